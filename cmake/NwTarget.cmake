@@ -1,0 +1,29 @@
+# What every target of this project is built with. Usage: nw_target(<target>)
+
+find_program(NW_CCACHE ccache)
+mark_as_advanced(NW_CCACHE)
+if(NW_CCACHE AND NOT DEFINED CMAKE_CXX_COMPILER_LAUNCHER)
+  set(CMAKE_CXX_COMPILER_LAUNCHER "${NW_CCACHE}")
+endif()
+
+# Results are bit-identical across instruction sets, so no product may be fused with a sum behind our back.
+set(NW_NUMERIC_FLAGS -ffp-contract=off)
+
+set(NW_WARNINGS -Wall -Wextra -Wpedantic -Wshadow -Wconversion -Wsign-conversion -Wold-style-cast -Wnon-virtual-dtor)
+
+function(nw_target target)
+  set_target_properties(${target} PROPERTIES
+    CXX_STANDARD 20
+    CXX_STANDARD_REQUIRED ON
+    CXX_EXTENSIONS OFF
+    CXX_VISIBILITY_PRESET hidden
+    VISIBILITY_INLINES_HIDDEN ON
+    POSITION_INDEPENDENT_CODE ON)
+  target_compile_options(${target} PRIVATE
+    ${NW_NUMERIC_FLAGS} ${NW_WARNINGS} $<$<BOOL:${NW_WARNINGS_AS_ERRORS}>:-Werror>)
+  if(NW_SANITIZE)
+    target_compile_options(${target} PRIVATE
+      -fsanitize=${NW_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
+    target_link_options(${target} PRIVATE -fsanitize=${NW_SANITIZE})
+  endif()
+endfunction()
