@@ -13,7 +13,10 @@ source_lists() {
   codename=$(. /etc/os-release && printf '%s' "$VERSION_CODENAME")
   for file in /etc/apt/sources.list /etc/apt/sources.list.d/*.list; do
     [[ -e $file ]] || continue
-    sed -n "s/#.*//; s/^ *deb  *\(.* $codename[^ ]* .*main.*\)/deb-src \1/p" "$file" >>"$1/machine.list"
+    awk -v codename="$codename" '
+      { sub(/#.*/, "") }
+      $1 == "deb" { for (i = 2; i < NF; ++i) if ($i ~ "^" codename) { $1 = "deb-src"; print; next } }' \
+      "$file" >>"$1/machine.list"
   done
   for file in /etc/apt/sources.list.d/*.sources; do
     [[ -e $file ]] || continue
@@ -42,18 +45,20 @@ fetch_source() {
     fail "apt-get source onetbb failed: $(grep -m 1 '^E:' "$scratch/apt.log")"
 }
 
-build() {
+configure_build_install() {
   local source=("$scratch"/source/onetbb-*/)
-  say "building oneTBB $version for the thread sanitizer"
   cmake -S "${source[0]}" -B "$scratch/build" -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
     -DCMAKE_CXX_COMPILER=clang++-14 -DCMAKE_C_COMPILER=clang-14 -DCMAKE_INSTALL_PREFIX="$scratch/install" \
-    -DCMAKE_INSTALL_LIBDIR=lib -DTBB_SANITIZE=thread -DTBB_TEST=OFF -DTBB_STRICT=OFF -DTBBMALLOC_BUILD=OFF \
-    >"$scratch/build.log" 2>&1 &&
-    cmake --build "$scratch/build" --parallel "$(jobs)" >>"$scratch/build.log" 2>&1 &&
-    cmake --install "$scratch/build" >>"$scratch/build.log" 2>&1 || {
-    tail -n 30 "$scratch/build.log" >&2
-    fail "oneTBB did not build for the thread sanitizer (its last lines are above)"
-  }
+    -DCMAKE_INSTALL_LIBDIR=lib -DTBB_SANITIZE=thread -DTBB_TEST=OFF -DTBB_STRICT=OFF -DTBBMALLOC_BUILD=OFF &&
+    cmake --build "$scratch/build" --parallel "$(jobs)" &&
+    cmake --install "$scratch/build"
+}
+
+build() {
+  say "building oneTBB $version for the thread sanitizer"
+  configure_build_install >"$scratch/build.log" 2>&1 && return
+  tail -n 30 "$scratch/build.log" >&2
+  fail "oneTBB did not build for the thread sanitizer (its last lines are above)"
 }
 
 unpack() {

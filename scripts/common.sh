@@ -27,7 +27,7 @@ declare -A probe_of=(
   [libeigen3-dev]=eigen3/Eigen/Core
   [npm]=npm
   [clang-14]=clang++-14
-  [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/14.0.6/include/sanitizer/asan_interface.h
+  [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/*/include/sanitizer/asan_interface.h
   [llvm-14]=llvm-symbolizer-14
   [clang-format-14]=clang-format-14
   [clang-tidy-14]=clang-tidy-14
@@ -40,7 +40,7 @@ is_debian_12() { (. /etc/os-release 2>/dev/null && [[ ${ID:-} == debian && ${VER
 is_installed() {
   local package=$1 probe=${probe_of[$1]}
   case $probe in
-    /*) [[ -e $probe ]] ;;
+    /*) compgen -G "$probe" >/dev/null ;;
     */*)
       if have dpkg-query && is_debian_12; then
         [[ $(dpkg-query -W -f '${db:Status-Status}' "$package" 2>/dev/null) == installed ]]
