@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A test that must fail (CTest inverts it) and its twin that must pass.
 #include <gtest/gtest.h>
 
