@@ -1,0 +1,94 @@
+#include "nw_model/PrincipalShapes.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <limits>
+
+#include "json.h"
+#include "readers.h"
+
+namespace neuralWarp {
+namespace {
+
+/// Half a step of the last place above the largest float: what lies below still rounds to a finite value.
+constexpr double floatRoundingLimit = 0x1.ffffffp+127;
+
+bool fitsFloat(const json::Value& value) {
+    return value.IsNumber() && std::fabs(value.GetDouble()) < floatRoundingLimit;
+}
+
+bool isShape(const json::Value& value, std::uint64_t coordinates) {
+    return value.IsArray() && value.Size() >= coordinates && std::all_of(value.Begin(), value.End(), fitsFloat);
+}
+
+/// Transposes the list of shapes into vertex-major order. Every shape holds at least 3 * vertCount numbers, so the size
+/// reserved is bounded by what the document holds.
+void appendVertexMajor(std::vector<float>& values, const json::Value& list, std::uint64_t vertCount) {
+    values.reserve(std::size_t{3} * list.Size() * vertCount);
+    for (rapidjson::SizeType first = 0; first < 3 * vertCount; first += 3) {
+        for (const json::Value& shape : list.GetArray()) {
+            for (rapidjson::SizeType i = first; i < first + 3; ++i) {
+                values.push_back(static_cast<float>(shape[i].GetDouble()));
+            }
+        }
+    }
+}
+
+bool readShapes(PrincipalShapes& shapes, const json::Value& root) {
+    const json::Value* list = json::find(root, "principalShapes");
+    const std::uint64_t found = list != nullptr && list->IsArray() ? list->Size() : 0;
+    if (found != shapes.shapeCount) {
+        std::fputs("Error: principalShapeCount does not match the number of principal shapes\n", stdout);
+        return false;
+    }
+    const std::uint64_t coordinates = 3 * shapes.vertCount;
+    if (!std::all_of(list->Begin(), list->End(), [=](const json::Value& v) { return isShape(v, coordinates); })) {
+        return false;
+    }
+    appendVertexMajor(shapes.values, *list, shapes.vertCount);
+    return true;
+}
+
+} // namespace
+
+bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source) {
+    json::Document root;
+    if (!json::parse(root, source) || !root.IsObject()) {
+        return false;
+    }
+    shapes.shapeCount = json::readUint(root, "principalShapeCount", 0);
+    shapes.vertCount = json::readUint(root, "principalVertCount", 0);
+    if (shapes.vertCount == 0) {
+        shapes.vertCount = json::readUint(root, "vertCount", 0);
+    }
+    if (shapes.shapeCount == 0 || shapes.vertCount == 0) {
+        return true;
+    }
+    if (!readShapes(shapes, root)) {
+        shapes.shapeCount = 0;
+        return false;
+    }
+    return true;
+}
+
+bool readPrincipalShapesFile(const std::filesystem::path& path, std::vector<float>& values, std::uint64_t& shapeCount,
+                             std::uint64_t& vertCount) noexcept {
+    values.clear();
+    shapeCount = 0;
+    vertCount = 0;
+    try {
+        std::filebuf file;
+        PrincipalShapes shapes;
+        const bool ok = json::open(file, path, principalShapesFileLimit) && readPrincipalShapes(shapes, file);
+        values.swap(shapes.values);
+        shapeCount = shapes.shapeCount;
+        vertCount = shapes.vertCount;
+        return ok;
+    } catch (...) {
+        json::printCurrentException();
+        return false;
+    }
+}
+
+} // namespace neuralWarp
