@@ -74,7 +74,7 @@ void replayKind(const Kind& kind, const std::vector<Case*>& cases, bool exact, T
         const auto disagreements = replayCase(kind, *testCase, exact ? 0.0 : testCase->tolerance);
         reportDisagreements(*testCase, disagreements);
         tally.count(disagreements.empty());
-        failed += disagreements.empty() ? 0 : 1;
+        failed += disagreements.empty() ? 0U : 1U;
     }
     std::printf("%zu cases of kind %s, %zu failed\n", cases.size(), kind.name.data(), failed);
 }

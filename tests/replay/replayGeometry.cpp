@@ -177,7 +177,7 @@ Json replayMesh(Input& input, JsonAllocator& allocator) {
 
     std::vector<quill::mat4d> plain, inverted, smoothed;
     frames.calculateFrames(plain, positions, map, false, pointerTo(subset));
-    frames.calculateFrames(inverted, positions, map, true, pointerTo(subset));
+    frames.calculateFrames(inverted, positions, map, true, nullptr);
     frames.calculateFrames(smoothed, positions, connections.connectionsIndexer(), connections.connections(), weights,
                            readCount(input["normalIterations"]), map, false, pointerTo(subset));
     out.set("calculateFrames", plain);
@@ -188,15 +188,16 @@ Json replayMesh(Input& input, JsonAllocator& allocator) {
     frames.calculateDisplacements(positions, points, displacements);
     out.set("calculateDisplacements", displacements);
 
-    // rest frames on the positions, current frames on the positions after one gentle smoothing pass
-    Points relaxed = positions;
-    connections.mushArray(relaxed, scratch, 1, 0.25F, nullptr, nullptr, false);
-    std::vector<quill::mat4d> restInverse, current;
-    frames.calculateFrames(restInverse, positions, map, true, nullptr);
-    frames.calculateFrames(current, relaxed, map, false, nullptr);
+    // positions at rest carried to points, both measured after one gentle smoothing pass
+    Points rest = positions, current = points;
+    connections.mushArray(rest, scratch, 1, 0.25F, nullptr, &weights, false);
+    connections.mushArray(current, scratch, 1, 0.25F, nullptr, &weights, false);
+    std::vector<quill::mat4d> restInverse, currentFrames;
+    frames.calculateFrames(restInverse, rest, map, true, nullptr);
+    frames.calculateFrames(currentFrames, current, map, false, nullptr);
     Points transported;
     for (std::size_t i = 0; i < positions.size(); ++i)
-        transported.push_back(quill::transportDelta(points[i], deltas[i], restInverse[i], current[i]));
+        transported.push_back(quill::transportDelta(positions[i], deltas[i], restInverse[i], currentFrames[i]));
     out.set("transport", transported);
     return out.take();
 }

@@ -35,13 +35,13 @@ public:
             }
             return;
         }
-        Candidate& best = byKey[key];
-        if (value.IsArray()) {
+        if (value.IsArray() && !value.Empty()) {
             for (rapidjson::SizeType i = 0; i < value.Size(); ++i)
                 collect(owner, value[i], key, where + '[' + std::to_string(i) + ']');
             return;
         }
-        if (!value.IsNull() && sizeOf(value) > best.size)
+        Candidate& best = byKey[key];
+        if (!value.IsArray() && !value.IsNull() && sizeOf(value) > best.size)
             best = {&owner, &value, where, sizeOf(value)};
     }
 
