@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <cstring>
 #include <exception>
 #include <limits>
 #include <optional>
@@ -95,12 +96,16 @@ TensorInfo readInput(const Ort::Session& session, OrtAllocator* allocator) {
     return input;
 }
 
-TensorInfo readOutput(const Ort::Session& session, OrtAllocator* allocator) {
+TensorInfo readOutput(const Ort::Session& session, OrtAllocator* allocator, const char* inputName) {
     if (session.GetOutputCount() == 0) {
         throw std::runtime_error("the model has no output");
     }
     TensorInfo output;
     output.name = session.GetOutputNameAllocated(0, allocator);
+    if (std::strcmp(output.name->get(), inputName) == 0) {
+        // The runtime then reports success and leaves the caller's output array unwritten.
+        throw std::runtime_error("the first output is the input itself");
+    }
     output.shape = usableShape(session.GetOutputTypeInfo(0), "the first output");
     return output;
 }
@@ -161,7 +166,7 @@ void ModelSession::Runtime::build(const std::filesystem::path& path) {
     options.SetGraphOptimizationLevel(ORT_ENABLE_ALL);
     Ort::Session fresh(*env, path.c_str(), options);
     TensorInfo freshInput = readInput(fresh, *allocator);
-    output = readOutput(fresh, *allocator);
+    output = readOutput(fresh, *allocator, freshInput.name->get());
     input = std::move(freshInput);
     session.emplace(std::move(fresh));
 }
