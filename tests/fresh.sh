@@ -12,10 +12,11 @@ cd "$(dirname "$0")/.."
 system=$(mktemp -d /tmp/neuralwarp-fresh.XXXXXX)
 clone=/project/neuralWarp
 
+# shellcheck disable=SC2317 # called by the trap below
 clean_up() {
   local mount status=$?
   # whatever is still mounted below goes first, deepest first: nothing of this machine may be removed through it
-  while read -r mount; do umount -l "$mount"; done < <(cut -d ' ' -f 2 /proc/mounts | grep "^$system/" | sort -r)
+  while read -r mount; do umount -l "$mount" || true; done < <(cut -d ' ' -f 2 /proc/mounts | grep "^$system/" | sort -r)
   if grep -q " $system/" /proc/mounts; then
     printf 'fresh.sh: cannot unmount everything below %s: remove it by hand\n' "$system" >&2
   elif [[ ${FRESH_KEEP:-} ]]; then
@@ -23,13 +24,14 @@ clean_up() {
   else
     rm -rf --one-file-system "$system"
   fi
-  exit $status
+  exit "$status"
 }
 trap clean_up EXIT
 trap 'exit 130' INT TERM
 
 # The first Debian archive that this machine's apt reads (not the security archive, which has no base system).
 mirror_of_this_machine() {
+  # shellcheck disable=SC2016 # the dollars are apt's
   apt-get indextargets --format '$(CODENAME) $(REPO_URI)' 'Created-By: Packages' |
     awk '$1 == "bookworm" { print $2; exit }'
 }
@@ -38,7 +40,8 @@ make_system() {
   local mirror
   have debootstrap || {
     say "installing debootstrap"
-    apt_get update && apt_get install -y --no-install-recommends debootstrap || fail "apt-get could not install debootstrap"
+    apt_get update || fail "apt-get update failed, and debootstrap is missing"
+    apt_get install -y --no-install-recommends debootstrap || fail "apt-get could not install debootstrap"
   }
   mirror=$(mirror_of_this_machine)
   [[ $mirror ]] || fail "this machine's apt knows no Debian 12 archive to make the system from"
@@ -65,7 +68,7 @@ hand_over_network() {
 
 # The tracked files as a clone of their own, and the shared cases beside it, where the tests look for them.
 copy_clone() {
-  mkdir -p "$system$clone"
+  mkdir -p "$system$clone" "$system/project/home"
   git -c safe.directory="$PWD" clone -q --no-hardlinks "$PWD" "$system$clone" || fail "git could not clone this tree"
   if [[ -n $(git -c safe.directory="$PWD" status --porcelain) ]]; then
     say "note: what is not committed is not part of this run"
@@ -85,12 +88,13 @@ mount_kernel_folders() {
 
 # An environment of its own: only how to reach the network comes from outside.
 run_inside() {
-  local name environment=(HOME=/root PATH=/usr/sbin:/usr/bin:/sbin:/bin LANG=C.UTF-8 CI=true)
+  local name environment=(HOME=/project/home PATH=/usr/sbin:/usr/bin:/sbin:/bin LANG=C.UTF-8 CI=true)
   for name in http_proxy https_proxy no_proxy HTTP_PROXY HTTPS_PROXY NO_PROXY NW_JOBS; do
     if [[ ${!name:-} ]]; then environment+=("$name=${!name}"); fi
   done
   if have npm; then environment+=("NPM_CONFIG_REGISTRY=$(npm config get registry)"); fi
   if [[ -e $system/etc/extra-ca.crt ]]; then environment+=(NODE_EXTRA_CA_CERTS=/etc/extra-ca.crt); fi
+  # shellcheck disable=SC2016 # the dollars are the inner shell's
   env -i "${environment[@]}" chroot "$system" /bin/bash -c 'cd "$1" && shift && exec "$@"' - "$clone" "$@" </dev/null
 }
 
