@@ -40,8 +40,8 @@ make_system() {
   local mirror
   have debootstrap || {
     say "installing debootstrap"
-    apt_get update || fail "apt-get update failed, and debootstrap is missing"
-    apt_get install -y --no-install-recommends debootstrap || fail "apt-get could not install debootstrap"
+    apt_get update || fail "apt-get update failed, and debootstrap is missing ($(apt_error))"
+    apt_get install -y --no-install-recommends debootstrap || fail "apt-get could not install debootstrap ($(apt_error))"
   }
   mirror=$(mirror_of_this_machine)
   [[ $mirror ]] || fail "this machine's apt knows no Debian 12 archive to make the system from"
