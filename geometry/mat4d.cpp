@@ -17,19 +17,19 @@ bool isPivot(double value) {
     return value > smallestPivot || value < -smallestPivot;
 }
 
-// The six 2x2 minors of rows r and r + 1: Laplace's expansion builds every cofactor from those of rows 0-1 and 2-3.
+// The six 2x2 minors of two rows, r above s, from which the cofactors of a third row's elements are expanded.
 struct RowPairMinors {
     double c01, c02, c03, c12, c13, c23;
 
-    RowPairMinors(const mat4d& a, std::size_t r) {
-        const auto minor = [&](std::size_t i, std::size_t j) { return a(r, i) * a(r + 1, j) - a(r, j) * a(r + 1, i); };
+    RowPairMinors(const mat4d& a, std::size_t r, std::size_t s) {
+        const auto minor = [&](std::size_t i, std::size_t j) { return a(r, i) * a(s, j) - a(r, j) * a(s, i); };
         c01 = minor(0, 1), c02 = minor(0, 2), c03 = minor(0, 3);
         c12 = minor(1, 2), c13 = minor(1, 3), c23 = minor(2, 3);
     }
 
-    // The signed cofactors, in column order, of the row outside the pair whose companion row is `other`.
-    std::array<double, 4> cofactors(const mat4d& a, std::size_t other) const {
-        const double a0 = a(other, 0), a1 = a(other, 1), a2 = a(other, 2), a3 = a(other, 3);
+    // The 3x3 determinants of row `top` above the pair, each without one column and with the signs + - + -.
+    std::array<double, 4> cofactors(const mat4d& a, std::size_t top) const {
+        const double a0 = a(top, 0), a1 = a(top, 1), a2 = a(top, 2), a3 = a(top, 3);
         return {a1 * c23 - a2 * c13 + a3 * c12, -a0 * c23 + a2 * c03 - a3 * c02, a0 * c13 - a1 * c03 + a3 * c01,
                 -a0 * c12 + a1 * c02 - a2 * c01};
     }
@@ -80,23 +80,22 @@ bool mat4d::isIdentity(double tolerance) const {
 }
 
 double mat4d::determinant() const {
-    return expandAlongFirstRow(*this, RowPairMinors(*this, 2).cofactors(*this, 1));
+    return expandAlongFirstRow(*this, RowPairMinors(*this, 2, 3).cofactors(*this, 1));
 }
 
 void mat4d::inverse() {
-    const RowPairMinors lower(*this, 2);
+    const RowPairMinors lower(*this, 2, 3);
     const auto row0 = lower.cofactors(*this, 1);
     const double d = expandAlongFirstRow(*this, row0);
     if (std::abs(d) < smallestDeterminant) {
         gaussJordanInverse();
         return;
     }
-    const RowPairMinors upper(*this, 0);
     const auto row1 = lower.cofactors(*this, 0);
-    const auto row2 = upper.cofactors(*this, 3);
-    const auto row3 = upper.cofactors(*this, 2);
+    const auto row2 = RowPairMinors(*this, 1, 3).cofactors(*this, 0);
+    const auto row3 = RowPairMinors(*this, 1, 2).cofactors(*this, 0);
     const double reciprocal = 1.0 / d;
-    // Swapping a row with its companion flips the sign of rows 1 and 3; the adjugate is the transpose.
+    // the cofactors of rows 1 and 3 have the signs - + - +; the adjugate is the transpose
     for (std::size_t k = 0; k < 4; ++k) {
         (*this)(k, 0) = row0[k] * reciprocal;
         (*this)(k, 1) = -row1[k] * reciprocal;

@@ -1,0 +1,101 @@
+# ./run check [--all]: sourced by ./run, whose functions it uses. Every phase runs, whatever the others said.
+
+# git that also reads a clone which belongs to another user, as a checkout in a container often does
+git_here() { git -c safe.directory="$PWD" "$@" 2>/dev/null; }
+
+# The project's C++ files: what git tracks or could; everything outside the build tree where there is no git.
+cpp_files() {
+  if have git && git_here rev-parse --git-dir >/dev/null; then
+    git_here ls-files --cached --others --exclude-standard -- '*.cpp' '*.h' | while read -r file; do
+      if [[ -e $file ]]; then printf '%s\n' "$file"; fi
+    done
+  else
+    find . -path ./build -prune -o -name .git -prune -o \( -name '*.cpp' -o -name '*.h' \) -printf '%P\n'
+  fi | sort
+}
+
+# The commit that the changes are counted from: where this branch left the main one, else the last commit but one.
+change_base() {
+  local head branch
+  head=$(git_here rev-parse HEAD) || return 1
+  for branch in "${NW_CHECK_BASE:-}" origin/HEAD origin/main main; do
+    [[ -n $branch ]] || continue
+    local base
+    base=$(git_here merge-base HEAD "$branch") || continue
+    [[ $base != "$head" ]] && printf '%s' "$base" && return 0
+  done
+  git_here rev-parse --verify HEAD~1
+}
+
+changed_files() {
+  local base
+  if have git && base=$(change_base); then
+    { git_here diff --name-only "$base" && git_here ls-files --others --exclude-standard; } | sort -u
+  else
+    cpp_files # no history to compare with
+  fi
+}
+
+# A header has no compile command of its own: the translation unit that compiles it alone stands for it.
+translation_units() {
+  local file
+  while read -r file; do
+    case $file in
+      *.cpp) printf '%s/%s\n' "$PWD" "$file" ;;
+      *.h) find build/asan/tests/house/headers -path "*/${file//[\/]/_}.cpp" -printf "$PWD/%p\n" 2>/dev/null || true ;;
+    esac
+  done | sort -u >"$1.wanted"
+  sed -n 's/^ *"file": "\(.*\)".*/\1/p' build/asan/compile_commands.json | sort -u >"$1.known"
+  comm -12 "$1.wanted" "$1.known"
+}
+
+check_format() {
+  local files
+  mapfile -t files < <(cpp_files)
+  say "format: ${#files[@]} files"
+  ((${#files[@]} == 0)) || clang-format-14 --dry-run --Werror "${files[@]}"
+}
+
+check_tidy() {
+  local units
+  configure asan
+  mapfile -t units < <(if [[ $1 == --all ]]; then cpp_files; else changed_files; fi | translation_units build/tidy)
+  say "static analysis: ${#units[@]} translation units"
+  ((${#units[@]} == 0)) ||
+    printf '%s\0' "${units[@]}" | xargs -0 -n 1 -P "$(jobs)" clang-tidy-14 --quiet -p build/asan
+}
+
+build_and_test() {
+  build "$1"
+  run_tests "$1"
+}
+
+phase_report=()
+phase_failed=0
+
+# phase NAME COMMAND...: runs it in a shell of its own, notes seconds and outcome
+phase() {
+  local name=$1 start=$SECONDS verdict=passed
+  shift
+  # in the background, because `set -e` has no effect on what stands left of `||`
+  (set -e && "$@") &
+  wait $! || {
+    verdict=FAILED
+    phase_failed=1
+  }
+  phase_report+=("$(printf '%-16s %5d s  %s' "$name" $((SECONDS - start)) "$verdict")")
+}
+
+command_check() {
+  local scope=${1:-}
+  [[ -z $scope || $scope == --all ]] || fail "check takes --all or nothing, not '$scope'"
+  need_packages git clang-format-14 clang-tidy-14
+  need_for_preset tsan
+  phase format check_format
+  phase static-analysis check_tidy "${scope:-changed}"
+  phase asan build_and_test asan
+  phase tsan build_and_test tsan
+  say "check: seconds per phase"
+  printf '%s\n' "${phase_report[@]}"
+  return $phase_failed
+}

@@ -1,0 +1,102 @@
+# Shared by ./run and the scripts beside this file: messages, packages, caches. Sourced by bash, never run.
+
+say() { printf '== %s\n' "$*"; }
+
+# One line on standard error, then the end of the command.
+fail() {
+  printf '%s: %s\n' "${0##*/}" "$*" >&2
+  exit 1
+}
+
+have() { command -v "$1" >/dev/null 2>&1; }
+
+jobs() { printf '%s' "${NW_JOBS:-$(nproc)}"; }
+
+# Every Debian package that the project uses, and how its presence is seen: a command on the PATH, or a header
+# (on Debian the package database answers for headers, elsewhere the header itself is looked for).
+declare -A probe_of=(
+  [g++]=g++
+  [cmake]=cmake
+  [ninja-build]=ninja
+  [ccache]=ccache
+  [libtbb-dev]=tbb/parallel_for.h
+  [rapidjson-dev]=rapidjson/document.h
+  [libgtest-dev]=gtest/gtest.h
+  [libgmock-dev]=gmock/gmock.h
+  [libbenchmark-dev]=benchmark/benchmark.h
+  [libeigen3-dev]=eigen3/Eigen/Core
+  [npm]=npm
+  [clang-14]=clang++-14
+  [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/*/include/sanitizer/asan_interface.h
+  [llvm-14]=llvm-symbolizer-14
+  [clang-format-14]=clang-format-14
+  [clang-tidy-14]=clang-tidy-14
+  [dpkg-dev]=dpkg-source
+  [git]=git
+)
+
+is_debian_12() { (. /etc/os-release 2>/dev/null && [[ ${ID:-} == debian && ${VERSION_ID:-} == 12 ]]); }
+
+is_installed() {
+  local package=$1 probe=${probe_of[$1]}
+  case $probe in
+    /*) compgen -G "$probe" >/dev/null ;;
+    */*)
+      if have dpkg-query && is_debian_12; then
+        [[ $(dpkg-query -W -f '${db:Status-Status}' "$package" 2>/dev/null) == installed ]]
+      else
+        [[ -e /usr/include/$probe || -e /usr/local/include/$probe ]]
+      fi
+      ;;
+    *) have "$probe" ;;
+  esac
+}
+
+as_root() {
+  if ((EUID == 0)); then
+    "$@"
+  elif have sudo; then
+    sudo -n true 2>/dev/null || say "sudo asks for a password to run: $*"
+    sudo "$@"
+  else
+    fail "neither root nor sudo: as root, run: $*"
+  fi
+}
+
+# Installs those of the named packages that are missing; touches nothing when none is.
+need_packages() {
+  local package missing=()
+  for package in "$@"; do
+    is_installed "$package" || missing+=("$package")
+  done
+  ((${#missing[@]})) || return 0
+  is_debian_12 || fail "not Debian 12, so install by hand what is missing: ${missing[*]}"
+
+  # npm is only as good as the certificates it can check a server by, and Debian's npm merely recommends them.
+  [[ " ${missing[*]} " == *' npm '* && ! -e /etc/ssl/certs/ca-certificates.crt ]] && missing+=(ca-certificates)
+
+  say "installing ${missing[*]}"
+  apt_get update || fail "apt-get update failed; packages that are missing: ${missing[*]}"
+  apt_get install -y --no-install-recommends "${missing[@]}" ||
+    fail "apt-get could not install the missing packages: ${missing[*]}"
+}
+
+apt_get() {
+  as_root env DEBIAN_FRONTEND=noninteractive apt-get -q -o Dpkg::Use-Pty=0 "$@" </dev/null
+}
+
+# A folder of the user's, kept between clones, for what is slow to get. Nothing in it is trusted without a check.
+cache_folder() {
+  local base=${XDG_CACHE_HOME:-${HOME:+$HOME/.cache}}
+  local folder=${base:-$PWD/build/deps/cache}/neuralwarp
+  mkdir -p "$folder" || fail "cannot make the cache folder $folder; set XDG_CACHE_HOME to a folder that can be written"
+  printf '%s' "$folder"
+}
+
+# Makes a folder appear at once or not at all: whoever else is filling the same one may win, and that is as good.
+publish_folder() {
+  local from=$1 to=$2
+  rm -rf "$to"
+  mkdir -p "$(dirname "$to")"
+  mv -T "$from" "$to" 2>/dev/null || [[ -d $to ]]
+}

@@ -1,0 +1,50 @@
+#!/usr/bin/env bash
+# Plants one include at a time into a small tree and asks includes.sh for its verdict.
+set -euo pipefail
+here=$(cd "$(dirname "$0")" && pwd)
+tree=$(mktemp -d)
+trap 'rm -rf "$tree"' EXIT
+failed=0
+
+# try VERDICT FILE LINE: allowed, or refused with a message that names the place
+try() {
+  local verdict=$1 file=$2 line=$3 output status=0
+  rm -rf "${tree:?}"/*
+  mkdir -p "$tree"/{geometry/quill,model/nw_model,neuralWarp} "$tree/$(dirname "$file")"
+  touch "$tree/geometry/local.h" "$tree/geometry/quill/val3.h" "$tree/model/nw_model/session.h"
+  printf '// first line\n%s\n' "$line" >"$tree/$file"
+  output=$("$here/includes.sh" "$tree" 2>&1) || status=$?
+  case $verdict in
+    allowed) [[ $status == 0 && -z $output ]] ;;
+    refused) [[ $status == 1 && $output == *"$file:2: "* ]] ;;
+    no_layer) [[ $status == 1 && $output == *"$file: "* ]] ;;
+  esac && return
+  printf 'expected %s: %s in %s\nstatus %s, output: %s\n' "$verdict" "$line" "$file" "$status" "$output"
+  failed=1
+}
+
+try allowed geometry/bulk.cpp '#include <vector>'
+try allowed geometry/bulk.cpp '#include "quill/val3.h"'
+try allowed geometry/bulk.cpp '#include "local.h"'
+try allowed geometry/bulk.cpp '#include <oneapi/tbb/parallel_for.h>'
+try allowed neuralWarp/node.cpp '#include "nw_model/session.h"'
+try allowed host/api/openquarn/gpu/HGpu.h '#include <CL/cl.h>'
+try allowed tests/geometry/a.cpp '#include "nw_model/session.h"'
+try allowed geometry/bulk.cpp '// #include <onnxruntime_cxx_api.h>'
+
+try refused geometry/bulk.cpp '#include "nw_model/session.h"'
+try refused geometry/bulk.cpp '  #  include <nw_model/session.h>'
+try refused geometry/bulk.cpp '#include <onnxruntime_cxx_api.h>'
+try refused geometry/bulk.cpp '#include "../model/nw_model/session.h"'
+try refused geometry/bulk.cpp '#include "quill/../../model/nw_model/session.h"'
+try refused geometry/bulk.cpp '#include "missing.h"'
+try refused geometry/bulk.cpp '#include <unistd.h>'
+try refused geometry/bulk.cpp '#include SOME_MACRO'
+try refused geometry/quill/up.h '#include "neuralWarp/node.h"'
+try refused model/ModelSession.cpp '#include "quill/val3.h"'
+try refused model/ModelSession.cpp '#include <tbb/parallel_for.h>'
+try refused host/api/openquarn/HObject.h '#include <CL/cl.h>'
+try refused host/api/openquarn/HObject.h '#include "gpu/HGpu.h"'
+try refused neuralWarp/node.cpp '#include "runtime/scene.h"'
+try no_layer somewhere/else.cpp '#include <vector>'
+exit $failed

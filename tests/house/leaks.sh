@@ -1,0 +1,14 @@
+#!/usr/bin/env bash
+# leaks.sh ROOT: lists lines under ROOT that carry a path of somebody's machine or the address of a package registry.
+# Those belong to the machine's configuration. Exit status 1 when there is one.
+set -euo pipefail
+cd "$1"
+
+# The letter in brackets keeps this file from finding itself.
+home='(^|[^[:alnum:]_./-])/([r]oot|[h]ome/[a-z]+|[w]ork|[U]sers/[A-Za-z]+)(/|\b)'
+address='[a-z]+://[^[:space:]"<>]*([r]egistry|[m]irror|[a]rtifact|[p]roxy|deb\.[d]ebian|[n]pmjs|[p]ypi)'
+lock='"[r]esolved": *"'
+
+if grep -rnIE --exclude-dir=build --exclude-dir='.git' --exclude='.git' "$home|$address|$lock" .; then
+  exit 1
+fi

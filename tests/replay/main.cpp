@@ -1,0 +1,141 @@
+// SPDX-License-Identifier: Apache-2.0
+// replay_cases DIR [--exact | --self-check] [--skip-if-absent]: replays reference cases through the real code.
+#include "run.h"
+#include "selfCheck.h"
+
+#include <cstdio>
+#include <cstring>
+#include <exception>
+#include <map>
+#include <string>
+
+namespace {
+
+using replay::Case;
+using replay::Kind;
+using CasesByKind = std::map<std::string, std::vector<Case*>>;
+
+constexpr const char* usage =
+    "usage: replay_cases DIR [--exact | --self-check] [--skip-if-absent]\n"
+    "  DIR               a folder of reference cases, one JSON file each\n"
+    "  --exact           compare with tolerance 0\n"
+    "  --self-check      change one expected value per key and kind: each change must be noticed\n"
+    "  --skip-if-absent  exit 77 instead of 2 when DIR is not there\n"
+    "Exit status: 0 all passed, 1 a failure, 2 the cases or the arguments are unusable.\n";
+
+struct Options {
+    std::string folder;
+    bool exact = false;
+    bool selfCheck = false;
+    bool skipIfAbsent = false;
+};
+
+bool parse(int argc, char** argv, Options& options) {
+    for (int i = 1; i < argc; ++i) {
+        const std::string argument = argv[i];
+        if (argument == "--exact")
+            options.exact = true;
+        else if (argument == "--self-check")
+            options.selfCheck = true;
+        else if (argument == "--skip-if-absent")
+            options.skipIfAbsent = true;
+        else if (argument.starts_with("-") || !options.folder.empty())
+            return false;
+        else
+            options.folder = argument;
+    }
+    return !options.folder.empty() && !(options.exact && options.selfCheck);
+}
+
+// Passes and failures so far.
+struct Tally {
+    std::size_t passed = 0;
+    std::size_t failed = 0;
+
+    void count(bool ok) { ++(ok ? passed : failed); }
+    void failure(const std::string& what) {
+        std::printf("%s\n", what.c_str());
+        ++failed;
+    }
+};
+
+void reportDisagreements(const Case& testCase, const std::vector<replay::Disagreement>& disagreements) {
+    constexpr std::size_t most = 10;
+    for (std::size_t i = 0; i < std::min(most, disagreements.size()); ++i)
+        std::printf("%s: %s: expected %s, got %s\n", testCase.name.c_str(), disagreements[i].where.c_str(),
+                    disagreements[i].expected.c_str(), disagreements[i].actual.c_str());
+    if (disagreements.size() > most)
+        std::printf("%s: and %zu more\n", testCase.name.c_str(), disagreements.size() - most);
+}
+
+void replayKind(const Kind& kind, const std::vector<Case*>& cases, bool exact, Tally& tally) {
+    std::size_t failed = 0;
+    for (const Case* testCase : cases) {
+        const auto disagreements = replayCase(kind, *testCase, exact ? 0.0 : testCase->tolerance);
+        reportDisagreements(*testCase, disagreements);
+        tally.count(disagreements.empty());
+        failed += disagreements.empty() ? 0U : 1U;
+    }
+    std::printf("%zu cases of kind %s, %zu failed\n", cases.size(), kind.name.data(), failed);
+}
+
+void checkKind(const Kind& kind, const std::vector<Case*>& cases, Tally& tally) {
+    const auto result = replay::selfCheck(kind, cases);
+    for (const std::string& key : result.unnoticed)
+        std::printf("kind %s: a change of \"%s\" went unnoticed\n", kind.name.data(), key.c_str());
+    for (const std::string& key : result.unperturbed)
+        tally.failure(std::string("kind ") + kind.name.data() + ": no case has a value to change in \"" + key + '"');
+    tally.passed += result.perturbed - result.unnoticed.size();
+    tally.failed += result.unnoticed.size();
+    std::printf("%zu cases of kind %s, %zu keys changed, %zu unnoticed\n", cases.size(), kind.name.data(),
+                result.perturbed, result.unnoticed.size());
+}
+
+void runAll(CasesByKind& byKind, const Options& options, Tally& tally) {
+    for (const Kind& kind : replay::kinds) {
+        const auto& cases = byKind[std::string(kind.name)];
+        if (!kind.replay)
+            std::printf("%zu cases of kind %s, not replayed: its code is not there yet\n", cases.size(),
+                        kind.name.data());
+        else if (cases.empty())
+            tally.failure("0 cases of kind " + std::string(kind.name) + ": there must be some");
+        else if (options.selfCheck)
+            checkKind(kind, cases, tally);
+        else
+            replayKind(kind, cases, options.exact, tally);
+    }
+    for (const auto& [name, cases] : byKind)
+        if (!replay::findKind(name))
+            tally.failure(std::to_string(cases.size()) + " cases of the unknown kind " + name);
+}
+
+int run(const Options& options) {
+    if (!std::filesystem::is_directory(options.folder)) {
+        std::printf("the reference cases were not there: %s\n", options.folder.c_str());
+        return options.skipIfAbsent ? 77 : 2;
+    }
+    auto cases = replay::readCases(options.folder);
+    CasesByKind byKind;
+    for (Case& testCase : cases)
+        byKind[testCase.kind].push_back(&testCase);
+    Tally tally;
+    runAll(byKind, options, tally);
+    std::printf("%zu passed, %zu failed\n", tally.passed, tally.failed);
+    return tally.failed == 0 ? 0 : 1;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    Options options;
+    if (!parse(argc, argv, options)) {
+        std::fputs(usage, stderr);
+        return 2;
+    }
+    try {
+        return run(options);
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "replay_cases: %s\n", error.what());
+        return 2;
+    }
+}
