@@ -6,7 +6,6 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/common.sh
 
-(($#)) || set -- test
 ((EUID == 0)) || fail "needs root, for debootstrap and chroot"
 
 system=$(mktemp -d /tmp/neuralwarp-fresh.XXXXXX)
@@ -98,16 +97,24 @@ run_inside() {
   env -i "${environment[@]}" chroot "$system" /bin/bash -c 'cd "$1" && shift && exec "$@"' - "$clone" "$@" </dev/null
 }
 
-make_system
-hand_over_network
-copy_clone
-mount_kernel_folders
+# in a function that ends the script: bash reads a script as it goes, and this one may change while it runs
+main() {
+  local program=./run status=0 start
+  (($#)) || set -- test
+  if [[ $1 == ci ]]; then
+    program=.ci/run
+    shift
+  fi
 
-program=./run
-[[ $1 == ci ]] && program=.ci/run && shift
-say "$program $* in $system"
-start=$SECONDS
-status=0
-run_inside "$program" "$@" || status=$?
-say "fresh: $program $* ended with status $status after $((SECONDS - start)) s"
-exit $status
+  make_system
+  hand_over_network
+  copy_clone
+  mount_kernel_folders
+  say "$program $* in $system"
+  start=$SECONDS
+  run_inside "$program" "$@" || status=$?
+  say "fresh: $program $* ended with status $status after $((SECONDS - start)) s"
+  exit "$status"
+}
+
+main "$@"
