@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelSession.h"
 
 #include <algorithm>
@@ -277,7 +278,9 @@ std::int32_t ModelSession::inputCount() const {
         printUnsupportedType();
         return 0;
     }
-    return elementCount(runtime_->input.shape); // one dimension: the count is the dimension
+    // checked at load: one dimension that fits, or no shape at all when that load failed
+    const std::vector<std::int64_t>& shape = runtime_->input.shape;
+    return shape.empty() ? 0 : static_cast<std::int32_t>(shape.front());
 }
 
 std::vector<float> ModelSession::run(std::span<const float> inputs) noexcept {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // neuralWarp model runtime: one network file, loaded and run.
 #pragma once
 

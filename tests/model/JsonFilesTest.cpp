@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What both readers of the model directory do with files that are no usable JSON document.
 #include <functional>
 #include <string>
@@ -26,7 +27,7 @@ void expectRefused(const std::filesystem::path& path, const std::string& output)
     StdoutCapture out;
     EXPECT_FALSE(readMetadataFile(record, path)) << path;
     EXPECT_FALSE(readPrincipalShapesFile(path, values, shapeCount, vertCount)) << path;
-    EXPECT_EQ(out.text(), output + output) << path;
+    EXPECT_EQ(out.take(), output + output) << path;
     EXPECT_TRUE(record.loaded) << path;
     EXPECT_EQ(record.deltaMode + record.affectMap.size(), 13u) << path;
     EXPECT_EQ(record.geometry, "geometry") << path;
@@ -36,7 +37,7 @@ void expectRefused(const std::filesystem::path& path, const std::string& output)
 
 /// Whether both readers accept a file of `text`, which must then be silent.
 void expectAccepted(const std::string& text) {
-    const TempFolder folder;
+    const TestFolder folder;
     const auto path = folder.write("file.json", text);
     ModelMetadata record;
     std::vector<float> values;
@@ -44,13 +45,13 @@ void expectAccepted(const std::string& text) {
     StdoutCapture out;
     EXPECT_TRUE(readMetadataFile(record, path)) << text.substr(0, 80);
     EXPECT_TRUE(readPrincipalShapesFile(path, values, counts[0], counts[1])) << text.substr(0, 80);
-    EXPECT_EQ(out.text(), "");
+    EXPECT_EQ(out.take(), "");
 }
 
 } // namespace
 
 TEST(JsonFiles, PathsThatCannotBeOpened) {
-    const TempFolder folder;
+    const TestFolder folder;
     const auto link = folder / "loop.json";
     std::filesystem::create_symlink(link, link);
     const auto pipe = folder / "pipe.json";
@@ -64,17 +65,34 @@ TEST(JsonFiles, PathsThatCannotBeOpened) {
 
 TEST(JsonFiles, MalformedDocuments) {
     const std::string zero(1, '\0');
-    for (const std::string& text : std::vector<std::string>{
-             "", "  ", "{} x", "{}{}", "{]", "[1,]", "{\"a\": NaN}", "{\"a\": Infinity}", "{\"a\": 1e400}",
-             "{\"a\": 01}", "{'a': 1}", "{\"a\": 1,}", "{/**/}", "{\"a\": \"\t\"}", "{\"a\": \"\\ud800\"}", "{\"a\": \"",
-             "{\"a\": tru", zero, "{\"a\": \"" + zero + "\"}", "\xef\xbb\xbf{}", "\xff\xfe{\0}\0"}) {
-        const TempFolder folder;
+    for (const std::string& text : std::vector<std::string>{"",
+                                                            "  ",
+                                                            "{} x",
+                                                            "{}{}",
+                                                            "{]",
+                                                            "[1,]",
+                                                            "{\"a\": NaN}",
+                                                            "{\"a\": Infinity}",
+                                                            "{\"a\": 1e400}",
+                                                            "{\"a\": 01}",
+                                                            "{'a': 1}",
+                                                            "{\"a\": 1,}",
+                                                            "{/**/}",
+                                                            "{\"a\": \"\t\"}",
+                                                            "{\"a\": \"\\ud800\"}",
+                                                            "{\"a\": \"",
+                                                            "{\"a\": tru",
+                                                            zero,
+                                                            "{\"a\": \"" + zero + "\"}",
+                                                            "\xef\xbb\xbf{}",
+                                                            "\xff\xfe{\0}\0"}) {
+        const TestFolder folder;
         expectRefused(folder.write("file.json", text), parseError);
     }
 }
 
 TEST(JsonFiles, RootsThatAreNoObjectsAreRefusedInSilence) {
-    const TempFolder folder;
+    const TestFolder folder;
     for (const char* text : {"[]", "[{}]", "null", "3", "\"{}\"", "true"}) {
         expectRefused(folder.write("file.json", text), "");
     }
@@ -88,15 +106,17 @@ TEST(JsonFiles, NestingIsNotLimited) {
         objects += "{\"\":";
     }
     expectAccepted(objects + "0" + std::string(depth, '}'));
-    const TempFolder folder;
+    const TestFolder folder;
     expectRefused(folder.write("file.json", std::string(depth, '[')), parseError);
 }
 
-TEST(JsonFiles, TextBehindAZeroByteIsNotSeen) { expectAccepted("{}" + std::string("\0x", 2)); }
+TEST(JsonFiles, TextBehindAZeroByteIsNotSeen) {
+    expectAccepted("{}" + std::string("\0x", 2));
+}
 
 TEST(JsonFiles, SizeLimits) {
     // sparse files of zero bytes: what is read at all gives a parse error at once
-    const TempFolder folder;
+    const TestFolder folder;
     const auto path = folder.write("file.json", "");
     ModelMetadata record;
     std::vector<float> values;
@@ -111,6 +131,6 @@ TEST(JsonFiles, SizeLimits) {
         EXPECT_FALSE(reader());
         std::filesystem::resize_file(path, limit + 1);
         EXPECT_FALSE(reader());
-        EXPECT_EQ(out.text(), parseError + ("Error: file is larger than " + std::to_string(limit) + " bytes\n"));
+        EXPECT_EQ(out.take(), parseError + ("Error: file is larger than " + std::to_string(limit) + " bytes\n"));
     }
 }

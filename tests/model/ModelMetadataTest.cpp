@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelMetadata.h"
 
 #include <string>
@@ -15,11 +16,11 @@ namespace {
 
 /// Reads `text` over a record that an earlier model filled; nothing may be printed.
 ModelMetadata read(const std::string& text) {
-    const TempFolder folder;
+    const TestFolder folder;
     ModelMetadata record{true, 11, 12, 13, 14, 15, {16, 17}, SubsetState::Partial, "old tags", "old geometry"};
     StdoutCapture out;
     EXPECT_TRUE(readMetadataFile(record, folder.write("metadata.json", text))) << text;
-    EXPECT_EQ(out.text(), "") << text;
+    EXPECT_EQ(out.take(), "") << text;
     EXPECT_TRUE(record.loaded) << text;
     return record;
 }
@@ -62,8 +63,8 @@ TEST(ModelMetadata, FreshRecordIsNotLoadedAndAllZero) {
 }
 
 TEST(ModelMetadata, CountsThatAreNoUnsignedIntegersGiveTheDefault) {
-    for (const std::string value : {"-1", "1.0", "2e0", "4294967296", "18446744073709551616", "\"2\"", "true", "null",
-                                    "[2]", "{}", "0.5"}) {
+    for (const std::string value :
+         {"-1", "1.0", "2e0", "4294967296", "18446744073709551616", "\"2\"", "true", "null", "[2]", "{}", "0.5"}) {
         std::string text = "{";
         for (const char* key : {"deltaCount", "deltaMode", "smoothingIterations", "affectCount", "fullCount"}) {
             text += '"' + std::string(key) + "\": " + value + ',';
@@ -80,10 +81,10 @@ TEST(ModelMetadata, CountsThatAreNoUnsignedIntegersGiveTheDefault) {
 
 TEST(ModelMetadata, SubsetStateIsExactText) {
     const std::vector<std::pair<std::string, SubsetState>> cases = {
-        {R"("empty")", SubsetState::Empty},          {R"("complete")", SubsetState::Complete},
-        {R"("partial")", SubsetState::Partial},      {R"("Complete")", SubsetState::Unrecognized},
+        {R"("empty")", SubsetState::Empty},           {R"("complete")", SubsetState::Complete},
+        {R"("partial")", SubsetState::Partial},       {R"("Complete")", SubsetState::Unrecognized},
         {R"("partial ")", SubsetState::Unrecognized}, {R"("partial\u0000")", SubsetState::Unrecognized},
-        {R"("")", SubsetState::Unrecognized},        {"3", SubsetState::Unrecognized}};
+        {R"("")", SubsetState::Unrecognized},         {"3", SubsetState::Unrecognized}};
     for (const auto& [value, state] : cases) {
         EXPECT_EQ(read(R"({"subsetState": )" + value + "}").subsetState, state) << value;
     }

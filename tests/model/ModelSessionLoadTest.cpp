@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelSession.h"
 
 #include <string>
@@ -29,7 +30,7 @@ void expectNoSession(const fs::path& path, LoadResult result, const std::string&
     ASSERT_EQ(session.load(testModel("direct"), true), LoadResult::Loaded);
     StdoutCapture out;
     EXPECT_EQ(session.load(path, true), result) << path;
-    EXPECT_EQ(out.text(), result == LoadResult::NotFound ? "" : loadError(path));
+    EXPECT_EQ(out.take(), result == LoadResult::NotFound ? "" : loadError(path));
     EXPECT_THAT(session.errorText(), HasSubstr(reason)) << path;
     EXPECT_EQ(session.lastResult(), result) << path;
     EXPECT_EQ(session.modelPath(), path);
@@ -53,18 +54,23 @@ TEST(ModelSessionLoad, FreshSessionHasNothingToRun) {
     StdoutCapture out;
     EXPECT_EQ(session.inputCount(), 0);
     EXPECT_THAT(session.run(std::vector<float>{1}), IsEmpty());
-    EXPECT_EQ(out.text(), std::string(unsupported) + unsupported);
+    EXPECT_EQ(out.take(), std::string(unsupported) + unsupported);
 }
 
 TEST(ModelSessionLoad, FileTypeIsTheTextFromTheLastDot) {
-    const std::vector<std::pair<std::string, ModelType>> cases = {
-        {"a.pt", ModelType::TorchType},           {"a.onnx.pth", ModelType::TorchType},
-        {".pt", ModelType::TorchType},            {"a.h5", ModelType::H5Type},
-        {"model", ModelType::H5Type},             {"a.ONNX", ModelType::UnrecognizedType},
-        {"a.PT", ModelType::UnrecognizedType},    {"a.onnx ", ModelType::UnrecognizedType},
-        {"a.", ModelType::UnrecognizedType},      {"a.json", ModelType::UnrecognizedType},
-        {".hidden", ModelType::UnrecognizedType}, {"...", ModelType::UnrecognizedType}};
-    const TempFolder folder;
+    const std::vector<std::pair<std::string, ModelType>> cases = {{"a.pt", ModelType::TorchType},
+                                                                  {"a.onnx.pth", ModelType::TorchType},
+                                                                  {".pt", ModelType::TorchType},
+                                                                  {"a.h5", ModelType::H5Type},
+                                                                  {"model", ModelType::H5Type},
+                                                                  {"a.ONNX", ModelType::UnrecognizedType},
+                                                                  {"a.PT", ModelType::UnrecognizedType},
+                                                                  {"a.onnx ", ModelType::UnrecognizedType},
+                                                                  {"a.", ModelType::UnrecognizedType},
+                                                                  {"a.json", ModelType::UnrecognizedType},
+                                                                  {".hidden", ModelType::UnrecognizedType},
+                                                                  {"...", ModelType::UnrecognizedType}};
+    const TestFolder folder;
     for (const auto& [name, type] : cases) {
         ModelSession session;
         const fs::path path = folder.write(name, "");
@@ -74,7 +80,7 @@ TEST(ModelSessionLoad, FileTypeIsTheTextFromTheLastDot) {
         EXPECT_EQ(session.isLoaded(), type != ModelType::UnrecognizedType) << name;
         EXPECT_EQ(session.inputCount(), 0) << name;
         EXPECT_THAT(session.run(std::vector<float>{1}), IsEmpty()) << name;
-        EXPECT_EQ(out.text(), std::string(unsupported) + unsupported) << name;
+        EXPECT_EQ(out.take(), std::string(unsupported) + unsupported) << name;
     }
     // a dot in a folder's name is none of the file's; the folders themselves have no extension
     fs::create_directory(folder / "x.onnx");
@@ -86,7 +92,7 @@ TEST(ModelSessionLoad, FileTypeIsTheTextFromTheLastDot) {
 }
 
 TEST(ModelSessionLoad, NameThatIsOnlyTheExtensionIsAnOnnxFile) {
-    const TempFolder folder;
+    const TestFolder folder;
     copyModel(folder / ".onnx");
     ModelSession session;
     EXPECT_EQ(session.load(folder / ".onnx", true), LoadResult::Loaded);
@@ -94,10 +100,10 @@ TEST(ModelSessionLoad, NameThatIsOnlyTheExtensionIsAnOnnxFile) {
 }
 
 TEST(ModelSessionLoad, MissingFileIsNotFound) {
-    const TempFolder folder;
+    const TestFolder folder;
     const fs::path file = folder.write("file", "");
-    for (const fs::path& path : std::vector<fs::path>{"", folder / "model.onnx", folder / "missing/model.onnx",
-                                                      file / "model.onnx"}) {
+    for (const fs::path& path :
+         std::vector<fs::path>{"", folder / "model.onnx", folder / "missing/model.onnx", file / "model.onnx"}) {
         expectNoSession(path, LoadResult::NotFound, "");
         ModelSession fresh;
         EXPECT_EQ(fresh.load(path, true), LoadResult::NotFound) << path;
@@ -107,7 +113,7 @@ TEST(ModelSessionLoad, MissingFileIsNotFound) {
 }
 
 TEST(ModelSessionLoad, UnansweredFileQueryIsNotLoaded) {
-    const TempFolder folder;
+    const TestFolder folder;
     const fs::path link = folder / "loop.onnx";
     fs::create_symlink(link, link);
     expectNoSession(link, LoadResult::NotLoaded, "Too many levels of symbolic links");
@@ -145,7 +151,7 @@ TEST(ModelSessionLoad, UnusableModelsAreRefused) {
         {"bad_empty", "does not have a graph"}};
     std::size_t files = 0;
     for (const auto& entry : fs::directory_iterator(NW_TEST_MODELS)) {
-        files += entry.path().filename().string().rfind("bad_", 0) == 0 ? 1 : 0;
+        files += entry.path().filename().string().rfind("bad_", 0) == 0 ? 1u : 0u;
     }
     EXPECT_EQ(files, cases.size()) << "a bad model is not in the table";
     for (const auto& [name, reason] : cases) {
@@ -154,7 +160,7 @@ TEST(ModelSessionLoad, UnusableModelsAreRefused) {
 }
 
 TEST(ModelSessionLoad, OnlyRegularFilesReachTheRuntime) {
-    const TempFolder folder;
+    const TestFolder folder;
     fs::create_directory(folder / "folder.onnx");
     ASSERT_EQ(mkfifo((folder / "pipe.onnx").c_str(), 0600), 0);
     expectNoSession(folder / "folder.onnx", LoadResult::Loaded, "not a regular file");
@@ -173,7 +179,7 @@ TEST(ModelSessionLoad, FailedBuildTakesNoInputs) {
 }
 
 TEST(ModelSessionLoad, EqualPathIsLoadedAgainOnlyByForce) {
-    const TempFolder folder;
+    const TestFolder folder;
     const fs::path path = folder / "model.onnx";
     ModelSession session;
     EXPECT_EQ(session.load(path, false), LoadResult::NotFound);
@@ -212,9 +218,9 @@ TEST(ModelSessionLoad, ResetKeepsTypeAndShapes) {
 }
 
 TEST(ModelSessionLoad, PathsAreBytes) {
-    const TempFolder folder;
-    for (const char* name : {"with space.onnx", "\xc3\xa9\xe6\x89\x8b \xf0\x9f\x96\x90.onnx", "\xff\xfe not UTF-8.onnx",
-                             "%s%n.onnx"}) {
+    const TestFolder folder;
+    for (const char* name :
+         {"with space.onnx", "\xc3\xa9\xe6\x89\x8b \xf0\x9f\x96\x90.onnx", "\xff\xfe not UTF-8.onnx", "%s%n.onnx"}) {
         copyModel(folder / name);
         ModelSession session;
         EXPECT_EQ(session.load(folder / name, true), LoadResult::Loaded) << name;

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelSession.h"
 
 #include <limits>
@@ -103,7 +104,7 @@ TEST(ModelSessionRun, FailureInTheRuntimeGivesNothingAndIsOver) {
     load(session, "data_dependent"); // two positive values make two outputs where three are declared
     StdoutCapture out;
     EXPECT_THAT(session.run(std::vector<float>{1, -1, 2}), IsEmpty());
-    EXPECT_EQ(out.text(), "");
+    EXPECT_EQ(out.take(), "");
     EXPECT_THAT(session.errorText(), testing::Not(IsEmpty()));
     EXPECT_TRUE(session.isLoaded());
     EXPECT_THAT(session.run(std::vector<float>{1, 3, 2}), ElementsAre(1.f, 3.f, 2.f));

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/PrincipalShapes.h"
 
 #include <string>
@@ -22,12 +23,12 @@ struct Shapes {
 };
 
 Shapes read(const std::string& text) {
-    const TempFolder folder;
+    const TestFolder folder;
     const auto path = folder.write("principal_shapes.json", text);
     Shapes shapes;
     StdoutCapture out;
     shapes.ok = readPrincipalShapesFile(path, shapes.values, shapes.shapeCount, shapes.vertCount);
-    shapes.output = out.text();
+    shapes.output = out.take();
     return shapes;
 }
 
@@ -50,8 +51,8 @@ TEST(PrincipalShapes, AreStoredByVertexThenShape) {
 }
 
 TEST(PrincipalShapes, NumbersAreRoundedToFloat) {
-    const Shapes shapes = read(withShapes("[[16777217, 18446744073709551616, 3.4028235677973362e38, 1e-60, -0, -5]]",
-                                          1, 2));
+    const Shapes shapes =
+        read(withShapes("[[16777217, 18446744073709551616, 3.4028235677973362e38, 1e-60, -0, -5]]", 1, 2));
     EXPECT_THAT(shapes.values, ElementsAre(16777216.f, 0x1p64f, 0x1.fffffep127f, 0.f, 0.f, -5.f));
 }
 

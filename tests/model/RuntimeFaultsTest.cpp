@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How a session uses the runtime, and what it does when a call fails: this program's own OrtGetApiBase stands before
 // the library's and hands out a table that counts, and fails on demand. The table ends with version 16: a newer
 // function would be a null pointer.
@@ -79,8 +80,8 @@ OrtApi makeTable() {
          &OrtApi::SessionGetOutputName, &OrtApi::SessionGetInputTypeInfo, &OrtApi::SessionGetOutputTypeInfo,
          &OrtApi::CastTypeInfoToTensorInfo, &OrtApi::GetDimensionsCount, &OrtApi::GetDimensions,
          &OrtApi::CreateCpuMemoryInfo, &OrtApi::CreateTensorWithDataAsOrtValue, &OrtApi::Run>(api);
-    hookReleases<&OrtApi::ReleaseEnv, &OrtApi::ReleaseSession, &OrtApi::ReleaseSessionOptions,
-                 &OrtApi::ReleaseTypeInfo, &OrtApi::ReleaseMemoryInfo, &OrtApi::ReleaseValue>(api);
+    hookReleases<&OrtApi::ReleaseEnv, &OrtApi::ReleaseSession, &OrtApi::ReleaseSessionOptions, &OrtApi::ReleaseTypeInfo,
+                 &OrtApi::ReleaseMemoryInfo, &OrtApi::ReleaseValue>(api);
     return api;
 }
 
@@ -92,13 +93,12 @@ const OrtApi* getApi(std::uint32_t version) noexcept {
 
 /// Objects made and not yet released, of every kind.
 int liveObjects() {
-    return Hook<&OrtApi::CreateEnv>::calls - Release<&OrtApi::ReleaseEnv>::calls +
-           Hook<&OrtApi::CreateSession>::calls - Release<&OrtApi::ReleaseSession>::calls +
-           Hook<&OrtApi::CreateSessionOptions>::calls - Release<&OrtApi::ReleaseSessionOptions>::calls +
-           Hook<&OrtApi::SessionGetInputTypeInfo>::calls + Hook<&OrtApi::SessionGetOutputTypeInfo>::calls -
-           Release<&OrtApi::ReleaseTypeInfo>::calls + Hook<&OrtApi::CreateCpuMemoryInfo>::calls -
-           Release<&OrtApi::ReleaseMemoryInfo>::calls + Hook<&OrtApi::CreateTensorWithDataAsOrtValue>::calls -
-           Release<&OrtApi::ReleaseValue>::calls;
+    return Hook<&OrtApi::CreateEnv>::calls - Release<&OrtApi::ReleaseEnv>::calls + Hook<&OrtApi::CreateSession>::calls -
+           Release<&OrtApi::ReleaseSession>::calls + Hook<&OrtApi::CreateSessionOptions>::calls -
+           Release<&OrtApi::ReleaseSessionOptions>::calls + Hook<&OrtApi::SessionGetInputTypeInfo>::calls +
+           Hook<&OrtApi::SessionGetOutputTypeInfo>::calls - Release<&OrtApi::ReleaseTypeInfo>::calls +
+           Hook<&OrtApi::CreateCpuMemoryInfo>::calls - Release<&OrtApi::ReleaseMemoryInfo>::calls +
+           Hook<&OrtApi::CreateTensorWithDataAsOrtValue>::calls - Release<&OrtApi::ReleaseValue>::calls;
 }
 
 /// Makes the next call of one entry fail. The entry counts as not called then: it made no object.
@@ -124,8 +124,12 @@ void* operator new(std::size_t size) {
     }
     return block;
 }
-void operator delete(void* block) noexcept { std::free(block); }
-void operator delete(void* block, std::size_t) noexcept { std::free(block); }
+void operator delete(void* block) noexcept {
+    std::free(block);
+}
+void operator delete(void* block, std::size_t) noexcept {
+    std::free(block);
+}
 
 TEST(RuntimeFaults, TableOfVersion16IsAskedForOnce) {
     ModelSession first;
@@ -134,7 +138,7 @@ TEST(RuntimeFaults, TableOfVersion16IsAskedForOnce) {
 }
 
 TEST(RuntimeFaults, AllocatorFailureLeavesTheConstructor) {
-    Hook<&OrtApi::GetAllocatorWithDefaultOptions>::failures = 1;
+    Hook<& OrtApi::GetAllocatorWithDefaultOptions>::failures = 1;
     EXPECT_THROW(ModelSession(), std::exception);
     EXPECT_NO_THROW(ModelSession());
 }
@@ -163,7 +167,7 @@ TEST(RuntimeFaults, EveryStepOfALoadCanFail) {
         steps[step]();
         StdoutCapture out;
         EXPECT_EQ(session.load(testModel("direct"), true), LoadResult::Loaded) << step;
-        EXPECT_EQ(out.text(),
+        EXPECT_EQ(out.take(),
                   "[NEURAL WARP] ERROR, Failed to load the ONNX model " + testModel("direct").string() + "\n");
         EXPECT_EQ(session.errorText(), "armed") << step;
         EXPECT_FALSE(session.isLoaded()) << step;
@@ -179,8 +183,8 @@ TEST(RuntimeFaults, EveryStepOfARunCanFail) {
     {
         ModelSession session;
         session.load(testModel("direct"), true);
-        for (const auto& step : {arm<&OrtApi::CreateCpuMemoryInfo>, arm<&OrtApi::CreateTensorWithDataAsOrtValue>,
-                                 arm<&OrtApi::Run>}) {
+        for (const auto& step :
+             {arm<&OrtApi::CreateCpuMemoryInfo>, arm<&OrtApi::CreateTensorWithDataAsOrtValue>, arm<&OrtApi::Run>}) {
             step();
             EXPECT_THAT(session.run(std::vector<float>(7)), IsEmpty());
             EXPECT_EQ(session.errorText(), "armed");

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What a session does with a runtime that does not offer the function table it asks for: this program's own
 // OrtGetApiBase stands before the library's.
 #include <gmock/gmock.h>
@@ -19,7 +20,7 @@ TEST(RuntimeTooOld, EveryOnnxLoadFailsWithItsLine) {
     const std::filesystem::path model = testModel("direct");
     StdoutCapture out;
     EXPECT_EQ(session.load(model, true), LoadResult::Loaded);
-    EXPECT_EQ(out.text(), "[NEURAL WARP] ERROR, Failed to load the ONNX model " + model.string() + "\n");
+    EXPECT_EQ(out.take(), "[NEURAL WARP] ERROR, Failed to load the ONNX model " + model.string() + "\n");
     EXPECT_EQ(session.errorText(), "ONNX Runtime is older than version 1.16");
     EXPECT_FALSE(session.isLoaded());
     EXPECT_EQ(session.inputCount(), 0);
