@@ -6,10 +6,9 @@
 // outcome of the runtime breaks a promise of ModelSession. It needs no flags; -close_fd_mask=2 hides the runtime's own
 // warnings.
 #include "modelTargets.h"
-#include "support/limitedNew.h"
 
 // A model may ask for any amount of memory. malloc then returns null, as it would without a sanitizer, well below the
-// fuzzer's own limit; and operator new throws.
+// fuzzer's own limit; and operator new throws (support/limitedNew.cpp).
 extern "C" const char* __asan_default_options() {
     return "allocator_may_return_null=1:max_allocation_size_mb=512";
 }
