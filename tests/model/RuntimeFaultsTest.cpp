@@ -3,10 +3,8 @@
 // the library's and hands out a table that counts, and fails on demand. The table ends with version 16: a newer
 // function would be a null pointer.
 #include <cstddef>
-#include <cstdlib>
 #include <cstring>
 #include <functional>
-#include <new>
 #include <vector>
 
 #include <dlfcn.h>
@@ -15,6 +13,7 @@
 
 #include "nw_model/ModelSession.h"
 #include "support.h"
+#include "support/limitedNew.h"
 
 using namespace neuralWarp;
 using testing::IsEmpty;
@@ -108,27 +107,11 @@ void arm() {
     --Hook<Entry>::calls;
 }
 
-std::size_t refusedAllocation = SIZE_MAX; // smallest size that operator new refuses
-
 } // namespace
 
 const OrtApiBase* ORT_API_CALL OrtGetApiBase() noexcept {
     static const OrtApiBase base = {&getApi, []() noexcept { return "1.16.0"; }};
     return &base;
-}
-
-void* operator new(std::size_t size) {
-    void* block = size >= refusedAllocation ? nullptr : std::malloc(size);
-    if (block == nullptr) {
-        throw std::bad_alloc();
-    }
-    return block;
-}
-void operator delete(void* block) noexcept {
-    std::free(block);
-}
-void operator delete(void* block, std::size_t) noexcept {
-    std::free(block);
 }
 
 TEST(RuntimeFaults, TableOfVersion16IsAskedForOnce) {
