@@ -9,23 +9,23 @@
 
 namespace quill {
 
-// The polygon structure of a mesh. Filled by whoever reads the mesh; the code that walks it trusts nothing in it.
+/// The polygon structure of a mesh. Filled by whoever reads the mesh; the code that walks it trusts nothing in it.
 struct MeshTopology {
-    // [polygonCount + 1] polygon p's first corner in polygonVertices; the last entry is the total number of corners.
+    /// [polygonCount + 1] polygon p's first corner in polygonVertices; the last entry is the total number of corners.
     std::vector<std::uint32_t> polygonOffsets;
-    // Vertex indices (of the full mesh) of all corners, polygon after polygon, each in its winding order.
+    /// Vertex indices (of the full mesh) of all corners, polygon after polygon, each in its winding order.
     std::vector<std::uint32_t> polygonVertices;
     std::size_t polygonCount = 0;
-    // The mesh's vertex count as its owner reports it; the walk below does not use it.
+    /// The mesh's vertex count as its owner reports it; the walk below does not use it.
     int vertexCount = 0;
-    // Set once the record is filled.
+    /// Set once the record is filled.
     bool valid = false;
 };
 
-// Calls visit(corners) for each polygon in order, corners being a span of full vertex indices, never empty.
-// Ill-formed records are safe and cost no more than their size: polygons beyond the stored offsets, polygons whose
-// offsets do not ascend, that reach back into a polygon before them or that begin past the stored corners are skipped;
-// a polygon that ends past the stored corners is cut there. The vertex indices themselves are not checked.
+/// Calls visit(corners) for each polygon in order, corners being a span of full vertex indices, never empty.
+/// Ill-formed records are safe and cost no more than their size: polygons beyond the stored offsets, polygons whose
+/// offsets do not ascend, that reach back into a polygon before them or that begin past the stored corners are skipped;
+/// a polygon that ends past the stored corners is cut there. The vertex indices themselves are not checked.
 template <typename Visit>
 void forEachPolygon(const MeshTopology& topology, const Visit& visit) {
     const auto& offsets = topology.polygonOffsets;

@@ -12,59 +12,60 @@
 
 namespace quill {
 
-// Which neighbours define the local frame of each vertex of a mesh, in affected index space, and the frames measured
-// on given positions. A frame's rows are X, Y, Z (the normal) and the vertex position; the basis is left-handed
-// (X x Y = -Z), object space. A vertex on no polygon of three or more affected corners has the identity at its
-// position. Const members may run at the same time on different arrays; build() may not run beside anything.
+/// Which neighbours define the local frame of each vertex of a mesh, in affected index space, and the frames measured
+/// on given positions. A frame's rows are X, Y, Z (the normal) and the vertex position; the basis is left-handed
+/// (X x Y = -Z), object space. A vertex on no polygon of three or more affected corners has the identity at its
+/// position. Const members may run at the same time on different arrays; build() may not run beside anything.
 class VertexFrames {
 public:
-    // Replaces both tables: one corner pair (a, b) per polygon corner at a vertex, whose share of the vertex normal is
-    // cross(P[a] - P[i], P[b] - P[i]). The first entry of a vertex's first pair is its tangent reference, an edge
-    // neighbour whenever one of its pairs begins with one.
-    //   topology   not trusted; see forEachPolygon for what is skipped. A corner that is not below the map's full count
-    //              is not affected; a polygon's unaffected corners are left out of it.
-    //   map        full to affected indices; its reverse table is built here when it was not yet
-    //   positions  null, or rest points [map.affectCount()]: each corner then takes the two other corners of the
-    //   polygon
-    //              that span the largest area with it, the next and previous corner counting double. Shorter arrays
-    //              count as null.
-    // Runs on the calling thread, in O(corners) for polygons of bounded size and O(m^3) in a polygon of m corners.
-    // Throws std::length_error above 2^31 - 1 corners or vertices, std::bad_alloc; the tables are then as before.
+    /// Replaces both tables: one corner pair (a, b) per polygon corner at a vertex, whose share of the vertex normal is
+    /// cross(P[a] - P[i], P[b] - P[i]). The first entry of a vertex's first pair is its tangent reference, an edge
+    /// neighbour whenever one of its pairs begins with one.
+    ///   topology   not trusted; see forEachPolygon for what is skipped. A corner that is not below the map's full
+    ///   count
+    ///              is not affected; a polygon's unaffected corners are left out of it.
+    ///   map        full to affected indices; its reverse table is built here when it was not yet
+    ///   positions  null, or rest points [map.affectCount()]: each corner then takes the two other corners of the
+    ///   polygon
+    ///              that span the largest area with it, the next and previous corner counting double. Shorter arrays
+    ///              count as null.
+    /// Runs on the calling thread, in O(corners) for polygons of bounded size and O(m^3) in a polygon of m corners.
+    /// Throws std::length_error above 2^31 - 1 corners or vertices, std::bad_alloc; the tables are then as before.
     void build(const MeshTopology& topology, const IndexMapper& map, const std::vector<val3<float>>* positions);
 
-    // The corner pairs of all vertices, one after another, two entries per pair.
+    /// The corner pairs of all vertices, one after another, two entries per pair.
     const std::vector<std::uint32_t>& framesPairs() const { return framesPairs_; }
-    // [affectCount + 1] vertex i's pairs are the entries framesPairs()[indexer[i] .. indexer[i + 1]); empty before
-    // build.
+    /// [affectCount + 1] vertex i's pairs are the entries framesPairs()[indexer[i] .. indexer[i + 1]); empty before
+    /// build.
     const std::vector<std::uint32_t>& framesIndexer() const { return framesIndexer_; }
-    // Number of vertices the tables were built for; every entry of framesPairs() is below it.
+    /// Number of vertices the tables were built for; every entry of framesPairs() is below it.
     std::size_t vertexCount() const { return framesIndexer_.empty() ? 0 : framesIndexer_.size() - 1; }
 
-    // Writes the frames of the listed vertices.
-    //   frames     in and out; grown (by identities) to map.affectCount(), never shrunk. Others keep their values.
-    //   positions  points [map.affectCount()] to measure on, object space
-    //   invert     store each frame's inverse (Gauss-Jordan) instead
-    //   subset     null for every vertex, or affected indices, none twice
-    // A vertex that is not below map.affectCount() and positions.size() is left out; if positions are fewer than
-    // vertexCount(), all are. The result is the same for every number of threads.
+    /// Writes the frames of the listed vertices.
+    ///   frames     in and out; grown (by identities) to map.affectCount(), never shrunk. Others keep their values.
+    ///   positions  points [map.affectCount()] to measure on, object space
+    ///   invert     store each frame's inverse (Gauss-Jordan) instead
+    ///   subset     null for every vertex, or affected indices, none twice
+    /// A vertex that is not below map.affectCount() and positions.size() is left out; if positions are fewer than
+    /// vertexCount(), all are. The result is the same for every number of threads.
     void calculateFrames(std::vector<mat4d>& frames, const std::vector<val3<float>>& positions, const IndexMapper& map,
                          bool invert, const std::vector<std::uint32_t>* subset) const;
 
-    // The same with normals smoothed first: in each of normalIterations passes, the normal of every listed vertex with
-    // connections becomes the normalised sum of itself and its neighbours' normals times their weights.
-    //   connectionsIndexer, connections, weights   as VertexConnections has them; not trusted: entries outside the
-    //                                              arrays, and neighbours without a normal, are left out
-    // Allocates two arrays of normals.
+    /// The same with normals smoothed first: in each of normalIterations passes, the normal of every listed vertex with
+    /// connections becomes the normalised sum of itself and its neighbours' normals times their weights.
+    ///   connectionsIndexer, connections, weights   as VertexConnections has them; not trusted: entries outside the
+    ///                                              arrays, and neighbours without a normal, are left out
+    /// Allocates two arrays of normals.
     void calculateFrames(std::vector<mat4d>& frames, const std::vector<val3<float>>& positions,
                          const std::vector<std::uint32_t>& connectionsIndexer,
                          const std::vector<std::uint32_t>& connections, const std::vector<float>& weights,
                          std::size_t normalIterations, const IndexMapper& map, bool invert,
                          const std::vector<std::uint32_t>* subset) const;
 
-    // out[i] = points[i] in the local coordinates of the frame of vertex i on positions.
-    //   positions  [vertexCount()] object space
-    //   points     any number; those from positions.size() on, or all if positions are too few, give zero
-    //   out        resized to points.size()
+    /// out[i] = points[i] in the local coordinates of the frame of vertex i on positions.
+    ///   positions  [vertexCount()] object space
+    ///   points     any number; those from positions.size() on, or all if positions are too few, give zero
+    ///   out        resized to points.size()
     void calculateDisplacements(const std::vector<val3<float>>& positions, const std::vector<val3<float>>& points,
                                 std::vector<val3<float>>& out) const;
 
@@ -72,7 +73,7 @@ private:
     bool hasPairs(std::size_t vertex) const {
         return vertex < vertexCount() && framesIndexer_[vertex] != framesIndexer_[vertex + 1];
     }
-    // The unit normal of a vertex; zero when it has no pairs.
+    /// The unit normal of a vertex; zero when it has no pairs.
     val3<float> normalOf(std::size_t vertex, const std::vector<val3<float>>& positions) const;
     mat4d frameOf(std::size_t vertex, const val3<float>& normal, const std::vector<val3<float>>& positions) const;
 
@@ -80,8 +81,8 @@ private:
     std::vector<std::uint32_t> framesIndexer_;
 };
 
-// Carries a rest point moved by its delta from the rest surface to the current one: into the local coordinates of the
-// rest frame (narrowed to float there) and out through the current frame. Object space in and out.
+/// Carries a rest point moved by its delta from the rest surface to the current one: into the local coordinates of the
+/// rest frame (narrowed to float there) and out through the current frame. Object space in and out.
 inline val3<float> transportDelta(const val3<float>& restPoint, const val3<float>& delta, const mat4d& restFrameInverse,
                                   const mat4d& currentFrame) {
     return transformAsPoint(transformAsPoint(restPoint + delta, restFrameInverse), currentFrame);

@@ -8,9 +8,9 @@
 
 namespace quill {
 
-// A vector or point of three components, stored contiguously as x, y, z: an array of val3<float> is a packed run of
-// floats x0, y0, z0, x1, y1, z1, ... Every operation is carried out in the component type T, without fused steps.
-// No operation fails or throws; all are safe on any thread.
+/// A vector or point of three components, stored contiguously as x, y, z: an array of val3<float> is a packed run of
+/// floats x0, y0, z0, x1, y1, z1, ... Every operation is carried out in the component type T, without fused steps.
+/// No operation fails or throws; all are safe on any thread.
 template <typename T>
 struct val3 {
     static_assert(std::is_floating_point_v<T>);
@@ -25,7 +25,7 @@ struct val3 {
         , y(yIn)
         , z(zIn) {}
 
-    // Component 0, 1 or 2 (x, y, z). Any other index is a caller's error and reads z.
+    /// Component 0, 1 or 2 (x, y, z). Any other index is a caller's error and reads z.
     constexpr T& operator[](std::size_t i) { return i == 0 ? x : i == 1 ? y : z; }
     constexpr const T& operator[](std::size_t i) const { return i == 0 ? x : i == 1 ? y : z; }
 
@@ -47,7 +47,7 @@ struct val3 {
         z *= s;
         return *this;
     }
-    // Divides each component (never by a reciprocal, which would round differently).
+    /// Divides each component (never by a reciprocal, which would round differently).
     constexpr val3& operator/=(T s) {
         x /= s;
         y /= s;
@@ -66,8 +66,8 @@ struct val3 {
     constexpr T squaredLength() const { return x * x + y * y + z * z; }
     T length() const { return std::sqrt(squaredLength()); }
 
-    // Scales to unit length. A vector whose squared length is not above 1e-20 (in T) stays as it is, so that a zero
-    // vector never becomes NaN.
+    /// Scales to unit length. A vector whose squared length is not above 1e-20 (in T) stays as it is, so that a zero
+    /// vector never becomes NaN.
     void normalize() {
         const T s = squaredLength();
         if (s > static_cast<T>(1e-20))
@@ -90,13 +90,13 @@ T length(const val3<T>& a) {
     return a.length();
 }
 
-// True when |a - b| <= tolerance. NaN is equivalent to nothing.
+/// True when |a - b| <= tolerance. NaN is equivalent to nothing.
 constexpr bool equivalent(double a, double b, double tolerance) {
     const double difference = a - b;
     return difference <= tolerance && -difference <= tolerance;
 }
 
-// Writes "[x, y, z]" in the stream's own number format.
+/// Writes "[x, y, z]" in the stream's own number format.
 template <typename T>
 std::ostream& operator<<(std::ostream& out, const val3<T>& a) {
     return out << '[' << a.x << ", " << a.y << ", " << a.z << ']';

@@ -1,0 +1,116 @@
+// SPDX-License-Identifier: Apache-2.0
+// The same bits from 1, 2 and 7 threads and from run to run, on meshes large enough to be cut among them.
+#include "support/meshZoo.h"
+
+#include "quill/VertexConnections.h"
+#include "quill/VertexFrames.h"
+#include "quill/bulk.h"
+#include "quill/parallelFor.h"
+
+#include <gtest/gtest.h>
+
+#include <tbb/global_control.h>
+#include <tbb/task_arena.h>
+
+#include <atomic>
+#include <chrono>
+#include <cmath>
+#include <cstdint>
+#include <mutex>
+#include <set>
+#include <thread>
+
+namespace {
+
+using Points = std::vector<quill::val3<float>>;
+
+// FNV-1a, 64 bits.
+template <typename T>
+void hash(std::uint64_t& state, const std::vector<T>& values) {
+    const auto* bytes = reinterpret_cast<const unsigned char*>(values.data());
+    for (std::size_t i = 0; i < values.size() * sizeof(T); ++i)
+        state = (state ^ bytes[i]) * 1099511628211ULL;
+}
+
+// Every parallel operation of the library on one mesh, hashed.
+std::uint64_t hashEverything(const ZooMesh& mesh) {
+    std::uint64_t state = 14695981039346656037ULL;
+    quill::IndexMapper map;
+    map.setIdentity(mesh.vertexCount());
+    quill::VertexConnections connections;
+    connections.build(mesh.topology(), map, 0, false);
+    hash(state, connections.connections());
+    std::vector<float> weights;
+    connections.calculateConnectionWeights(weights, mesh.points, 1.3, 0.0);
+    hash(state, weights);
+    Points smoothed = mesh.points, scratch;
+    connections.mushArray(smoothed, scratch, 7, 0.9F, nullptr, &weights, false);
+    hash(state, smoothed);
+
+    quill::VertexFrames vertexFrames;
+    vertexFrames.build(mesh.topology(), map, &mesh.points);
+    std::vector<quill::mat4d> frames, smoothFrames;
+    vertexFrames.calculateFrames(frames, smoothed, map, true, nullptr);
+    vertexFrames.calculateFrames(smoothFrames, smoothed, connections.connectionsIndexer(), connections.connections(),
+                                 weights, 2, map, false, nullptr);
+    vertexFrames.calculateDisplacements(mesh.points, smoothed, scratch);
+    hash(state, scratch);
+    quill::multAsPoint(smoothed, frames[17]);
+    quill::multFrames(frames, smoothFrames[3]);
+    quill::invertFrames(smoothFrames);
+    std::vector<float> floats;
+    quill::convertToFloatArray(frames, floats);
+    hash(state, smoothed);
+    hash(state, floats);
+    hash(state, smoothFrames);
+    return state;
+}
+
+// How many threads take part in one of the library's loops. Each part of the range waits, for a bounded time, until a
+// second thread has come, so that the count does not depend on how busy the machine is.
+std::size_t threadsInALoop() {
+    std::mutex mutex;
+    std::set<std::thread::id> threads;
+    std::atomic<bool> enough = false;
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    quill::parallelFor(1000, [&](std::size_t) {
+        {
+            const std::lock_guard lock(mutex);
+            threads.insert(std::this_thread::get_id());
+            enough = enough || threads.size() > 1;
+        }
+        while (!enough && std::chrono::steady_clock::now() < deadline)
+            std::this_thread::yield();
+    });
+    return threads.size();
+}
+
+TEST(Determinism, EqualBitsForEveryNumberOfThreadsAndEveryRun) {
+    const ZooMesh grid = makeGrid(400, 300);
+    for (const ZooMesh& mesh : {grid, shuffled(grid, 9)}) {
+        ASSERT_GE(mesh.vertexCount(), 100000U);
+        std::set<std::uint64_t> hashes;
+        for (const std::size_t threads : {1U, 2U, 7U}) {
+            const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
+            tbb::task_arena arena(static_cast<int>(threads)); // more slots than cores, if need be
+            arena.execute([&] {
+                if (threads > 1) {
+                    EXPECT_GE(threadsInALoop(), 2U) << "the comparison would compare one thread with itself";
+                }
+                hashes.insert(hashEverything(mesh));
+                hashes.insert(hashEverything(mesh));
+            });
+        }
+        EXPECT_EQ(hashes.size(), 1U) << mesh.name;
+    }
+}
+
+TEST(Determinism, TheHashSeesASingleBit) {
+    ZooMesh grid = makeGrid(20, 20);
+    const std::uint64_t before = hashEverything(grid);
+    EXPECT_EQ(hashEverything(grid), before);
+    grid.points[211].z = std::nextafter(grid.points[211].z, 1.0F);
+    EXPECT_NE(hashEverything(grid), before);
+}
+
+} // namespace
