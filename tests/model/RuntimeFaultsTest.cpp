@@ -13,7 +13,6 @@
 
 #include "nw_model/ModelSession.h"
 #include "support.h"
-#include "support/limitedNew.h"
 
 using namespace neuralWarp;
 using testing::IsEmpty;
@@ -175,17 +174,6 @@ TEST(RuntimeFaults, EveryStepOfARunCanFail) {
         }
     }
     EXPECT_EQ(liveObjects(), before);
-}
-
-TEST(RuntimeFaults, NoMemoryForTheResult) {
-    ModelSession session;
-    session.load(testModel("wide"), true);
-    const std::vector<float> inputs = {1};
-    refusedAllocation = 3000 * sizeof(float);
-    const std::vector<float> outputs = session.run(inputs);
-    refusedAllocation = SIZE_MAX;
-    EXPECT_THAT(outputs, IsEmpty());
-    EXPECT_EQ(session.run(inputs).size(), 3000u);
 }
 
 TEST(RuntimeFaults, NamesAndShapesAreReadOncePerLoad) {

@@ -80,7 +80,7 @@ def refused():
 
     # output shapes that depend on data, so that the declaration is all the runtime knows
     selected = [node("NonZero", ["x"], ["i"]), node("Cast", ["i"], ["y"], to=FLOAT)]
-    for name, shape in [("symbolic", [1, "n"]), ("zero", [1, 0]), ("negative", [1, -1]), ("overflow", [65536, 32768])]:
+    for name, shape in [("symbolic", [1, "n"]), ("zero", [0, 3]), ("negative", [1, -1]), ("overflow", [65536, 32768])]:
         write("bad_output_" + name, selected, [tensor("x", [3])], [tensor("y", shape)])
     write("bad_output_scalar", [node("ReduceMax", ["x"], ["y"], keepdims=0)], [tensor("x", [3])], [tensor("y", [])])
     # which dimensions go depends on data, so the runtime cannot infer even their number
