@@ -27,5 +27,9 @@ function(nw_target target)
     target_compile_options(${target} PRIVATE
       -fsanitize=${NW_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
     target_link_options(${target} PRIVATE -fsanitize=${NW_SANITIZE})
+    if(NW_SANITIZE MATCHES undefined AND CMAKE_CXX_COMPILER_ID MATCHES Clang)
+      target_compile_options(${target} PRIVATE
+        -fsanitize-ignorelist=${PROJECT_SOURCE_DIR}/tests/sanitizers/ubsan.ignorelist)
+    endif()
   endif()
 endfunction()
