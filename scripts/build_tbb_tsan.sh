@@ -50,7 +50,7 @@ configure_build_install() {
   cmake -S "${source[0]}" -B "$scratch/build" -G Ninja -DCMAKE_BUILD_TYPE=RelWithDebInfo \
     -DCMAKE_CXX_COMPILER=clang++-14 -DCMAKE_C_COMPILER=clang-14 -DCMAKE_INSTALL_PREFIX="$scratch/install" \
     -DCMAKE_INSTALL_LIBDIR=lib -DTBB_SANITIZE=thread -DTBB_TEST=OFF -DTBB_STRICT=OFF -DTBBMALLOC_BUILD=OFF &&
-    cmake --build "$scratch/build" --parallel "$(jobs)" &&
+    cmake --build "$scratch/build" --parallel "$(job_count)" &&
     cmake --install "$scratch/build"
 }
 
@@ -67,16 +67,16 @@ unpack() {
   staging=$(mktemp -d build/deps/tbb-tsan.XXXXXX)
   tar -xzf "$1" -C "$staging" || { rm -rf "$staging" "$1"; return 1; }
   chmod u+rwX,go+rX "$staging"
+  printf '%s\n' "$name" >"$staging/stamp"
   publish_folder "$staging" "$target"
 }
-
-[[ -e $target/lib/libtbb.so ]] && exit 0
 
 need_packages clang-14 libclang-rt-14-dev cmake ninja-build libtbb-dev dpkg-dev
 version=$(dpkg-query -W -f '${source:Version}' libtbb-dev 2>/dev/null) ||
   fail "the thread sanitizer's oneTBB is built from Debian's source package, and this machine has no dpkg"
-compiler=$(clang++-14 -dumpversion)
-archive=$(cache_folder)/tbb-tsan-$version-clang-$compiler.tar.gz
+name=tbb-tsan-$version-clang-$(clang++-14 -dumpversion)
+[[ -e $target/stamp && $(<"$target/stamp") == "$name" ]] && exit 0
+archive=$(cache_folder)/$name.tar.gz
 if [[ -e $archive ]]; then
   say "taking oneTBB for the thread sanitizer from $archive"
   unpack "$archive" && exit 0

@@ -36,13 +36,13 @@ changed_files() {
   fi
 }
 
-# A header has no compile command of its own: the translation unit that compiles it alone stands for it.
+# A header has no compile command of its own: the unit that compiles it alone, or the source beside it, stands for it.
 translation_units() {
   local file
   while read -r file; do
     case $file in
       *.cpp) printf '%s/%s\n' "$PWD" "$file" ;;
-      *.h) find build/asan/tests/house/headers -path "*/${file//[\/]/_}.cpp" -printf "$PWD/%p\n" 2>/dev/null || true ;;
+      *.h) printf '%s\n' "$PWD/build/asan/tests/house/headers/${file//\//_}.cpp" "$PWD/${file%.h}.cpp" ;;
     esac
   done | sort -u >"$1.wanted"
   sed -n 's/^ *"file": "\(.*\)".*/\1/p' build/asan/compile_commands.json | sort -u >"$1.known"
@@ -63,7 +63,7 @@ check_tidy() {
   say "static analysis: ${#units[@]} translation units"
   ((${#units[@]})) || return 0
   # findings come on standard output; standard error counts those in system headers, and says what went wrong
-  printf '%s\0' "${units[@]}" | xargs -0 -n 1 -P "$(jobs)" clang-tidy-14 --quiet -p build/asan 2>build/tidy.log || {
+  printf '%s\0' "${units[@]}" | xargs -0 -n 1 -P "$(job_count)" clang-tidy-14 --quiet -p build/asan 2>build/tidy.log || {
     grep -v ' warnings\? generated' build/tidy.log >&2
     return 1
   }

@@ -10,7 +10,7 @@ fail() {
 
 have() { command -v "$1" >/dev/null 2>&1; }
 
-jobs() { printf '%s' "${NW_JOBS:-$(nproc)}"; }
+job_count() { printf '%s' "${NW_JOBS:-$(nproc)}"; }
 
 # Every Debian package that the project uses, and how its presence is seen: a command on the PATH, or a header
 # (on Debian the package database answers for headers, elsewhere the header itself is looked for).

@@ -55,12 +55,15 @@ unpack() {
   mv "$scratch/$library" "$staging/lib/"
   ln -s libonnxruntime.so "$staging/lib/libonnxruntime.so.1" # its SONAME, which the loader asks for
   mv "$scratch/package/LICENSE" "$staging/"
+  printf '%s\n' "$integrity" >"$staging/stamp"
   chmod -R u+rwX,go+rX "$staging"
   publish_folder "$staging" "$target"
 }
 
 is_given && exit 0
-[[ -e $target/lib/libonnxruntime.so.1 && -e $target/LICENSE ]] && exit 0
+[[ -e $target/stamp && $(<"$target/stamp") == "$integrity" ]] && exit 0
+[[ $(uname -m) == x86_64 ]] ||
+  fail "the pinned ONNX Runtime is for x86-64 processors: set ONNXRUNTIME_ROOT to one for this machine"
 
 cache=$(cache_folder)
 archive=$cache/$package-$version.tgz

@@ -50,7 +50,7 @@ command_fuzz() {
   ((${#programs[@]})) || fail "there is no fuzz target in build/fuzz/tests/fuzz yet"
 
   local i j status at_once=2
-  (($(jobs) > 1)) || at_once=1
+  (($(job_count) > 1)) || at_once=1
   say "fuzzing ${#programs[@]} targets for $seconds s each, $at_once at a time"
   for ((i = 0; i < ${#programs[@]}; i += at_once)); do
     names=() pids=()
