@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelMetadata.h"
 
 #include <algorithm>

@@ -1,8 +1,10 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelSession.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <cstring>
 #include <exception>
 #include <limits>
 #include <optional>
@@ -95,12 +97,16 @@ TensorInfo readInput(const Ort::Session& session, OrtAllocator* allocator) {
     return input;
 }
 
-TensorInfo readOutput(const Ort::Session& session, OrtAllocator* allocator) {
+TensorInfo readOutput(const Ort::Session& session, OrtAllocator* allocator, const char* inputName) {
     if (session.GetOutputCount() == 0) {
         throw std::runtime_error("the model has no output");
     }
     TensorInfo output;
     output.name = session.GetOutputNameAllocated(0, allocator);
+    if (std::strcmp(output.name->get(), inputName) == 0) {
+        // The runtime then reports success and leaves the caller's output array unwritten.
+        throw std::runtime_error("the first output is the input itself");
+    }
     output.shape = usableShape(session.GetOutputTypeInfo(0), "the first output");
     return output;
 }
@@ -161,7 +167,7 @@ void ModelSession::Runtime::build(const std::filesystem::path& path) {
     options.SetGraphOptimizationLevel(ORT_ENABLE_ALL);
     Ort::Session fresh(*env, path.c_str(), options);
     TensorInfo freshInput = readInput(fresh, *allocator);
-    output = readOutput(fresh, *allocator);
+    output = readOutput(fresh, *allocator, freshInput.name->get());
     input = std::move(freshInput);
     session.emplace(std::move(fresh));
 }
@@ -272,7 +278,9 @@ std::int32_t ModelSession::inputCount() const {
         printUnsupportedType();
         return 0;
     }
-    return elementCount(runtime_->input.shape); // one dimension: the count is the dimension
+    // checked at load: one dimension that fits, or no shape at all when that load failed
+    const std::vector<std::int64_t>& shape = runtime_->input.shape;
+    return shape.empty() ? 0 : static_cast<std::int32_t>(shape.front());
 }
 
 std::vector<float> ModelSession::run(std::span<const float> inputs) noexcept {

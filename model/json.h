@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // JSON files of a model directory: opening, parsing and typed member lookup.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The readers of the model directory, from any source of bytes. The file readers open their file and call these.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // neuralWarp model runtime: one network file, loaded and run.
 #pragma once
 
@@ -30,7 +31,9 @@ enum class ModelType : std::int32_t {
 ///
 /// A model can be run when it has exactly one input, float32 of shape [N] with N > 0, and at least one output, the
 /// first of which is float32 with a fully known shape of one or more dimensions, all positive; both element counts
-/// must fit a signed 32-bit integer. Further outputs are not computed. Any other model is refused at load.
+/// must fit a signed 32-bit integer. Further outputs are not computed. Any other model is refused at load, and so is
+/// one whose first output is its input itself, which computes nothing. A scalar output is refused because the runtime
+/// reports an output without a declared shape in the same way.
 ///
 /// Thread: one thread at a time for one object; different objects are independent.
 class ModelSession {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // neuralWarp model runtime: "principal_shapes.json" of a model directory.
 #pragma once
 

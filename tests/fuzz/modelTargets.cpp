@@ -1,0 +1,106 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "modelTargets.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
+#include <filesystem>
+#include <streambuf>
+#include <vector>
+
+#include <sys/mman.h>
+#include <unistd.h>
+
+#include "nw_model/ModelSession.h"
+#include "readers.h"
+#include "support/TemporaryFolder.h"
+
+using namespace neuralWarp;
+
+namespace {
+
+class MemoryBuffer : public std::streambuf {
+public:
+    MemoryBuffer(const std::uint8_t* data, std::size_t size)
+        : bytes_(data, data + size) { // a copy of exact size: the sanitizer sees a read past its end
+        setg(bytes_.data(), bytes_.data(), bytes_.data() + bytes_.size());
+    }
+
+private:
+    std::vector<char> bytes_;
+};
+
+void require(bool condition) {
+    if (!condition) {
+        std::abort();
+    }
+}
+
+/// A file in memory under a path that ends in ".onnx".
+class MemoryModelFile {
+public:
+    MemoryModelFile()
+        : descriptor_(memfd_create("model", 0))
+        , link_(folder_.path() / "model.onnx") {
+        require(descriptor_ >= 0);
+        std::filesystem::create_symlink("/proc/self/fd/" + std::to_string(descriptor_), link_);
+    }
+    ~MemoryModelFile() { close(descriptor_); }
+    MemoryModelFile(const MemoryModelFile&) = delete;
+    MemoryModelFile& operator=(const MemoryModelFile&) = delete;
+
+    const std::filesystem::path& replaceBy(const std::uint8_t* data, std::size_t size) {
+        require(ftruncate(descriptor_, 0) == 0);
+        require(pwrite(descriptor_, data, size, 0) == static_cast<ssize_t>(size));
+        return link_;
+    }
+
+private:
+    TemporaryFolder folder_;
+    int descriptor_;
+    std::filesystem::path link_;
+};
+
+} // namespace
+
+bool fuzzMetadata(const std::uint8_t* data, std::size_t size) {
+    MemoryBuffer source(data, size);
+    ModelMetadata record;
+    record.fullCount = 123456789;
+    const bool accepted = readMetadata(record, source);
+    require(record.loaded == accepted);
+    require(accepted || record.fullCount == 123456789);
+    require(record.affectMap.size() <= size); // an index takes a byte at least
+    return accepted;
+}
+
+bool fuzzPrincipalShapes(const std::uint8_t* data, std::size_t size) {
+    MemoryBuffer source(data, size);
+    PrincipalShapes shapes;
+    const bool accepted = readPrincipalShapes(shapes, source);
+    require(accepted || (shapes.shapeCount == 0 && shapes.values.empty()));
+    require(!accepted || shapes.values.size() == 3 * shapes.shapeCount * shapes.vertCount);
+    require(shapes.values.capacity() <= size);
+    require(std::all_of(shapes.values.begin(), shapes.values.end(), [](float value) { return std::isfinite(value); }));
+    return accepted;
+}
+
+bool fuzzOnnxLoad(const std::uint8_t* data, std::size_t size) {
+    static MemoryModelFile file;
+    ModelSession session;
+    require(session.load(file.replaceBy(data, size), true) == LoadResult::Loaded);
+    const bool accepted = session.isLoaded();
+    require(accepted == (session.inputCount() > 0));
+    require(accepted == session.errorText().empty());
+    // a model of a few bytes can declare billions of control values: feed it no more than could be real
+    const auto inputCount = static_cast<std::size_t>(std::min(session.inputCount(), 65536));
+    const std::vector<float> outputs = session.run(std::vector<float>(inputCount));
+    require(outputs.empty() == !session.errorText().empty());
+    require(accepted || outputs.empty());
+    return accepted;
+}
+
+void silenceStandardOutput() {
+    require(std::freopen("/dev/null", "w", stdout) != nullptr);
+}

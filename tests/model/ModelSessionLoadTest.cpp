@@ -1,0 +1,230 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "nw_model/ModelSession.h"
+
+#include <string>
+#include <vector>
+
+#include <gmock/gmock.h>
+#include <sys/stat.h>
+
+#include "support.h"
+
+using namespace neuralWarp;
+using testing::HasSubstr;
+using testing::IsEmpty;
+using testing::SizeIs;
+
+namespace fs = std::filesystem;
+
+namespace {
+
+constexpr const char* unsupported = "[NEURAL WARP] WARNING, unsupported ml model type\n";
+
+std::string loadError(const fs::path& path) {
+    return "[NEURAL WARP] ERROR, Failed to load the ONNX model " + path.string() + "\n";
+}
+
+/// Loads `path` over a session that runs well; nothing of the old model may be left to run.
+void expectNoSession(const fs::path& path, LoadResult result, const std::string& reason) {
+    ModelSession session;
+    ASSERT_EQ(session.load(testModel("direct"), true), LoadResult::Loaded);
+    StdoutCapture out;
+    EXPECT_EQ(session.load(path, true), result) << path;
+    EXPECT_EQ(out.take(), result == LoadResult::NotFound ? "" : loadError(path));
+    EXPECT_THAT(session.errorText(), HasSubstr(reason)) << path;
+    EXPECT_EQ(session.lastResult(), result) << path;
+    EXPECT_EQ(session.modelPath(), path);
+    EXPECT_EQ(session.type(), ModelType::OnnxType) << path;
+    EXPECT_FALSE(session.isLoaded()) << path;
+    EXPECT_THAT(session.run(std::vector<float>(7)), IsEmpty()) << path;
+}
+
+void copyModel(const fs::path& to) {
+    fs::copy_file(testModel("direct"), to, fs::copy_options::overwrite_existing);
+}
+
+} // namespace
+
+TEST(ModelSessionLoad, FreshSessionHasNothingToRun) {
+    ModelSession session;
+    EXPECT_EQ(session.lastResult(), LoadResult::NotLoaded);
+    EXPECT_EQ(session.type(), ModelType::UnrecognizedType);
+    EXPECT_EQ(session.modelPath(), fs::path());
+    EXPECT_FALSE(session.isLoaded());
+    StdoutCapture out;
+    EXPECT_EQ(session.inputCount(), 0);
+    EXPECT_THAT(session.run(std::vector<float>{1}), IsEmpty());
+    EXPECT_EQ(out.take(), std::string(unsupported) + unsupported);
+}
+
+TEST(ModelSessionLoad, FileTypeIsTheTextFromTheLastDot) {
+    const std::vector<std::pair<std::string, ModelType>> cases = {{"a.pt", ModelType::TorchType},
+                                                                  {"a.onnx.pth", ModelType::TorchType},
+                                                                  {".pt", ModelType::TorchType},
+                                                                  {"a.h5", ModelType::H5Type},
+                                                                  {"model", ModelType::H5Type},
+                                                                  {"a.ONNX", ModelType::UnrecognizedType},
+                                                                  {"a.PT", ModelType::UnrecognizedType},
+                                                                  {"a.onnx ", ModelType::UnrecognizedType},
+                                                                  {"a.", ModelType::UnrecognizedType},
+                                                                  {"a.json", ModelType::UnrecognizedType},
+                                                                  {".hidden", ModelType::UnrecognizedType},
+                                                                  {"...", ModelType::UnrecognizedType}};
+    const TestFolder folder;
+    for (const auto& [name, type] : cases) {
+        ModelSession session;
+        const fs::path path = folder.write(name, "");
+        StdoutCapture out;
+        EXPECT_EQ(session.load(path, true), LoadResult::NotRecognized) << name;
+        EXPECT_EQ(session.type(), type) << name;
+        EXPECT_EQ(session.isLoaded(), type != ModelType::UnrecognizedType) << name;
+        EXPECT_EQ(session.inputCount(), 0) << name;
+        EXPECT_THAT(session.run(std::vector<float>{1}), IsEmpty()) << name;
+        EXPECT_EQ(out.take(), std::string(unsupported) + unsupported) << name;
+    }
+    // a dot in a folder's name is none of the file's; the folders themselves have no extension
+    fs::create_directory(folder / "x.onnx");
+    for (const char* name : {"x.onnx/", "x.onnx/.", "x.onnx/.."}) {
+        ModelSession session;
+        EXPECT_EQ(session.load(folder / name, true), LoadResult::NotRecognized) << name;
+        EXPECT_EQ(session.type(), ModelType::H5Type) << name;
+    }
+}
+
+TEST(ModelSessionLoad, NameThatIsOnlyTheExtensionIsAnOnnxFile) {
+    const TestFolder folder;
+    copyModel(folder / ".onnx");
+    ModelSession session;
+    EXPECT_EQ(session.load(folder / ".onnx", true), LoadResult::Loaded);
+    EXPECT_TRUE(session.isLoaded());
+}
+
+TEST(ModelSessionLoad, MissingFileIsNotFound) {
+    const TestFolder folder;
+    const fs::path file = folder.write("file", "");
+    for (const fs::path& path :
+         std::vector<fs::path>{"", folder / "model.onnx", folder / "missing/model.onnx", file / "model.onnx"}) {
+        expectNoSession(path, LoadResult::NotFound, "");
+        ModelSession fresh;
+        EXPECT_EQ(fresh.load(path, true), LoadResult::NotFound) << path;
+        EXPECT_EQ(fresh.type(), ModelType::UnrecognizedType) << path;
+        EXPECT_FALSE(fresh.isLoaded()) << path;
+    }
+}
+
+TEST(ModelSessionLoad, UnansweredFileQueryIsNotLoaded) {
+    const TestFolder folder;
+    const fs::path link = folder / "loop.onnx";
+    fs::create_symlink(link, link);
+    expectNoSession(link, LoadResult::NotLoaded, "Too many levels of symbolic links");
+    expectNoSession(folder / (std::string(300, 'x') + ".onnx"), LoadResult::NotLoaded, "File name too long");
+}
+
+TEST(ModelSessionLoad, UnusableModelsAreRefused) {
+    const std::vector<std::pair<std::string, std::string>> cases = {
+        {"bad_input_scalar", "the input is a scalar or has no declared shape"},
+        {"bad_input_shapeless", "the input is a scalar or has no declared shape"},
+        {"bad_input_rank2", "the input has more than one dimension"},
+        {"bad_input_zero", "the input has an unknown, zero or too large dimension"},
+        {"bad_input_symbolic", "the input has an unknown, zero or too large dimension"},
+        {"bad_input_negative", "the input has an unknown, zero or too large dimension"},
+        {"bad_input_too_large", "the input has an unknown, zero or too large dimension"},
+        {"bad_input_low_bits", "the input has an unknown, zero or too large dimension"},
+        {"bad_input_double", "the input is not float32"},
+        {"bad_input_int64", "the input is not float32"},
+        {"bad_output_double", "the first output is not float32"},
+        {"bad_output_int64", "the first output is not float32"},
+        {"bad_output_scalar", "the first output is a scalar or has no declared shape"},
+        {"bad_output_shapeless", "the first output is a scalar or has no declared shape"},
+        {"bad_output_symbolic", "the first output has an unknown, zero or too large dimension"},
+        {"bad_output_zero", "the first output has an unknown, zero or too large dimension"},
+        {"bad_output_negative", "the first output has an unknown, zero or too large dimension"},
+        {"bad_output_overflow", "the first output has an unknown, zero or too large dimension"},
+        {"bad_output_sequence", "the first output is not a tensor"},
+        {"bad_pass_through", "the first output is the input itself"},
+        {"bad_two_inputs", "the model does not have exactly one input"},
+        {"bad_no_input", "the model does not have exactly one input"},
+        {"bad_no_output", "the model has no output"},
+        {"bad_operator", "NoSuchOperator"},
+        {"bad_truncated", "Protobuf parsing failed"},
+        {"bad_text", "Protobuf parsing failed"},
+        {"bad_empty", "does not have a graph"}};
+    std::size_t files = 0;
+    for (const auto& entry : fs::directory_iterator(NW_TEST_MODELS)) {
+        files += entry.path().filename().string().rfind("bad_", 0) == 0 ? 1u : 0u;
+    }
+    EXPECT_EQ(files, cases.size()) << "a bad model is not in the table";
+    for (const auto& [name, reason] : cases) {
+        expectNoSession(testModel(name), LoadResult::Loaded, reason);
+    }
+}
+
+TEST(ModelSessionLoad, OnlyRegularFilesReachTheRuntime) {
+    const TestFolder folder;
+    fs::create_directory(folder / "folder.onnx");
+    ASSERT_EQ(mkfifo((folder / "pipe.onnx").c_str(), 0600), 0);
+    expectNoSession(folder / "folder.onnx", LoadResult::Loaded, "not a regular file");
+    expectNoSession(folder / "pipe.onnx", LoadResult::Loaded, "not a regular file"); // and does not hang
+    fs::create_symlink(testModel("direct"), folder / "link.onnx");
+    ModelSession session;
+    session.load(folder / "link.onnx", true);
+    EXPECT_TRUE(session.isLoaded());
+}
+
+TEST(ModelSessionLoad, FailedBuildTakesNoInputs) {
+    ModelSession session;
+    session.load(testModel("direct"), true);
+    session.load(testModel("bad_text"), true);
+    EXPECT_EQ(session.inputCount(), 0);
+}
+
+TEST(ModelSessionLoad, EqualPathIsLoadedAgainOnlyByForce) {
+    const TestFolder folder;
+    const fs::path path = folder / "model.onnx";
+    ModelSession session;
+    EXPECT_EQ(session.load(path, false), LoadResult::NotFound);
+    copyModel(path);
+    EXPECT_EQ(session.load(path, false), LoadResult::NotFound);
+    EXPECT_EQ(session.load(path, true), LoadResult::Loaded);
+    folder.write("model.onnx", "damaged");
+    EXPECT_EQ(session.load(path, false), LoadResult::Loaded);
+    EXPECT_THAT(session.run(std::vector<float>(7)), SizeIs(6));
+    EXPECT_EQ(session.load(folder / "./model.onnx", false), LoadResult::Loaded); // another path: not the same text
+    EXPECT_FALSE(session.isLoaded());
+    EXPECT_EQ(ModelSession().load("", false), LoadResult::NotLoaded); // equal to the path of a fresh session
+}
+
+TEST(ModelSessionLoad, SuccessReplacesAnyState) {
+    ModelSession session;
+    session.load(testModel("bad_text"), true);
+    EXPECT_EQ(session.load(testModel("direct"), true), LoadResult::Loaded);
+    EXPECT_EQ(session.errorText(), "");
+    EXPECT_EQ(session.inputCount(), 7);
+    EXPECT_EQ(session.load(testModel("coefficients"), false), LoadResult::Loaded);
+    EXPECT_EQ(session.inputCount(), 2);
+    EXPECT_THAT(session.run(std::vector<float>(2)), SizeIs(1));
+}
+
+TEST(ModelSessionLoad, ResetKeepsTypeAndShapes) {
+    ModelSession session;
+    session.load(testModel("direct"), true);
+    session.reset();
+    EXPECT_EQ(session.lastResult(), LoadResult::NotLoaded);
+    EXPECT_EQ(session.type(), ModelType::OnnxType);
+    EXPECT_EQ(session.inputCount(), 7);
+    EXPECT_FALSE(session.isLoaded());
+    EXPECT_THAT(session.run(std::vector<float>(7)), IsEmpty());
+    EXPECT_EQ(session.load(testModel("direct"), false), LoadResult::NotLoaded); // the path is still the same
+}
+
+TEST(ModelSessionLoad, PathsAreBytes) {
+    const TestFolder folder;
+    for (const char* name :
+         {"with space.onnx", "\xc3\xa9\xe6\x89\x8b \xf0\x9f\x96\x90.onnx", "\xff\xfe not UTF-8.onnx", "%s%n.onnx"}) {
+        copyModel(folder / name);
+        ModelSession session;
+        EXPECT_EQ(session.load(folder / name, true), LoadResult::Loaded) << name;
+        EXPECT_THAT(session.run(std::vector<float>(7)), SizeIs(6)) << name;
+        expectNoSession(folder.write(name, "damaged"), LoadResult::Loaded, "");
+    }
+}
