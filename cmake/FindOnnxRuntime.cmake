@@ -4,7 +4,12 @@
 #   3. build/deps/onnxruntime, which `./run deps` fills.
 # Also sets OnnxRuntime_LICENSE_FILE when the root holds one; it is installed along with the library.
 
-find_package(onnxruntime CONFIG QUIET)
+# The code asks for function table 16, which came with 1.16.
+if(NOT OnnxRuntime_FIND_VERSION)
+  set(OnnxRuntime_FIND_VERSION 1.16)
+endif()
+
+find_package(onnxruntime ${OnnxRuntime_FIND_VERSION} CONFIG QUIET)
 if(TARGET onnxruntime::onnxruntime)
   if(NOT TARGET OnnxRuntime::OnnxRuntime)
     add_library(OnnxRuntime::OnnxRuntime INTERFACE IMPORTED)
@@ -21,9 +26,17 @@ find_library(OnnxRuntime_LIBRARY NAMES onnxruntime libonnxruntime.so.1 HINTS ${_
 find_file(OnnxRuntime_LICENSE_FILE LICENSE HINTS ${_ort_roots} NO_DEFAULT_PATH)
 mark_as_advanced(OnnxRuntime_INCLUDE_DIR OnnxRuntime_LIBRARY OnnxRuntime_LICENSE_FILE)
 
+# The version of the function table that these headers declare, which is the minor version of the release.
+if(OnnxRuntime_INCLUDE_DIR AND EXISTS "${OnnxRuntime_INCLUDE_DIR}/onnxruntime_c_api.h")
+  file(STRINGS "${OnnxRuntime_INCLUDE_DIR}/onnxruntime_c_api.h" _ort_api REGEX "#define ORT_API_VERSION")
+  string(REGEX MATCH "[0-9]+" _ort_api "${_ort_api}")
+  set(OnnxRuntime_VERSION "1.${_ort_api}")
+endif()
+
 include(FindPackageHandleStandardArgs)
 find_package_handle_standard_args(OnnxRuntime
   REQUIRED_VARS OnnxRuntime_LIBRARY OnnxRuntime_INCLUDE_DIR
+  VERSION_VAR OnnxRuntime_VERSION
   REASON_FAILURE_MESSAGE "run './run deps', or give its root: -DONNXRUNTIME_ROOT=DIR")
 
 if(OnnxRuntime_FOUND AND NOT TARGET OnnxRuntime::OnnxRuntime)

@@ -53,14 +53,7 @@ is_installed() {
 }
 
 as_root() {
-  if ((EUID == 0)); then
-    "$@"
-  elif have sudo; then
-    sudo -n true 2>/dev/null || say "sudo asks for a password to run: $*"
-    sudo "$@"
-  else
-    fail "neither root nor sudo: as root, run: $*"
-  fi
+  if ((EUID == 0)); then "$@"; else sudo "$@"; fi
 }
 
 # Installs those of the named packages that are missing; touches nothing when none is.
@@ -71,19 +64,23 @@ need_packages() {
   done
   ((${#missing[@]})) || return 0
   is_debian_12 || fail "not Debian 12, so install by hand what is missing: ${missing[*]}"
+  ((EUID == 0)) || have sudo || fail "neither root nor sudo; as root, run: apt-get install ${missing[*]}"
 
   # npm is only as good as the certificates it can check a server by, and Debian's npm merely recommends them.
   [[ " ${missing[*]} " == *' npm '* && ! -e /etc/ssl/certs/ca-certificates.crt ]] && missing+=(ca-certificates)
 
-  say "installing ${missing[*]}"
-  apt_get update || fail "apt-get update failed; packages that are missing: ${missing[*]}"
+  say "installing ${missing[*]} (log: build/apt.log)"
+  apt_get update || fail "apt-get update failed ($(apt_error)); packages that are missing: ${missing[*]}"
   apt_get install -y --no-install-recommends "${missing[@]}" ||
-    fail "apt-get could not install the missing packages: ${missing[*]}"
+    fail "apt-get could not install ${missing[*]} ($(apt_error))"
 }
 
 apt_get() {
-  as_root env DEBIAN_FRONTEND=noninteractive apt-get -q -o Dpkg::Use-Pty=0 "$@" </dev/null
+  mkdir -p build
+  as_root env DEBIAN_FRONTEND=noninteractive apt-get -q -o Dpkg::Use-Pty=0 "$@" </dev/null >build/apt.log 2>&1
 }
+
+apt_error() { grep -m 1 '^E:' build/apt.log || tail -n 1 build/apt.log; }
 
 # A folder of the user's, kept between clones, for what is slow to get. Nothing in it is trusted without a check.
 cache_folder() {

@@ -37,7 +37,7 @@ download() {
   local archive=$1 log=$scratch/npm.log
   need_packages npm
   say "fetching $package $version (150 MB)"
-  (cd "$scratch" && npm pack --silent "$package@$version" </dev/null >"$log" 2>&1) ||
+  (cd "$scratch" && npm pack --loglevel=error "$package@$version" </dev/null >"$log" 2>&1) ||
     fail "npm could not fetch $package@$version ($(grep -m 1 -i 'err' "$log" || tail -n 1 "$log")); check the network and npm's registry, or set ONNXRUNTIME_ROOT"
   is_intact "$scratch/$package-$version.tgz" ||
     fail "$package-$version.tgz does not have the pinned hash: check npm's registry, or set ONNXRUNTIME_ROOT"
@@ -49,7 +49,7 @@ unpack() {
   say "unpacking ONNX Runtime into $target"
   mkdir -p build/deps
   staging=$(mktemp -d build/deps/onnxruntime.XXXXXX)
-  tar -xzf "$archive" -C "$scratch" "$headers" "$library" package/LICENSE
+  tar -xzf "$archive" --no-same-owner -C "$scratch" "$headers" "$library" package/LICENSE
   mkdir "$staging/lib"
   mv "$scratch/$headers" "$staging/include"
   mv "$scratch/$library" "$staging/lib/"

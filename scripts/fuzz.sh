@@ -2,6 +2,10 @@
 
 fuzz_work=build/fuzz/work
 
+# what the presets give to CTest's tests; libFuzzer looks for leaks too
+export LSAN_OPTIONS="suppressions='$PWD/tests/sanitizers/lsan.supp':print_suppressions=0"
+export UBSAN_OPTIONS=print_stacktrace=1 PATH=$PATH:/usr/lib/llvm-14/bin
+
 # Fuzzes one target on a copy of its corpus, so that what it finds stays in the build tree.
 fuzz_target() {
   local program=$1 seconds=$2 name=${1##*/}
@@ -45,11 +49,12 @@ command_fuzz() {
   done
   ((${#programs[@]})) || fail "there is no fuzz target in build/fuzz/tests/fuzz yet"
 
-  say "fuzzing ${#programs[@]} targets for $seconds s each, 2 at a time"
-  local i j status
-  for ((i = 0; i < ${#programs[@]}; i += 2)); do
+  local i j status at_once=2
+  (($(jobs) > 1)) || at_once=1
+  say "fuzzing ${#programs[@]} targets for $seconds s each, $at_once at a time"
+  for ((i = 0; i < ${#programs[@]}; i += at_once)); do
     names=() pids=()
-    for program in "${programs[@]:i:2}"; do
+    for program in "${programs[@]:i:at_once}"; do
       fuzz_target "$program" "$seconds" &
       pids+=($!) names+=("${program##*/}")
     done

@@ -1,6 +1,7 @@
+// SPDX-License-Identifier: Apache-2.0
 // `planted_race race` sums into one element from every task of a parallel loop, which the thread sanitizer must report;
 // `planted_race disjoint` is the same loop with one element for each index, which it must not.
-#include <oneapi/tbb/parallel_for.h>
+#include <tbb/parallel_for.h>
 
 #include <cstddef>
 #include <cstdio>
