@@ -3,6 +3,7 @@
 
 #include "edgeNeighbours.h"
 #include "quill/parallelFor.h"
+#include "smoothing.h"
 
 #include <algorithm>
 #include <cmath>
@@ -70,52 +71,6 @@ double inverseDistance(float distance, double exponent, double offset) {
     return 1.0 / (exponent == 1.0 ? reach : std::pow(reach, exponent));
 }
 
-// One smoothing pass over a range of vertices, in float throughout and in the order the connections stand.
-struct SmoothingPass {
-    const std::uint32_t* connections;
-    const std::uint32_t* indexer;
-    std::size_t vertexCount;
-    const std::uint8_t* mask; // may be null
-    const float* weights;     // may be null
-    float step;
-    bool wholeStep;
-    bool includeSelf;
-
-    void run(const val3<float>* source, val3<float>* destination, std::size_t begin, std::size_t end) const {
-        if (weights)
-            runRange<true>(source, destination, begin, end);
-        else
-            runRange<false>(source, destination, begin, end);
-    }
-
-private:
-    template <bool weighted>
-    void runRange(const val3<float>* source, val3<float>* destination, std::size_t begin, std::size_t end) const {
-        const std::size_t connectedEnd = std::clamp(vertexCount, begin, end);
-        for (std::size_t i = begin; i < connectedEnd; ++i)
-            destination[i] = mask && mask[i] != 0 ? source[i] : smoothed<weighted>(source, i);
-        std::copy(source + connectedEnd, source + end, destination + connectedEnd);
-    }
-
-    template <bool weighted>
-    val3<float> smoothed(const val3<float>* source, std::size_t i) const {
-        const std::uint32_t first = indexer[i];
-        const std::uint32_t last = indexer[i + 1];
-        const val3<float> here = source[i];
-        if (first == last)
-            return here;
-        val3<float> sum = includeSelf ? here : val3<float>();
-        for (std::uint32_t k = first; k < last; ++k) {
-            val3<float> neighbour = source[connections[k]];
-            if constexpr (weighted)
-                neighbour *= weights[k];
-            sum += neighbour;
-        }
-        sum /= static_cast<float>(last - first + (includeSelf ? 1U : 0U));
-        return wholeStep ? sum : here + step * (sum - here);
-    }
-};
-
 } // namespace
 
 void VertexConnections::build(const MeshTopology& topology, const IndexMapper& map, std::size_t extraRings,
@@ -172,11 +127,13 @@ void VertexConnections::mushArray(std::vector<val3<float>>& positions, std::vect
                              step,
                              equivalent(step, 1.0, 1e-5),
                              includeSelf};
+    const SmoothingKernel kernel = smoothingKernel();
     scratch.resize(positions.size());
     for (std::size_t iteration = 0; iteration < iterations; ++iteration) {
         positions.swap(scratch);
         parallelForRange(positions.size(), [&](int begin, int end) {
-            pass.run(scratch.data(), positions.data(), static_cast<std::size_t>(begin), static_cast<std::size_t>(end));
+            kernel(pass, scratch.data(), positions.data(), static_cast<std::size_t>(begin),
+                   static_cast<std::size_t>(end));
         });
     }
 }

@@ -94,8 +94,8 @@ public:
     /// Type of the last file that was found; a load that finds no file does not change it.
     ModelType type() const { return type_; }
 
-    /// Why the last load gave no session, or the last run since then no values: in words and without the path. Empty
-    /// after a success, and where result or type say it all (NotFound, NotRecognized).
+    /// Why the last load gave no session, or the last run since then no values: one or more lines of text, in part the
+    /// runtime's own. Empty after a success, and where result or type say it all (NotFound, NotRecognized).
     const std::string& errorText() const { return errorText_; }
 
 private:

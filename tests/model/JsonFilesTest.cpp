@@ -85,7 +85,7 @@ TEST(JsonFiles, MalformedDocuments) {
                                                             zero,
                                                             "{\"a\": \"" + zero + "\"}",
                                                             "\xef\xbb\xbf{}",
-                                                            "\xff\xfe{\0}\0"}) {
+                                                            "\xff\xfe{"}) {
         const TestFolder folder;
         expectRefused(folder.write("file.json", text), parseError);
     }

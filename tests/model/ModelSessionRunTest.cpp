@@ -65,18 +65,6 @@ TEST(ModelSessionRun, GivesTheFirstOutputInRowMajorOrder) {
     }
 }
 
-TEST(ModelSessionRun, ReadsTheCallersValuesAndLeavesThemAlone) {
-    ModelSession session;
-    load(session, "direct");
-    std::vector<float> inputs = sevenInputs;
-    for (int repeat = 0; repeat < 3; ++repeat) {
-        inputs[0] += 1;
-        const std::vector<float> before = inputs;
-        EXPECT_EQ(session.run(inputs), linear(before, 6));
-        EXPECT_EQ(inputs, before);
-    }
-}
-
 TEST(ModelSessionRun, NeedsAllInputsAndIgnoresFurtherOnes) {
     ModelSession session;
     load(session, "identity");

@@ -1,0 +1,244 @@
+// SPDX-License-Identifier: Apache-2.0
+// bench_quill: every phase of the geometry library beside its yardsticks, on generated meshes of three sizes, on one
+// core and on all. See Report::legend for the columns.
+#include "eigenProduct.h"
+#include "harness.h"
+#include "plainLoops.h"
+#include "probes.h"
+#include "support/meshZoo.h"
+
+#include "quill/VertexConnections.h"
+#include "quill/VertexFrames.h"
+#include "quill/bulk.h"
+
+#include <cstdlib>
+#include <exception>
+#include <string>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+
+namespace {
+
+using bench::Phase;
+using plain::Points;
+
+constexpr const char* usage = "usage: bench_quill [--csv FILE] [--seconds S] [--only PHASE]\n"
+                              "  --csv FILE    write the rows there as well\n"
+                              "  --seconds S   time for each row (default 0.4)\n"
+                              "  --only PHASE  phases whose name begins so\n";
+
+struct Options {
+    std::string csv;
+    double seconds = 0.4;
+    std::string only;
+};
+
+// Everything the phases of one mesh run on.
+struct Subject {
+    std::string name;
+    std::size_t n;
+    Points points, smoothed, plainSmoothed, scratch, plainScratch;
+    quill::MeshTopology topology;
+    quill::IndexMapper map;
+    quill::VertexConnections connections, rebuilt;
+    quill::VertexFrames frames, rebuiltFrames;
+    std::vector<float> weights, plainWeights, floats;
+    std::vector<quill::mat4d> matrices, plainMatrices;
+    quill::mat4d motion{{0.8, 0.6, 0, 0, -0.6, 0.8, 0, 0, 0, 0, 1, 0, 1e-3, 2e-3, 0, 1}};
+
+    Subject(std::string nameIn, const ZooMesh& mesh)
+        : name(std::move(nameIn))
+        , n(mesh.vertexCount())
+        , points(mesh.points)
+        , smoothed(points)
+        , plainSmoothed(points)
+        , scratch(n)
+        , plainScratch(n)
+        , topology(mesh.topology())
+        , matrices(n)
+        , plainMatrices(n) {
+        map.setIdentity(n);
+        connections.build(topology, map, 0, false);
+        frames.build(topology, map, &points);
+        connections.calculateConnectionWeights(weights, points, 1.0, 0.0);
+        plainWeights = weights;
+        floats.resize(16 * n);
+    }
+
+    Phase phase(std::string phaseName, std::size_t bytes) const { return {std::move(phaseName), name, n, bytes}; }
+};
+
+// Bytes that must move: every array of the phase once, read or written.
+std::size_t tableBytes(const Subject& s) {
+    return 4 * (s.connections.connections().size() + s.connections.connectionsIndexer().size());
+}
+std::size_t pairBytes(const Subject& s) {
+    return 4 * (s.frames.framesPairs().size() + s.frames.framesIndexer().size());
+}
+
+Phase smoothing(Subject& s, EigenProduct& eigen) {
+    // a call is ten passes, as a deformer would make; the yardsticks run the same ten
+    constexpr std::size_t passes = 10;
+    Phase phase = s.phase("smoothing pass", 24 * s.n + tableBytes(s) + 4 * s.weights.size());
+    phase.perCall = passes;
+    phase.ours = [&s] { s.connections.mushArray(s.smoothed, s.scratch, passes, 1.0F, nullptr, &s.weights, false); };
+    phase.plain = [&s] {
+        for (std::size_t i = 0; i < passes; ++i) {
+            s.plainScratch.swap(s.plainSmoothed);
+            plain::smoothingPass(s.plainScratch, s.plainSmoothed, s.connections.connectionsIndexer(),
+                                 s.connections.connections(), s.weights);
+        }
+    };
+    phase.eigen = [&eigen] {
+        for (std::size_t i = 0; i < passes; ++i)
+            eigen.pass();
+    };
+    return phase;
+}
+
+Phase weighing(Subject& s) {
+    Phase phase = s.phase("weights", 12 * s.n + tableBytes(s) + 4 * s.weights.size());
+    phase.ours = [&s] { s.connections.calculateConnectionWeights(s.weights, s.points, 1.0, 0.0); };
+    phase.plain = [&s] {
+        plain::connectionWeights(s.plainWeights, s.points, s.connections.connectionsIndexer(),
+                                 s.connections.connections());
+    };
+    return phase;
+}
+
+Phase framing(Subject& s, bool invert) {
+    Phase phase = s.phase(invert ? "rest frames" : "frames", (12 + sizeof(quill::mat4d)) * s.n + pairBytes(s));
+    phase.ours = [&s, invert] { s.frames.calculateFrames(s.matrices, s.points, s.map, invert, nullptr); };
+    phase.plain = [&s, invert] {
+        plain::frames(s.plainMatrices, s.points, s.frames.framesIndexer(), s.frames.framesPairs(), invert);
+    };
+    return phase;
+}
+
+Phase transforming(Subject& s) {
+    Phase phase = s.phase("multAsPoint", 24 * s.n);
+    phase.ours = [&s] { quill::multAsPoint(s.smoothed, s.motion); };
+    phase.plain = [&s] { plain::transformPoints(s.plainSmoothed, s.motion); };
+    return phase;
+}
+
+Phase inverting(Subject& s) {
+    Phase phase = s.phase("invertFrames", 2 * sizeof(quill::mat4d) * s.n);
+    phase.ours = [&s] { quill::invertFrames(s.matrices); };
+    phase.plain = [&s] { plain::invertFrames(s.plainMatrices); };
+    return phase;
+}
+
+Phase narrowing(Subject& s) {
+    Phase phase = s.phase("floats", (sizeof(quill::mat4d) + 64) * s.n);
+    phase.ours = [&s] { quill::convertToFloatArray(s.matrices, s.floats); };
+    phase.plain = [&s] { plain::toFloats(s.matrices, s.floats); };
+    return phase;
+}
+
+Phase buildingConnections(Subject& s) {
+    Phase phase = s.phase("build adjacency", 0);
+    phase.parallel = false;
+    phase.ours = [&s] { s.rebuilt.build(s.topology, s.map, 0, false); };
+    phase.plain = [&s] {
+        if (plain::adjacencyBySets(s.topology, s.n) != s.connections.connections().size())
+            std::abort();
+    };
+    return phase;
+}
+
+Phase buildingFrames(Subject& s) {
+    Phase phase = s.phase("build frames", 0);
+    phase.parallel = false;
+    phase.ours = [&s] { s.rebuiltFrames.build(s.topology, s.map, &s.points); };
+    return phase;
+}
+
+void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::size_t threads, const Options& options,
+             bench::Report& report) {
+    Subject s(name, mesh);
+    EigenProduct eigen(s.connections, s.weights, s.points);
+    std::vector<Phase> phases{smoothing(s, eigen), framing(s, false)};
+    if (allPhases) {
+        phases.insert(phases.end(), {weighing(s), framing(s, true), transforming(s), inverting(s), narrowing(s)});
+    }
+    if (threads == 1)
+        phases.insert(phases.end(), {buildingConnections(s), buildingFrames(s)});
+    for (const Phase& phase : phases)
+        if (phase.name.starts_with(options.only))
+            report.add(bench::measure(phase, threads, options.seconds));
+}
+
+void runAll(std::size_t threads, const Options& options, bench::Report& report) {
+    struct Size {
+        std::size_t gridSide;
+        std::size_t subdivisions; // 4^s * 10 + 2 vertices
+    };
+    for (const Size& size : {Size{100, 5}, Size{316, 7}, Size{1000, 8}}) {
+        const ZooMesh grid = makeGrid(size.gridSide - 1, size.gridSide - 1);
+        runMesh("grid", grid, true, threads, options, report);
+        runMesh("shuffled", shuffled(grid, 1), false, threads, options, report);
+        runMesh("icosphere", makeIcosphere(size.subdivisions), false, threads, options, report);
+    }
+}
+
+// In a process of its own, since the cores must be fixed before the first thread starts.
+bool runOnCores(std::size_t count, const Options& options, std::FILE* csv) {
+    std::fflush(nullptr);
+    const pid_t child = fork();
+    if (child < 0)
+        return false;
+    if (child > 0) {
+        int status = 0;
+        return waitpid(child, &status, 0) == child && WIFEXITED(status) && WEXITSTATUS(status) == 0;
+    }
+    int status = 0;
+    try {
+        bench::Report report(csv);
+        runAll(bench::useCores(count), options, report);
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "bench_quill: %s\n", error.what());
+        status = 1;
+    }
+    std::fflush(nullptr);
+    _exit(status);
+}
+
+bool parse(int argc, char** argv, Options& options) {
+    for (int i = 1; i + 1 < argc; i += 2) {
+        const std::string name = argv[i];
+        if (name == "--csv")
+            options.csv = argv[i + 1];
+        else if (name == "--seconds")
+            options.seconds = std::atof(argv[i + 1]);
+        else if (name == "--only")
+            options.only = argv[i + 1];
+        else
+            return false;
+    }
+    return argc % 2 == 1;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    Options options;
+    if (!parse(argc, argv, options)) {
+        std::fputs(usage, stderr);
+        return 2;
+    }
+    std::FILE* csv = options.csv.empty() ? nullptr : std::fopen(options.csv.c_str(), "w");
+    if (!options.csv.empty() && !csv) {
+        std::fprintf(stderr, "bench_quill: %s cannot be written\n", options.csv.c_str());
+        return 1;
+    }
+    bench::Report(csv).header();
+    bool ok = runOnCores(1, options, csv);
+    if (const std::size_t cores = std::thread::hardware_concurrency(); cores > 1)
+        ok = runOnCores(cores, options, csv) && ok;
+    bench::Report::legend();
+    if (csv)
+        std::fclose(csv);
+    return ok ? 0 : 1;
+}

@@ -1,0 +1,25 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "smoothing.h"
+
+namespace quill {
+
+std::size_t availableSmoothingKernels(SmoothingKernel* out) {
+    std::size_t count = 0;
+    out[count++] = smoothScalar;
+#if defined(__x86_64__)
+    out[count++] = smoothSse2;
+    if (__builtin_cpu_supports("avx"))
+        out[count++] = smoothAvx;
+#endif
+    return count;
+}
+
+SmoothingKernel smoothingKernel() {
+    static const SmoothingKernel fastest = [] {
+        SmoothingKernel kernels[3];
+        return kernels[availableSmoothingKernels(kernels) - 1];
+    }();
+    return fastest;
+}
+
+} // namespace quill

@@ -1,0 +1,95 @@
+// SPDX-License-Identifier: Apache-2.0
+// Steady-state calls allocate nothing: what they need is there after the first call. A program of its own, because it
+// replaces operator new for the whole process.
+#include "support/meshZoo.h"
+
+#include "quill/VertexConnections.h"
+#include "quill/VertexFrames.h"
+#include "quill/bulk.h"
+
+#include <gtest/gtest.h>
+
+#include <atomic>
+#include <cstdlib>
+#include <functional>
+#include <new>
+
+namespace {
+
+std::atomic<std::size_t> allocations = 0;
+
+void* countedAllocation(std::size_t size) {
+    ++allocations;
+    if (void* memory = std::malloc(size == 0 ? 1 : size))
+        return memory;
+    throw std::bad_alloc();
+}
+
+} // namespace
+
+void* operator new(std::size_t size) {
+    return countedAllocation(size);
+}
+void* operator new[](std::size_t size) {
+    return countedAllocation(size);
+}
+void operator delete(void* memory) noexcept {
+    std::free(memory);
+}
+void operator delete[](void* memory) noexcept {
+    std::free(memory);
+}
+void operator delete(void* memory, std::size_t) noexcept {
+    std::free(memory);
+}
+void operator delete[](void* memory, std::size_t) noexcept {
+    std::free(memory);
+}
+
+namespace {
+
+TEST(Allocation, TheCounterCounts) {
+    const std::size_t before = allocations;
+    const std::vector<int> one(3);
+    EXPECT_EQ(allocations, before + 1);
+    EXPECT_EQ(one.size(), 3U);
+}
+
+TEST(Allocation, SteadyStateCallsAllocateNothing) {
+    const ZooMesh mesh = makeGrid(60, 60);
+    quill::IndexMapper map;
+    map.setIdentity(mesh.vertexCount());
+    quill::VertexConnections connections;
+    connections.build(mesh.topology(), map, 0, false);
+    quill::VertexFrames vertexFrames;
+    vertexFrames.build(mesh.topology(), map, &mesh.points);
+    std::vector<quill::val3<float>> points = mesh.points, scratch, displacements;
+    std::vector<float> weights, floats;
+    std::vector<quill::mat4d> frames;
+    const quill::mat4d turn{{0, 1, 0, 0, -1, 0, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1}};
+
+    struct Step {
+        const char* name;
+        std::function<void()> call;
+    };
+    const std::vector<Step> steps{
+        {"weights", [&] { connections.calculateConnectionWeights(weights, mesh.points, 1.0, 0.0); }},
+        {"mushArray", [&] { connections.mushArray(points, scratch, 8, 1.0F, nullptr, &weights, false); }},
+        {"calculateFrames", [&] { vertexFrames.calculateFrames(frames, points, map, true, nullptr); }},
+        {"calculateDisplacements", [&] { vertexFrames.calculateDisplacements(points, mesh.points, displacements); }},
+        {"multAsPoint", [&] { quill::multAsPoint(points, turn); }},
+        {"multFrames", [&] { quill::multFrames(frames, turn); }},
+        {"invertFrames", [&] { quill::invertFrames(frames); }},
+        {"convertToFloatArray", [&] { quill::convertToFloatArray(frames, floats); }},
+    };
+    for (const Step& step : steps)
+        step.call();
+    for (const Step& step : steps) {
+        const std::size_t before = allocations;
+        step.call();
+        step.call();
+        EXPECT_EQ(allocations, before) << step.name;
+    }
+}
+
+} // namespace
