@@ -46,7 +46,12 @@ struct Candidate {
         return secondsSince(start);
     }
 
-    void sample() { seconds.push_back(timeSample() / static_cast<double>(callsPerSample)); }
+    // The call before the clock starts brings the data back that another candidate drove out of the caches.
+    void sample(bool warm) {
+        if (warm)
+            run();
+        seconds.push_back(timeSample() / static_cast<double>(callsPerSample));
+    }
 };
 
 // Median over the rounds of a's time over b's.
@@ -79,10 +84,10 @@ Row measure(const Phase& phase, std::size_t threads, double seconds) {
     }
     const auto start = Clock::now();
     while (ours.seconds.size() < fewestRounds || secondsSince(start) < seconds) {
-        ours.sample();
+        ours.sample(phase.parallel);
         for (auto* yardstick : {&plain, &eigen, &triad})
             if (*yardstick)
-                (*yardstick)->sample();
+                (*yardstick)->sample(phase.parallel);
     }
     const double units = static_cast<double>(phase.perCall);
     row.cores = std::min(coresBefore, coresAtWork(threads));

@@ -88,21 +88,26 @@ void VertexConnections::calculateConnectionWeights(std::vector<float>& weights,
     weights.assign(connections_.size(), 1.0F);
     if (std::abs(exponent) < 1e-5 || positions.size() < vertexCount())
         return;
-    parallelFor(vertexCount(), [&](std::size_t i) {
-        const std::uint32_t first = connectionsIndexer_[i];
-        const std::uint32_t last = connectionsIndexer_[i + 1];
+    // plain pointers: after a store to a weight the compiler would load the vectors' own again
+    const std::uint32_t* const indexer = connectionsIndexer_.data();
+    const std::uint32_t* const connections = connections_.data();
+    const val3<float>* const points = positions.data();
+    float* const out = weights.data();
+    parallelFor(vertexCount(), [=](std::size_t i) {
+        const std::uint32_t first = indexer[i];
+        const std::uint32_t last = indexer[i + 1];
         if (first == last)
             return;
+        const val3<float> here = points[i];
         double sum = 0.0;
         for (std::uint32_t k = first; k < last; ++k) {
-            const float distance = length(positions[i] - positions[connections_[k]]);
-            const double weight = inverseDistance(distance, exponent, offset);
+            const double weight = inverseDistance(length(here - points[connections[k]]), exponent, offset);
             sum += weight;
-            weights[k] = static_cast<float>(weight);
+            out[k] = static_cast<float>(weight);
         }
         const auto scale = static_cast<float>(static_cast<double>(last - first) / sum);
         for (std::uint32_t k = first; k < last; ++k)
-            weights[k] *= scale;
+            out[k] *= scale;
     });
 }
 

@@ -3,9 +3,11 @@
 
 #include "cornerPairs.h"
 #include "edgeNeighbours.h"
+#include "frameBlock.h"
 #include "quill/parallelFor.h"
 
 #include <algorithm>
+#include <array>
 #include <utility>
 
 namespace quill {
@@ -43,16 +45,31 @@ public:
         : count_(count)
         , subset_(subset) {}
 
+    // Calls visit(vertices, n) in parallel with blocks of n <= FrameBlock::capacity listed vertices below the count.
+    template <typename Visit>
+    void parallelForEachBlock(const Visit& visit) const {
+        parallelForRange(subset_ ? subset_->size() : count_, [&](int begin, int end) {
+            std::array<std::size_t, FrameBlock::capacity> block;
+            std::size_t n = 0;
+            for (auto j = static_cast<std::size_t>(begin); j < static_cast<std::size_t>(end); ++j) {
+                const std::size_t vertex = subset_ ? (*subset_)[j] : j;
+                if (vertex >= count_)
+                    continue;
+                block[n++] = vertex;
+                if (n == block.size())
+                    visit(block.data(), std::exchange(n, 0));
+            }
+            if (n > 0)
+                visit(block.data(), n);
+        });
+    }
+
     // Calls visit(i) in parallel for each listed vertex below the count.
     template <typename Visit>
     void parallelForEach(const Visit& visit) const {
-        if (!subset_) {
-            parallelFor(count_, visit);
-            return;
-        }
-        parallelFor(subset_->size(), [&](std::size_t j) {
-            if (const std::size_t i = (*subset_)[j]; i < count_)
-                visit(i);
+        parallelForEachBlock([&](const std::size_t* vertices, std::size_t n) {
+            for (std::size_t j = 0; j < n; ++j)
+                visit(vertices[j]);
         });
     }
 
@@ -88,10 +105,16 @@ val3<float> smoothedNormal(std::size_t vertex, const std::vector<val3<float>>& n
     return sum;
 }
 
-void store(mat4d& out, mat4d frame, bool invert) {
-    if (invert)
-        frame.gaussJordanInverse();
-    out = frame;
+// Builds the frames of a block on its normals and stores them, inverted or not.
+void storeFrames(FrameBlock& block, const FrameTables& tables, const std::size_t* vertices, std::size_t n, bool invert,
+                 mat4d* frames) {
+    block.buildAxes(tables, vertices, n);
+    for (std::size_t j = 0; j < n; ++j) {
+        mat4d& frame = frames[vertices[j]];
+        block.write(tables, j, vertices[j], frame);
+        if (invert)
+            frame.gaussJordanInverse();
+    }
 }
 
 } // namespace
@@ -128,31 +151,6 @@ void VertexFrames::build(const MeshTopology& topology, const IndexMapper& map,
     framesIndexer_ = std::move(cursor);
 }
 
-val3<float> VertexFrames::normalOf(std::size_t vertex, const std::vector<val3<float>>& positions) const {
-    val3<float> normal;
-    if (!hasPairs(vertex))
-        return normal;
-    const val3<float> here = positions[vertex];
-    for (std::uint32_t k = framesIndexer_[vertex]; k < framesIndexer_[vertex + 1]; k += 2)
-        normal += cross(positions[framesPairs_[k]] - here, positions[framesPairs_[k + 1]] - here);
-    normal.normalize();
-    return normal;
-}
-
-mat4d VertexFrames::frameOf(std::size_t vertex, const val3<float>& normal,
-                            const std::vector<val3<float>>& positions) const {
-    const val3<float> origin = positions[vertex];
-    if (!hasPairs(vertex))
-        return mat4d{{1.0, 0.0, 0.0, 0.0, 0.0, 1.0, 0.0, 0.0, 0.0, 0.0, 1.0, 0.0, origin.x, origin.y, origin.z, 1.0}};
-    val3<float> tangent = positions[framesPairs_[framesIndexer_[vertex]]] - origin;
-    tangent.normalize();
-    val3<float> x = cross(normal, tangent);
-    x.normalize();
-    const val3<float> y = cross(x, normal);
-    return mat4d{
-        {x.x, x.y, x.z, 0.0, y.x, y.y, y.z, 0.0, normal.x, normal.y, normal.z, 0.0, origin.x, origin.y, origin.z, 1.0}};
-}
-
 void VertexFrames::calculateFrames(std::vector<mat4d>& frames, const std::vector<val3<float>>& positions,
                                    const IndexMapper& map, bool invert,
                                    const std::vector<std::uint32_t>* subset) const {
@@ -160,9 +158,13 @@ void VertexFrames::calculateFrames(std::vector<mat4d>& frames, const std::vector
         frames.resize(map.affectCount());
     if (positions.size() < vertexCount())
         return;
-    VertexList(std::min(map.affectCount(), positions.size()), subset).parallelForEach([&](std::size_t i) {
-        store(frames[i], frameOf(i, normalOf(i, positions), positions), invert);
-    });
+    const FrameTables tables{framesPairs_.data(), framesIndexer_.data(), vertexCount(), positions.data()};
+    VertexList(std::min(map.affectCount(), positions.size()), subset)
+        .parallelForEachBlock([&](const std::size_t* vertices, std::size_t n) {
+            FrameBlock block;
+            block.measureNormals(tables, vertices, n);
+            storeFrames(block, tables, vertices, n, invert, frames.data());
+        });
 }
 
 void VertexFrames::calculateFrames(std::vector<mat4d>& frames, const std::vector<val3<float>>& positions,
@@ -179,16 +181,24 @@ void VertexFrames::calculateFrames(std::vector<mat4d>& frames, const std::vector
     if (positions.size() < vertexCount())
         return;
     const std::size_t count = std::min(map.affectCount(), positions.size());
-    const VertexList vertices(count, subset);
-    const ConnectionTables tables{connectionsIndexer, connections, weights};
+    const VertexList listed(count, subset);
+    const FrameTables tables{framesPairs_.data(), framesIndexer_.data(), vertexCount(), positions.data()};
+    const ConnectionTables connectionTables{connectionsIndexer, connections, weights};
     std::vector<val3<float>> normals(count);
     std::vector<val3<float>> snapshot;
-    vertices.parallelForEach([&](std::size_t i) { normals[i] = normalOf(i, positions); });
+    listed.parallelForEach([&](std::size_t i) {
+        normals[i] = tables.normalSum(i);
+        normals[i].normalize();
+    });
     for (std::size_t iteration = 0; iteration < normalIterations; ++iteration) {
         snapshot = normals;
-        vertices.parallelForEach([&](std::size_t i) { normals[i] = smoothedNormal(i, snapshot, tables); });
+        listed.parallelForEach([&](std::size_t i) { normals[i] = smoothedNormal(i, snapshot, connectionTables); });
     }
-    vertices.parallelForEach([&](std::size_t i) { store(frames[i], frameOf(i, normals[i], positions), invert); });
+    listed.parallelForEachBlock([&](const std::size_t* vertices, std::size_t n) {
+        FrameBlock block;
+        block.takeNormals(normals.data(), vertices, n);
+        storeFrames(block, tables, vertices, n, invert, frames.data());
+    });
 }
 
 void VertexFrames::calculateDisplacements(const std::vector<val3<float>>& positions,
@@ -196,11 +206,20 @@ void VertexFrames::calculateDisplacements(const std::vector<val3<float>>& positi
     out.assign(points.size(), {});
     if (positions.size() < vertexCount())
         return;
-    parallelFor(std::min(points.size(), positions.size()), [&](std::size_t i) {
-        mat4d frame = frameOf(i, normalOf(i, positions), positions);
-        frame.inverse();
-        out[i] = transformAsPoint(points[i], frame);
-    });
+    const FrameTables tables{framesPairs_.data(), framesIndexer_.data(), vertexCount(), positions.data()};
+    VertexList(std::min(points.size(), positions.size()), nullptr)
+        .parallelForEachBlock([&](const std::size_t* vertices, std::size_t n) {
+            FrameBlock block;
+            block.measureNormals(tables, vertices, n);
+            block.buildAxes(tables, vertices, n);
+            for (std::size_t j = 0; j < n; ++j) {
+                const std::size_t i = vertices[j];
+                mat4d frame;
+                block.write(tables, j, i, frame);
+                frame.inverse();
+                out[i] = transformAsPoint(points[i], frame);
+            }
+        });
 }
 
 } // namespace quill

@@ -70,13 +70,6 @@ public:
                                 std::vector<val3<float>>& out) const;
 
 private:
-    bool hasPairs(std::size_t vertex) const {
-        return vertex < vertexCount() && framesIndexer_[vertex] != framesIndexer_[vertex + 1];
-    }
-    /// The unit normal of a vertex; zero when it has no pairs.
-    val3<float> normalOf(std::size_t vertex, const std::vector<val3<float>>& positions) const;
-    mat4d frameOf(std::size_t vertex, const val3<float>& normal, const std::vector<val3<float>>& positions) const;
-
     std::vector<std::uint32_t> framesPairs_;
     std::vector<std::uint32_t> framesIndexer_;
 };

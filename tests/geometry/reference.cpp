@@ -70,6 +70,22 @@ std::vector<std::vector<std::uint32_t>> cornerPairs(const Polygons& polygons, co
     return pairs;
 }
 
+quill::mat4d frame(std::uint32_t i, const std::vector<std::uint32_t>& pairs, const Points& positions) {
+    const auto o = positions[i];
+    if (pairs.empty())
+        return {{1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, o.x, o.y, o.z, 1}};
+    quill::val3<float> normal;
+    for (std::size_t p = 0; p < pairs.size(); p += 2)
+        normal += cross(positions[pairs[p]] - o, positions[pairs[p + 1]] - o);
+    normal.normalize();
+    auto tangent = positions[pairs[0]] - o;
+    tangent.normalize();
+    auto x = cross(normal, tangent);
+    x.normalize();
+    const auto y = cross(x, normal);
+    return {{x.x, x.y, x.z, 0, y.x, y.y, y.z, 0, normal.x, normal.y, normal.z, 0, o.x, o.y, o.z, 1}};
+}
+
 Points smooth(Points points, const quill::VertexConnections& connections, const Smoothing& smoothing) {
     const auto& indexer = connections.connectionsIndexer();
     for (std::size_t iteration = 0; iteration < smoothing.iterations; ++iteration) {

@@ -3,6 +3,7 @@
 
 #include "quill/IndexMapper.h"
 #include "quill/VertexConnections.h"
+#include "quill/mat4d.h"
 #include "quill/val3.h"
 
 #include <cstdint>
@@ -23,6 +24,9 @@ std::vector<std::set<std::uint32_t>> neighbours(const Polygons& polygons, const 
 // Corner pairs of every affected vertex, the tangent reference first. positions may be null.
 std::vector<std::vector<std::uint32_t>> cornerPairs(const Polygons& polygons, const quill::IndexMapper& map,
                                                     const Points* positions);
+
+// The frame of vertex i, whose pairs are two entries each.
+quill::mat4d frame(std::uint32_t i, const std::vector<std::uint32_t>& pairs, const Points& positions);
 
 struct Smoothing {
     std::size_t iterations = 1;
