@@ -36,6 +36,11 @@ changed_files() {
   fi
 }
 
+# Among all files every header is seen through a source that includes it.
+files_to_analyse() {
+  if [[ $1 == --all ]]; then cpp_files | grep '\.cpp$'; else changed_files; fi
+}
+
 # A header has no compile command of its own: the unit that compiles it alone, or the source beside it, stands for it.
 translation_units() {
   local file
@@ -59,7 +64,7 @@ check_format() {
 check_tidy() {
   local units
   configure asan
-  mapfile -t units < <(if [[ $1 == --all ]]; then cpp_files; else changed_files; fi | translation_units build/tidy)
+  mapfile -t units < <(files_to_analyse "$1" | translation_units build/tidy)
   say "static analysis: ${#units[@]} translation units"
   ((${#units[@]})) || return 0
   # findings come on standard output; standard error counts those in system headers, and says what went wrong
