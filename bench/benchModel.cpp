@@ -1,0 +1,237 @@
+// SPDX-License-Identifier: Apache-2.0
+// bench_model: the model runtime beside its yardsticks: the bare runtime for loading and running, and a loop of
+// std::from_chars over the file's text for the readers. In the table a "vertex" is one run, one load or one number of
+// the file.
+#include "harness.h"
+
+#include "nw_model/ModelMetadata.h"
+#include "nw_model/ModelSession.h"
+#include "nw_model/PrincipalShapes.h"
+#include "support/TemporaryFolder.h"
+
+#include <charconv>
+#include <cstdlib>
+#include <exception>
+#include <filesystem>
+#include <fstream>
+#include <iterator>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+#define ORT_API_MANUAL_INIT
+#include <onnxruntime_cxx_api.h>
+
+namespace {
+
+using bench::Phase;
+namespace fs = std::filesystem;
+
+constexpr const char* usage = "usage: bench_model [--csv FILE] [--seconds S] [--only PHASE]\n"
+                              "  --csv FILE    write the rows there as well\n"
+                              "  --seconds S   time for each row (default 0.4)\n"
+                              "  --only PHASE  phases whose name begins so\n";
+
+struct Options {
+    std::string csv;
+    double seconds = 0.4;
+    std::string only;
+};
+
+fs::path testModel(const std::string& name) {
+    return fs::path(NW_TEST_MODELS) / (name + ".onnx");
+}
+
+// A network run without ModelSession: tensors are wrapped once and written again by every run.
+class BareNetwork {
+public:
+    explicit BareNetwork(const fs::path& path)
+        : session_(env_, path.c_str(), options_)
+        , inputName_(session_.GetInputNameAllocated(0, Ort::AllocatorWithDefaultOptions()))
+        , outputName_(session_.GetOutputNameAllocated(0, Ort::AllocatorWithDefaultOptions()))
+        , input_(wrap(inputs_, session_.GetInputTypeInfo(0)))
+        , output_(wrap(outputs_, session_.GetOutputTypeInfo(0))) {}
+
+    std::size_t inputCount() const { return inputs_.size(); }
+    void run() {
+        const char* const inputNames[] = {inputName_.get()};
+        const char* const outputNames[] = {outputName_.get()};
+        session_.Run(Ort::RunOptions{nullptr}, inputNames, &input_, 1, outputNames, &output_, 1);
+    }
+
+private:
+    static Ort::Value wrap(std::vector<float>& values, const Ort::TypeInfo& type) {
+        const std::vector<std::int64_t> shape = type.GetTensorTypeAndShapeInfo().GetShape();
+        std::size_t count = 1;
+        for (const std::int64_t dimension : shape)
+            count *= static_cast<std::size_t>(dimension);
+        values.assign(count, 1.0F);
+        const auto memory = Ort::MemoryInfo::CreateCpu(OrtArenaAllocator, OrtMemTypeDefault);
+        return Ort::Value::CreateTensor<float>(memory, values.data(), count, shape.data(), shape.size());
+    }
+
+    Ort::Env env_{ORT_LOGGING_LEVEL_WARNING, "bench_model"};
+    Ort::SessionOptions options_;
+    Ort::Session session_;
+    Ort::AllocatedStringPtr inputName_, outputName_;
+    std::vector<float> inputs_, outputs_;
+    Ort::Value input_, output_;
+};
+
+Phase running(const std::string& model, neuralWarp::ModelSession& session, BareNetwork& bare) {
+    session.load(testModel(model), true);
+    const std::vector<float> inputs(bare.inputCount(), 1.0F);
+    Phase phase{"run", model, 1};
+    phase.ours = [&session, inputs] {
+        if (session.run(inputs).empty())
+            throw std::runtime_error(session.errorText());
+    };
+    phase.plain = [&bare] { bare.run(); };
+    return phase;
+}
+
+Phase loading(const std::string& model, neuralWarp::ModelSession& session) {
+    Phase phase{"load", model, 1};
+    phase.ours = [&session, model] {
+        session.load(testModel(model), true);
+        if (!session.isLoaded())
+            throw std::runtime_error(session.errorText());
+    };
+    phase.plain = [model] { const BareNetwork bare(testModel(model)); };
+    return phase;
+}
+
+// What any reader must do: fetch the text and convert every number in it.
+template <typename Number, typename Stored>
+void convertNumbers(const fs::path& path, std::vector<Stored>& values) {
+    std::ifstream file(path, std::ios::binary);
+    const std::string text(std::istreambuf_iterator<char>(file), {});
+    values.clear();
+    const char* at = text.data() + text.find('[');
+    for (const char* end = text.data() + text.size(); at != end;) {
+        Number number{};
+        const auto [next, error] = std::from_chars(at, end, number);
+        if (error == std::errc())
+            values.push_back(static_cast<Stored>(number));
+        at = error == std::errc() ? next : at + 1;
+    }
+}
+
+std::string shapesText(std::size_t shapes, std::size_t vertices) {
+    std::string text = "{\"principalShapeCount\": " + std::to_string(shapes) +
+                       ", \"principalVertCount\": " + std::to_string(vertices) + ", \"principalShapes\": [";
+    double value = 0.1234567890123456;
+    for (std::size_t s = 0; s < shapes; ++s) {
+        text += s == 0 ? "[" : "], [";
+        for (std::size_t i = 0; i < 3 * vertices; ++i) {
+            char number[32];
+            value = value * 3.9 * (1.0 - value); // spreads over ]0, 1[ with all its digits
+            std::snprintf(number, sizeof number, "%s%.17g", i == 0 ? "" : ", ", value - 0.5);
+            text += number;
+        }
+    }
+    return text + "]]}";
+}
+
+std::string metadataText(std::size_t indices) {
+    std::string text = "{\"subsetState\": \"partial\", \"affectMap\": [0";
+    for (std::size_t i = 1; i < indices; ++i)
+        text += ", " + std::to_string(7 * i);
+    return text + "]}";
+}
+
+fs::path write(const fs::path& path, const std::string& text) {
+    std::ofstream(path, std::ios::binary) << text;
+    return path;
+}
+
+Phase readingShapes(const fs::path& folder, std::vector<float>& values, std::vector<float>& plainValues) {
+    constexpr std::size_t shapes = 50, vertices = 4000;
+    const fs::path path = write(folder / "principal_shapes.json", shapesText(shapes, vertices));
+    Phase phase{"read shapes", "50 shapes", 3 * shapes * vertices, fs::file_size(path)};
+    phase.ours = [path, &values] {
+        std::uint64_t counts[2];
+        if (!neuralWarp::readPrincipalShapesFile(path, values, counts[0], counts[1]))
+            throw std::runtime_error("the shapes cannot be read");
+    };
+    phase.plain = [path, &plainValues] { convertNumbers<double>(path, plainValues); };
+    return phase;
+}
+
+Phase readingMetadata(const fs::path& folder, neuralWarp::ModelMetadata& record, std::vector<std::uint32_t>& plain) {
+    constexpr std::size_t indices = 100000;
+    const fs::path path = write(folder / "metadata.json", metadataText(indices));
+    Phase phase{"read metadata", "affectMap", indices, fs::file_size(path)};
+    phase.ours = [path, &record] {
+        if (!neuralWarp::readMetadataFile(record, path))
+            throw std::runtime_error("the metadata cannot be read");
+    };
+    phase.plain = [path, &plain] { convertNumbers<std::uint32_t>(path, plain); };
+    return phase;
+}
+
+void runAll(const Options& options, bench::Report& report) {
+    const TemporaryFolder folder;
+    neuralWarp::ModelSession direct, wide, loaded;
+    BareNetwork bareDirect(testModel("direct")), bareWide(testModel("wide"));
+    std::vector<float> values, plainValues;
+    neuralWarp::ModelMetadata record;
+    std::vector<std::uint32_t> plainIndices;
+    std::vector<Phase> phases = {
+        running("direct", direct, bareDirect),
+        running("wide", wide, bareWide),
+        loading("direct", loaded),
+        readingShapes(folder.path(), values, plainValues),
+        readingMetadata(folder.path(), record, plainIndices),
+    };
+    for (Phase& phase : phases) {
+        phase.parallel = false;
+        if (phase.name.rfind(options.only, 0) == 0)
+            report.add(bench::measure(phase, 1, options.seconds));
+    }
+}
+
+bool parse(int argc, char** argv, Options& options) {
+    for (int i = 1; i + 1 < argc; i += 2) {
+        const std::string name = argv[i];
+        if (name == "--csv")
+            options.csv = argv[i + 1];
+        else if (name == "--seconds")
+            options.seconds = std::atof(argv[i + 1]);
+        else if (name == "--only")
+            options.only = argv[i + 1];
+        else
+            return false;
+    }
+    return argc % 2 == 1;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    Options options;
+    if (!parse(argc, argv, options)) {
+        std::fputs(usage, stderr);
+        return 2;
+    }
+    const OrtApi* api = OrtGetApiBase()->GetApi(16);
+    std::FILE* csv = options.csv.empty() ? nullptr : std::fopen(options.csv.c_str(), "w");
+    if (!api || (!options.csv.empty() && !csv)) {
+        std::fprintf(stderr, "bench_model: %s\n", api ? "the CSV file cannot be written" : "ONNX Runtime is too old");
+        return 1;
+    }
+    Ort::InitApi(api);
+    int status = 0;
+    try {
+        bench::Report report(csv);
+        report.header();
+        runAll(options, report);
+        bench::Report::legend();
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "bench_model: %s\n", error.what());
+        status = 1;
+    }
+    if (csv)
+        std::fclose(csv);
+    return status;
+}
