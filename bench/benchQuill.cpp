@@ -34,17 +34,18 @@ struct Options {
     std::string only;
 };
 
-// Everything the phases of one mesh run on.
+// Everything the phases of one mesh run on. Ours and the plain loop work on the same arrays: where those happen to lie
+// in memory must not decide between them.
 struct Subject {
     std::string name;
     std::size_t n;
-    Points points, smoothed, plainSmoothed, scratch, plainScratch;
+    Points points, smoothed, scratch;
     quill::MeshTopology topology;
     quill::IndexMapper map;
     quill::VertexConnections connections, rebuilt;
     quill::VertexFrames frames, rebuiltFrames;
-    std::vector<float> weights, plainWeights, floats;
-    std::vector<quill::mat4d> matrices, plainMatrices;
+    std::vector<float> weights, floats;
+    std::vector<quill::mat4d> matrices;
     quill::mat4d motion{{0.8, 0.6, 0, 0, -0.6, 0.8, 0, 0, 0, 0, 1, 0, 1e-3, 2e-3, 0, 1}};
 
     Subject(std::string nameIn, const ZooMesh& mesh)
@@ -52,17 +53,13 @@ struct Subject {
         , n(mesh.vertexCount())
         , points(mesh.points)
         , smoothed(points)
-        , plainSmoothed(points)
         , scratch(n)
-        , plainScratch(n)
         , topology(mesh.topology())
-        , matrices(n)
-        , plainMatrices(n) {
+        , matrices(n) {
         map.setIdentity(n);
         connections.build(topology, map, 0, false);
         frames.build(topology, map, &points);
         connections.calculateConnectionWeights(weights, points, 1.0, 0.0);
-        plainWeights = weights;
         floats.resize(16 * n);
     }
 
@@ -85,9 +82,9 @@ Phase smoothing(Subject& s, EigenProduct& eigen) {
     phase.ours = [&s] { s.connections.mushArray(s.smoothed, s.scratch, passes, 1.0F, nullptr, &s.weights, false); };
     phase.plain = [&s] {
         for (std::size_t i = 0; i < passes; ++i) {
-            s.plainScratch.swap(s.plainSmoothed);
-            plain::smoothingPass(s.plainScratch, s.plainSmoothed, s.connections.connectionsIndexer(),
-                                 s.connections.connections(), s.weights);
+            s.scratch.swap(s.smoothed);
+            plain::smoothingPass(s.scratch, s.smoothed, s.connections.connectionsIndexer(), s.connections.connections(),
+                                 s.weights);
         }
     };
     phase.eigen = [&eigen] {
@@ -101,8 +98,7 @@ Phase weighing(Subject& s) {
     Phase phase = s.phase("weights", 12 * s.n + tableBytes(s) + 4 * s.weights.size());
     phase.ours = [&s] { s.connections.calculateConnectionWeights(s.weights, s.points, 1.0, 0.0); };
     phase.plain = [&s] {
-        plain::connectionWeights(s.plainWeights, s.points, s.connections.connectionsIndexer(),
-                                 s.connections.connections());
+        plain::connectionWeights(s.weights, s.points, s.connections.connectionsIndexer(), s.connections.connections());
     };
     return phase;
 }
@@ -111,7 +107,7 @@ Phase framing(Subject& s, bool invert) {
     Phase phase = s.phase(invert ? "rest frames" : "frames", (12 + sizeof(quill::mat4d)) * s.n + pairBytes(s));
     phase.ours = [&s, invert] { s.frames.calculateFrames(s.matrices, s.points, s.map, invert, nullptr); };
     phase.plain = [&s, invert] {
-        plain::frames(s.plainMatrices, s.points, s.frames.framesIndexer(), s.frames.framesPairs(), invert);
+        plain::frames(s.matrices, s.points, s.frames.framesIndexer(), s.frames.framesPairs(), invert);
     };
     return phase;
 }
@@ -119,14 +115,14 @@ Phase framing(Subject& s, bool invert) {
 Phase transforming(Subject& s) {
     Phase phase = s.phase("multAsPoint", 24 * s.n);
     phase.ours = [&s] { quill::multAsPoint(s.smoothed, s.motion); };
-    phase.plain = [&s] { plain::transformPoints(s.plainSmoothed, s.motion); };
+    phase.plain = [&s] { plain::transformPoints(s.smoothed, s.motion); };
     return phase;
 }
 
 Phase inverting(Subject& s) {
     Phase phase = s.phase("invertFrames", 2 * sizeof(quill::mat4d) * s.n);
     phase.ours = [&s] { quill::invertFrames(s.matrices); };
-    phase.plain = [&s] { plain::invertFrames(s.plainMatrices); };
+    phase.plain = [&s] { plain::invertFrames(s.matrices); };
     return phase;
 }
 
