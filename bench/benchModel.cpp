@@ -80,17 +80,6 @@ Phase running(const std::string& model, neuralWarp::ModelSession& session, BareN
     return phase;
 }
 
-Phase loading(const std::string& model, neuralWarp::ModelSession& session) {
-    Phase phase{"load", model, 1};
-    phase.ours = [&session, model] {
-        session.load(testModel(model), true);
-        if (!session.isLoaded())
-            throw std::runtime_error(session.errorText());
-    };
-    phase.plain = [model] { const BareNetwork bare(testModel(model)); };
-    return phase;
-}
-
 // What any reader must do: fetch the text and convert every number in it.
 template <typename Number, typename Stored>
 void convertNumbers(const fs::path& path, std::vector<Stored>& values) {
@@ -162,7 +151,7 @@ Phase readingMetadata(const fs::path& folder, neuralWarp::ModelMetadata& record,
 
 void runAll(const bench::Options& options, bench::Report& report) {
     const TemporaryFolder folder;
-    neuralWarp::ModelSession direct, wide, loaded;
+    neuralWarp::ModelSession direct, wide;
     BareNetwork bareDirect(testModel("direct")), bareWide(testModel("wide"));
     std::vector<float> values, plainValues;
     neuralWarp::ModelMetadata record;
@@ -170,7 +159,6 @@ void runAll(const bench::Options& options, bench::Report& report) {
     std::vector<Phase> phases = {
         running("direct", direct, bareDirect),
         running("wide", wide, bareWide),
-        loading("direct", loaded),
         readingShapes(folder.path(), values, plainValues),
         readingMetadata(folder.path(), record, plainIndices),
     };
@@ -195,7 +183,7 @@ int main(int argc, char** argv) {
         bench::Report report(options->csv.get());
         report.header();
         runAll(*options, report);
-        bench::Report::legend();
+        bench::Report::legend("the bare runtime, or a loop that only converts a file's numbers");
         std::printf("CSV: %s\n", options->csvPath.c_str());
         return 0;
     } catch (const std::exception& error) {

@@ -201,7 +201,7 @@ int main(int argc, char** argv) {
     bool ok = runOnCores(1, *options);
     if (const std::size_t cores = std::thread::hardware_concurrency(); cores > 1)
         ok = runOnCores(cores, *options) && ok;
-    bench::Report::legend();
+    bench::Report::legend("a plain loop of the same shape, or a set per vertex");
     std::printf("CSV: %s\n", options->csvPath.c_str());
     return ok ? 0 : 1;
 }
