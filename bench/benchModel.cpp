@@ -3,6 +3,7 @@
 // std::from_chars over the file's text for the readers. In the table a "vertex" is one run, one load or one number of
 // the file.
 #include "harness.h"
+#include "options.h"
 
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
@@ -26,17 +27,6 @@ namespace {
 
 using bench::Phase;
 namespace fs = std::filesystem;
-
-constexpr const char* usage = "usage: bench_model [--csv FILE] [--seconds S] [--only PHASE]\n"
-                              "  --csv FILE    write the rows there as well\n"
-                              "  --seconds S   time for each row (default 0.4)\n"
-                              "  --only PHASE  phases whose name begins so\n";
-
-struct Options {
-    std::string csv;
-    double seconds = 0.4;
-    std::string only;
-};
 
 fs::path testModel(const std::string& name) {
     return fs::path(NW_TEST_MODELS) / (name + ".onnx");
@@ -87,17 +77,6 @@ Phase running(const std::string& model, neuralWarp::ModelSession& session, BareN
             throw std::runtime_error(session.errorText());
     };
     phase.plain = [&bare] { bare.run(); };
-    return phase;
-}
-
-Phase loading(const std::string& model, neuralWarp::ModelSession& session) {
-    Phase phase{"load", model, 1};
-    phase.ours = [&session, model] {
-        session.load(testModel(model), true);
-        if (!session.isLoaded())
-            throw std::runtime_error(session.errorText());
-    };
-    phase.plain = [model] { const BareNetwork bare(testModel(model)); };
     return phase;
 }
 
@@ -170,9 +149,9 @@ Phase readingMetadata(const fs::path& folder, neuralWarp::ModelMetadata& record,
     return phase;
 }
 
-void runAll(const Options& options, bench::Report& report) {
+void runAll(const bench::Options& options, bench::Report& report) {
     const TemporaryFolder folder;
-    neuralWarp::ModelSession direct, wide, loaded;
+    neuralWarp::ModelSession direct, wide;
     BareNetwork bareDirect(testModel("direct")), bareWide(testModel("wide"));
     std::vector<float> values, plainValues;
     neuralWarp::ModelMetadata record;
@@ -180,7 +159,6 @@ void runAll(const Options& options, bench::Report& report) {
     std::vector<Phase> phases = {
         running("direct", direct, bareDirect),
         running("wide", wide, bareWide),
-        loading("direct", loaded),
         readingShapes(folder.path(), values, plainValues),
         readingMetadata(folder.path(), record, plainIndices),
     };
@@ -191,47 +169,25 @@ void runAll(const Options& options, bench::Report& report) {
     }
 }
 
-bool parse(int argc, char** argv, Options& options) {
-    for (int i = 1; i + 1 < argc; i += 2) {
-        const std::string name = argv[i];
-        if (name == "--csv")
-            options.csv = argv[i + 1];
-        else if (name == "--seconds")
-            options.seconds = std::atof(argv[i + 1]);
-        else if (name == "--only")
-            options.only = argv[i + 1];
-        else
-            return false;
-    }
-    return argc % 2 == 1;
-}
-
 } // namespace
 
 int main(int argc, char** argv) {
-    Options options;
-    if (!parse(argc, argv, options)) {
-        std::fputs(usage, stderr);
+    const auto options = bench::readOptions(argc, argv);
+    if (!options)
         return 2;
-    }
-    const OrtApi* api = OrtGetApiBase()->GetApi(16);
-    std::FILE* csv = options.csv.empty() ? nullptr : std::fopen(options.csv.c_str(), "w");
-    if (!api || (!options.csv.empty() && !csv)) {
-        std::fprintf(stderr, "bench_model: %s\n", api ? "the CSV file cannot be written" : "ONNX Runtime is too old");
-        return 1;
-    }
-    Ort::InitApi(api);
-    int status = 0;
     try {
-        bench::Report report(csv);
+        const OrtApi* api = OrtGetApiBase()->GetApi(16);
+        if (!api)
+            throw std::runtime_error("ONNX Runtime is too old");
+        Ort::InitApi(api);
+        bench::Report report(options->csv.get());
         report.header();
-        runAll(options, report);
-        bench::Report::legend();
+        runAll(*options, report);
+        bench::Report::legend("the bare runtime, or a loop that only converts a file's numbers");
+        std::printf("CSV: %s\n", options->csvPath.c_str());
+        return 0;
     } catch (const std::exception& error) {
         std::fprintf(stderr, "bench_model: %s\n", error.what());
-        status = 1;
+        return 1;
     }
-    if (csv)
-        std::fclose(csv);
-    return status;
 }

@@ -3,6 +3,7 @@
 // core and on all. See Report::legend for the columns.
 #include "eigenProduct.h"
 #include "harness.h"
+#include "options.h"
 #include "plainLoops.h"
 #include "probes.h"
 #include "support/meshZoo.h"
@@ -22,17 +23,6 @@ namespace {
 
 using bench::Phase;
 using plain::Points;
-
-constexpr const char* usage = "usage: bench_quill [--csv FILE] [--seconds S] [--only PHASE]\n"
-                              "  --csv FILE    write the rows there as well\n"
-                              "  --seconds S   time for each row (default 0.4)\n"
-                              "  --only PHASE  phases whose name begins so\n";
-
-struct Options {
-    std::string csv;
-    double seconds = 0.4;
-    std::string only;
-};
 
 // Everything the phases of one mesh run on. Ours and the plain loop work on the same arrays: where those happen to lie
 // in memory must not decide between them.
@@ -151,8 +141,8 @@ Phase buildingFrames(Subject& s) {
     return phase;
 }
 
-void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::size_t threads, const Options& options,
-             bench::Report& report) {
+void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::size_t threads,
+             const bench::Options& options, bench::Report& report) {
     Subject s(name, mesh);
     EigenProduct eigen(s.connections, s.weights, s.points);
     std::vector<Phase> phases{smoothing(s, eigen), framing(s, false)};
@@ -166,7 +156,7 @@ void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::
             report.add(bench::measure(phase, threads, options.seconds));
 }
 
-void runAll(std::size_t threads, const Options& options, bench::Report& report) {
+void runAll(std::size_t threads, const bench::Options& options, bench::Report& report) {
     struct Size {
         std::size_t gridSide;
         std::size_t subdivisions; // 4^s * 10 + 2 vertices
@@ -180,7 +170,7 @@ void runAll(std::size_t threads, const Options& options, bench::Report& report) 
 }
 
 // In a process of its own, since the cores must be fixed before the first thread starts.
-bool runOnCores(std::size_t count, const Options& options, std::FILE* csv) {
+bool runOnCores(std::size_t count, const bench::Options& options) {
     std::fflush(nullptr);
     const pid_t child = fork();
     if (child < 0)
@@ -191,7 +181,7 @@ bool runOnCores(std::size_t count, const Options& options, std::FILE* csv) {
     }
     int status = 0;
     try {
-        bench::Report report(csv);
+        bench::Report report(options.csv.get());
         runAll(bench::useCores(count), options, report);
     } catch (const std::exception& error) {
         std::fprintf(stderr, "bench_quill: %s\n", error.what());
@@ -201,40 +191,17 @@ bool runOnCores(std::size_t count, const Options& options, std::FILE* csv) {
     _exit(status);
 }
 
-bool parse(int argc, char** argv, Options& options) {
-    for (int i = 1; i + 1 < argc; i += 2) {
-        const std::string name = argv[i];
-        if (name == "--csv")
-            options.csv = argv[i + 1];
-        else if (name == "--seconds")
-            options.seconds = std::atof(argv[i + 1]);
-        else if (name == "--only")
-            options.only = argv[i + 1];
-        else
-            return false;
-    }
-    return argc % 2 == 1;
-}
-
 } // namespace
 
 int main(int argc, char** argv) {
-    Options options;
-    if (!parse(argc, argv, options)) {
-        std::fputs(usage, stderr);
+    const auto options = bench::readOptions(argc, argv);
+    if (!options)
         return 2;
-    }
-    std::FILE* csv = options.csv.empty() ? nullptr : std::fopen(options.csv.c_str(), "w");
-    if (!options.csv.empty() && !csv) {
-        std::fprintf(stderr, "bench_quill: %s cannot be written\n", options.csv.c_str());
-        return 1;
-    }
-    bench::Report(csv).header();
-    bool ok = runOnCores(1, options, csv);
+    bench::Report(options->csv.get()).header();
+    bool ok = runOnCores(1, *options);
     if (const std::size_t cores = std::thread::hardware_concurrency(); cores > 1)
-        ok = runOnCores(cores, options, csv) && ok;
-    bench::Report::legend();
-    if (csv)
-        std::fclose(csv);
+        ok = runOnCores(cores, *options) && ok;
+    bench::Report::legend("a plain loop of the same shape, or a set per vertex");
+    std::printf("CSV: %s\n", options->csvPath.c_str());
     return ok ? 0 : 1;
 }

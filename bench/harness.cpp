@@ -142,14 +142,16 @@ void Report::add(const Row& row) {
     }
 }
 
-void Report::legend() {
-    std::puts("ns/vert  median per vertex (and pass); best: the fastest sample; spread: (p90 - p10) / median\n"
-              "GB/s     bytes that must move over the median\n"
-              "/plain   our time over the plain loop's, same loop shape (below 1: we are faster); building: over sets\n"
-              "Eigen/   the time of Eigen's row-major sparse product, on one core, over ours (above 1: we are faster)\n"
-              "/limit   our time over a triad's that moves the same bytes (1: as fast as memory allows)\n"
-              "cores    cores at work beside the measurement; *: they were not all there, do not quote the row\n"
-              "Ratios are medians over alternating samples of one run.");
+void Report::legend(const char* plain) {
+    std::printf(
+        "ns/vert  median per vertex (and pass); best: the fastest sample; spread: (p90 - p10) / median\n"
+        "GB/s     bytes that must move over the median\n"
+        "/plain   our time over that of the plain way (below 1: we are faster), which is %s\n"
+        "Eigen/   the time of Eigen's row-major sparse product, on one core, over ours (above 1: we are faster)\n"
+        "/limit   our time over a triad's that moves the same bytes (1: as fast as memory allows)\n"
+        "cores    cores at work beside the measurement; *: they were not all there, do not quote the row\n"
+        "Ratios are medians over alternating samples of one run.\n",
+        plain);
 }
 
 } // namespace bench

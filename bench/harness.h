@@ -48,7 +48,8 @@ public:
         : csv_(csv) {}
     void header();
     void add(const Row& row);
-    static void legend();
+    // Explains the columns. plain: what the column "/plain" is held against.
+    static void legend(const char* plain);
 
 private:
     std::FILE* csv_;

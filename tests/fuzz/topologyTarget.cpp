@@ -18,7 +18,9 @@ void require(bool condition) {
 // Takes small numbers off the front of the input; zeros when it is used up.
 class Bytes {
 public:
-    Bytes(const std::uint8_t* data, std::size_t size) : data_(data), end_(data + size) {}
+    Bytes(const std::uint8_t* data, std::size_t size)
+        : data_(data)
+        , end_(data + size) {}
 
     std::uint8_t byte() { return data_ == end_ ? std::uint8_t{0} : *data_++; }
     bool bit() { return byte() % 2 == 1; }
@@ -38,7 +40,8 @@ public:
         if (small != 0xFF)
             return static_cast<float>(small) * 0.125F;
         // any bits at all: huge, tiny, infinite, not a number
-        return std::bit_cast<float>(static_cast<std::uint32_t>(byte()) << 24U | static_cast<std::uint32_t>(byte()) << 16U);
+        return std::bit_cast<float>(static_cast<std::uint32_t>(byte()) << 24U | static_cast<std::uint32_t>(byte())
+                                                                                    << 16U);
     }
 
 private:

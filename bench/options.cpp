@@ -1,0 +1,49 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "options.h"
+
+#include <cstdlib>
+#include <filesystem>
+
+namespace bench {
+namespace {
+
+constexpr const char* usage = "usage: %s [--seconds S] [--only PHASE] [--csv FOLDER]\n"
+                              "  --seconds S   time for each row (default 0.4)\n"
+                              "  --only PHASE  phases whose name begins so\n"
+                              "  --csv FOLDER  where the rows go as NAME.csv as well (default: beside the program)\n";
+
+bool parse(int argc, char** argv, Options& options, std::filesystem::path& folder) {
+    for (int i = 1; i + 1 < argc; i += 2) {
+        const std::string name = argv[i];
+        if (name == "--csv")
+            folder = argv[i + 1];
+        else if (name == "--seconds")
+            options.seconds = std::atof(argv[i + 1]);
+        else if (name == "--only")
+            options.only = argv[i + 1];
+        else
+            return false;
+    }
+    return argc % 2 == 1 && options.seconds > 0.0;
+}
+
+} // namespace
+
+std::optional<Options> readOptions(int argc, char** argv) {
+    const std::filesystem::path program = argv[0];
+    std::filesystem::path folder = program.parent_path();
+    Options options;
+    if (!parse(argc, argv, options, folder)) {
+        std::fprintf(stderr, usage, program.filename().c_str());
+        return std::nullopt;
+    }
+    options.csvPath = (folder / program.filename()).string() + ".csv";
+    options.csv.reset(std::fopen(options.csvPath.c_str(), "w"));
+    if (!options.csv) {
+        std::fprintf(stderr, "%s: %s cannot be written\n", program.filename().c_str(), options.csvPath.c_str());
+        return std::nullopt;
+    }
+    return options;
+}
+
+} // namespace bench
