@@ -23,7 +23,6 @@ declare -A probe_of=(
   [rapidjson-dev]=rapidjson/document.h
   [libgtest-dev]=gtest/gtest.h
   [libgmock-dev]=gmock/gmock.h
-  [libbenchmark-dev]=benchmark/benchmark.h
   [libeigen3-dev]=eigen3/Eigen/Core
   [npm]=npm
   [clang-14]=clang++-14

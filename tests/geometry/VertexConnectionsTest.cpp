@@ -112,7 +112,7 @@ TEST(VertexConnections, WeightsAverageOnePerVertex) {
 
 TEST(VertexConnections, WeightsFallWithDistance) {
     const auto connections = star(2);
-    const auto weightsAt = [&](Points points, double exponent, double offset) {
+    const auto weightsAt = [&](const Points& points, double exponent, double offset) {
         std::vector<float> weights;
         connections.calculateConnectionWeights(weights, points, exponent, offset);
         return weights;

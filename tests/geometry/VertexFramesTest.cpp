@@ -17,7 +17,6 @@ namespace {
 using quill::mat4d;
 using quill::VertexFrames;
 using testing::ElementsAre;
-using testing::IsEmpty;
 using Points = std::vector<quill::val3<float>>;
 using Vector = quill::val3<double>;
 

@@ -49,6 +49,7 @@ std::vector<Case> readCases(const std::filesystem::path& folder) {
             files.push_back(entry.path());
     std::sort(files.begin(), files.end());
     std::vector<Case> cases;
+    cases.reserve(files.size());
     for (const auto& file : files)
         cases.push_back(readCase(file));
     return cases;

@@ -14,7 +14,7 @@ namespace replay {
 namespace {
 
 std::filesystem::path writeFile(const TemporaryFolder& folder, const std::string& text) {
-    const auto path = folder.path() / "case.json";
+    auto path = folder.path() / "case.json";
     std::ofstream stream(path, std::ios::binary);
     if (!stream.write(text.data(), static_cast<std::streamsize>(text.size())).flush())
         throw std::runtime_error(path.string() + " cannot be written");

@@ -69,7 +69,7 @@ bool noticed(const Kind& kind, const Candidate& candidate) {
 
 } // namespace
 
-SelfCheckResult selfCheck(const Kind& kind, std::vector<Case*> cases) {
+SelfCheckResult selfCheck(const Kind& kind, const std::vector<Case*>& cases) {
     Candidates candidates;
     for (Case* owner : cases)
         candidates.collect(*owner, owner->expected(), "", "");
