@@ -82,13 +82,16 @@ Row measure(const Phase& phase, std::size_t threads, double seconds) {
         triadArrays.emplace(phase.bytes);
         triad.emplace([&] { triadArrays->run(); });
     }
+    std::vector<Candidate*> inTurn{&ours};
+    for (auto* yardstick : {&plain, &eigen, &triad})
+        if (*yardstick)
+            inTurn.push_back(&**yardstick);
     const std::size_t warmUpCalls = phase.parallel ? 3 : 0; // building takes long, and starts from cold arrays in life
     const auto start = Clock::now();
     while (ours.seconds.size() < fewestRounds || secondsSince(start) < seconds) {
-        ours.sample(warmUpCalls);
-        for (auto* yardstick : {&plain, &eigen, &triad})
-            if (*yardstick)
-                (*yardstick)->sample(warmUpCalls);
+        for (Candidate* candidate : inTurn)
+            candidate->sample(warmUpCalls);
+        std::reverse(inTurn.begin(), inTurn.end()); // nobody always comes after the same other one
     }
     const double units = static_cast<double>(phase.perCall);
     row.cores = std::min(coresBefore, coresAtWork(threads));

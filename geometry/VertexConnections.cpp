@@ -85,9 +85,11 @@ void VertexConnections::build(const MeshTopology& topology, const IndexMapper& m
 void VertexConnections::calculateConnectionWeights(std::vector<float>& weights,
                                                    const std::vector<val3<float>>& positions, double exponent,
                                                    double offset) const {
-    weights.assign(connections_.size(), 1.0F);
-    if (std::abs(exponent) < 1e-5 || positions.size() < vertexCount())
+    if (std::abs(exponent) < 1e-5 || positions.size() < vertexCount()) {
+        weights.assign(connections_.size(), 1.0F);
         return;
+    }
+    weights.resize(connections_.size()); // each entry is some vertex's, and written below
     // plain pointers: after a store to a weight the compiler would load the vectors' own again
     const std::uint32_t* const indexer = connectionsIndexer_.data();
     const std::uint32_t* const connections = connections_.data();

@@ -7,7 +7,6 @@ std::size_t availableSmoothingKernels(SmoothingKernel* out) {
     std::size_t count = 0;
     out[count++] = smoothScalar;
 #if defined(__x86_64__)
-    out[count++] = smoothSse2;
     if (__builtin_cpu_supports("avx"))
         out[count++] = smoothAvx;
 #endif
@@ -16,7 +15,7 @@ std::size_t availableSmoothingKernels(SmoothingKernel* out) {
 
 SmoothingKernel smoothingKernel() {
     static const SmoothingKernel fastest = [] {
-        SmoothingKernel kernels[3];
+        SmoothingKernel kernels[2];
         return kernels[availableSmoothingKernels(kernels) - 1];
     }();
     return fastest;

@@ -28,14 +28,11 @@ using SmoothingKernel = void (*)(const SmoothingPass& pass, const val3<float>* s
 
 void smoothScalar(const SmoothingPass& pass, const val3<float>* source, val3<float>* destination, std::size_t begin,
                   std::size_t end);
-// Only on x86-64, whose every processor has SSE2.
-void smoothSse2(const SmoothingPass& pass, const val3<float>* source, val3<float>* destination, std::size_t begin,
-                std::size_t end);
 // Only on x86-64, and only to be called where the processor has AVX.
 void smoothAvx(const SmoothingPass& pass, const val3<float>* source, val3<float>* destination, std::size_t begin,
                std::size_t end);
 
-// The kernels that this processor can run, the fastest last; `out` has room for 3. Gives their number.
+// The kernels that this processor can run, the fastest last; out has room for 2. Gives their number.
 std::size_t availableSmoothingKernels(SmoothingKernel* out);
 
 // The fastest of them, chosen once.
