@@ -6,6 +6,7 @@
 #include <tbb/partitioner.h>
 
 #include <cstddef>
+#include <limits>
 
 namespace quill {
 
@@ -17,8 +18,9 @@ namespace quill {
 /// An exception thrown by body cancels the loop and is rethrown to the caller.
 template <typename Body>
 void parallelForRange(std::size_t count, const Body& body) {
+    const int end = count <= static_cast<std::size_t>(std::numeric_limits<int>::max()) ? static_cast<int>(count) : 0;
     tbb::parallel_for(
-        tbb::blocked_range<int>(0, static_cast<int>(count), 1),
+        tbb::blocked_range<int>(0, end, 1),
         [&body](const tbb::blocked_range<int>& range) { body(range.begin(), range.end()); }, tbb::auto_partitioner());
 }
 

@@ -21,7 +21,7 @@ for folder in root home/ann work Users/Ann; do
   try 1 "set(DIR \"/$folder/project\")"
   try 1 "/$folder/project"
 done
-for host in registry.example.org npm.example.org/registry deb.debian.org mirror.example.org; do
+for host in registry.example.org npm.example.org/registry deb.""debian.org mirror.example.org; do
   try 1 "get https:/""/$host/package"
 done
 try 1 "  \"resolved\""": \"somewhere\""

@@ -60,12 +60,9 @@ struct Tally {
 };
 
 void reportDisagreements(const Case& testCase, const std::vector<replay::Disagreement>& disagreements) {
-    constexpr std::size_t most = 10;
-    for (std::size_t i = 0; i < std::min(most, disagreements.size()); ++i)
-        std::printf("%s: %s: expected %s, got %s\n", testCase.name.c_str(), disagreements[i].where.c_str(),
-                    disagreements[i].expected.c_str(), disagreements[i].actual.c_str());
-    if (disagreements.size() > most)
-        std::printf("%s: and %zu more\n", testCase.name.c_str(), disagreements.size() - most);
+    for (const auto& [where, expected, actual] : disagreements)
+        std::printf("%s: %s: expected %s, got %s\n", testCase.name.c_str(), where.c_str(), expected.c_str(),
+                    actual.c_str());
 }
 
 void replayKind(const Kind& kind, const std::vector<Case*>& cases, bool exact, Tally& tally) {
