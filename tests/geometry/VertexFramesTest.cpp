@@ -207,15 +207,21 @@ TEST(VertexFrames, SmoothedNormalsAreTheWeightedSumOfNeighbours) {
     std::vector<float> weights;
     built.connections.calculateConnectionWeights(weights, built.points, 1.0, 0.0);
     const auto plain = built.on(built.points);
-    std::vector<mat4d> smoothed;
-    built.frames.calculateFrames(smoothed, built.points, indexer, neighbours, weights, 1, built.map, false, nullptr);
-    for (std::size_t v = 0; v < plain.size(); ++v) {
-        Vector expected = row(plain[v], 2);
-        for (std::size_t k = indexer[v]; k < indexer[v + 1]; ++k)
-            expected += static_cast<double>(weights[k]) * row(plain[neighbours[k]], 2);
-        expected.normalize();
-        EXPECT_LT(length(row(smoothed[v], 2) - expected), 1e-6);
-        EXPECT_NEAR(dot(row(smoothed[v], 0), row(smoothed[v], 2)), 0.0, 1e-6);
+    std::vector<Vector> normals;
+    for (const mat4d& frame : plain)
+        normals.push_back(row(frame, 2));
+    for (std::size_t passes = 1; passes <= 3; ++passes) {
+        const std::vector<Vector> before = normals;
+        std::vector<mat4d> smoothed;
+        built.frames.calculateFrames(smoothed, built.points, indexer, neighbours, weights, passes, built.map, false,
+                                     nullptr);
+        for (std::size_t v = 0; v < plain.size(); ++v) {
+            for (std::size_t k = indexer[v]; k < indexer[v + 1]; ++k)
+                normals[v] += static_cast<double>(weights[k]) * before[neighbours[k]];
+            normals[v].normalize();
+            EXPECT_LT(length(row(smoothed[v], 2) - normals[v]), 1e-6) << passes << " passes, vertex " << v;
+            EXPECT_NEAR(dot(row(smoothed[v], 0), row(smoothed[v], 2)), 0.0, 1e-6);
+        }
     }
     std::vector<mat4d> zeroPasses;
     built.frames.calculateFrames(zeroPasses, built.points, indexer, neighbours, weights, 0, built.map, false, nullptr);
