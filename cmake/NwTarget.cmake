@@ -23,6 +23,11 @@ function(nw_target target)
     POSITION_INDEPENDENT_CODE ON)
   target_compile_options(${target} PRIVATE
     ${NW_NUMERIC_FLAGS} ${NW_WARNINGS} $<$<BOOL:${NW_WARNINGS_AS_ERRORS}>:-Werror>)
+  # the fuzzer only steers by code that counts its edges, and that is the libraries' above all
+  if(NW_BUILD_FUZZ)
+    target_compile_options(${target} PRIVATE -fsanitize=fuzzer-no-link)
+    target_link_options(${target} PRIVATE -fsanitize=fuzzer-no-link)
+  endif()
   if(NW_SANITIZE)
     target_compile_options(${target} PRIVATE
       -fsanitize=${NW_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
