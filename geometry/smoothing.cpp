@@ -9,13 +9,15 @@ std::size_t availableSmoothingKernels(SmoothingKernel* out) {
 #if defined(__x86_64__)
     if (__builtin_cpu_supports("avx"))
         out[count++] = smoothAvx;
+    if (__builtin_cpu_supports("avx512vl"))
+        out[count++] = smoothAvx512;
 #endif
     return count;
 }
 
 SmoothingKernel smoothingKernel() {
     static const SmoothingKernel fastest = [] {
-        SmoothingKernel kernels[2];
+        SmoothingKernel kernels[3];
         return kernels[availableSmoothingKernels(kernels) - 1];
     }();
     return fastest;

@@ -32,7 +32,11 @@ void smoothScalar(const SmoothingPass& pass, const val3<float>* source, val3<flo
 void smoothAvx(const SmoothingPass& pass, const val3<float>* source, val3<float>* destination, std::size_t begin,
                std::size_t end);
 
-// The kernels that this processor can run, the fastest last; out has room for 2. Gives their number.
+// Only on x86-64, and only to be called where the processor has AVX-512VL.
+void smoothAvx512(const SmoothingPass& pass, const val3<float>* source, val3<float>* destination, std::size_t begin,
+                  std::size_t end);
+
+// The kernels that this processor can run, the fastest last; out has room for 3. Gives their number.
 std::size_t availableSmoothingKernels(SmoothingKernel* out);
 
 // The fastest of them, chosen once.

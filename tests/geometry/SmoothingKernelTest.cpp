@@ -33,7 +33,7 @@ bool sameBits(const Points& a, const Points& b) {
 }
 
 TEST(SmoothingKernel, EveryKernelGivesTheScalarBits) {
-    std::array<quill::SmoothingKernel, 2> kernels{};
+    std::array<quill::SmoothingKernel, 3> kernels{};
     const std::size_t count = quill::availableSmoothingKernels(kernels.data());
     ASSERT_EQ(kernels[0], &quill::smoothScalar);
     RecordProperty("kernels", static_cast<int>(count));
