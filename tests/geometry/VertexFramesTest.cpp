@@ -208,6 +208,7 @@ TEST(VertexFrames, SmoothedNormalsAreTheWeightedSumOfNeighbours) {
     built.connections.calculateConnectionWeights(weights, built.points, 1.0, 0.0);
     const auto plain = built.on(built.points);
     std::vector<Vector> normals;
+    normals.reserve(plain.size());
     for (const mat4d& frame : plain)
         normals.push_back(row(frame, 2));
     for (std::size_t passes = 1; passes <= 3; ++passes) {
