@@ -1,0 +1,54 @@
+// SPDX-License-Identifier: Apache-2.0
+// What wraps the body of every operation of the API that can fail: the fault on demand, and exceptions made statuses.
+#pragma once
+
+#include "faults/FaultPoints.h"
+#include "openquarn/HStatus.h"
+
+#include <exception>
+#include <new>
+#include <string>
+#include <utility>
+
+namespace OpenQuarn {
+
+/// The failing status of a fault on demand.
+HStatus faultStatus(FaultPoint point) noexcept;
+
+/// The status of an exception that is being handled: kInsufficientMemory for std::bad_alloc, else kFailure with its
+/// text. `operation` names what threw.
+HStatus statusOfException(const char* operation) noexcept;
+
+/// For an operation that returns a status: `return apiCall(FaultPoint::HPlug_setString, [&] { … });`
+template <class Body>
+HStatus apiCall(FaultPoint point, Body&& body) noexcept {
+    if (faultFires(point))
+        return faultStatus(point);
+    try {
+        return std::forward<Body>(body)();
+    } catch (...) {
+        return statusOfException(faultPointName(point));
+    }
+}
+
+/// For an operation that returns a value and writes its status where the caller asks for it. The body gets a status
+/// that starts as success, and its value is returned as it is; `fallback` is returned when it does not run or throws.
+template <class Value, class Body>
+Value apiValue(FaultPoint point, HStatus* status, Value fallback, Body&& body) noexcept {
+    HStatus outcome;
+    Value value = fallback;
+    if (faultFires(point)) {
+        outcome = faultStatus(point);
+    } else {
+        try {
+            value = std::forward<Body>(body)(outcome);
+        } catch (...) {
+            outcome = statusOfException(faultPointName(point));
+        }
+    }
+    if (status)
+        *status = outcome;
+    return value;
+}
+
+} // namespace OpenQuarn

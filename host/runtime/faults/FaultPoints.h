@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+// The table of operations that can be made to fail on demand. One row for each operation of the API that can fail:
+// overloads share a row. A family keeps its rows in a .def file of its own: FAULT_POINT(Class, operation).
+#pragma once
+
+#include <atomic>
+
+namespace OpenQuarn {
+
+enum class FaultPoint : unsigned {
+#define FAULT_POINT(type, operation) type##_##operation,
+#include "faults/all.def"
+#undef FAULT_POINT
+    count
+};
+
+/// "Class::operation".
+const char* faultPointName(FaultPoint point);
+
+namespace detail {
+extern std::atomic<bool> faultsArmed;
+bool countFault(FaultPoint point) noexcept;
+} // namespace detail
+
+/// Called by each operation, once a call, before it does anything: true when this call has to fail. One relaxed load
+/// while no fault is armed. Thread: any.
+inline bool faultFires(FaultPoint point) noexcept {
+    return detail::faultsArmed.load(std::memory_order_relaxed) && detail::countFault(point);
+}
+
+} // namespace OpenQuarn

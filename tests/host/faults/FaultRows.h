@@ -1,0 +1,17 @@
+// SPDX-License-Identifier: Apache-2.0
+// One row for each operation of the API that can fail: how to call it so that it succeeds.
+#pragma once
+
+#include "openquarn/HStatus.h"
+
+#include <functional>
+#include <string>
+#include <vector>
+
+struct FaultRow {
+    std::string operation;        ///< "Class::operation", as in the table of fault points
+    std::function<HStatus()> call; ///< sets up what it needs, calls the operation, returns its status
+};
+
+// by family, each in a file of its own
+std::vector<FaultRow> graphRows();
