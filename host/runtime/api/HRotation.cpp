@@ -81,7 +81,7 @@ HMatrix HEulerRotation::asMatrix() const noexcept {
 }
 
 HEulerRotation HEulerRotation::fromMatrix(const HMatrix& m, RotationOrder order) noexcept {
-    constexpr double lock = 16 * std::numeric_limits<double>::epsilon(); // below it the outer axes cannot be told apart
+    constexpr double lock = 4 * std::numeric_limits<double>::epsilon(); // below it the outer axes cannot be told apart
     const auto [i, j, k, parity] = axesOf(order);
     const double cj = std::hypot(m[i][i], m[i][j]);
     const bool locked = cj <= lock;

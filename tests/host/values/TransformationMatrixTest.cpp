@@ -113,8 +113,9 @@ TEST(TransformationMatrix, RecomposesRegularMatrices) {
         for (const double value : scale)
             EXPECT_TRUE(value != 0.0 && std::signbit(value) == mirrored) << tested.name;
         // where dependence is not a matter of rounding, the determinant says which
-        if (tested.name == "random" || tested.name == "mirrored")
+        if (tested.name == "random" || tested.name == "mirrored") {
             EXPECT_EQ(mirrored, tested.matrix.det3x3() < 0.0) << tested.name;
+        }
     }
 }
 
