@@ -20,7 +20,7 @@ using OpenQuarn::Workspace;
 
 /// A workspace folder "project" and a current directory "here", each with files of its own; HOME is "home".
 class FileObject : public testing::Test {
-protected:
+public:
     FileObject()
         : directoryBefore_(fs::current_path())
         , homeBefore_(std::getenv("HOME") ? std::getenv("HOME") : "") {
