@@ -1,0 +1,7 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "openquarn/HArray.h"
+
+/// Unsigned integers of 32 bits. See HArray.h for the operations.
+using HUintArray = HArray<unsigned>;
