@@ -15,4 +15,5 @@ struct FaultRow {
 
 // by family, each in a file of its own
 std::vector<FaultRow> graphRows();
+std::vector<FaultRow> servicesRows();
 std::vector<FaultRow> valuesRows();
