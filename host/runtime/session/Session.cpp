@@ -3,6 +3,7 @@
 
 #include "core/threads.h"
 #include "graph/Graph.h"
+#include "services/SceneFileState.h"
 
 namespace OpenQuarn {
 namespace {
@@ -20,10 +21,13 @@ Session::Session() {
     impl_ = std::make_unique<Impl>();
 }
 
-Session::~Session() = default;
+Session::~Session() {
+    setCurrentSceneFile({});
+}
 
 void Session::newScene() {
     impl_->graph.clear(firstFrame);
+    setCurrentSceneFile({});
 }
 
 std::vector<HObject> Session::nodes() const {
