@@ -34,6 +34,9 @@ CommandOutcome runAll(const std::vector<ScriptCommand>& commands, std::string_vi
     return outcome;
 }
 
+// owner of the application's commands
+const char application = 'a';
+
 bool readFile(const std::string& path, std::string& text) {
     std::ifstream file(path, std::ios::binary);
     std::error_code isNone;
@@ -75,6 +78,15 @@ CommandOutcome runScriptFile(const std::string& path, const ResultSink& results)
     if (!readFile(path, text))
         return failed("the script " + inQuotes(path) + " cannot be read");
     return runScript(text, path, results);
+}
+
+HStatus addCommand(const std::string& name, std::function<HPxCommand*()> create,
+                   const std::function<HSyntax()>& syntax) {
+    return CommandRegistry::instance().add(name, std::move(create), syntax, &application);
+}
+
+HStatus removeCommand(const std::string& name) {
+    return CommandRegistry::instance().remove(name, &application);
 }
 
 std::vector<std::string> commandNames() {

@@ -7,13 +7,16 @@
 // that ends with the line. docs/commands.md lists the commands.
 #pragma once
 
-#include "openquarn/HApi.h"
+#include "openquarn/HStatus.h"
 
 #include <functional>
 #include <string>
 #include <string_view>
 #include <variant>
 #include <vector>
+
+class HPxCommand;
+class HSyntax;
 
 namespace OpenQuarn {
 
@@ -49,6 +52,17 @@ OPENQUARN_API CommandOutcome runScript(std::string_view text, std::string_view n
 
 /// Reads the file and runs it; errors call it by its path. Thread: main.
 OPENQUARN_API CommandOutcome runScriptFile(const std::string& path, const ResultSink& results = {});
+
+/// Adds a command of the application's own; plug-ins register theirs with HFnPlugin.
+/// `name` a letter, then letters, digits and underscores; `create` gives a new object for the host to delete, or null;
+/// `syntax` is called once, now; may be empty. Fails with kInvalidParameter for another name, without a creator, and
+/// when there is a command of that name; with kFailure when `syntax` throws. Thread: main.
+OPENQUARN_API HStatus addCommand(const std::string& name, std::function<HPxCommand*()> create,
+                                 const std::function<HSyntax()>& syntax = {});
+
+/// Takes such a command away. Fails with kFailure when there is none of that name, when it is the host's or a
+/// plug-in's, and while it runs. Thread: main.
+OPENQUARN_API HStatus removeCommand(const std::string& name);
 
 /// Names of all commands, in alphabetical order. Thread: main.
 OPENQUARN_API std::vector<std::string> commandNames();
