@@ -15,3 +15,4 @@ struct FaultRow {
 
 // by family, each in a file of its own
 std::vector<FaultRow> graphRows();
+std::vector<FaultRow> servicesRows();
