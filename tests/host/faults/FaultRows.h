@@ -14,5 +14,6 @@ struct FaultRow {
 };
 
 // by family, each in a file of its own
+std::vector<FaultRow> commandsRows();
 std::vector<FaultRow> graphRows();
 std::vector<FaultRow> servicesRows();
