@@ -15,11 +15,11 @@
 /// matrix (determinant below 0) has all three scales below 0, any other all three at 0 or above. Column 3 of the matrix
 /// is not looked at: perspective is dropped.
 ///
-/// Singular matrices give finite values, and asMatrix() gives the matrix back up to rounding (a few 1e-16 of the
+/// Singular matrices give finite values, and asMatrix() gives the matrix back up to rounding (about 1e-15 of the
 /// length of each row). A zero row has scale 0 and shears 0. A row that lies in the span of the rows before it, up to
-/// rounding (4e-15 of its length), has the scale 2.2e-16 (2 to the power of -52) times its length, so that its shears
-/// can carry it. Axes that the rows leave open are chosen so that R is proper. Values that are infinite or not a number
-/// in the matrix come out as such.
+/// rounding (9e-16 of its length), has the scale 2.2e-16 (2 to the power of -52) times its length, so that its shears
+/// can carry it. Axes that the rows leave open are chosen so that R is proper. Rows with values that are infinite or
+/// not a number have scales and shears that are not a number.
 ///
 /// Trivially copyable. Of the spaces, scale and shear are the same in all: they act on the object's own axes.
 /// `[any]` throughout.

@@ -17,3 +17,4 @@ struct FaultRow {
 std::vector<FaultRow> commandsRows();
 std::vector<FaultRow> graphRows();
 std::vector<FaultRow> servicesRows();
+std::vector<FaultRow> valuesRows();
