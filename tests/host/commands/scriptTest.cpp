@@ -103,7 +103,7 @@ TEST(Script, ErrorsNameFileLineAndCommandAndStopIt) {
         {"help \\\n1 \\\n2", "s.oq, line 1: help: too many arguments: '2'", 0},
         {"print 'a\nprint b'", "s.oq, line 1: the quote ' is not closed at the end of the line", 0},
         {"count\nprint \"a\\", "s.oq, line 2: the quote \" is not closed at the end of the line", 0},
-        {"count\nprint \"C:\\p\"", "s.oq, line 2: unknown escape \\p in \"...\": \" \\ \\n and \\t are known", 0},
+        {"count\nprint \"C:\\p\"", "s.oq, line 2: unknown escape \\p in \"...\": \\\" \\\\ \\n and \\t are known", 0},
         {"count\ncount\nprint `help`",
          "s.oq, line 3: back-quoted commands are not supported: run the command on a "
          "line of its own",
