@@ -80,6 +80,8 @@ public:
 
 protected:
     explicit HArgParser(std::shared_ptr<const OpenQuarn::ParsedArgs> parsed) noexcept;
+
+private:
     friend class OpenQuarn::Access;
     std::shared_ptr<const OpenQuarn::ParsedArgs> impl_;
 };

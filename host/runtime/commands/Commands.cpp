@@ -45,8 +45,9 @@ bool readFile(const std::string& path, std::string& text) {
     std::ostringstream all;
     if (file.peek() != std::ifstream::traits_type::eof())
         all << file.rdbuf();
+    const bool isRead = !file.bad() && !all.fail();
     text = std::move(all).str();
-    return !file.bad() && !all.fail();
+    return isRead;
 }
 
 } // namespace

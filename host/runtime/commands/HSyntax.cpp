@@ -51,7 +51,7 @@ HStatus readTypes(const std::array<HSyntax::ArgType, 6>& types, std::vector<HSyn
 
 HStatus addFlagTo(Syntax& syntax, SyntaxFlag flag, const std::array<HSyntax::ArgType, 6>& types) {
     for (const std::string& name : {flag.shortName, flag.longName})
-        if (const HStatus status = checkFlagName(syntax, name); status.error())
+        if (HStatus status = checkFlagName(syntax, name); status.error())
             return status;
     if (const HStatus status = readTypes(types, flag.types); status.error())
         return {status.statusCode(), "flag '-" + flag.longName + "': " + status.errorString().asChar()};

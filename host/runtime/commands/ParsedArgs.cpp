@@ -45,7 +45,7 @@ public:
     HStatus parse() {
         findModes();
         while (next_ < size())
-            if (const HStatus status = isFlag(next_) ? flag() : argument(); status.error())
+            if (HStatus status = isFlag(next_) ? flag() : argument(); status.error())
                 return status;
         return checkNumbers();
     }

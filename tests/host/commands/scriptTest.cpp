@@ -25,7 +25,7 @@ using testing::HasSubstr;
 class TestCommand {
 public:
     using Body = std::function<HStatus(const HPxCommand&, const HArgList&)>;
-    TestCommand(std::string name, Body body)
+    TestCommand(std::string name, const Body& body)
         : name_(std::move(name)) {
         const HStatus status = OpenQuarn::addCommand(name_, [body] { return new Object(body); });
         EXPECT_FALSE(status.error()) << status.errorString().asChar();

@@ -40,7 +40,15 @@ HStatus Builtin::doIt(const HArgList& words) {
     ParsedArgs parsed;
     parsed.syntax = *Access::impl(*Access::impl(*this)->syntax);
     HStatus status = parseArgs(words, parsed);
-    return status.error() ? status : run(Arguments(parsed));
+    if (status.error())
+        return status;
+    try {
+        return run(Arguments(parsed));
+    } catch (const std::bad_alloc&) {
+        throw;
+    } catch (const std::exception& error) { // the graph says in this way what cannot be done
+        return {HStatus::kFailure, error.what()};
+    }
 }
 
 void Builtin::give(CommandValue value) {

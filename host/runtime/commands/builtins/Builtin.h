@@ -40,6 +40,7 @@ public:
     HStatus doIt(const HArgList& words) final;
 
 protected:
+    /// May throw: the text of what it throws is what the user reads.
     virtual HStatus run(const Arguments& args) = 0;
     /// The result of this command.
     static void give(CommandValue value);

@@ -4,6 +4,12 @@
 namespace OpenQuarn {
 
 void addBuiltins(CommandRegistry& registry) {
+    addConnectionCommands(registry);
+    addDuplicate(registry);
+    addGetAttr(registry);
+    addNodeCommands(registry);
+    addSceneCommands(registry);
+    addSetAttr(registry);
     addTextCommands(registry);
 }
 

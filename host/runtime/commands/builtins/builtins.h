@@ -8,6 +8,12 @@ class CommandRegistry;
 
 void addBuiltins(CommandRegistry& registry);
 
+void addConnectionCommands(CommandRegistry& registry);
+void addDuplicate(CommandRegistry& registry);
+void addGetAttr(CommandRegistry& registry);
+void addNodeCommands(CommandRegistry& registry);
+void addSceneCommands(CommandRegistry& registry);
+void addSetAttr(CommandRegistry& registry);
 void addTextCommands(CommandRegistry& registry);
 
 } // namespace OpenQuarn
