@@ -32,5 +32,7 @@
 
 namespace OpenQuarn {
 class Access; // the runtime's way into the handles
+class Node;
+class NodeClass;
 class Object; // what an HObject stands for
 } // namespace OpenQuarn

@@ -36,8 +36,8 @@ public:
     OPENQUARN_API HQuaternion asQuaternion() const noexcept;
 
     /// The angles of a rotation matrix, whose first three rows must be orthonormal and right-handed. The middle angle
-    /// is -pi/2 to pi/2, the others -pi to pi. In gimbal lock (the middle angle at an end) only the sum or difference
-    /// of the outer angles is determined: the angle of the last axis is then 0.
+    /// is -pi/2 to pi/2, the others -pi to pi. In gimbal lock (the middle angle within 9e-16 of an
+    /// end) only the sum or difference of the outer angles is determined: the angle of the last axis is then 0.
     OPENQUARN_API static HEulerRotation fromMatrix(const HMatrix& rotation, RotationOrder order = kXYZ) noexcept;
 
     /// The same rotation in another order; the same angles when the order is the same already.

@@ -117,14 +117,14 @@ HStatus checkTriple(const double* values, HSpace::Space space) {
 }
 
 HStatus readTriple(const HVector& from, double* values, HSpace::Space space) {
-    const HStatus status = checkTriple(values, space);
+    HStatus status = checkTriple(values, space);
     for (unsigned i = 0; i < 3 && !status.error(); ++i)
         values[i] = from[i];
     return status;
 }
 
 HStatus writeTriple(HVector& to, const double* values, HSpace::Space space) {
-    const HStatus status = checkTriple(values, space);
+    HStatus status = checkTriple(values, space);
     if (!status.error())
         to = {values[0], values[1], values[2]};
     return status;

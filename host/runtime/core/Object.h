@@ -47,6 +47,11 @@ public:
     static auto& impl(H& handle) {
         return handle.impl_;
     }
+    template <class H>
+    static void setContext(H& handle, double time) {
+        handle.normal_ = false;
+        handle.time_ = time;
+    }
     template <class H, class Impl>
     static H make(Impl&& impl) {
         return H(std::forward<Impl>(impl));

@@ -1,0 +1,30 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn/HNodeMessage.h"
+
+#include "core/apiCall.h"
+#include "core/threads.h"
+#include "graph/Graph.h"
+
+using OpenQuarn::Access;
+using OpenQuarn::FaultPoint;
+
+HStatus HMessage::removeCallback(HCallbackId id) {
+    return OpenQuarn::apiCall(FaultPoint::HMessage_removeCallback, [&]() -> HStatus {
+        OpenQuarn::requireMain("HMessage::removeCallback");
+        OpenQuarn::currentGraph().removeCallback(id);
+        return HStatus::kSuccess;
+    });
+}
+
+HCallbackId HNodeMessage::addAttributeChangedCallback(const HObject& node, HAttributeChangedFunction function,
+                                                      void* clientData, HStatus* status) {
+    return OpenQuarn::apiValue(
+        FaultPoint::HNodeMessage_addAttributeChangedCallback, status, HCallbackId{0}, [&](HStatus& outcome) {
+            OpenQuarn::requireMain("HNodeMessage::addAttributeChangedCallback");
+            const auto watched = Access::as<OpenQuarn::Node>(node);
+            if (watched && function)
+                return watched->graph().addCallback(*watched, function, clientData);
+            outcome = {HStatus::kInvalidParameter, watched ? "the function is null" : "the object is no node"};
+            return HCallbackId{0};
+        });
+}

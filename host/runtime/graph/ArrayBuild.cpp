@@ -1,0 +1,73 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "graph/ArrayBuild.h"
+
+#include "graph/arrayLock.h"
+
+#include <algorithm>
+
+namespace OpenQuarn {
+namespace {
+
+std::shared_ptr<Slot> existing(const Slot& array, unsigned index) {
+    const ArrayReadLock lock(array.owner);
+    return array.elements.find(index);
+}
+
+void forget(std::vector<Slot*>& slots, const Slot& slot) {
+    slots.erase(std::remove(slots.begin(), slots.end(), &slot), slots.end());
+}
+
+// without telling anybody: this happens inside an evaluation
+void unlink(Slot& slot) {
+    if (slot.links) {
+        if (slot.links->source)
+            forget(slot.links->source->links->destinations, slot);
+        for (Slot* destination : slot.links->destinations)
+            destination->links->source = nullptr;
+        slot.links.reset();
+    }
+    slot.forEachPart([](Slot& part) { unlink(part); });
+}
+
+} // namespace
+
+std::shared_ptr<Slot> ArrayBuild::add(unsigned index) {
+    if (std::shared_ptr<Slot> element = added.find(index))
+        return element;
+    if (!removed.find(index))
+        if (std::shared_ptr<Slot> element = existing(*array, index))
+            return element;
+    auto element = std::make_shared<Slot>(array->field, array->owner, nullptr, true, index);
+    added.insert(index, element);
+    return element;
+}
+
+bool ArrayBuild::remove(unsigned index) {
+    if (added.remove(index))
+        return true;
+    const std::shared_ptr<Slot> element = removed.find(index) ? nullptr : existing(*array, index);
+    if (element)
+        removed.insert(index, element);
+    return element != nullptr;
+}
+
+std::size_t ArrayBuild::size() const {
+    const ArrayReadLock lock(array->owner);
+    return array->elements.size() + added.size() - removed.size();
+}
+
+void commit(ArrayBuild& build) {
+    build.removed.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
+        unlink(*element);
+        {
+            const ArrayWriteLock lock(build.array->owner);
+            build.array->elements.remove(index);
+        }
+        element->detach();
+    });
+    build.added.forEach([&](unsigned, const std::shared_ptr<Slot>& element) { build.array->adopt(element); });
+    build.added.clear();
+    build.removed.clear();
+}
+
+} // namespace OpenQuarn

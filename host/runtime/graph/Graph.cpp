@@ -1,0 +1,429 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "graph/Graph.h"
+
+#include "core/text.h"
+#include "graph/baseNodes.h"
+#include "graph/dirty.h"
+#include "graph/plugImpl.h"
+
+#include <algorithm>
+#include <stdexcept>
+
+namespace OpenQuarn {
+namespace {
+
+Graph* theGraph = nullptr;
+
+} // namespace
+
+Graph* Graph::current() {
+    return theGraph;
+}
+
+Graph& currentGraph() {
+    if (!theGraph)
+        throw std::runtime_error("there is no scene: no session has been started");
+    return *theGraph;
+}
+
+Graph::Graph() {
+    if (theGraph)
+        throw std::runtime_error("there can be only one session at a time");
+    registerBaseNodes();
+    theGraph = this;
+    timeNode_ = createNode(timeClass(), "time1");
+    setTimeIn(*timeNode_->data(), time_);
+}
+
+Graph::~Graph() {
+    clear(time_);
+    timeNode_->bury();
+    theGraph = nullptr;
+}
+
+// --- nodes ---
+
+std::string Graph::freeName(const std::string& base) {
+    unsigned& number = nextNumber_[base];
+    std::string name;
+    do {
+        name = base + std::to_string(++number);
+    } while (byName_.count(name) != 0);
+    return name;
+}
+
+void Graph::insert(const std::shared_ptr<Node>& node) {
+    const std::uint64_t order = nextOrder_++;
+    byOrder_.emplace(order, node);
+    byName_.emplace(node->name(), Entry{node, order});
+    ++typeCounts_[&node->type()];
+}
+
+std::shared_ptr<Node> Graph::createNode(const std::shared_ptr<const NodeClass>& type, const std::string& name) {
+    if (!name.empty() && !isIdentifier(name))
+        throw std::invalid_argument("'" + name + "' cannot name a node");
+    if (!type->creator)
+        throw std::invalid_argument("node type '" + type->name + "' cannot be created by itself");
+    const bool asGiven = !name.empty() && byName_.count(name) == 0;
+    const auto node = std::make_shared<Node>(*this, type, asGiven ? name : freeName(name.empty() ? type->name : name));
+    insert(node);
+    try {
+        node->createUserNode();
+    } catch (...) {
+        deleteNode(*node);
+        throw;
+    }
+    node->runPostConstructor();
+    return node;
+}
+
+void Graph::deleteNode(Node& node) {
+    const auto entry = byName_.find(node.name());
+    if (entry == byName_.end() || entry->second.node.get() != &node)
+        throw std::invalid_argument("node '" + node.name() + "' is not in the scene");
+    if (&node == timeNode_.get())
+        throw std::invalid_argument("the time node '" + node.name() + "' cannot be deleted");
+    const std::shared_ptr<Node> kept = entry->second.node;
+    for (const std::shared_ptr<Slot>& slot : node.data()->slots)
+        disconnectAll(*slot);
+    for (const Node::Callback& callback : node.callbacks)
+        callbackNodes_.erase(callback.id);
+    byOrder_.erase(entry->second.order);
+    byName_.erase(entry);
+    --typeCounts_[&node.type()];
+    node.bury();
+}
+
+void Graph::renameNode(Node& node, const std::string& name) {
+    if (name == node.name())
+        return;
+    if (!isIdentifier(name))
+        throw std::invalid_argument("'" + name + "' cannot name a node");
+    if (byName_.count(name) != 0)
+        throw std::invalid_argument("there is a node named '" + name + "' already");
+    const auto entry = byName_.find(node.name());
+    if (entry == byName_.end())
+        throw std::invalid_argument("node '" + node.name() + "' is not in the scene");
+    Entry kept = entry->second;
+    byName_.erase(entry);
+    node.name_ = name;
+    byName_.emplace(name, std::move(kept));
+}
+
+std::shared_ptr<Node> Graph::find(const std::string& name) const {
+    const auto found = byName_.find(name);
+    return found == byName_.end() ? nullptr : found->second.node;
+}
+
+std::vector<std::shared_ptr<Node>> Graph::nodes() const {
+    std::vector<std::shared_ptr<Node>> all;
+    all.reserve(byOrder_.size());
+    for (const auto& [order, node] : byOrder_)
+        all.push_back(node);
+    return all;
+}
+
+std::size_t Graph::nodeCount(const NodeClass& type) const {
+    const auto found = typeCounts_.find(&type);
+    return found == typeCounts_.end() ? 0 : found->second;
+}
+
+void Graph::clear(double time) {
+    const std::vector<std::shared_ptr<Node>> all = nodes();
+    // connections first, all at once: nobody is told, since nobody is left to tell
+    const auto unlink = [](auto&& self, Slot& slot) -> void {
+        slot.links.reset();
+        slot.forEachPart([&](Slot& part) { self(self, part); });
+    };
+    for (const std::shared_ptr<Node>& node : all)
+        for (const std::shared_ptr<Slot>& slot : node->data()->slots)
+            unlink(unlink, *slot);
+    for (auto node = all.rbegin(); node != all.rend(); ++node)
+        if (*node != timeNode_)
+            deleteNode(**node);
+    nextNumber_.clear();
+    setTime(time);
+}
+
+// --- connections ---
+
+std::string Graph::refusal(Slot& source, Slot& destination, bool checkCycle) const {
+    const Attribute& from = *source.field.attribute;
+    const Attribute& to = *destination.field.attribute;
+    const std::string both = "cannot connect '" + source.name() + "' to '" + destination.name() + "': ";
+    if (!from.readable || !from.connectable)
+        return both + "the source is not readable, or not connectable";
+    if (!to.writable || !to.connectable)
+        return both + "the destination is not writable, or not connectable";
+    if (source.isArray() != destination.isArray())
+        return both + "one is a whole array, the other is not";
+    if (!to.takesValueOf(from))
+        return both + "a " + from.typeName() + " does not fit a " + to.typeName();
+    if (destination.locked)
+        return both + "the destination is locked";
+    for (const Slot* at = &destination; at; at = at->parent)
+        if (const Slot* present = at->source())
+            return both + "the destination is connected from '" + present->name() + "'";
+    if (checkCycle && to.kind() != HFn::kMessageAttribute && reaches(destination, source))
+        return both + "the source depends on the destination";
+    return {};
+}
+
+void Graph::connect(Slot& source, Slot& destination, bool checkCycle) {
+    const std::string refused = refusal(source, destination, checkCycle);
+    if (!refused.empty())
+        throw std::invalid_argument(refused);
+    for (Slot* end : {&source, &destination})
+        if (!end->links)
+            end->links = std::make_unique<Slot::Links>();
+    source.links->destinations.push_back(&destination);
+    destination.links->source = &source;
+    makeDirty(destination);
+    tellNodes(source, destination, true);
+}
+
+void Graph::breakLink(Slot& source, Slot& destination) {
+    std::vector<Slot*>& all = source.links->destinations;
+    all.erase(std::find(all.begin(), all.end(), &destination));
+    destination.links->source = nullptr;
+}
+
+void Graph::disconnect(Slot& destination) {
+    Slot* source = destination.source();
+    if (!source)
+        throw std::invalid_argument("'" + destination.name() + "' is not connected");
+    const std::shared_ptr<Slot> keptSource = source->shared_from_this();
+    const std::shared_ptr<Slot> kept = destination.shared_from_this();
+    breakLink(*source, destination);
+    tellNodes(*source, destination, false);
+    if (destination.owner) // the plug-in may have removed it itself
+        afterDisconnect(destination);
+}
+
+void Graph::afterDisconnect(Slot& destination) {
+    const HFnAttribute::DisconnectBehavior behavior = destination.field.attribute->onDisconnect;
+    if (behavior == HFnAttribute::kDelete && destination.isElement && destination.parent) {
+        removeElement(*destination.parent, destination.index);
+        return;
+    }
+    if (behavior == HFnAttribute::kReset) {
+        destination.reset();
+    }
+    destination.markClean();
+    propagateFrom(destination);
+}
+
+void Graph::tellNodes(Slot& source, Slot& destination, bool made) {
+    struct Side {
+        Slot& slot;
+        Slot& other;
+        bool isSource;
+    };
+    const auto keptSource = source.owner ? source.owner->node.shared_from_this() : nullptr;
+    const auto keptDestination = destination.owner ? destination.owner->node.shared_from_this() : nullptr;
+    for (const Side& side : {Side{source, destination, true}, Side{destination, source, false}}) {
+        if (!side.slot.owner)
+            continue;
+        Node& node = side.slot.owner->node;
+        if (HPxNode* user = node.userNode())
+            callPlugin(node, made ? "connectionMade" : "connectionBroken", [&] {
+                return made ? user->connectionMade(makePlug(side.slot), makePlug(side.other), side.isSource)
+                            : user->connectionBroken(makePlug(side.slot), makePlug(side.other), side.isSource);
+            });
+        const int direction = side.isSource ? 0 : HNodeMessage::kIncomingDirection;
+        notify(side.slot,
+               (made ? HNodeMessage::kConnectionMade : HNodeMessage::kConnectionBroken) | direction |
+                   HNodeMessage::kOtherPlugSet,
+               &side.other);
+    }
+}
+
+void Graph::disconnectAll(Slot& slot) {
+    const std::shared_ptr<Slot> kept = slot.shared_from_this();
+    if (slot.source())
+        disconnect(slot);
+    while (slot.hasDestinations())
+        disconnect(*slot.links->destinations.back());
+    std::vector<std::shared_ptr<Slot>> parts(slot.children);
+    parts.reserve(parts.size() + slot.elements.size());
+    slot.elements.forEach([&](unsigned, const std::shared_ptr<Slot>& part) { parts.push_back(part); });
+    for (const std::shared_ptr<Slot>& part : parts)
+        disconnectAll(*part);
+}
+
+namespace {
+
+/// Depth first over slots, with a stack of its own: a chain may be as long as memory allows.
+class CycleSearch {
+public:
+    void from(Slot& start) {
+        enter(start);
+        while (!stack_.empty()) {
+            Frame& frame = stack_.back();
+            if (frame.next == frame.dependents.size()) {
+                state_[frame.slot] = State::done;
+                stack_.pop_back();
+                continue;
+            }
+            Slot& dependent = *frame.dependents[frame.next++];
+            const State state = stateOf(dependent);
+            if (state == State::open && dependent.source())
+                closers.push_back(dependent.shared_from_this());
+            if (state == State::unseen)
+                enter(dependent);
+        }
+    }
+
+    std::vector<std::shared_ptr<Slot>> closers;
+
+private:
+    enum class State { unseen, open, done };
+    struct Frame {
+        Slot* slot;
+        std::vector<Slot*> dependents;
+        std::size_t next = 0;
+    };
+
+    State stateOf(const Slot& slot) const {
+        const auto found = state_.find(&slot);
+        return found == state_.end() ? State::unseen : found->second;
+    }
+
+    void enter(Slot& slot) {
+        state_[&slot] = State::open;
+        Frame frame{&slot, {}};
+        forEachDependent(slot, [&](Slot& dependent) { frame.dependents.push_back(&dependent); });
+        stack_.push_back(std::move(frame));
+    }
+
+    std::unordered_map<const Slot*, State> state_;
+    std::vector<Frame> stack_;
+};
+
+} // namespace
+
+std::vector<std::shared_ptr<Slot>> Graph::cycleClosers() const {
+    CycleSearch search;
+    const auto visit = [&](auto&& self, Slot& slot) -> void {
+        if (slot.source())
+            search.from(slot);
+        slot.forEachPart([&](Slot& part) { self(self, part); });
+    };
+    for (const auto& [order, node] : byOrder_)
+        for (const std::shared_ptr<Slot>& slot : node->data()->slots)
+            visit(visit, *slot);
+    return search.closers;
+}
+
+// --- values ---
+
+std::string Graph::setRefusal(const Slot& slot) {
+    if (!slot.field.attribute->writable)
+        return "'" + slot.name() + "' is an output and cannot be set";
+    for (const Slot* at = &slot; at; at = at->parent) {
+        if (at->locked)
+            return "'" + slot.name() + "' is locked";
+        if (const Slot* source = at->source())
+            return "'" + slot.name() + "' is connected from '" + source->name() + "' and cannot be set";
+    }
+    return {};
+}
+
+void Graph::valueSet(Slot& slot) {
+    slot.markClean();
+    propagateFrom(slot);
+    notify(slot, HNodeMessage::kAttributeSet);
+}
+
+void Graph::setLocked(Slot& slot, bool locked) {
+    slot.locked = locked;
+    notify(slot, locked ? HNodeMessage::kAttributeLocked : HNodeMessage::kAttributeUnlocked);
+}
+
+void Graph::removeElement(Slot& array, unsigned index) {
+    const std::shared_ptr<Slot> element = array.elements.find(index);
+    if (!element)
+        throw std::invalid_argument("'" + array.name() + "' has no element " + std::to_string(index));
+    disconnectAll(*element);
+    if (!array.elements.remove(index))
+        return; // it went with its connection
+    propagateFrom(array);
+    notify(*element, HNodeMessage::kAttributeArrayRemoved);
+    element->detach();
+}
+
+void Graph::notify(Slot& slot, int mask, const Slot* other) {
+    if (!slot.owner || slot.owner->node.callbacks.empty())
+        return;
+    const std::shared_ptr<Node> node = std::static_pointer_cast<Node>(slot.owner->node.shared_from_this());
+    const std::vector<Node::Callback> callbacks = node->callbacks; // one may remove another
+    for (const Node::Callback& callback : callbacks) {
+        if (callbackNodes_.count(callback.id) == 0)
+            continue;
+        HPlug plug = makePlug(slot);
+        HPlug otherPlug = other ? makePlug(*other) : HPlug();
+        callPlugin(*node, "attribute-changed callback", [&]() -> HStatus {
+            callback.function(mask, plug, otherPlug, callback.clientData);
+            return HStatus::kSuccess;
+        });
+    }
+}
+
+// --- callbacks ---
+
+HCallbackId Graph::addCallback(Node& node, HNodeMessage::HAttributeChangedFunction function, void* clientData) {
+    const HCallbackId id = nextCallback_++;
+    node.callbacks.push_back({id, function, clientData});
+    callbackNodes_[id] = std::static_pointer_cast<Node>(node.shared_from_this());
+    return id;
+}
+
+void Graph::removeCallback(HCallbackId id) {
+    const auto found = callbackNodes_.find(id);
+    if (found == callbackNodes_.end())
+        throw std::invalid_argument("there is no callback " + std::to_string(id));
+    if (const std::shared_ptr<Node> node = found->second.lock())
+        node->callbacks.erase(std::remove_if(node->callbacks.begin(), node->callbacks.end(),
+                                             [&](const Node::Callback& callback) { return callback.id == id; }),
+                              node->callbacks.end());
+    callbackNodes_.erase(found);
+}
+
+// --- time ---
+
+void Graph::setTime(double time) {
+    time_ = time;
+    setTimeIn(*timeNode_->data(), time);
+    propagateFrom(*timeNode_->data()->slots[timeOutPosition()]);
+}
+
+void Graph::setTimeIn(NodeData& data, double time) const {
+    if (&data.node != timeNode_.get() && timeNode_)
+        return;
+    if (&data.node.type() == timeClass().get()) {
+        Slot& slot = *data.slots[timeOutPosition()];
+        slot.number = time;
+        slot.markClean();
+    }
+}
+
+// --- what can be observed ---
+
+void Graph::recordDirty(const Slot& slot) {
+    if (dirtyPlugs_)
+        dirtyPlugs_->push_back(slot.name());
+}
+
+void Graph::observeComputes(std::vector<std::string>* plugs) {
+    computedPlugs_ = plugs;
+}
+
+void Graph::recordCompute(const Slot& slot) {
+    if (!computedPlugs_.load(std::memory_order_relaxed))
+        return;
+    const std::scoped_lock lock(computesMutex_);
+    if (std::vector<std::string>* plugs = computedPlugs_)
+        plugs->push_back(slot.name());
+}
+
+} // namespace OpenQuarn

@@ -1,0 +1,113 @@
+// SPDX-License-Identifier: Apache-2.0
+// The nodes of the scene and their connections.
+#pragma once
+
+#include "graph/Node.h"
+#include "openquarn/HStatus.h"
+
+#include <cstdint>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+namespace OpenQuarn {
+
+/// Thread: main, outside of evaluations, except where a function says otherwise. What can fail throws
+/// std::invalid_argument or std::runtime_error with a sentence that names the thing and the value.
+class Graph {
+public:
+    Graph();
+    ~Graph();
+    Graph(const Graph&) = delete;
+    Graph& operator=(const Graph&) = delete;
+
+    /// The scene that is open: there is one a process. Null before the first session.
+    static Graph* current();
+
+    // --- nodes ---
+    /// `name` empty: the type's name and the first number that is free. With a name that is taken, a number is added.
+    std::shared_ptr<Node> createNode(const std::shared_ptr<const NodeClass>& type, const std::string& name = {});
+    void deleteNode(Node& node);
+    void renameNode(Node& node, const std::string& name);
+    /// Null when there is none.
+    std::shared_ptr<Node> find(const std::string& name) const;
+    /// In order of creation.
+    std::vector<std::shared_ptr<Node>> nodes() const;
+    std::size_t nodeCount() const { return byName_.size(); }
+    /// Number of nodes of a type.
+    std::size_t nodeCount(const NodeClass& type) const;
+    /// Deletes all nodes but the time node, which is set to `time`.
+    void clear(double time);
+
+    // --- connections ---
+    /// Why the two cannot be connected, as a sentence naming both; empty when they can. `checkCycle` false leaves out
+    /// the walk through what depends on the destination.
+    std::string refusal(Slot& source, Slot& destination, bool checkCycle = true) const;
+    void connect(Slot& source, Slot& destination, bool checkCycle = true);
+    /// Breaks the connection into `destination`; its value then does as the attribute says.
+    void disconnect(Slot& destination);
+    /// Destinations whose connection closes a cycle: without these connections there is none. One walk over all nodes.
+    std::vector<std::shared_ptr<Slot>> cycleClosers() const;
+
+    // --- values ---
+    /// Why a plug's value cannot be set from outside: not writable, locked, connected; empty when it can.
+    static std::string setRefusal(const Slot& slot);
+    /// To be called after a value was set: makes dirty what depends on it and tells the callbacks.
+    void valueSet(Slot& slot);
+    void setLocked(Slot& slot, bool locked);
+    /// Removes an element with its connections; fails when something locked or not writable is in the way.
+    void removeElement(Slot& array, unsigned index);
+    /// Tells the callbacks of a node. `other` null: none.
+    void notify(Slot& slot, int mask, const Slot* other = nullptr);
+
+    // --- callbacks ---
+    HCallbackId addCallback(Node& node, HNodeMessage::HAttributeChangedFunction function, void* clientData);
+    void removeCallback(HCallbackId id);
+
+    // --- time ---
+    double time() const { return time_; }
+    void setTime(double time);
+    /// Writes a time into data of the time node; nothing for other nodes.
+    void setTimeIn(NodeData& data, double time) const;
+
+    // --- what can be observed ---
+    /// From now on, names of plugs are added to `plugs` in the order in which they become dirty; null ends it.
+    void observeDirty(std::vector<std::string>* plugs) { dirtyPlugs_ = plugs; }
+    void recordDirty(const Slot& slot);
+    /// The same for the plugs that are computed. Thread of recordCompute(): any.
+    void observeComputes(std::vector<std::string>* plugs);
+    void recordCompute(const Slot& slot);
+
+private:
+    std::string freeName(const std::string& base);
+    void insert(const std::shared_ptr<Node>& node);
+    void disconnectAll(Slot& slot);
+    void breakLink(Slot& source, Slot& destination);
+    void afterDisconnect(Slot& destination);
+    void tellNodes(Slot& source, Slot& destination, bool made);
+
+    std::map<std::uint64_t, std::shared_ptr<Node>> byOrder_;
+    struct Entry {
+        std::shared_ptr<Node> node;
+        std::uint64_t order;
+    };
+    std::unordered_map<std::string, Entry> byName_;
+    std::unordered_map<std::string, unsigned> nextNumber_; // where the search for a free name goes on
+    std::unordered_map<const NodeClass*, std::size_t> typeCounts_;
+    std::uint64_t nextOrder_ = 1;
+    std::unordered_map<HCallbackId, std::weak_ptr<Node>> callbackNodes_;
+    HCallbackId nextCallback_ = 1;
+    std::shared_ptr<Node> timeNode_;
+    double time_ = 1.0;
+    std::vector<std::string>* dirtyPlugs_ = nullptr;
+    std::mutex computesMutex_;
+    std::atomic<std::vector<std::string>*> computedPlugs_{nullptr};
+};
+
+/// Throws std::runtime_error when there is no scene.
+Graph& currentGraph();
+
+} // namespace OpenQuarn

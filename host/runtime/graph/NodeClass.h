@@ -1,0 +1,90 @@
+// SPDX-License-Identifier: Apache-2.0
+// A node type: its attributes, what depends on what, and how to make a node of it.
+#pragma once
+
+#include "graph/Attribute.h"
+#include "openquarn/HPxNode.h"
+
+#include <memory>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+namespace OpenQuarn {
+
+/// Built once by registration, fixed afterwards.
+class NodeClass {
+public:
+    using Creator = HPxNode* (*)();
+
+    NodeClass(std::string typeName, HTypeId typeId, HFn::Type objectKind, Creator nodeCreator)
+        : name(std::move(typeName))
+        , id(typeId)
+        , kind(objectKind)
+        , creator(nodeCreator) {}
+
+    const std::string name;
+    const HTypeId id;
+    const HFn::Type kind;  ///< of the nodes
+    const Creator creator; ///< null for a type that cannot be created by itself
+    std::string plugin;    ///< name of the plug-in that registered it; empty for the host's own
+
+    /// Adds an attribute that has no parent, with its children. Throws std::invalid_argument when a name is taken.
+    void add(const std::shared_ptr<Attribute>& attribute);
+    /// Throws std::invalid_argument when one of them does not belong to the type.
+    void affects(const Attribute& affecting, const Attribute& affected, bool affectsTree, bool sameElement = false);
+    /// Adds what another type has, as the base of this one.
+    void inherit(const NodeClass& base);
+    /// Works out what depends on what; nothing is added afterwards.
+    void finish();
+
+    const std::vector<std::unique_ptr<Field>>& fields() const { return fields_; }
+    /// By long or short name, at any depth; null when there is none.
+    const Field* find(const std::string& attributeName) const;
+    const Field* find(const Attribute& attribute) const;
+
+private:
+    struct Pair {
+        Field* affecting;
+        Field* affected;
+        bool tree;
+        bool sameElement;
+    };
+
+    std::unique_ptr<Field> makeField(const std::shared_ptr<const Attribute>& attribute, const Field* parent,
+                                     unsigned position);
+    Field& fieldOf(const Attribute& attribute) const;
+    void addDependents(Field& field);
+    static void addAffecting(Field& affected, const Field& affecting);
+
+    std::vector<std::unique_ptr<Field>> fields_;
+    std::unordered_map<const Attribute*, Field*> byAttribute_;
+    std::unordered_map<std::string, Field*> byName_;
+    std::vector<Pair> pairs_;
+};
+
+/// The registered types. Thread: changes on the main thread, outside of evaluations.
+std::shared_ptr<const NodeClass> findNodeClass(const std::string& name);
+/// Throws std::invalid_argument naming what is in the way: the name or the id.
+void addNodeClass(std::shared_ptr<const NodeClass> type);
+/// By type id. Throws std::invalid_argument when there is none. The caller has made sure that no node of it exists.
+void removeNodeClass(HTypeId id);
+/// Sorted by name.
+std::vector<std::shared_ptr<const NodeClass>> nodeClasses();
+std::shared_ptr<const NodeClass> findNodeClass(HTypeId id);
+
+/// While a type's initializer runs, the type that HPxNode::addAttribute() and attributeAffects() work on.
+class ClassUnderConstruction {
+public:
+    explicit ClassUnderConstruction(NodeClass& type);
+    ~ClassUnderConstruction();
+    ClassUnderConstruction(const ClassUnderConstruction&) = delete;
+    ClassUnderConstruction& operator=(const ClassUnderConstruction&) = delete;
+    /// Null when none is.
+    static NodeClass* current();
+
+private:
+    NodeClass* previous_;
+};
+
+} // namespace OpenQuarn

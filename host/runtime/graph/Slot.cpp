@@ -1,0 +1,141 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "graph/Slot.h"
+
+#include "graph/Node.h"
+#include "graph/arrayLock.h"
+
+namespace OpenQuarn {
+
+Slot::Slot(const Field& slotField, NodeData* slotOwner, Slot* slotParent, bool element, unsigned logicalIndex)
+    : field(slotField)
+    , owner(slotOwner)
+    , parent(slotParent)
+    , isElement(element)
+    , index(logicalIndex) {
+    number = field.attribute->defaultNumber;
+    data = field.attribute->defaultData;
+    if (isCompound())
+        makeChildren();
+}
+
+Slot::~Slot() {
+    forEachPart([](Slot& part) { part.detach(); });
+}
+
+void Slot::makeChildren() {
+    children.reserve(field.children.size());
+    for (const std::unique_ptr<Field>& childField : field.children)
+        children.push_back(std::make_shared<Slot>(*childField, owner, this, false, 0U));
+}
+
+std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
+    {
+        const ArrayReadLock lock(owner);
+        if (std::shared_ptr<Slot> existing = elements.find(logicalIndex))
+            return existing;
+    }
+    const auto element = std::make_shared<Slot>(field, owner, this, true, logicalIndex);
+    adopt(element);
+    return element;
+}
+
+void Slot::adopt(const std::shared_ptr<Slot>& element) {
+    element->parent = this;
+    {
+        const ArrayWriteLock lock(owner);
+        elements.insert(element->index, element);
+    }
+    if (field.computed)
+        element->markDirty();
+}
+
+std::shared_ptr<Slot> Slot::child(const Field& childField) const {
+    return isCompound() && childField.parent == &field ? children[childField.position] : nullptr;
+}
+
+void Slot::reset() {
+    number = field.attribute->defaultNumber;
+    data = field.attribute->defaultData;
+    for (const std::shared_ptr<Slot>& part : children)
+        part->reset();
+    elements.forEach([](unsigned, const std::shared_ptr<Slot>& element) { element->detach(); });
+    elements.clear();
+}
+
+void Slot::copyFrom(const Slot& from) {
+    number = field.attribute->isNumber() ? field.attribute->stored(from.number) : from.number;
+    data = from.data;
+    for (std::size_t i = 0; i < children.size() && i < from.children.size(); ++i)
+        children[i]->copyFrom(*from.children[i]);
+    if (!isArray())
+        return;
+    std::vector<unsigned> surplus;
+    elements.forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>&) {
+        if (!from.elements.find(elementIndex))
+            surplus.push_back(elementIndex);
+    });
+    for (const unsigned elementIndex : surplus)
+        if (const std::shared_ptr<Slot> element = elements.remove(elementIndex))
+            element->detach();
+    from.elements.forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>& element) {
+        elementAt(elementIndex)->copyFrom(*element);
+    });
+}
+
+void Slot::detach() {
+    owner = nullptr;
+    parent = nullptr;
+    for (const std::shared_ptr<Slot>& part : children) {
+        part->detach();
+        part->parent = this;
+    }
+    elements.forEach([this](unsigned, const std::shared_ptr<Slot>& element) {
+        element->detach();
+        element->parent = this;
+    });
+}
+
+std::string Slot::path() const {
+    if (isElement)
+        return (parent ? parent->path() : field.attribute->name) + "[" + std::to_string(index) + "]";
+    return parent ? parent->path() + "." + field.attribute->name : field.attribute->name;
+}
+
+std::string Slot::name() const {
+    return owner ? owner->node.name() + "." + path() : path();
+}
+
+void Slot::setFailed(bool failed) {
+    if (failed)
+        state_.fetch_or(failedBit, std::memory_order_acq_rel);
+    else
+        state_.fetch_and(static_cast<std::uint8_t>(~failedBit), std::memory_order_acq_rel);
+}
+
+void Slot::markDirtyBelow() {
+    state_.fetch_or(dirtyBit | belowBit, std::memory_order_acq_rel);
+    forEachPart([](Slot& part) { part.markDirtyBelow(); });
+}
+
+void Slot::markDirty() {
+    markDirtyBelow();
+    for (Slot* above = parent; above; above = above->parent)
+        if (above->state_.fetch_or(belowBit, std::memory_order_acq_rel) & belowBit)
+            break;
+}
+
+void Slot::markClean() {
+    markCleanBelow();
+    // what is above is no longer dirty as a whole
+    for (Slot* above = parent; above; above = above->parent)
+        above->state_.fetch_and(static_cast<std::uint8_t>(~dirtyBit), std::memory_order_acq_rel);
+}
+
+void Slot::markCleanBelow() {
+    if (state_.load(std::memory_order_acquire) == 0)
+        return;
+    forEachPart([](Slot& part) { part.markCleanBelow(); });
+    state_.store(0, std::memory_order_release);
+}
+
+} // namespace OpenQuarn

@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+// What a plug is inside.
+#pragma once
+
+#include "graph/Node.h"
+#include "openquarn/HPlug.h"
+
+#include <memory>
+#include <optional>
+#include <vector>
+
+/// A node and the way to a slot: for each array on the way, outermost first, the index of an element. The last index of
+/// a plug on a whole array is missing; so are indices that have not been chosen yet.
+struct HPlug::Impl {
+    std::shared_ptr<OpenQuarn::Node> node;
+    const OpenQuarn::Field* field = nullptr;
+    std::vector<std::optional<unsigned>> indices;
+
+    bool operator==(const Impl& other) const {
+        return node == other.node && field == other.field && indices == other.indices;
+    }
+};
+
+namespace OpenQuarn {
+
+/// The plug of a slot; null for one that has been cut off.
+HPlug makePlug(const Slot& slot);
+
+/// The slot in the data of the calling thread's context; null when the plug is null, an index is not chosen, or an
+/// element does not exist. `create` makes elements that are missing.
+std::shared_ptr<Slot> resolvePlug(const HPlug& plug, bool create = false);
+/// The same in the data of a certain context.
+std::shared_ptr<Slot> resolvePlugIn(const NodeData& data, const HPlug& plug, bool create);
+
+/// The slot of the plug, or the nearest one above it that exists; null for a null plug.
+std::shared_ptr<Slot> nearestExisting(const HPlug& plug);
+
+/// The plug behind a handle; null for a null plug, or one whose node has gone.
+const HPlug::Impl* plugImpl(const HPlug& plug);
+HPlug plugOf(HPlug::Impl impl);
+
+/// The number of arrays at and above a field.
+std::size_t arrayDepth(const Field& field);
+
+} // namespace OpenQuarn

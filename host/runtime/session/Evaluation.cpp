@@ -1,0 +1,129 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn_app/Evaluation.h"
+
+#include "core/apiCall.h"
+#include "core/threads.h"
+#include "graph/Context.h"
+#include "graph/Graph.h"
+#include "graph/arrayLock.h"
+#include "graph/dirty.h"
+#include "graph/evaluation.h"
+#include "graph/plugImpl.h"
+
+#include <oneapi/tbb/parallel_for.h>
+
+namespace OpenQuarn {
+namespace {
+
+HStatus nullPlug() {
+    return {HStatus::kInvalidParameter, "the plug is null"};
+}
+
+// the plug's slot; an output's element comes into being when it is asked for
+std::shared_ptr<Slot> slotToEvaluate(const HPlug& plug) {
+    const HPlug::Impl* impl = plugImpl(plug);
+    return impl ? resolvePlug(plug, impl->field->computed) : nullptr;
+}
+
+HStatus pullPlug(const HPlug& plug) noexcept {
+    try {
+        const std::shared_ptr<Slot> slot = slotToEvaluate(plug);
+        if (slot)
+            return pull(slot);
+        return plug.isNull() ? nullPlug()
+                             : HStatus(HStatus::kFailure, "'" + plug.name().asStdString() + "' does not exist");
+    } catch (...) {
+        return statusOfException("evaluate");
+    }
+}
+
+} // namespace
+
+HStatus evaluate(const HPlug& plug) {
+    requireMain("evaluate");
+    return pullPlug(plug);
+}
+
+HStatus evaluate(const HPlugArray& plugs, bool parallel) {
+    requireMain("evaluate");
+    std::vector<HStatus> statuses(plugs.size());
+    if (parallel) {
+        for (const HPlug& plug : plugs)
+            slotToEvaluate(plug);
+        const ParallelSection section;
+        tbb::parallel_for(std::size_t{0}, plugs.size(), [&](std::size_t i) { statuses[i] = pullPlug(plugs[i]); });
+    } else {
+        for (std::size_t i = 0; i < plugs.size(); ++i)
+            statuses[i] = pullPlug(plugs[i]);
+    }
+    for (const HStatus& status : statuses)
+        if (status.error())
+            return status;
+    return HStatus::kSuccess;
+}
+
+HStatus makeDirty(const HPlug& plug) {
+    requireMain("makeDirty");
+    const std::shared_ptr<Slot> slot = resolvePlug(plug);
+    if (!slot)
+        return plug.isNull() ? nullPlug()
+                             : HStatus(HStatus::kFailure, "'" + plug.name().asStdString() + "' does not exist");
+    makeDirty(*slot, true);
+    return HStatus::kSuccess;
+}
+
+HStatus makeDirty(const HObject& node) {
+    requireMain("makeDirty");
+    const auto found = Access::as<Node>(node);
+    if (!found)
+        return {HStatus::kInvalidParameter, "the object is no node"};
+    for (const std::shared_ptr<Slot>& slot : found->data()->slots)
+        if (slot->field.computed)
+            makeDirty(*slot, true);
+    return HStatus::kSuccess;
+}
+
+unsigned computeCount(const HObject& node) {
+    const auto found = Access::as<Node>(node);
+    return found ? found->computes.load() : 0U;
+}
+
+DirtyWatch::DirtyWatch() {
+    currentGraph().observeDirty(&plugs_);
+}
+DirtyWatch::~DirtyWatch() {
+    if (Graph* graph = Graph::current())
+        graph->observeDirty(nullptr);
+}
+
+ComputeWatch::ComputeWatch() {
+    currentGraph().observeComputes(&plugs_);
+}
+ComputeWatch::~ComputeWatch() {
+    if (Graph* graph = Graph::current())
+        graph->observeComputes(nullptr);
+}
+
+struct EvaluationContext::Impl {
+    Context context;
+};
+
+EvaluationContext::EvaluationContext(double frame)
+    : impl_(new Impl{Context(frame)}) {}
+EvaluationContext::~EvaluationContext() = default;
+
+void EvaluationContext::setTime(double frame) {
+    impl_->context.setTime(frame);
+}
+
+HDataHandle EvaluationContext::evaluateAt(const HPlug& plug, HStatus* status) {
+    requireMain("EvaluationContext::evaluateAt");
+    const ContextScope scope(&impl_->context);
+    HStatus outcome = pullPlug(plug);
+    std::shared_ptr<Slot> slot = resolvePlug(plug);
+    if (status)
+        *status = outcome;
+    return slot ? Access::make<HDataHandle>(std::move(slot)) : HDataHandle();
+}
+
+} // namespace OpenQuarn
