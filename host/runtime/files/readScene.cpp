@@ -285,7 +285,7 @@ private:
 
     struct Found {
         std::shared_ptr<Node> node;
-        std::shared_ptr<Slot> slot;
+        std::unique_ptr<TentativeSlot> slot;
         std::string why;        ///< when there is no slot
         bool isMissing = false; ///< of a node that could not be created
         KeptScene::End end;
@@ -319,10 +319,14 @@ private:
             keepConnection(std::move(source.end), std::move(destination.end));
             return !isMissing;
         }
-        const std::string refusal = graph_.refusal(*source.slot, *destination.slot, false);
+        Slot& from = *source.slot->get();
+        Slot& to = *destination.slot->get();
+        const std::string refusal = graph_.refusal(from, to, false);
         if (refusal.empty()) {
-            graph_.connect(*source.slot, *destination.slot, false);
-        } else if (Graph::isConnectedInto(*destination.slot)) {
+            source.slot->keep();
+            destination.slot->keep();
+            graph_.connect(from, to, false);
+        } else if (Graph::isConnectedInto(to)) {
             warnings_.add(refusal + "; the connection is dropped");
         } else {
             warnings_.add(refusal + "; the connection is kept");
@@ -348,7 +352,7 @@ private:
         }
         found.end = {found.node, true, std::string(name.substr(dot + 1))};
         try {
-            found.slot = resolvePlugIn(*found.node->data(), plugNamed(found.node, found.end.name), true);
+            found.slot = std::make_unique<TentativeSlot>(plugNamed(found.node, found.end.name));
         } catch (const std::invalid_argument& error) {
             found.why = error.what();
         }

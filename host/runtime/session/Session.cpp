@@ -3,6 +3,7 @@
 
 #include "core/threads.h"
 #include "graph/Graph.h"
+#include "plugins/PluginTable.h"
 #include "services/SceneFileState.h"
 
 namespace OpenQuarn {
@@ -22,7 +23,8 @@ Session::Session() {
 }
 
 Session::~Session() {
-    setCurrentSceneFile({});
+    newScene();
+    PluginTable::instance().unloadAll();
 }
 
 void Session::newScene() {

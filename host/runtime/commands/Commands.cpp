@@ -1,0 +1,97 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn_app/Commands.h"
+
+#include "commands/CommandRegistry.h"
+#include "commands/ScriptText.h"
+#include "commands/WordValues.h"
+#include "commands/dispatch.h"
+#include "core/apiCall.h"
+
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+
+namespace OpenQuarn {
+namespace {
+
+CommandOutcome failed(const std::string& error) {
+    return {false, error, {}};
+}
+
+std::string place(std::string_view name, int line) {
+    return name.empty() ? std::string() : std::string(name) + ", line " + std::to_string(line) + ": ";
+}
+
+CommandOutcome runAll(const std::vector<ScriptCommand>& commands, std::string_view name, const ResultSink& results) {
+    CommandOutcome outcome;
+    for (const ScriptCommand& command : commands) {
+        const HStatus status = dispatch(command.words, outcome.result);
+        if (status.error())
+            return failed(place(name, command.line) + status.errorString().asStdString());
+        if (results && !std::holds_alternative<std::monostate>(outcome.result))
+            results(outcome.result);
+    }
+    return outcome;
+}
+
+// owner of the application's commands
+const char application = 'a';
+
+bool readFile(const std::string& path, std::string& text) {
+    std::ifstream file(path, std::ios::binary);
+    std::error_code isNone;
+    if (!file || std::filesystem::is_directory(path, isNone))
+        return false;
+    std::ostringstream all;
+    if (file.peek() != std::ifstream::traits_type::eof())
+        all << file.rdbuf();
+    const bool isRead = !file.bad() && !all.fail();
+    text = std::move(all).str();
+    return isRead;
+}
+
+} // namespace
+
+std::string quotedWord(std::string_view text) {
+    return quoteScriptWord(text);
+}
+
+CommandOutcome runCommand(std::string_view text) noexcept {
+    try {
+        return runScript(text, {});
+    } catch (...) {
+        return {false, {}, {}}; // no memory for the text of the error
+    }
+}
+
+CommandOutcome runScript(std::string_view text, std::string_view name, const ResultSink& results) {
+    std::vector<ScriptCommand> commands;
+    try {
+        commands = splitScript(text);
+    } catch (const ScriptError& error) {
+        return failed(place(name, error.line()) + error.what());
+    }
+    return runAll(commands, name, results);
+}
+
+CommandOutcome runScriptFile(const std::string& path, const ResultSink& results) {
+    std::string text;
+    if (!readFile(path, text))
+        return failed("the script " + inQuotes(path) + " cannot be read");
+    return runScript(text, path, results);
+}
+
+HStatus addCommand(const std::string& name, std::function<HPxCommand*()> create,
+                   const std::function<HSyntax()>& syntax) {
+    return CommandRegistry::instance().add(name, std::move(create), syntax, &application);
+}
+
+HStatus removeCommand(const std::string& name) {
+    return CommandRegistry::instance().remove(name, &application);
+}
+
+std::vector<std::string> commandNames() {
+    return CommandRegistry::instance().names();
+}
+
+} // namespace OpenQuarn

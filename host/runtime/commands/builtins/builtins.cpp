@@ -1,0 +1,16 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "commands/builtins/builtins.h"
+
+namespace OpenQuarn {
+
+void addBuiltins(CommandRegistry& registry) {
+    addConnectionCommands(registry);
+    addDuplicate(registry);
+    addGetAttr(registry);
+    addNodeCommands(registry);
+    addSceneCommands(registry);
+    addSetAttr(registry);
+    addTextCommands(registry);
+}
+
+} // namespace OpenQuarn

@@ -1,0 +1,19 @@
+// SPDX-License-Identifier: Apache-2.0
+// The host's own commands, by subject, each in a file of its own. docs/commands.md describes them.
+#pragma once
+
+namespace OpenQuarn {
+
+class CommandRegistry;
+
+void addBuiltins(CommandRegistry& registry);
+
+void addConnectionCommands(CommandRegistry& registry);
+void addDuplicate(CommandRegistry& registry);
+void addGetAttr(CommandRegistry& registry);
+void addNodeCommands(CommandRegistry& registry);
+void addSceneCommands(CommandRegistry& registry);
+void addSetAttr(CommandRegistry& registry);
+void addTextCommands(CommandRegistry& registry);
+
+} // namespace OpenQuarn
