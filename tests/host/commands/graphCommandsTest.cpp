@@ -228,6 +228,33 @@ TEST_F(GraphCommands, TheWorkspace) {
     OpenQuarn::Workspace::resetRootDirectory();
 }
 
+TEST_F(GraphCommands, TheSceneAndItsFile) {
+    const TemporaryFolder folder;
+    const std::string path = (folder.path() / "an arm.json").string();
+    const std::string other = (folder.path() / "other.json").string();
+    expectErrors({
+        {"file", "one of -new, -open, -save and -saveAs is needed, and 0 are given"},
+        {"file -new -save", "and 2 are given"},
+        {"file -save", "the scene has no file yet"},
+        {"file -open", "flag '-open', argument 1 (text) is missing"},
+    });
+    print("createNode testSum -name arm; setAttr arm.values 1 2");
+    EXPECT_EQ(print("file -saveAs " + OpenQuarn::quotedWord(path)), path);
+    print("setAttr arm.values 7; file -saveAs " + OpenQuarn::quotedWord(other));
+    EXPECT_EQ(print("file -open " + OpenQuarn::quotedWord(path) + "; getAttr arm.total"), "3");
+    EXPECT_EQ(print("setAttr arm.values 5; file -save"), path);
+    expectPrints({
+        {"file -new; ls", "time1"},
+        {"file -query -sceneName", ""},
+        {"createNode testSum -name kept", "kept"},
+    });
+    EXPECT_THAT(error("file -open " + OpenQuarn::quotedWord(path + "x")), HasSubstr(path + "x"));
+    EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr(path + "x")));
+    EXPECT_EQ(print("ls kept"), "kept");
+    EXPECT_EQ(print("file -open " + OpenQuarn::quotedWord(path) + "; getAttr arm.total"), "7");
+    EXPECT_EQ(print("file -query -sceneName"), path);
+}
+
 TEST_F(GraphCommands, DuplicateTakesValuesAndNoConnections) {
     create("testSum", "n");
     create("testSum", "up");
