@@ -3,6 +3,7 @@
 
 #include "core/threads.h"
 #include "graph/Graph.h"
+#include "plugins/PluginTable.h"
 
 namespace OpenQuarn {
 namespace {
@@ -20,7 +21,10 @@ Session::Session() {
     impl_ = std::make_unique<Impl>();
 }
 
-Session::~Session() = default;
+Session::~Session() {
+    newScene();
+    PluginTable::instance().unloadAll();
+}
 
 void Session::newScene() {
     impl_->graph.clear(firstFrame);
