@@ -34,12 +34,18 @@ HObject createNode(const std::shared_ptr<const OpenQuarn::NodeClass>& type, cons
 }
 
 HStatus connectNow(const HPlug& source, const HPlug& destination) {
-    const std::shared_ptr<Slot> from = OpenQuarn::resolvePlug(source, true);
-    const std::shared_ptr<Slot> to = OpenQuarn::resolvePlug(destination, true);
-    if (!from || !to)
+    OpenQuarn::TentativeSlot from(source);
+    OpenQuarn::TentativeSlot to(destination);
+    if (!from.get() || !to.get())
         return {HStatus::kFailure, "'" + source.name().asStdString() + "' or '" + destination.name().asStdString() +
                                        "' does not name one place"};
-    from->owner->node.graph().connect(*from, *to);
+    OpenQuarn::Graph& graph = from.get()->owner->node.graph();
+    graph.connect(*from.get(), *to.get());
+    for (OpenQuarn::TentativeSlot* end : {&from, &to}) {
+        if (end->isNew())
+            graph.notify(*end->get(), HNodeMessage::kAttributeArrayAdded);
+        end->keep();
+    }
     return HStatus::kSuccess;
 }
 

@@ -20,6 +20,7 @@ using OpenQuarn::FaultPoint;
 using OpenQuarn::nearestExisting;
 using OpenQuarn::resolvePlug;
 using OpenQuarn::Slot;
+using OpenQuarn::slotToEvaluate;
 
 namespace {
 
@@ -42,8 +43,7 @@ std::shared_ptr<Slot> evaluated(const HPlug& plug, HStatus& status) {
         status = nullPlug();
         return nullptr;
     }
-    // an output's element comes into being with the evaluation
-    std::shared_ptr<Slot> slot = resolvePlug(plug, impl->field->computed);
+    std::shared_ptr<Slot> slot = slotToEvaluate(plug);
     if (!slot)
         return nullptr;
     status = pull(slot);
