@@ -8,6 +8,7 @@ void addBuiltins(CommandRegistry& registry) {
     addDuplicate(registry);
     addGetAttr(registry);
     addNodeCommands(registry);
+    addPluginCommands(registry);
     addSceneCommands(registry);
     addSetAttr(registry);
     addTextCommands(registry);

@@ -12,6 +12,7 @@ void addConnectionCommands(CommandRegistry& registry);
 void addDuplicate(CommandRegistry& registry);
 void addGetAttr(CommandRegistry& registry);
 void addNodeCommands(CommandRegistry& registry);
+void addPluginCommands(CommandRegistry& registry);
 void addSceneCommands(CommandRegistry& registry);
 void addSetAttr(CommandRegistry& registry);
 void addTextCommands(CommandRegistry& registry);
