@@ -2,6 +2,7 @@
 #include "openquarn_app/Session.h"
 
 #include "core/threads.h"
+#include "geometry/filterAttributes.h"
 #include "graph/Graph.h"
 
 namespace OpenQuarn {
@@ -17,6 +18,7 @@ struct Session::Impl {
 
 Session::Session() {
     setMainThread();
+    registerGeometryNodes();
     impl_ = std::make_unique<Impl>();
 }
 
