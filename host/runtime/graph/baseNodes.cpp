@@ -82,11 +82,15 @@ void setBaseClass(HPxNode::Type type, std::shared_ptr<const NodeClass> base) {
     bases().at(static_cast<std::size_t>(type)) = std::move(base);
 }
 
-std::shared_ptr<const NodeClass> baseClassOf(HPxNode::Type type) {
+bool hasBaseClass(HPxNode::Type type) {
     const auto number = static_cast<std::size_t>(type);
-    if (type < 0 || number >= bases().size() || !bases()[number])
+    return number < bases().size() && bases()[number];
+}
+
+std::shared_ptr<const NodeClass> baseClassOf(HPxNode::Type type) {
+    if (!hasBaseClass(type))
         throw std::invalid_argument("there is no kind of node types with the number " + std::to_string(type));
-    return bases()[number];
+    return bases()[static_cast<std::size_t>(type)];
 }
 
 HFn::Type objectKindOf(HPxNode::Type type) {

@@ -20,6 +20,7 @@ unsigned timeOutPosition();
 
 /// The class that a kind of plug-in node begins with: its attributes and what depends on what.
 std::shared_ptr<const NodeClass> baseClassOf(HPxNode::Type type);
+bool hasBaseClass(HPxNode::Type type);
 /// For the families that bring such a class.
 void setBaseClass(HPxNode::Type type, std::shared_ptr<const NodeClass> base);
 /// The kind that nodes of such a type have.

@@ -4,6 +4,8 @@
 #include "core/threads.h"
 #include "geometry/filterAttributes.h"
 #include "graph/Graph.h"
+#include "plugins/PluginTable.h"
+#include "services/SceneFileState.h"
 
 namespace OpenQuarn {
 namespace {
@@ -22,10 +24,14 @@ Session::Session() {
     impl_ = std::make_unique<Impl>();
 }
 
-Session::~Session() = default;
+Session::~Session() {
+    newScene();
+    PluginTable::instance().unloadAll();
+}
 
 void Session::newScene() {
     impl_->graph.clear(firstFrame);
+    setCurrentSceneFile({});
 }
 
 std::vector<HObject> Session::nodes() const {

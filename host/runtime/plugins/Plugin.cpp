@@ -1,0 +1,182 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "plugins/Plugin.h"
+
+#include "commands/CommandRegistry.h"
+#include "core/text.h"
+#include "graph/Data.h"
+#include "graph/Graph.h"
+#include "graph/baseNodes.h"
+#include "plugins/GPUDeformers.h"
+
+#include <algorithm>
+#include <stdexcept>
+
+namespace OpenQuarn {
+namespace {
+
+std::string counted(std::size_t count, const std::string& thing) {
+    return std::to_string(count) + " " + thing + (count == 1 ? "" : "s");
+}
+
+std::string nodeUsers(const Registration& registration) {
+    const std::shared_ptr<const NodeClass> type = findNodeClass(registration.id);
+    const Graph* graph = Graph::current();
+    const std::size_t count = type && graph ? graph->nodeCount(*type) : 0;
+    if (count == 0)
+        return {};
+    const std::vector<std::shared_ptr<Node>> nodes = graph->nodes();
+    const auto first = std::find_if(nodes.begin(), nodes.end(),
+                                    [&](const std::shared_ptr<Node>& node) { return &node->type() == type.get(); });
+    return counted(count, "node") + " of type '" + type->name + "', such as '" + (*first)->name() + "'";
+}
+
+std::string dataUsers(const Registration& registration) {
+    const std::shared_ptr<const DataType> type = findDataType(registration.id);
+    const int count = type ? type->objects.load() : 0;
+    return count == 0 ? std::string()
+                      : counted(static_cast<std::size_t>(count), "object") + " of data type '" + type->name + "'";
+}
+
+void deleteNodesOf(HTypeId id) {
+    Graph* graph = Graph::current();
+    const std::shared_ptr<const NodeClass> type = findNodeClass(id);
+    if (!graph || !type)
+        return;
+    for (const std::shared_ptr<Node>& node : graph->nodes())
+        if (&node->type() == type.get())
+            graph->deleteNode(*node);
+}
+
+} // namespace
+
+std::string describe(const Registration& registration) {
+    const char* const kinds[] = {"node type", "data type", "command", "GPU deformer of node type"};
+    return std::string(kinds[static_cast<int>(registration.kind)]) + " '" + registration.name + "'";
+}
+
+std::string usersOf(const Registration& registration) {
+    if (registration.kind == Registration::Kind::node)
+        return nodeUsers(registration);
+    return registration.kind == Registration::Kind::data ? dataUsers(registration) : std::string();
+}
+
+Plugin::Plugin(std::string pluginName, std::string pluginPath, std::string builtFor)
+    : name(std::move(pluginName))
+    , path(std::move(pluginPath))
+    , apiVersion(std::move(builtFor)) {}
+
+void Plugin::introduce(const std::string& vendor, const std::string& version) {
+    if (introduced_)
+        return;
+    vendor_ = vendor;
+    version_ = version;
+    introduced_ = true;
+}
+
+void Plugin::registerNode(const std::string& typeName, HTypeId id, HPxNode* (*creator)(), HStatus (*initializer)(),
+                          HPxNode::Type type) {
+    const std::shared_ptr<NodeClass> built = buildNodeClass(typeName, id, type, creator, initializer);
+    built->plugin = name;
+    registrations_.push_back({Registration::Kind::node, typeName, id});
+    try {
+        addNodeClass(built);
+    } catch (...) {
+        registrations_.pop_back();
+        throw;
+    }
+}
+
+void Plugin::registerData(const std::string& typeName, HTypeId id, HPxData* (*creator)()) {
+    const auto type = std::make_shared<DataType>();
+    type->name = typeName;
+    type->id = id;
+    type->creator = creator;
+    registrations_.push_back({Registration::Kind::data, typeName, id});
+    try {
+        addDataType(type);
+    } catch (...) {
+        registrations_.pop_back();
+        throw;
+    }
+}
+
+HStatus Plugin::registerCommand(const std::string& command, HPxCommand* (*creator)(), HSyntax (*syntax)()) {
+    registrations_.push_back({Registration::Kind::command, command, {}});
+    const HStatus status = CommandRegistry::instance().add(command, creator, syntax, this);
+    if (status.error())
+        registrations_.pop_back();
+    return status;
+}
+
+void Plugin::deregister(Registration::Kind kind, HTypeId id) {
+    const auto place = std::find_if(registrations_.begin(), registrations_.end(), [&](const Registration& present) {
+        return present.kind == kind && present.id == id;
+    });
+    if (place == registrations_.end())
+        throw std::invalid_argument("plug-in '" + name + "' has registered no " +
+                                    (kind == Registration::Kind::node ? "node" : "data") + " type " + hexText(id));
+    remove(place);
+}
+
+void Plugin::deregister(Registration::Kind kind, const std::string& registered) {
+    const auto place = std::find_if(registrations_.begin(), registrations_.end(), [&](const Registration& present) {
+        return present.kind == kind && present.name == registered;
+    });
+    if (place == registrations_.end())
+        throw std::invalid_argument("plug-in '" + name + "' has registered no " + describe({kind, registered, {}}));
+    remove(place);
+}
+
+void Plugin::remove(Place place) {
+    const std::string users = usersOf(*place);
+    if (!users.empty())
+        throw std::invalid_argument(describe(*place) + " cannot be deregistered: there are still " + users);
+    removeFrom(*place);
+    registrations_.erase(place);
+}
+
+void Plugin::removeFrom(const Registration& registration) const {
+    switch (registration.kind) {
+    case Registration::Kind::node:
+        removeNodeClass(registration.id);
+        break;
+    case Registration::Kind::data:
+        removeDataType(registration.id);
+        break;
+    case Registration::Kind::gpuDeformer:
+        removeGPUDeformer(registration.name);
+        break;
+    case Registration::Kind::command:
+        const HStatus status = CommandRegistry::instance().remove(registration.name, this);
+        if (status.error())
+            throw std::runtime_error(status.errorString().asStdString());
+        break;
+    }
+}
+
+std::string Plugin::users() const {
+    std::string all;
+    for (const Registration& registration : registrations_) {
+        const std::string users = usersOf(registration);
+        if (!users.empty())
+            all += (all.empty() ? "" : ", ") + users;
+    }
+    return all;
+}
+
+std::vector<Registration> Plugin::removeAll() {
+    std::vector<Registration> found = registrations_;
+    for (std::size_t i = registrations_.size(); i-- > 0;) {
+        const auto place = registrations_.begin() + static_cast<std::ptrdiff_t>(i);
+        if (place->kind == Registration::Kind::node)
+            deleteNodesOf(place->id);
+        try {
+            remove(place);
+        } catch (const std::exception&) {
+            continue; // stays in the list, where the caller finds it
+        }
+    }
+    return found;
+}
+
+} // namespace OpenQuarn

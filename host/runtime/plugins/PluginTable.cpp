@@ -1,0 +1,231 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "plugins/PluginTable.h"
+
+#include "commands/CommandRegistry.h"
+#include "core/apiCall.h"
+#include "graph/Graph.h"
+#include "openquarn_app/Messages.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <stdexcept>
+
+namespace OpenQuarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+fs::path existingFile(const std::string& path) {
+    std::error_code error;
+    const fs::path whole = fs::canonical(path, error);
+    if (error)
+        throw std::runtime_error("there is no such file: " + error.message());
+    if (!fs::is_regular_file(whole, error))
+        throw std::runtime_error("it is not a file");
+    return whole;
+}
+
+PluginEntryPoint entryPoint(const Library& library, const char* name) {
+    return reinterpret_cast<PluginEntryPoint>(library.symbol(name));
+}
+
+std::string listed(const std::vector<Registration>& registrations) {
+    std::string text;
+    for (const Registration& registration : registrations)
+        text += (text.empty() ? "" : ", ") + describe(registration);
+    return text;
+}
+
+[[noreturn]] void refuseLoading(const std::string& what, const std::string& why) {
+    throw std::runtime_error("plug-in '" + what + "' cannot be loaded: " + why);
+}
+
+} // namespace
+
+PluginTable& PluginTable::instance() {
+    static PluginTable table;
+    return table;
+}
+
+PluginTable::Place PluginTable::placeOf(const std::string& name) {
+    return std::find_if(loaded_.begin(), loaded_.end(),
+                        [&](const Loaded& loaded) { return loaded.plugin->name == name; });
+}
+
+std::shared_ptr<Plugin> PluginTable::find(const std::string& name) const {
+    for (const Loaded& loaded : loaded_)
+        if (loaded.plugin->name == name)
+            return loaded.plugin;
+    return nullptr;
+}
+
+std::vector<std::shared_ptr<Plugin>> PluginTable::all() const {
+    std::vector<std::shared_ptr<Plugin>> plugins;
+    plugins.reserve(loaded_.size());
+    for (const Loaded& loaded : loaded_)
+        plugins.push_back(loaded.plugin);
+    return plugins;
+}
+
+void PluginTable::refuseTaken(const std::string& name, const std::string& path) const {
+    if (const std::shared_ptr<Plugin> present = find(name))
+        throw std::runtime_error("a plug-in named '" + name + "' is loaded already, " +
+                                 (present->path.empty() ? "as part of the application" : "from " + present->path) +
+                                 (path.empty() ? "" : "; unload it first"));
+    if (active_ && active_->name == name)
+        throw std::runtime_error("a plug-in named '" + name + "' is being loaded or unloaded");
+}
+
+std::string PluginTable::load(const std::string& path) {
+    try {
+        const fs::path whole = existingFile(path);
+        const std::string name = whole.stem().string();
+        const std::shared_ptr<Plugin> present = find(name);
+        if (present && present->path == whole.string())
+            return name;
+        refuseTaken(name, whole.string());
+        Loaded loaded;
+        loaded.library = std::make_unique<Library>(whole.string());
+        const std::string builtFor = checkedApiVersion(static_cast<const char*>(loaded.library->symbol("HApiVersion")));
+        loaded.initialize = entryPoint(*loaded.library, "initializePlugin");
+        loaded.uninitialize = entryPoint(*loaded.library, "uninitializePlugin");
+        loaded.plugin = std::make_shared<Plugin>(name, whole.string(), builtFor);
+        start(std::move(loaded));
+        return name;
+    } catch (const std::exception& error) {
+        refuseLoading(path, error.what());
+    }
+}
+
+void PluginTable::addInProcess(const std::string& name, PluginEntryPoint initialize, PluginEntryPoint uninitialize) {
+    try {
+        if (name.empty() || !initialize || !uninitialize)
+            throw std::invalid_argument("it needs a name and two functions");
+        refuseTaken(name, {});
+        start({std::make_shared<Plugin>(name, std::string(), hostApiVersion()), nullptr, initialize, uninitialize});
+    } catch (const std::exception& error) {
+        refuseLoading(name, error.what());
+    }
+}
+
+HStatus PluginTable::call(const Loaded& loaded, PluginEntryPoint entry, const char* name) {
+    Plugin* const previous = std::exchange(active_, loaded.plugin.get());
+    HStatus status;
+    try {
+        status = entry(Access::object(loaded.plugin));
+    } catch (...) {
+        status = statusOfException(name);
+    }
+    active_ = previous;
+    return status;
+}
+
+void PluginTable::start(Loaded loaded) {
+    currentGraph(); // throws when there is no session, and the host's own types with it
+    loaded_.reserve(loaded_.size() + 1);
+    const HStatus status = call(loaded, loaded.initialize, "initializePlugin");
+    if (status.error()) {
+        const std::string why = "initializePlugin failed: " + status.errorString().asStdString();
+        loaded.plugin->removeAll();
+        retire(loaded);
+        throw std::runtime_error(why);
+    }
+    loaded_.push_back(std::move(loaded));
+}
+
+// The last step: nothing of the host leads into the plug-in any more, or its library stays where it is.
+void PluginTable::retire(Loaded& loaded) const {
+    loaded.plugin->bury();
+    const std::vector<Registration>& left = loaded.plugin->registrations();
+    if (loaded.library && !left.empty()) {
+        showMessage(Severity::warning, "the library of plug-in '" + loaded.plugin->name + "' stays mapped, since " +
+                                           listed(left) + " is still in use: " + loaded.plugin->users());
+        loaded.library->keep();
+    }
+    loaded.library.reset();
+}
+
+void PluginTable::refuseInUse(const Plugin& plugin) {
+    const std::string users = plugin.users();
+    if (!users.empty())
+        throw std::runtime_error("there are still " + users);
+    if (CommandRegistry::instance().isRunning(&plugin))
+        throw std::runtime_error("one of its commands is running");
+}
+
+void PluginTable::unload(const std::string& name) {
+    const auto place = placeOf(name);
+    if (place == loaded_.end())
+        throw std::runtime_error("no plug-in named '" + name + "' is loaded");
+    try {
+        if (active_)
+            throw std::runtime_error("plug-in '" + active_->name + "' is being loaded or unloaded");
+        refuseInUse(*place->plugin);
+        const HStatus status = call(*place, place->uninitialize, "uninitializePlugin");
+        if (status.error())
+            throw std::runtime_error("uninitializePlugin failed, and it stays loaded: " +
+                                     status.errorString().asStdString());
+    } catch (const std::exception& error) {
+        throw std::runtime_error("plug-in '" + name + "' cannot be unloaded: " + error.what());
+    }
+    Loaded loaded = std::move(*placeOf(name)); // it may have loaded another meanwhile
+    loaded_.erase(placeOf(name));
+    const std::vector<Registration> left = loaded.plugin->removeAll();
+    if (!left.empty())
+        showMessage(Severity::warning,
+                    "plug-in '" + name + "' left registered, and the host took away: " + listed(left));
+    retire(loaded);
+}
+
+void PluginTable::unloadAll() noexcept {
+    while (!loaded_.empty()) {
+        try {
+            Loaded loaded = std::move(loaded_.back());
+            loaded_.pop_back();
+            const HStatus status = call(loaded, loaded.uninitialize, "uninitializePlugin");
+            if (status.error())
+                showMessage(Severity::warning, "plug-in '" + loaded.plugin->name + "': uninitializePlugin failed: " +
+                                                   status.errorString().asStdString());
+            loaded.plugin->removeAll();
+            retire(loaded);
+        } catch (const std::exception& error) {
+            showMessage(Severity::warning, error.what());
+        }
+    }
+}
+
+// --- what applications see ---
+
+std::string loadPlugin(const std::string& path) {
+    return PluginTable::instance().load(path);
+}
+
+void addPlugin(const std::string& name, PluginEntryPoint initialize, PluginEntryPoint uninitialize) {
+    PluginTable::instance().addInProcess(name, initialize, uninitialize);
+}
+
+void unloadPlugin(const std::string& name) {
+    PluginTable::instance().unload(name);
+}
+
+std::vector<std::string> loadedPlugins() {
+    std::vector<std::string> names;
+    const std::vector<std::shared_ptr<Plugin>> plugins = PluginTable::instance().all();
+    names.reserve(plugins.size());
+    for (const std::shared_ptr<Plugin>& plugin : plugins)
+        names.push_back(plugin->name);
+    return names;
+}
+
+PluginInfo pluginInfo(const std::string& name) {
+    const std::shared_ptr<Plugin> plugin = PluginTable::instance().find(name);
+    if (!plugin)
+        throw std::runtime_error("no plug-in named '" + name + "' is loaded");
+    PluginInfo info{name, plugin->path, plugin->vendor(), plugin->version(), plugin->apiVersion, {}, {}, {}, {}};
+    std::vector<std::string>* const lists[] = {&info.nodeTypes, &info.dataTypes, &info.commands, &info.gpuDeformers};
+    for (const Registration& registration : plugin->registrations())
+        lists[static_cast<int>(registration.kind)]->push_back(registration.name);
+    return info;
+}
+
+} // namespace OpenQuarn
