@@ -12,7 +12,8 @@ public:
     static bool isPlaying() noexcept;
     /// True while the user drags the current time to and fro. [any]
     static bool isScrubbing() noexcept;
-    /// The scene's time. An evaluation at another time has its own in its context (HDGContext). [any]
+    /// The scene's time; 0 while no scene is open. An evaluation at another time has its own in its context
+    /// (HDGContext). [eval]
     static HTime currentTime() noexcept;
     /// First frame of the animation; 1 until the application sets another. [any]
     static HTime animationStartTime() noexcept;

@@ -3,7 +3,6 @@
 
 #include "core/apiCall.h"
 #include "core/text.h"
-#include "core/threads.h"
 #include "graph/Graph.h"
 #include "graph/plugImpl.h"
 #include "openquarn/HGlobal.h"
@@ -28,7 +27,6 @@ HStatus noPlug() {
 
 HObject createNode(const std::shared_ptr<const OpenQuarn::NodeClass>& type, const std::string& wanted,
                    HStatus& outcome) {
-    OpenQuarn::requireMain("HDGModifier::createNode");
     if (type)
         return Access::object(OpenQuarn::currentGraph().createNode(type));
     outcome = {HStatus::kNotFound, "no node type " + wanted + " is registered"};
@@ -36,12 +34,18 @@ HObject createNode(const std::shared_ptr<const OpenQuarn::NodeClass>& type, cons
 }
 
 HStatus connectNow(const HPlug& source, const HPlug& destination) {
-    const std::shared_ptr<Slot> from = OpenQuarn::resolvePlug(source, true);
-    const std::shared_ptr<Slot> to = OpenQuarn::resolvePlug(destination, true);
-    if (!from || !to)
+    OpenQuarn::TentativeSlot from(source);
+    OpenQuarn::TentativeSlot to(destination);
+    if (!from.get() || !to.get())
         return {HStatus::kFailure, "'" + source.name().asStdString() + "' or '" + destination.name().asStdString() +
                                        "' does not name one place"};
-    from->owner->node.graph().connect(*from, *to);
+    OpenQuarn::Graph& graph = from.get()->owner->node.graph();
+    graph.connect(*from.get(), *to.get());
+    for (OpenQuarn::TentativeSlot* end : {&from, &to}) {
+        if (end->isNew())
+            graph.notify(*end->get(), HNodeMessage::kAttributeArrayAdded);
+        end->keep();
+    }
     return HStatus::kSuccess;
 }
 
@@ -190,7 +194,6 @@ HStatus HDGModifier::commandToExecute(const HString& command) {
 
 HStatus HDGModifier::doIt() {
     return apiCall(FaultPoint::HDGModifier_doIt, [&]() -> HStatus {
-        OpenQuarn::requireMain("HDGModifier::doIt");
         std::size_t made = 0;
         HStatus status;
         for (; made < changes_.size(); ++made) {

@@ -3,6 +3,7 @@
 
 #include "graph/Context.h"
 #include "graph/arrayLock.h"
+#include "graph/evaluation.h"
 
 #include <algorithm>
 
@@ -88,6 +89,39 @@ std::shared_ptr<Slot> nearestExisting(const HPlug& plug) {
 std::shared_ptr<Slot> resolvePlug(const HPlug& plug, bool create) {
     const HPlug::Impl* impl = plugImpl(plug);
     return impl ? resolvePlugIn(*dataInCurrentContext(*impl->node), plug, create) : nullptr;
+}
+
+std::shared_ptr<Slot> slotToEvaluate(const HPlug& plug) {
+    const HPlug::Impl* impl = plugImpl(plug);
+    if (!impl)
+        return nullptr;
+    std::shared_ptr<Slot> slot = resolvePlug(plug, impl->field->computed);
+    if (slot)
+        return slot;
+    for (const Slot* at = nearestExisting(plug).get(); at; at = at->parent)
+        if (sourceInContext(*at)) {
+            pull(std::const_pointer_cast<Slot>(at->shared_from_this()));
+            return resolvePlug(plug);
+        }
+    return nullptr;
+}
+
+TentativeSlot::TentativeSlot(const HPlug& plug)
+    : slot_(resolvePlug(plug)) {
+    if (slot_)
+        return;
+    const std::shared_ptr<Slot> existing = nearestExisting(plug);
+    slot_ = resolvePlug(plug, true);
+    for (Slot* at = slot_.get(); at && at != existing.get(); at = at->parent)
+        made_ = at;
+}
+
+TentativeSlot::~TentativeSlot() {
+    if (!made_ || !made_->parent)
+        return;
+    const std::shared_ptr<Slot> element = made_->parent->elements.remove(made_->index);
+    if (element)
+        element->detach();
 }
 
 } // namespace OpenQuarn

@@ -35,6 +35,29 @@ std::shared_ptr<Slot> resolvePlugIn(const NodeData& data, const HPlug& plug, boo
 /// The slot of the plug, or the nearest one above it that exists; null for a null plug.
 std::shared_ptr<Slot> nearestExisting(const HPlug& plug);
 
+/// The slot that a plug's value comes from when it is evaluated. An element that does not exist may come into being
+/// with the evaluation: of an output it is made, below a connected array the array is evaluated first. Null as for
+/// resolvePlug().
+std::shared_ptr<Slot> slotToEvaluate(const HPlug& plug);
+
+/// The slot of a plug, made where it is missing, for as long as it is not clear whether it is needed: what was made is
+/// taken away again unless keep() is called.
+class TentativeSlot {
+public:
+    explicit TentativeSlot(const HPlug& plug);
+    ~TentativeSlot();
+    TentativeSlot(const TentativeSlot&) = delete;
+    TentativeSlot& operator=(const TentativeSlot&) = delete;
+    /// Null when the plug does not name one place.
+    Slot* get() const { return slot_.get(); }
+    bool isNew() const { return made_ != nullptr; }
+    void keep() { made_ = nullptr; }
+
+private:
+    std::shared_ptr<Slot> slot_;
+    Slot* made_ = nullptr; // the outermost element that was made
+};
+
 /// The plug behind a handle; null for a null plug, or one whose node has gone.
 const HPlug::Impl* plugImpl(const HPlug& plug);
 HPlug plugOf(HPlug::Impl impl);

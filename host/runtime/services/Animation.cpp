@@ -2,6 +2,7 @@
 #include "openquarn_app/Animation.h"
 
 #include "openquarn/HAnimControl.h"
+#include "openquarn/HDGContext.h"
 #include "services/AnimationState.h"
 
 #include <cmath>
@@ -51,7 +52,7 @@ bool HAnimControl::isScrubbing() noexcept {
 }
 
 HTime HAnimControl::currentTime() noexcept {
-    return HTime(animationState().currentFrame);
+    return HTime(HDGContext().time());
 }
 
 HTime HAnimControl::animationStartTime() noexcept {

@@ -6,12 +6,10 @@
 
 namespace OpenQuarn {
 
-/// Plain values; who changes the current frame also marks what depends on it as dirty. Thread: set on the main thread,
-/// read on any.
+/// Plain values; the current time is the graph's. Thread: set on the main thread, read on any.
 struct AnimationState {
     std::atomic<bool> isPlaying{false};
     std::atomic<bool> isScrubbing{false};
-    std::atomic<double> currentFrame{1.0};
     std::atomic<double> framesPerSecond{24.0}; // finite and above 0
     std::atomic<double> startFrame{1.0};
     std::atomic<double> endFrame{120.0};

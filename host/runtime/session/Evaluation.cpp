@@ -19,12 +19,6 @@ HStatus nullPlug() {
     return {HStatus::kInvalidParameter, "the plug is null"};
 }
 
-// the plug's slot; an output's element comes into being when it is asked for
-std::shared_ptr<Slot> slotToEvaluate(const HPlug& plug) {
-    const HPlug::Impl* impl = plugImpl(plug);
-    return impl ? resolvePlug(plug, impl->field->computed) : nullptr;
-}
-
 HStatus pullPlug(const HPlug& plug) noexcept {
     try {
         const std::shared_ptr<Slot> slot = slotToEvaluate(plug);

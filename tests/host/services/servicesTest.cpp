@@ -8,6 +8,7 @@
 #include "openquarn_app/Animation.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Resources.h"
+#include "openquarn_app/Session.h"
 #include "openquarn_app/Usage.h"
 
 #include <gmock/gmock.h>
@@ -45,6 +46,11 @@ TEST(AnimationState, IsWhatTheApplicationSets) {
     Animation::setScrubbing(true);
     EXPECT_TRUE(!HAnimControl::isPlaying() && HAnimControl::isScrubbing());
     Animation::setScrubbing(false);
+
+    EXPECT_EQ(HAnimControl::currentTime(), HTime(0.0));
+    OpenQuarn::Session session;
+    session.setTime(12.25);
+    EXPECT_EQ(HAnimControl::currentTime(), HTime(12.25));
 
     Animation::setRange(-10.5, 30.0);
     EXPECT_EQ(HAnimControl::animationStartTime(), HTime(-10.5));

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Tells the host what the animation is doing. The current time is set with the scene, which has to follow it.
+// Tells the host what the animation is doing. The current time is set with the scene (Session).
 #pragma once
 
 #include "openquarn/HApi.h"
