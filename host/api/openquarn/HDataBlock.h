@@ -48,7 +48,7 @@ public:
     HStatus setClean(const HPlug& plug);
     HStatus setClean(const HObject& attribute);
     bool isClean(const HPlug& plug) const;
-    /// The context that the data belongs to.
+    /// The context that the data belongs to. [any]
     HDGContext context() const;
 
 private:
@@ -63,11 +63,11 @@ private:
 class OPENQUARN_API HDataHandle {
 public:
     HDataHandle();
-    bool isValid() const;
+    bool isValid() const; ///< [any]
     /// kMesh (14) for a mesh, kNumeric for numbers and enums, kInvalid for a data attribute that holds nothing.
     HFnData::Type type() const;
-    HFnNumericData::Type numericType() const;
-    HObject attribute() const;
+    HFnNumericData::Type numericType() const; ///< [any]
+    HObject attribute() const;                ///< [any]
 
     bool asBool() const;
     short asShort() const;
@@ -119,7 +119,7 @@ public:
     HArrayDataHandle();
     /// The array child of a compound value. Fails when the value is no array.
     explicit HArrayDataHandle(const HDataHandle& array, HStatus* status = nullptr);
-    bool isValid() const;
+    bool isValid() const; ///< [any]
     unsigned elementCount() const;
     /// Logical index of the element it stands on. Fails beyond the last.
     unsigned elementIndex(HStatus* status = nullptr) const;

@@ -9,8 +9,7 @@
 
 /// What every kind of attribute has. A new attribute is not an array, readable, writable, connectable, storable, not
 /// hidden, keyable when it is numeric, and its array elements keep their index. Flags are set between create() and
-/// HPxNode::addAttribute(): afterwards the attribute is fixed and a set call fails. [main] for all set calls, [any] for
-/// the others.
+/// HPxNode::addAttribute(): afterwards the attribute is fixed and a set call fails. [any] unless a call says otherwise.
 class OPENQUARN_API HFnAttribute : public HFnBase {
 public:
     /// What happens to an element whose incoming connection is broken.
@@ -42,7 +41,7 @@ public:
     bool isUsedAsFilename() const;
     DisconnectBehavior disconnectBehavior() const;
 
-    /// Makes the attribute a sparse array, whose elements are found by logical index.
+    /// Makes the attribute a sparse array, whose elements are found by logical index. [main], as for all set calls.
     HStatus setArray(bool on);
     /// May be the source of a connection.
     HStatus setReadable(bool on);
@@ -74,13 +73,14 @@ public:
     /// attribute's own unit. [main]
     HObject create(const HString& longName, const HString& shortName, HFnNumericData::Type kind,
                    double defaultValue = 0.0, HStatus* status = nullptr);
-    HFnNumericData::Type numericType() const;
-    double defaultValue() const;
     HStatus setDefault(double value);
     HStatus setMin(double value);
     HStatus setMax(double value);
     HStatus setSoftMin(double value);
     HStatus setSoftMax(double value);
+
+    HFnNumericData::Type numericType() const;
+    double defaultValue() const;
     bool hasMin() const;
     bool hasMax() const;
     bool hasSoftMin() const;
@@ -106,6 +106,7 @@ public:
     /// The same for the data type that a plug-in registered under this id. [main]
     HObject create(const HString& longName, const HString& shortName, const HTypeId& pluginDataType,
                    const HObject& defaultValue = HObject::kNullObj, HStatus* status = nullptr);
+
     HFnData::Type attrType() const;
 };
 
@@ -121,12 +122,13 @@ public:
                    HStatus* status = nullptr);
     /// Fails when the number has a label already. [main]
     HStatus addField(const HString& label, short value);
+    HStatus setDefault(short value);
+
     /// "" for a number without a label, which fails.
     HString fieldName(short value, HStatus* status = nullptr) const;
     /// 0 for a label that no number has, which fails.
     short fieldIndex(const HString& label, HStatus* status = nullptr) const;
     short defaultValue() const;
-    HStatus setDefault(short value);
 };
 
 /// A group of attributes that are read, connected and made arrays together.
@@ -140,6 +142,7 @@ public:
     HObject create(const HString& longName, const HString& shortName, HStatus* status = nullptr);
     /// Fails when the child has a parent already or one of its names is taken. [main]
     HStatus addChild(const HObject& child);
+
     unsigned numChildren() const;
     /// Null, and a failure, when there is no such child.
     HObject child(unsigned index, HStatus* status = nullptr) const;

@@ -29,6 +29,7 @@ public:
     HStatus getPlug(unsigned index, HPlug& plug) const;
 
 private:
+    friend class HArgDatabase;
     struct Item {
         HObject node;
         HPlug plug;

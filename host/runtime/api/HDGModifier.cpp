@@ -3,7 +3,6 @@
 
 #include "core/apiCall.h"
 #include "core/text.h"
-#include "core/threads.h"
 #include "graph/Graph.h"
 #include "graph/plugImpl.h"
 #include "openquarn/HGlobal.h"
@@ -28,7 +27,6 @@ HStatus noPlug() {
 
 HObject createNode(const std::shared_ptr<const OpenQuarn::NodeClass>& type, const std::string& wanted,
                    HStatus& outcome) {
-    OpenQuarn::requireMain("HDGModifier::createNode");
     if (type)
         return Access::object(OpenQuarn::currentGraph().createNode(type));
     outcome = {HStatus::kNotFound, "no node type " + wanted + " is registered"};
@@ -196,7 +194,6 @@ HStatus HDGModifier::commandToExecute(const HString& command) {
 
 HStatus HDGModifier::doIt() {
     return apiCall(FaultPoint::HDGModifier_doIt, [&]() -> HStatus {
-        OpenQuarn::requireMain("HDGModifier::doIt");
         std::size_t made = 0;
         HStatus status;
         for (; made < changes_.size(); ++made) {

@@ -29,7 +29,6 @@ HStatus noData() {
 
 /// The slot of an attribute in the block; null, with the status set, when it has none.
 SlotPointer slotOf(const std::shared_ptr<NodeData>& data, const HObject& attribute, HStatus& status) {
-    OpenQuarn::requireEval("HDataBlock");
     if (!data || data->isGone()) {
         status = noData();
         return nullptr;
@@ -45,7 +44,6 @@ SlotPointer slotOf(const std::shared_ptr<NodeData>& data, const HObject& attribu
 }
 
 SlotPointer slotOf(const std::shared_ptr<NodeData>& data, const HPlug& plug, bool create, HStatus& status) {
-    OpenQuarn::requireEval("HDataBlock");
     const HPlug::Impl* impl = OpenQuarn::plugImpl(plug);
     if (!data || data->isGone() || !impl || impl->node.get() != &data->node) {
         status = {HStatus::kInvalidParameter,
@@ -152,6 +150,7 @@ HStatus HDataBlock::setClean(const HObject& attribute) {
 }
 
 bool HDataBlock::isClean(const HPlug& plug) const {
+    OpenQuarn::requireEval("HDataBlock::isClean");
     HStatus status;
     const SlotPointer slot = slotOf(impl_, plug, false, status);
     return slot && !slot->mayBeDirty();
@@ -172,6 +171,7 @@ bool HDataHandle::isValid() const {
 }
 
 HFnData::Type HDataHandle::type() const {
+    OpenQuarn::requireEval("HDataHandle::type");
     if (!impl_)
         return HFnData::kInvalid;
     if (impl_->data)
@@ -187,41 +187,61 @@ HObject HDataHandle::attribute() const {
     return impl_ ? Access::object(std::const_pointer_cast<OpenQuarn::Attribute>(impl_->field.attribute)) : HObject();
 }
 
+namespace {
+
+const Slot* toRead(const SlotPointer& slot, [[maybe_unused]] const char* function) {
+    OpenQuarn::requireEval(function);
+    return slot.get();
+}
+
+} // namespace
+
 bool HDataHandle::asBool() const {
-    return impl_ && numberIn(*impl_) != 0.0;
+    const Slot* slot = toRead(impl_, "HDataHandle::asBool");
+    return slot && numberIn(*slot) != 0.0;
 }
 short HDataHandle::asShort() const {
-    return impl_ ? shortIn(*impl_) : short{0};
+    const Slot* slot = toRead(impl_, "HDataHandle::asShort");
+    return slot ? shortIn(*slot) : short{0};
 }
 int HDataHandle::asInt() const {
-    return impl_ ? intIn(*impl_) : 0;
+    const Slot* slot = toRead(impl_, "HDataHandle::asInt");
+    return slot ? intIn(*slot) : 0;
 }
 float HDataHandle::asFloat() const {
-    return static_cast<float>(asDouble());
+    const Slot* slot = toRead(impl_, "HDataHandle::asFloat");
+    return slot ? static_cast<float>(numberIn(*slot)) : 0.0F;
 }
 double HDataHandle::asDouble() const {
-    return impl_ ? numberIn(*impl_) : 0.0;
+    const Slot* slot = toRead(impl_, "HDataHandle::asDouble");
+    return slot ? numberIn(*slot) : 0.0;
 }
 HString HDataHandle::asString() const {
-    return impl_ ? HString(textIn(*impl_)) : HString();
+    const Slot* slot = toRead(impl_, "HDataHandle::asString");
+    return slot ? HString(textIn(*slot)) : HString();
 }
 HMatrix HDataHandle::asMatrix() const {
-    return impl_ ? OpenQuarn::toMatrix(matrixIn(*impl_)) : HMatrix();
+    const Slot* slot = toRead(impl_, "HDataHandle::asMatrix");
+    return slot ? OpenQuarn::toMatrix(matrixIn(*slot)) : HMatrix();
 }
 
 HObject HDataHandle::asMesh() const {
-    return type() == HFnData::kMesh ? Access::object(impl_->data) : HObject();
+    const Slot* slot = toRead(impl_, "HDataHandle::asMesh");
+    return slot && slot->data && slot->data->dataType() == HFnData::kMesh ? Access::object(slot->data) : HObject();
 }
 HObject HDataHandle::data() const {
-    return impl_ && impl_->data ? Access::object(impl_->data) : HObject();
+    const Slot* slot = toRead(impl_, "HDataHandle::data");
+    return slot && slot->data ? Access::object(slot->data) : HObject();
 }
 
 HPxData* HDataHandle::asPluginData() const {
-    const auto* data = impl_ ? dynamic_cast<const OpenQuarn::PluginData*>(impl_->data.get()) : nullptr;
+    const Slot* slot = toRead(impl_, "HDataHandle::asPluginData");
+    const auto* data = slot ? dynamic_cast<const OpenQuarn::PluginData*>(slot->data.get()) : nullptr;
     return data ? data->value.get() : nullptr;
 }
 
 HDataHandle HDataHandle::child(const HObject& attribute) const {
+    OpenQuarn::requireEval("HDataHandle::child");
     const auto wanted = impl_ ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
     if (wanted)
         for (const SlotPointer& part : impl_->children)
@@ -230,11 +250,23 @@ HDataHandle HDataHandle::child(const HObject& attribute) const {
     return {};
 }
 
+namespace {
+
+HStatus noChild(const SlotPointer& slot, const HObject& attribute) {
+    const auto wanted = Access::as<OpenQuarn::Attribute>(attribute);
+    if (!slot)
+        return {HStatus::kInvalidParameter, "the data handle is not valid"};
+    return {HStatus::kInvalidParameter,
+            "'" + slot->name() + "' has no child '" + (wanted ? wanted->name : std::string("(null)")) + "'"};
+}
+
+} // namespace
+
 HArrayDataHandle HDataHandle::childArray(const HObject& attribute, HStatus* status) const {
     return apiValue(FaultPoint::HDataHandle_childArray, status, HArrayDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = child(attribute).impl_;
         if (!slot)
-            outcome = {HStatus::kInvalidParameter, "the value has no such child"};
+            outcome = noChild(impl_, attribute);
         return isArray(slot, outcome) ? Access::make<HArrayDataHandle>(std::move(slot)) : HArrayDataHandle();
     });
 }
@@ -316,6 +348,7 @@ HStatus HDataHandle::copy(const HDataHandle& source) {
 }
 
 void HDataHandle::setClean() {
+    OpenQuarn::requireEval("HDataHandle::setClean");
     if (impl_)
         impl_->markClean();
 }
@@ -324,8 +357,10 @@ void HDataHandle::setClean() {
 
 namespace {
 
-HStatus beyondLast() {
-    return {HStatus::kFailure, "the array handle stands beyond its last element"};
+HStatus beyondLast(const SlotPointer& array) {
+    if (!array)
+        return {HStatus::kInvalidParameter, "the array handle is not valid"};
+    return {HStatus::kFailure, "the handle on '" + array->name() + "' stands beyond its last element"};
 }
 
 SlotPointer firstFrom(const Slot& array, unsigned index) {
@@ -355,6 +390,7 @@ bool HArrayDataHandle::isValid() const {
 }
 
 unsigned HArrayDataHandle::elementCount() const {
+    OpenQuarn::requireEval("HArrayDataHandle::elementCount");
     if (!impl_)
         return 0;
     const OpenQuarn::ArrayReadLock lock(impl_->owner);
@@ -365,7 +401,7 @@ unsigned HArrayDataHandle::elementIndex(HStatus* status) const {
     return apiValue(FaultPoint::HArrayDataHandle_elementIndex, status, 0U, [&](HStatus& outcome) {
         if (current_)
             return current_->index;
-        outcome = beyondLast();
+        outcome = beyondLast(impl_);
         return 0U;
     });
 }
@@ -373,10 +409,10 @@ unsigned HArrayDataHandle::elementIndex(HStatus* status) const {
 HStatus HArrayDataHandle::next() {
     return apiCall(FaultPoint::HArrayDataHandle_next, [&]() -> HStatus {
         if (!current_)
-            return beyondLast();
+            return beyondLast(impl_);
         const unsigned index = current_->index;
         current_ = index == ~0U ? nullptr : firstFrom(*impl_, index + 1);
-        return current_ ? HStatus() : beyondLast();
+        return current_ ? HStatus() : beyondLast(impl_);
     });
 }
 
@@ -420,9 +456,8 @@ HStatus HArrayDataHandle::jumpToPosition(unsigned position) {
 
 HDataHandle HArrayDataHandle::inputValue(HStatus* status) {
     return apiValue(FaultPoint::HArrayDataHandle_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
-        OpenQuarn::requireEval("HArrayDataHandle::inputValue");
         if (!current_)
-            outcome = beyondLast();
+            outcome = beyondLast(impl_);
         return handleOn(evaluated(current_));
     });
 }
@@ -430,7 +465,7 @@ HDataHandle HArrayDataHandle::inputValue(HStatus* status) {
 HDataHandle HArrayDataHandle::outputValue(HStatus* status) {
     return apiValue(FaultPoint::HArrayDataHandle_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
         if (!current_)
-            outcome = beyondLast();
+            outcome = beyondLast(impl_);
         return handleOn(current_);
     });
 }
@@ -474,7 +509,7 @@ HStatus HArrayDataHandle::setAllClean() {
 HStatus HArrayDataHandle::setClean() {
     return apiCall(FaultPoint::HArrayDataHandle_setClean, [&]() -> HStatus {
         if (!current_)
-            return beyondLast();
+            return beyondLast(impl_);
         current_->markClean();
         return HStatus::kSuccess;
     });
@@ -506,5 +541,6 @@ HStatus HArrayDataBuilder::removeElement(unsigned logicalIndex) {
 }
 
 unsigned HArrayDataBuilder::elementCount() const {
+    OpenQuarn::requireEval("HArrayDataBuilder::elementCount");
     return impl_ ? static_cast<unsigned>(impl_->size()) : 0U;
 }

@@ -2,7 +2,6 @@
 #include "openquarn/HFnAttribute.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/Attribute.h"
 
 #include <algorithm>
@@ -27,7 +26,6 @@ HStatus nothingAttached() {
 template <class Change>
 HStatus changeAttribute(const HObject& object, FaultPoint point, Change&& change) {
     return apiCall(point, [&]() -> HStatus {
-        OpenQuarn::requireMain(OpenQuarn::faultPointName(point));
         const std::shared_ptr<Attribute> attribute = attached(object);
         if (!attribute)
             return nothingAttached();
@@ -156,7 +154,6 @@ template <class Fill>
 HObject createAttribute(FaultPoint point, HStatus* status, HObject& attachTo, HFn::Type kind, const HString& longName,
                         const HString& shortName, Fill&& fill) {
     return apiValue(point, status, HObject(), [&](HStatus& outcome) {
-        OpenQuarn::requireMain(OpenQuarn::faultPointName(point));
         attachTo = HObject();
         const std::shared_ptr<Attribute> made =
             OpenQuarn::makeAttribute(kind, longName.asStdString(), shortName.asStdString());

@@ -2,7 +2,6 @@
 #include "openquarn/HFnData.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/Data.h"
 #include "graph/matrix.h"
 
@@ -86,7 +85,6 @@ HFnPluginData::HFnPluginData(const HObject& object, HStatus* status) {
 }
 
 HObject HFnPluginData::create(const HTypeId& type, HStatus* status) {
-    OpenQuarn::requireEval("HFnPluginData::create");
     return createData(FaultPoint::HFnPluginData_create, status, object_,
                       [&] { return OpenQuarn::createPluginData(type); });
 }

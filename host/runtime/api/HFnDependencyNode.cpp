@@ -3,7 +3,6 @@
 
 #include "core/apiCall.h"
 #include "core/text.h"
-#include "core/threads.h"
 #include "graph/Graph.h"
 #include "graph/plugImpl.h"
 #include "openquarn/HNodeClass.h"
@@ -31,7 +30,6 @@ HObject attributeObject(const OpenQuarn::Field& field) {
 
 HObject createNode(const std::shared_ptr<const NodeClass>& type, const std::string& wanted, const HString& name,
                    HStatus& outcome) {
-    OpenQuarn::requireMain("HFnDependencyNode::create");
     if (type)
         return Access::object(OpenQuarn::currentGraph().createNode(type, name.asStdString()));
     outcome = {HStatus::kNotFound, "no node type " + wanted + " is registered"};
@@ -68,7 +66,6 @@ HString HFnDependencyNode::name() const {
 
 HStatus HFnDependencyNode::setName(const HString& name) {
     return apiCall(FaultPoint::HFnDependencyNode_setName, [&]() -> HStatus {
-        OpenQuarn::requireMain("HFnDependencyNode::setName");
         const std::shared_ptr<Node> node = attached(object_);
         if (!node)
             return nothingAttached();

@@ -2,7 +2,6 @@
 #include "openquarn/HNodeMessage.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/Graph.h"
 
 using OpenQuarn::Access;
@@ -10,7 +9,6 @@ using OpenQuarn::FaultPoint;
 
 HStatus HMessage::removeCallback(HCallbackId id) {
     return OpenQuarn::apiCall(FaultPoint::HMessage_removeCallback, [&]() -> HStatus {
-        OpenQuarn::requireMain("HMessage::removeCallback");
         OpenQuarn::currentGraph().removeCallback(id);
         return HStatus::kSuccess;
     });
@@ -20,7 +18,6 @@ HCallbackId HNodeMessage::addAttributeChangedCallback(const HObject& node, HAttr
                                                       void* clientData, HStatus* status) {
     return OpenQuarn::apiValue(
         FaultPoint::HNodeMessage_addAttributeChangedCallback, status, HCallbackId{0}, [&](HStatus& outcome) {
-            OpenQuarn::requireMain("HNodeMessage::addAttributeChangedCallback");
             const auto watched = Access::as<OpenQuarn::Node>(node);
             if (watched && function)
                 return watched->graph().addCallback(*watched, function, clientData);

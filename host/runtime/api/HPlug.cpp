@@ -2,7 +2,6 @@
 #include "openquarn/HPlug.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/Context.h"
 #include "graph/Graph.h"
 #include "graph/arrayLock.h"
@@ -39,7 +38,6 @@ bool namesWholeArray(const HPlug::Impl& impl) {
 
 /// Evaluates the plug; null, with the status set, when there is no value to read.
 std::shared_ptr<Slot> evaluated(const HPlug& plug, HStatus& status) {
-    OpenQuarn::requireEval("HPlug: reading a value");
     const HPlug::Impl* impl = OpenQuarn::plugImpl(plug);
     if (!impl) {
         status = nullPlug();
@@ -95,7 +93,6 @@ std::string setRefusal(const HPlug& plug, const HPlug::Impl& impl, Put&& put) {
 template <class Put>
 HStatus setPlug(const HPlug& plug, FaultPoint point, Put&& put) {
     return apiCall(point, [&]() -> HStatus {
-        OpenQuarn::requireMain(OpenQuarn::faultPointName(point));
         const HPlug::Impl* impl = OpenQuarn::plugImpl(plug);
         if (!impl)
             return nullPlug();
@@ -416,7 +413,6 @@ bool HPlug::isLocked() const {
 
 HStatus HPlug::setLocked(bool on) {
     return apiCall(FaultPoint::HPlug_setLocked, [&]() -> HStatus {
-        OpenQuarn::requireMain("HPlug::setLocked");
         const std::shared_ptr<Slot> slot = resolvePlug(*this, true);
         if (!slot)
             return isNull() ? nullPlug() : failed(*this, "does not name one value: an index is not chosen");

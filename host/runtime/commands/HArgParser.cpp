@@ -5,7 +5,6 @@
 #include "commands/WordValues.h"
 #include "core/Object.h"
 #include "core/apiCall.h"
-#include "openquarn/HArgDatabase.h"
 
 #include <algorithm>
 
@@ -16,15 +15,6 @@ using OpenQuarn::ParsedArgs;
 using ParsedPointer = std::shared_ptr<const ParsedArgs>;
 
 namespace {
-
-ParsedPointer parsedOrNull(FaultPoint point, const HSyntax& syntax, const HArgList& args, HStatus* status) {
-    return apiValue(point, status, ParsedPointer(), [&](HStatus& outcome) {
-        auto parsed = std::make_shared<ParsedArgs>();
-        parsed->syntax = *OpenQuarn::Access::impl(syntax);
-        outcome = OpenQuarn::parseArgs(args, *parsed);
-        return outcome.error() ? nullptr : ParsedPointer(std::move(parsed));
-    });
-}
 
 HStatus notParsed() {
     return {HStatus::kFailure, "the arguments of the command could not be read by its syntax"};
@@ -84,7 +74,8 @@ Value argumentValue(FaultPoint point, const ParsedPointer& parsed, unsigned inde
 } // namespace
 
 HArgParser::HArgParser(const HSyntax& syntax, const HArgList& args, HStatus* status)
-    : impl_(parsedOrNull(FaultPoint::HArgParser_HArgParser, syntax, args, status)) {}
+    : impl_(apiValue(FaultPoint::HArgParser_HArgParser, status, ParsedPointer(),
+                     [&](HStatus& outcome) { return OpenQuarn::parseArgs(syntax, args, outcome); })) {}
 HArgParser::HArgParser(std::shared_ptr<const OpenQuarn::ParsedArgs> parsed) noexcept
     : impl_(std::move(parsed)) {}
 HArgParser::~HArgParser() = default;
@@ -183,6 +174,3 @@ HStatus HArgParser::getObjects(HArgList& result) const {
         return {};
     });
 }
-
-HArgDatabase::HArgDatabase(const HSyntax& syntax, const HArgList& args, HStatus* status)
-    : HArgParser(parsedOrNull(FaultPoint::HArgDatabase_HArgDatabase, syntax, args, status)) {}

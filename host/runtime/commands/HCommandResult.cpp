@@ -3,6 +3,7 @@
 
 #include "commands/Results.h"
 #include "core/apiCall.h"
+#include "core/threads.h"
 
 #include <algorithm>
 #include <limits>
@@ -103,6 +104,7 @@ HCommandResult& HCommandResult::operator=(const HCommandResult& other) {
 }
 
 HCommandResult::Type HCommandResult::resultType() const noexcept {
+    OpenQuarn::requireMain("HCommandResult::resultType");
     return OpenQuarn::kindOf(impl_->value);
 }
 

@@ -2,6 +2,7 @@
 #include "openquarn/HPxCommand.h"
 
 #include "commands/CommandRegistry.h"
+#include "core/threads.h"
 #include "openquarn/HString.h"
 #include "openquarn_app/Messages.h"
 
@@ -25,6 +26,7 @@ bool HPxCommand::hasSyntax() const {
 }
 
 HSyntax HPxCommand::syntax() const {
+    OpenQuarn::requireMain("HPxCommand::syntax");
     return hasSyntax() ? *impl_->syntax : HSyntax();
 }
 

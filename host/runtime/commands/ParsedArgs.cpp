@@ -144,4 +144,11 @@ HStatus parseArgs(const HArgList& words, ParsedArgs& parsed) {
     return Parser(words, parsed).parse();
 }
 
+std::shared_ptr<const ParsedArgs> parseArgs(const HSyntax& syntax, const HArgList& words, HStatus& status) {
+    auto parsed = std::make_shared<ParsedArgs>();
+    parsed->syntax = *Access::impl(syntax);
+    status = parseArgs(words, *parsed);
+    return status.error() ? nullptr : parsed;
+}
+
 } // namespace OpenQuarn

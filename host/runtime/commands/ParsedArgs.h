@@ -25,5 +25,7 @@ struct ParsedArgs {
 
 /// Sorts the words into `parsed`, whose syntax is set. Fails with kFailure and what is wrong with which word.
 HStatus parseArgs(const HArgList& words, ParsedArgs& parsed);
+/// The words sorted by the syntax; null, with a failing status, where that cannot be done.
+std::shared_ptr<const ParsedArgs> parseArgs(const HSyntax& syntax, const HArgList& words, HStatus& status);
 
 } // namespace OpenQuarn

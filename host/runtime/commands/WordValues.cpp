@@ -73,7 +73,8 @@ HStatus readWord(const std::string& word, HString& value) {
 }
 
 std::string printedNumber(double value) {
-    constexpr double longestWhole = 1e15; // whole numbers up to there are shown with all their digits: 100000, not 1e+05
+    constexpr double longestWhole =
+        1e15; // whole numbers up to there are shown with all their digits: 100000, not 1e+05
     std::array<char, 32> digits{};
     char* const end = digits.data() + digits.size();
     const bool isWhole = std::fabs(value) < longestWhole && value == std::trunc(value);

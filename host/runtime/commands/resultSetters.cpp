@@ -2,6 +2,7 @@
 // The static functions of HPxCommand that make the result of the running command.
 #include "commands/Results.h"
 #include "core/apiCall.h"
+#include "core/threads.h"
 #include "openquarn/HPxCommand.h"
 
 #include <algorithm>
@@ -88,6 +89,7 @@ bool appendOne(std::vector<Item>* to, Item item) {
 } // namespace
 
 void HPxCommand::clearResult() noexcept {
+    OpenQuarn::requireMain("HPxCommand::clearResult");
     if (CommandValue* result = RunningResult::current())
         *result = std::monostate();
 }
@@ -145,6 +147,7 @@ HStatus HPxCommand::appendToResult(const HStringArray& values) {
 }
 
 HCommandResult::Type HPxCommand::currentResultType() noexcept {
+    OpenQuarn::requireMain("HPxCommand::currentResultType");
     const CommandValue* result = RunningResult::current();
     return result ? OpenQuarn::kindOf(*result) : HCommandResult::kInvalid;
 }

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// What wraps the body of every operation of the API that can fail: the fault on demand, and exceptions made statuses.
+// What wraps the body of every operation of the API that can fail: the check of its thread, the fault on demand, and
+// exceptions made statuses.
 #pragma once
 
 #include "faults/FaultPoints.h"
@@ -22,6 +23,7 @@ HStatus statusOfException(const char* operation) noexcept;
 /// For an operation that returns a status: `return apiCall(FaultPoint::HPlug_setString, [&] { … });`
 template <class Body>
 HStatus apiCall(FaultPoint point, Body&& body) noexcept {
+    requireThreadOf(point);
     if (faultFires(point))
         return faultStatus(point);
     try {
@@ -35,6 +37,7 @@ HStatus apiCall(FaultPoint point, Body&& body) noexcept {
 /// that starts as success, and its value is returned as it is; `fallback` is returned when it does not run or throws.
 template <class Value, class Body>
 Value apiValue(FaultPoint point, HStatus* status, Value fallback, Body&& body) noexcept {
+    requireThreadOf(point);
     HStatus outcome;
     Value value = fallback;
     if (faultFires(point)) {

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The table of operations that can be made to fail on demand. One row for each operation of the API that can fail:
-// overloads share a row. A family keeps its rows in a .def file of its own: FAULT_POINT(Class, operation).
+// overloads share a row. A family keeps its rows in a .def file of its own: FAULT_POINT(Class, operation), and behind
+// these, unless it is [any], the tag that says on which thread the operation may be called: main or eval.
 #pragma once
 
 #include <atomic>
@@ -8,7 +9,7 @@
 namespace OpenQuarn {
 
 enum class FaultPoint : unsigned {
-#define FAULT_POINT(type, operation) type##_##operation,
+#define FAULT_POINT(type, operation, ...) type##_##operation,
 #include "faults/all.def"
 #undef FAULT_POINT
     count
@@ -16,6 +17,13 @@ enum class FaultPoint : unsigned {
 
 /// "Class::operation".
 const char* faultPointName(FaultPoint point);
+
+/// Ends a debug build, with a sentence that names the operation, when it is called on a thread that its tag excludes.
+#ifdef NDEBUG
+inline void requireThreadOf(FaultPoint) {}
+#else
+void requireThreadOf(FaultPoint point);
+#endif
 
 namespace detail {
 extern std::atomic<bool> faultsArmed;

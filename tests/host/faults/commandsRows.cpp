@@ -4,7 +4,12 @@
 #include "openquarn/HArgDatabase.h"
 #include "openquarn/HGlobal.h"
 #include "openquarn/HPxCommand.h"
+#include "openquarn/HSelectionList.h"
 #include "openquarn_app/Commands.h"
+#include "openquarn_app/Session.h"
+
+#include <optional>
+#include <stdexcept>
 
 namespace {
 
@@ -58,6 +63,21 @@ std::function<HStatus()> inCommand(const std::function<HStatus()>& call) {
         OpenQuarn::removeCommand("commandsRow");
         return outcome.ok ? HStatus() : HStatus(HStatus::kFailure, outcome.error);
     };
+}
+
+HStatus lookUp() {
+    std::optional<OpenQuarn::Session> own;
+    try {
+        own.emplace();
+    } catch (const std::runtime_error&) {
+        own.reset(); // another row keeps one open
+    }
+    HSyntax name;
+    name.addArg(HSyntax::kString);
+    HArgList list;
+    list.addArg("time1");
+    HSelectionList selection;
+    return HArgDatabase(name, list).getCommandArgument(0, selection);
 }
 
 HStatus getResult() {
@@ -128,6 +148,7 @@ std::vector<FaultRow> commandsRows() {
              return parser.getObjects(list);
          })},
         {"HArgDatabase::HArgDatabase", written([](HStatus* status) { HArgDatabase(syntax(), words(), status); })},
+        {"HArgDatabase::getCommandArgument", lookUp},
         {"HPxCommand::setResult", inCommand([] { return HPxCommand::setResult(1); })},
         {"HPxCommand::appendToResult", inCommand([] { return HPxCommand::appendToResult(1.5); })},
         {"HCommandResult::getResult", getResult},

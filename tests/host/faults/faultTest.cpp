@@ -5,6 +5,7 @@
 #include "openquarn/HString.h"
 #include "openquarn_app/Faults.h"
 
+#include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -17,7 +18,7 @@ using OpenQuarn::Faults;
 
 std::vector<FaultRow> allRows() {
     std::vector<FaultRow> rows;
-    for (const auto& family : {commandsRows(), graphRows(), servicesRows(), valuesRows()})
+    for (const auto& family : {commandsRows(), graphRows(), pluginsRows(), servicesRows(), valuesRows()})
         rows.insert(rows.end(), family.begin(), family.end());
     return rows;
 }
@@ -26,12 +27,15 @@ TEST(Faults, EveryOperationFailsOnDemandAndRecovers) {
     for (const FaultRow& row : allRows()) {
         SCOPED_TRACE(row.operation);
         Faults::clear();
+        const std::shared_ptr<void> kept = row.prepare ? row.prepare() : nullptr;
         const HStatus before = row.call();
         EXPECT_FALSE(before.error()) << before.errorString().asChar();
 
         Faults::fail(row.operation);
-        EXPECT_TRUE(row.call().error());
+        const HStatus failed = row.call();
         EXPECT_TRUE(Faults::fired(row.operation));
+        // by this operation, and no other that it is needed for
+        EXPECT_THAT(failed.errorString().asStdString(), testing::HasSubstr(row.operation + ": failed on demand"));
 
         Faults::clear();
         const HStatus after = row.call();

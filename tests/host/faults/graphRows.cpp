@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "host/faults/FaultRows.h"
+#include "host/faults/GraphRig.h"
 
 std::vector<FaultRow> graphRows() {
-    return {};
+    std::vector<FaultRow> rows;
+    for (const auto& part : {attributeRows(), dataRows(), nodeRows(), plugRows()})
+        rows.insert(rows.end(), part.begin(), part.end());
+    return rows;
 }

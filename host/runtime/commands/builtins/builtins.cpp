@@ -6,8 +6,10 @@ namespace OpenQuarn {
 void addBuiltins(CommandRegistry& registry) {
     addConnectionCommands(registry);
     addDuplicate(registry);
+    addFileCommand(registry);
     addGetAttr(registry);
     addNodeCommands(registry);
+    addPluginCommands(registry);
     addSceneCommands(registry);
     addSetAttr(registry);
     addTextCommands(registry);

@@ -10,8 +10,10 @@ void addBuiltins(CommandRegistry& registry);
 
 void addConnectionCommands(CommandRegistry& registry);
 void addDuplicate(CommandRegistry& registry);
+void addFileCommand(CommandRegistry& registry);
 void addGetAttr(CommandRegistry& registry);
 void addNodeCommands(CommandRegistry& registry);
+void addPluginCommands(CommandRegistry& registry);
 void addSceneCommands(CommandRegistry& registry);
 void addSetAttr(CommandRegistry& registry);
 void addTextCommands(CommandRegistry& registry);

@@ -1,0 +1,192 @@
+// SPDX-License-Identifier: Apache-2.0
+// bench_graph: whether the costs of the host's graph grow as they should. The yardstick of a row ("plain") is the same
+// work in a small scene: the ratio of the times per unit should stay near 1. In the table a "vertex" is one node, one
+// element or one evaluation.
+#include "harness.h"
+#include "options.h"
+
+#include "openquarn/HDGModifier.h"
+#include "openquarn/HFnAttribute.h"
+#include "openquarn/HFnDependencyNode.h"
+#include "openquarn/HFnPlugin.h"
+#include "openquarn/HNodeClass.h"
+#include "openquarn/HPxNode.h"
+#include "openquarn_app/Evaluation.h"
+#include "openquarn_app/Plugins.h"
+#include "openquarn_app/Session.h"
+
+#include <exception>
+#include <functional>
+#include <memory>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace {
+
+using bench::Phase;
+
+void check(const HStatus& status) {
+    if (status.error())
+        throw std::runtime_error(status.errorString().asStdString());
+}
+
+/// out = in + the number of elements of ins.
+class BenchNode : public HPxNode {
+public:
+    static HPxNode* creator() { return new BenchNode; }
+
+    static HStatus initialize() {
+        in = HFnNumericAttribute().create("in", "in", HFnNumericData::kDouble);
+        ins = HFnNumericAttribute().create("ins", "ins", HFnNumericData::kDouble);
+        HFnAttribute(ins).setArray(true);
+        out = HFnNumericAttribute().create("out", "out", HFnNumericData::kDouble);
+        HFnAttribute(out).setWritable(false);
+        for (const HObject& attribute : {in, ins, out})
+            addAttribute(attribute);
+        attributeAffects(in, out);
+        return attributeAffects(ins, out);
+    }
+
+    HStatus compute(const HPlug& plug, HDataBlock& block) override {
+        if (plug != out)
+            return HStatus::kUnknownParameter;
+        const double count = block.outputArrayValue(ins).elementCount();
+        HDataHandle result = block.outputValue(out);
+        result.set(block.inputValue(in).asDouble() + count);
+        result.setClean();
+        return HStatus::kSuccess;
+    }
+
+private:
+    static inline HObject in, ins, out;
+};
+
+constexpr unsigned typeId = 0x7e570101;
+
+HStatus initializePlugin(HObject object) {
+    return HFnPlugin(object).registerNode("benchNode", typeId, BenchNode::creator, BenchNode::initialize);
+}
+HStatus uninitializePlugin(HObject object) {
+    return HFnPlugin(object).deregisterNode(typeId);
+}
+
+struct Chain {
+    std::vector<HPlug> ins, outs;
+
+    explicit Chain(std::size_t length) {
+        HDGModifier modifier;
+        for (std::size_t i = 0; i < length; ++i) {
+            const HFnDependencyNode node(HFnDependencyNode().create("benchNode"));
+            ins.push_back(node.findPlug("in"));
+            outs.push_back(node.findPlug("out"));
+            if (i > 0)
+                check(modifier.connect(outs[i - 1], ins[i]));
+        }
+        check(modifier.doIt());
+        check(OpenQuarn::evaluate(outs.back()));
+    }
+    ~Chain() {
+        HDGModifier modifier;
+        for (const HPlug& plug : outs)
+            modifier.deleteNode(plug.node());
+        modifier.doIt();
+    }
+    Chain(const Chain&) = delete;
+    Chain& operator=(const Chain&) = delete;
+};
+
+/// `work` on a small and on a large thing, `count` units of it in the large one.
+Phase growth(const std::string& name, const std::string& what, std::size_t count, std::function<void()> large,
+             std::function<void()> small) {
+    Phase phase{name, what, count};
+    phase.parallel = false;
+    phase.ours = std::move(large);
+    phase.plain = std::move(small);
+    return phase;
+}
+
+// the last node of a chain, whose own second input changed
+std::function<void()> evaluateLast(const Chain& chain) {
+    HPlug extra = HPlug(chain.outs.back().node(), HNodeClass("benchNode").attribute("ins")).elementByLogicalIndex(0);
+    return [extra, out = chain.outs.back(), value = 0.0]() mutable {
+        check(extra.setDouble(value += 1.0));
+        check(OpenQuarn::evaluate(out));
+    };
+}
+
+// the whole chain, `times` over, so that the small one does as much as the large one
+std::function<void()> dirtyAndEvaluateAll(const Chain& chain, std::size_t times) {
+    return [in = chain.ins.front(), out = chain.outs.back(), times, value = 0.0]() mutable {
+        for (std::size_t i = 0; i < times; ++i) {
+            check(in.setDouble(value += 1.0));
+            check(OpenQuarn::evaluate(out));
+        }
+    };
+}
+
+enum class Order { ascending, descending, scattered };
+
+// sets and reads back a fresh array of `size` elements, `times` over
+std::function<void()> fillArray(std::size_t size, std::size_t times, Order order) {
+    return [size, times, order] {
+        for (std::size_t round = 0; round < times; ++round) {
+            const HFnDependencyNode node(HFnDependencyNode().create("benchNode"));
+            const HPlug array = node.findPlug("ins");
+            for (std::size_t i = 0; i < size; ++i) {
+                const std::size_t scattered = i * 7919 % size; // a prime that divides no size used here
+                const std::size_t index = order == Order::ascending    ? i
+                                          : order == Order::descending ? size - 1 - i
+                                                                       : scattered;
+                check(array.elementByLogicalIndex(static_cast<unsigned>(index)).setDouble(1.0));
+            }
+            for (std::size_t i = 0; i < size; ++i)
+                if (array.elementByPhysicalIndex(static_cast<unsigned>(i)).asDouble() != 1.0)
+                    throw std::runtime_error("an element was lost");
+            HDGModifier modifier;
+            modifier.deleteNode(node.object());
+            check(modifier.doIt());
+        }
+    };
+}
+
+void runAll(const bench::Options& options, bench::Report& report) {
+    const Chain small(100);
+    const Chain medium(1000);
+    const Chain large(10000);
+    const std::vector<Phase> phases = {
+        growth("evaluate last", "10 000 nodes", 1, evaluateLast(large), evaluateLast(small)),
+        growth("dirty and evaluate all", "10 000 nodes", 10000, dirtyAndEvaluateAll(large, 1),
+               dirtyAndEvaluateAll(medium, 10)),
+        growth("array, ascending", "100 000", 100000, fillArray(100000, 1, Order::ascending),
+               fillArray(1000, 100, Order::ascending)),
+        growth("array, descending", "100 000", 100000, fillArray(100000, 1, Order::descending),
+               fillArray(1000, 100, Order::descending)),
+        growth("array, scattered", "100 000", 100000, fillArray(100000, 1, Order::scattered),
+               fillArray(1000, 100, Order::scattered)),
+    };
+    for (const Phase& phase : phases)
+        if (phase.name.rfind(options.only, 0) == 0)
+            report.add(bench::measure(phase, 1, options.seconds));
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    const auto options = bench::readOptions(argc, argv);
+    if (!options)
+        return 2;
+    try {
+        const OpenQuarn::Session session;
+        OpenQuarn::addPlugin("bench", initializePlugin, uninitializePlugin);
+        bench::Report report(options->csv.get());
+        report.header();
+        runAll(*options, report);
+        bench::Report::legend("the same number of units in a small scene");
+        std::printf("CSV: %s\n", options->csvPath.c_str());
+        return 0;
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "bench_graph: %s\n", error.what());
+        return 1;
+    }
+}

@@ -1,0 +1,65 @@
+#!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# header_scan.sh ROOT: compares the headers below ROOT/host/api with the tables of fault points and the sources of the
+# runtime. Lists what does not fit, one line each, and fails then:
+#   - a function that can fail and has no fault point, and a fault point whose function has gone;
+#   - a function without a thread tag, and a fault point whose tag is not its function's;
+#   - a function that is [main] or [eval], cannot fail, and does not check it by a call that names it, as in
+#     requireMain("HPxCommand::syntax").
+# What counts as a function, and which are exempt: see operations.awk.
+set -euo pipefail
+here=$(cd "$(dirname "$0")" && pwd)
+cd "$1"
+scratch=$(mktemp)
+trap 'rm -f "$scratch"' EXIT
+
+find host/api/openquarn -name '*.h' -print0 | sort -z | xargs -0 awk -f "$here/operations.awk" >"$scratch"
+
+{
+  sed 's/^/function\t/' "$scratch"
+  sed -nE 's|^FAULT_POINT\((\w+), (\w+)(, (\w+))?\)$|point\t\1\t\2\t\4|p' host/runtime/faults/*.def
+  # toRead() of HDataBlock.cpp checks for its callers
+  find host/runtime -name '*.cpp' -exec sed -nE \
+    -e 's|.*requireMain\("(\w+)::(\w+)"\).*|checked\t\1\t\2\tmain|p' \
+    -e 's|.*(requireEval\(\|toRead\(.*)"(\w+)::(\w+)"\).*|checked\t\2\t\3\teval|p' {} +
+} | awk -F '\t' '
+  function bad(text) {
+      if (!(text in said))
+          print text
+      said[text] = 1
+      ++failures
+  }
+  { name = $2 "::" $3 }
+  $1 == "point" {
+      if (name in point)
+          bad(name " has two fault points")
+      point[name] = $4 == "" ? "any" : $4
+  }
+  $1 == "checked" { checked[name] = $4 }
+  $1 == "function" && $4 != "attach" {
+      row[++rows] = $0
+  }
+  END {
+      for (i = 1; i <= rows; ++i) {
+          split(row[i], field, "\t")
+          name = field[2] "::" field[3]
+          kind = field[4]
+          tag = field[5]
+          where = " (" field[6] ")"
+          if (kind == "inline" || kind == "plugin")
+              continue
+          declared[name] = 1
+          if (tag == "-")
+              bad(name " has no thread tag" where)
+          else if (kind == "plain" && tag != "any" && checked[name] != tag)
+              bad(name " is [" tag "] and does not check it" where)
+          if (kind == "fails" && !(name in point))
+              bad(name " can fail and has no fault point" where)
+          else if (kind == "fails" && tag != "-" && point[name] != tag)
+              bad(name " is [" tag "], and its fault point says [" point[name] "]" where)
+      }
+      for (name in point)
+          if (!(name in declared))
+              bad(name " has a fault point and is no function of the headers")
+      exit failures > 0
+  }'
