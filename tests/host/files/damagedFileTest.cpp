@@ -63,6 +63,27 @@ TEST_F(DamagedFile, EveryTruncationOfASceneIsAnErrorAndLeavesTheScene) {
     }
 }
 
+TEST_F(DamagedFile, WhatIsNoMeshIsReportedAndKept) {
+    const std::pair<const char*, const char*> rows[] = {
+        {"[1]", "it is no object"},
+        {R"({"points":[0,0,0],"counts":[]})", "it has no list 'corners'"},
+        {R"({"points":[0,0],"counts":[],"corners":[]})", "its points are not three numbers each"},
+        {R"({"points":[0,0,"x"],"counts":[],"corners":[]})", "its points are not three numbers each"},
+        {R"({"points":[0,0,0],"counts":[3],"corners":[0,0,1]})", "polygon vertex number 2 is 1"},
+        {R"({"points":[0,0,0],"counts":[2147483647,2147483647],"corners":[0]})", "polygon 0 ends at"},
+        {R"({"points":[0,0,0],"counts":[2],"corners":[0,0]})", "at least 3"},
+        {R"({"points":[0,0,0],"counts":[],"corners":[4294967296]})", "no whole number"},
+        {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"t":[-1]}})", "lists vertex 4294967295"},
+        {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"t":[0],"t":[0]}})", "'t' stands twice"},
+        {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"a b":[0]}})", "'a b' cannot name a component tag"},
+    };
+    for (const auto& [mesh, warning] : rows) {
+        const std::string value = std::string("\"mesh\":") + mesh;
+        EXPECT_THAT(read(sceneText({value})), ElementsAre(HasSubstr(warning)));
+        EXPECT_THAT(saved(), HasSubstr(value));
+    }
+}
+
 // Each row is a part of a scene with a node "one"; the warnings it gives; and what is written again. Reading that gives
 // the same text.
 TEST_F(DamagedFile, WhatIsNotUnderstoodIsReportedAndKept) {

@@ -104,6 +104,7 @@ public:
                                   matrix("matrix"),
                                   typed("list", HFnData::kDoubleArray),
                                   data("data"),
+                                  typed("mesh", HFnData::kMesh),
                                   arrayOf(number("singles", HFnNumericData::kFloat)),
                                   arrayOf(typed("words", HFnData::kString)),
                                   arrayOf(matrix("matrices")),

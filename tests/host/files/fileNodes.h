@@ -12,7 +12,7 @@ namespace fileNodes {
 
 /// Registers "fileNode", of the plug-in "fileNodes", with the session that is open:
 ///   yes bool, small short, whole int (3), single float (0.1), real double (0.5), choice enum, unusual double (NaN)
-///   word string (""), path string (null, used as file name), matrix matrix, list doubleArray, data fileData
+///   word string (""), path string (null, used as file name), matrix matrix, list doubleArray, data fileData, mesh mesh
 ///   weights double array, singles float array, words string array, matrices, messages, datas arrays
 ///   groups compound array (title string; items double array; spot compound (x, y double))
 ///   whole array inputs `weights` can be connected from `copied`, an output double array

@@ -5,6 +5,8 @@
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnData.h"
 #include "openquarn/HFnDependencyNode.h"
+#include "openquarn/HFnMesh.h"
+#include "openquarn/HFnMeshData.h"
 #include "openquarn/HMatrix.h"
 
 #include <bit>
@@ -28,6 +30,27 @@ std::string bits(double value) {
     return text.str();
 }
 
+std::string meshText(const HObject& object) {
+    std::ostringstream text;
+    const HFnMesh mesh(object);
+    HPointArray points;
+    mesh.getPoints(points);
+    for (const HPoint& point : points)
+        text << bits(point.x) << ' ' << bits(point.y) << ' ' << bits(point.z) << ' ';
+    HIntArray vertices;
+    for (int polygon = 0; !mesh.getPolygonVertices(polygon, vertices).error(); ++polygon)
+        text << ::testing::PrintToString(std::vector<int>(vertices.begin(), vertices.end()));
+    const HFnGeometryData geometry(object);
+    HStringArray tags;
+    geometry.getComponentTags(tags);
+    HUintArray tagged;
+    for (const HString& tag : tags) {
+        geometry.getComponentTag(tag, tagged);
+        text << tag.asChar() << ::testing::PrintToString(std::vector<unsigned>(tagged.begin(), tagged.end()));
+    }
+    return text.str();
+}
+
 std::string dataText(const HObject& object) {
     std::ostringstream text;
     if (object.hasFn(HFn::kStringData))
@@ -38,6 +61,8 @@ std::string dataText(const HObject& object) {
     if (object.hasFn(HFn::kMatrixData))
         for (unsigned i = 0; i < 16; ++i)
             text << bits(HFnMatrixData(object).matrix()[i / 4][i % 4]) << ' ';
+    if (object.hasFn(HFn::kMeshData))
+        text << meshText(object);
     return object.hasFn(HFn::kPluginData) ? textOf(object) : object.isNull() ? "null" : text.str();
 }
 
@@ -131,6 +156,20 @@ HMatrix anyMatrix(Random& random) {
     return matrix;
 }
 
+HObject anyMesh(Random& random) {
+    HPointArray points;
+    for (unsigned i = 0; i < 6; ++i)
+        points.append(HPoint(anyDouble(random), anyDouble(random), anyDouble(random)));
+    HFnMeshData mesh;
+    if (below(random, 3) == 0)
+        mesh.create(points, {}, {});
+    else
+        mesh.create(points, {3, 5}, {0, 1, 2, 5, 4, 3, 2, 1});
+    if (below(random, 2) == 0)
+        mesh.setComponentTag("shuffled", {5, 0, 3});
+    return mesh.object();
+}
+
 unsigned anyIndex(Random& random) {
     return below(random, 5) == 0 ? std::numeric_limits<unsigned>::max() - below(random, 3) : below(random, 12);
 }
@@ -151,6 +190,7 @@ void setData(const std::string& node, Random& random) {
         plug(node + ".word").setHObject(HObject::kNullObj);
     plug(node + ".matrix").setMatrix(anyMatrix(random));
     plug(node + ".list").setHObject(HFnDoubleArrayData().create({anyDouble(random), anyDouble(random)}));
+    plug(node + ".mesh").setHObject(anyMesh(random));
     plug(node + ".data").setHObject(makeData(anyText(random).asStdString()));
 }
 
