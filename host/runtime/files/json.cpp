@@ -52,7 +52,6 @@ void checkDepth(const std::string& text) {
 
 struct NoOutput {
     void Put(char) {}
-    void PutUnsafe(char) {}
 };
 
 bool isUtf8(std::string_view text) {

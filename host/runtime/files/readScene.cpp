@@ -184,7 +184,7 @@ private:
     std::shared_ptr<const NodeClass> registeredType(const Value& entry, std::string& why) {
         const std::string_view typeName = textMember(entry, SceneKey::type);
         const std::string_view plugin = textMember(entry, SceneKey::plugin);
-        const std::shared_ptr<const NodeClass> type = typeOf(entry);
+        std::shared_ptr<const NodeClass> type = typeOf(entry);
         if (!type)
             why = "node type " + quoted(typeName) + (plugin.empty() ? "" : " of plug-in " + quoted(plugin)) +
                   " is not registered";
