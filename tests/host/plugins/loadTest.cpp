@@ -199,9 +199,19 @@ TEST_F(Loading, WhatItLeavesRegisteredIsTakenAwayWithAWarning) {
     loadPlugin(module("tinyLeaves"));
     unloadPlugin("tinyLeaves");
     EXPECT_THAT(messages_, ElementsAre("plug-in 'tinyLeaves' left registered, and the host took away: node type "
-                                       "'tinyNode', data type 'tinyNodeData', command 'tinyCommand'"));
+                                       "'tinyNode', data type 'tinyNodeData', command 'tinyCommand'",
+                                       HasSubstr("'tinyLeaves' left 1 callbacks on nodes")));
     expectNothingLeft();
     EXPECT_FALSE(isMapped("tinyLeaves"));
+    session_.setTime(12.0); // would call it
+}
+
+TEST_F(Loading, SaysSoWhenALibraryCannotGo) {
+    loadPlugin(module("tinyPinned"));
+    unloadPlugin("tinyPinned");
+    EXPECT_THAT(messages_, ElementsAre(HasSubstr("the library of plug-in 'tinyPinned' stays mapped")));
+    EXPECT_TRUE(isMapped("tinyPinned"));
+    expectNothingLeft();
 }
 
 TEST(Unloading, FiftyRoundsWithThreadsAtWorkInThePlugin) {

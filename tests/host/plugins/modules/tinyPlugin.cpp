@@ -5,6 +5,8 @@
 
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HFnPlugin.h"
+#include "openquarn/HNodeMessage.h"
+#include "openquarn/HSelectionList.h"
 
 #include <stdexcept>
 
@@ -53,6 +55,18 @@ HStatus initialize() {
         status = set.deregisterData(DATA_ID);
     if (!status.error())
         status = set.deregisterCommand(COMMAND_NAME);
+    return status;
+}
+
+void heard(int, HPlug&, HPlug&, void*) {}
+
+[[maybe_unused]] HStatus listenToTime() {
+    HSelectionList list;
+    HObject time;
+    list.add("time1");
+    list.getDependNode(0, time);
+    HStatus status;
+    HNodeMessage::addAttributeChangedCallback(time, heard, nullptr, &status);
     return status;
 }
 
