@@ -63,6 +63,8 @@ std::shared_ptr<NodeData> Context::dataOf(Node& node) {
 void Context::fill(NodeData& data) {
     for (std::size_t i = 0; i < data.slots.size(); ++i)
         markConnectedOrComputed(*data.slots[i], *data.node.data()->slots[i]);
+    if (data.filterState)
+        data.filterState->connectionsChanged();
     data.node.graph().setTimeIn(data, time_);
 }
 

@@ -27,6 +27,8 @@ NodeData::NodeData(Node& dataNode, Context* dataContext)
         if (field->computed)
             slots.back()->markDirty();
     }
+    if (node.type().makeFilterState)
+        filterState = node.type().makeFilterState(*this);
 }
 
 NodeData::~NodeData() {
@@ -34,6 +36,7 @@ NodeData::~NodeData() {
 }
 
 void NodeData::bury() {
+    filterState.reset();
     for (const std::shared_ptr<Slot>& slot : slots)
         slot->detach();
     slots.clear();
@@ -89,7 +92,6 @@ void Node::bury() {
     user_.reset(); // its destructor still sees the node
     alive_.store(false, std::memory_order_release);
     callbacks.clear();
-    filterState.reset();
     data_->bury();
 }
 

@@ -18,6 +18,23 @@ class Context;
 class Graph;
 class Node;
 
+/// What the host keeps for a geometry filter beside its attributes, in one context.
+class FilterState {
+public:
+    virtual ~FilterState() = default;
+    FilterState(const FilterState&) = delete;
+    FilterState& operator=(const FilterState&) = delete;
+
+    /// Called for each slot of the node that has another value or has become dirty, before what depends on it becomes
+    /// dirty. Thread: main.
+    virtual void changed(Slot& slot) = 0;
+    /// Everything that is connected may have another value. Thread: main.
+    virtual void connectionsChanged() = 0;
+
+protected:
+    FilterState() = default;
+};
+
 /// The values of a node in one context.
 class NodeData : public std::enable_shared_from_this<NodeData> {
 public:
@@ -30,6 +47,7 @@ public:
     Context* const context;                   ///< null for the normal one
     std::vector<std::shared_ptr<Slot>> slots; ///< of the type's top-level fields
     mutable std::shared_mutex arrayMutex;     ///< see arrayLock.h
+    std::unique_ptr<FilterState> filterState; ///< null for nodes that are no geometry filters
 
     /// The slot of a field; null below an array, where an element has to be chosen first, and when the node has gone.
     std::shared_ptr<Slot> slot(const Field& field) const;
@@ -37,12 +55,6 @@ public:
     bool isGone() const { return slots.empty(); }
     /// Cuts all slots off.
     void bury();
-};
-
-/// What the host keeps for a geometry filter beside its attributes; made by the geometry family.
-class FilterState {
-public:
-    virtual ~FilterState() = default;
 };
 
 class Node final : public Object {
@@ -73,7 +85,6 @@ public:
 
     std::vector<Callback> callbacks; ///< in order of registration
     std::atomic<unsigned> computes{0};
-    std::unique_ptr<FilterState> filterState;
     /// What the scene file says of it that this host does not know: kept for the next save.
     std::string unknownFileContent;
 

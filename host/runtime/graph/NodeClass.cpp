@@ -53,6 +53,7 @@ void NodeClass::affects(const Attribute& affecting, const Attribute& affected, b
 }
 
 void NodeClass::inherit(const NodeClass& base) {
+    makeFilterState = base.makeFilterState;
     for (const std::unique_ptr<Field>& field : base.fields_)
         fields_.push_back(makeField(field->attribute, nullptr, static_cast<unsigned>(fields_.size())));
     for (const Pair& pair : base.pairs_)

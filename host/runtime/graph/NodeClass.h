@@ -12,6 +12,9 @@
 
 namespace OpenQuarn {
 
+class FilterState;
+class NodeData;
+
 /// Built once by registration, fixed afterwards.
 class NodeClass {
 public:
@@ -27,7 +30,8 @@ public:
     const HTypeId id;
     const HFn::Type kind;  ///< of the nodes
     const Creator creator; ///< null for a type that cannot be created by itself
-    std::string plugin;    ///< name of the plug-in that registered it; empty for the host's own
+    std::unique_ptr<FilterState> (*makeFilterState)(NodeData&) = nullptr; ///< of geometry filters; types inherit it
+    std::string plugin; ///< name of the plug-in that registered it; empty for the host's own
 
     /// Adds an attribute that has no parent, with its children. Throws std::invalid_argument when a name is taken.
     void add(const std::shared_ptr<Attribute>& attribute);

@@ -132,7 +132,7 @@ void Slot::markClean() {
 }
 
 void Slot::markCleanBelow() {
-    if (state_.load(std::memory_order_acquire) == 0)
+    if (!mayBeDirty()) // clean already, and still failed if its last compute did
         return;
     forEachPart([](Slot& part) { part.markCleanBelow(); });
     state_.store(0, std::memory_order_release);

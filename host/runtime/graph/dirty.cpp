@@ -31,6 +31,8 @@ public:
     }
 
     void pushDependents(Slot& slot) {
+        if (slot.owner && slot.owner->filterState)
+            slot.owner->filterState->changed(slot);
         forEachDependent(slot, [&](Slot& dependent) { queue_.push_back(&dependent); });
         if (slot.owner)
             pushPluginDependents(*slot.owner, slot);

@@ -2,6 +2,7 @@
 #include "openquarn_app/Session.h"
 
 #include "core/threads.h"
+#include "geometry/filterAttributes.h"
 #include "graph/Graph.h"
 #include "plugins/PluginTable.h"
 #include "services/SceneFileState.h"
@@ -19,6 +20,7 @@ struct Session::Impl {
 
 Session::Session() {
     setMainThread();
+    registerGeometryNodes();
     impl_ = std::make_unique<Impl>();
 }
 

@@ -1,0 +1,28 @@
+// SPDX-License-Identifier: Apache-2.0
+// Base class of deformers: geometry filters with a weight for each vertex.
+#pragma once
+
+#include "openquarn/HPxGeometryFilter.h"
+
+/// The attributes below belong to the node class "deformer" and to every type registered as HPxNode::kDeformerNode, in
+/// addition to those of the geometry filter.
+class OPENQUARN_API HPxDeformerNode : public HPxGeometryFilter {
+public:
+    /// Array by geometry, a compound of `weights`.
+    static const HObject weightList;
+    /// Array of floats by index of the vertex in the whole geometry, default 1: the weight of a vertex that has no
+    /// element.
+    static const HObject weights;
+
+    HPxDeformerNode();
+    ~HPxDeformerNode() override;
+
+    /// A buffer that the node publishes for a GPU deformer, by name; null for a name it does not know. The base
+    /// publishes none. [eval]
+    virtual HObject getNamedBuffer(const HString& name, unsigned multiIndex);
+
+    /// A weight for each affected vertex, in the order of the index mapper; null when the geometry has no weights,
+    /// which is not a failure: all are 1 then. Owned by the host, valid until the next evaluation of this geometry or
+    /// change of its weights. Fails, and is null, for another node's data block, and as indexMapper() does. [eval]
+    const float* envelopeWeights(HDataBlock& block, unsigned multiIndex, HStatus* status = nullptr);
+};

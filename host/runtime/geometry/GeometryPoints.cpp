@@ -1,0 +1,69 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "geometry/GeometryPoints.h"
+
+#include <algorithm>
+
+namespace OpenQuarn {
+
+GeometryPoints::GeometryPoints(std::shared_ptr<MeshData> mesh, std::shared_ptr<const IndexMap> map,
+                               std::shared_ptr<PositionPool> pool)
+    : mesh_(std::move(mesh))
+    , map_(std::move(map))
+    , pool_(std::move(pool)) {}
+
+double* GeometryPoints::writable(bool keep) {
+    if (written_)
+        return written_->xyz();
+    const Positions& present = *mesh_->points;
+    std::shared_ptr<Positions> made = pool_ ? pool_->take(present.vertexCount()) : newPositions(present.vertexCount());
+    if (keep)
+        std::copy_n(present.xyz(), 3 * present.vertexCount(), made->xyz());
+    written_ = std::move(made);
+    return written_->xyz();
+}
+
+HPoint GeometryPoints::point(unsigned position) const {
+    const double* xyz = current().xyz() + std::size_t{3} * fullIndex(position);
+    return {xyz[0], xyz[1], xyz[2]};
+}
+
+void GeometryPoints::setPoint(unsigned position, const HPoint& point) {
+    double* xyz = writable(true) + std::size_t{3} * fullIndex(position);
+    xyz[0] = point.x;
+    xyz[1] = point.y;
+    xyz[2] = point.z;
+}
+
+HStatus GeometryPoints::copyTo(HPointArray& points) const {
+    if (isWhole())
+        return copyPoints(current(), points);
+    if (HStatus status = points.setLength(count()); status.error())
+        return status;
+    const double* all = current().xyz();
+    for (unsigned i = 0; i < points.length(); ++i) {
+        const double* xyz = all + std::size_t{3} * (*map_->affected)[i];
+        points[i] = HPoint(xyz[0], xyz[1], xyz[2]);
+    }
+    return HStatus::kSuccess;
+}
+
+void GeometryPoints::copyFrom(const HPointArray& points) {
+    const bool whole = isWhole();
+    double* xyz = writable(!whole);
+    for (unsigned i = 0; i < points.length(); ++i) {
+        double* to = xyz + std::size_t{3} * (whole ? i : (*map_->affected)[i]);
+        to[0] = points[i].x;
+        to[1] = points[i].y;
+        to[2] = points[i].z;
+    }
+}
+
+const std::shared_ptr<MeshData>& GeometryPoints::result() {
+    if (written_) {
+        mesh_ = std::make_shared<MeshData>(mesh_->topology, written_, mesh_->tags);
+        written_.reset();
+    }
+    return mesh_;
+}
+
+} // namespace OpenQuarn

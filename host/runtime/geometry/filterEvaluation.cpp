@@ -1,0 +1,147 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "geometry/filterEvaluation.h"
+
+#include "geometry/GeometryPoints.h"
+#include "geometry/filterAttributes.h"
+#include "graph/Context.h"
+#include "graph/evaluation.h"
+#include "graph/values.h"
+
+namespace OpenQuarn {
+namespace {
+
+std::shared_ptr<MeshData> evaluatedMesh(const std::shared_ptr<Slot>& slot) {
+    if (!slot)
+        return nullptr;
+    pull(slot); // what fails further up is reported there: the last mesh is taken
+    return std::dynamic_pointer_cast<MeshData>(slot->data);
+}
+
+std::shared_ptr<Slot> childOf(const Slot& element, const Attribute& attribute) {
+    for (const std::shared_ptr<Slot>& part : element.children)
+        if (part->field.attribute.get() == &attribute)
+            return part;
+    return nullptr;
+}
+
+std::shared_ptr<Data> evaluatedExpression(const Slot& input) {
+    const std::shared_ptr<Slot> slot = childOf(input, *filterAttributes().componentTagExpression);
+    pull(slot);
+    return slot->data;
+}
+
+/// What the slot, or the nearest one above it, is connected from.
+std::weak_ptr<Slot> connectionInto(const Slot* slot) {
+    for (; slot; slot = slot->parent)
+        if (const std::shared_ptr<Slot> source = sourceInContext(*slot))
+            return source;
+    return {};
+}
+
+/// Null, with the status set, when there is no such component tag.
+std::shared_ptr<const IndexMap> resolve(GeometryState& state, const Slot& input, const MeshData& mesh,
+                                        HStatus& status) {
+    const std::shared_ptr<Data> expression = evaluatedExpression(input);
+    std::shared_ptr<const IndexMap> affected = state.affectedVertices(mesh, expression);
+    if (!affected)
+        status = {HStatus::kFailure, "'" + childOf(input, *filterAttributes().componentTagExpression)->name() +
+                                         "': geometry " + std::to_string(input.index) + " has no component tag '" +
+                                         static_cast<const StringData&>(*expression).value + "'"};
+    return affected;
+}
+
+/// One evaluation of one geometry that has a mesh.
+class Evaluation {
+public:
+    Evaluation(HPxGeometryFilter& filter, NodeData& data, HDataBlock& block, unsigned index)
+        : filter_(filter)
+        , data_(data)
+        , block_(block)
+        , index_(index)
+        , state_(filterStateOf(data).geometry(index)) {}
+
+    HStatus run(const Slot& input, const std::shared_ptr<MeshData>& mesh, Slot& output) {
+        HStatus status;
+        const std::shared_ptr<const IndexMap> affected = resolve(*state_, input, *mesh, status);
+        if (affected)
+            status = initialize(sources(input, *mesh, affected));
+        if (status.error())
+            return status;
+        GeometryPoints points(mesh, affected, state_->pool);
+        status = deform(points);
+        if (!status.error())
+            output.data = points.result();
+        return status;
+    }
+
+private:
+    GeometrySources sources(const Slot& input, const MeshData& mesh, const std::shared_ptr<const IndexMap>& affected) {
+        GeometrySources now;
+        const std::shared_ptr<Slot> rest = elementOf(data_, *filterAttributes().originalGeometry, index_);
+        const std::shared_ptr<MeshData> restMesh = evaluatedMesh(rest);
+        now.inputConnection = connectionInto(childOf(input, *filterAttributes().inputGeometry).get());
+        now.restConnection = connectionInto(rest.get());
+        now.input = mesh.topology;
+        if (restMesh) {
+            now.rest = restMesh->topology;
+            now.restPoints = restMesh->points;
+        }
+        now.expression = textIn(*childOf(input, *filterAttributes().componentTagExpression));
+        now.affected = affected;
+        return now;
+    }
+
+    HStatus initialize(GeometrySources now) {
+        if (state_->isStale(now)) {
+            state_->notInitialized();
+            const HStatus status = callPlugin(data_.node, "initializeMultiIndex",
+                                              [&] { return filter_.initializeMultiIndex(block_, index_, true); });
+            if (status.error())
+                return status;
+        }
+        state_->initializedFrom(std::move(now)); // shares what was compared, so that it need not be compared again
+        return HStatus::kSuccess;
+    }
+
+    HStatus deform(GeometryPoints& points) {
+        const OutsideOfGraph outside;
+        HItGeometry iterator = Access::make<HItGeometry>(points);
+        return callPlugin(data_.node, "deform", [&] { return filter_.deform(block_, iterator, HMatrix(), index_); });
+    }
+
+    HPxGeometryFilter& filter_;
+    NodeData& data_;
+    HDataBlock& block_;
+    const unsigned index_;
+    const std::shared_ptr<GeometryState> state_;
+};
+
+} // namespace
+
+HStatus evaluateGeometry(HPxGeometryFilter& filter, NodeData& data, HDataBlock& block, unsigned index) {
+    const FilterAttributes& attributes = filterAttributes();
+    const std::shared_ptr<Slot> output = elementOf(data, *attributes.outputGeom, index);
+    if (!output)
+        return {HStatus::kFailure, "'" + data.node.name() + ".outputGeom[" + std::to_string(index) + "]' is not there"};
+    const std::shared_ptr<Slot> input = elementOf(data, *attributes.input, index);
+    const std::shared_ptr<MeshData> mesh = input ? evaluatedMesh(childOf(*input, *attributes.inputGeometry)) : nullptr;
+    output->data = mesh; // what stays when something fails
+    HStatus status;
+    if (mesh)
+        status = Evaluation(filter, data, block, index).run(*input, mesh, *output);
+    else
+        filterStateOf(data).forget(index);
+    output->markClean();
+    return status;
+}
+
+std::shared_ptr<const IndexMap> affectedVertices(const NodeData& data, unsigned index, HStatus& status) {
+    const FilterAttributes& attributes = filterAttributes();
+    const std::shared_ptr<Slot> input = elementOf(data, *attributes.input, index);
+    const std::shared_ptr<MeshData> mesh = input ? evaluatedMesh(childOf(*input, *attributes.inputGeometry)) : nullptr;
+    if (!mesh)
+        return std::make_shared<IndexMap>();
+    return resolve(*filterStateOf(data).geometry(index), *input, *mesh, status);
+}
+
+} // namespace OpenQuarn
