@@ -42,10 +42,12 @@ private:
 
 constexpr std::uint32_t complaintId = 0x00001234;
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the type of an entry point
 HStatus initializeComplaint(HObject plugin) {
     return HFnPlugin(plugin).registerNode("complaint", complaintId, Complaint::create, Complaint::initialize);
 }
 
+// NOLINTNEXTLINE(performance-unnecessary-value-param): the type of an entry point
 HStatus uninitializeComplaint(HObject plugin) {
     return HFnPlugin(plugin).deregisterNode(complaintId);
 }

@@ -20,5 +20,6 @@ struct FaultRow {
 std::vector<FaultRow> commandsRows();
 std::vector<FaultRow> geometryRows();
 std::vector<FaultRow> graphRows();
+std::vector<FaultRow> pluginsRows();
 std::vector<FaultRow> servicesRows();
 std::vector<FaultRow> valuesRows();
