@@ -3,8 +3,12 @@
 
 #include "core/apiCall.h"
 #include "core/text.h"
+#include "geometry/MeshData.h"
 
+#include <span>
 #include <sstream>
+#include <stdexcept>
+#include <type_traits>
 
 namespace OpenQuarn {
 namespace {
@@ -76,6 +80,103 @@ std::shared_ptr<Data> readDoubles(const Attribute&, const Value& value, std::str
     return nullptr;
 }
 
+// --- meshes ---
+
+template <class Integers>
+void writeIntegers(JsonWriter& writer, const char* key, const Integers& integers) {
+    writer.key(key);
+    writer.StartArray();
+    for (const auto integer : integers)
+        writer.Int64(integer);
+    writer.EndArray();
+}
+
+void writeMesh(JsonWriter& writer, const Data& data, const std::string&) {
+    const auto& mesh = static_cast<const MeshData&>(data);
+    writer.StartObject();
+    writer.key("points");
+    const double* xyz = mesh.points->xyz();
+    writeNumbers(writer, std::span(xyz, 3 * std::size_t{mesh.vertexCount()}));
+    std::vector<unsigned> counts(mesh.topology->polygonCount());
+    for (std::size_t i = 0; i < counts.size(); ++i)
+        counts[i] = mesh.topology->offsets[i + 1] - mesh.topology->offsets[i];
+    writeIntegers(writer, "counts", counts);
+    writeIntegers(writer, "corners", mesh.topology->corners);
+    if (mesh.tags && !mesh.tags->empty()) {
+        writer.key("tags");
+        writer.StartObject();
+        for (const auto& [name, vertices] : *mesh.tags)
+            writeIntegers(writer, name.c_str(), *vertices);
+        writer.EndObject();
+    }
+    writer.EndObject();
+}
+
+// The list under a key; throws std::invalid_argument when there is none.
+const Value& listIn(const Value& object, const char* key) {
+    const auto member = object.FindMember(key);
+    if (member == object.MemberEnd() || !member->value.IsArray())
+        throw std::invalid_argument(std::string("it has no list '") + key + "'");
+    return member->value;
+}
+
+// `integers` an array of int or unsigned; throws std::invalid_argument when an item is none.
+template <class Integers>
+void readIntegers(const Value& list, Integers& integers) {
+    integers = Integers(list.Size());
+    std::size_t at = 0;
+    for (const Value& item : list.GetArray()) {
+        if (!item.IsInt())
+            throw std::invalid_argument("one of its lists holds something that is no whole number");
+        integers[at++] = static_cast<std::decay_t<decltype(integers[0])>>(item.GetInt());
+    }
+}
+
+HPointArray readPoints(const Value& list) {
+    std::vector<double> xyz(list.Size());
+    if (xyz.size() % 3 != 0 || !readNumbers(list, xyz))
+        throw std::invalid_argument("its points are not three numbers each");
+    HPointArray points(static_cast<unsigned>(xyz.size() / 3));
+    for (std::size_t i = 0; i < points.length(); ++i)
+        points[i] = HPoint(xyz[3 * i], xyz[3 * i + 1], xyz[3 * i + 2]);
+    return points;
+}
+
+std::shared_ptr<const ComponentTags> readTags(const Value& object) {
+    auto tags = std::make_shared<ComponentTags>();
+    for (const auto& member : object.GetObject()) {
+        const std::string name(viewOf(member.name));
+        auto vertices = std::make_shared<HUintArray>();
+        if (!member.value.IsArray())
+            throw std::invalid_argument("its component tag '" + name + "' is no list");
+        readIntegers(member.value, *vertices);
+        if (!tags->emplace(name, std::move(vertices)).second)
+            throw std::invalid_argument("its component tag '" + name + "' stands twice");
+    }
+    return tags;
+}
+
+std::shared_ptr<Data> readMesh(const Attribute&, const Value& value, std::string& why) {
+    try {
+        if (!value.IsObject())
+            throw std::invalid_argument("it is no object");
+        HIntArray counts;
+        HIntArray corners;
+        readIntegers(listIn(value, "counts"), counts);
+        readIntegers(listIn(value, "corners"), corners);
+        const std::shared_ptr<MeshData> mesh = makeMesh(readPoints(listIn(value, "points")), counts, corners);
+        const auto tags = value.FindMember("tags");
+        if (tags == value.MemberEnd())
+            return mesh;
+        if (!tags->value.IsObject())
+            throw std::invalid_argument("its component tags are no object");
+        return withTags(*mesh, readTags(tags->value));
+    } catch (const std::invalid_argument& error) {
+        why = std::string("is no mesh: ") + error.what();
+        return nullptr;
+    }
+}
+
 // --- data of plug-ins: as the plug-in writes it ---
 
 /// Runs a function of the plug-in's object; what it throws is a failing status.
@@ -137,6 +238,7 @@ const DataFormat* formatOf(HFnData::Type type) {
         {HFnData::kString, {"hex"}, writeString, readString},
         {HFnData::kMatrix, {}, writeMatrix, readMatrix},
         {HFnData::kDoubleArray, {}, writeDoubles, readDoubles},
+        {HFnData::kMesh, {"points", "counts", "corners", "tags"}, writeMesh, readMesh},
         {HFnData::kPlugin, {"typeId", "text"}, writePlugin, readPlugin},
     };
     for (const DataFormat& format : formats)

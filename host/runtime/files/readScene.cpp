@@ -360,14 +360,13 @@ private:
     }
 
     void breakCycles() {
-        for (const std::shared_ptr<Slot>& closer : graph_.cycleClosers()) {
-            const Slot* source = closer->source();
-            if (!source)
-                continue; // went with another
-            warnings_.add("the connection from " + quoted(source->name()) + " to " + quoted(closer->name()) +
-                          " closes a cycle; it is dropped");
-            graph_.disconnect(*closer);
-        }
+        for (auto closers = graph_.cycleClosers(); !closers.empty(); closers = graph_.cycleClosers())
+            for (const std::shared_ptr<Slot>& closer : closers)
+                if (const Slot* source = closer->source()) { // else it went with another
+                    warnings_.add("the connection from " + quoted(source->name()) + " to " + quoted(closer->name()) +
+                                  " closes a cycle; it is dropped");
+                    graph_.disconnect(*closer);
+                }
     }
 
     // --- what is kept ---

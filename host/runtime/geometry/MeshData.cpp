@@ -54,7 +54,9 @@ std::shared_ptr<const Positions> positionsOf(const HPointArray& points) {
     return positions;
 }
 
-void checkTagVertices(const MeshData& mesh, const std::string& name, const HUintArray& vertices) {
+void checkTag(const MeshData& mesh, const std::string& name, const HUintArray& vertices) {
+    if (!isIdentifier(name))
+        throw std::invalid_argument("'" + name + "' cannot name a component tag");
     std::vector<bool> listed(mesh.vertexCount());
     for (const unsigned vertex : vertices) {
         if (vertex >= mesh.vertexCount())
@@ -99,11 +101,15 @@ std::shared_ptr<MeshData> withPoints(const MeshData& mesh, const HPointArray& po
 }
 
 std::shared_ptr<MeshData> withTag(const MeshData& mesh, const std::string& name, const HUintArray& vertices) {
-    if (!isIdentifier(name))
-        throw std::invalid_argument("'" + name + "' cannot name a component tag");
-    checkTagVertices(mesh, name, vertices);
+    checkTag(mesh, name, vertices);
     const std::shared_ptr<ComponentTags> tags = copyOfTags(mesh);
     (*tags)[name] = std::make_shared<HUintArray>(vertices);
+    return std::make_shared<MeshData>(mesh.topology, mesh.points, tags);
+}
+
+std::shared_ptr<MeshData> withTags(const MeshData& mesh, const std::shared_ptr<const ComponentTags>& tags) {
+    for (const auto& [name, vertices] : *tags)
+        checkTag(mesh, name, *vertices);
     return std::make_shared<MeshData>(mesh.topology, mesh.points, tags);
 }
 

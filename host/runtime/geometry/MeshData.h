@@ -59,6 +59,8 @@ std::shared_ptr<MeshData> makeMesh(const HPointArray& points, const HIntArray& c
 std::shared_ptr<MeshData> withPoints(const MeshData& mesh, const HPointArray& points);
 /// As HFnGeometryData::setComponentTag().
 std::shared_ptr<MeshData> withTag(const MeshData& mesh, const std::string& name, const HUintArray& vertices);
+/// The same for all tags at once, in the place of those it has; no list is null.
+std::shared_ptr<MeshData> withTags(const MeshData& mesh, const std::shared_ptr<const ComponentTags>& tags);
 std::shared_ptr<MeshData> withoutTag(const MeshData& mesh, const std::string& name);
 
 /// `points` gets the right length; fails when there is no memory for it.

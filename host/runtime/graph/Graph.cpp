@@ -285,50 +285,71 @@ void Graph::disconnectAll(Slot& slot) {
 
 namespace {
 
+bool isPartOf(const Slot& part, const Slot& whole) {
+    for (const Slot* at = &part; at; at = at->parent)
+        if (at == &whole)
+            return true;
+    return false;
+}
+
 /// Depth first over slots, with a stack of its own: a chain may be as long as memory allows.
 class CycleSearch {
 public:
     void from(Slot& start) {
-        enter(start);
+        if (places_.count(&start) == 0)
+            enter(start, false);
         while (!stack_.empty()) {
             Frame& frame = stack_.back();
             if (frame.next == frame.dependents.size()) {
-                state_[frame.slot] = State::done;
+                places_[frame.slot] = done;
                 stack_.pop_back();
                 continue;
             }
             Slot& dependent = *frame.dependents[frame.next++];
-            const State state = stateOf(dependent);
-            if (state == State::open && dependent.source())
-                closers.push_back(dependent.shared_from_this());
-            if (state == State::unseen)
-                enter(dependent);
+            const bool connected = isConnection(*frame.slot, dependent);
+            const auto place = places_.find(&dependent);
+            if (place == places_.end())
+                enter(dependent, connected);
+            else if (place->second != done)
+                addCloser(dependent, connected, place->second);
         }
     }
 
     std::vector<std::shared_ptr<Slot>> closers;
 
 private:
-    enum class State { unseen, open, done };
+    static constexpr std::size_t done = SIZE_MAX;
+    static constexpr std::size_t none = SIZE_MAX;
+
     struct Frame {
         Slot* slot;
+        std::size_t connected; // the highest frame up to here that was entered along a connection
         std::vector<Slot*> dependents;
         std::size_t next = 0;
     };
 
-    State stateOf(const Slot& slot) const {
-        const auto found = state_.find(&slot);
-        return found == state_.end() ? State::unseen : found->second;
+    static bool isConnection(const Slot& from, const Slot& to) {
+        return to.source() && (isPartOf(*to.source(), from) || isPartOf(from, *to.source()));
     }
 
-    void enter(Slot& slot) {
-        state_[&slot] = State::open;
-        Frame frame{&slot, {}};
+    void enter(Slot& slot, bool connected) {
+        places_[&slot] = stack_.size();
+        const std::size_t below = stack_.empty() ? none : stack_.back().connected;
+        Frame frame{&slot, connected ? stack_.size() : below, {}};
         forEachDependent(slot, [&](Slot& dependent) { frame.dependents.push_back(&dependent); });
         stack_.push_back(std::move(frame));
     }
 
-    std::unordered_map<const Slot*, State> state_;
+    // the cycle goes from the frame at `place` up to the top and back: its last connection closes it
+    void addCloser(Slot& dependent, bool connected, std::size_t place) {
+        const std::size_t last = stack_.back().connected;
+        if (connected)
+            closers.push_back(dependent.shared_from_this());
+        else if (last != none && last > place)
+            closers.push_back(stack_[last].slot->shared_from_this());
+    }
+
+    std::unordered_map<const Slot*, std::size_t> places_; // in the stack, or done
     std::vector<Frame> stack_;
 };
 

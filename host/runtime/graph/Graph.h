@@ -67,7 +67,8 @@ public:
     void connect(Slot& source, Slot& destination, bool checkCycle = true);
     /// Breaks the connection into `destination`; its value then does as the attribute says.
     void disconnect(Slot& destination);
-    /// Destinations whose connection closes a cycle: without these connections there is none. One walk over all nodes.
+    /// Destinations whose connection closes a cycle; none when there is no cycle. Breaking them may leave cycles that
+    /// share a part with those, so ask again afterwards. One walk over all nodes. A slot may be listed twice.
     std::vector<std::shared_ptr<Slot>> cycleClosers() const;
 
     // --- values ---
