@@ -5,6 +5,7 @@
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HFnPlugin.h"
+#include "openquarn/HGlobal.h"
 #include "openquarn_app/Plugins.h"
 
 namespace {
@@ -55,6 +56,38 @@ TEST_F(NodeClassTest, ARefusedAttributeLeavesNothingBehind) {
     HPlug first = node.findPlug("first");
     EXPECT_FALSE(first.setDouble(2.0).error());
     EXPECT_EQ(node.findPlug("last").asDouble(), 0.0);
+}
+
+// makes another node before its own, and deletes itself when it is told to
+class Nested : public HPxNode {
+public:
+    static HPxNode* creator() {
+        HFnDependencyNode().create("testSum", "inner");
+        return new Nested;
+    }
+    void postConstructor() override {
+        if (suicidal)
+            HGlobal::executeCommand("deleteNode " + name());
+    }
+    static bool suicidal;
+};
+bool Nested::suicidal = false;
+
+TEST_F(NodeClassTest, CreatorsMayCreateAndConstructorsMayDelete) {
+    OpenQuarn::addPlugin(
+        "nested",
+        [](HObject plugin) { return HFnPlugin(plugin).registerNode("nested", 0x7112, Nested::creator, nullptr); },
+        [](HObject plugin) { return HFnPlugin(plugin).deregisterNode(0x7112); });
+    HFnDependencyNode node;
+    node.create("nested", "outer");
+    ASSERT_NE(node.userNode(), nullptr);
+    EXPECT_EQ(node.userNode()->name(), "outer");
+
+    Nested::suicidal = true;
+    HStatus status;
+    EXPECT_TRUE(node.create("nested", "gone", &status).isNull());
+    EXPECT_EQ(testNodes::text(status), "HFnDependencyNode::create: node 'gone' was deleted while it was created");
+    Nested::suicidal = false;
 }
 
 TEST_F(NodeClassTest, CompoundsCannotHoldThemselves) {
