@@ -6,6 +6,7 @@
 #include "commands/WordValues.h"
 #include "core/Object.h"
 #include "core/apiCall.h"
+#include "core/threads.h"
 
 #include <memory>
 
@@ -72,6 +73,7 @@ HStatus run(const std::vector<ScriptWord>& words, CommandValue& result) {
 } // namespace
 
 HStatus dispatch(const std::vector<ScriptWord>& words, CommandValue& result) noexcept {
+    requireMain("running a command");
     try {
         result = std::monostate();
         return run(words, result);

@@ -15,7 +15,8 @@ template <class Integer>
 double roundedTo(double value) {
     if (std::isnan(value))
         return 0.0;
-    return std::clamp(std::nearbyint(value), static_cast<double>(std::numeric_limits<Integer>::min()),
+    // the sum makes a negative zero, which integers do not have, a zero
+    return std::clamp(std::nearbyint(value) + 0.0, static_cast<double>(std::numeric_limits<Integer>::min()),
                       static_cast<double>(std::numeric_limits<Integer>::max()));
 }
 

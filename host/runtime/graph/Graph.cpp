@@ -14,6 +14,23 @@ namespace {
 
 Graph* theGraph = nullptr;
 
+constexpr const char* timeNodeName = "time1";
+
+// A connection that ends below the slot; null when there is none.
+const Slot* connectedBelow(const Slot& slot) {
+    const Slot* connected = nullptr;
+    slot.forEachPart([&](const Slot& part) {
+        if (!connected)
+            connected = part.source() ? &part : connectedBelow(part);
+    });
+    return connected;
+}
+
+void unlock(Slot& slot) {
+    slot.locked = false;
+    slot.forEachPart([](Slot& part) { unlock(part); });
+}
+
 } // namespace
 
 Graph* Graph::current() {
@@ -31,7 +48,7 @@ Graph::Graph() {
         throw std::runtime_error("there can be only one session at a time");
     registerBaseNodes();
     theGraph = this;
-    timeNode_ = createNode(timeClass(), "time1");
+    timeNode_ = createNode(timeClass(), timeNodeName);
     setTimeIn(*timeNode_->data(), time_);
 }
 
@@ -48,7 +65,7 @@ std::string Graph::freeName(const std::string& base) {
     std::string name;
     do {
         name = base + std::to_string(++number);
-    } while (byName_.count(name) != 0);
+    } while (isTaken(name));
     return name;
 }
 
@@ -64,7 +81,7 @@ std::shared_ptr<Node> Graph::createNode(const std::shared_ptr<const NodeClass>& 
         throw std::invalid_argument("'" + name + "' cannot name a node");
     if (!type->creator)
         throw std::invalid_argument("node type '" + type->name + "' cannot be created by itself");
-    const bool asGiven = !name.empty() && byName_.count(name) == 0;
+    const bool asGiven = !name.empty() && !isTaken(name);
     const auto node = std::make_shared<Node>(*this, type, asGiven ? name : freeName(name.empty() ? type->name : name));
     insert(node);
     try {
@@ -104,7 +121,7 @@ void Graph::renameNode(Node& node, const std::string& name) {
         return;
     if (!isIdentifier(name))
         throw std::invalid_argument("'" + name + "' cannot name a node");
-    if (byName_.count(name) != 0)
+    if (isTaken(name))
         throw std::invalid_argument("there is a node named '" + name + "' already");
     const auto entry = byName_.find(node.name());
     if (entry == byName_.end())
@@ -147,6 +164,12 @@ void Graph::clear(double time) {
         if (*node != timeNode_ && (*node)->isAlive()) // one may have deleted others
             deleteNode(**node);
     nextNumber_.clear();
+    reservedNames_.clear();
+    keptFileContent.reset();
+    timeNode_->unknownFileContent.clear();
+    for (const std::shared_ptr<Slot>& slot : timeNode_->data()->slots)
+        unlock(*slot);
+    renameNode(*timeNode_, timeNodeName);
     setTime(time);
 }
 
@@ -169,9 +192,18 @@ std::string Graph::refusal(Slot& source, Slot& destination, bool checkCycle) con
     for (const Slot* at = &destination; at; at = at->parent)
         if (const Slot* present = at->source())
             return both + "the destination is connected from '" + present->name() + "'";
+    if (const Slot* part = connectedBelow(destination))
+        return both + "'" + part->name() + "' is connected from '" + part->source()->name() + "'";
     if (checkCycle && to.kind() != HFn::kMessageAttribute && reaches(destination, source))
         return both + "the source depends on the destination";
     return {};
+}
+
+bool Graph::isConnectedInto(const Slot& destination) {
+    for (const Slot* at = &destination; at; at = at->parent)
+        if (at->source())
+            return true;
+    return connectedBelow(destination) != nullptr;
 }
 
 void Graph::connect(Slot& source, Slot& destination, bool checkCycle) {

@@ -11,9 +11,20 @@
 #include <mutex>
 #include <string>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 namespace OpenQuarn {
+
+/// What a scene file says that this host does not know: kept with the scene for the next save. Made by the scene
+/// reader.
+class KeptFileContent {
+public:
+    KeptFileContent() = default;
+    virtual ~KeptFileContent() = default;
+    KeptFileContent(const KeptFileContent&) = delete;
+    KeptFileContent& operator=(const KeptFileContent&) = delete;
+};
 
 /// Thread: main, outside of evaluations, except where a function says otherwise. What can fail throws
 /// std::invalid_argument or std::runtime_error with a sentence that names the thing and the value.
@@ -39,13 +50,20 @@ public:
     std::size_t nodeCount() const { return byName_.size(); }
     /// Number of nodes of a type.
     std::size_t nodeCount(const NodeClass& type) const;
-    /// Deletes all nodes but the time node, which is set to `time`.
+    /// Deletes all nodes but the time node, which is set to `time` and named "time1" again; forgets what was kept of a
+    /// scene file.
     void clear(double time);
+    const std::shared_ptr<Node>& timeNode() const { return timeNode_; }
+    /// Keeps a name from being given to a node: a node of the scene file that cannot be created has it.
+    void reserveName(const std::string& name) { reservedNames_.insert(name); }
+    std::unique_ptr<KeptFileContent> keptFileContent;
 
     // --- connections ---
     /// Why the two cannot be connected, as a sentence naming both; empty when they can. `checkCycle` false leaves out
     /// the walk through what depends on the destination.
     std::string refusal(Slot& source, Slot& destination, bool checkCycle = true) const;
+    /// True when a connection ends at the slot, above it or below it.
+    static bool isConnectedInto(const Slot& destination);
     void connect(Slot& source, Slot& destination, bool checkCycle = true);
     /// Breaks the connection into `destination`; its value then does as the attribute says.
     void disconnect(Slot& destination);
@@ -83,6 +101,7 @@ public:
 
 private:
     std::string freeName(const std::string& base);
+    bool isTaken(const std::string& name) const { return byName_.count(name) + reservedNames_.count(name) != 0; }
     void insert(const std::shared_ptr<Node>& node);
     void disconnectAll(Slot& slot);
     void breakLink(Slot& source, Slot& destination);
@@ -95,6 +114,7 @@ private:
         std::uint64_t order;
     };
     std::unordered_map<std::string, Entry> byName_;
+    std::unordered_set<std::string> reservedNames_;
     std::unordered_map<std::string, unsigned> nextNumber_; // where the search for a free name goes on
     std::unordered_map<const NodeClass*, std::size_t> typeCounts_;
     std::uint64_t nextOrder_ = 1;

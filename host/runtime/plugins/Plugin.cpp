@@ -73,17 +73,22 @@ void Plugin::introduce(const std::string& vendor, const std::string& version) {
     introduced_ = true;
 }
 
-void Plugin::registerNode(const std::string& typeName, HTypeId id, HPxNode* (*creator)(), HStatus (*initializer)(),
-                          HPxNode::Type type) {
-    const std::shared_ptr<NodeClass> built = buildNodeClass(typeName, id, type, creator, initializer);
-    built->plugin = name;
-    registrations_.push_back({Registration::Kind::node, typeName, id});
+template <class Call>
+void Plugin::tracked(Registration registration, Call&& call) {
+    registrations_.push_back(std::move(registration));
     try {
-        addNodeClass(built);
+        std::forward<Call>(call)();
     } catch (...) {
         registrations_.pop_back();
         throw;
     }
+}
+
+void Plugin::registerNode(const std::string& typeName, HTypeId id, HPxNode* (*creator)(), HStatus (*initializer)(),
+                          HPxNode::Type type) {
+    const std::shared_ptr<NodeClass> built = buildNodeClass(typeName, id, type, creator, initializer);
+    built->plugin = name;
+    tracked({Registration::Kind::node, typeName, id}, [&] { addNodeClass(built); });
 }
 
 void Plugin::registerData(const std::string& typeName, HTypeId id, HPxData* (*creator)()) {
@@ -91,18 +96,18 @@ void Plugin::registerData(const std::string& typeName, HTypeId id, HPxData* (*cr
     type->name = typeName;
     type->id = id;
     type->creator = creator;
-    registrations_.push_back({Registration::Kind::data, typeName, id});
-    try {
-        addDataType(type);
-    } catch (...) {
-        registrations_.pop_back();
-        throw;
-    }
+    tracked({Registration::Kind::data, typeName, id}, [&] { addDataType(type); });
+}
+
+void Plugin::registerGPUDeformer(const std::string& nodeType, const std::string& registrant,
+                                 HGPUDeformerRegistrationInfo* info) {
+    tracked({Registration::Kind::gpuDeformer, nodeType, {}}, [&] { addGPUDeformer(nodeType, registrant, info); });
 }
 
 HStatus Plugin::registerCommand(const std::string& command, HPxCommand* (*creator)(), HSyntax (*syntax)()) {
-    registrations_.push_back({Registration::Kind::command, command, {}});
-    const HStatus status = CommandRegistry::instance().add(command, creator, syntax, this);
+    HStatus status;
+    tracked({Registration::Kind::command, command, {}},
+            [&] { status = CommandRegistry::instance().add(command, creator, syntax, this); });
     if (status.error())
         registrations_.pop_back();
     return status;

@@ -9,10 +9,10 @@
 #include "openquarn/HString.h"
 #include "openquarn/HTypeId.h"
 
-#include <functional>
 #include <string>
 #include <vector>
 
+class HGPUDeformerRegistrationInfo;
 class HPxCommand;
 class HSyntax;
 
@@ -52,10 +52,10 @@ public:
                       HPxNode::Type type);
     void registerData(const std::string& typeName, HTypeId id, HPxData* (*creator)());
     HStatus registerCommand(const std::string& command, HPxCommand* (*creator)(), HSyntax (*syntax)());
-    /// To be called after something else was registered for it.
-    void add(Registration registration) { registrations_.push_back(std::move(registration)); }
+    void registerGPUDeformer(const std::string& nodeType, const std::string& registrant,
+                             HGPUDeformerRegistrationInfo* info);
 
-    /// Takes away what `matches` finds; throws when it finds nothing (as `what`) and when it is in use.
+    /// Takes away one registration; throws when it is not this plug-in's, and when it is in use.
     void deregister(Registration::Kind kind, HTypeId id);
     void deregister(Registration::Kind kind, const std::string& registered);
 
@@ -68,6 +68,9 @@ public:
     std::vector<Registration> removeAll();
 
 private:
+    /// Runs `call`, which registers, and remembers the registration unless it throws.
+    template <class Call>
+    void tracked(Registration registration, Call&& call);
     using Place = std::vector<Registration>::iterator;
     void remove(Place place);
     void removeFrom(const Registration& registration) const;

@@ -4,6 +4,7 @@
 #include "core/threads.h"
 #include "graph/Graph.h"
 #include "plugins/PluginTable.h"
+#include "services/SceneFileState.h"
 
 namespace OpenQuarn {
 namespace {
@@ -28,6 +29,7 @@ Session::~Session() {
 
 void Session::newScene() {
     impl_->graph.clear(firstFrame);
+    setCurrentSceneFile({});
 }
 
 std::vector<HObject> Session::nodes() const {

@@ -19,5 +19,6 @@ struct FaultRow {
 // by family, each in a file of its own
 std::vector<FaultRow> commandsRows();
 std::vector<FaultRow> graphRows();
+std::vector<FaultRow> pluginsRows();
 std::vector<FaultRow> servicesRows();
 std::vector<FaultRow> valuesRows();

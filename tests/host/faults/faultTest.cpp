@@ -18,7 +18,7 @@ using OpenQuarn::Faults;
 
 std::vector<FaultRow> allRows() {
     std::vector<FaultRow> rows;
-    for (const auto& family : {commandsRows(), graphRows(), servicesRows(), valuesRows()})
+    for (const auto& family : {commandsRows(), graphRows(), pluginsRows(), servicesRows(), valuesRows()})
         rows.insert(rows.end(), family.begin(), family.end());
     return rows;
 }

@@ -23,7 +23,7 @@ public:
     Session(const Session&) = delete;
     Session& operator=(const Session&) = delete;
 
-    /// Deletes all nodes but the time node, and goes to the first frame.
+    /// Deletes all nodes but the time node, goes to the first frame, and has no file any more.
     void newScene();
     /// All nodes, in order of creation.
     std::vector<HObject> nodes() const;

@@ -6,6 +6,7 @@ namespace OpenQuarn {
 void addBuiltins(CommandRegistry& registry) {
     addConnectionCommands(registry);
     addDuplicate(registry);
+    addFileCommand(registry);
     addGetAttr(registry);
     addNodeCommands(registry);
     addPluginCommands(registry);

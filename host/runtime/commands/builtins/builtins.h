@@ -10,6 +10,7 @@ void addBuiltins(CommandRegistry& registry);
 
 void addConnectionCommands(CommandRegistry& registry);
 void addDuplicate(CommandRegistry& registry);
+void addFileCommand(CommandRegistry& registry);
 void addGetAttr(CommandRegistry& registry);
 void addNodeCommands(CommandRegistry& registry);
 void addPluginCommands(CommandRegistry& registry);

@@ -11,48 +11,19 @@
 namespace OpenQuarn {
 namespace {
 
-/// The slot of a plug, made where elements on the way to it are missing; taken away again unless it is kept.
-class MadeSlot {
-public:
-    explicit MadeSlot(const HPlug& plug)
-        : above_(nearestExisting(plug))
-        , slot_(resolvePlug(plug, true)) {
-        if (!slot_)
-            throw std::invalid_argument("'" + plug.name().asStdString() + "' does not name one place");
-    }
-    ~MadeSlot() {
-        if (!kept_ && above_ != slot_)
-            remove();
-    }
-    MadeSlot(const MadeSlot&) = delete;
-    MadeSlot& operator=(const MadeSlot&) = delete;
-
-    Slot& slot() { return *slot_; }
-    void keep() { kept_ = true; }
-
-private:
-    void remove() noexcept {
-        try {
-            const Slot* made = slot_.get();
-            while (made && made->parent != above_.get())
-                made = made->parent;
-            if (made)
-                currentGraph().removeElement(*above_, made->index);
-        } catch (...) { // NOLINT(bugprone-empty-catch): an element with default values stays, which harms nothing
-        }
-    }
-
-    std::shared_ptr<Slot> above_;
-    std::shared_ptr<Slot> slot_;
-    bool kept_ = false;
-};
-
 void connect(const HPlug& from, const HPlug& to) {
-    MadeSlot source(from);
-    MadeSlot destination(to);
-    currentGraph().connect(source.slot(), destination.slot());
-    source.keep();
-    destination.keep();
+    TentativeSlot source(from);
+    TentativeSlot destination(to);
+    if (!source.get() || !destination.get())
+        throw std::invalid_argument("'" + from.name().asStdString() + "' or '" + to.name().asStdString() +
+                                    "' does not name one place");
+    Graph& graph = currentGraph();
+    graph.connect(*source.get(), *destination.get());
+    for (TentativeSlot* end : {&source, &destination}) {
+        if (end->isNew())
+            graph.notify(*end->get(), HNodeMessage::kAttributeArrayAdded);
+        end->keep();
+    }
 }
 
 // breaking a connection may remove the element that it leads to: everything is found by plug again

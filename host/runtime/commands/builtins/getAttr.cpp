@@ -109,7 +109,7 @@ CommandValue labelOf(const Slot& slot) {
 class GetAttr : public Builtin {
     HStatus run(const Arguments& args) override {
         const HPlug plug = plugNamed(args.text(0));
-        const std::shared_ptr<Slot> slot = resolvePlug(plug, plugImpl(plug)->field->computed);
+        const std::shared_ptr<Slot> slot = slotToEvaluate(plug);
         if (!slot)
             throw std::invalid_argument("'" + plug.name().asStdString() + "' does not exist");
         if (args.has("lock")) {

@@ -1,0 +1,183 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "files/dataFormats.h"
+
+#include "core/apiCall.h"
+#include "core/text.h"
+
+#include <sstream>
+
+namespace OpenQuarn {
+namespace {
+
+using rapidjson::Value;
+
+template <class Numbers>
+void writeNumbers(JsonWriter& writer, const Numbers& numbers) {
+    writer.StartArray();
+    for (const double number : numbers)
+        writer.Double(number);
+    writer.EndArray();
+}
+
+// False when one of them is no number.
+template <class Numbers>
+bool readNumbers(const Value& list, Numbers& numbers) {
+    std::size_t at = 0;
+    for (const Value& item : list.GetArray()) {
+        const std::optional<double> number = numberOf(item);
+        if (!number)
+            return false;
+        numbers[at++] = *number;
+    }
+    return true;
+}
+
+// --- texts ---
+
+void writeString(JsonWriter& writer, const Data& data, const std::string&) {
+    writer.text(static_cast<const StringData&>(data).value);
+}
+
+std::shared_ptr<Data> readString(const Attribute&, const Value& value, std::string& why) {
+    const std::optional<std::string> text = textOf(value);
+    if (text)
+        return std::make_shared<StringData>(*text);
+    why = "is no text";
+    return nullptr;
+}
+
+// --- matrices ---
+
+void writeMatrix(JsonWriter& writer, const Data& data, const std::string&) {
+    writeNumbers(writer, static_cast<const MatrixData&>(data).value);
+}
+
+std::shared_ptr<Data> readMatrix(const Attribute&, const Value& value, std::string& why) {
+    MatrixValue matrix = identityMatrix;
+    if (value.IsArray() && value.Size() == matrix.size() && readNumbers(value, matrix))
+        return std::make_shared<MatrixData>(matrix);
+    why = "is no list of 16 numbers";
+    return nullptr;
+}
+
+// --- lists of doubles ---
+
+void writeDoubles(JsonWriter& writer, const Data& data, const std::string&) {
+    writeNumbers(writer, static_cast<const DoubleArrayData&>(data).values);
+}
+
+std::shared_ptr<Data> readDoubles(const Attribute&, const Value& value, std::string& why) {
+    if (value.IsArray()) {
+        std::vector<double> numbers(value.Size());
+        if (readNumbers(value, numbers))
+            return std::make_shared<DoubleArrayData>(std::move(numbers));
+    }
+    why = "is no list of numbers";
+    return nullptr;
+}
+
+// --- data of plug-ins: as the plug-in writes it ---
+
+/// Runs a function of the plug-in's object; what it throws is a failing status.
+template <class Call>
+HStatus guarded(const char* function, Call&& call) {
+    try {
+        return call();
+    } catch (...) {
+        return statusOfException(function);
+    }
+}
+
+std::string reasonOf(const HStatus& status) {
+    return status.errorString().asStdString();
+}
+
+void writePlugin(JsonWriter& writer, const Data& data, const std::string& text) {
+    writer.StartObject();
+    writer.key("typeId");
+    writer.Uint(static_cast<const PluginData&>(data).type->id.id());
+    writer.key("text");
+    writer.text(text);
+    writer.EndObject();
+}
+
+std::shared_ptr<Data> readPlugin(const Attribute& attribute, const Value& value, std::string& why) {
+    const auto text = value.IsObject() ? value.FindMember("text") : Value::ConstMemberIterator();
+    const auto id = value.IsObject() ? value.FindMember("typeId") : Value::ConstMemberIterator();
+    const bool isWhole = value.IsObject() && text != value.MemberEnd() && id != value.MemberEnd();
+    const std::optional<std::string> bytes = isWhole ? textOf(text->value) : std::nullopt;
+    if (!bytes || !id->value.IsUint()) {
+        why = "is no plug-in data with a type id and a text";
+        return nullptr;
+    }
+    if (HTypeId(id->value.GetUint()) != attribute.pluginData) {
+        why = "is of data type " + hexText(id->value.GetUint()) + ", not " + hexText(attribute.pluginData);
+        return nullptr;
+    }
+    std::shared_ptr<PluginData> data;
+    const HStatus status = guarded("readASCII", [&] {
+        data = createPluginData(attribute.pluginData);
+        return data->value->readASCII(HString(*bytes));
+    });
+    if (!status.error())
+        return data;
+    why = "could not be read by its data type: " + reasonOf(status);
+    return nullptr;
+}
+
+struct DataFormat {
+    HFnData::Type type;
+    std::vector<std::string> keys;
+    void (*write)(JsonWriter& writer, const Data& data, const std::string& text);
+    std::shared_ptr<Data> (*read)(const Attribute& attribute, const Value& value, std::string& why);
+};
+
+const DataFormat* formatOf(HFnData::Type type) {
+    static const std::vector<DataFormat> formats = {
+        {HFnData::kString, {"hex"}, writeString, readString},
+        {HFnData::kMatrix, {}, writeMatrix, readMatrix},
+        {HFnData::kDoubleArray, {}, writeDoubles, readDoubles},
+        {HFnData::kPlugin, {"typeId", "text"}, writePlugin, readPlugin},
+    };
+    for (const DataFormat& format : formats)
+        if (format.type == type)
+            return &format;
+    return nullptr;
+}
+
+} // namespace
+
+bool preparePluginData(const Data& data, std::string& text, std::string& why) {
+    if (!formatOf(data.dataType())) {
+        why = "is of a kind that scene files do not hold";
+        return false;
+    }
+    if (data.dataType() != HFnData::kPlugin)
+        return true;
+    std::ostringstream stream;
+    const HStatus status =
+        guarded("writeASCII", [&] { return static_cast<const PluginData&>(data).value->writeASCII(stream); });
+    if (status.error() && status.statusCode() != HStatus::kNotImplemented)
+        why = "could not be written by its data type: " + reasonOf(status);
+    text = stream.str();
+    return !status.error();
+}
+
+void writeData(JsonWriter& writer, const Data& data, const std::string& text) {
+    formatOf(data.dataType())->write(writer, data, text);
+}
+
+std::shared_ptr<Data> readData(const Attribute& attribute, const Value& value, std::string& why) {
+    if (const DataFormat* format = formatOf(attribute.data))
+        return format->read(attribute, value, why);
+    why = "is of a kind that scene files do not hold";
+    return nullptr;
+}
+
+const std::vector<std::string>& knownDataKeys(HFnData::Type type) {
+    static const std::vector<std::string> none;
+    const DataFormat* format = formatOf(type);
+    return format ? format->keys : none;
+}
+
+} // namespace OpenQuarn

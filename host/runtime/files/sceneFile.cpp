@@ -1,0 +1,136 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn_app/SceneFile.h"
+
+#include "core/threads.h"
+#include "files/atomicFile.h"
+#include "files/json.h"
+#include "files/sceneText.h"
+#include "graph/baseNodes.h"
+#include "openquarn_app/Messages.h"
+#include "services/SceneFileState.h"
+
+#include <stdexcept>
+
+namespace OpenQuarn {
+namespace {
+
+/// Runs `work(warnings)`, and makes of what it finds and throws the outcome, with the file's name before every text.
+template <class Work>
+FileOutcome fileOperation(const std::string& fileName, Work&& work) {
+    FileOutcome outcome;
+    Warnings warnings;
+    try {
+        work(warnings);
+        outcome.ok = true;
+    } catch (const std::bad_alloc&) {
+        outcome.error = fileName + ": there is not enough memory";
+    } catch (const std::exception& error) {
+        outcome.error = fileName + ": " + error.what();
+    }
+    for (const std::string& text : warnings.take()) {
+        outcome.warnings.push_back(fileName + ": " + text);
+        showMessage(Severity::warning, outcome.warnings.back());
+    }
+    if (!outcome.ok)
+        showMessage(Severity::error, outcome.error);
+    return outcome;
+}
+
+// What was read only in part must not be saved in the place of the whole.
+void readWhole(const rapidjson::Document& document, Graph& graph, Warnings& warnings) {
+    try {
+        readScene(document, graph, warnings);
+    } catch (...) {
+        graph.clear(1.0);
+        setCurrentSceneFile({});
+        throw;
+    }
+}
+
+std::string textMember(const rapidjson::Value& object, const char* key) {
+    if (!object.IsObject())
+        return {};
+    const auto member = object.FindMember(key);
+    return member != object.MemberEnd() && member->value.IsString() ? std::string(viewOf(member->value)) : "";
+}
+
+const rapidjson::Value* listMember(const rapidjson::Value& object, const char* key) {
+    const auto member = object.FindMember(key);
+    return member != object.MemberEnd() && member->value.IsArray() ? &member->value : nullptr;
+}
+
+void summarize(const rapidjson::Document& document, SceneSummary& summary) {
+    summary.version = sceneVersion(document);
+    summary.writtenBy = textMember(document, SceneKey::writtenBy);
+    if (const auto time = document.FindMember(SceneKey::time); time != document.MemberEnd() && time->value.IsNumber())
+        summary.time = time->value.GetDouble();
+    if (const rapidjson::Value* nodes = listMember(document, SceneKey::nodes)) {
+        summary.nodes = nodes->Size();
+        for (const rapidjson::Value& node : nodes->GetArray())
+            ++summary.nodesByType[textMember(node, SceneKey::type)];
+    }
+    if (const rapidjson::Value* connections = listMember(document, SceneKey::connections))
+        summary.connections = connections->Size();
+    if (const rapidjson::Value* plugins = listMember(document, SceneKey::plugins))
+        for (const rapidjson::Value& plugin : plugins->GetArray())
+            if (plugin.IsString())
+                summary.plugins.emplace_back(viewOf(plugin));
+    for (const auto& [type, count] : summary.nodesByType)
+        if (!findNodeClass(type))
+            summary.missingTypes.push_back(type);
+}
+
+} // namespace
+
+FileOutcome openScene(const std::filesystem::path& path) {
+    requireMain("openScene");
+    return fileOperation(path.string(), [&](Warnings& warnings) {
+        rapidjson::Document document;
+        Graph& graph = currentGraph();
+        parseScene(document, readFile(path));
+        setCurrentSceneFile(path.string()); // nodes look for files beside it
+        readWhole(document, graph, warnings);
+    });
+}
+
+FileOutcome saveScene(const std::filesystem::path& path) {
+    requireMain("saveScene");
+    return fileOperation(path.string(), [&](Warnings& warnings) {
+        replaceFile(path, writeScene(currentGraph(), warnings));
+        setCurrentSceneFile(path.string());
+    });
+}
+
+FileOutcome sceneFromText(const std::string& text, const std::string& fileName) {
+    requireMain("sceneFromText");
+    return fileOperation(fileName, [&](Warnings& warnings) {
+        rapidjson::Document document;
+        Graph& graph = currentGraph();
+        parseScene(document, text);
+        readWhole(document, graph, warnings);
+    });
+}
+
+FileOutcome sceneToText(std::string& text) {
+    requireMain("sceneToText");
+    return fileOperation("the scene", [&](Warnings& warnings) { text = writeScene(currentGraph(), warnings); });
+}
+
+std::string currentFile() {
+    return currentSceneFile();
+}
+
+SceneSummary readSummary(const std::filesystem::path& path) {
+    SceneSummary summary;
+    summary.outcome = fileOperation(path.string(), [&](Warnings&) {
+        const std::string text = readFile(path);
+        rapidjson::Document document;
+        parseScene(document, text);
+        registerBaseNodes();
+        summary.bytes = text.size();
+        summarize(document, summary);
+    });
+    return summary;
+}
+
+} // namespace OpenQuarn
