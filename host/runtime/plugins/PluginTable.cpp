@@ -168,8 +168,9 @@ void PluginTable::unload(const std::string& name) {
     } catch (const std::exception& error) {
         throw std::runtime_error("plug-in '" + name + "' cannot be unloaded: " + error.what());
     }
-    Loaded loaded = std::move(*placeOf(name)); // it may have loaded another meanwhile
-    loaded_.erase(placeOf(name));
+    const auto gone = placeOf(name); // it may have loaded another meanwhile
+    Loaded loaded = std::move(*gone);
+    loaded_.erase(gone);
     const std::vector<Registration> left = loaded.plugin->removeAll();
     if (!left.empty())
         showMessage(Severity::warning,
