@@ -339,8 +339,10 @@ TEST_F(GraphCommands, DuplicateHasPluginsCopyTheirData) {
 
     EXPECT_THAT(print("loadPlugin -query"), HasSubstr("holders"));
     EXPECT_THAT(error("unloadPlugin holders"), HasSubstr("unloadPlugin: "));
+    print("deleteNode h g; unloadPlugin holders");
     expectErrors({
-        {"unloadPlugin nope", "nope"},
+        {"createNode testHolder", "there is no node type 'testHolder'"},
+        {"unloadPlugin holders", "holders"},
         {"loadPlugin /no/such/plugin.so", "/no/such/plugin.so"},
         {"loadPlugin", "argument 1 (text) is missing"},
     });
