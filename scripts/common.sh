@@ -21,6 +21,7 @@ declare -A probe_of=(
   [ccache]=ccache
   [libtbb-dev]=tbb/parallel_for.h
   [rapidjson-dev]=rapidjson/document.h
+  [libcli11-dev]=CLI/CLI.hpp
   [libgtest-dev]=gtest/gtest.h
   [libgmock-dev]=gmock/gmock.h
   [libeigen3-dev]=eigen3/Eigen/Core

@@ -35,9 +35,11 @@ public:
     /// only for a dirty plug, on one thread at a time for one node (geometry filters: one thread for one geometry).
     /// [eval]
     virtual HStatus compute(const HPlug& plug, HDataBlock& block);
-    /// Adds to `affected` what becomes dirty with `dirty` beyond the declared dependencies. [main]
+    /// Adds to `affected` what becomes dirty with `dirty` beyond the declared dependencies. May not change the graph.
+    /// [main]
     virtual HStatus setDependentsDirty(const HPlug& dirty, HPlugArray& affected);
-    /// Called after a connection has been made or broken: `plug` is this node's side, `asSource` says which it is.
+    /// Called after a connection has been made or broken: `plug` is this node's side, `asSource` says which it is. May
+    /// change the graph, and even delete the node; what is connected again to a node that is being deleted is let go.
     /// [main]
     virtual HStatus connectionMade(const HPlug& plug, const HPlug& otherPlug, bool asSource);
     virtual HStatus connectionBroken(const HPlug& plug, const HPlug& otherPlug, bool asSource);

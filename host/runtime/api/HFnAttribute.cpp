@@ -396,12 +396,21 @@ HObject HFnCompoundAttribute::create(const HString& longName, const HString& sho
                            shortName, [](Attribute&) { return std::string(); });
 }
 
+namespace {
+
+bool isAtOrAbove(const Attribute& above, const Attribute& attribute) {
+    const std::shared_ptr<Attribute> parent = attribute.parent.lock();
+    return &above == &attribute || (parent && isAtOrAbove(above, *parent));
+}
+
+} // namespace
+
 HStatus HFnCompoundAttribute::addChild(const HObject& child) {
     return changeAttribute(object_, FaultPoint::HFnCompoundAttribute_addChild, [&](Attribute& attribute) -> HStatus {
         const std::shared_ptr<Attribute> added = attached(child);
         if (!added)
             return {HStatus::kInvalidParameter, "the child is no attribute"};
-        if (!added->parent.expired() || added->fixed || added.get() == &attribute)
+        if (!added->parent.expired() || added->fixed || isAtOrAbove(*added, attribute))
             return {HStatus::kFailure, "attribute '" + added->name + "' has its place already"};
         for (const std::shared_ptr<Attribute>& other : attribute.children)
             if (other->name == added->name || other->shortName == added->shortName)

@@ -28,6 +28,13 @@ HObject attributeObject(const OpenQuarn::Field& field) {
     return Access::object(std::const_pointer_cast<OpenQuarn::Attribute>(field.attribute));
 }
 
+HStatus noAttribute(const std::shared_ptr<Node>& node, const std::shared_ptr<OpenQuarn::Attribute>& wanted) {
+    if (!node)
+        return nothingAttached();
+    return {HStatus::kNotFound,
+            "node '" + node->name() + "' has no attribute '" + (wanted ? wanted->name : std::string("(null)")) + "'"};
+}
+
 HObject createNode(const std::shared_ptr<const NodeClass>& type, const std::string& wanted, const HString& name,
                    HStatus& outcome) {
     if (type)
@@ -46,6 +53,7 @@ HFnDependencyNode::HFnDependencyNode(const HObject& node, HStatus* status) {
 
 HObject HFnDependencyNode::create(const HString& typeName, const HString& name, HStatus* status) {
     return apiValue(FaultPoint::HFnDependencyNode_create, status, HObject(), [&](HStatus& outcome) {
+        object_ = HObject();
         object_ = createNode(OpenQuarn::findNodeClass(typeName.asStdString()), "'" + typeName.asStdString() + "'", name,
                              outcome);
         return object_;
@@ -54,6 +62,7 @@ HObject HFnDependencyNode::create(const HString& typeName, const HString& name, 
 
 HObject HFnDependencyNode::create(const HTypeId& type, const HString& name, HStatus* status) {
     return apiValue(FaultPoint::HFnDependencyNode_create, status, HObject(), [&](HStatus& outcome) {
+        object_ = HObject();
         object_ = createNode(OpenQuarn::findNodeClass(type), OpenQuarn::hexText(type), name, outcome);
         return object_;
     });
@@ -117,7 +126,9 @@ HObject HFnDependencyNode::attribute(unsigned index, HStatus* status) const {
         const std::shared_ptr<Node> node = attached(object_);
         if (node && index < node->type().fields().size())
             return attributeObject(*node->type().fields()[index]);
-        outcome = {HStatus::kFailure, "there is no attribute number " + std::to_string(index)};
+        outcome = node ? HStatus(HStatus::kFailure,
+                                 "node '" + node->name() + "' has no attribute number " + std::to_string(index))
+                       : nothingAttached();
         return HObject();
     });
 }
@@ -139,7 +150,7 @@ HPlug HFnDependencyNode::findPlug(const HObject& attribute, HStatus* status) con
     return apiValue(FaultPoint::HFnDependencyNode_findPlug, status, HPlug(), [&](HStatus& outcome) {
         HPlug plug(object_, attribute);
         if (plug.isNull())
-            outcome = {HStatus::kNotFound, "the node has no such attribute"};
+            outcome = noAttribute(attached(object_), Access::as<OpenQuarn::Attribute>(attribute));
         return plug;
     });
 }

@@ -29,6 +29,8 @@ HStatus nullPlug() {
 }
 
 HStatus failed(const HPlug& plug, const std::string& what) {
+    if (plug.isNull())
+        return nullPlug();
     return {HStatus::kFailure, "'" + plug.name().asStdString() + "' " + what};
 }
 

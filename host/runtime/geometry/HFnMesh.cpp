@@ -124,7 +124,7 @@ namespace {
 
 /// The mesh that a mesh node gives, evaluated.
 HObject meshOf(OpenQuarn::Node& node, HStatus& status) {
-    OpenQuarn::requireEval("HFnMesh");
+    OpenQuarn::requireEval("HFnMesh::HFnMesh");
     const OpenQuarn::Field* field = node.type().find("outMesh");
     const auto slot = field ? dataInCurrentContext(node)->slot(*field) : nullptr;
     if (slot)
@@ -135,22 +135,26 @@ HObject meshOf(OpenQuarn::Node& node, HStatus& status) {
     return Access::object(std::move(mesh));
 }
 
-HObject meshFrom(const HObject& object, HStatus& status) {
-    if (Access::as<MeshData>(object))
-        return object;
-    const auto node = Access::as<OpenQuarn::Node>(object);
-    if (node && node->isKind(HFn::kMeshNode))
-        return meshOf(*node, status);
-    status = {HStatus::kInvalidParameter,
-              object.isNull() ? "the object is null" : "the object is neither a mesh nor a mesh node"};
-    return {};
+/// The data of a mesh node; any other object as it is.
+HObject dataOf(const HObject& object, HStatus& status) noexcept {
+    try {
+        const auto node = Access::as<OpenQuarn::Node>(object);
+        return node && node->isKind(HFn::kMeshNode) ? meshOf(*node, status) : object;
+    } catch (...) {
+        status = OpenQuarn::statusOfException("HFnMesh::HFnMesh");
+        return {};
+    }
 }
 
 } // namespace
 
 HFnMesh::HFnMesh(const HObject& mesh, HStatus* status) {
-    object_ = apiValue(FaultPoint::HFnMesh_HFnMesh, status, HObject(),
-                       [&](HStatus& outcome) { return meshFrom(mesh, outcome); });
+    HStatus outcome;
+    const HObject data = dataOf(mesh, outcome);
+    if (!outcome.error())
+        outcome = setObject(data);
+    if (status)
+        *status = outcome;
 }
 
 int HFnMesh::numVertices(HStatus* status) const {

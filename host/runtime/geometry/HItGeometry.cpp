@@ -67,6 +67,7 @@ HItGeometry::~HItGeometry() {
 }
 
 unsigned HItGeometry::index() const {
+    OpenQuarn::requireEval("HItGeometry::index");
     return isDone() ? current_ : impl_->fullIndex(current_);
 }
 

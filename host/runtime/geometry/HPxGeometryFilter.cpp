@@ -2,7 +2,6 @@
 #include "openquarn/HPxGeometryFilter.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "geometry/filterAttributes.h"
 #include "geometry/filterEvaluation.h"
 #include "graph/Context.h"
@@ -59,7 +58,6 @@ HStatus HPxGeometryFilter::deform(HDataBlock&, HItGeometry&, const HMatrix&, uns
 
 HIndexMapper HPxGeometryFilter::indexMapper(unsigned multiIndex, HStatus* status) const {
     return apiValue(FaultPoint::HPxGeometryFilter_indexMapper, status, HIndexMapper(), [&](HStatus& outcome) {
-        OpenQuarn::requireEval("HPxGeometryFilter::indexMapper");
         const auto node = Access::as<OpenQuarn::Node>(thisHObject());
         if (!node) {
             outcome = {HStatus::kInvalidParameter, "the node is none of the scene"};
@@ -82,7 +80,6 @@ HObject HPxDeformerNode::getNamedBuffer(const HString&, unsigned) {
 const float* HPxDeformerNode::envelopeWeights(HDataBlock& block, unsigned multiIndex, HStatus* status) {
     const float* none = nullptr;
     return apiValue(FaultPoint::HPxDeformerNode_envelopeWeights, status, none, [&](HStatus& outcome) {
-        OpenQuarn::requireEval("HPxDeformerNode::envelopeWeights");
         const std::shared_ptr<OpenQuarn::NodeData>& data = Access::impl(block);
         if (!data || data->isGone() || Access::pointer(thisHObject()).get() != &data->node) {
             outcome = {HStatus::kInvalidParameter, "the data block is not one of node '" + name().asStdString() + "'"};

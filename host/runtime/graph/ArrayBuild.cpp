@@ -3,30 +3,12 @@
 
 #include "graph/arrayLock.h"
 
-#include <algorithm>
-
 namespace OpenQuarn {
 namespace {
 
 std::shared_ptr<Slot> existing(const Slot& array, unsigned index) {
     const ArrayReadLock lock(array.owner);
     return array.elements.find(index);
-}
-
-void forget(std::vector<Slot*>& slots, const Slot& slot) {
-    slots.erase(std::remove(slots.begin(), slots.end(), &slot), slots.end());
-}
-
-// without telling anybody: this happens inside an evaluation
-void unlink(Slot& slot) {
-    if (slot.links) {
-        if (slot.links->source)
-            forget(slot.links->source->links->destinations, slot);
-        for (Slot* destination : slot.links->destinations)
-            destination->links->source = nullptr;
-        slot.links.reset();
-    }
-    slot.forEachPart([](Slot& part) { unlink(part); });
 }
 
 } // namespace
@@ -37,7 +19,8 @@ std::shared_ptr<Slot> ArrayBuild::add(unsigned index) {
     if (!removed.find(index))
         if (std::shared_ptr<Slot> element = existing(*array, index))
             return element;
-    auto element = std::make_shared<Slot>(array->field, array->owner, nullptr, true, index);
+    auto element = std::make_shared<Slot>(array->field, nullptr, nullptr, true, index);
+    element->keepTypeOf(*array);
     added.insert(index, element);
     return element;
 }
@@ -58,7 +41,6 @@ std::size_t ArrayBuild::size() const {
 
 void commit(ArrayBuild& build) {
     build.removed.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
-        unlink(*element);
         {
             const ArrayWriteLock lock(build.array->owner);
             build.array->elements.remove(index);

@@ -40,16 +40,24 @@ ContextScope::~ContextScope() {
     current = previous_;
 }
 
+// blocks and handles that are still held see the data as gone
+Context::~Context() {
+    for (const auto& [node, entry] : data_)
+        entry.data->bury();
+}
+
 void Context::setTime(double time) {
     time_ = time;
-    for (const auto& [node, data] : data_)
+    for (const auto& [node, entry] : data_)
         if (node->isAlive())
-            fill(*data);
+            fill(*entry.data);
 }
 
 std::shared_ptr<NodeData> Context::dataOf(Node& node) {
-    std::shared_ptr<NodeData>& data = data_[&node];
+    Entry& entry = data_[&node];
+    std::shared_ptr<NodeData>& data = entry.data;
     if (!data) {
+        entry.node = std::static_pointer_cast<Node>(node.shared_from_this());
         data = std::make_shared<NodeData>(node, this);
         for (std::size_t i = 0; i < data->slots.size(); ++i) {
             data->slots[i]->copyFrom(*node.data()->slots[i]);

@@ -17,6 +17,7 @@ class Context {
 public:
     explicit Context(double time)
         : time_(time) {}
+    ~Context();
     Context(const Context&) = delete;
     Context& operator=(const Context&) = delete;
 
@@ -28,8 +29,13 @@ public:
 private:
     void fill(NodeData& data);
 
+    struct Entry {
+        std::shared_ptr<Node> node; // kept: the data refers to it
+        std::shared_ptr<NodeData> data;
+    };
+
     double time_;
-    std::unordered_map<Node*, std::shared_ptr<NodeData>> data_;
+    std::unordered_map<const Node*, Entry> data_;
 };
 
 /// The context of the evaluation that the thread is in; null for the normal one.

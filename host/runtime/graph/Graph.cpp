@@ -91,18 +91,23 @@ std::shared_ptr<Node> Graph::createNode(const std::shared_ptr<const NodeClass>& 
         throw;
     }
     node->runPostConstructor();
+    if (!node->isAlive())
+        throw std::runtime_error("node '" + node->name() + "' was deleted while it was created");
     return node;
 }
 
 void Graph::deleteNode(Node& node) {
-    const auto entry = byName_.find(node.name());
-    if (entry == byName_.end() || entry->second.node.get() != &node)
+    const std::shared_ptr<Node> kept = find(node.name());
+    if (kept.get() != &node)
         throw std::invalid_argument("node '" + node.name() + "' is not in the scene");
     if (&node == timeNode_.get())
         throw std::invalid_argument("the time node '" + node.name() + "' cannot be deleted");
-    const std::shared_ptr<Node> kept = entry->second.node;
-    for (const std::shared_ptr<Slot>& slot : node.data()->slots)
+    const std::vector<std::shared_ptr<Slot>> slots = node.data()->slots;
+    for (const std::shared_ptr<Slot>& slot : slots)
         disconnectAll(*slot);
+    if (!node.isAlive())
+        return;                                   // who was told of a broken connection has deleted it
+    const auto entry = byName_.find(node.name()); // or has renamed it
     for (const Node::Callback& callback : node.callbacks)
         callbackNodes_.erase(callback.id);
     byOrder_.erase(entry->second.order);
@@ -156,7 +161,7 @@ void Graph::clear(double time) {
         for (const std::shared_ptr<Slot>& slot : node->data()->slots)
             unlink(unlink, *slot);
     for (auto node = all.rbegin(); node != all.rend(); ++node)
-        if (*node != timeNode_)
+        if (*node != timeNode_ && (*node)->isAlive()) // one may have deleted others
             deleteNode(**node);
     nextNumber_.clear();
     reservedNames_.clear();
@@ -216,7 +221,7 @@ void Graph::connect(Slot& source, Slot& destination, bool checkCycle) {
 
 void Graph::breakLink(Slot& source, Slot& destination) {
     std::vector<Slot*>& all = source.links->destinations;
-    all.erase(std::find(all.begin(), all.end(), &destination));
+    all.erase(std::next(std::find(all.rbegin(), all.rend(), &destination)).base()); // the last ones are broken first
     destination.links->source = nullptr;
 }
 
@@ -228,7 +233,7 @@ void Graph::disconnect(Slot& destination) {
     const std::shared_ptr<Slot> kept = destination.shared_from_this();
     breakLink(*source, destination);
     tellNodes(*source, destination, false);
-    if (destination.owner) // the plug-in may have removed it itself
+    if (destination.owner && !destination.source()) // who was told may have removed it, or connected it again
         afterDisconnect(destination);
 }
 
@@ -251,14 +256,14 @@ void Graph::tellNodes(Slot& source, Slot& destination, bool made) {
         Slot& other;
         bool isSource;
     };
-    const auto keptSource = source.owner ? source.owner->node.shared_from_this() : nullptr;
-    const auto keptDestination = destination.owner ? destination.owner->node.shared_from_this() : nullptr;
+    const std::shared_ptr<Slot> keptSource = source.shared_from_this();
+    const std::shared_ptr<Slot> keptDestination = destination.shared_from_this();
     for (const Side& side : {Side{source, destination, true}, Side{destination, source, false}}) {
         if (!side.slot.owner)
             continue;
-        Node& node = side.slot.owner->node;
-        if (HPxNode* user = node.userNode())
-            callPlugin(node, made ? "connectionMade" : "connectionBroken", [&] {
+        const auto node = std::static_pointer_cast<Node>(side.slot.owner->node.shared_from_this());
+        if (HPxNode* user = node->userNode())
+            callPlugin(*node, made ? "connectionMade" : "connectionBroken", [&] {
                 return made ? user->connectionMade(makePlug(side.slot), makePlug(side.other), side.isSource)
                             : user->connectionBroken(makePlug(side.slot), makePlug(side.other), side.isSource);
             });
@@ -274,8 +279,15 @@ void Graph::disconnectAll(Slot& slot) {
     const std::shared_ptr<Slot> kept = slot.shared_from_this();
     if (slot.source())
         disconnect(slot);
-    while (slot.hasDestinations())
-        disconnect(*slot.links->destinations.back());
+    // those of now: a plug-in that connects again does not keep us for ever
+    std::vector<std::shared_ptr<Slot>> destinations;
+    destinations.reserve(slot.links ? slot.links->destinations.size() : 0);
+    if (slot.links)
+        for (auto at = slot.links->destinations.rbegin(); at != slot.links->destinations.rend(); ++at)
+            destinations.push_back((*at)->shared_from_this());
+    for (const std::shared_ptr<Slot>& destination : destinations)
+        if (destination->source() == &slot)
+            disconnect(*destination);
     std::vector<std::shared_ptr<Slot>> parts(slot.children);
     parts.reserve(parts.size() + slot.elements.size());
     slot.elements.forEach([&](unsigned, const std::shared_ptr<Slot>& part) { parts.push_back(part); });
@@ -397,9 +409,11 @@ void Graph::removeElement(Slot& array, unsigned index) {
     const std::shared_ptr<Slot> element = array.elements.find(index);
     if (!element)
         throw std::invalid_argument("'" + array.name() + "' has no element " + std::to_string(index));
+    const std::shared_ptr<Slot> kept = array.shared_from_this();
     disconnectAll(*element);
-    if (!array.elements.remove(index))
+    if (array.elements.find(index) != element)
         return; // it went with its connection
+    array.elements.remove(index);
     propagateFrom(array);
     notify(*element, HNodeMessage::kAttributeArrayRemoved);
     element->detach();

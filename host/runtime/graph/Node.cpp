@@ -5,6 +5,7 @@
 #include "openquarn_app/Messages.h"
 
 #include <stdexcept>
+#include <utility>
 
 namespace OpenQuarn {
 namespace {
@@ -71,12 +72,13 @@ bool Node::isKind(HFn::Type type) const {
 void Node::createUserNode() {
     if (!type_->creator)
         throw std::runtime_error("node type '" + type_->name + "' cannot be created by itself");
-    constructing = std::static_pointer_cast<Node>(shared_from_this());
+    // the creator may create other nodes before its own
+    const std::shared_ptr<Node> outer = std::exchange(constructing, std::static_pointer_cast<Node>(shared_from_this()));
     const HStatus status = callPlugin(*this, "creator", [&]() -> HStatus {
         user_.reset(type_->creator());
         return HStatus::kSuccess;
     });
-    constructing = nullptr;
+    constructing = outer;
     if (!user_ || status.error())
         throw std::runtime_error("the creator of node type '" + type_->name + "' gave no node");
 }

@@ -74,7 +74,10 @@ public:
     const std::string& name() const { return name_; }
     Graph& graph() const { return graph_; }
     const NodeClass& type() const { return *type_; }
+    const std::shared_ptr<const NodeClass>& typePointer() const { return type_; }
     HPxNode* userNode() const { return user_.get(); }
+    /// For calls: what they run on stays although they delete the node.
+    const std::shared_ptr<HPxNode>& userNodePointer() const { return user_; }
     const std::shared_ptr<NodeData>& data() const { return data_; }
 
     /// Runs the creator and postConstructor(); throws std::runtime_error when the creator gives none.
@@ -94,7 +97,7 @@ private:
     std::shared_ptr<const NodeClass> type_;
     std::string name_;
     std::shared_ptr<NodeData> data_;
-    std::unique_ptr<HPxNode> user_;
+    std::shared_ptr<HPxNode> user_;
     std::atomic<bool> alive_{true};
 };
 
@@ -111,6 +114,7 @@ HStatus pluginException(const Node& node, const char* function) noexcept;
 template <class Call>
 HStatus callPlugin(const Node& node, const char* function, Call&& call) noexcept {
     try {
+        const std::shared_ptr<HPxNode> kept = node.userNodePointer();
         return call();
     } catch (...) {
         return pluginException(node, function);

@@ -12,7 +12,18 @@ namespace OpenQuarn {
 void NodeClass::add(const std::shared_ptr<Attribute>& attribute) {
     if (!attribute->parent.expired())
         throw std::invalid_argument("attribute '" + attribute->name + "' is a child: add its parent");
+    std::unordered_set<std::string> names;
+    checkNames(*attribute, names);
     fields_.push_back(makeField(attribute, nullptr, static_cast<unsigned>(fields_.size())));
+}
+
+void NodeClass::checkNames(const Attribute& attribute, std::unordered_set<std::string>& names) const {
+    const std::unordered_set<std::string> own{attribute.name, attribute.shortName};
+    for (const std::string& key : own)
+        if (byName_.count(key) != 0 || !names.insert(key).second)
+            throw std::invalid_argument("node type '" + name + "' has an attribute named '" + key + "' already");
+    for (const std::shared_ptr<Attribute>& child : attribute.children)
+        checkNames(*child, names);
 }
 
 std::unique_ptr<Field> NodeClass::makeField(const std::shared_ptr<const Attribute>& attribute, const Field* parent,
@@ -21,11 +32,8 @@ std::unique_ptr<Field> NodeClass::makeField(const std::shared_ptr<const Attribut
     field->attribute = attribute;
     field->parent = parent;
     field->position = position;
-    for (const std::string& key : {attribute->name, attribute->shortName}) {
-        const auto [place, isNew] = byName_.try_emplace(key, field.get());
-        if (!isNew && place->second != field.get())
-            throw std::invalid_argument("node type '" + name + "' has an attribute named '" + key + "' already");
-    }
+    for (const std::string& key : {attribute->name, attribute->shortName})
+        byName_[key] = field.get();
     byAttribute_[attribute.get()] = field.get();
     field->children.reserve(attribute->children.size());
     for (const std::shared_ptr<Attribute>& child : attribute->children)

@@ -8,6 +8,7 @@
 #include <memory>
 #include <string>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 namespace OpenQuarn {
@@ -55,6 +56,8 @@ private:
         bool sameElement;
     };
 
+    /// Throws std::invalid_argument when a name of the attribute or below it is taken, here or in `names`.
+    void checkNames(const Attribute& attribute, std::unordered_set<std::string>& names) const;
     std::unique_ptr<Field> makeField(const std::shared_ptr<const Attribute>& attribute, const Field* parent,
                                      unsigned position);
     Field& fieldOf(const Attribute& attribute) const;

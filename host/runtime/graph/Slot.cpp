@@ -4,6 +4,8 @@
 #include "graph/Node.h"
 #include "graph/arrayLock.h"
 
+#include <algorithm>
+
 namespace OpenQuarn {
 
 Slot::Slot(const Field& slotField, NodeData* slotOwner, Slot* slotParent, bool element, unsigned logicalIndex)
@@ -41,12 +43,18 @@ std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
 
 void Slot::adopt(const std::shared_ptr<Slot>& element) {
     element->parent = this;
+    element->attach(owner);
     {
         const ArrayWriteLock lock(owner);
         elements.insert(element->index, element);
     }
     if (field.computed)
         element->markDirty();
+}
+
+void Slot::attach(NodeData* newOwner) {
+    owner = newOwner;
+    forEachPart([newOwner](Slot& part) { part.attach(newOwner); });
 }
 
 std::shared_ptr<Slot> Slot::child(const Field& childField) const {
@@ -82,15 +90,46 @@ void Slot::copyFrom(const Slot& from) {
     });
 }
 
+namespace {
+
+void forget(std::vector<Slot*>& slots, const Slot& slot) {
+    slots.erase(std::remove(slots.begin(), slots.end(), &slot), slots.end());
+}
+
+} // namespace
+
+void Slot::unlink() {
+    if (links) {
+        if (links->source)
+            forget(links->source->links->destinations, *this);
+        for (Slot* destination : links->destinations)
+            destination->links->source = nullptr;
+        links.reset();
+    }
+    forEachPart([](Slot& part) { part.unlink(); });
+}
+
+void Slot::keepTypeOf(const Slot& like) {
+    type_ = like.owner ? like.owner->node.typePointer() : like.type_;
+    forEachPart([this](Slot& part) { part.keepTypeOf(*this); });
+}
+
 void Slot::detach() {
+    unlink();
+    cutOff();
+}
+
+void Slot::cutOff() {
+    if (owner)
+        type_ = owner->node.typePointer();
     owner = nullptr;
     parent = nullptr;
     for (const std::shared_ptr<Slot>& part : children) {
-        part->detach();
+        part->cutOff();
         part->parent = this;
     }
     elements.forEach([this](unsigned, const std::shared_ptr<Slot>& element) {
-        element->detach();
+        element->cutOff();
         element->parent = this;
     });
 }

@@ -13,6 +13,7 @@
 
 namespace OpenQuarn {
 
+class NodeClass;
 class NodeData;
 
 /// Slots form a tree for each node: the slot of an array holds its elements, the slot of a compound (or of an element
@@ -78,8 +79,12 @@ public:
     /// Takes over the values of a slot of the same kind, as a connection does; elements and children too. Data is
     /// shared.
     void copyFrom(const Slot& from);
-    /// Cuts it and everything below off from its node.
+    /// Breaks all connections here and below, without telling anybody.
+    void unlink();
+    /// Cuts it and everything below off from its node, and from what it is connected to.
     void detach();
+    /// Keeps the type of `like` for as long as this slot lives: a handle may outlive node and plug-in.
+    void keepTypeOf(const Slot& like);
 
     /// "list[3].child"
     std::string path() const;
@@ -106,11 +111,14 @@ private:
     static constexpr std::uint8_t belowBit = 2;  // something below, perhaps
     static constexpr std::uint8_t failedBit = 4; // the last compute failed
 
+    void attach(NodeData* newOwner);
+    void cutOff();
     void markDirtyBelow();
     void markCleanBelow();
     void makeChildren();
 
     std::atomic<std::uint8_t> state_{0};
+    std::shared_ptr<const NodeClass> type_; // of a slot without an owner
 };
 
 } // namespace OpenQuarn

@@ -26,7 +26,6 @@ std::shared_ptr<Plugin> pluginOf(const HFnBase& set) {
 template <class Body>
 HStatus pluginCall(const HFnBase& set, FaultPoint point, Body&& body) {
     return apiCall(point, [&]() -> HStatus {
-        OpenQuarn::requireMain(OpenQuarn::faultPointName(point));
         const std::shared_ptr<Plugin> plugin = pluginOf(set);
         if (!plugin)
             return {HStatus::kInvalidParameter, "the function set is attached to no plug-in"};
@@ -59,22 +58,27 @@ HFnPlugin::HFnPlugin(const HObject& plugin, const char* vendor, const char* vers
 HFnPlugin::~HFnPlugin() = default;
 
 HString HFnPlugin::name() const {
+    OpenQuarn::requireMain("HFnPlugin::name");
     const std::shared_ptr<Plugin> plugin = pluginOf(*this);
     return plugin ? HString(plugin->name) : HString();
 }
 HString HFnPlugin::vendor() const {
+    OpenQuarn::requireMain("HFnPlugin::vendor");
     const std::shared_ptr<Plugin> plugin = pluginOf(*this);
     return plugin ? HString(plugin->vendor()) : HString();
 }
 HString HFnPlugin::version() const {
+    OpenQuarn::requireMain("HFnPlugin::version");
     const std::shared_ptr<Plugin> plugin = pluginOf(*this);
     return plugin ? HString(plugin->version()) : HString();
 }
 HString HFnPlugin::apiVersion() const {
+    OpenQuarn::requireMain("HFnPlugin::apiVersion");
     const std::shared_ptr<Plugin> plugin = pluginOf(*this);
     return plugin ? HString(plugin->apiVersion) : HString();
 }
 HString HFnPlugin::loadPath() const {
+    OpenQuarn::requireMain("HFnPlugin::loadPath");
     const std::shared_ptr<Plugin> plugin = pluginOf(*this);
     return plugin ? HString(std::filesystem::path(plugin->path).parent_path().string()) : HString();
 }

@@ -2,7 +2,6 @@
 #include "openquarn/gpu/HGPUDeformerRegistry.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "plugins/GPUDeformers.h"
 #include "plugins/PluginTable.h"
 
@@ -27,7 +26,6 @@ Plugin& activePlugin() {
 HStatus HGPUDeformerRegistry::registerGPUDeformerCreator(const HString& nodeType, const HString& registrantId,
                                                          HGPUDeformerRegistrationInfo* info) {
     return apiCall(FaultPoint::HGPUDeformerRegistry_registerGPUDeformerCreator, [&]() -> HStatus {
-        OpenQuarn::requireMain("HGPUDeformerRegistry::registerGPUDeformerCreator");
         if (nodeType.isEmpty() || registrantId.isEmpty() || !info)
             return {HStatus::kInvalidParameter, "a GPU deformer needs a node type, a registrant and an object: '" +
                                                     nodeType.asStdString() + "', '" + registrantId.asStdString() + "'"};
@@ -38,7 +36,6 @@ HStatus HGPUDeformerRegistry::registerGPUDeformerCreator(const HString& nodeType
 
 HStatus HGPUDeformerRegistry::deregisterGPUDeformerCreator(const HString& nodeType, const HString& registrantId) {
     return apiCall(FaultPoint::HGPUDeformerRegistry_deregisterGPUDeformerCreator, [&]() -> HStatus {
-        OpenQuarn::requireMain("HGPUDeformerRegistry::deregisterGPUDeformerCreator");
         std::string registrant;
         OpenQuarn::findGPUDeformer(nodeType.asStdString(), &registrant);
         if (registrantId != HString(registrant))

@@ -49,16 +49,26 @@ std::string printable(std::string text) {
 
 } // namespace
 
-Library::Library(const std::string& path)
-    : handle_(dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL)) {
+Library::Library(std::string path)
+    : path_(std::move(path))
+    , handle_(dlopen(path_.c_str(), RTLD_NOW | RTLD_LOCAL)) {
     if (!handle_)
         throw std::runtime_error("it cannot be opened as a library: " + loaderError());
     dlinfo(handle_, RTLD_DI_LINKMAP, &record_);
 }
 
 Library::~Library() {
-    if (handle_)
-        dlclose(handle_);
+    close();
+}
+
+bool Library::close() {
+    if (!handle_)
+        return true;
+    dlclose(std::exchange(handle_, nullptr));
+    void* const present = dlopen(path_.c_str(), RTLD_NOW | RTLD_NOLOAD);
+    if (present)
+        dlclose(present);
+    return !present;
 }
 
 void* Library::symbol(const char* name) const {

@@ -6,12 +6,13 @@
 
 namespace OpenQuarn {
 
-/// Closes the library when it goes.
 class Library {
 public:
     /// `path` absolute. Throws std::runtime_error with the loader's reason.
-    explicit Library(const std::string& path);
-    ~Library();
+    explicit Library(std::string path);
+    ~Library(); ///< closes it
+    /// False when it stays mapped nevertheless.
+    bool close();
     Library(const Library&) = delete;
     Library& operator=(const Library&) = delete;
 
@@ -23,6 +24,7 @@ public:
     void keep() { handle_ = nullptr; }
 
 private:
+    std::string path_;
     void* handle_;
     void* record_ = nullptr; // the loader's, of this library
 };

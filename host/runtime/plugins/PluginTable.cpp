@@ -36,6 +36,18 @@ std::string listed(const std::vector<Registration>& registrations) {
     return text;
 }
 
+std::size_t removeCallbacksInto(const Library& library) {
+    Graph* const graph = Graph::current();
+    std::vector<HCallbackId> found;
+    for (const std::shared_ptr<Node>& node : graph ? graph->nodes() : std::vector<std::shared_ptr<Node>>())
+        for (const Node::Callback& callback : node->callbacks)
+            if (library.contains(reinterpret_cast<const void*>(callback.function)))
+                found.push_back(callback.id);
+    for (const HCallbackId id : found)
+        graph->removeCallback(id);
+    return found.size();
+}
+
 [[noreturn]] void refuseLoading(const std::string& what, const std::string& why) {
     throw std::runtime_error("plug-in '" + what + "' cannot be loaded: " + why);
 }
@@ -135,14 +147,23 @@ void PluginTable::start(Loaded loaded) {
 
 // The last step: nothing of the host leads into the plug-in any more, or its library stays where it is.
 void PluginTable::retire(Loaded& loaded) const {
+    const std::string name = "plug-in '" + loaded.plugin->name + "'";
     loaded.plugin->bury();
-    const std::vector<Registration>& left = loaded.plugin->registrations();
-    if (loaded.library && !left.empty()) {
-        showMessage(Severity::warning, "the library of plug-in '" + loaded.plugin->name + "' stays mapped, since " +
-                                           listed(left) + " is still in use: " + loaded.plugin->users());
+    if (!loaded.library)
+        return;
+    if (const std::size_t callbacks = removeCallbacksInto(*loaded.library))
+        showMessage(Severity::warning,
+                    name + " left " + std::to_string(callbacks) + " callbacks on nodes, which the host took away");
+    const std::string users = loaded.plugin->users();
+    if (!users.empty()) {
+        showMessage(Severity::warning, "the library of " + name + " stays mapped: there are still " + users);
         loaded.library->keep();
+    } else if (!loaded.library->close()) {
+        showMessage(Severity::warning,
+                    "the library of " + name +
+                        " stays mapped, and loading it again will not see a "
+                        "changed file: it was not built with openquarn_plugin(), or is in use elsewhere");
     }
-    loaded.library.reset();
 }
 
 void PluginTable::refuseInUse(const Plugin& plugin) {
@@ -168,9 +189,9 @@ void PluginTable::unload(const std::string& name) {
     } catch (const std::exception& error) {
         throw std::runtime_error("plug-in '" + name + "' cannot be unloaded: " + error.what());
     }
-    const auto current = placeOf(name); // it may have loaded another meanwhile
-    Loaded loaded = std::move(*current);
-    loaded_.erase(current);
+    const Place now = placeOf(name); // it may have loaded another meanwhile
+    Loaded loaded = std::move(*now);
+    loaded_.erase(now);
     const std::vector<Registration> left = loaded.plugin->removeAll();
     if (!left.empty())
         showMessage(Severity::warning,

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn_app/Animation.h"
 
+#include "core/threads.h"
 #include "openquarn/HAnimControl.h"
 #include "openquarn/HDGContext.h"
 #include "services/AnimationState.h"
@@ -52,6 +53,7 @@ bool HAnimControl::isScrubbing() noexcept {
 }
 
 HTime HAnimControl::currentTime() noexcept {
+    OpenQuarn::requireEval("HAnimControl::currentTime");
     return HTime(HDGContext().time());
 }
 

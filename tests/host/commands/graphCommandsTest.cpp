@@ -299,7 +299,7 @@ HStatus initializeHolder() {
     return HPxNode::addAttribute(store);
 }
 
-HStatus registerHolder(HObject object) {
+HStatus registerHolder(HObject object) { // NOLINT(performance-unnecessary-value-param): as the host calls it
     HFnPlugin plugin(object);
     const HStatus status = plugin.registerData("testCounted", countedId, []() -> HPxData* { return new Counted; });
     return status.error() ? status
@@ -307,7 +307,7 @@ HStatus registerHolder(HObject object) {
                                 "testHolder", holderId, []() -> HPxNode* { return new HPxNode; }, initializeHolder);
 }
 
-HStatus deregisterHolder(HObject object) {
+HStatus deregisterHolder(HObject object) { // NOLINT(performance-unnecessary-value-param): as the host calls it
     HFnPlugin plugin(object);
     const HStatus status = plugin.deregisterNode(holderId);
     return status.error() ? status : plugin.deregisterData(countedId);
@@ -339,8 +339,10 @@ TEST_F(GraphCommands, DuplicateHasPluginsCopyTheirData) {
 
     EXPECT_THAT(print("loadPlugin -query"), HasSubstr("holders"));
     EXPECT_THAT(error("unloadPlugin holders"), HasSubstr("unloadPlugin: "));
+    print("deleteNode h g; unloadPlugin holders");
     expectErrors({
-        {"unloadPlugin nope", "nope"},
+        {"createNode testHolder", "there is no node type 'testHolder'"},
+        {"unloadPlugin holders", "holders"},
         {"loadPlugin /no/such/plugin.so", "/no/such/plugin.so"},
         {"loadPlugin", "argument 1 (text) is missing"},
     });

@@ -18,6 +18,7 @@ struct FaultRow {
 
 // by family, each in a file of its own
 std::vector<FaultRow> commandsRows();
+std::vector<FaultRow> geometryRows();
 std::vector<FaultRow> graphRows();
 std::vector<FaultRow> pluginsRows();
 std::vector<FaultRow> servicesRows();

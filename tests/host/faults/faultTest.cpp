@@ -18,7 +18,8 @@ using OpenQuarn::Faults;
 
 std::vector<FaultRow> allRows() {
     std::vector<FaultRow> rows;
-    for (const auto& family : {commandsRows(), graphRows(), pluginsRows(), servicesRows(), valuesRows()})
+    for (const auto& family :
+         {commandsRows(), geometryRows(), graphRows(), pluginsRows(), servicesRows(), valuesRows()})
         rows.insert(rows.end(), family.begin(), family.end());
     return rows;
 }

@@ -52,7 +52,7 @@ function declare(text,    name, before, kind, current, isVirtual) {
     sub(/\(.*/, "", before)
     if (before ~ /operator|~|=/)
         return
-    isVirtual = before ~ /(^| )virtual /
+    isVirtual = before ~ /(^| )virtual / || text ~ /\) (const )?override/
     name = before
     sub(/.*[ *&]/, "", name)
     if (name == "")

@@ -1,0 +1,80 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/commands.h"
+
+#include "openquarn_app/SceneFile.h"
+
+#include <rapidjson/prettywriter.h>
+#include <rapidjson/stringbuffer.h>
+
+#include <iostream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+using OpenQuarn::SceneSummary;
+using Writer = rapidjson::PrettyWriter<rapidjson::StringBuffer>;
+
+void writeText(Writer& writer, const std::string& text) {
+    writer.String(text.data(), static_cast<rapidjson::SizeType>(text.size()));
+}
+
+void writeTexts(Writer& writer, const char* key, const std::vector<std::string>& texts) {
+    writer.Key(key);
+    writer.StartArray();
+    for (const std::string& text : texts)
+        writeText(writer, text);
+    writer.EndArray();
+}
+
+void printJson(const SceneSummary& summary) {
+    rapidjson::StringBuffer buffer;
+    Writer writer(buffer);
+    writer.StartObject();
+    writer.Key("version");
+    writer.Int(summary.version);
+    writer.Key("writtenBy");
+    writeText(writer, summary.writtenBy);
+    writer.Key("bytes");
+    writer.Uint64(summary.bytes);
+    writer.Key("time");
+    writer.Double(summary.time);
+    writer.Key("nodes");
+    writer.Uint64(summary.nodes);
+    writer.Key("connections");
+    writer.Uint64(summary.connections);
+    writer.Key("nodesByType");
+    writer.StartObject();
+    for (const auto& [type, count] : summary.nodesByType) {
+        writeText(writer, type);
+        writer.Uint64(count);
+    }
+    writer.EndObject();
+    writeTexts(writer, "plugins", summary.plugins);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void printText(const SceneSummary& summary) {
+    std::cout << "format version " << summary.version << ", written by " << summary.writtenBy << ", " << summary.bytes
+              << " bytes\ntime " << summary.time << '\n'
+              << summary.nodes << " nodes, " << summary.connections << " connections\n";
+    for (const auto& [type, count] : summary.nodesByType)
+        std::cout << "  " << count << ' ' << (type.empty() ? "without a type" : type) << '\n';
+    for (const std::string& plugin : summary.plugins)
+        std::cout << "needs plug-in " << plugin << '\n';
+}
+
+} // namespace
+
+void showInfo(const std::string& scene, bool json) {
+    const SceneSummary summary = OpenQuarn::readSummary(scene);
+    if (!summary.outcome)
+        throw std::runtime_error(summary.outcome.error);
+    if (json)
+        printJson(summary);
+    else
+        printText(summary);
+}
+
+} // namespace quarn
