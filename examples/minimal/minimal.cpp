@@ -23,7 +23,7 @@ constexpr HTypeId remapId{0x6d000002};
 // For the functions that make attributes: the first step that fails is the answer.
 HStatus addAttributes(std::initializer_list<HObject> attributes) {
     for (const HObject& attribute : attributes)
-        if (const HStatus status = HPxNode::addAttribute(attribute); status.error())
+        if (HStatus status = HPxNode::addAttribute(attribute); status.error())
             return status;
     return HStatus::kSuccess;
 }

@@ -114,7 +114,7 @@ HStatus pluginException(const Node& node, const char* function) noexcept;
 template <class Call>
 HStatus callPlugin(const Node& node, const char* function, Call&& call) noexcept {
     try {
-        const std::shared_ptr<HPxNode> kept = node.userNodePointer();
+        [[maybe_unused]] const std::shared_ptr<HPxNode> kept(node.userNodePointer()); // it may delete its own node
         return call();
     } catch (...) {
         return pluginException(node, function);

@@ -12,14 +12,14 @@ namespace OpenQuarn {
 /// Held while a parallel evaluation runs; without one, the locks below cost a load and a branch.
 class ParallelSection {
 public:
-    ParallelSection() { ++running_; }
-    ~ParallelSection() { --running_; }
+    ParallelSection() { ++running; }
+    ~ParallelSection() { --running; }
     ParallelSection(const ParallelSection&) = delete;
     ParallelSection& operator=(const ParallelSection&) = delete;
-    static bool isRunning() { return running_.load(std::memory_order_relaxed) > 0; }
+    static bool isRunning() { return running.load(std::memory_order_relaxed) > 0; }
 
 private:
-    static inline std::atomic<int> running_{0};
+    static inline std::atomic<int> running{0};
 };
 
 class ArrayReadLock {

@@ -4,6 +4,7 @@
 #include "host/support/recordScene.h"
 
 #include "openquarn/HFnMesh.h"
+#include "openquarn_app/SceneFile.h"
 
 #include <atomic>
 #include <cmath>
@@ -68,6 +69,26 @@ TEST_F(RecordTest, IsAsItSays) {
     EXPECT_EQ(deformer("firstDeformer").indexMapper(1).affectCount(), 8008U);
     EXPECT_FALSE(deformer("secondDeformer").indexMapper(1).isIdentityMap());
     EXPECT_TRUE(deformer("secondDeformer").indexMapper(4).isIdentityMap());
+}
+
+TEST_F(RecordTest, ComesBackFromItsFileWithTheSameBits) {
+    Hooks::deform = twist;
+    const recordScene::Scene scene = recordScene::build("testDeformer", "testDeformer");
+    plug("firstDeformer.envelope").setDouble(0.1);
+    EXPECT_EQ(text(OpenQuarn::evaluate(scene.outputs, true)), "");
+    const auto before = results(scene);
+    std::vector<std::string> names;
+    for (const HPlug& output : scene.outputs)
+        names.push_back(output.name().asStdString());
+
+    std::string saved, savedAgain;
+    ASSERT_EQ(OpenQuarn::sceneToText(saved).error, "");
+    session.newScene();
+    ASSERT_EQ(OpenQuarn::sceneFromText(saved, "record").error, "");
+    for (std::size_t i = 0; i < names.size(); ++i)
+        expectSameBits(testDeformers::points(plug(names[i])), before[i]);
+    ASSERT_EQ(OpenQuarn::sceneToText(savedAgain).error, "");
+    EXPECT_TRUE(saved == savedAgain);
 }
 
 TEST_F(RecordTest, ThreadsGiveTheSameBitsAsOne) {
