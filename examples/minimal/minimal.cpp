@@ -63,7 +63,7 @@ public:
                            distance * block.inputValue(directionY).asDouble(),
                            distance * block.inputValue(directionZ).asDouble());
         HStatus status;
-        const float* weights = envelopeWeights(block, multiIndex, &status); // null: all are 1
+        const float* weightOf = envelopeWeights(block, multiIndex, &status); // null: all are 1
         if (status.error())
             return status;
         HPointArray points; // not a member: several geometries may be deformed at the same time
@@ -71,7 +71,7 @@ public:
         if (status.error())
             return status;
         for (unsigned i = 0; i < points.length(); ++i)
-            points[i] += weights ? step * static_cast<double>(weights[i]) : step;
+            points[i] += weightOf ? step * static_cast<double>(weightOf[i]) : step;
         return vertices.setAllPositions(points);
     }
 };

@@ -17,22 +17,22 @@ expect() {
     bad=1
   fi
 }
-fits() { if [[ $1 ]]; then grep -Eqz "$1" "$2"; else [[ ! -s $2 ]]; fi; }
+fits() { if [[ $1 ]]; then [[ $(<"$2") =~ $1 ]]; else [[ ! -s $2 ]]; fi; }
 
 : >"$work/in"
-expect 0 '^lift\n0\.2\npush\n0\.4\n2\n$' 'lift is one of mine' exec --plugin "$plugin" "$script"
+expect 0 $'^lift\n0\\.2\npush\n0\\.4\n2$' 'lift is one of mine' exec --plugin "$plugin" "$script"
 expect 1 '' 'quarn: .*line 4: createNode: .*minimalRemap' exec "$script"
 expect 1 '' 'plug-in .*/none\.so. cannot be loaded: there is no such file' exec --plugin /none.so "$script"
 expect 1 '' 'none\.txt' exec /none.txt
 expect 0 'exec.*info' '' --help
-expect 0 '^quarn [0-9.]+\n$' '' --version
+expect 0 '^quarn [0-9.]+$' '' --version
 
 echo 'createNode' >"$work/in"
 expect 1 '' 'standard input, line 1: createNode' exec -
-echo "createNode minimalRemap -name kept; file -save $work/scene.json" >"$work/in"
+echo "createNode minimalRemap -name kept; file -saveAs $work/scene.json" >"$work/in"
 expect 0 'kept' '' exec --plugin "$plugin" -
 : >"$work/in"
-expect 0 '1 minimalRemap\n' '' info "$work/scene.json"
+expect 0 $'\n  1 minimalRemap\n' '' info "$work/scene.json"
 expect 0 '"minimalRemap": 1' '' info --json "$work/scene.json"
 expect 1 '' 'quarn: .*none\.json' info /none.json
 
