@@ -13,6 +13,7 @@
 #include "openquarn/HPxNode.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Plugins.h"
+#include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Session.h"
 
 #include <exception>
@@ -150,6 +151,45 @@ std::function<void()> fillArray(std::size_t size, std::size_t times, Order order
     };
 }
 
+/// The text of a scene that is a chain of nodes, or one node with an array.
+std::string sceneText(OpenQuarn::Session& session, std::size_t nodes, std::size_t elements) {
+    session.newScene();
+    std::string text;
+    {
+        const Chain chain(nodes);
+        const HPlug array = HFnDependencyNode(chain.ins.front().node()).findPlug("ins");
+        for (std::size_t i = 0; i < elements; ++i)
+            check(array.elementByLogicalIndex(static_cast<unsigned>(3 * i))
+                      .setDouble(1.0 / (1.0 + static_cast<double>(i))));
+        if (const auto outcome = OpenQuarn::sceneToText(text); !outcome)
+            throw std::runtime_error(outcome.error);
+    }
+    return text;
+}
+
+// reads a scene and writes it again, `times` over
+std::function<void()> readAndWrite(std::string text, std::size_t times) {
+    return [text = std::move(text), times] {
+        std::string again;
+        for (std::size_t i = 0; i < times; ++i) {
+            if (!OpenQuarn::sceneFromText(text, "bench") || !OpenQuarn::sceneToText(again) || again != text)
+                throw std::runtime_error("the scene did not come back");
+        }
+    };
+}
+
+void measureFiles(OpenQuarn::Session& session, const bench::Options& options, bench::Report& report) {
+    const std::vector<Phase> phases = {
+        growth("read and write", "10 000 nodes", 10000, readAndWrite(sceneText(session, 10000, 0), 1),
+               readAndWrite(sceneText(session, 1000, 0), 10)),
+        growth("read and write array", "100 000", 100000, readAndWrite(sceneText(session, 1, 100000), 1),
+               readAndWrite(sceneText(session, 1, 10000), 10)),
+    };
+    for (const Phase& phase : phases)
+        if (phase.name.rfind(options.only, 0) == 0)
+            report.add(bench::measure(phase, 1, options.seconds));
+}
+
 void runAll(const bench::Options& options, bench::Report& report) {
     const Chain small(100);
     const Chain medium(1000);
@@ -177,11 +217,12 @@ int main(int argc, char** argv) {
     if (!options)
         return 2;
     try {
-        const OpenQuarn::Session session;
+        OpenQuarn::Session session;
         OpenQuarn::addPlugin("bench", initializePlugin, uninitializePlugin);
         bench::Report report(options->csv.get());
         report.header();
         runAll(*options, report);
+        measureFiles(session, *options, report);
         bench::Report::legend("the same number of units in a small scene");
         std::printf("CSV: %s\n", options->csvPath.c_str());
         return 0;
