@@ -13,10 +13,7 @@ function(openquarn_plugin target)
     CXX_VISIBILITY_PRESET hidden
     VISIBILITY_INLINES_HIDDEN ON
     LINK_DEPENDS "${_openquarn_plugin_exports}")
-  # the entry points are found by their C names, and answer with a class: Clang warns of that
-  target_compile_options(${target} PRIVATE
-    $<$<CXX_COMPILER_ID:GNU>:-fno-gnu-unique>
-    $<$<CXX_COMPILER_ID:Clang,AppleClang>:-Wno-return-type-c-linkage>)
+  target_compile_options(${target} PRIVATE $<$<CXX_COMPILER_ID:GNU>:-fno-gnu-unique>)
   target_link_options(${target} PRIVATE "LINKER:--version-script=${_openquarn_plugin_exports}")
   target_link_libraries(${target} PRIVATE OpenQuarn::OpenQuarn)
 endfunction()
