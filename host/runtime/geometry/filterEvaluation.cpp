@@ -94,8 +94,8 @@ private:
     HStatus initialize(GeometrySources now) {
         if (state_->isStale(now)) {
             state_->notInitialized();
-            const HStatus status = callPlugin(data_.node, "initializeMultiIndex",
-                                              [&] { return filter_.initializeMultiIndex(block_, index_, true); });
+            HStatus status = callPlugin(data_.node, "initializeMultiIndex",
+                                        [&] { return filter_.initializeMultiIndex(block_, index_, true); });
             if (status.error())
                 return status;
         }
@@ -105,7 +105,7 @@ private:
 
     HStatus deform(GeometryPoints& points) {
         const OutsideOfGraph outside;
-        HItGeometry iterator = Access::make<HItGeometry>(points);
+        auto iterator = Access::make<HItGeometry>(points);
         return callPlugin(data_.node, "deform", [&] { return filter_.deform(block_, iterator, HMatrix(), index_); });
     }
 

@@ -82,7 +82,7 @@ std::shared_ptr<Node> Graph::createNode(const std::shared_ptr<const NodeClass>& 
     if (!type->creator)
         throw std::invalid_argument("node type '" + type->name + "' cannot be created by itself");
     const bool asGiven = !name.empty() && !isTaken(name);
-    const auto node = std::make_shared<Node>(*this, type, asGiven ? name : freeName(name.empty() ? type->name : name));
+    auto node = std::make_shared<Node>(*this, type, asGiven ? name : freeName(name.empty() ? type->name : name));
     insert(node);
     try {
         node->createUserNode();
@@ -151,7 +151,7 @@ std::size_t Graph::nodeCount(const NodeClass& type) const {
 }
 
 void Graph::clear(double time) {
-    const std::vector<std::shared_ptr<Node>> all = nodes();
+    std::vector<std::shared_ptr<Node>> all = nodes();
     // connections first, all at once: nobody is told, since nobody is left to tell
     const auto unlink = [](auto&& self, Slot& slot) -> void {
         slot.links.reset();
@@ -160,9 +160,10 @@ void Graph::clear(double time) {
     for (const std::shared_ptr<Node>& node : all)
         for (const std::shared_ptr<Slot>& slot : node->data()->slots)
             unlink(unlink, *slot);
-    for (auto node = all.rbegin(); node != all.rend(); ++node)
-        if (*node != timeNode_ && (*node)->isAlive()) // one may have deleted others
-            deleteNode(**node);
+    std::reverse(all.begin(), all.end());
+    for (const std::shared_ptr<Node>& node : all)
+        if (node != timeNode_ && node->isAlive()) // one may have deleted others
+            deleteNode(*node);
     nextNumber_.clear();
     reservedNames_.clear();
     keptFileContent.reset();
@@ -283,8 +284,9 @@ void Graph::disconnectAll(Slot& slot) {
     std::vector<std::shared_ptr<Slot>> destinations;
     destinations.reserve(slot.links ? slot.links->destinations.size() : 0);
     if (slot.links)
-        for (auto at = slot.links->destinations.rbegin(); at != slot.links->destinations.rend(); ++at)
-            destinations.push_back((*at)->shared_from_this());
+        for (Slot* destination : slot.links->destinations)
+            destinations.push_back(destination->shared_from_this());
+    std::reverse(destinations.begin(), destinations.end());
     for (const std::shared_ptr<Slot>& destination : destinations)
         if (destination->source() == &slot)
             disconnect(*destination);

@@ -98,7 +98,7 @@ void Node::bury() {
 }
 
 HStatus pluginException(const Node& node, const char* function) noexcept {
-    const HStatus status = statusOfException(function);
+    HStatus status = statusOfException(function);
     try {
         showMessage(Severity::error, node.name() + ": " + status.errorString().asStdString());
     } catch (...) {

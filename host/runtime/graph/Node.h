@@ -114,7 +114,9 @@ HStatus pluginException(const Node& node, const char* function) noexcept;
 template <class Call>
 HStatus callPlugin(const Node& node, const char* function, Call&& call) noexcept {
     try {
-        [[maybe_unused]] const std::shared_ptr<HPxNode> kept(node.userNodePointer()); // it may delete its own node
+        // it may delete its own node
+        // NOLINTNEXTLINE(performance-unnecessary-copy-initialization)
+        const std::shared_ptr<HPxNode> kept(node.userNodePointer());
         return call();
     } catch (...) {
         return pluginException(node, function);

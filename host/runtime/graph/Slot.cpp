@@ -36,7 +36,7 @@ std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
         if (std::shared_ptr<Slot> existing = elements.find(logicalIndex))
             return existing;
     }
-    const auto element = std::make_shared<Slot>(field, owner, this, true, logicalIndex);
+    auto element = std::make_shared<Slot>(field, owner, this, true, logicalIndex);
     adopt(element);
     return element;
 }

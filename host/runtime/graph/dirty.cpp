@@ -26,7 +26,7 @@ public:
     void start(Slot& slot) { queue_.push_back(&slot); }
 
     void run() {
-        for (std::size_t next = 0; next < queue_.size(); ++next)
+        for (std::size_t next = 0; next < queue_.size(); ++next) // NOLINT(modernize-loop-convert): it grows meanwhile
             visit(*queue_[next]);
     }
 

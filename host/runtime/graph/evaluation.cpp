@@ -74,7 +74,7 @@ HStatus runCompute(Node& node, NodeData& data, const Slot& slot) {
     node.graph().recordCompute(slot);
     const ContextScope context(data.context);
     HPlug plug = makePlug(slot);
-    HDataBlock block = Access::make<HDataBlock>(data.shared_from_this());
+    auto block = Access::make<HDataBlock>(data.shared_from_this());
     HStatus status;
     // a parallel loop of the plug-in must not pick up the evaluation of another geometry while it waits
     tbb::this_task_arena::isolate(

@@ -94,7 +94,7 @@ bool servesApiVersion(const std::string& required) {
 }
 
 std::string checkedApiVersion(const char* version) {
-    const std::string text(version, std::find(version, version + versionLength, '\0'));
+    std::string text(version, std::find(version, version + versionLength, '\0'));
     if (!servesApiVersion(text))
         throw std::runtime_error("it was built for version '" + printable(text) + "' of the H-API, and this host has " +
                                  hostApiVersion());

@@ -17,7 +17,7 @@ namespace fs = std::filesystem;
 
 fs::path existingFile(const std::string& path) {
     std::error_code error;
-    const fs::path whole = fs::canonical(path, error);
+    fs::path whole = fs::canonical(path, error);
     if (error)
         throw std::runtime_error("there is no such file: " + error.message());
     if (!fs::is_regular_file(whole, error))
@@ -91,7 +91,7 @@ void PluginTable::refuseTaken(const std::string& name, const std::string& path) 
 std::string PluginTable::load(const std::string& path) {
     try {
         const fs::path whole = existingFile(path);
-        const std::string name = whole.stem().string();
+        std::string name = whole.stem().string();
         const std::shared_ptr<Plugin> present = find(name);
         if (present && present->path == whole.string())
             return name;
@@ -189,7 +189,7 @@ void PluginTable::unload(const std::string& name) {
     } catch (const std::exception& error) {
         throw std::runtime_error("plug-in '" + name + "' cannot be unloaded: " + error.what());
     }
-    const Place now = placeOf(name); // it may have loaded another meanwhile
+    const auto now = placeOf(name); // it may have loaded another meanwhile
     Loaded loaded = std::move(*now);
     loaded_.erase(now);
     const std::vector<Registration> left = loaded.plugin->removeAll();

@@ -26,7 +26,7 @@ GraphRig* current = nullptr;
 
 HObject makeList(const char* longName, const char* shortName) {
     HFnNumericAttribute numeric;
-    const HObject made = numeric.create(longName, shortName, HFnNumericData::kDouble);
+    HObject made = numeric.create(longName, shortName, HFnNumericData::kDouble);
     numeric.setArray(true);
     numeric.setUsesArrayDataBuilder(true);
     return made;
@@ -54,7 +54,7 @@ HStatus initializeRowNode() {
     makeAttributes();
     for (const HObject& attribute :
          {RowNode::number, RowNode::text, RowNode::matrix, RowNode::list, RowNode::group, RowNode::out})
-        if (const HStatus status = HPxNode::addAttribute(attribute); status.error())
+        if (HStatus status = HPxNode::addAttribute(attribute); status.error())
             return status;
     return HPxNode::attributeAffects(RowNode::number, RowNode::out);
 }

@@ -19,11 +19,14 @@ protected:
             OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) { messages_.push_back(message.text); });
         fileNodes::registerTypes();
     }
+
+public:
     ~FileTest() override {
         EXPECT_THAT(messages_, ::testing::IsEmpty());
         OpenQuarn::setMessageSink(std::move(previous_));
     }
 
+protected:
     std::vector<std::string> takeMessages() { return std::exchange(messages_, {}); }
 
     std::string saved() {
@@ -36,7 +39,7 @@ protected:
     std::vector<std::string> read(const std::string& text) {
         const OpenQuarn::FileOutcome outcome = OpenQuarn::sceneFromText(text, "file");
         EXPECT_EQ(outcome.ok, outcome.error.empty());
-        const std::vector<std::string> all = outcome.ok ? outcome.warnings : std::vector<std::string>{outcome.error};
+        std::vector<std::string> all = outcome.ok ? outcome.warnings : std::vector<std::string>{outcome.error};
         EXPECT_EQ(takeMessages(), all) << "what goes to the sink is what is returned";
         return all;
     }

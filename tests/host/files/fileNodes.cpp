@@ -68,7 +68,7 @@ HObject arrayOf(const HObject& attribute) {
 }
 HObject compound(const char* name, const std::vector<HObject>& children) {
     HFnCompoundAttribute set;
-    const HObject made = set.create(name, name);
+    HObject made = set.create(name, name);
     for (const HObject& child : children)
         set.addChild(child);
     return made;
@@ -203,7 +203,7 @@ void connect(const std::string& source, const std::string& destination) {
 
 HObject makeData(const std::string& text) {
     HFnPluginData set;
-    const HObject object = set.create(dataId);
+    HObject object = set.create(dataId);
     static_cast<FileData*>(set.data())->text = text;
     return object;
 }

@@ -15,7 +15,6 @@ using testDeformers::grid;
 using testDeformers::Hooks;
 using testDeformers::meshNode;
 using testDeformers::withTag;
-using ::testing::Each;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;

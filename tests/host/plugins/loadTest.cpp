@@ -60,8 +60,11 @@ class Loading : public testing::Test {
 protected:
     Loading()
         : previous_(setMessageSink([this](const Message& message) { messages_.push_back(message.text); })) {}
+
+public:
     ~Loading() override { setMessageSink(previous_); }
 
+protected:
     void expectNothingLeft() {
         EXPECT_THAT(loadedPlugins(), IsEmpty());
         EXPECT_EQ(session_.nodeCount(), 1U);

@@ -25,16 +25,18 @@ protected:
         testNodes::registerTypes();
     }
 
+public:
     ~SceneTest() override {
         EXPECT_THAT(messages_, ::testing::IsEmpty());
         OpenQuarn::Faults::clear();
         OpenQuarn::setMessageSink(std::move(previous_));
     }
 
+    OpenQuarn::Session session;
+
+protected:
     /// What was shown since the last call, as "severity: text".
     std::vector<std::string> takeMessages() { return std::exchange(messages_, {}); }
-
-    OpenQuarn::Session session;
 
 private:
     std::vector<std::string> messages_;

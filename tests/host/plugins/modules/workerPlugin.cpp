@@ -43,7 +43,7 @@ HStatus initialize() {
     total = output.create("total", "t", HFnNumericData::kInt);
     output.setWritable(false);
     for (const HObject& attribute : {count, total})
-        if (const HStatus status = HPxNode::addAttribute(attribute); status.error())
+        if (HStatus status = HPxNode::addAttribute(attribute); status.error())
             return status;
     return HPxNode::attributeAffects(count, total);
 }
