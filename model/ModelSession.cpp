@@ -7,6 +7,7 @@
 #include <cstring>
 #include <exception>
 #include <limits>
+#include <mutex>
 #include <optional>
 #include <stdexcept>
 #include <system_error>
@@ -144,11 +145,37 @@ void printUnsupportedType() {
     std::fputs("[NEURAL WARP] WARNING, unsupported ml model type\n", stdout);
 }
 
+/// An environment of the runtime. All of them stand for one object of the process, which the runtime takes down with
+/// the last: it fails to make a new one while another thread is doing that, so the two take turns.
+class Environment {
+public:
+    Environment() = default;
+    ~Environment() {
+        const std::scoped_lock lock(turn());
+        env_.reset();
+    }
+    Environment(const Environment&) = delete;
+    Environment& operator=(const Environment&) = delete;
+
+    void renew() {
+        const std::scoped_lock lock(turn());
+        env_.emplace(ORT_LOGGING_LEVEL_WARNING, logIdentifier());
+    }
+    const Ort::Env& get() const { return *env_; }
+
+private:
+    static std::mutex& turn() {
+        static std::mutex mutex;
+        return mutex;
+    }
+    std::optional<Ort::Env> env_;
+};
+
 } // namespace
 
 /// What is held of ONNX Runtime. The names go before the allocator, the session before its environment.
 struct ModelSession::Runtime {
-    std::optional<Ort::Env> env;
+    Environment env;
     std::optional<Ort::Session> session;
     std::optional<Ort::AllocatorWithDefaultOptions> allocator; // absent when the runtime is too old
     TensorInfo input;
@@ -162,10 +189,10 @@ void ModelSession::Runtime::build(const std::filesystem::path& path) {
     if (!allocator) {
         throw std::runtime_error("ONNX Runtime is older than version 1.16");
     }
-    env.emplace(ORT_LOGGING_LEVEL_WARNING, logIdentifier());
+    env.renew();
     Ort::SessionOptions options;
     options.SetGraphOptimizationLevel(ORT_ENABLE_ALL);
-    Ort::Session fresh(*env, path.c_str(), options);
+    Ort::Session fresh(env.get(), path.c_str(), options);
     TensorInfo freshInput = readInput(fresh, *allocator);
     output = readOutput(fresh, *allocator, freshInput.name->get());
     input = std::move(freshInput);
