@@ -2,6 +2,7 @@
 // What the three nodes have in common: their attributes, their profile, the way from matrices to control values.
 #include "controls/ControlsTest.h"
 
+#include "controls/guard.h"
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HNodeClass.h"
@@ -12,6 +13,8 @@
 #include <rapidjson/istreamwrapper.h>
 
 #include <fstream>
+#include <functional>
+#include <stdexcept>
 
 namespace {
 
@@ -105,6 +108,21 @@ TEST_F(ControlNodes, AttributesAreTheOnesThatScenesRelyOn) {
                     names);
         run("deleteNode n");
     }
+}
+
+TEST_F(ControlNodes, NothingIsThrownAtTheHost) {
+    const HPxNode& node = *HFnDependencyNode(testNodes::create("controlCollector", "c")).userNode();
+    const auto statusOf = [&](const std::function<void()>& raise) {
+        const HStatus status = neuralWarp::guardedCompute(node, "compute", [&]() -> HStatus {
+            raise();
+            return HStatus::kNotFound;
+        });
+        return std::to_string(status.statusCode()) + ' ' + testNodes::text(status);
+    };
+    EXPECT_EQ(statusOf([] {}), "6 kNotFound");
+    EXPECT_EQ(statusOf([] { throw std::bad_alloc(); }), "2 kInsufficientMemory");
+    EXPECT_EQ(statusOf([] { throw std::runtime_error("too far"); }), "1 node 'c', compute: too far");
+    EXPECT_EQ(statusOf([] { throw 1; }), "1 node 'c', compute: unknown exception");
 }
 
 TEST_F(ControlNodes, ConversionsHaveTheirLabels) {
