@@ -8,7 +8,6 @@
 namespace {
 
 using ::testing::ElementsAre;
-using ::testing::IsEmpty;
 
 const std::string doubled = " 2 0 0 0  0 2 0 0  0 0 2 0  0 0 0 1;";
 const std::string sheared = " 0 3 0 0  0 5 1e-3 0  0 0 0 0  1 2 3 1;";
