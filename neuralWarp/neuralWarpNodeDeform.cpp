@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // The evaluation of one geometry.
 #include "messages/displayErrorGated.h"
+#include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
 #include "neuralWarp/blend.h"
 #include "neuralWarp/deltas.h"
-#include "neuralWarp/guard.h"
 #include "neuralWarp/neuralWarpNode.h"
 #include "neuralWarp/neuralWarpUtils.h"
 #include "openquarn/HProfilingScope.h"
