@@ -2,7 +2,7 @@
 // What the three nodes have in common: their attributes, their profile, the way from matrices to control values.
 #include "controls/ControlsTest.h"
 
-#include "messages/guard.h"
+#include "controls/guardedCompute.h"
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HNodeClass.h"
