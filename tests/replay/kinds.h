@@ -15,6 +15,7 @@ Json replayMatrix(Input& input, JsonAllocator& allocator);
 Json replayMesh(Input& input, JsonAllocator& allocator);
 Json replayMetadata(Input& input, JsonAllocator& allocator);
 Json replayPrincipal(Input& input, JsonAllocator& allocator);
+Json replayScenario(Input& input, JsonAllocator& allocator);
 
 // A kind of case. A null replay: the code it exercises does not exist yet.
 struct Kind {
@@ -25,7 +26,7 @@ struct Kind {
 inline constexpr Kind kinds[] = {
     {"val3", replayVal3},           {"matrix", replayMatrix}, {"mesh", replayMesh},   {"metadata", replayMetadata},
     {"principal", replayPrincipal}, {"collector", nullptr},   {"converter", nullptr}, {"ortho", nullptr},
-    {"scenario", nullptr},
+    {"scenario", replayScenario},
 };
 
 } // namespace replay
