@@ -38,6 +38,7 @@ Case readCase(const std::filesystem::path& file) {
             file, "has a member of the wrong type");
     result.name = document["case"].GetString();
     result.kind = document["kind"].GetString();
+    result.folder = std::filesystem::absolute(file).lexically_normal().parent_path();
     result.tolerance = document["tolerance"].GetDouble();
     return result;
 }
@@ -55,12 +56,26 @@ std::vector<Case> readCases(const std::filesystem::path& folder) {
     return cases;
 }
 
+Input::Input(const Json& members, std::filesystem::path folder)
+    : members_(members)
+    , folder_(std::move(folder)) {
+    if (!members.IsObject())
+        throw std::runtime_error("what should be an object is none");
+}
+
 const Json& Input::operator[](std::string_view key) {
+    const Json* value = find(key);
+    if (!value)
+        throw std::runtime_error("there is no \"" + std::string(key) + '"');
+    return *value;
+}
+
+const Json* Input::find(std::string_view key) {
     const auto member = members_.FindMember(Json(key.data(), static_cast<rapidjson::SizeType>(key.size())));
     if (member == members_.MemberEnd())
-        throw std::runtime_error("the input has no \"" + std::string(key) + '"');
+        return nullptr;
     read_.emplace(key);
-    return member->value;
+    return &member->value;
 }
 
 std::vector<std::string> Input::unread() const {

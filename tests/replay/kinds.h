@@ -18,6 +18,7 @@ Json replayPrincipal(Input& input, JsonAllocator& allocator);
 Json replayCollector(Input& input, JsonAllocator& allocator);
 Json replayConverter(Input& input, JsonAllocator& allocator);
 Json replayOrtho(Input& input, JsonAllocator& allocator);
+Json replayScenario(Input& input, JsonAllocator& allocator);
 
 // A kind of case. A null replay: the code it exercises does not exist yet.
 struct Kind {
@@ -28,7 +29,7 @@ struct Kind {
 inline constexpr Kind kinds[] = {
     {"val3", replayVal3},           {"matrix", replayMatrix},       {"mesh", replayMesh},
     {"metadata", replayMetadata},   {"principal", replayPrincipal}, {"collector", replayCollector},
-    {"converter", replayConverter}, {"ortho", replayOrtho},         {"scenario", nullptr},
+    {"converter", replayConverter}, {"ortho", replayOrtho},         {"scenario", replayScenario},
 };
 
 } // namespace replay

@@ -21,17 +21,6 @@ std::filesystem::path writeFile(const TemporaryFolder& folder, const std::string
     return path;
 }
 
-// Lines with their line ends.
-std::vector<std::string> lines(const std::string& text) {
-    std::vector<std::string> result;
-    for (std::size_t begin = 0; begin < text.size();) {
-        const std::size_t end = std::min(text.find('\n', begin), text.size() - 1) + 1;
-        result.push_back(text.substr(begin, end - begin));
-        begin = end;
-    }
-    return result;
-}
-
 Json recordToJson(const neuralWarp::ModelMetadata& record, JsonAllocator& allocator) {
     Output out(allocator);
     out.set("loaded", record.loaded);
@@ -60,7 +49,7 @@ Json replayMetadata(Input& input, JsonAllocator& allocator) {
     Output out(allocator);
     out.set("ok", ok);
     out.set("record", recordToJson(record, allocator));
-    out.set("stdout", lines(printed));
+    out.set("stdout", linesOf(printed));
     return out.take();
 }
 
@@ -78,7 +67,7 @@ Json replayPrincipal(Input& input, JsonAllocator& allocator) {
     out.set("S", static_cast<std::uint32_t>(shapeCount));
     out.set("V", static_cast<std::uint32_t>(vertCount));
     out.set("values", values);
-    out.set("stdout", lines(printed));
+    out.set("stdout", linesOf(printed));
     return out.take();
 }
 

@@ -13,7 +13,7 @@ const Kind* findKind(std::string_view name) {
 
 std::vector<Disagreement> replayCase(const Kind& kind, const Case& testCase, double tolerance) {
     rapidjson::Document results;
-    Input input(testCase.input());
+    Input input(testCase.input(), testCase.folder);
     try {
         const Json actual = kind.replay(input, results.GetAllocator());
         auto disagreements = compare(testCase.expected(), actual, tolerance);

@@ -8,7 +8,8 @@
 namespace replay {
 namespace {
 
-// The value of a key that is best to change: of numbers the largest, which no tolerance hides.
+// The value of a key that is best to change: of numbers the largest, which no tolerance hides. An empty list, which
+// gets an element, only where every other value is one too.
 struct Candidate {
     Case* owner = nullptr;
     Json* value = nullptr;
@@ -41,7 +42,9 @@ public:
             return;
         }
         Candidate& best = byKey[key];
-        if (!value.IsArray() && !value.IsNull() && sizeOf(value) > best.size)
+        if (value.IsArray() && !best.value)
+            best = {&owner, &value, where + ".length", best.size};
+        else if (!value.IsArray() && !value.IsNull() && sizeOf(value) > best.size)
             best = {&owner, &value, where, sizeOf(value)};
     }
 
@@ -49,7 +52,9 @@ public:
 };
 
 void perturb(Json& value, JsonAllocator& allocator) {
-    if (value.IsBool())
+    if (value.IsArray())
+        value.PushBack("x", allocator);
+    else if (value.IsBool())
         value.SetBool(!value.GetBool());
     else if (value.IsString())
         value.SetString((std::string(value.GetString(), value.GetStringLength()) + "x").c_str(), allocator);

@@ -17,7 +17,8 @@ struct SelfCheckResult {
 
 // For every key of the expected results of a kind (members of members counted apart, elements of a list together),
 // changes one value in one case (an integer by 1, a number by a thousandth, a text by an "x", a truth value to the
-// other) and asks the comparison, at the case's own tolerance, whether it notices there.
+// other; a list that is empty in every case gets an element) and asks the comparison, at the case's own tolerance,
+// whether it notices there.
 SelfCheckResult selfCheck(const Kind& kind, const std::vector<Case*>& cases);
 
 } // namespace replay

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "values.h"
 
+#include <algorithm>
 #include <stdexcept>
 
 namespace replay {
@@ -60,6 +61,16 @@ Json toJson(const quill::mat4d& matrix, JsonAllocator& allocator) {
         rows.PushBack(row, allocator);
     }
     return rows;
+}
+
+std::vector<std::string> linesOf(const std::string& text) {
+    std::vector<std::string> lines;
+    for (std::size_t begin = 0; begin < text.size();) {
+        const std::size_t end = std::min(text.find('\n', begin), text.size() - 1) + 1;
+        lines.push_back(text.substr(begin, end - begin));
+        begin = end;
+    }
+    return lines;
 }
 
 } // namespace replay

@@ -69,6 +69,9 @@ Json toJson(const std::vector<T>& values, JsonAllocator& allocator) {
     return list;
 }
 
+// The lines of a text, with their line ends.
+std::vector<std::string> linesOf(const std::string& text);
+
 // Builds the object of actual values.
 class Output {
 public:
