@@ -4,7 +4,7 @@
 #include "values.h"
 
 #include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HFnMesh.h"
+#include "openquarn/HFnMeshData.h"
 #include "openquarn/HGlobal.h"
 #include "openquarn/HPxDeformerNode.h"
 #include "openquarn_app/Plugins.h"
@@ -36,18 +36,17 @@ HPointArray readPoints(const Json& list) {
     return points;
 }
 
-// a mesh of these polygons; the host's have three corners or more
-ZooMesh polygonsOf(const Json& polygons, std::size_t vertexCount) {
-    ZooMesh mesh;
-    mesh.points.resize(vertexCount);
-    for (const Json& polygon : polygons.GetArray())
-        mesh.polygons.push_back(readIndices(polygon));
+HObject makeMesh(const HPointArray& points, const Json& polygons) {
+    HIntArray counts, corners;
+    for (const Json& polygon : polygons.GetArray()) {
+        counts.append(static_cast<int>(polygon.Size()));
+        for (const std::uint32_t corner : readIndices(polygon))
+            corners.append(static_cast<int>(corner));
+    }
+    HStatus status;
+    HObject mesh = HFnMeshData().create(points, counts, corners, &status);
+    require(status);
     return mesh;
-}
-
-HObject readMesh(const Json& polygons, const Json& pointList) {
-    const HPointArray points = readPoints(pointList);
-    return warpRig::withPoints(warpRig::mesh(polygonsOf(polygons, points.length())), points);
 }
 
 // by vertex of the whole geometry, where the case has them by affected vertex
@@ -104,8 +103,8 @@ ScenarioScene::ScenarioScene(Input& input)
 void ScenarioScene::addGeometry(unsigned index, Input geometry) {
     const Json& polygons = geometry["polygons"];
     warpRig::GeometrySpec spec;
-    spec.rest = readMesh(polygons, geometry["rest"]);
-    spec.mesh = readMesh(polygons, geometry["input"]);
+    spec.rest = makeMesh(readPoints(geometry["rest"]), polygons);
+    spec.mesh = makeMesh(readPoints(geometry["input"]), polygons);
     if (const Json& affected = geometry["affected"]; !affected.IsNull())
         spec.affected = readIndices(affected);
     spec.weights = spreadWeights(geometry["weights"], spec.affected, geometry["input"].Size());
@@ -153,7 +152,7 @@ HObject ScenarioScene::meshOf(unsigned index, const Json& pointList) const {
     const HObject mesh = rig_.plug("input[" + std::to_string(index) + "].inputGeometry").asHObject();
     if (!mesh.isNull() && warpRig::pointsOf(mesh).length() == points.length())
         return warpRig::withPoints(mesh, points);
-    return warpRig::withPoints(warpRig::mesh(polygonsOf(Json(rapidjson::kArrayType), points.length())), points);
+    return makeMesh(points, Json(rapidjson::kArrayType));
 }
 
 HStatus ScenarioScene::deform(unsigned index) {

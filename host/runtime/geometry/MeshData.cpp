@@ -9,6 +9,9 @@
 namespace OpenQuarn {
 namespace {
 
+/// Two corners are an edge that bounds no face.
+constexpr int fewestCorners = 2;
+
 std::string number(std::size_t value) {
     return std::to_string(value);
 }
@@ -20,9 +23,9 @@ std::vector<unsigned> offsetsOf(const HIntArray& counts, std::size_t cornerCount
     std::size_t total = 0;
     offsets.push_back(0);
     for (std::size_t polygon = 0; polygon < counts.length(); ++polygon) {
-        if (counts[polygon] < 3)
+        if (counts[polygon] < fewestCorners)
             throw std::invalid_argument("polygon " + number(polygon) + " has " + std::to_string(counts[polygon]) +
-                                        " vertices: it needs at least 3");
+                                        " vertices: it needs at least " + std::to_string(fewestCorners));
         total += static_cast<unsigned>(counts[polygon]);
         if (total > cornerCount)
             throw std::invalid_argument("polygon " + number(polygon) + " ends at vertex number " + number(total) +

@@ -15,7 +15,7 @@
 
 namespace OpenQuarn {
 
-/// The polygons of a mesh, each any number of corners from 3 on. The vertices of polygon p are corners[offsets[p]] to
+/// The polygons of a mesh, each any number of corners from 2 on. The vertices of polygon p are corners[offsets[p]] to
 /// corners[offsets[p + 1] - 1], in winding order; each is below vertexCount.
 struct Topology {
     unsigned vertexCount = 0;

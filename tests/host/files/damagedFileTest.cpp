@@ -71,7 +71,7 @@ TEST_F(DamagedFile, WhatIsNoMeshIsReportedAndKept) {
         {R"({"points":[0,0,"x"],"counts":[],"corners":[]})", "its points are not three numbers each"},
         {R"({"points":[0,0,0],"counts":[3],"corners":[0,0,1]})", "polygon vertex number 2 is 1"},
         {R"({"points":[0,0,0],"counts":[2147483647,2147483647],"corners":[0]})", "polygon 0 ends at"},
-        {R"({"points":[0,0,0],"counts":[2],"corners":[0,0]})", "at least 3"},
+        {R"({"points":[0,0,0],"counts":[1],"corners":[0]})", "at least 2"},
         {R"({"points":[0,0,0],"counts":[],"corners":[4294967296]})", "no whole number"},
         {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"t":[-1]}})", "lists vertex 4294967295"},
         {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"t":[0],"t":[0]}})", "'t' stands twice"},
