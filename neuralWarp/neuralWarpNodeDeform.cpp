@@ -168,12 +168,12 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
 
     const HProfilingScope scope(evaluationCategory(), 9, "ApplyDeltas", name());
     Points points;
-    if (const HStatus status = readInputPoints(data, block, multiIndex, points); status.error())
+    if (HStatus status = readInputPoints(data, block, multiIndex, points); status.error())
         return status;
     const std::size_t count = data.componentMap.affectCount();
     if (points.size() != count)
         return misfit("the input geometry", points.size(), count);
-    if (const HStatus status = checkOutputs(data, outputs); status.error())
+    if (HStatus status = checkOutputs(data, outputs); status.error())
         return status;
     data.endPhase(Phase::points);
     result.resize(count);

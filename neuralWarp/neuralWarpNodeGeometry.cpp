@@ -62,7 +62,7 @@ HStatus neuralWarpNode::prepareRestState(neuralWarpData& data, HDataBlock& block
     if (!needsWork(data))
         return HStatus::kSuccess;
     if (data.indexMapDirty)
-        if (const HStatus status = updateComponentMap(data); status.error())
+        if (HStatus status = updateComponentMap(data); status.error())
             return status;
     return needsWork(data) ? rebuildRestCaches(data, block, multiIndex) : HStatus();
 }
@@ -100,7 +100,7 @@ HStatus neuralWarpNode::rebuildRestCaches(neuralWarpData& data, HDataBlock& bloc
 
 HStatus neuralWarpNode::rebuildRestFrames(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex) {
     Points smoothed;
-    if (const HStatus status = readSmoothedRestPoints(data, block, multiIndex, smoothed, true); status.error())
+    if (HStatus status = readSmoothedRestPoints(data, block, multiIndex, smoothed, true); status.error())
         return status;
     std::vector<quill::mat4d> frames;
     calculateVertexFrames(data, frames, smoothed, true, nullptr);

@@ -152,7 +152,7 @@ HStatus neuralWarpNode::loadModel(neuralWarpData& data, bool force) {
         return HStatus::kFailure;
     if (const HStatus status = validateModel(data); status.error())
         return reported(status, sourceUnit::node);
-    const HStatus network = loadNetwork(data);
+    HStatus network = loadNetwork(data);
     const HStatus shapes = loadPrincipalShapes(data);
     if (shapes.error()) {
         data.modelValid = false; // without knowing its shapes, the network's outputs would be taken for deltas

@@ -90,7 +90,7 @@ HStatus neuralWarpNode::readTrainingPoints(const neuralWarpData& data, HDataBloc
 }
 
 HStatus neuralWarpNode::pointDifferences(HDoubleArray& out, const Points& target, const Points& base) {
-    if (const HStatus status = out.setLength(3 * target.size()); status.error())
+    if (HStatus status = out.setLength(3 * target.size()); status.error())
         return status;
     quill::parallelFor(target.size(), [&](std::size_t j) {
         const quill::val3<float> delta = target[j] - base[j];
