@@ -11,9 +11,9 @@
 #include <cstdint>
 #include <vector>
 
-class HFnMesh;
-
 namespace neuralWarp {
+
+struct Blend;
 
 /// What is kept of a geometry between evaluations is a neuralWarpData, in the element of `deformerData` that has the
 /// geometry's index. docs/neuralWarp.md lists the attributes.
@@ -68,6 +68,10 @@ public:
     /// `frames` grows to the number of affected vertices. [eval]
     void calculateVertexFrames(const neuralWarpData& data, std::vector<quill::mat4d>& frames, const Points& positions,
                                bool invert, const std::vector<std::uint32_t>* subset) const;
+    /// The same on another topology than the state's.
+    void calculateVertexFrames(const quill::VertexFrames& topology, const quill::IndexMapper& map,
+                               std::vector<quill::mat4d>& frames, const Points& positions, bool invert,
+                               const std::vector<std::uint32_t>* subset) const;
     /// out[i] = in[i] transformed as a point by frames[i], for the vertices in `subset`, all when null; `out` gets as
     /// many elements as the geometry has affected vertices. Vertices beyond `in` or `frames` are left out. [eval]
     HStatus applyVertexFrames(Points& out, const Points& in, const std::vector<quill::mat4d>& frames,
@@ -125,17 +129,33 @@ private:
     HStatus prepareRestState(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
     HStatus updateComponentMap(neuralWarpData& data);
     HStatus rebuildRestCaches(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
+    HStatus rebuildRestFrames(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
     HStatus readTargetPoints(const neuralWarpData& data, std::uint32_t multiIndex, Points& points);
     bool readTargetMorph(HDataBlock& block, std::uint32_t multiIndex, double& envelope, Points& points,
                          HStatus& status);
-    bool readMorphPoints(HDataBlock& block, std::uint32_t multiIndex, Points& points, HStatus& status);
+    HStatus readMorphPoints(HDataBlock& block, std::uint32_t multiIndex, Points& points);
     HStatus readInputPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex, Points& points);
     HStatus readSmoothedRestPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
                                    Points& points, bool smooth);
 
+    // Training deltas.
+    struct TrainingPoints;
+    struct RestSurface;
+    HStatus readTrainingPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
+                               TargetDeltaType type, TrainingPoints& points);
+    static HStatus pointDifferences(HDoubleArray& out, const Points& target, const Points& base);
+    static HStatus findRestSurface(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
+                                   RestSurface& surface);
+    HStatus surfaceDeltas(HDoubleArray& out, const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
+                          TargetDeltaType type, const TrainingPoints& points);
+
     // Evaluation.
     HStatus evaluate(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex);
+    bool updateModelSettings(HDataBlock& block, neuralWarpData& data);
     HStatus applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, Points& result);
+    std::vector<float> runNetwork(neuralWarpData& data, const std::vector<float>& controls) const;
+    HStatus applyDeltas(const neuralWarpData& data, const Points& points, const Points& deltas, Points& result) const;
+    HStatus writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex, const Blend& blend);
 
     HCallbackId attributeCallback_ = 0;
 };

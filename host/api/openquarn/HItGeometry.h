@@ -42,6 +42,10 @@ public:
     /// Positions of the count() vertices in the order of iteration, wherever it stands; `points` is replaced. An array
     /// that has the right length already is written in place.
     HStatus allPositions(HPointArray& points, HSpace::Space space = HSpace::kObject) const;
+    /// x, y and z of every vertex of the whole geometry, in its own order whatever this iterator visits: for readers
+    /// that would copy the points only to convert them. Owned by the host, valid until a position is set or this and
+    /// the handle it was made on are gone. Null, and a failure, when it stands on no geometry; null for no vertices.
+    const double* rawPositions(HStatus* status = nullptr) const;
     /// Sets all of them. Fails with kInvalidParameter, and changes nothing, when there are not count() points.
     HStatus setAllPositions(const HPointArray& points, HSpace::Space space = HSpace::kObject);
 

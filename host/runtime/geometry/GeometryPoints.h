@@ -19,6 +19,8 @@ public:
     unsigned fullIndex(unsigned position) const { return map_ ? map_->fullIndex(position) : position; }
     /// `position` below count().
     HPoint point(unsigned position) const;
+    /// Of all vertices.
+    const double* raw() const { return current().xyz(); }
     void setPoint(unsigned position, const HPoint& point);
     HStatus copyTo(HPointArray& points) const;
     /// count() points.

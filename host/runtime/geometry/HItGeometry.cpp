@@ -94,6 +94,14 @@ HStatus HItGeometry::allPositions(HPointArray& points, HSpace::Space space) cons
     });
 }
 
+const double* HItGeometry::rawPositions(HStatus* status) const {
+    const double* none = nullptr;
+    return apiValue(FaultPoint::HItGeometry_rawPositions, status, none, [&](HStatus& outcome) {
+        outcome = impl_ ? HStatus() : noGeometry();
+        return impl_ ? impl_->raw() : nullptr;
+    });
+}
+
 HStatus HItGeometry::setAllPositions(const HPointArray& points, HSpace::Space space) {
     return apiCall(FaultPoint::HItGeometry_setAllPositions, [&]() -> HStatus {
         HStatus status = impl_ ? spaceStatus(space) : noGeometry();

@@ -118,6 +118,8 @@ std::vector<FaultRow> iteratorRows() {
                 HItGeometry(rig.handle).position(HSpace::kObject, &status);
                 return status;
             }),
+        row("HItGeometry::rawPositions",
+            [](GeometryRig& rig, HStatus* status) { return HItGeometry(rig.handle).rawPositions(status) != nullptr; }),
         row("HItGeometry::setPosition",
             [](GeometryRig& rig) { return HItGeometry(rig.handle).setPosition(HPoint(1, 2, 3)); }),
         row("HItGeometry::allPositions",

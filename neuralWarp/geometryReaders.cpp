@@ -1,0 +1,109 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "neuralWarp/geometryReaders.h"
+
+#include "messages/sourceUnits.h"
+#include "neuralWarp/neuralWarpUtils.h"
+#include "openquarn/HFnMesh.h"
+#include "openquarn/HItGeometry.h"
+#include "openquarn/HNodeClass.h"
+#include "quill/parallelFor.h"
+
+namespace neuralWarp {
+namespace {
+
+HObject filterAttribute(const char* name) {
+    return HNodeClass("geometryFilter").attribute(name);
+}
+
+/// The passes that the settings in force ask for.
+void smoothPoints(const neuralWarpData& data, Points& points) {
+    if (!data.activeSettings.isSmoothed())
+        return;
+    Points scratch;
+    data.vertexConnections.mushArray(points, scratch, static_cast<std::size_t>(data.activeSettings.smoothingIterations),
+                                     1.0F, nullptr, &data.connectionWeights, false);
+}
+
+} // namespace
+
+HDataHandle restGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HStatus& status) {
+    static const HObject originalGeometry = filterAttribute("originalGeometry");
+    return existingElement(block, originalGeometry, multiIndex, status);
+}
+
+HDataHandle inputGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HStatus& status) {
+    static const HObject input = filterAttribute("input");
+    static const HObject inputGeometry = filterAttribute("inputGeometry");
+    const HDataHandle element = existingElement(block, input, multiIndex, status);
+    return status.error() ? HDataHandle() : element.child(inputGeometry);
+}
+
+bool readGeometryPoints(const HDataHandle& geometry, Points& points, const quill::IndexMapper& map) {
+    HStatus status;
+    const HItGeometry iterator(geometry, &status);
+    if (status.error() || iterator.count() < map.fullCount())
+        return false;
+    const double* xyz = iterator.rawPositions(&status);
+    if (status.error())
+        return false;
+    points.resize(map.affectCount());
+    quill::parallelFor(points.size(), [&](std::size_t k) {
+        const double* p = xyz + std::size_t{3} * map.toFull(k);
+        points[k] = {static_cast<float>(p[0]), static_cast<float>(p[1]), static_cast<float>(p[2])};
+    });
+    return true;
+}
+
+HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, Points& points, bool smooth) {
+    HStatus status;
+    const HFnMesh mesh(geometry.asMesh(), &status);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    readGeometryPoints(geometry, points, data.componentMap);
+    if (smooth)
+        smoothPoints(data, points);
+    return HStatus::kSuccess;
+}
+
+void readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology) {
+    topology = {};
+    topology.vertexCount = mesh.numVertices();
+    const int polygons = mesh.numPolygons();
+    topology.polygonOffsets.reserve(static_cast<std::size_t>(polygons) + 1);
+    topology.polygonVertices.reserve(static_cast<std::size_t>(polygons) * 4);
+    HIntArray corners;
+    for (int polygon = 0; polygon < polygons; ++polygon) {
+        if (mesh.getPolygonVertices(polygon, corners).error())
+            continue;
+        ++topology.polygonCount;
+        topology.polygonOffsets.push_back(static_cast<std::uint32_t>(topology.polygonVertices.size()));
+        for (const int corner : corners)
+            topology.polygonVertices.push_back(static_cast<std::uint32_t>(corner));
+    }
+    topology.polygonOffsets.push_back(static_cast<std::uint32_t>(topology.polygonVertices.size()));
+    topology.valid = true;
+}
+
+quill::IndexMapper readIndexMap(const HIndexMapper& mapper) {
+    quill::IndexMapper map;
+    if (mapper.isIdentityMap()) {
+        map.setIdentity(mapper.fullCount());
+    } else {
+        const HUintArray& affected = mapper.affectMap();
+        map.set(std::vector<std::uint32_t>(affected.begin(), affected.end()), mapper.fullCount());
+    }
+    return map;
+}
+
+HDoubleArray convertDeltasToHDoubleArray(const Points& deltas) {
+    HDoubleArray array;
+    if (array.setLength(3 * deltas.size()).error())
+        return {};
+    quill::parallelFor(deltas.size(), [&](std::size_t j) {
+        for (std::size_t axis = 0; axis < 3; ++axis)
+            array[3 * j + axis] = static_cast<double>(deltas[j][axis]);
+    });
+    return array;
+}
+
+} // namespace neuralWarp

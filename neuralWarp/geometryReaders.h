@@ -1,0 +1,37 @@
+// SPDX-License-Identifier: Apache-2.0
+// Geometry of the host, as the numeric code takes it: single precision, in affected index space.
+#pragma once
+
+#include "neuralWarp/neuralWarpData.h"
+#include "openquarn/HDataBlock.h"
+#include "openquarn/HDoubleArray.h"
+#include "openquarn/HIndexMapper.h"
+#include "quill/MeshTopology.h"
+
+class HFnMesh;
+
+namespace neuralWarp {
+
+/// The rest geometry of a geometry (originalGeometry[multiIndex]), and the geometry as it comes in
+/// (input[multiIndex].inputGeometry), evaluated. Invalid, with the host's failing status, when it is not there. [eval]
+HDataHandle restGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HStatus& status);
+HDataHandle inputGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HStatus& status);
+
+/// The affected points of a geometry, object space, narrowed to float. False, and `points` is left as it is, when the
+/// geometry has fewer vertices than `map`; its further vertices are ignored. [eval]
+bool readGeometryPoints(const HDataHandle& geometry, Points& points, const quill::IndexMapper& map);
+
+/// The same for a handle that must hold a mesh, smoothed by the settings in force if `smooth` says so. The failing
+/// status of the mesh is reported and returned. A mesh that is too small leaves `points` as it is, with success. [eval]
+HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, Points& points, bool smooth);
+
+/// The polygons of a mesh; those that the host does not give are left out. [any]
+void readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology);
+
+/// The host's map of the affected vertices, in the same order. [any]
+quill::IndexMapper readIndexMap(const HIndexMapper& mapper);
+
+/// x, y, z of each delta, widened. Empty when there is no memory. [any]
+HDoubleArray convertDeltasToHDoubleArray(const Points& deltas);
+
+} // namespace neuralWarp

@@ -1,0 +1,222 @@
+// SPDX-License-Identifier: Apache-2.0
+// The evaluation of one geometry.
+#include "messages/displayErrorGated.h"
+#include "messages/messageText.h"
+#include "messages/sourceUnits.h"
+#include "neuralWarp/blend.h"
+#include "neuralWarp/deltas.h"
+#include "neuralWarp/guard.h"
+#include "neuralWarp/neuralWarpNode.h"
+#include "neuralWarp/neuralWarpUtils.h"
+#include "openquarn/HProfilingScope.h"
+#include "quill/parallelFor.h"
+
+#include <algorithm>
+#include <string>
+
+namespace neuralWarp {
+namespace {
+
+bool usesPrincipalShapes(const neuralWarpData& data) {
+    return data.principalShapeCount != 0 && data.principalVertCount != 0;
+}
+
+HStatus noDeltas(const std::string& reason) {
+    raiseMessage<Text::kErrorMLModelNoDeltas>(displayErrorGated);
+    return {HStatus::kFailure, reason};
+}
+
+HStatus tooFewDeltas(std::size_t predicted, std::size_t needed) {
+    raiseMessage<Text::kMlNodeVertexCountMismatch>(displayErrorGated, predicted, needed);
+    return {HStatus::kFailure,
+            "the model gives " + std::to_string(predicted) + " deltas where " + std::to_string(needed) + " are needed"};
+}
+
+/// A failure, which the user is told of, when what the network gave, or the basis of shapes, does not reach the highest
+/// slot that a vertex is driven from.
+HStatus checkOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {
+    if (outputs.empty())
+        return noDeltas("the model gave no values: " + data.session.errorText());
+    const std::size_t slots = data.slotCount();
+    if (!usesPrincipalShapes(data))
+        return outputs.size() / 3 >= slots ? HStatus() : tooFewDeltas(outputs.size() / 3, slots);
+    const auto shapes = static_cast<std::size_t>(data.principalShapeCount);
+    if (outputs.size() < shapes)
+        return noDeltas("the model gives " + std::to_string(outputs.size()) + " coefficients for " +
+                        std::to_string(shapes) + " principal shapes");
+    const std::size_t covered = data.principalShapes.size() / 3 / shapes;
+    return covered >= slots ? HStatus() : tooFewDeltas(covered, slots);
+}
+
+void extractDeltas(Points& deltas, const neuralWarpData& data, const std::vector<float>& outputs,
+                   const DrivenVertices& driven) {
+    if (usesPrincipalShapes(data))
+        extractPrincipalDeltas(deltas, outputs, static_cast<std::size_t>(data.principalShapeCount),
+                               data.principalShapes, driven);
+    else
+        extractComputedDeltas(deltas, outputs, driven);
+}
+
+void applyOffsets(Points& result, const Points& points, const Points& deltas, const DrivenVertices& driven) {
+    quill::parallelFor(driven.count, [&](std::size_t k) {
+        const std::size_t v = driven.vertex(k);
+        result[v] = points[v] + deltas[k];
+    });
+}
+
+void transportDeltas(Points& result, const neuralWarpData& data, const std::vector<quill::mat4d>& frames,
+                     const Points& deltas, const DrivenVertices& driven) {
+    quill::parallelFor(driven.count, [&](std::size_t k) {
+        const std::size_t v = driven.vertex(k);
+        result[v] = quill::transportDelta(data.restPoints[v], deltas[k], data.restFramesInverse[v], frames[v]);
+    });
+}
+
+HStatus misfit(const char* what, std::size_t has, std::size_t needed) {
+    return {HStatus::kFailure, std::string(what) + " has " + std::to_string(has) + " points where " +
+                                   std::to_string(needed) + " vertices are deformed"};
+}
+
+} // namespace
+
+HStatus neuralWarpNode::deform(HDataBlock& block, HItGeometry& iterator, const HMatrix&, unsigned multiIndex) {
+    return guarded(*this, "deform", [&] { return evaluate(block, iterator, multiIndex); });
+}
+
+HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex) {
+    HStatus status;
+    const HDataHandle model = existingElement(block, models, multiIndex, status);
+    if (status.error())
+        return status;
+    bool isActive = model.child(modelActive).asShort() == 1;
+    const float envelopeValue = block.inputValue(envelope, &status).asFloat();
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    if (envelopeValue == 0.0F)
+        return HStatus::kSuccess;
+    neuralWarpData* data = fetchNodeData(block, multiIndex);
+    if (!data)
+        return HStatus::kFailure;
+    if (data->observedOutputs)
+        data->observedOutputs->clear();
+    if (data->exportMode) {
+        data->modelApplied = false;
+        return HStatus::kSuccess;
+    }
+
+    isActive = isActive && updateModelSettings(block, *data);
+    status = prepareRestState(*data, block, multiIndex);
+    if (status.error())
+        return status;
+    Points target;
+    double morphEnvelope = 0.0;
+    const bool isMorphed = readTargetMorph(block, multiIndex, morphEnvelope, target, status);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+
+    if (isMorphed && morphEnvelope == 1.0) {
+        isActive = false; // nothing of the model would be left to see
+    } else if (isActive) {
+        if (data->modelLoadPending)
+            loadModel(*data, false); // a failure shows in canApplyModel()
+    } else if (!isMorphed) {
+        data->modelApplied = false;
+        return HStatus::kSuccess;
+    }
+    isActive = isActive && data->canApplyModel() && !data->drivesNothing();
+    data->modelApplied = isActive;
+
+    Points result;
+    if (isActive) {
+        status = applyNeuralModel(block, multiIndex, *data, result);
+        if (status.error())
+            return reported(status, sourceUnit::node);
+    }
+    const Blend blend{data, isActive ? &result : nullptr, isMorphed ? &target : nullptr,
+                      static_cast<float>(morphEnvelope), envelopeValue};
+    return writeBlended(block, iterator, multiIndex, blend);
+}
+
+bool neuralWarpNode::updateModelSettings(HDataBlock& block, neuralWarpData& data) {
+    if (data.modelPathDirty && resolveModelDirectory(block, data).error())
+        return false;
+    if (data.metadataDirty) {
+        const bool isRead = !loadMetadata(data, false).error();
+        // the map is that of the model before: the new one is loaded in the next evaluation
+        if (!isRead || data.drivesNothing())
+            return false;
+    }
+    data.applySettings(data.modelSettings);
+    data.releaseUnusedCaches();
+    return true;
+}
+
+HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data,
+                                         Points& result) {
+    if (!data.canApplyModel())
+        return HStatus::kFailure;
+    std::vector<float> controls;
+    if (const HStatus status = gatherControlValues(block, data.session.inputCount(), controls); status.error())
+        return reported(status, sourceUnit::node);
+    const std::vector<float> outputs = runNetwork(data, controls);
+
+    const HProfilingScope scope(evaluationCategory(), 9, "ApplyDeltas", name());
+    Points points;
+    if (const HStatus status = readInputPoints(data, block, multiIndex, points); status.error())
+        return status;
+    const std::size_t count = data.componentMap.affectCount();
+    if (points.size() != count)
+        return misfit("the input geometry", points.size(), count);
+    if (const HStatus status = checkOutputs(data, outputs); status.error())
+        return status;
+    result.resize(count);
+    const DrivenVertices driven(data);
+    Points deltas;
+    extractDeltas(deltas, data, outputs, driven);
+    return applyDeltas(data, points, deltas, result);
+}
+
+std::vector<float> neuralWarpNode::runNetwork(neuralWarpData& data, const std::vector<float>& controls) const {
+    const HProfilingScope scope(evaluationCategory(), 0, "InferenceDeltas", name());
+    std::vector<float> outputs = data.session.run(controls);
+    if (data.observedOutputs)
+        *data.observedOutputs = outputs;
+    return outputs;
+}
+
+HStatus neuralWarpNode::applyDeltas(const neuralWarpData& data, const Points& points, const Points& deltas,
+                                    Points& result) const {
+    const DrivenVertices driven(data);
+    if (data.activeSettings.deltaMode == kOffsetMode)
+        applyOffsets(result, points, deltas, driven);
+    if (!data.activeSettings.isSurface())
+        return HStatus::kSuccess;
+    if (data.restPoints.size() < points.size() || data.restFramesInverse.size() < points.size())
+        return misfit("the rest geometry", std::min(data.restPoints.size(), data.restFramesInverse.size()),
+                      points.size());
+    std::vector<quill::mat4d> frames;
+    calculateVertexFrames(data, frames, points, false, driven.vertices);
+    transportDeltas(result, data, frames, deltas, driven);
+    return HStatus::kSuccess;
+}
+
+HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex,
+                                     const Blend& blend) {
+    HStatus status;
+    const std::size_t count = indexMapper(multiIndex, &status).affectCount();
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    const float* weights = envelopeWeights(block, multiIndex, &status);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    HPointArray positions;
+    status = iterator.allPositions(positions, HSpace::kObject);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    if (positions.length() != count || !blend.fits(count))
+        return misfit("the deformed geometry", positions.length(), count);
+    blendPositions(positions, weights, blend);
+    return reported(iterator.setAllPositions(positions, HSpace::kObject), sourceUnit::node);
+}
+
+} // namespace neuralWarp
