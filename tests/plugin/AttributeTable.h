@@ -8,8 +8,8 @@
 
 namespace attributeTable {
 
-/// Everything that is said of one attribute: a text for each of "short name", "type", "default", "limits", "parent", and
-/// for each flag.
+/// Everything that is said of one attribute: a text for each of "short name", "type", "default", "limits", "parent",
+/// and for each flag.
 using Fields = std::map<std::string, std::string>;
 
 struct Table {
