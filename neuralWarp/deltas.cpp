@@ -48,8 +48,9 @@ void storeThree(quill::val3<float>& to, __m128 v) {
 
 /// The same sums for blockSize driven vertices side by side; the fourth lane holds nothing of use.
 void sumBlock(const Basis& basis, const std::array<const float*, blockSize>& rows, quill::val3<float>* deltas) {
-    std::array<__m128, blockSize> sums;
-    sums.fill(_mm_setzero_ps());
+    __m128 sums[blockSize]; // NOLINT(modernize-avoid-c-arrays): std::array would drop the attributes of the type
+    for (__m128& sum : sums)
+        sum = _mm_setzero_ps();
     const std::size_t last = basis.shapeCount - 1;
     for (std::size_t j = 0; j < last; ++j) {
         const __m128 coefficient = _mm_set1_ps(basis.coefficients[j]);

@@ -89,8 +89,9 @@ public:
     quill::IndexMapper componentMap;      ///< the deformed vertices, in the host's order
     /// For each deformed vertex the model slot that drives it, or missingIndex. Empty unless useAffectMap.
     std::vector<std::uint32_t> affectMap;
-    std::vector<std::uint32_t> affectedVertices; ///< the deformed vertices that a slot drives, ascending; empty as above
-    Points restPoints;                           ///< unsmoothed, object space
+    std::vector<std::uint32_t>
+        affectedVertices; ///< the deformed vertices that a slot drives, ascending; empty as above
+    Points restPoints;    ///< unsmoothed, object space
     std::vector<quill::mat4d> restFramesInverse; ///< inverted frames of the smoothed rest surface
     std::vector<float> principalShapes;          ///< [principalVertCount][principalShapeCount][3]
     std::uint64_t principalShapeCount = 0;

@@ -9,7 +9,7 @@
 #include "openquarn/HCommandResult.h"
 #include "openquarn/HFileIO.h"
 #include "openquarn/HFileObject.h"
-#include "openquarn/HFnPluginData.h"
+#include "openquarn/HFnData.h"
 #include "openquarn/HGlobal.h"
 
 namespace neuralWarp {
@@ -128,8 +128,8 @@ HStatus neuralWarpNode::initializeMultiIndex(HDataBlock& block, unsigned multiIn
             element.set(HFnPluginData().create(neuralWarpData::id));
         auto* data = static_cast<neuralWarpData*>(element.asPluginData());
         if (!data)
-            return {HStatus::kFailure, "'" + name().asStdString() + "': there is no state for geometry " +
-                                           std::to_string(multiIndex)};
+            return {HStatus::kFailure,
+                    "'" + name().asStdString() + "': there is no state for geometry " + std::to_string(multiIndex)};
         if (reset) {
             data->markAllDirty();
             data->multiIndex = multiIndex;

@@ -131,7 +131,7 @@ private:
     HStatus rebuildRestCaches(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
     HStatus rebuildRestFrames(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
     HStatus readTargetPoints(const neuralWarpData& data, std::uint32_t multiIndex, Points& points);
-    bool readTargetMorph(HDataBlock& block, std::uint32_t multiIndex, double& envelope, Points& points,
+    bool readTargetMorph(HDataBlock& block, std::uint32_t multiIndex, double& morphEnvelope, Points& points,
                          HStatus& status);
     HStatus readMorphPoints(HDataBlock& block, std::uint32_t multiIndex, Points& points);
     HStatus readInputPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex, Points& points);

@@ -206,7 +206,7 @@ HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, s
     const std::size_t count = indexMapper(multiIndex, &status).affectCount();
     if (status.error())
         return reported(status, sourceUnit::node);
-    const float* weights = envelopeWeights(block, multiIndex, &status);
+    const float* vertexWeights = envelopeWeights(block, multiIndex, &status);
     if (status.error())
         return reported(status, sourceUnit::node);
     HPointArray positions;
@@ -215,7 +215,7 @@ HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, s
         return reported(status, sourceUnit::node);
     if (positions.length() != count || !blend.fits(count))
         return misfit("the deformed geometry", positions.length(), count);
-    blendPositions(positions, weights, blend);
+    blendPositions(positions, vertexWeights, blend);
     return reported(iterator.setAllPositions(positions, HSpace::kObject), sourceUnit::node);
 }
 

@@ -113,14 +113,14 @@ HStatus neuralWarpNode::rebuildRestFrames(neuralWarpData& data, HDataBlock& bloc
 HStatus neuralWarpNode::readInputPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
                                         Points& points) {
     HStatus status;
-    const HDataHandle input = inputGeometryHandle(block, multiIndex, status);
+    const HDataHandle geometry = inputGeometryHandle(block, multiIndex, status);
     if (status.error())
         return reported(status, sourceUnit::node);
-    if (input.type() != HFnData::kMesh) {
+    if (geometry.type() != HFnData::kMesh) {
         raiseMessage<Text::kErrorMLInputGeomInvalid>(displayErrorGated);
         return HStatus::kFailure;
     }
-    return readMeshPoints(input, data, points, true);
+    return readMeshPoints(geometry, data, points, true);
 }
 
 HStatus neuralWarpNode::readSmoothedRestPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
@@ -141,16 +141,16 @@ HStatus neuralWarpNode::readTargetPoints(const neuralWarpData& data, std::uint32
         return HStatus::kFailure;
     }
     const PlugData target(source);
-    const HFnGeometryData geometry(target.handle.data(), &status);
+    const HFnGeometryData targetData(target.handle.data(), &status);
     if (status.error())
         return reported(status, sourceUnit::node);
     readGeometryPoints(target.handle, points, data.componentMap);
     return HStatus::kSuccess;
 }
 
-bool neuralWarpNode::readTargetMorph(HDataBlock& block, std::uint32_t multiIndex, double& envelope, Points& points,
+bool neuralWarpNode::readTargetMorph(HDataBlock& block, std::uint32_t multiIndex, double& morphEnvelope, Points& points,
                                      HStatus& status) {
-    envelope = 0.0;
+    morphEnvelope = 0.0;
     const bool isEnabled = block.inputValue(targetMorphEnabled, &status).asBool();
     if (reported(status, sourceUnit::node).error() || !isEnabled)
         return false;
@@ -158,13 +158,13 @@ bool neuralWarpNode::readTargetMorph(HDataBlock& block, std::uint32_t multiIndex
     if (reported(status, sourceUnit::node).error())
         return false;
     if (std::abs(wanted) < smallestMorphEnvelope) {
-        envelope = wanted;
+        morphEnvelope = wanted;
         return false;
     }
     status = readMorphPoints(block, multiIndex, points);
     if (status.error())
         return false;
-    envelope = wanted;
+    morphEnvelope = wanted;
     return true;
 }
 

@@ -64,9 +64,9 @@ HStatus neuralWarpNode::getVertexDeltas(HDoubleArray& out, std::uint32_t multiIn
         TrainingPoints points;
         if (const HStatus status = readTrainingPoints(*data, block, multiIndex, type, points); status.error())
             return reported(status, sourceUnit::node);
-        return isSurfaceType(type) ? surfaceDeltas(out, *data, block, multiIndex, type, points)
-                                   : pointDifferences(out, points.target, needsInputPoints(type) ? points.input
-                                                                                                 : points.rest);
+        return isSurfaceType(type)
+                   ? surfaceDeltas(out, *data, block, multiIndex, type, points)
+                   : pointDifferences(out, points.target, needsInputPoints(type) ? points.input : points.rest);
     });
 }
 
