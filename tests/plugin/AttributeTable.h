@@ -14,6 +14,7 @@ using Fields = std::map<std::string, std::string>;
 
 struct Table {
     std::map<std::string, Fields> attributes; ///< by long name
+    std::vector<std::string> names;           ///< long names, in order of creation; of a type they are not known
     /// Names in their order, by parent; "" for those that have none.
     std::map<std::string, std::vector<std::string>> order;
     std::vector<std::string> dependencies; ///< "FROM -> TO" or "FROM -> TO tree", in order of declaration

@@ -52,7 +52,6 @@ TEST_F(NodeHooksTest, ANewNodeGetsFoldersBelowTheWorkspaceRoot) {
         {"/work", nullptr, "/workneuralWarp/models", "/workcache/neuralWarp/trainingData"},
         {"", nullptr, "neuralWarp/models", "cache/neuralWarp/trainingData"},
         {"/work/", "HGlobal::executeCommand", "neuralWarp/models", "cache/neuralWarp/trainingData"},
-        {"/work/", "HPxCommand::setResult", "neuralWarp/models", "cache/neuralWarp/trainingData"},
         {"/work/", "HCommandResult::getResult", "neuralWarp/models", "cache/neuralWarp/trainingData"},
     };
     for (const auto& row : rows) {

@@ -91,6 +91,7 @@ void readAttribute(const std::string& line, Table& table) {
     fields["parent"] = columns[6];
     if (!table.attributes.emplace(columns[0], fields).second)
         throw std::runtime_error("'" + columns[0] + "' stands there twice");
+    table.names.push_back(columns[0]);
     if (!columns[6].empty())
         table.order[columns[6]].push_back(columns[0]);
 }
@@ -140,6 +141,12 @@ Table readTable(const std::string& path) {
             throw std::runtime_error(path + ", line " + std::to_string(number) + ": " + error.what());
         }
     }
+    std::size_t placed = 0;
+    for (const auto& [parent, children] : table.order)
+        placed += children.size();
+    if (placed != table.names.size())
+        throw std::runtime_error(path +
+                                 ": an attribute without a parent is not added, or one is added that is not there");
     return table;
 }
 
