@@ -48,11 +48,11 @@ TEST_F(NodeHooksTest, ANewNodeGetsFoldersBelowTheWorkspaceRoot) {
         const char* models;
         const char* training;
     } rows[] = {
-        {"/work/", nullptr, "/work/neuralWarp/models", "/work/cache/neuralWarp/trainingData"},
-        {"/work", nullptr, "/workneuralWarp/models", "/workcache/neuralWarp/trainingData"},
+        {"/hand/", nullptr, "/hand/neuralWarp/models", "/hand/cache/neuralWarp/trainingData"},
+        {"/hand", nullptr, "/handneuralWarp/models", "/handcache/neuralWarp/trainingData"},
         {"", nullptr, "neuralWarp/models", "cache/neuralWarp/trainingData"},
-        {"/work/", "HGlobal::executeCommand", "neuralWarp/models", "cache/neuralWarp/trainingData"},
-        {"/work/", "HCommandResult::getResult", "neuralWarp/models", "cache/neuralWarp/trainingData"},
+        {"/hand/", "HGlobal::executeCommand", "neuralWarp/models", "cache/neuralWarp/trainingData"},
+        {"/hand/", "HCommandResult::getResult", "neuralWarp/models", "cache/neuralWarp/trainingData"},
     };
     for (const auto& row : rows) {
         SCOPED_TRACE(std::string(row.root) + (row.fault ? row.fault : ""));
