@@ -8,6 +8,7 @@ void addBuiltins(CommandRegistry& registry) {
     addDuplicate(registry);
     addFileCommand(registry);
     addGetAttr(registry);
+    addMeshInfo(registry);
     addNodeCommands(registry);
     addPluginCommands(registry);
     addSceneCommands(registry);

@@ -12,6 +12,7 @@ void addConnectionCommands(CommandRegistry& registry);
 void addDuplicate(CommandRegistry& registry);
 void addFileCommand(CommandRegistry& registry);
 void addGetAttr(CommandRegistry& registry);
+void addMeshInfo(CommandRegistry& registry);
 void addNodeCommands(CommandRegistry& registry);
 void addPluginCommands(CommandRegistry& registry);
 void addSceneCommands(CommandRegistry& registry);
