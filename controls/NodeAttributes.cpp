@@ -14,9 +14,9 @@ void NodeAttributes::setFlags(const HObject& attribute, const AttributeFlags& fl
     HFnAttribute set(attribute);
     note(set.setArray(flags.array));
     note(set.setUsesArrayDataBuilder(flags.builder));
-    note(set.setReadable(true));
     note(set.setWritable(flags.writable));
-    note(set.setKeyable(flags.keyable));
+    if (!flags.keyable)
+        note(set.setKeyable(false));
     note(set.setDisconnectBehavior(flags.onDisconnect));
 }
 

@@ -13,7 +13,7 @@ struct AttributeFlags {
     bool array = false;
     bool builder = false;
     bool writable = true;
-    bool keyable = true;
+    bool keyable = true; ///< if its kind is
     HFnAttribute::DisconnectBehavior onDisconnect = HFnAttribute::kNothing;
 };
 

@@ -7,7 +7,7 @@
 namespace neuralWarp {
 
 /// output[k] is the k-th value of inputList[i].input[j], ascending in i, then in j. docs/controlNodes.md lists the
-/// attributes; limits and sampling settings are kept for the trainer and affect nothing here.
+/// attributes; limits and sampling settings are kept with the scene for other tools and affect nothing here.
 class controlCollectorNode final : public HPxNode {
 public:
     static const HTypeId id;

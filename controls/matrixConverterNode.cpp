@@ -51,6 +51,7 @@ HObject makeConversion(NodeAttributes& attributes) {
     HStatus status;
     HObject attribute = set.create("rotationConversion", "rc", ChannelChoice::kEuler, &status);
     attributes.note(status);
+    attributes.note(set.setKeyable(false));
     attributes.note(set.addField(messageText(Text::kEuler), ChannelChoice::kEuler));
     attributes.note(set.addField(messageText(Text::kQuaternion), ChannelChoice::kQuaternion));
     attributes.note(set.addField(messageText(Text::kDoubleAxis), ChannelChoice::kDoubleAxis));

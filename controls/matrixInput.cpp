@@ -1,7 +1,20 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "controls/matrixInput.h"
 
+#include "openquarn/HFnAttribute.h"
+
+#include <string>
+
 namespace neuralWarp {
+namespace {
+
+HStatus noMatrix(const HArrayDataHandle& matrices, const HDataHandle& element, const HStatus& status) {
+    return {status.statusCode(), HFnAttribute(element.attribute()).name().asStdString() + '[' +
+                                     std::to_string(matrices.elementIndex()) +
+                                     "] holds no matrix: " + status.errorString().asStdString()};
+}
+
+} // namespace
 
 HStatus readMatrix(HArrayDataHandle& matrices, unsigned& logicalIndex, HMatrix& matrix) {
     HStatus status;
@@ -10,7 +23,7 @@ HStatus readMatrix(HArrayDataHandle& matrices, unsigned& logicalIndex, HMatrix& 
         return status;
     const HFnMatrixData data(element.data(), &status);
     if (status.error())
-        return status;
+        return noMatrix(matrices, element, status);
     matrix = data.matrix();
     logicalIndex = matrices.elementIndex(&status);
     return status;

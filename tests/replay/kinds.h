@@ -15,6 +15,9 @@ Json replayMatrix(Input& input, JsonAllocator& allocator);
 Json replayMesh(Input& input, JsonAllocator& allocator);
 Json replayMetadata(Input& input, JsonAllocator& allocator);
 Json replayPrincipal(Input& input, JsonAllocator& allocator);
+Json replayCollector(Input& input, JsonAllocator& allocator);
+Json replayConverter(Input& input, JsonAllocator& allocator);
+Json replayOrtho(Input& input, JsonAllocator& allocator);
 
 // A kind of case. A null replay: the code it exercises does not exist yet.
 struct Kind {
@@ -23,9 +26,9 @@ struct Kind {
 };
 
 inline constexpr Kind kinds[] = {
-    {"val3", replayVal3},           {"matrix", replayMatrix}, {"mesh", replayMesh},   {"metadata", replayMetadata},
-    {"principal", replayPrincipal}, {"collector", nullptr},   {"converter", nullptr}, {"ortho", nullptr},
-    {"scenario", nullptr},
+    {"val3", replayVal3},           {"matrix", replayMatrix},       {"mesh", replayMesh},
+    {"metadata", replayMetadata},   {"principal", replayPrincipal}, {"collector", replayCollector},
+    {"converter", replayConverter}, {"ortho", replayOrtho},         {"scenario", nullptr},
 };
 
 } // namespace replay

@@ -1,0 +1,193 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the three nodes have in common: their attributes, their profile, the way from matrices to control values.
+#include "controls/ControlsTest.h"
+
+#include "controls/guard.h"
+#include "openquarn/HFnAttribute.h"
+#include "openquarn/HFnDependencyNode.h"
+#include "openquarn/HNodeClass.h"
+#include "openquarn_app/Profiling.h"
+#include "support/TemporaryFolder.h"
+
+#include <rapidjson/document.h>
+#include <rapidjson/istreamwrapper.h>
+
+#include <fstream>
+#include <functional>
+#include <stdexcept>
+
+namespace {
+
+using ::testing::ElementsAre;
+using ::testing::IsEmpty;
+using ::testing::SizeIs;
+
+using ControlNodes = ControlsTest;
+
+// "name short, kind default, limits, labels, flags"
+std::string described(const HNodeClass& type, const std::string& path) {
+    const HObject object = type.attribute(path.substr(path.rfind('.') + 1));
+    const HFnAttribute attribute(object);
+    std::string text = path + ' ' + attribute.shortName().asStdString();
+    if (const HFnNumericAttribute number(object); number.numericType() != HFnNumericData::kInvalid) {
+        text += ", n" + std::to_string(number.numericType()) + ' ' + OpenQuarn::printedValue(number.defaultValue());
+        text += number.hasMin() ? ", min " + OpenQuarn::printedValue(number.getMin()) : "";
+        text += number.hasMax() ? ", max " + OpenQuarn::printedValue(number.getMax()) : "";
+    }
+    if (const HFnTypedAttribute typed(object); typed.attrType() != HFnData::kInvalid)
+        text += ", d" + std::to_string(typed.attrType());
+    HStatus hasLabel;
+    const HFnEnumAttribute choice(object);
+    for (short value = 0; value < 5; ++value)
+        if (const HString label = choice.fieldName(value, &hasLabel); !hasLabel.error())
+            text += ", " + label.asStdString();
+    const std::pair<bool, const char*> flags[] = {
+        {attribute.isArray(), ", array"},
+        {attribute.usesArrayDataBuilder(), ", builder"},
+        {!attribute.isReadable(), ", unreadable"},
+        {!attribute.isWritable(), ", output"},
+        {!attribute.isKeyable(), ", unkeyable"},
+        {!attribute.isStorable(), ", unstored"},
+        {attribute.isHidden(), ", hidden"},
+        {attribute.disconnectBehavior() == HFnAttribute::kDelete, ", delete"},
+        {attribute.disconnectBehavior() == HFnAttribute::kReset, ", reset"},
+    };
+    for (const auto& [holds, flag] : flags)
+        text += holds ? flag : "";
+    return text;
+}
+
+// what scenes, rigs and the trainer rely on
+TEST_F(ControlNodes, AttributesAreTheOnesThatScenesRelyOn) {
+    const struct {
+        const char* type;
+        unsigned id;
+        std::vector<std::string> attributes; // in their order
+    } types[] = {
+        {"controlCollector",
+         0x58000973,
+         {"inputList inl, array, builder, unkeyable, delete", "inputList.input in, n5 0, array, delete",
+          "limitsList liml, array, builder, unkeyable, delete", "limitsList.limits lim, array, unkeyable, delete",
+          "limitsList.limits.minValue mnv, n5 0, unkeyable", "limitsList.limits.maxValue mxv, n5 1, unkeyable",
+          "limitsList.limits.defaultValue dv, n5 0, unkeyable", "samples sa, n3 1000, min 1, unkeyable",
+          "activationRate ar, n5 0.2, min 0, max 1, unkeyable", "samplesStartFrame ssf, n3 1, unkeyable",
+          "output out, n5 0, array, builder, output"}},
+        {"orthoAxisFromMatrixArray",
+         0x58000974,
+         {"input in, d5, array, unkeyable, delete", "outputList outl, array, builder, unkeyable, delete",
+          "outputList.output out, n5 0, array, builder"}},
+        {"matrixConverter",
+         0x58000975,
+         {"input in, d5, array, unkeyable, delete", "extractRotation er, n1 1, unkeyable",
+          "extractScale es, n1 1, unkeyable", "extractTranslation et, n1 1, unkeyable", "rotationX rx, n1 1, unkeyable",
+          "rotationY ry, n1 1, unkeyable", "rotationZ rz, n1 1, unkeyable", "scaleX sx, n1 1, unkeyable",
+          "scaleY sy, n1 1, unkeyable", "scaleZ sz, n1 1, unkeyable", "translationX tx, n1 1, unkeyable",
+          "translationY ty, n1 1, unkeyable", "translationZ tz, n1 1, unkeyable",
+          "rotationConversion rc, Euler, Quaternion, Double Axis, Triple Axis, unkeyable",
+          "flatOutput fout, n5 0, array, builder, output, delete",
+          "outputList outl, array, builder, output, unkeyable, delete",
+          "outputList.output out, n5 0, array, builder, output, delete"}},
+    };
+    for (const auto& [typeName, id, attributes] : types) {
+        const HNodeClass type(typeName);
+        EXPECT_EQ(type.typeId().id(), id);
+        testNodes::create(typeName, "n");
+        std::vector<std::string> listed;
+        const auto paths = std::get<std::vector<std::string>>(run("listAttr n"));
+        for (const std::string& path : paths)
+            if (path != "message")
+                listed.push_back(described(type, path));
+        EXPECT_EQ(listed, attributes);
+        run("deleteNode n");
+    }
+}
+
+TEST_F(ControlNodes, NothingIsThrownAtTheHost) {
+    const HPxNode& node = *HFnDependencyNode(testNodes::create("controlCollector", "c")).userNode();
+    const auto statusOf = [&](const std::function<void()>& raise) {
+        const HStatus status = neuralWarp::guardedCompute(node, "compute", [&]() -> HStatus {
+            raise();
+            return HStatus::kNotFound;
+        });
+        return std::to_string(status.statusCode()) + ' ' + testNodes::text(status);
+    };
+    EXPECT_EQ(statusOf([] {}), "6 not found");
+    EXPECT_EQ(statusOf([] { throw std::bad_alloc(); }), "2 out of memory");
+    EXPECT_EQ(statusOf([] { throw std::runtime_error("too far"); }), "1 node 'c', compute: too far");
+    EXPECT_EQ(statusOf([] { throw 1; }), "1 node 'c', compute: unknown exception");
+}
+
+TEST_F(ControlNodes, EveryComputeShowsInTheProfile) {
+    run("createNode controlCollector -name c; createNode matrixConverter -name m;"
+        "createNode orthoAxisFromMatrixArray -name o");
+    OpenQuarn::Profiling::start();
+    for (const char* output : {"c.output", "m.flatOutput", "o.outputList"})
+        EXPECT_FALSE(OpenQuarn::evaluate(testNodes::plug(output)).error());
+    OpenQuarn::Profiling::stop();
+
+    const TemporaryFolder folder;
+    OpenQuarn::Profiling::writeTrace(folder.path() / "trace.json");
+    std::ifstream file(folder.path() / "trace.json");
+    rapidjson::IStreamWrapper stream(file);
+    rapidjson::Document trace;
+    trace.ParseStream(stream);
+    std::vector<std::string> shown;
+    for (const auto& event : trace["traceEvents"].GetArray())
+        if (event["ph"] == "X" && std::string(event["name"].GetString()).ends_with("::compute"))
+            shown.push_back(std::string(event["cat"].GetString()) + ' ' + event["name"].GetString() + ' ' +
+                            event["args"]["description"].GetString() + ' ' +
+                            std::to_string(event["args"]["color"].GetInt()));
+    EXPECT_THAT(shown, ElementsAre("Evaluation controlCollectorNode::compute c 10",
+                                   "Evaluation matrixConverterNode::compute m 10",
+                                   "Evaluation orthoAxisFromMatrixArray::compute o 10"));
+}
+
+TEST_F(ControlNodes, MatricesBecomeControlValues) {
+    const std::string moved = " 1 0 0 0  0 1 0 0  0 0 1 0  4 5 6 1;";
+    run("createNode matrixConverter -name joints; setAttr joints.input[1]" + moved + "setAttr joints.input[4]" + moved +
+        "createNode matrixConverter -name m; setAttr m.extractRotation off; setAttr m.extractScale off;"
+        "createNode orthoAxisFromMatrixArray -name o; createNode controlCollector -name c;"
+        "createNode testSum -name sink;"
+        "connectAttr joints.input m.input; connectAttr joints.input[4] o.input[2];"
+        "connectAttr m.flatOutput c.inputList[0].input; connectAttr o.outputList[2].output c.inputList[3].input;"
+        "connectAttr m.outputList[4].output[0] c.inputList[7].input[0]; connectAttr c.output sink.values");
+    EXPECT_EQ(values("sink.values"), (Values{4, 5, 6, 4, 5, 6, 1, 0, 0, 0, 1, 0, 4}));
+
+    run("setAttr joints.input[4] 0 1 0 0  -1 0 0 0  0 0 1 0  7 8 9 1; setAttr m.translationY off");
+    EXPECT_EQ(values("sink.values"), (Values{4, 6, 7, 9, 0, 1, 0, -1, 0, 0, 7}));
+
+    removeElement("joints.input[1]");
+    EXPECT_EQ(values("sink.values"), (Values{7, 9, 0, 1, 0, -1, 0, 0, 7}));
+    EXPECT_THAT(indices("sink.values"), SizeIs(9));
+
+    run("disconnectAttr joints.input m.input; disconnectAttr o.outputList[2].output c.inputList[3].input");
+    EXPECT_THAT(indices("c.inputList[3].input"), IsEmpty());
+    removeElement("m.input[4]");                   // a list that is no longer connected keeps its matrices
+    EXPECT_EQ(values("sink.values"), (Values{7})); // outputList[4] stays as it was
+}
+
+TEST_F(ControlNodes, ThePagesExamplesGiveWhatThePageSays) {
+    std::ifstream page(NW_CONTROL_NODES_PAGE);
+    ASSERT_TRUE(page) << NW_CONTROL_NODES_PAGE;
+    bool inExample = false;
+    int compared = 0;
+    for (std::string line; std::getline(page, line);) {
+        if (line.starts_with("```")) {
+            inExample = line == "```quarn";
+            if (inExample)
+                run("file -new");
+            continue;
+        }
+        if (!inExample)
+            continue;
+        const std::string result = OpenQuarn::printedValue(run(line));
+        const std::string promise = "# gives ";
+        if (const auto at = line.find(promise); at != std::string::npos) {
+            EXPECT_EQ(result, line.substr(at + promise.size())) << line;
+            ++compared;
+        }
+    }
+    EXPECT_GE(compared, 8);
+}
+
+} // namespace
