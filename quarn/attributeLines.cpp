@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <array>
 #include <charconv>
+#include <cmath>
 #include <cstdio>
 #include <iterator>
 
@@ -91,10 +92,13 @@ std::string affectsText(const std::string& name, const std::vector<OpenQuarn::Af
 } // namespace
 
 std::string numberText(double value, bool isFloat) {
-    std::array<char, 32> digits{};
+    const double size = std::fabs(value);
+    const bool isPlain = size == 0.0 || (size >= 1e-6 && size < 1e15);
+    const std::chars_format format = isPlain ? std::chars_format::fixed : std::chars_format::general;
+    std::array<char, 64> digits{};
     char* const end = digits.data() + digits.size();
-    const auto result = isFloat ? std::to_chars(digits.data(), end, static_cast<float>(value))
-                                : std::to_chars(digits.data(), end, value);
+    const auto result = isFloat ? std::to_chars(digits.data(), end, static_cast<float>(value), format)
+                                : std::to_chars(digits.data(), end, value, format);
     return {digits.data(), result.ptr};
 }
 

@@ -23,7 +23,7 @@ std::string attributeJson(const AttributeList& list);
 /// new attribute of that kind.
 std::string attributeLines(const AttributeList& list);
 
-/// In the fewest digits that read back the same.
+/// In the fewest digits that read back the same; with an exponent below a millionth and from 10^15.
 std::string numberText(double value, bool isFloat);
 
 /// Of a matrix, row by row, or of a list of doubles.

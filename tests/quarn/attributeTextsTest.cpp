@@ -31,10 +31,10 @@ quarn::AttributeList everything() {
     AttributeInfo ratio = plain("ratio", HFn::kNumericAttribute, "float");
     ratio.parent = "group";
     ratio.defaultNumber = static_cast<double>(0.2F);
-    ratio.min = -1.0;
+    ratio.min = -100000.0;
     ratio.max = std::numeric_limits<double>::infinity();
-    ratio.softMin = 0.1;
-    ratio.softMax = 0.5;
+    ratio.softMin = 0.0001;
+    ratio.softMax = 1e20;
     ratio.keyable = ratio.readable = ratio.storable = false;
     AttributeInfo choice = plain("choice", HFn::kEnumAttribute, "enum");
     choice.defaultNumber = 3.0;
@@ -59,16 +59,17 @@ quarn::AttributeList everything() {
 }
 
 TEST(AttributeTextsTest, LinesSayWhatIsNotAsUsual) {
-    EXPECT_EQ(quarn::attributeLines(everything()),
-              "group (g): array of compound, inherited; affects state (with what is below)\n"
-              "  ratio (r): float = 0.2, min -1, max inf, soft min 0.1, soft max 0.5, not readable, not storable, "
-              "not keyable\n"
-              "choice (c): enum {0 None, 3 Two \"words\"} = 3, reset when disconnected\n"
-              "on (o): bool = true; affects state\n"
-              "path (p): string = \"a b\", keyable, file name\n"
-              "matrix (m): matrix = [1 0 0 0 0 1 0 0 0 0 1 0 0 0 0 1]\n"
-              "state (s): pluginData 0x58000972, not writable, not connectable, hidden, index does not matter, "
-              "array data builder, deleted when disconnected\n");
+    EXPECT_EQ(
+        quarn::attributeLines(everything()),
+        "group (g): array of compound, inherited; affects state (with what is below)\n"
+        "  ratio (r): float = 0.2, min -100000, max inf, soft min 0.0001, soft max 1e+20, not readable, not storable, "
+        "not keyable\n"
+        "choice (c): enum {0 None, 3 Two \"words\"} = 3, reset when disconnected\n"
+        "on (o): bool = true; affects state\n"
+        "path (p): string = \"a b\", keyable, file name\n"
+        "matrix (m): matrix = [1 0 0 0 0 1 0 0 0 0 1 0 0 0 0 1]\n"
+        "state (s): pluginData 0x58000972, not writable, not connectable, hidden, index does not matter, "
+        "array data builder, deleted when disconnected\n");
 }
 
 // each row: where in the JSON, and what stands there
@@ -97,10 +98,10 @@ TEST(AttributeTextsTest, JsonSaysEverything) {
         {1, "dataTypeId", "null"},
         {1, "fields", "null"},
         {1, "default", "0.2"},
-        {1, "min", "-1"},
+        {1, "min", "-100000"},
         {1, "max", R"("inf")"},
-        {1, "softMin", "0.1"},
-        {1, "softMax", "0.5"},
+        {1, "softMin", "0.0001"},
+        {1, "softMax", "1e20"},
         {1, "readable", "false"},
         {1, "storable", "false"},
         {1, "keyable", "false"},
