@@ -7,24 +7,35 @@
 namespace bench {
 namespace {
 
-constexpr const char* usage = "usage: %s [--seconds S] [--only PHASE] [--csv FOLDER]\n"
+constexpr const char* usage = "usage: %s [--quick] [--seconds S] [--only PHASE] [--csv FOLDER]\n"
+                              "  --quick       fewer and shorter rows\n"
                               "  --seconds S   time for each row (default 0.4)\n"
                               "  --only PHASE  phases whose name begins so\n"
                               "  --csv FOLDER  where the rows go as NAME.csv as well (default: beside the program)\n";
 
 bool parse(int argc, char** argv, Options& options, std::filesystem::path& folder) {
-    for (int i = 1; i + 1 < argc; i += 2) {
+    bool hasSeconds = false;
+    for (int i = 1; i < argc; ++i) {
         const std::string name = argv[i];
+        if (name == "--quick") {
+            options.isQuick = true;
+            continue;
+        }
+        if (++i == argc)
+            return false;
         if (name == "--csv")
-            folder = argv[i + 1];
+            folder = argv[i];
         else if (name == "--seconds")
-            options.seconds = std::atof(argv[i + 1]);
+            options.seconds = std::atof(argv[i]);
         else if (name == "--only")
-            options.only = argv[i + 1];
+            options.only = argv[i];
         else
             return false;
+        hasSeconds = hasSeconds || name == "--seconds";
     }
-    return argc % 2 == 1 && options.seconds > 0.0;
+    if (options.isQuick && !hasSeconds)
+        options.seconds = 0.1;
+    return options.seconds > 0.0;
 }
 
 } // namespace

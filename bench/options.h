@@ -16,6 +16,8 @@ struct CloseFile {
 struct Options {
     double seconds = 0.4; // for each row
     std::string only;     // phases whose name begins so
+    bool isQuick = false; // fewer and shorter rows, where a program has many
+    bool wants(const std::string& phase) const { return phase.rfind(only, 0) == 0; }
     std::string csvPath;
     std::unique_ptr<std::FILE, CloseFile> csv; // opened for writing
 };

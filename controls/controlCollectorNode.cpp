@@ -3,7 +3,7 @@
 
 #include "controls/NodeAttributes.h"
 #include "controls/arrayOutput.h"
-#include "controls/guard.h"
+#include "controls/guardedCompute.h"
 #include "openquarn/HDGModifier.h"
 
 #include <vector>

@@ -3,7 +3,7 @@
 
 #include "controls/NodeAttributes.h"
 #include "controls/arrayOutput.h"
-#include "controls/guard.h"
+#include "controls/guardedCompute.h"
 #include "controls/matrixChannels.h"
 #include "controls/matrixInput.h"
 #include "messages/messageText.h"
@@ -51,7 +51,7 @@ HObject makeConversion(NodeAttributes& attributes) {
     HStatus status;
     HObject attribute = set.create("rotationConversion", "rc", ChannelChoice::kEuler, &status);
     attributes.note(status);
-    attributes.note(set.setKeyable(false));
+    attributes.setFlags(attribute, {.keyable = false});
     attributes.note(set.addField(messageText(Text::kEuler), ChannelChoice::kEuler));
     attributes.note(set.addField(messageText(Text::kQuaternion), ChannelChoice::kQuaternion));
     attributes.note(set.addField(messageText(Text::kDoubleAxis), ChannelChoice::kDoubleAxis));

@@ -4,7 +4,7 @@
 #include "controls/NodeAttributes.h"
 #include "controls/arrayOutput.h"
 #include "controls/axes.h"
-#include "controls/guard.h"
+#include "controls/guardedCompute.h"
 #include "controls/matrixInput.h"
 
 #include <array>

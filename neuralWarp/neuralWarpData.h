@@ -3,6 +3,7 @@
 #pragma once
 
 #include "neuralWarp/DeltaSettings.h"
+#include "neuralWarp/PhaseClock.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
 #include "openquarn/HPxData.h"
@@ -112,6 +113,12 @@ public:
     /// For whoever looks for a fault: when set, each evaluation leaves the raw outputs of the network here; empty when
     /// it did not run. Not owned.
     std::vector<float>* observedOutputs = nullptr;
+    /// For benchmarks: when set, each evaluation starts it, and laps it as it goes. Not owned.
+    PhaseClock* phases = nullptr;
+    void endPhase(Phase phase) const {
+        if (phases)
+            phases->lap(phase);
+    }
 };
 
 } // namespace neuralWarp

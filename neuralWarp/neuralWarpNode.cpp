@@ -2,8 +2,8 @@
 // The life of the node: its making, its state of each geometry, and what is asked of it beside evaluation.
 #include "neuralWarp/neuralWarpNode.h"
 
+#include "messages/guard.h"
 #include "messages/sourceUnits.h"
-#include "neuralWarp/guard.h"
 #include "neuralWarp/namedBuffers.h"
 #include "neuralWarp/neuralWarpUtils.h"
 #include "openquarn/HCommandResult.h"

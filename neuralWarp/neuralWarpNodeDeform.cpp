@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // The evaluation of one geometry.
 #include "messages/displayErrorGated.h"
+#include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
 #include "neuralWarp/blend.h"
 #include "neuralWarp/deltas.h"
-#include "neuralWarp/guard.h"
 #include "neuralWarp/neuralWarpNode.h"
 #include "neuralWarp/neuralWarpUtils.h"
 #include "openquarn/HProfilingScope.h"
@@ -99,6 +99,8 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
         return HStatus::kFailure;
     if (data->observedOutputs)
         data->observedOutputs->clear();
+    if (data->phases)
+        data->phases->start();
     if (data->exportMode) {
         data->modelApplied = false;
         return HStatus::kSuccess;
@@ -125,6 +127,8 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     }
     isActive = isActive && data->canApplyModel() && !data->drivesNothing();
     data->modelApplied = isActive;
+
+    data->endPhase(Phase::prepare);
 
     Points result;
     if (isActive) {
@@ -158,7 +162,9 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
     std::vector<float> controls;
     if (const HStatus status = gatherControlValues(block, data.session.inputCount(), controls); status.error())
         return reported(status, sourceUnit::node);
+    data.endPhase(Phase::gather);
     const std::vector<float> outputs = runNetwork(data, controls);
+    data.endPhase(Phase::network);
 
     const HProfilingScope scope(evaluationCategory(), 9, "ApplyDeltas", name());
     Points points;
@@ -169,10 +175,11 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
         return misfit("the input geometry", points.size(), count);
     if (const HStatus status = checkOutputs(data, outputs); status.error())
         return status;
+    data.endPhase(Phase::points);
     result.resize(count);
-    const DrivenVertices driven(data);
     Points deltas;
-    extractDeltas(deltas, data, outputs, driven);
+    extractDeltas(deltas, data, outputs, DrivenVertices(data));
+    data.endPhase(Phase::deltas);
     return applyDeltas(data, points, deltas, result);
 }
 
@@ -187,8 +194,10 @@ std::vector<float> neuralWarpNode::runNetwork(neuralWarpData& data, const std::v
 HStatus neuralWarpNode::applyDeltas(const neuralWarpData& data, const Points& points, const Points& deltas,
                                     Points& result) const {
     const DrivenVertices driven(data);
-    if (data.activeSettings.deltaMode == kOffsetMode)
+    if (data.activeSettings.deltaMode == kOffsetMode) {
         applyOffsets(result, points, deltas, driven);
+        data.endPhase(Phase::apply);
+    }
     if (!data.activeSettings.isSurface())
         return HStatus::kSuccess;
     if (data.restPoints.size() < points.size() || data.restFramesInverse.size() < points.size())
@@ -196,7 +205,9 @@ HStatus neuralWarpNode::applyDeltas(const neuralWarpData& data, const Points& po
                       points.size());
     std::vector<quill::mat4d> frames;
     calculateVertexFrames(data, frames, points, false, driven.vertices);
+    data.endPhase(Phase::frames);
     transportDeltas(result, data, frames, deltas, driven);
+    data.endPhase(Phase::apply);
     return HStatus::kSuccess;
 }
 
@@ -215,8 +226,12 @@ HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, s
         return reported(status, sourceUnit::node);
     if (positions.length() != count || !blend.fits(count))
         return misfit("the deformed geometry", positions.length(), count);
+    blend.data->endPhase(Phase::fetch);
     blendPositions(positions, vertexWeights, blend);
-    return reported(iterator.setAllPositions(positions, HSpace::kObject), sourceUnit::node);
+    blend.data->endPhase(Phase::blend);
+    status = iterator.setAllPositions(positions, HSpace::kObject);
+    blend.data->endPhase(Phase::writeBack);
+    return reported(status, sourceUnit::node);
 }
 
 } // namespace neuralWarp

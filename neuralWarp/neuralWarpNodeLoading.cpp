@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // From the attributes of the node to a loaded model.
 #include "messages/displayErrorGated.h"
+#include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
-#include "neuralWarp/guard.h"
 #include "neuralWarp/neuralWarpNode.h"
 #include "neuralWarp/neuralWarpUtils.h"
 #include "nw_model/PrincipalShapes.h"

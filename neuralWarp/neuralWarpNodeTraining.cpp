@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // Training deltas: what a model would have to predict for the geometry to become its target.
+#include "messages/guard.h"
 #include "messages/sourceUnits.h"
 #include "neuralWarp/geometryReaders.h"
-#include "neuralWarp/guard.h"
 #include "neuralWarp/neuralWarpNode.h"
 #include "neuralWarp/neuralWarpUtils.h"
 #include "openquarn/HFnMesh.h"

@@ -2,7 +2,7 @@
 // What the three nodes have in common: their attributes, their profile, the way from matrices to control values.
 #include "controls/ControlsTest.h"
 
-#include "controls/guard.h"
+#include "controls/guardedCompute.h"
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HNodeClass.h"
@@ -164,6 +164,23 @@ TEST_F(ControlNodes, MatricesBecomeControlValues) {
     EXPECT_THAT(indices("c.inputList[3].input"), IsEmpty());
     removeElement("m.input[4]");                   // a list that is no longer connected keeps its matrices
     EXPECT_EQ(values("sink.values"), (Values{7})); // outputList[4] stays as it was
+}
+
+TEST_F(ControlNodes, OnSeveralThreadsTheyGiveTheSame) {
+    run("createNode matrixConverter -name m; createNode orthoAxisFromMatrixArray -name o;"
+        "connectAttr m.input o.input; setAttr m.input[3] 0 2 0 0  -3 0 0 0  0 0 4 0  5 6 7 1");
+    HPlugArray outputs;
+    for (int i = 0; i < 40; ++i) {
+        const std::string name = "c" + std::to_string(i);
+        run("createNode controlCollector -name " + name + "; connectAttr m.flatOutput " + name +
+            ".inputList[0].input; connectAttr o.outputList[3].output " + name + ".inputList[1].input");
+        outputs.push_back(testNodes::plug(name + ".output"));
+    }
+    EXPECT_FALSE(OpenQuarn::evaluate(outputs, true).error());
+    for (const HPlug& output : outputs)
+        EXPECT_EQ(values(output.name().asStdString()), values("c0.output"));
+    EXPECT_THAT(values("c0.output"), SizeIs(15));
+    EXPECT_EQ(OpenQuarn::computeCount(testNodes::plug("o.input").node()), 1U);
 }
 
 TEST_F(ControlNodes, ThePagesExamplesGiveWhatThePageSays) {

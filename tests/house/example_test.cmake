@@ -1,5 +1,5 @@
 # Installs the build tree BUILD into an empty prefix, builds the sample plug-in there as a project of its own, and has
-# the installed quarn run its script.
+# the installed quarn run its script; then the installed plug-in moves the example scene.
 function(must_run)
   execute_process(COMMAND ${ARGN} RESULT_VARIABLE status OUTPUT_VARIABLE output ERROR_VARIABLE errors)
   if(NOT status EQUAL 0)
@@ -20,4 +20,11 @@ must_run("${EXPORTS}" "${WORK}/minimal/build/minimal.so")
 must_run("${WORK}/moved/bin/quarn" exec --plugin "${WORK}/minimal/build/minimal.so" "${WORK}/minimal/demo.txt")
 if(NOT output STREQUAL "lift\n0.2\npush\n0.4\n2\n")
   message(FATAL_ERROR "the script of the sample plug-in printed:\n${output}")
+endif()
+
+must_run(${CMAKE_COMMAND} -E chdir "${SOURCE}" "${WORK}/moved/bin/quarn" exec
+  --plugin "${WORK}/moved/lib/OpenQuarn/plug-ins/neuralWarp.so" examples/wave/evaluate.txt)
+file(READ "${SOURCE}/examples/wave/expected.txt" expected)
+if(NOT output STREQUAL expected)
+  message(FATAL_ERROR "the example scene printed:\n${output}")
 endif()

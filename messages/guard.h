@@ -11,10 +11,10 @@
 namespace neuralWarp {
 
 /// The status of the exception that is being handled, for an operation of a node: kInsufficientMemory for a lack of
-/// memory, else kFailure, with a text that names the node and the operation.
+/// memory, else kFailure with "node 'NAME', OPERATION: WHAT". [any]
 HStatus statusOfException(const HPxNode& node, const char* operation) noexcept;
 
-/// Runs `body`, which returns a status; what it throws becomes one.
+/// Runs `body`, which returns a status; what it throws becomes one. [any]
 template <class Body>
 HStatus guarded(const HPxNode& node, const char* operation, Body&& body) noexcept {
     try {
@@ -24,7 +24,7 @@ HStatus guarded(const HPxNode& node, const char* operation, Body&& body) noexcep
     }
 }
 
-/// The same for an operation that has no status to return: it shows an error.
+/// The same for an operation that has no status to return: it shows an error. [any]
 template <class Body>
 void guardedAndShown(const HPxNode& node, const char* operation, Body&& body) noexcept {
     try {

@@ -1,0 +1,295 @@
+// SPDX-License-Identifier: Apache-2.0
+// bench_deform: single frames of the whole deformer in the host, with where the time goes, and the product of the
+// principal shapes beside the memory's own speed.
+#include "harness.h"
+#include "options.h"
+
+#include "neuralWarp/deltas.h"
+#include "neuralWarp/support/modelFolder.h"
+#include "neuralWarp/support/warpRig.h"
+#include "openquarn_app/Evaluation.h"
+#include "openquarn_app/Messages.h"
+#include "openquarn_app/Session.h"
+#include "support/TemporaryFolder.h"
+
+#include <oneapi/tbb/global_control.h>
+
+#include <algorithm>
+#include <chrono>
+#include <cmath>
+#include <exception>
+#include <sched.h>
+#include <sys/wait.h>
+#include <thread>
+#include <unistd.h>
+
+namespace {
+
+using neuralWarp::PhaseClock;
+using neuralWarp::phaseCount;
+
+constexpr std::size_t controlCount = 16;
+
+struct Setting {
+    std::size_t side; // of the grid, in vertices
+    bool isSurface;
+    std::size_t shapes; // 0: a direct model
+    unsigned smoothing;
+};
+
+std::string modelName(const Setting& setting) {
+    return setting.shapes == 0 ? "direct" : "S=" + std::to_string(setting.shapes);
+}
+
+float noise(std::size_t i) {
+    return 0.01F * std::sin(static_cast<float>(i % 10007));
+}
+
+ModelSpec modelOf(const Setting& setting, std::size_t vertices) {
+    ModelSpec spec;
+    const std::size_t outputs = setting.shapes == 0 ? 3 * vertices : setting.shapes;
+    spec.controls = controlCount;
+    spec.bias.assign(outputs, 0.125F);
+    spec.weights.resize(controlCount * outputs);
+    for (std::size_t i = 0; i < spec.weights.size(); ++i)
+        spec.weights[i] = noise(i);
+    spec.deltaMode = setting.isSurface ? 1 : 0;
+    spec.smoothingIterations = setting.smoothing;
+    spec.fullCount = spec.affectCount = static_cast<std::uint32_t>(vertices);
+    return spec;
+}
+
+// A deformed grid whose model has been loaded.
+class Frame {
+public:
+    explicit Frame(const Setting& setting)
+        : setting_(setting)
+        , vertices_(setting.side * setting.side) {
+        warpRig::registerPlugin();
+        writeModel(folder_.path() / "model.nwrp", modelOf(setting, vertices_));
+        rig_.emplace();
+        rig_->addGeometry(0, {.mesh = warpRig::mesh(makeGrid(setting.side - 1, setting.side - 1))});
+        rig_->setModelRoot(folder_.path());
+        rig_->setControls(std::vector<double>(controlCount, 0.25));
+        output_ = rig_->output(0);
+        control_ = rig_->plug("controlValues[0]");
+        OpenQuarn::evaluate(output_); // without shapes yet, when it needs some
+        addShapes();
+        run();
+    }
+
+    // The control changes before the clock starts.
+    double run() {
+        control_.setDouble(0.001 * static_cast<double>(++frame_ % 1000));
+        const auto start = std::chrono::steady_clock::now();
+        const HStatus status = OpenQuarn::evaluate(output_);
+        const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+        if (status.error() || !state().modelApplied)
+            throw std::runtime_error("a frame failed: " + status.errorString().asStdString());
+        return seconds;
+    }
+
+    neuralWarp::neuralWarpData& state() { return *rig_->state(0); }
+    std::size_t vertices() const { return vertices_; }
+
+private:
+    // past the file: as text, a large basis takes longer to read than all frames together
+    void addShapes() {
+        neuralWarp::neuralWarpData& data = state();
+        data.principalShapeCount = setting_.shapes;
+        data.principalVertCount = setting_.shapes == 0 ? 0 : vertices_;
+        data.principalShapes.resize(3 * setting_.shapes * vertices_);
+        for (std::size_t i = 0; i < data.principalShapes.size(); ++i)
+            data.principalShapes[i] = noise(i);
+    }
+
+    Setting setting_;
+    std::size_t vertices_;
+    OpenQuarn::Session session_;
+    TemporaryFolder folder_;
+    std::optional<warpRig::Rig> rig_;
+    HPlug output_, control_;
+    unsigned frame_ = 0;
+};
+
+template <class T>
+std::size_t bytesOf(const std::vector<T>& values) {
+    return values.capacity() * sizeof(T);
+}
+
+double stateBytesPerVertex(const neuralWarp::neuralWarpData& data, std::size_t vertices) {
+    const std::size_t bytes = bytesOf(data.vertexFrames.framesPairs()) + bytesOf(data.vertexFrames.framesIndexer()) +
+                              bytesOf(data.vertexConnections.connections()) +
+                              bytesOf(data.vertexConnections.connectionsIndexer()) + bytesOf(data.connectionWeights) +
+                              bytesOf(data.affectMap) + bytesOf(data.affectedVertices) + bytesOf(data.restPoints) +
+                              bytesOf(data.restFramesInverse) + bytesOf(data.principalShapes);
+    return static_cast<double>(bytes) / static_cast<double>(vertices);
+}
+
+double quantile(std::vector<double> values, double q) {
+    std::sort(values.begin(), values.end());
+    return values[static_cast<std::size_t>(q * static_cast<double>(values.size() - 1) + 0.5)];
+}
+
+// Phases and total of each frame, after a pause of one frame time.
+struct Samples {
+    std::array<std::vector<double>, phaseCount> phases;
+    std::vector<double> total, rest;
+};
+
+Samples sample(Frame& frame, double seconds) {
+    constexpr std::size_t fewest = 20;
+    Samples samples;
+    PhaseClock clock;
+    frame.state().phases = &clock;
+    const auto start = std::chrono::steady_clock::now();
+    const auto elapsed = [&] {
+        return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    };
+    for (double last = frame.run(); samples.total.size() < fewest || elapsed() < seconds;) {
+        std::this_thread::sleep_for(std::chrono::duration<double>(last));
+        last = frame.run();
+        double known = 0.0;
+        for (std::size_t p = 0; p < phaseCount; ++p) {
+            samples.phases[p].push_back(clock.seconds[p]);
+            known += clock.seconds[p];
+        }
+        samples.total.push_back(last);
+        samples.rest.push_back(last - known);
+    }
+    frame.state().phases = nullptr;
+    return samples;
+}
+
+constexpr const char* columns[] = {"prepare", "gather", "network", "points", "deltas",
+                                   "frames",  "apply",  "fetch",   "blend",  "write"};
+
+void printHeader(std::FILE* csv) {
+    std::printf("%7s %-7s %-7s %3s %3s %8s %8s", "verts", "mode", "model", "smo", "thr", "us", "p99");
+    std::fputs("vertices,mode,model,smoothing,threads,us_median,us_p99", csv);
+    for (const char* column : columns) {
+        std::printf(" %7s", column);
+        std::fprintf(csv, ",%s_us", column);
+    }
+    std::printf(" %7s %5s %6s\n", "rest", "rest%", "B/vert");
+    std::fputs(",rest_us,rest_percent,state_bytes_per_vertex\n", csv);
+}
+
+void report(const Setting& setting, unsigned threads, Frame& frame, const Samples& samples, std::FILE* csv) {
+    const double total = quantile(samples.total, 0.5) * 1e6, p99 = quantile(samples.total, 0.99) * 1e6;
+    const double rest = quantile(samples.rest, 0.5) * 1e6;
+    const double bytes = stateBytesPerVertex(frame.state(), frame.vertices());
+    const char* mode = setting.isSurface ? "Surface" : "Offset";
+    std::printf("%7zu %-7s %-7s %3u %3u %8.0f %8.0f", frame.vertices(), mode, modelName(setting).c_str(),
+                setting.smoothing, threads, total, p99);
+    std::fprintf(csv, "%zu,%s,%s,%u,%u,%.1f,%.1f", frame.vertices(), mode, modelName(setting).c_str(),
+                 setting.smoothing, threads, total, p99);
+    for (const std::vector<double>& phase : samples.phases) {
+        std::printf(" %7.0f", quantile(phase, 0.5) * 1e6);
+        std::fprintf(csv, ",%.1f", quantile(phase, 0.5) * 1e6);
+    }
+    std::printf(" %7.0f %5.1f %6.0f\n", rest, 100.0 * rest / total, bytes);
+    std::fprintf(csv, ",%.1f,%.2f,%.1f\n", rest, 100.0 * rest / total, bytes);
+    std::fflush(stdout);
+    std::fflush(csv);
+}
+
+std::vector<Setting> settings(bool isQuick) {
+    if (isQuick)
+        return {{100, true, 20, 10}, {316, false, 20, 0}, {316, true, 50, 10}, {316, true, 0, 0}};
+    std::vector<Setting> all;
+    for (const std::size_t side : {100U, 316U, 1000U})
+        for (const bool isSurface : {false, true})
+            for (const unsigned smoothing : {0U, 10U})
+                for (const std::size_t shapes : {0U, 20U, 50U, 100U})
+                    if (side < 1000 || shapes == 20)
+                        all.push_back({side, isSurface, shapes, smoothing});
+    return all;
+}
+
+// The network's threads and ours are as many as the cores that the process may use from its start.
+void useCores(unsigned count) {
+    cpu_set_t cores;
+    CPU_ZERO(&cores);
+    for (unsigned core = 0; core < count; ++core)
+        CPU_SET(core, &cores);
+    sched_setaffinity(0, sizeof cores, &cores);
+}
+
+void benchFrames(const bench::Options& options, unsigned threads) {
+    useCores(threads);
+    const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
+    OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {}); // the shapes come after the first frame
+    for (const Setting& setting : settings(options.isQuick)) {
+        Frame frame(setting);
+        report(setting, threads, frame, sample(frame, options.seconds), options.csv.get());
+    }
+}
+
+// In a process of its own, because the network's threads are counted once.
+void inChild(const bench::Options& options, unsigned threads) {
+    std::fflush(nullptr);
+    const pid_t child = fork();
+    if (child == 0) {
+        benchFrames(options, threads);
+        std::fflush(nullptr);
+        _exit(0);
+    }
+    int status = 0;
+    if (child < 0 || waitpid(child, &status, 0) != child || status != 0)
+        throw std::runtime_error("the frames on " + std::to_string(threads) + " threads failed");
+}
+
+void benchProduct(const bench::Options& options) {
+    bench::Report table(nullptr);
+    table.header();
+    for (const std::size_t vertices : {10000U, 100000U, 1000000U})
+        for (const std::size_t shapes : {20U, 50U, 100U}) {
+            if (vertices == 1000000 && (shapes != 20 || options.isQuick))
+                continue;
+            neuralWarp::neuralWarpData data;
+            data.componentMap.setIdentity(vertices);
+            const std::vector<float> basis(3 * shapes * vertices, 0.5F), coefficients(shapes, 0.25F);
+            neuralWarp::Points deltas;
+            bench::Phase phase;
+            phase.name = "product S=" + std::to_string(shapes);
+            phase.mesh = "-";
+            phase.vertices = vertices;
+            phase.bytes = basis.size() * sizeof(float);
+            phase.ours = [&] {
+                extractPrincipalDeltas(deltas, coefficients, shapes, basis, neuralWarp::DrivenVertices(data));
+            };
+            for (const unsigned threads : {1U, 2U}) {
+                const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
+                table.add(bench::measure(phase, threads, options.seconds));
+            }
+        }
+}
+
+int run(int argc, char** argv) {
+    const auto options = bench::readOptions(argc, argv);
+    if (!options)
+        return 2;
+    if (options->wants("frames")) {
+        std::printf("single frames, each after a pause of one frame time: medians in us; rest: what the host does\n");
+        printHeader(options->csv.get());
+        for (const unsigned threads : {1U, 2U})
+            inChild(*options, threads);
+    }
+    if (options->wants("product")) {
+        std::printf("the product of the principal shapes; /limit: time over that of a triad of the same bytes\n");
+        benchProduct(*options);
+    }
+    return 0;
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return run(argc, argv);
+    } catch (const std::exception& error) {
+        std::fprintf(stderr, "bench_deform: %s\n", error.what());
+        return 1;
+    }
+}
