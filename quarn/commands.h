@@ -13,4 +13,7 @@ void execute(const std::vector<std::string>& plugins, const std::string& file);
 /// Prints what is in a scene file, for people or as JSON.
 void showInfo(const std::string& scene, bool json);
 
+/// Loads the plug-ins, then prints the attributes of a node type, for people or as JSON.
+void listAttributes(const std::vector<std::string>& plugins, const std::string& nodeType, bool json);
+
 } // namespace quarn

@@ -2,9 +2,7 @@
 #include "quarn/commands.h"
 
 #include "openquarn_app/SceneFile.h"
-
-#include <rapidjson/prettywriter.h>
-#include <rapidjson/stringbuffer.h>
+#include "quarn/json.h"
 
 #include <iostream>
 #include <stdexcept>
@@ -13,13 +11,8 @@ namespace quarn {
 namespace {
 
 using OpenQuarn::SceneSummary;
-using Writer = rapidjson::PrettyWriter<rapidjson::StringBuffer>;
 
-void writeText(Writer& writer, const std::string& text) {
-    writer.String(text.data(), static_cast<rapidjson::SizeType>(text.size()));
-}
-
-void writeTexts(Writer& writer, const char* key, const std::vector<std::string>& texts) {
+void writeTexts(JsonWriter& writer, const char* key, const std::vector<std::string>& texts) {
     writer.Key(key);
     writer.StartArray();
     for (const std::string& text : texts)
@@ -29,12 +22,11 @@ void writeTexts(Writer& writer, const char* key, const std::vector<std::string>&
 
 void printJson(const SceneSummary& summary) {
     rapidjson::StringBuffer buffer;
-    Writer writer(buffer);
+    JsonWriter writer(buffer);
     writer.StartObject();
     writer.Key("version");
     writer.Int(summary.version);
-    writer.Key("writtenBy");
-    writeText(writer, summary.writtenBy);
+    writeText(writer, "writtenBy", summary.writtenBy);
     writer.Key("bytes");
     writer.Uint64(summary.bytes);
     writer.Key("time");

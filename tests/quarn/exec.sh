@@ -36,8 +36,15 @@ expect 0 '1 minimalRemap\n' '' info "$work/scene.json"
 expect 0 '"minimalRemap": 1' '' info --json "$work/scene.json"
 expect 1 '' 'quarn: .*none\.json' info /none.json
 
+expect 0 'message \(msg\): (.|\n)*\ninputMax \(im\): double = 1; affects output\n' '' \
+  listAttr --plugin "$plugin" minimalRemap
+expect 0 '\n  weights \(wts\): array of float = 1, inherited; affects outputGeom\namount \(am\)' '' \
+  listAttr --plugin "$plugin" minimalPush
+expect 0 '^\[(.|\n)*"name": "inMesh",(.|\n)*"attribute": "outMesh",(.|\n)*\]\n$' '' listAttr --json mesh
+expect 1 '' "quarn: there is no node type 'minimalRemap'" listAttr minimalRemap
+
 # neither of these is a call: not 0, and the answer is on standard error
-for arguments in "" "exec" "dance" "exec --plugin"; do
+for arguments in "" "exec" "dance" "exec --plugin" "listAttr"; do
   # shellcheck disable=SC2086 # words
   if "$quarn" $arguments >"$work/out" 2>"$work/err" || [[ -s $work/out || ! -s $work/err ]]; then
     printf 'quarn %s: no failure, or not on standard error alone\n' "$arguments"

@@ -52,6 +52,7 @@ Field& NodeClass::fieldOf(const Attribute& attribute) const {
 void NodeClass::affects(const Attribute& affecting, const Attribute& affected, bool affectsTree, bool sameElement) {
     Field& from = fieldOf(affecting);
     Field& to = fieldOf(affected);
+    declarations_.push_back({&from, &to, affectsTree, sameElement, false});
     for (Pair& pair : pairs_)
         if (pair.affecting == &from && pair.affected == &to) {
             pair.tree = pair.tree || affectsTree; // declared again, by a derived type: what the base said of it stays
@@ -64,8 +65,15 @@ void NodeClass::inherit(const NodeClass& base) {
     makeFilterState = base.makeFilterState;
     for (const std::unique_ptr<Field>& field : base.fields_)
         fields_.push_back(makeField(field->attribute, nullptr, static_cast<unsigned>(fields_.size())));
-    for (const Pair& pair : base.pairs_)
-        affects(*pair.affecting->attribute, *pair.affected->attribute, pair.tree, pair.sameElement);
+    inheritedFields_ = fields_.size();
+    for (const Declaration& made : base.declarations_)
+        affects(*made.affecting->attribute, *made.affected->attribute, made.tree, made.sameElement);
+    for (Declaration& made : declarations_)
+        made.inherited = true;
+}
+
+bool NodeClass::isInherited(const Field& field) const {
+    return field.parent ? isInherited(*field.parent) : field.position < inheritedFields_;
 }
 
 void NodeClass::finish() {

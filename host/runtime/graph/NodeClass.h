@@ -5,6 +5,7 @@
 #include "graph/Attribute.h"
 #include "openquarn/HPxNode.h"
 
+#include <cstddef>
 #include <memory>
 #include <string>
 #include <unordered_map>
@@ -48,6 +49,19 @@ public:
     const Field* find(const std::string& attributeName) const;
     const Field* find(const Attribute& attribute) const;
 
+    /// One call of affects(). What was declared twice stands here twice.
+    struct Declaration {
+        const Field* affecting;
+        const Field* affected;
+        bool tree;
+        bool sameElement;
+        bool inherited;
+    };
+    /// In order, those of the base first.
+    const std::vector<Declaration>& declarations() const { return declarations_; }
+    /// True for what came from the base.
+    bool isInherited(const Field& field) const;
+
 private:
     struct Pair {
         Field* affecting;
@@ -68,6 +82,8 @@ private:
     std::unordered_map<const Attribute*, Field*> byAttribute_;
     std::unordered_map<std::string, Field*> byName_;
     std::vector<Pair> pairs_;
+    std::vector<Declaration> declarations_;
+    std::size_t inheritedFields_ = 0; ///< at the front of fields_
 };
 
 /// The registered types. Thread: changes on the main thread, outside of evaluations.
