@@ -51,7 +51,6 @@ HObject makeConversion(NodeAttributes& attributes) {
     HStatus status;
     HObject attribute = set.create("rotationConversion", "rc", ChannelChoice::kEuler, &status);
     attributes.note(status);
-    attributes.setFlags(attribute, {.keyable = false});
     attributes.note(set.addField(messageText(Text::kEuler), ChannelChoice::kEuler));
     attributes.note(set.addField(messageText(Text::kQuaternion), ChannelChoice::kQuaternion));
     attributes.note(set.addField(messageText(Text::kDoubleAxis), ChannelChoice::kDoubleAxis));

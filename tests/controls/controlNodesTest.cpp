@@ -3,9 +3,7 @@
 #include "controls/ControlsTest.h"
 
 #include "controls/guardedCompute.h"
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HNodeClass.h"
 #include "openquarn_app/Profiling.h"
 #include "support/TemporaryFolder.h"
 
@@ -23,84 +21,6 @@ using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
 using ControlNodes = ControlsTest;
-
-// "name short, kind default, limits, labels, flags"
-std::string described(const HNodeClass& type, const std::string& path) {
-    const HObject object = type.attribute(path.substr(path.rfind('.') + 1));
-    const HFnAttribute attribute(object);
-    std::string text = path + ' ' + attribute.shortName().asStdString();
-    if (const HFnNumericAttribute number(object); number.numericType() != HFnNumericData::kInvalid) {
-        text += ", n" + std::to_string(number.numericType()) + ' ' + OpenQuarn::printedValue(number.defaultValue());
-        text += number.hasMin() ? ", min " + OpenQuarn::printedValue(number.getMin()) : "";
-        text += number.hasMax() ? ", max " + OpenQuarn::printedValue(number.getMax()) : "";
-    }
-    if (const HFnTypedAttribute typed(object); typed.attrType() != HFnData::kInvalid)
-        text += ", d" + std::to_string(typed.attrType());
-    HStatus hasLabel;
-    const HFnEnumAttribute choice(object);
-    for (short value = 0; value < 5; ++value)
-        if (const HString label = choice.fieldName(value, &hasLabel); !hasLabel.error())
-            text += ", " + label.asStdString();
-    const std::pair<bool, const char*> flags[] = {
-        {attribute.isArray(), ", array"},
-        {attribute.usesArrayDataBuilder(), ", builder"},
-        {!attribute.isReadable(), ", unreadable"},
-        {!attribute.isWritable(), ", output"},
-        {!attribute.isKeyable(), ", unkeyable"},
-        {!attribute.isStorable(), ", unstored"},
-        {attribute.isHidden(), ", hidden"},
-        {attribute.disconnectBehavior() == HFnAttribute::kDelete, ", delete"},
-        {attribute.disconnectBehavior() == HFnAttribute::kReset, ", reset"},
-    };
-    for (const auto& [holds, flag] : flags)
-        text += holds ? flag : "";
-    return text;
-}
-
-// what scenes, rigs and the trainer rely on
-TEST_F(ControlNodes, AttributesAreTheOnesThatScenesRelyOn) {
-    const struct {
-        const char* type;
-        unsigned id;
-        std::vector<std::string> attributes; // in their order
-    } types[] = {
-        {"controlCollector",
-         0x58000973,
-         {"inputList inl, array, builder, unkeyable, delete", "inputList.input in, n5 0, array, delete",
-          "limitsList liml, array, builder, unkeyable, delete", "limitsList.limits lim, array, unkeyable, delete",
-          "limitsList.limits.minValue mnv, n5 0, unkeyable", "limitsList.limits.maxValue mxv, n5 1, unkeyable",
-          "limitsList.limits.defaultValue dv, n5 0, unkeyable", "samples sa, n3 1000, min 1, unkeyable",
-          "activationRate ar, n5 0.2, min 0, max 1, unkeyable", "samplesStartFrame ssf, n3 1, unkeyable",
-          "output out, n5 0, array, builder, output"}},
-        {"orthoAxisFromMatrixArray",
-         0x58000974,
-         {"input in, d5, array, unkeyable, delete", "outputList outl, array, builder, unkeyable, delete",
-          "outputList.output out, n5 0, array, builder"}},
-        {"matrixConverter",
-         0x58000975,
-         {"input in, d5, array, unkeyable, delete", "extractRotation er, n1 1, unkeyable",
-          "extractScale es, n1 1, unkeyable", "extractTranslation et, n1 1, unkeyable", "rotationX rx, n1 1, unkeyable",
-          "rotationY ry, n1 1, unkeyable", "rotationZ rz, n1 1, unkeyable", "scaleX sx, n1 1, unkeyable",
-          "scaleY sy, n1 1, unkeyable", "scaleZ sz, n1 1, unkeyable", "translationX tx, n1 1, unkeyable",
-          "translationY ty, n1 1, unkeyable", "translationZ tz, n1 1, unkeyable",
-          "rotationConversion rc, Euler, Quaternion, Double Axis, Triple Axis, unkeyable",
-          "flatOutput fout, n5 0, array, builder, output, delete",
-          "outputList outl, array, builder, output, unkeyable, delete",
-          "outputList.output out, n5 0, array, builder, output, delete"}},
-    };
-    for (const auto& [typeName, id, attributes] : types) {
-        const HNodeClass type(typeName);
-        EXPECT_EQ(type.typeId().id(), id);
-        testNodes::create(typeName, "n");
-        std::vector<std::string> listed;
-        const auto paths = std::get<std::vector<std::string>>(run("listAttr n"));
-        for (const std::string& path : paths)
-            if (path != "message")
-                listed.push_back(described(type, path));
-        EXPECT_EQ(listed, attributes);
-        run("deleteNode n");
-    }
-}
 
 TEST_F(ControlNodes, NothingIsThrownAtTheHost) {
     const HPxNode& node = *HFnDependencyNode(testNodes::create("controlCollector", "c")).userNode();
