@@ -16,6 +16,12 @@ namespace {
 /// As many vertices at a time as hide the latency of one addition, which the order of summation makes them wait for.
 constexpr std::size_t blockSize = 8;
 
+/// How far beyond the present block the basis is asked for, in bytes. A block walks down its rows side by side, and the
+/// processor does not see that as the one stream through memory that it is. Found by trial with S = 20, 50 and 100 on
+/// bases larger than the cache: 2 to 8 KiB are within a few percent of each other; asking for nothing takes two to four
+/// times as long.
+constexpr std::size_t prefetchDistance = 4096;
+
 struct Basis {
     const float* row(std::size_t slot) const { return values + 3 * shapeCount * slot; }
     const float* values;
@@ -46,6 +52,15 @@ void storeThree(quill::val3<float>& to, __m128 v) {
     to = {lanes[0], lanes[1], lanes[2]};
 }
 
+/// Asks for a part of what the blocks after this one will read, when their rows follow each other; else for something
+/// near it. An address beyond the basis does no harm.
+void prefetchStep(const float* blockEnd, std::size_t j) {
+    constexpr std::size_t stepBytes = blockSize * 3 * sizeof(float);
+    const char* ahead = reinterpret_cast<const char*>(blockEnd) + prefetchDistance + j * stepBytes; // NOLINT
+    for (std::size_t line = 0; line < stepBytes; line += 64)
+        _mm_prefetch(ahead + line, _MM_HINT_T0);
+}
+
 /// The same sums for blockSize driven vertices side by side; the fourth lane holds nothing of use.
 void sumBlock(const Basis& basis, const std::array<const float*, blockSize>& rows, quill::val3<float>* deltas) {
     __m128 sums[blockSize]; // NOLINT(modernize-avoid-c-arrays): std::array would drop the attributes of the type
@@ -53,6 +68,7 @@ void sumBlock(const Basis& basis, const std::array<const float*, blockSize>& row
         sum = _mm_setzero_ps();
     const std::size_t last = basis.shapeCount - 1;
     for (std::size_t j = 0; j < last; ++j) {
+        prefetchStep(rows[0] + 3 * basis.shapeCount * blockSize, j);
         const __m128 coefficient = _mm_set1_ps(basis.coefficients[j]);
         for (std::size_t v = 0; v < blockSize; ++v)
             sums[v] = _mm_add_ps(sums[v], _mm_mul_ps(coefficient, _mm_loadu_ps(rows[v] + 3 * j)));
