@@ -162,7 +162,7 @@ Samples sample(Frame& frame, double seconds) {
 }
 
 constexpr const char* columns[] = {"prepare", "gather", "network", "points", "deltas",
-                                   "frames",  "apply",  "fetch",   "blend",  "write"};
+                                   "apply",   "fetch",  "blend",   "write"};
 
 void printHeader(std::FILE* csv) {
     std::printf("%7s %-7s %-7s %3s %3s %8s %8s", "verts", "mode", "model", "smo", "thr", "us", "p99");

@@ -45,23 +45,32 @@ public:
         : count_(count)
         , subset_(subset) {}
 
-    // Calls visit(vertices, n) in parallel with blocks of n <= FrameBlock::capacity listed vertices below the count.
+    // Calls visit(vertices, places, n) in parallel with blocks of n <= FrameBlock::capacity listed vertices below the
+    // count, and their places in the list.
     template <typename Visit>
-    void parallelForEachBlock(const Visit& visit) const {
+    void parallelForEachPlacedBlock(const Visit& visit) const {
         parallelForRange(subset_ ? subset_->size() : count_, [&](int begin, int end) {
-            std::array<std::size_t, FrameBlock::capacity> block;
+            std::array<std::size_t, FrameBlock::capacity> vertices, places;
             std::size_t n = 0;
             for (auto j = static_cast<std::size_t>(begin); j < static_cast<std::size_t>(end); ++j) {
                 const std::size_t vertex = subset_ ? (*subset_)[j] : j;
                 if (vertex >= count_)
                     continue;
-                block[n++] = vertex;
-                if (n == block.size())
-                    visit(block.data(), std::exchange(n, 0));
+                vertices[n] = vertex;
+                places[n++] = j;
+                if (n == vertices.size())
+                    visit(vertices.data(), places.data(), std::exchange(n, 0));
             }
             if (n > 0)
-                visit(block.data(), n);
+                visit(vertices.data(), places.data(), n);
         });
+    }
+
+    // Calls visit(vertices, n) with the same blocks.
+    template <typename Visit>
+    void parallelForEachBlock(const Visit& visit) const {
+        parallelForEachPlacedBlock(
+            [&](const std::size_t* vertices, const std::size_t*, std::size_t n) { visit(vertices, n); });
     }
 
     // Calls visit(i) in parallel for each listed vertex below the count.
@@ -199,6 +208,29 @@ void VertexFrames::calculateFrames(std::vector<mat4d>& frames, const std::vector
         block.takeNormals(normals.data(), vertices, n);
         storeFrames(block, tables, vertices, n, invert, frames.data());
     });
+}
+
+void VertexFrames::transportDeltas(std::vector<val3<float>>& out, const std::vector<val3<float>>& deltas,
+                                   const std::vector<val3<float>>& restPoints,
+                                   const std::vector<mat4d>& restFramesInverse,
+                                   const std::vector<val3<float>>& positions,
+                                   const std::vector<std::uint32_t>* subset) const {
+    if (positions.size() < vertexCount())
+        return;
+    const FrameTables tables{framesPairs_.data(), framesIndexer_.data(), vertexCount(), positions.data()};
+    const std::size_t count = std::min({out.size(), restPoints.size(), restFramesInverse.size(), positions.size()});
+    VertexList(count, subset)
+        .parallelForEachPlacedBlock([&](const std::size_t* vertices, const std::size_t* places, std::size_t n) {
+            FrameBlock block;
+            block.measureNormals(tables, vertices, n);
+            block.buildAxes(tables, vertices, n);
+            for (std::size_t j = 0; j < n && places[j] < deltas.size(); ++j) {
+                const std::size_t i = vertices[j];
+                mat4d frame;
+                block.write(tables, j, i, frame);
+                out[i] = transportDelta(restPoints[i], deltas[places[j]], restFramesInverse[i], frame);
+            }
+        });
 }
 
 void VertexFrames::calculateDisplacements(const std::vector<val3<float>>& positions,

@@ -9,8 +9,8 @@
 namespace neuralWarp {
 
 /// Steps of an evaluation in which a model is applied.
-enum class Phase : std::size_t { prepare, gather, network, points, deltas, frames, apply, fetch, blend, writeBack };
-inline constexpr std::size_t phaseCount = 10;
+enum class Phase : std::size_t { prepare, gather, network, points, deltas, apply, fetch, blend, writeBack };
+inline constexpr std::size_t phaseCount = 9;
 
 /// Each lap belongs to the phase that it ends. Thread: one at a time.
 class PhaseClock {

@@ -64,14 +64,6 @@ void applyOffsets(Points& result, const Points& points, const Points& deltas, co
     });
 }
 
-void transportDeltas(Points& result, const neuralWarpData& data, const std::vector<quill::mat4d>& frames,
-                     const Points& deltas, const DrivenVertices& driven) {
-    quill::parallelFor(driven.count, [&](std::size_t k) {
-        const std::size_t v = driven.vertex(k);
-        result[v] = quill::transportDelta(data.restPoints[v], deltas[k], data.restFramesInverse[v], frames[v]);
-    });
-}
-
 HStatus misfit(const char* what, std::size_t has, std::size_t needed) {
     return {HStatus::kFailure, std::string(what) + " has " + std::to_string(has) + " points where " +
                                    std::to_string(needed) + " vertices are deformed"};
@@ -203,10 +195,8 @@ HStatus neuralWarpNode::applyDeltas(const neuralWarpData& data, const Points& po
     if (data.restPoints.size() < points.size() || data.restFramesInverse.size() < points.size())
         return misfit("the rest geometry", std::min(data.restPoints.size(), data.restFramesInverse.size()),
                       points.size());
-    std::vector<quill::mat4d> frames;
-    calculateVertexFrames(data, frames, points, false, driven.vertices);
-    data.endPhase(Phase::frames);
-    transportDeltas(result, data, frames, deltas, driven);
+    const HProfilingScope scope(evaluationCategory(), 10, "CalculateVertexFrames", name());
+    data.vertexFrames.transportDeltas(result, deltas, data.restPoints, data.restFramesInverse, points, driven.vertices);
     data.endPhase(Phase::apply);
     return HStatus::kSuccess;
 }

@@ -12,6 +12,13 @@
 
 namespace quill {
 
+/// Carries a rest point moved by its delta from the rest surface to the current one: into the local coordinates of the
+/// rest frame (narrowed to float there) and out through the current frame. Object space in and out.
+inline val3<float> transportDelta(const val3<float>& restPoint, const val3<float>& delta, const mat4d& restFrameInverse,
+                                  const mat4d& currentFrame) {
+    return transformAsPoint(transformAsPoint(restPoint + delta, restFrameInverse), currentFrame);
+}
+
 /// Which neighbours define the local frame of each vertex of a mesh, in affected index space, and the frames measured
 /// on given positions. A frame's rows are X, Y, Z (the normal) and the vertex position; the basis is left-handed
 /// (X x Y = -Z), object space. A vertex on no polygon of three or more affected corners has the identity at its
@@ -62,6 +69,20 @@ public:
                          std::size_t normalIterations, const IndexMapper& map, bool invert,
                          const std::vector<std::uint32_t>* subset) const;
 
+    /// The transport of all listed vertices (transportDelta) through the frames measured on positions, which are not
+    /// stored: at 128 bytes each, that takes longer than measuring them.
+    ///   out                in and out, [affectCount]; vertices that are not listed keep their values
+    ///   deltas             one per listed vertex, in the order of the list
+    ///   restPoints         [affectCount] unsmoothed, object space
+    ///   restFramesInverse  [affectCount] as calculateFrames inverts them
+    ///   positions          [affectCount] points to measure the current frames on, object space
+    ///   subset             null for every vertex, or affected indices, none twice
+    /// Vertices beyond one of the arrays are left out; if positions are fewer than vertexCount(), all are. The result
+    /// is the same for every number of threads.
+    void transportDeltas(std::vector<val3<float>>& out, const std::vector<val3<float>>& deltas,
+                         const std::vector<val3<float>>& restPoints, const std::vector<mat4d>& restFramesInverse,
+                         const std::vector<val3<float>>& positions, const std::vector<std::uint32_t>* subset) const;
+
     /// out[i] = points[i] in the local coordinates of the frame of vertex i on positions.
     ///   positions  [vertexCount()] object space
     ///   points     any number; those from positions.size() on, or all if positions are too few, give zero
@@ -73,12 +94,5 @@ private:
     std::vector<std::uint32_t> framesPairs_;
     std::vector<std::uint32_t> framesIndexer_;
 };
-
-/// Carries a rest point moved by its delta from the rest surface to the current one: into the local coordinates of the
-/// rest frame (narrowed to float there) and out through the current frame. Object space in and out.
-inline val3<float> transportDelta(const val3<float>& restPoint, const val3<float>& delta, const mat4d& restFrameInverse,
-                                  const mat4d& currentFrame) {
-    return transformAsPoint(transformAsPoint(restPoint + delta, restFrameInverse), currentFrame);
-}
 
 } // namespace quill

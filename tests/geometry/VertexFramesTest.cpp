@@ -160,6 +160,37 @@ TEST(VertexFrames, TransportBetweenEqualFramesAddsTheDelta) {
     });
 }
 
+TEST(VertexFrames, TransportOfManyIsThatOfEach) {
+    forEachBuilt([](const ZooMesh&, const Built& built) {
+        const std::size_t count = built.points.size();
+        Points moved = built.points;
+        for (std::size_t v = 0; v < count; ++v)
+            moved[v].x += 0.25F * static_cast<float>(v % 3);
+        const auto restInverse = built.on(built.points, true), current = built.on(moved);
+        std::vector<std::uint32_t> everySecond;
+        for (std::size_t v = 0; v < count; v += 2)
+            everySecond.push_back(static_cast<std::uint32_t>(v));
+        for (const auto* subset : {static_cast<const std::vector<std::uint32_t>*>(nullptr),
+                                   static_cast<const std::vector<std::uint32_t>*>(&everySecond)}) {
+            Points deltas(subset ? subset->size() : count), expected(count, {9, 9, 9}), out = expected;
+            for (std::size_t k = 0; k < deltas.size(); ++k) {
+                const std::size_t v = subset ? (*subset)[k] : k;
+                deltas[k] = {0.5F, 0.125F * static_cast<float>(k), -1.0F};
+                expected[v] = transportDelta(built.points[v], deltas[k], restInverse[v], current[v]);
+            }
+            built.frames.transportDeltas(out, deltas, built.points, restInverse, moved, subset);
+            EXPECT_EQ(out, expected);
+            if (deltas.empty())
+                continue;
+            deltas.pop_back(); // what is missing at the end is left out
+            expected[subset ? subset->back() : count - 1] = {9, 9, 9};
+            out.assign(count, {9, 9, 9});
+            built.frames.transportDeltas(out, deltas, built.points, restInverse, moved, subset);
+            EXPECT_EQ(out, expected);
+        }
+    });
+}
+
 TEST(VertexFrames, TransportFollowsARigidMotion) {
     const Built built(makeGrid(6, 4));
     // a quarter turn about z and a shift

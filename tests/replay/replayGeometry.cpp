@@ -192,12 +192,10 @@ Json replayMesh(Input& input, JsonAllocator& allocator) {
     Points rest = positions, current = points;
     connections.mushArray(rest, scratch, 1, 0.25F, nullptr, &weights, false);
     connections.mushArray(current, scratch, 1, 0.25F, nullptr, &weights, false);
-    std::vector<quill::mat4d> restInverse, currentFrames;
+    std::vector<quill::mat4d> restInverse;
     frames.calculateFrames(restInverse, rest, map, true, nullptr);
-    frames.calculateFrames(currentFrames, current, map, false, nullptr);
-    Points transported;
-    for (std::size_t i = 0; i < positions.size(); ++i)
-        transported.push_back(quill::transportDelta(positions[i], deltas[i], restInverse[i], currentFrames[i]));
+    Points transported(positions.size());
+    frames.transportDeltas(transported, deltas, positions, restInverse, current, nullptr);
     out.set("transport", transported);
     return out.take();
 }
