@@ -72,8 +72,11 @@ TEST(State, OperationsRaiseAndLowerTheirFlagsOnly) {
     };
     const Row rows[] = {
         {"all dirty", "", [](auto& d) { d.markAllDirty(); }, everything, {0, 1}},
-        {"all dirty keeps the rest", "applied export valid affectMap", [](auto& d) { d.markAllDirty(); },
-         everything + " applied export valid affectMap", {0, 1}},
+        {"all dirty keeps the rest",
+         "applied export valid affectMap",
+         [](auto& d) { d.markAllDirty(); },
+         everything + " applied export valid affectMap",
+         {0, 1}},
         {"path dirty", "", [](auto& d) { d.setModelPathDirty(true); }, "load metadata path", {0, 1}},
         {"path clean", "load metadata path", [](auto& d) { d.setModelPathDirty(false); }, "load metadata", {0, 1}},
         {"the same", "", apply({3, 1}, {3, 1}), "", {3, 1}},
