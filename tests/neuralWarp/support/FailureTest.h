@@ -49,12 +49,12 @@ public: // tables of what to spoil are lambdas, which get the test
     }
     static Coordinates came() { return coordinates(warpRig::pointsOf(unevenMesh())); }
     /// What the blend leaves without a model: each coordinate goes part of the way to its value in single precision.
-    static Coordinates rounded(float envelope = 1.0F) {
-        Coordinates points = came();
+    static Coordinates rounded() { return rounded(came()); }
+    static Coordinates rounded(Coordinates points) {
         for (std::array<double, 3>& point : points)
             for (double& x : point) {
                 const volatile auto single = static_cast<float>(x); // gcc 12 -O3 leaves the rounding of pairs out
-                x += (static_cast<double>(single) - x) * static_cast<double>(envelope);
+                x += static_cast<double>(single) - x;
             }
         return points;
     }
