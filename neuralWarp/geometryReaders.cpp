@@ -8,11 +8,18 @@
 #include "openquarn/HNodeClass.h"
 #include "quill/parallelFor.h"
 
+#include <stdexcept>
+
 namespace neuralWarp {
 namespace {
 
+/// Throws when the host does not find it, so that nobody keeps a null attribute for good.
 HObject filterAttribute(const char* name) {
-    return HNodeClass("geometryFilter").attribute(name);
+    HStatus status;
+    HObject attribute = HNodeClass("geometryFilter").attribute(name, &status);
+    if (status.error())
+        throw std::runtime_error(status.errorString().asStdString());
+    return attribute;
 }
 
 /// The passes that the settings in force ask for.
@@ -65,10 +72,14 @@ HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, 
     return HStatus::kSuccess;
 }
 
-void readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology) {
+HStatus readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology) {
     topology = {};
-    topology.vertexCount = mesh.numVertices();
-    const int polygons = mesh.numPolygons();
+    HStatus status;
+    const int vertices = mesh.numVertices(&status);
+    const int polygons = status.error() ? 0 : mesh.numPolygons(&status);
+    if (status.error())
+        return status;
+    topology.vertexCount = vertices;
     topology.polygonOffsets.reserve(static_cast<std::size_t>(polygons) + 1);
     topology.polygonVertices.reserve(static_cast<std::size_t>(polygons) * 4);
     HIntArray corners;
@@ -82,6 +93,7 @@ void readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology) {
     }
     topology.polygonOffsets.push_back(static_cast<std::uint32_t>(topology.polygonVertices.size()));
     topology.valid = true;
+    return HStatus::kSuccess;
 }
 
 quill::IndexMapper readIndexMap(const HIndexMapper& mapper) {

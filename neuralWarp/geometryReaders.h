@@ -13,7 +13,8 @@ class HFnMesh;
 namespace neuralWarp {
 
 /// The rest geometry of a geometry (originalGeometry[multiIndex]), and the geometry as it comes in
-/// (input[multiIndex].inputGeometry), evaluated. Invalid, with the host's failing status, when it is not there. [eval]
+/// (input[multiIndex].inputGeometry), evaluated. Invalid, with the host's failing status, when it is not there. Throw
+/// std::runtime_error when the host does not know the attribute. [eval]
 HDataHandle restGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HStatus& status);
 HDataHandle inputGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HStatus& status);
 
@@ -25,8 +26,9 @@ bool readGeometryPoints(const HDataHandle& geometry, Points& points, const quill
 /// status of the mesh is reported and returned. A mesh that is too small leaves `points` as it is, with success. [eval]
 HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, Points& points, bool smooth);
 
-/// The polygons of a mesh; those that the host does not give are left out. [any]
-void readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology);
+/// The polygons of a mesh; those that the host does not give are left out. Fails, and `topology` is not valid, when the
+/// host does not say how many there are. [any]
+HStatus readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology);
 
 /// The host's map of the affected vertices, in the same order. [any]
 quill::IndexMapper readIndexMap(const HIndexMapper& mapper);

@@ -28,6 +28,11 @@ bool needsWork(const neuralWarpData& data) {
            (data.connectionsDirty && data.activeSettings.isSmoothed());
 }
 
+HStatus invalidRest() {
+    raiseMessage<Text::kErrorMLOriginalGeomInvalid>(displayErrorGated);
+    return HStatus::kFailure;
+}
+
 void rebuildConnections(neuralWarpData& data, const quill::MeshTopology& topology) {
     data.vertexConnections.build(topology, data.componentMap, 0, false);
     data.vertexConnections.calculateConnectionWeights(data.connectionWeights, data.restPoints, 1.0, 0.0);
@@ -84,12 +89,11 @@ HStatus neuralWarpNode::rebuildRestCaches(neuralWarpData& data, HDataBlock& bloc
         return reported(status, sourceUnit::node);
     const HFnMesh mesh(rest.asMesh(), &status);
     // a rest geometry with fewer vertices than the deformed one has no rest position for each of them
-    if (status.error() || !readGeometryPoints(rest, data.restPoints, data.componentMap)) {
-        raiseMessage<Text::kErrorMLOriginalGeomInvalid>(displayErrorGated);
-        return HStatus::kFailure;
-    }
+    if (status.error() || !readGeometryPoints(rest, data.restPoints, data.componentMap))
+        return invalidRest();
     quill::MeshTopology topology;
-    readMeshTopology(mesh, topology);
+    if (status = readMeshTopology(mesh, topology); status.error())
+        return reported(status, sourceUnit::node);
     if (data.connectionsDirty)
         rebuildConnections(data, topology);
     if (data.activeSettings.isSurface() && data.framesTopologyDirty)
@@ -102,6 +106,8 @@ HStatus neuralWarpNode::rebuildRestFrames(neuralWarpData& data, HDataBlock& bloc
     Points smoothed;
     if (HStatus status = readSmoothedRestPoints(data, block, multiIndex, smoothed, true); status.error())
         return status;
+    if (smoothed.size() != data.componentMap.affectCount())
+        return invalidRest();
     std::vector<quill::mat4d> frames;
     calculateVertexFrames(data, frames, smoothed, true, nullptr);
     data.restFramesInverse = std::move(frames);

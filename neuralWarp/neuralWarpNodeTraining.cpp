@@ -118,7 +118,8 @@ HStatus neuralWarpNode::findRestSurface(const neuralWarpData& data, HDataBlock& 
     if (!readGeometryPoints(rest, surface.ownRestPoints, data.componentMap))
         return tooFew("the rest geometry", 0, count);
     quill::MeshTopology topology;
-    readMeshTopology(mesh, topology);
+    if (status = readMeshTopology(mesh, topology); status.error())
+        return reported(status, sourceUnit::node);
     surface.ownFrames.build(topology, data.componentMap, &surface.ownRestPoints);
     surface.frames = &surface.ownFrames;
     surface.restPoints = &surface.ownRestPoints;

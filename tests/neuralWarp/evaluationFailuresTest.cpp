@@ -1,0 +1,434 @@
+// SPDX-License-Identifier: Apache-2.0
+// Everything that can go wrong in an evaluation: what is said, what it answers, and that the geometry is then either as
+// it came, to the last bit, or as it should be.
+#include "neuralWarp/support/FailureTest.h"
+
+#include "openquarn/HDGModifier.h"
+
+#include <functional>
+#include <limits>
+
+namespace {
+
+using OpenQuarn::Faults;
+using testing::ElementsAre;
+using testing::IsEmpty;
+
+class EvaluationFailures : public FailureTest {
+public:
+    enum class Points { asTheyCame, rounded, moved };
+
+    /// A rig with its model loaded; `change` is applied to the specification of the model.
+    warpRig::Rig& makeRig(const std::function<void(ModelSpec&)>& change = {}) {
+        session.newScene();
+        ModelSpec spec = modelSpec();
+        if (change)
+            change(spec);
+        writeModel(modelDirectory(), spec);
+        rig_.emplace();
+        rig_->addGeometry(0, {.mesh = unevenMesh()});
+        rig_->setModelRoot(folder.path());
+        rig_->setControls({1.0});
+        return *rig_;
+    }
+    void remove(const char* element) const {
+        HDGModifier modifier;
+        modifier.removeMultiInstance(rig_->plug(element), true);
+        EXPECT_EQ(modifier.doIt(), HStatus::kSuccess);
+    }
+
+    /// Messages of the deformer: the host adds one of its own to each failing evaluation.
+    Texts said() {
+        Texts texts = shown();
+        texts.erase(std::remove_if(texts.begin(), texts.end(),
+                                   [](const std::string& text) {
+                                       return text.rfind("report: 'warp1.outputGeom[0]' could not be computed", 0) == 0;
+                                   }),
+                    texts.end());
+        return texts;
+    }
+
+    std::optional<warpRig::Rig> rig_;
+};
+
+std::string onDemand(const char* operation) {
+    return std::string(operation) + ": failed on demand";
+}
+
+TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
+    using T = EvaluationFailures;
+    const std::string restInvalid = "error: [NEURAL WARP] Original geometry is not a valid mesh";
+    const std::string targetInvalid = "error: [NEURAL WARP] Target geometry is not a valid mesh";
+    const std::string noDeltas = "error: [NEURAL WARP] No delta computed from the ML model";
+    const Texts notFinite{noDeltas, report("the model gave no values: a control value is not finite")};
+    const auto fault = [](const char* operation, int call = 1) { return [=](T&) { Faults::fail(operation, call); }; };
+    const auto controls = [](std::vector<double> values) { return [=](T& t) { t.rig_->setControls(values); }; };
+    const auto morph = [](HObject mesh) {
+        return [=](T& t) {
+            t.rig_->plug("targetMorphEnabled").setBool(true);
+            if (!mesh.isNull())
+                t.rig_->setMorphTarget(0, mesh);
+        };
+    };
+    const auto reload = [](std::function<void(ModelSpec&)> change) {
+        return [=](T& t) {
+            ModelSpec spec = modelSpec();
+            change(spec);
+            writeModel(t.modelDirectory(), spec);
+            nodeOf(*t.rig_).requestReload(0);
+        };
+    };
+    const auto tooFew = [](const char* has, const char* needed) {
+        return Texts{"error: [NEURAL WARP] Size of predicted deltas (" + std::string(has) +
+                         ") does not match affected vertex count (" + needed + ")",
+                     report("the model gives " + std::string(has) + " deltas where " + needed + " are needed")};
+    };
+    struct Row {
+        const char* name;
+        std::function<void(T&)> spoil; ///< after a first evaluation that went well
+        Texts messages;
+    };
+    const Row rows[] = {
+        {"no element of models", [](T& t) { t.remove("models[0]"); }, {}},
+        {"envelope", fault("HDataBlock::inputValue"), {report(onDemand("HDataBlock::inputValue"))}},
+        {"no state", fault("HArrayDataHandle::outputValue"), {}},
+        {"rest without a mesh", [](T& t) { t.rig_->setRest(0, {}); }, {restInvalid}},
+        {"rest too small", [](T& t) { t.rig_->setRest(0, unevenMesh(2, 1)); }, {restInvalid}},
+        {"no rest",
+         [](T& t) { t.remove("originalGeometry[0]"); },
+         {report("'warp1.originalGeometry' has no element 0")}},
+        {"morph without an element",
+         morph({}),
+         {targetInvalid, report("'warp1.targetMorphGeometry' has no element 0")}},
+        {"morph without a mesh",
+         [&](T& t) {
+             morph(unevenMesh())(t);
+             warpRig::setMesh(t.rig_->plug("targetMorphGeometry[0]").source().node(), {});
+         },
+         {targetInvalid, report("failure")}},
+        {"morph too small",
+         morph(unevenMesh(2, 1)),
+         {"error: [NEURAL WARP] Size of target geometry (0) does not match deforming geometry (9)", report("failure")}},
+        {"no controls",
+         controls({}),
+         {"error: [NEURAL WARP] Size of the ML model inputs (1) does not match the connected control attributes "
+          "count(0).",
+          report("failure"), report("failure")}},
+        {"control values",
+         fault("HDataBlock::inputArrayValue"),
+         {report(onDemand("HDataBlock::inputArrayValue"), "neuralWarp/neuralWarpUtils"),
+          report(onDemand("HDataBlock::inputArrayValue")), report(onDemand("HDataBlock::inputArrayValue"))}},
+        {"no number", controls({std::numeric_limits<double>::quiet_NaN()}), notFinite},
+        {"infinite as a float", controls({1e300}), notFinite},
+        {"too few outputs", reload([](ModelSpec& spec) { spec.bias.resize(26); }), tooFew("8", "9")},
+        {"no whole delta", reload([](ModelSpec& spec) { spec.bias.resize(2); }), tooFew("0", "9")},
+        {"too few coefficients",
+         reload([](ModelSpec& spec) {
+             spec.bias.resize(1);
+             spec.shapes = {std::vector<float>(27), std::vector<float>(27)};
+         }),
+         {noDeltas, report("the model gives 1 coefficients for 2 principal shapes")}},
+        {"too small a basis", reload([](ModelSpec& spec) { spec.shapes = {std::vector<float>(24, 1.0F)}; }),
+         tooFew("8", "9")},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        makeRig();
+        ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+        row.spoil(*this);
+        const HPlug output = rig_->output(0);
+        OpenQuarn::makeDirty(output);
+        EXPECT_NE(OpenQuarn::evaluate(output), HStatus::kSuccess);
+        Faults::clear();
+        EXPECT_EQ(said(), row.messages);
+        EXPECT_EQ(result(*rig_), came());
+    }
+}
+
+// --- evaluations that go on without the model, or with a part of it ---
+
+/// p + f * (c - p), with c in single precision.
+EvaluationFailures::Coordinates blended(const EvaluationFailures::Coordinates& from,
+                                        const EvaluationFailures::Coordinates& to, float f) {
+    EvaluationFailures::Coordinates points = from;
+    for (std::size_t i = 0; i < points.size(); ++i)
+        for (std::size_t axis = 0; axis < 3; ++axis) {
+            const volatile auto c = static_cast<float>(to[i][axis]); // as in rounded()
+            points[i][axis] += (static_cast<double>(c) - points[i][axis]) * static_cast<double>(f);
+        }
+    return points;
+}
+
+/// c + (t - c) * w, in single precision.
+EvaluationFailures::Coordinates morphed(EvaluationFailures::Coordinates from,
+                                        const EvaluationFailures::Coordinates& target, float w) {
+    for (std::size_t i = 0; i < from.size(); ++i)
+        for (std::size_t axis = 0; axis < 3; ++axis) {
+            const volatile auto c = static_cast<float>(from[i][axis]);
+            const volatile auto t = static_cast<float>(target[i][axis]);
+            from[i][axis] = static_cast<double>(c + (t - c) * w);
+        }
+    return from;
+}
+
+TEST_F(EvaluationFailures, AModelThatDrivesNothingGivesWayOneEvaluationLater) {
+    makeRig();
+    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+    const Coordinates moved = result(*rig_);
+    makeRig([](ModelSpec& spec) {
+        spec.subsetState = "partial";
+        spec.affectMap = {42};
+    });
+    const auto expect = [&](const Coordinates& points, const char* flags) {
+        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig_), points);
+        EXPECT_EQ(stateText::raised(*rig_->state(0)), flags);
+    };
+    expect(rounded(), "valid affectMap");
+    EXPECT_EQ(said(), Texts{"warning: [NEURAL WARP \"warp1\", multiIndex 0] Setup for multiIndex 0 not the same as for "
+                            "trained model. Using deltas on 0 of 9 affected verts. Trained model subset is \"*\""});
+    expect(rounded(), "valid affectMap");
+    writeModel(modelDirectory(), modelSpec());
+    nodeOf(*rig_).requestReload(0);
+    expect(came(), "load valid affectMap");
+    expect(moved, "applied valid");
+}
+
+TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
+    makeRig();
+    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+    const Coordinates moved = result(*rig_);
+    HPointArray targetPoints = warpRig::pointsOf(unevenMesh());
+    for (HPoint& p : targetPoints)
+        p = {p.y * 3, p.z + p.x, 0.1 - p.x};
+    const HObject target = warpRig::withPoints(unevenMesh(), targetPoints);
+    const Coordinates targetShape = coordinates(targetPoints);
+    const Coordinates origin(9);
+
+    using T = EvaluationFailures;
+    const auto envelope = [](float value) { return [=](T& t) { t.rig_->plug("envelope").setFloat(value); }; };
+    const auto morph = [&](double value) {
+        return [=](T& t) {
+            t.rig_->setMorphTarget(0, target);
+            t.rig_->plug("targetMorphEnabled").setBool(true);
+            t.rig_->plug("targetMorphEnvelope").setDouble(value);
+        };
+    };
+    const auto both = [](auto one, auto other) {
+        return [=](T& t) {
+            one(t);
+            other(t);
+        };
+    };
+    const auto off = [](T& t) { t.rig_->plug("models[0].modelActive").setShort(0); };
+    const auto otherMode = [](T& t) {
+        ModelSpec spec = modelSpec();
+        spec.deltaMode = 2;
+        writeModel(t.modelDirectory(), spec);
+    };
+    const auto badRoot = [](T& t) { t.rig_->setModelRoot(t.folder.path() / "missing"); };
+    const auto smallMorph = [](T& t) {
+        t.rig_->setMorphTarget(0, unevenMesh(1, 1));
+        t.rig_->plug("targetMorphEnabled").setBool(true);
+        t.rig_->plug("targetMorphEnvelope").setDouble(-0.5e-6);
+    };
+    const Texts badPath{"error: [NEURAL WARP] Unable to access the ML model file at ROOT/missing"};
+    const std::string untouched = "topology indexMap connections restFrames load metadata path";
+    struct Row {
+        const char* name;
+        std::function<void(T&)> set; ///< before the first evaluation
+        Coordinates points;
+        std::string flags;
+        Texts messages = {};
+    };
+    const Row rows[] = {
+        {"envelope 0 touches no file", both(badRoot, envelope(0.0F)), came(), untouched},
+        {"envelope -0", both(badRoot, envelope(-0.0F)), came(), untouched},
+        {"half", envelope(0.5F), blended(came(), moved, 0.5F), "applied valid"},
+        {"no number as envelope", both(off, envelope(std::numeric_limits<float>::quiet_NaN())), came(),
+         "load metadata path"},
+        {"a delta mode that is none", otherMode, blended(came(), origin, 1.0F),
+         "topology connections restFrames applied valid"},
+        {"morph below what counts", morph(0.5e-6), moved, "applied valid"},
+        {"and its target is not looked at", smallMorph, moved, "applied valid"},
+        {"a quarter of the morph", morph(0.25), blended(came(), morphed(moved, targetShape, 0.25F), 1.0F),
+         "applied valid"},
+        {"and half the envelope", both(morph(0.25), envelope(0.5F)),
+         blended(came(), morphed(moved, targetShape, 0.25F), 0.5F), "applied valid"},
+        {"all of the morph leaves the model unloaded", morph(1.0),
+         blended(came(), morphed(came(), targetShape, 1.0F), 1.0F), "load"},
+        {"morph without the model", both(off, morph(0.25)), blended(came(), morphed(came(), targetShape, 0.25F), 1.0F),
+         "load metadata path"},
+        {"morph when there is no model", both(badRoot, morph(0.25)),
+         blended(came(), morphed(came(), targetShape, 0.25F), 1.0F), "load metadata", badPath},
+        {"model off", off, came(), "load metadata path"},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        makeRig();
+        row.set(*this);
+        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig_), row.points);
+        EXPECT_EQ(stateText::raised(*rig_->state(0)), row.flags);
+        EXPECT_EQ(said(), row.messages);
+    }
+    // and while training data is exported, the geometry stays as it is
+    makeRig();
+    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+    rig_->plug("export[0].deltaMode").setShort(0);
+    ASSERT_EQ(nodeOf(*rig_).setExportActive(0, true), HStatus::kSuccess);
+    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(result(*rig_), came());
+    EXPECT_EQ(stateText::raised(*rig_->state(0)), "topology restFrames export valid");
+    ASSERT_EQ(nodeOf(*rig_).setExportActive(0, false), HStatus::kSuccess);
+    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(result(*rig_), moved);
+}
+
+// --- every call of the host that an evaluation makes ---
+
+class EveryHostCall : public EvaluationFailures {
+public:
+    /// Everything that an evaluation can do: frames, smoothing, shapes, an affect map, weights and a morph.
+    void makeFullRig(bool isMorphed, bool isOn = true) {
+        session.newScene();
+        rig_.emplace();
+        rig_->addGeometry(0, {.mesh = unevenMesh(),
+                              .affected = std::vector<unsigned>{7, 1, 4, 0, 3},
+                              .weights = {0.25F, 0.5F, 0.75F, 1.0F, 0.9F, 0.8F, 0.7F, 0.6F, 0.5F},
+                              .modelOn = isOn});
+        rig_->setModelRoot(folder.path());
+        rig_->setControls({0.5, -1.0, 2.0});
+        HPointArray points = warpRig::pointsOf(unevenMesh());
+        for (HPoint& p : points)
+            p = {p.y, p.z, p.x};
+        rig_->setMorphTarget(0, warpRig::withPoints(unevenMesh(), points));
+        rig_->plug("targetMorphEnabled").setBool(isMorphed);
+        rig_->plug("targetMorphEnvelope").setDouble(0.5);
+        for (const char* into : {"input[0].inputGeometry", "originalGeometry[0]", "targetMorphGeometry[0]"})
+            OpenQuarn::evaluate(rig_->plug(into).source()); // calls of other nodes are not looked at
+    }
+    void writeFullModel() const {
+        ModelSpec spec = modelSpec();
+        spec.controls = 2;
+        spec.affectCount = 5;
+        spec.smoothingIterations = 2;
+        spec.subsetState = "partial";
+        spec.affectMap = {0, 1, 2, 3, 4};
+        spec.shapes = {spec.bias, spec.bias};
+        spec.shapes[1][4] = 9.0F;
+        spec.bias = {0.25F, 0.5F};
+        writeModel(modelDirectory(), spec);
+    }
+    Coordinates evaluated() {
+        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
+        takeMessages();
+        return result(*rig_);
+    }
+    /// One evaluation in which one call fails. False when there is no such call.
+    bool expectCall(const std::string& operation, int call, bool isFirst);
+
+    Coordinates right_, withoutModel_;
+};
+
+bool EveryHostCall::expectCall(const std::string& operation, int call, bool isFirst) {
+    const HPlug output = rig_->output(0);
+    if (!isFirst) {
+        EXPECT_EQ(evaluated(), right_);
+        nodeOf(*rig_).requestReload(0);
+    }
+    OpenQuarn::makeDirty(output);
+    Faults::fail(operation, call);
+    const HStatus status = OpenQuarn::evaluate(output);
+    const bool isReached = Faults::fired(operation);
+    Faults::clear();
+    const Texts messages = takeMessages();
+    if (!isReached)
+        return false;
+
+    const Coordinates points = result(*rig_);
+    neuralWarp::neuralWarpData* state = rig_->state(0);
+    const bool isApplied = state && state->modelApplied;
+    // a polygon that the host does not give is left out
+    const bool dropsPolygon = operation == "HFnMesh::getPolygonVertices" || operation == "HArray::assign";
+    if (status.error() || !isApplied) {
+        EXPECT_THAT(messages, testing::Not(IsEmpty()));
+        EXPECT_TRUE(points == came() || (!status.error() && points == withoutModel_));
+    } else if (!dropsPolygon) {
+        EXPECT_EQ(points, right_);
+    }
+    if (state && dropsPolygon)
+        state->markAllDirty();
+    else if (!status.error() && !isApplied) // it is the loader that failed, and it is not tried again
+        nodeOf(*rig_).requestReload(0);
+    EXPECT_EQ(evaluated(), right_);
+    return true;
+}
+
+// Attributes are looked up once in a process: it takes one of its own to see this fail.
+TEST_F(EveryHostCall, AnAttributeThatWasNotFoundIsLookedUpAgain) {
+    writeFullModel();
+    makeFullRig(false);
+    const HPlug output = rig_->output(0);
+    for (int attempt = 0; attempt < 3; ++attempt) {
+        OpenQuarn::makeDirty(output);
+        Faults::fail("HNodeClass::attribute");
+        const HStatus status = OpenQuarn::evaluate(output);
+        EXPECT_EQ(status.error(), Faults::fired("HNodeClass::attribute"));
+        Faults::clear();
+        if (status.error()) {
+            EXPECT_EQ(result(*rig_), came());
+        }
+        takeMessages();
+        rig_->state(0)->markAllDirty();
+        EXPECT_NE(evaluated(), came());
+    }
+}
+
+TEST_F(EveryHostCall, MayFailWithoutHarm) {
+    writeFullModel();
+    std::vector<std::string> reached;
+    for (const bool isMorphed : {false, true}) {
+        makeFullRig(isMorphed, false);
+        withoutModel_ = evaluated();
+        makeFullRig(isMorphed);
+        right_ = evaluated();
+        ASSERT_TRUE(rig_->state(0)->modelApplied);
+        ASSERT_NE(right_, withoutModel_);
+        for (const std::string& operation : Faults::operations())
+            for (const bool isFirst : {true, false})
+                for (int call = 1; call < 500; ++call) {
+                    SCOPED_TRACE(operation + ", call " + std::to_string(call) + (isFirst ? "" : " of a reload"));
+                    makeFullRig(isMorphed);
+                    if (!expectCall(operation, call, isFirst))
+                        break;
+                    if (call == 1)
+                        reached.push_back(operation);
+                }
+    }
+    EXPECT_THAT(reached, testing::IsSupersetOf({"HDataBlock::inputValue",
+                                                "HDataBlock::inputArrayValue",
+                                                "HDataBlock::outputArrayValue",
+                                                "HArrayDataHandle::jumpToElement",
+                                                "HArrayDataHandle::jumpToArrayElement",
+                                                "HArrayDataHandle::inputValue",
+                                                "HArrayDataHandle::outputValue",
+                                                "HArrayDataHandle::next",
+                                                "HArrayDataHandle::builder",
+                                                "HArrayDataBuilder::addElement",
+                                                "HArrayDataHandle::set",
+                                                "HFnPluginData::create",
+                                                "HDataHandle::set",
+                                                "HFnMesh::numPolygons",
+                                                "HFnMesh::numVertices",
+                                                "HFnMesh::getPolygonVertices",
+                                                "HItGeometry::HItGeometry",
+                                                "HItGeometry::rawPositions",
+                                                "HItGeometry::allPositions",
+                                                "HItGeometry::setAllPositions",
+                                                "HPxGeometryFilter::indexMapper",
+                                                "HPxDeformerNode::envelopeWeights",
+                                                "HFnBase::setObject"}));
+}
+
+} // namespace
