@@ -11,7 +11,6 @@
 namespace {
 
 namespace fs = std::filesystem;
-using ::testing::HasSubstr;
 
 const fs::path sources = NW_SOURCES;
 
