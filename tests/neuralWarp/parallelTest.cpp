@@ -7,9 +7,14 @@
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Evaluation.h"
 
-#include <functional>
 #include <tbb/global_control.h>
+#include <tbb/parallel_for.h>
 #include <tbb/task_arena.h>
+
+#include <atomic>
+#include <chrono>
+#include <functional>
+#include <thread>
 
 namespace {
 
@@ -21,11 +26,26 @@ HStatus serial(const HPlugArray& plugs) {
     return OpenQuarn::evaluate(plugs, false);
 }
 
+/// Each of two tasks waits, for a bounded time, until the other has come.
+bool aSecondThreadComes() {
+    std::atomic<int> here = 0;
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+    tbb::parallel_for(0, 2, [&](int) {
+        ++here;
+        while (here < 2 && std::chrono::steady_clock::now() < deadline)
+            std::this_thread::yield();
+    });
+    return std::chrono::steady_clock::now() < deadline;
+}
+
 Evaluator onThreads(std::size_t threads) {
     return [threads](const HPlugArray& plugs) {
         const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
         tbb::task_arena arena(static_cast<int>(threads)); // more slots than cores, if need be
-        return arena.execute([&] { return OpenQuarn::evaluate(plugs, true); });
+        return arena.execute([&] {
+            EXPECT_TRUE(aSecondThreadComes()) << "one thread would be compared with itself";
+            return OpenQuarn::evaluate(plugs, true);
+        });
     };
 }
 
