@@ -162,6 +162,7 @@ TEST_F(Command, AnswersByItsFlags) {
         {"-rm -mi 4 warp1", success, "", none, {}, "---- none pml-"},
         {"-rm -mi 2 -mi 0 warp1", success, "", none, {noData(2)}, "pml- none ----"},
         {"-rm -mi 0 -mi 2 warp1", failure, "", none, {noData(2)}, "pml- none ----"},
+        {"-rm -mi 2 -mi 0 -mi 2 warp1", failure, "", none, {noData(2), noData(2)}, "pml- none ----"},
         {"-rm -vertexDeltas pos -mi 0 warp1", success, "", none, {}, "pml- none ----"},
         {"-rm -vertexDeltas POS -mi 0 warp1", success, "", none, {}, "pml- none ----"}, // not even looked at
         {"-rm -dumpInfo -mi 0 warp1", success, "{" + described(0) + "}", none, {}, "pml- none ----"},
@@ -382,9 +383,10 @@ TEST_F(Command, ExportModeLeavesTheGeometryAndTakesTheExportSettings) {
 
     // an edit is taken over when the mode is switched on, and not before
     rig.plug("export[0].smoothingIterations").setInt(5);
+    rig.plug("export[0].deltaMode").setShort(0);
     EXPECT_EQ(settings(), std::pair(std::int64_t{2}, 1U));
     run("neuralWarp -exp on -mi 0 warp1");
-    EXPECT_EQ(settings(), std::pair(std::int64_t{5}, 1U));
+    EXPECT_EQ(settings(), std::pair(std::int64_t{5}, 0U));
 
     run("neuralWarp -exp off -mi 0 warp1");
     EXPECT_EQ(settings(), std::pair(std::int64_t{0}, 0U));
