@@ -156,6 +156,10 @@ TEST_F(Inversion, TheDeformerReturnsTheTargetFromWhatTheCommandExtracts) {
                 }
             }
             EXPECT_EQ(firstDifference(result, wanted), wanted.length()) << "a vertex that is not affected moved";
+            // outside of an export, the settings are the model's
+            startExport(static_cast<short>(1 - mode), static_cast<int>(smoothing) + 1);
+            run("-exportActive off");
+            expectSame(deltas("dbp"), trainingDeltas("dbp", surface, pose.input, pose.target, smoothing), "dbp after");
         }
         if (!zooMesh.degenerate && smoothing == 0) {
             EXPECT_EQ(std::count(regular.begin(), regular.end(), false), 0);
