@@ -58,8 +58,7 @@ TEST_F(Memory, OfASteadyEvaluationIsItsWorkingArrays) {
                 watch.threshold = SIZE_MAX;
                 Sizes expected = large(); // the outputs, and what else the network takes
                 expected.insert(expected.end(), {32 * n, 12 * n, 12 * n, 12 * n}); // positions, points, deltas, result
-                if (deltaMode == 1)
-                    expected.push_back(128 * n); // frames
+                // and no frames: they are not kept
                 if (smoothing > 0)
                     expected.push_back(12 * n); // scratch
                 if (isMorphed)
