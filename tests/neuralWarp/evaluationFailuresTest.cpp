@@ -11,26 +11,10 @@
 namespace {
 
 using OpenQuarn::Faults;
-using testing::ElementsAre;
 using testing::IsEmpty;
 
 class EvaluationFailures : public FailureTest {
 public:
-    enum class Points { asTheyCame, rounded, moved };
-
-    /// A rig with its model loaded; `change` is applied to the specification of the model.
-    warpRig::Rig& makeRig(const std::function<void(ModelSpec&)>& change = {}) {
-        session.newScene();
-        ModelSpec spec = modelSpec();
-        if (change)
-            change(spec);
-        writeModel(modelDirectory(), spec);
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = unevenMesh()});
-        rig_->setModelRoot(folder.path());
-        rig_->setControls({1.0});
-        return *rig_;
-    }
     void remove(const char* element) const {
         HDGModifier modifier;
         modifier.removeMultiInstance(rig_->plug(element), true);
@@ -47,12 +31,10 @@ public:
                     texts.end());
         return texts;
     }
-
-    std::optional<warpRig::Rig> rig_;
 };
 
-std::string onDemand(const char* operation) {
-    return std::string(operation) + ": failed on demand";
+std::string onDemand(const std::string& operation) {
+    return operation + ": failed on demand";
 }
 
 TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
@@ -61,78 +43,74 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
     const std::string targetInvalid = "error: [NEURAL WARP] Target geometry is not a valid mesh";
     const std::string noDeltas = "error: [NEURAL WARP] No delta computed from the ML model";
     const Texts notFinite{noDeltas, report("the model gave no values: a control value is not finite")};
-    const auto fault = [](const char* operation, int call = 1) { return [=](T&) { Faults::fail(operation, call); }; };
+    const auto fault = [](const char* operation) { return [=](T&) { Faults::fail(operation); }; };
     const auto controls = [](std::vector<double> values) { return [=](T& t) { t.rig_->setControls(values); }; };
-    const auto morph = [](HObject mesh) {
-        return [=](T& t) {
-            t.rig_->plug("targetMorphEnabled").setBool(true);
-            if (!mesh.isNull())
-                t.rig_->setMorphTarget(0, mesh);
-        };
+    const auto removed = [](const char* element) { return [=](T& t) { t.remove(element); }; };
+    const auto rest = [](HObject mesh) { return [=](T& t) { t.rig_->setRest(0, mesh); }; };
+    const auto morphOn = [](T& t) { t.rig_->plug("targetMorphEnabled").setBool(true); };
+    const auto smallMorph = [&](T& t) {
+        morphOn(t);
+        t.rig_->setMorphTarget(0, unevenMesh(2, 1));
     };
-    const auto reload = [](std::function<void(ModelSpec&)> change) {
+    const auto noMorphMesh = [&](T& t) {
+        smallMorph(t);
+        warpRig::setMesh(t.rig_->plug("targetMorphGeometry[0]").source().node(), {});
+    };
+    const auto model = [](std::size_t outputs, std::size_t shapes = 0, std::size_t shapeSize = 27) {
         return [=](T& t) {
-            ModelSpec spec = modelSpec();
-            change(spec);
-            writeModel(t.modelDirectory(), spec);
+            t.writeChanged([&](ModelSpec& spec) {
+                spec.bias.resize(outputs);
+                spec.shapes.assign(shapes, std::vector<float>(shapeSize, 1.0F));
+            });
             nodeOf(*t.rig_).requestReload(0);
         };
     };
-    const auto tooFew = [](const char* has, const char* needed) {
-        return Texts{"error: [NEURAL WARP] Size of predicted deltas (" + std::string(has) +
-                         ") does not match affected vertex count (" + needed + ")",
-                     report("the model gives " + std::string(has) + " deltas where " + needed + " are needed")};
+    const auto tooFew = [](const std::string& has) {
+        return Texts{"error: [NEURAL WARP] Size of predicted deltas (" + has +
+                         ") does not match affected vertex count (9)",
+                     report("the model gives " + has + " deltas where 9 are needed")};
     };
+    const auto noElement = [](const char* array) {
+        return report(std::string("'warp1.") + array + "' has no element 0");
+    };
+    const std::string targetMismatch =
+        "error: [NEURAL WARP] Size of target geometry (0) does not match deforming geometry (9)";
+    const std::string controlMismatch = "error: [NEURAL WARP] Size of the ML model inputs (1) does not match the "
+                                        "connected control attributes count(0).";
+    const std::string failure = report("failure");
+    const std::string noArray = "HDataBlock::inputArrayValue";
+    const std::string noArrayReport = report(onDemand(noArray));
     struct Row {
         const char* name;
         std::function<void(T&)> spoil; ///< after a first evaluation that went well
         Texts messages;
     };
     const Row rows[] = {
-        {"no element of models", [](T& t) { t.remove("models[0]"); }, {}},
+        {"no element of models", removed("models[0]"), {}},
         {"envelope", fault("HDataBlock::inputValue"), {report(onDemand("HDataBlock::inputValue"))}},
         {"no state", fault("HArrayDataHandle::outputValue"), {}},
-        {"rest without a mesh", [](T& t) { t.rig_->setRest(0, {}); }, {restInvalid}},
-        {"rest too small", [](T& t) { t.rig_->setRest(0, unevenMesh(2, 1)); }, {restInvalid}},
-        {"no rest",
-         [](T& t) { t.remove("originalGeometry[0]"); },
-         {report("'warp1.originalGeometry' has no element 0")}},
-        {"morph without an element",
-         morph({}),
-         {targetInvalid, report("'warp1.targetMorphGeometry' has no element 0")}},
-        {"morph without a mesh",
-         [&](T& t) {
-             morph(unevenMesh())(t);
-             warpRig::setMesh(t.rig_->plug("targetMorphGeometry[0]").source().node(), {});
-         },
-         {targetInvalid, report("failure")}},
-        {"morph too small",
-         morph(unevenMesh(2, 1)),
-         {"error: [NEURAL WARP] Size of target geometry (0) does not match deforming geometry (9)", report("failure")}},
-        {"no controls",
-         controls({}),
-         {"error: [NEURAL WARP] Size of the ML model inputs (1) does not match the connected control attributes "
-          "count(0).",
-          report("failure"), report("failure")}},
+        {"rest without a mesh", rest({}), {restInvalid}},
+        {"rest too small", rest(unevenMesh(2, 1)), {restInvalid}},
+        {"no rest", removed("originalGeometry[0]"), {noElement("originalGeometry")}},
+        {"morph without an element", morphOn, {targetInvalid, noElement("targetMorphGeometry")}},
+        {"morph without a mesh", noMorphMesh, {targetInvalid, failure}},
+        {"morph too small", smallMorph, {targetMismatch, failure}},
+        {"no controls", controls({}), {controlMismatch, failure, failure}},
         {"control values",
          fault("HDataBlock::inputArrayValue"),
-         {report(onDemand("HDataBlock::inputArrayValue"), "neuralWarp/neuralWarpUtils"),
-          report(onDemand("HDataBlock::inputArrayValue")), report(onDemand("HDataBlock::inputArrayValue"))}},
+         {report(onDemand(noArray), "neuralWarp/neuralWarpUtils"), noArrayReport, noArrayReport}},
         {"no number", controls({std::numeric_limits<double>::quiet_NaN()}), notFinite},
         {"infinite as a float", controls({1e300}), notFinite},
-        {"too few outputs", reload([](ModelSpec& spec) { spec.bias.resize(26); }), tooFew("8", "9")},
-        {"no whole delta", reload([](ModelSpec& spec) { spec.bias.resize(2); }), tooFew("0", "9")},
+        {"too few outputs", model(26), tooFew("8")},
+        {"no whole delta", model(2), tooFew("0")},
         {"too few coefficients",
-         reload([](ModelSpec& spec) {
-             spec.bias.resize(1);
-             spec.shapes = {std::vector<float>(27), std::vector<float>(27)};
-         }),
+         model(1, 2),
          {noDeltas, report("the model gives 1 coefficients for 2 principal shapes")}},
-        {"too small a basis", reload([](ModelSpec& spec) { spec.shapes = {std::vector<float>(24, 1.0F)}; }),
-         tooFew("8", "9")},
+        {"too small a basis", model(1, 1, 24), tooFew("8")},
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
+        writeModel(modelDirectory(), modelSpec());
         makeRig();
         ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
         row.spoil(*this);
@@ -172,13 +150,15 @@ EvaluationFailures::Coordinates morphed(EvaluationFailures::Coordinates from,
 }
 
 TEST_F(EvaluationFailures, AModelThatDrivesNothingGivesWayOneEvaluationLater) {
+    writeModel(modelDirectory(), modelSpec());
     makeRig();
     ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
     const Coordinates moved = result(*rig_);
-    makeRig([](ModelSpec& spec) {
+    writeChanged([](ModelSpec& spec) {
         spec.subsetState = "partial";
         spec.affectMap = {42};
     });
+    makeRig();
     const auto expect = [&](const Coordinates& points, const char* flags) {
         EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
         EXPECT_EQ(result(*rig_), points);
@@ -195,6 +175,7 @@ TEST_F(EvaluationFailures, AModelThatDrivesNothingGivesWayOneEvaluationLater) {
 }
 
 TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
+    writeModel(modelDirectory(), modelSpec());
     makeRig();
     ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
     const Coordinates moved = result(*rig_);
@@ -221,11 +202,7 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
         };
     };
     const auto off = [](T& t) { t.rig_->plug("models[0].modelActive").setShort(0); };
-    const auto otherMode = [](T& t) {
-        ModelSpec spec = modelSpec();
-        spec.deltaMode = 2;
-        writeModel(t.modelDirectory(), spec);
-    };
+    const auto otherMode = [](T& t) { t.writeChanged([](ModelSpec& spec) { spec.deltaMode = 2; }); };
     const auto badRoot = [](T& t) { t.rig_->setModelRoot(t.folder.path() / "missing"); };
     const auto smallMorph = [](T& t) {
         t.rig_->setMorphTarget(0, unevenMesh(1, 1));
@@ -265,6 +242,7 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
     };
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
+        writeModel(modelDirectory(), modelSpec());
         makeRig();
         row.set(*this);
         EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
@@ -309,16 +287,16 @@ public:
             OpenQuarn::evaluate(rig_->plug(into).source()); // calls of other nodes are not looked at
     }
     void writeFullModel() const {
-        ModelSpec spec = modelSpec();
-        spec.controls = 2;
-        spec.affectCount = 5;
-        spec.smoothingIterations = 2;
-        spec.subsetState = "partial";
-        spec.affectMap = {0, 1, 2, 3, 4};
-        spec.shapes = {spec.bias, spec.bias};
-        spec.shapes[1][4] = 9.0F;
-        spec.bias = {0.25F, 0.5F};
-        writeModel(modelDirectory(), spec);
+        writeChanged([](ModelSpec& spec) {
+            spec.controls = 2;
+            spec.affectCount = 5;
+            spec.smoothingIterations = 2;
+            spec.subsetState = "partial";
+            spec.affectMap = {0, 1, 2, 3, 4};
+            spec.shapes = {spec.bias, spec.bias};
+            spec.shapes[1][4] = 9.0F;
+            spec.bias = {0.25F, 0.5F};
+        });
     }
     Coordinates evaluated() {
         EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);

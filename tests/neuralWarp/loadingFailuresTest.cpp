@@ -49,8 +49,8 @@ public:
     struct Row {
         const char* name;
         std::function<void(LoadingFailures&)> spoil;
-        std::vector<Step> steps; ///< one evaluation each; after the last, nothing changes any more
-        std::string printed;     ///< on standard output, in the first of them
+        std::vector<Step> steps;  ///< one evaluation each; after the last, nothing changes any more
+        std::string printed = {}; ///< on standard output, in the first of them
     };
 
     // --- what follows from a failing step of loading ---
@@ -71,8 +71,8 @@ public:
     static std::vector<Step> validationFails(const Texts& messages) {
         return {{messages, Points::rounded, "", {0, 0, 0, never, 0}}};
     }
-    static std::vector<Step> networkFails(const Texts& messages) {
-        return {{messages, Points::rounded, "valid", {0, 0, 0, 0, 0}}};
+    static std::vector<Step> networkFails(const Texts& messages, const char* flags = "valid") {
+        return {{messages, Points::rounded, flags, {0, 0, 0, 0, 0}}};
     }
     static std::vector<Step> loads(const Texts& messages, const char* flags = "applied valid") {
         return {{messages, Points::moved, flags, {0, 0, 0, 0, 0}}};
@@ -80,24 +80,40 @@ public:
 
     // --- the rig ---
 
-    warpRig::Rig& makeRig() {
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = unevenMesh()});
-        rig_->setModelRoot(folder.path());
-        rig_->setControls({1.0});
-        return *rig_;
-    }
     void setModelName(const std::string& name) const { rig_->plug("models[0].modelName").setString(name); }
-    void setRoot(const std::string& root) const { rig_->plug("modelRoot").setString(root); }
-    fs::path file(const char* name) const { return modelDirectory() / name; }
-    void loopAt(const fs::path& path) const {
-        fs::remove_all(path);
-        fs::create_symlink(path.filename(), path);
+    void setRoot(const std::string& path) const { rig_->plug("modelRoot").setString(path); }
+    fs::path file(const std::string& name) const { return modelDirectory() / name; }
+
+    // --- ways to spoil the model ---
+
+    using Spoil = std::function<void(LoadingFailures&)>;
+    static Spoil root(const std::string& path) {
+        return [=](LoadingFailures& t) { t.setRoot(path); };
     }
-    void write(void (*change)(ModelSpec&)) const {
-        ModelSpec spec = modelSpec();
-        change(spec);
-        writeModel(modelDirectory(), spec);
+    static Spoil name(const std::string& text) {
+        return [=](LoadingFailures& t) { t.setModelName(text); };
+    }
+    static Spoil gone(const std::string& name) {
+        return [=](LoadingFailures& t) { fs::remove_all(t.file(name)); };
+    }
+    static Spoil folderAt(const std::string& name) {
+        return [=](LoadingFailures& t) {
+            fs::remove(t.file(name));
+            fs::create_directory(t.file(name));
+        };
+    }
+    /// A link to itself, which cannot be looked up.
+    static Spoil loopAt(const std::string& name) {
+        return [=](LoadingFailures& t) {
+            fs::remove(t.file(name));
+            fs::create_symlink(name, t.file(name));
+        };
+    }
+    static Spoil text(const std::string& name, const std::string& bytes) {
+        return [=](LoadingFailures& t) { writeFile(t.file(name), bytes); };
+    }
+    static Spoil written(void (*change)(ModelSpec&)) {
+        return [=](const LoadingFailures& t) { t.writeChanged(change); };
     }
 
     /// What the evaluation prints.
@@ -120,8 +136,17 @@ public:
     }
 
     void expectRow(const Row& row);
+    void expectRows(const std::vector<Row>& rows) {
+        for (const Row& row : rows) {
+            SCOPED_TRACE(row.name);
+            expectRow(row);
+        }
+    }
+    static std::string unanswered(const std::string& path,
+                                  const std::string& reason = "Too many levels of symbolic links") {
+        return report("'ROOT/" + path + "' cannot be looked up: " + reason);
+    }
 
-    std::optional<warpRig::Rig> rig_;
     Coordinates moved_;
 };
 
@@ -132,7 +157,6 @@ void LoadingFailures::expectRow(const Row& row) {
         ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
         moved_ = result(*rig_);
         ASSERT_NE(moved_, rounded());
-        session.newScene();
         makeRig();
     }
     row.spoil(*this);
@@ -164,119 +188,75 @@ void LoadingFailures::expectRow(const Row& row) {
     EXPECT_EQ(stateText::raised(*rig_->state(0)), "applied valid");
     EXPECT_EQ(result(*rig_), moved_);
     EXPECT_THAT(shown(), IsEmpty());
-    session.newScene();
 }
 
 TEST_F(LoadingFailures, OfTheDirectory) {
-    using T = LoadingFailures;
-    const Row rows[] = {
-        {"no root", [](T& t) { t.setRoot(""); }, directoryFails({noPath}), ""},
-        {"missing root", [](T& t) { t.setRoot("/no/such folder"); }, directoryFails({badPath("/no/such folder")}), ""},
-        {"no name", [](T& t) { t.setModelName(""); }, directoryFails({noPath}), ""},
-        {"missing directory", [](T& t) { t.setModelName("other.onnx"); }, directoryFails({badPath("ROOT/other.nwrp")}),
-         ""},
-        {"a file instead",
-         [](T& t) {
-             fs::remove_all(t.modelDirectory());
-             writeFile(t.modelDirectory(), "not a directory");
-         },
-         directoryFails({badPath("ROOT/model.nwrp")}), ""},
-        {"below a file", [](T& t) { t.setRoot(t.file("model.onnx").string()); },
-         directoryFails({badPath("ROOT/model.nwrp/model.onnx/model.nwrp")}), ""},
-        {"root that cannot be looked up",
-         [](T& t) {
-             t.loopAt(t.folder.path() / "loop");
-             t.setRoot((t.folder.path() / "loop").string());
-         },
-         directoryFails({report("'ROOT/loop' cannot be looked up: Too many levels of symbolic links")}), ""},
-        {"name that is too long", [](T& t) { t.setModelName(std::string(300, 'n')); },
-         directoryFails({report("'ROOT/" + std::string(300, 'n') + ".nwrp' cannot be looked up: File name too long")}),
-         ""},
+    const std::string longName(300, 'n');
+    const auto aFile = [](const LoadingFailures& t) {
+        fs::remove_all(t.modelDirectory());
+        writeFile(t.modelDirectory(), "not a directory");
     };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.name);
-        expectRow(row);
-    }
+    const auto belowAFile = [](const LoadingFailures& t) { t.setRoot(t.file("model.onnx").string()); };
+    const auto loop = [](LoadingFailures& t) {
+        loopAt("loop")(t);
+        t.setRoot(t.file("loop").string());
+    };
+    expectRows({
+        {"no root", root(""), directoryFails({noPath})},
+        {"missing root", root("/no/such folder"), directoryFails({badPath("/no/such folder")})},
+        {"no name", name(""), directoryFails({noPath})},
+        {"missing directory", name("other.onnx"), directoryFails({badPath("ROOT/other.nwrp")})},
+        {"a file instead", aFile, directoryFails({badPath("ROOT/model.nwrp")})},
+        {"below a file", belowAFile, directoryFails({badPath("ROOT/model.nwrp/model.onnx/model.nwrp")})},
+        {"loop of links", loop, directoryFails({unanswered("model.nwrp/loop")})},
+        {"name too long", name(longName), directoryFails({unanswered(longName + ".nwrp", "File name too long")})},
+    });
 }
 
 TEST_F(LoadingFailures, OfTheMetadata) {
-    using T = LoadingFailures;
-    const std::string badMetadata =
-        "error: [NEURAL WARP \"warp1\"] Failed to load metadata from ROOT/model.nwrp/metadata.json";
-    const Row rows[] = {
-        {"missing", [](T& t) { fs::remove(t.file("metadata.json")); }, metadataFails({}), ""},
-        {"malformed", [](T& t) { writeFile(t.file("metadata.json"), "{"); }, metadataFails({badMetadata}),
-         "Parse error\n"},
-        {"unreadable",
-         [](T& t) {
-             fs::remove(t.file("metadata.json"));
-             fs::create_directory(t.file("metadata.json"));
-         },
-         metadataFails({badMetadata}), "Failed to open metadata file stream\n"},
-        {"cannot be looked up", [](T& t) { t.loopAt(t.file("metadata.json")); },
-         metadataFails(
-             {report("'ROOT/model.nwrp/metadata.json' cannot be looked up: Too many levels of symbolic links")}),
-         ""},
-        {"another vertex count", [](T& t) { t.write([](ModelSpec& spec) { spec.fullCount = 10; }); },
-         validationFails({fullCountMismatch(10), modelInvalid, report(unnamedFailure)}), ""},
-        {"both counts", [](T& t) { t.write([](ModelSpec& spec) { spec.fullCount = spec.affectCount = 0; }); },
-         validationFails({fullCountMismatch(0), affectCountMismatch(0), modelInvalid, report(unnamedFailure)}), ""},
-        {"another affected count", [](T& t) { t.write([](ModelSpec& spec) { spec.affectCount = 7; }); },
-         loads({affectCountMismatch(7)}), ""},
-        {"another order of vertices",
-         [](T& t) {
-             t.write([](ModelSpec& spec) {
-                 spec.subsetState = "partial";
-                 spec.affectMap = {8, 7, 6, 5, 4, 3, 2, 1, 0};
-                 spec.componentTagExpression = "face";
-                 for (std::size_t i = 0; i < 4; ++i) // as many slots back
-                     std::swap_ranges(&spec.bias[3 * i], &spec.bias[3 * i] + 3, &spec.bias[3 * (8 - i)]);
-             });
-         },
-         loads({"warning: [NEURAL WARP \"warp1\", multiIndex 0] Setup for multiIndex 0 not the same as for trained "
-                "model. Using deltas on 9 of 9 affected verts. Trained model subset is \"face\""},
-               "applied valid affectMap"),
-         ""},
+    const char* file = "metadata.json";
+    const std::string bad = "error: [NEURAL WARP \"warp1\"] Failed to load metadata from ROOT/model.nwrp/metadata.json";
+    const auto otherFullCount = [](ModelSpec& spec) { spec.fullCount = 10; };
+    const auto otherCounts = [](ModelSpec& spec) { spec.fullCount = spec.affectCount = 0; };
+    const auto otherAffectCount = [](ModelSpec& spec) { spec.affectCount = 7; };
+    const auto otherOrder = [](ModelSpec& spec) {
+        spec.subsetState = "partial";
+        spec.affectMap = {8, 7, 6, 5, 4, 3, 2, 1, 0};
+        spec.componentTagExpression = "face";
+        for (std::size_t i = 0; i < 4; ++i) // the slots the other way round give the same deltas
+            std::swap_ranges(&spec.bias[3 * i], &spec.bias[3 * i] + 3, &spec.bias[3 * (8 - i)]);
     };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.name);
-        expectRow(row);
-    }
+    const std::string setup = "warning: [NEURAL WARP \"warp1\", multiIndex 0] Setup for multiIndex 0 not the same as "
+                              "for trained model. Using deltas on 9 of 9 affected verts. Trained model subset is "
+                              "\"face\"";
+    expectRows({
+        {"missing", gone(file), metadataFails({})},
+        {"malformed", text(file, "{"), metadataFails({bad}), "Parse error\n"},
+        {"unreadable", folderAt(file), metadataFails({bad}), "Failed to open metadata file stream\n"},
+        {"loop of links", loopAt(file), metadataFails({unanswered("model.nwrp/metadata.json")})},
+        {"another vertex count", written(otherFullCount),
+         validationFails({fullCountMismatch(10), modelInvalid, report(unnamedFailure)})},
+        {"both counts", written(otherCounts),
+         validationFails({fullCountMismatch(0), affectCountMismatch(0), modelInvalid, report(unnamedFailure)})},
+        {"another affected count", written(otherAffectCount), loads({affectCountMismatch(7)})},
+        {"another order of vertices", written(otherOrder), loads({setup}, "applied valid affectMap")},
+    });
 }
 
 TEST_F(LoadingFailures, OfTheNetworkAndItsShapes) {
-    using T = LoadingFailures;
+    const char* file = "model.onnx";
+    const char* shapes = "principal_shapes.json";
     const std::string printed = "[NEURAL WARP] ERROR, Failed to load the ONNX model ROOT/model.nwrp/model.onnx\n";
-    const Row rows[] = {
-        {"missing", [](T& t) { fs::remove(t.file("model.onnx")); },
-         networkFails({badPath("ROOT/model.nwrp/model.onnx"), modelInit}), ""},
-        {"damaged", [](T& t) { writeFile(t.file("model.onnx"), "no network"); }, networkFails({modelInit}), printed},
-        {"a directory",
-         [](T& t) {
-             fs::remove(t.file("model.onnx"));
-             fs::create_directory(t.file("model.onnx"));
-         },
-         networkFails({modelInit}), printed},
-        {"cannot be looked up", [](T& t) { t.loopAt(t.file("model.onnx")); }, networkFails({modelInit}), printed},
-        {"bad shapes", [](T& t) { writeFile(t.file("principal_shapes.json"), "[1"); }, loads({}), "Parse error\n"},
-        {"shapes of another count",
-         [](T& t) {
-             writeFile(t.file("principal_shapes.json"),
-                       R"({"principalShapeCount":2,"vertCount":1,"principalShapes":[[1,2,3]]})");
-         },
+    expectRows({
+        {"missing", gone(file), networkFails({badPath("ROOT/model.nwrp/model.onnx"), modelInit})},
+        {"damaged", text(file, "no network"), networkFails({modelInit}), printed},
+        {"a directory", folderAt(file), networkFails({modelInit}), printed},
+        {"loop of links", loopAt(file), networkFails({modelInit}), printed},
+        {"bad shapes", text(shapes, "[1"), loads({}), "Parse error\n"},
+        {"shapes of another count", text(shapes, R"({"principalShapeCount":2,"vertCount":1,"principalShapes":[[1]]})"),
          loads({}), "Error: principalShapeCount does not match the number of principal shapes\n"},
-        {"shapes that cannot be looked up",
-         [](T& t) { t.loopAt(t.file("principal_shapes.json")); },
-         {{{report("'ROOT/model.nwrp/principal_shapes.json' cannot be looked up: Too many levels of symbolic links")},
-           Points::rounded,
-           "",
-           {0, 0, 0, 0, 0}}},
-         ""},
-    };
-    for (const Row& row : rows) {
-        SCOPED_TRACE(row.name);
-        expectRow(row);
-    }
+        {"loop instead of shapes", loopAt(shapes), networkFails({unanswered("model.nwrp/principal_shapes.json")}, "")},
+    });
 }
 
 TEST_F(LoadingFailures, TheExtensionOfANameIsReplaced) {
@@ -300,26 +280,23 @@ TEST_F(LoadingFailures, AModelThatIsOffIsLoadedWhenItIsSwitchedOn) {
 }
 
 TEST_F(LoadingFailures, ErrorsAreForWhoIsLooking) {
-    write([](ModelSpec& spec) {
+    writeChanged([](ModelSpec& spec) {
         spec.fullCount = 10;
         spec.affectCount = 8;
     });
     makeRig();
     const Texts all{fullCountMismatch(10), affectCountMismatch(8), modelInvalid, report(unnamedFailure)};
     const Texts ungated{affectCountMismatch(8), report(unnamedFailure)};
-    using OpenQuarn::Animation;
-    struct Moment {
-        bool isPlaying, isScrubbing;
-        Texts messages;
-    };
-    for (const Moment& moment :
-         {Moment{true, false, ungated}, Moment{false, true, ungated}, Moment{false, false, all}}) {
-        Animation::setPlaying(moment.isPlaying);
-        Animation::setScrubbing(moment.isScrubbing);
+    const auto expect = [&](bool isPlaying, bool isScrubbing, const Texts& messages) {
+        OpenQuarn::Animation::setPlaying(isPlaying);
+        OpenQuarn::Animation::setScrubbing(isScrubbing);
         setModelName("model");
         EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
-        EXPECT_EQ(shown(), moment.messages);
-    }
+        EXPECT_EQ(shown(), messages);
+    };
+    expect(true, false, ungated);
+    expect(false, true, ungated);
+    expect(false, false, all);
     OpenQuarn::EvaluationContext context(12.0);
     HStatus status;
     context.evaluateAt(rig_->output(0), &status);
@@ -351,76 +328,34 @@ TEST_F(LoadingFailures, FilesThatWereFoundAreCounted) {
 
 TEST_F(LoadingFailures, OfADescription) {
     writeModel(modelDirectory(), modelSpec());
-    warpRig::Rig& rig = makeRig();
-    rig.addGeometry(1, {.mesh = unevenMesh(), .hasModelElement = false});
+    makeRig();
+    const warpRig::Rig& rig = *rig_;
+    rig_->addGeometry(1, {.mesh = unevenMesh(), .hasModelElement = false});
     ASSERT_EQ(rig.deform(0), HStatus::kSuccess);
     EXPECT_EQ(rig.deform(1), HStatus::kFailure);
     takeMessages();
+    const auto expect = [&](unsigned index, const std::string& text, const Texts& messages, const std::string& flags) {
+        HString described("before");
+        EXPECT_EQ(nodeOf(rig).describeModel(index, described), text.empty() ? HStatus::kFailure : HStatus::kSuccess);
+        EXPECT_EQ(withoutFolder(described.asStdString()), text);
+        EXPECT_EQ(shown(), messages);
+        const neuralWarp::neuralWarpData* state = rig.state(index);
+        EXPECT_EQ(state ? stateText::raised(*state) : "", flags);
+    };
+    const std::string found = "{'rootPath' : 'ROOT' ,'modelPath' : 'ROOT/model.nwrp'}";
+    const std::string due = "load metadata applied valid";
     const std::string noElement = report("'warp1.models' has no element 1");
-    struct Description {
-        const char* name;
-        unsigned index;
-        std::function<void()> change;
-        HStatus::Code status;
-        std::string text;
-        Texts messages;
-        std::string flags;
-    };
-    const Description rows[] = {
-        {"loaded",
-         0,
-         [] {},
-         HStatus::kSuccess,
-         "{'rootPath' : 'ROOT' ,'modelPath' : 'ROOT/model.nwrp'}",
-         {},
-         "applied valid"},
-        {"due",
-         0,
-         [&] { setModelName("model.x"); },
-         HStatus::kSuccess,
-         "{'rootPath' : 'ROOT' ,'modelPath' : 'ROOT/model.nwrp'}",
-         {},
-         "load metadata applied valid"},
-        {"missing directory",
-         0,
-         [&] { setModelName("other"); },
-         HStatus::kFailure,
-         "",
-         {badPath("ROOT/other.nwrp"), report(unnamedFailure)},
-         "load metadata applied valid"},
-        {"known to be missing",
-         0,
-         [] {},
-         HStatus::kSuccess,
-         "{'rootPath' : 'ROOT' ,'modelPath' : ''}",
-         {},
-         "load metadata applied valid"},
-        {"no root",
-         0,
-         [&] { setRoot(""); },
-         HStatus::kFailure,
-         "",
-         {noPath, report(unnamedFailure)},
-         "load metadata applied valid"},
-        {"no element",
-         1,
-         [&] { setRoot(folder.path().string()); },
-         HStatus::kFailure,
-         "",
-         {noElement, noElement},
-         "topology indexMap connections restFrames load metadata"},
-        {"no state", 2, [] {}, HStatus::kFailure, "", {}, ""},
-    };
-    for (const Description& row : rows) {
-        SCOPED_TRACE(row.name);
-        row.change();
-        HString text("before");
-        EXPECT_EQ(nodeOf(rig).describeModel(row.index, text), row.status);
-        EXPECT_EQ(withoutFolder(text.asStdString()), row.text);
-        EXPECT_EQ(shown(), row.messages);
-        const neuralWarp::neuralWarpData* state = rig.state(row.index);
-        EXPECT_EQ(state ? stateText::raised(*state) : "", row.flags);
-    }
+    expect(0, found, {}, "applied valid");
+    setModelName("model.x");
+    expect(0, found, {}, due);
+    setModelName("other");
+    expect(0, "", {badPath("ROOT/other.nwrp"), report(unnamedFailure)}, due);
+    expect(0, "{'rootPath' : 'ROOT' ,'modelPath' : ''}", {}, due); // not looked for again
+    setRoot("");
+    expect(0, "", {noPath, report(unnamedFailure)}, due);
+    setRoot(folder.path().string());
+    expect(1, "", {noElement, noElement}, "topology indexMap connections restFrames load metadata");
+    expect(2, "", {}, "");
 }
 
 } // namespace

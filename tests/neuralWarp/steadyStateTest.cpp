@@ -12,22 +12,18 @@ using testing::IsEmpty;
 
 class SteadyState : public FailureTest {
 public:
-    void makeRig(std::uint32_t deltaMode, std::uint32_t smoothing, bool isPartial) {
-        session.newScene();
-        ModelSpec spec = modelSpec();
-        spec.deltaMode = deltaMode;
-        spec.smoothingIterations = smoothing;
-        if (isPartial) {
+    void makeRigOf(std::uint32_t deltaMode, std::uint32_t smoothing, bool isPartial) {
+        writeChanged([&](ModelSpec& spec) {
+            spec.deltaMode = deltaMode;
+            spec.smoothingIterations = smoothing;
+            if (!isPartial)
+                return;
             spec.subsetState = "partial";
             spec.affectMap = {0, 1, 2, 3, 4, 5, 6, 7, 7};
             spec.shapes = {spec.bias, spec.bias};
             spec.bias = {0.5F, 2.0F};
-        }
-        writeModel(modelDirectory(), spec);
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = unevenMesh()});
-        rig_->setModelRoot(folder.path());
-        rig_->setControls({1.0});
+        });
+        makeRig();
     }
     void expectEvaluation() {
         EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
@@ -39,8 +35,6 @@ public:
             p.z += by * p.x * p.y;
         return warpRig::withPoints(unevenMesh(), points);
     }
-
-    std::optional<warpRig::Rig> rig_;
 };
 
 TEST_F(SteadyState, NeedsNoFileAndRebuildsNothing) {
@@ -49,7 +43,7 @@ TEST_F(SteadyState, NeedsNoFileAndRebuildsNothing) {
             for (const bool isPartial : {false, true}) {
                 SCOPED_TRACE("mode " + std::to_string(deltaMode) + ", smoothing " + std::to_string(smoothing) +
                              (isPartial ? ", partial" : ""));
-                makeRig(deltaMode, smoothing, isPartial);
+                makeRigOf(deltaMode, smoothing, isPartial);
                 expectEvaluation();
                 const Coordinates first = result(*rig_);
                 expectEvaluation(); // what was built on the way to the model's settings is released here
@@ -74,7 +68,7 @@ TEST_F(SteadyState, NeedsNoFileAndRebuildsNothing) {
 }
 
 TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
-    makeRig(1, 3, true);
+    makeRigOf(1, 3, true);
     using T = SteadyState;
     struct Row {
         const char* name;

@@ -14,13 +14,7 @@ public:
     static constexpr std::size_t n = (columns + 1) * (columns + 1);
     using Sizes = std::vector<std::size_t>;
 
-    void makeRig() {
-        session.newScene();
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = unevenMesh(columns, columns)});
-        rig_->setModelRoot(folder.path());
-        rig_->setControls({1.0});
-    }
+    static HObject largeMesh() { return unevenMesh(columns, columns); }
     void writeMyModel(std::uint32_t deltaMode, std::uint32_t smoothing) const {
         ModelSpec spec = modelSpec(n);
         spec.deltaMode = deltaMode;
@@ -36,8 +30,6 @@ public:
         return status;
     }
     static Sizes large() { return {watch.sizes.begin(), watch.sizes.begin() + static_cast<long>(watch.count)}; }
-
-    std::optional<warpRig::Rig> rig_;
 };
 
 TEST_F(Memory, OfASteadyEvaluationIsItsWorkingArrays) {
@@ -45,8 +37,8 @@ TEST_F(Memory, OfASteadyEvaluationIsItsWorkingArrays) {
         for (const std::uint32_t smoothing : {0U, 2U})
             for (const bool isMorphed : {false, true}) {
                 writeMyModel(deltaMode, smoothing);
-                makeRig();
-                rig_->setMorphTarget(0, unevenMesh(columns, columns));
+                makeRig(largeMesh());
+                rig_->setMorphTarget(0, largeMesh());
                 rig_->plug("targetMorphEnabled").setBool(isMorphed);
                 rig_->plug("targetMorphEnvelope").setDouble(0.5);
                 for (int warmUp = 0; warmUp < 3; ++warmUp)
@@ -71,16 +63,16 @@ TEST_F(Memory, OfASteadyEvaluationIsItsWorkingArrays) {
 
 TEST_F(Memory, ThatIsMissingForAnyArrayFailsTheEvaluation) {
     writeMyModel(1, 2);
-    makeRig();
+    makeRig(largeMesh());
     ASSERT_EQ(evaluate(), HStatus::kSuccess);
     const Coordinates right = result(*rig_);
-    const Coordinates input = coordinates(warpRig::pointsOf(unevenMesh(columns, columns)));
+    const Coordinates input = coordinates(warpRig::pointsOf(largeMesh()));
     for (const bool isFirst : {false, true}) { // building the caches, or not
         std::size_t refused = 0;
         do {
             ++refused;
             SCOPED_TRACE(std::to_string(refused) + (isFirst ? " of the first evaluation" : ""));
-            makeRig();
+            makeRig(largeMesh());
             OpenQuarn::evaluate(rig_->plug("originalGeometry[0]").source());
             OpenQuarn::evaluate(rig_->plug("input[0].inputGeometry").source());
             if (!isFirst) {

@@ -10,6 +10,7 @@
 #include "openquarn_app/Evaluation.h"
 
 #include <array>
+#include <optional>
 #include <regex>
 #include <string>
 #include <vector>
@@ -60,6 +61,22 @@ public: // tables of what to spoil are lambdas, which get the test
     }
     static Coordinates result(const warpRig::Rig& rig) { return coordinates(rig.result(0)); }
 
+    /// A new scene with one geometry, whose model is switched on.
+    void makeRig(const HObject& mesh = unevenMesh()) {
+        session.newScene();
+        rig_.emplace();
+        rig_->addGeometry(0, {.mesh = mesh});
+        rig_->setModelRoot(folder.path());
+        rig_->setControls({1.0});
+    }
+    /// Writes the model of modelSpec(), changed.
+    template <class Change>
+    void writeChanged(Change change) const {
+        ModelSpec spec = modelSpec();
+        change(spec);
+        writeModel(modelDirectory(), spec);
+    }
+
     static neuralWarp::neuralWarpNode& nodeOf(const warpRig::Rig& rig) {
         return dynamic_cast<neuralWarp::neuralWarpNode&>(*HFnDependencyNode(rig.node).userNode());
     }
@@ -77,4 +94,6 @@ public: // tables of what to spoil are lambdas, which get the test
     static std::string report(const std::string& reason, const char* unit = "neuralWarp/neuralWarpNode") {
         return "report: API error in " + std::string(unit) + ", line N: " + reason;
     }
+
+    std::optional<warpRig::Rig> rig_;
 };
