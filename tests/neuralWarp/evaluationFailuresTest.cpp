@@ -207,7 +207,7 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
     const auto smallMorph = [](T& t) {
         t.rig->setMorphTarget(0, unevenMesh(1, 1));
         t.rig->plug("targetMorphEnabled").setBool(true);
-        t.rig->plug("targetMorphEnvelope").setDouble(-0.5e-6);
+        t.rig->plug("targetMorphEnvelope").setDouble(0.9e-6);
     };
     const Texts badPath{"error: [NEURAL WARP] Unable to access the ML model file at ROOT/missing"};
     const std::string untouched = "topology indexMap connections restFrames load metadata path";

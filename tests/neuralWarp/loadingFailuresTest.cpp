@@ -270,6 +270,22 @@ TEST_F(LoadingFailures, TheExtensionOfANameIsReplaced) {
     }
 }
 
+TEST_F(LoadingFailures, TheShapesOfTheModelBeforeAreForgotten) {
+    writeChanged([](ModelSpec& spec) { spec.shapes = {spec.bias}; });
+    makeRig();
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(rig->state(0)->principalShapeCount, 1U);
+    EXPECT_EQ(rig->state(0)->principalVertCount, 9U);
+    fs::remove(file("principal_shapes.json"));
+    fs::remove(file("model.onnx")); // not even a failed load leaves them
+    setModelName("model");
+    deform();
+    takeMessages();
+    EXPECT_EQ(rig->state(0)->principalShapeCount, 0U);
+    EXPECT_EQ(rig->state(0)->principalVertCount, 0U);
+    EXPECT_THAT(rig->state(0)->principalShapes, IsEmpty());
+}
+
 TEST_F(LoadingFailures, AModelThatIsOffIsLoadedWhenItIsSwitchedOn) {
     makeRig();
     rig->plug("models[0].modelActive").setShort(0);
