@@ -17,7 +17,7 @@ class EvaluationFailures : public FailureTest {
 public:
     void remove(const char* element) const {
         HDGModifier modifier;
-        modifier.removeMultiInstance(rig_->plug(element), true);
+        modifier.removeMultiInstance(rig->plug(element), true);
         EXPECT_EQ(modifier.doIt(), HStatus::kSuccess);
     }
 
@@ -44,17 +44,17 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
     const std::string noDeltas = "error: [NEURAL WARP] No delta computed from the ML model";
     const Texts notFinite{noDeltas, report("the model gave no values: a control value is not finite")};
     const auto fault = [](const char* operation) { return [=](T&) { Faults::fail(operation); }; };
-    const auto controls = [](std::vector<double> values) { return [=](T& t) { t.rig_->setControls(values); }; };
+    const auto controls = [](const std::vector<double>& values) { return [=](T& t) { t.rig->setControls(values); }; };
     const auto removed = [](const char* element) { return [=](T& t) { t.remove(element); }; };
-    const auto rest = [](HObject mesh) { return [=](T& t) { t.rig_->setRest(0, mesh); }; };
-    const auto morphOn = [](T& t) { t.rig_->plug("targetMorphEnabled").setBool(true); };
+    const auto rest = [](HObject mesh) { return [=](T& t) { t.rig->setRest(0, mesh); }; };
+    const auto morphOn = [](T& t) { t.rig->plug("targetMorphEnabled").setBool(true); };
     const auto smallMorph = [&](T& t) {
         morphOn(t);
-        t.rig_->setMorphTarget(0, unevenMesh(2, 1));
+        t.rig->setMorphTarget(0, unevenMesh(2, 1));
     };
     const auto noMorphMesh = [&](T& t) {
         smallMorph(t);
-        warpRig::setMesh(t.rig_->plug("targetMorphGeometry[0]").source().node(), {});
+        warpRig::setMesh(t.rig->plug("targetMorphGeometry[0]").source().node(), {});
     };
     const auto model = [](std::size_t outputs, std::size_t shapes = 0, std::size_t shapeSize = 27) {
         return [=](T& t) {
@@ -62,7 +62,7 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
                 spec.bias.resize(outputs);
                 spec.shapes.assign(shapes, std::vector<float>(shapeSize, 1.0F));
             });
-            nodeOf(*t.rig_).requestReload(0);
+            nodeOf(*t.rig).requestReload(0);
         };
     };
     const auto tooFew = [](const std::string& has) {
@@ -112,14 +112,14 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
         SCOPED_TRACE(row.name);
         writeModel(modelDirectory(), modelSpec());
         makeRig();
-        ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
+        ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
         row.spoil(*this);
-        const HPlug output = rig_->output(0);
+        const HPlug output = rig->output(0);
         OpenQuarn::makeDirty(output);
         EXPECT_NE(OpenQuarn::evaluate(output), HStatus::kSuccess);
         Faults::clear();
         EXPECT_EQ(said(), row.messages);
-        EXPECT_EQ(result(*rig_), came());
+        EXPECT_EQ(result(*rig), came());
     }
 }
 
@@ -152,24 +152,24 @@ EvaluationFailures::Coordinates morphed(EvaluationFailures::Coordinates from,
 TEST_F(EvaluationFailures, AModelThatDrivesNothingGivesWayOneEvaluationLater) {
     writeModel(modelDirectory(), modelSpec());
     makeRig();
-    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-    const Coordinates moved = result(*rig_);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    const Coordinates moved = result(*rig);
     writeChanged([](ModelSpec& spec) {
         spec.subsetState = "partial";
         spec.affectMap = {42};
     });
     makeRig();
     const auto expect = [&](const Coordinates& points, const char* flags) {
-        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
-        EXPECT_EQ(result(*rig_), points);
-        EXPECT_EQ(stateText::raised(*rig_->state(0)), flags);
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig), points);
+        EXPECT_EQ(stateText::raised(*rig->state(0)), flags);
     };
     expect(rounded(), "valid affectMap");
     EXPECT_EQ(said(), Texts{"warning: [NEURAL WARP \"warp1\", multiIndex 0] Setup for multiIndex 0 not the same as for "
                             "trained model. Using deltas on 0 of 9 affected verts. Trained model subset is \"*\""});
     expect(rounded(), "valid affectMap");
     writeModel(modelDirectory(), modelSpec());
-    nodeOf(*rig_).requestReload(0);
+    nodeOf(*rig).requestReload(0);
     expect(came(), "load valid affectMap");
     expect(moved, "applied valid");
 }
@@ -177,8 +177,8 @@ TEST_F(EvaluationFailures, AModelThatDrivesNothingGivesWayOneEvaluationLater) {
 TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
     writeModel(modelDirectory(), modelSpec());
     makeRig();
-    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-    const Coordinates moved = result(*rig_);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    const Coordinates moved = result(*rig);
     HPointArray targetPoints = warpRig::pointsOf(unevenMesh());
     for (HPoint& p : targetPoints)
         p = {p.y * 3, p.z + p.x, 0.1 - p.x};
@@ -187,12 +187,12 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
     const Coordinates origin(9);
 
     using T = EvaluationFailures;
-    const auto envelope = [](float value) { return [=](T& t) { t.rig_->plug("envelope").setFloat(value); }; };
+    const auto envelope = [](float value) { return [=](T& t) { t.rig->plug("envelope").setFloat(value); }; };
     const auto morph = [&](double value) {
         return [=](T& t) {
-            t.rig_->setMorphTarget(0, target);
-            t.rig_->plug("targetMorphEnabled").setBool(true);
-            t.rig_->plug("targetMorphEnvelope").setDouble(value);
+            t.rig->setMorphTarget(0, target);
+            t.rig->plug("targetMorphEnabled").setBool(true);
+            t.rig->plug("targetMorphEnvelope").setDouble(value);
         };
     };
     const auto both = [](auto one, auto other) {
@@ -201,13 +201,13 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
             other(t);
         };
     };
-    const auto off = [](T& t) { t.rig_->plug("models[0].modelActive").setShort(0); };
+    const auto off = [](T& t) { t.rig->plug("models[0].modelActive").setShort(0); };
     const auto otherMode = [](T& t) { t.writeChanged([](ModelSpec& spec) { spec.deltaMode = 2; }); };
-    const auto badRoot = [](T& t) { t.rig_->setModelRoot(t.folder.path() / "missing"); };
+    const auto badRoot = [](T& t) { t.rig->setModelRoot(t.folder.path() / "missing"); };
     const auto smallMorph = [](T& t) {
-        t.rig_->setMorphTarget(0, unevenMesh(1, 1));
-        t.rig_->plug("targetMorphEnabled").setBool(true);
-        t.rig_->plug("targetMorphEnvelope").setDouble(-0.5e-6);
+        t.rig->setMorphTarget(0, unevenMesh(1, 1));
+        t.rig->plug("targetMorphEnabled").setBool(true);
+        t.rig->plug("targetMorphEnvelope").setDouble(0.9e-6);
     };
     const Texts badPath{"error: [NEURAL WARP] Unable to access the ML model file at ROOT/missing"};
     const std::string untouched = "topology indexMap connections restFrames load metadata path";
@@ -245,22 +245,22 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
         writeModel(modelDirectory(), modelSpec());
         makeRig();
         row.set(*this);
-        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
-        EXPECT_EQ(result(*rig_), row.points);
-        EXPECT_EQ(stateText::raised(*rig_->state(0)), row.flags);
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig), row.points);
+        EXPECT_EQ(stateText::raised(*rig->state(0)), row.flags);
         EXPECT_EQ(said(), row.messages);
     }
     // and while training data is exported, the geometry stays as it is
     makeRig();
-    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-    rig_->plug("export[0].deltaMode").setShort(0);
-    ASSERT_EQ(nodeOf(*rig_).setExportActive(0, true), HStatus::kSuccess);
-    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-    EXPECT_EQ(result(*rig_), came());
-    EXPECT_EQ(stateText::raised(*rig_->state(0)), "topology restFrames export valid");
-    ASSERT_EQ(nodeOf(*rig_).setExportActive(0, false), HStatus::kSuccess);
-    ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-    EXPECT_EQ(result(*rig_), moved);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    rig->plug("export[0].deltaMode").setShort(0);
+    ASSERT_EQ(nodeOf(*rig).setExportActive(0, true), HStatus::kSuccess);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(result(*rig), came());
+    EXPECT_EQ(stateText::raised(*rig->state(0)), "topology restFrames export valid");
+    ASSERT_EQ(nodeOf(*rig).setExportActive(0, false), HStatus::kSuccess);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(result(*rig), moved);
 }
 
 // --- every call of the host that an evaluation makes ---
@@ -270,21 +270,21 @@ public:
     /// Everything that an evaluation can do: frames, smoothing, shapes, an affect map, weights and a morph.
     void makeFullRig(bool isMorphed, bool isOn = true) {
         session.newScene();
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = unevenMesh(),
-                              .affected = std::vector<unsigned>{7, 1, 4, 0, 3},
-                              .weights = {0.25F, 0.5F, 0.75F, 1.0F, 0.9F, 0.8F, 0.7F, 0.6F, 0.5F},
-                              .modelOn = isOn});
-        rig_->setModelRoot(folder.path());
-        rig_->setControls({0.5, -1.0, 2.0});
+        rig.emplace();
+        rig->addGeometry(0, {.mesh = unevenMesh(),
+                             .affected = std::vector<unsigned>{7, 1, 4, 0, 3},
+                             .weights = {0.25F, 0.5F, 0.75F, 1.0F, 0.9F, 0.8F, 0.7F, 0.6F, 0.5F},
+                             .modelOn = isOn});
+        rig->setModelRoot(folder.path());
+        rig->setControls({0.5, -1.0, 2.0});
         HPointArray points = warpRig::pointsOf(unevenMesh());
         for (HPoint& p : points)
             p = {p.y, p.z, p.x};
-        rig_->setMorphTarget(0, warpRig::withPoints(unevenMesh(), points));
-        rig_->plug("targetMorphEnabled").setBool(isMorphed);
-        rig_->plug("targetMorphEnvelope").setDouble(0.5);
+        rig->setMorphTarget(0, warpRig::withPoints(unevenMesh(), points));
+        rig->plug("targetMorphEnabled").setBool(isMorphed);
+        rig->plug("targetMorphEnvelope").setDouble(0.5);
         for (const char* into : {"input[0].inputGeometry", "originalGeometry[0]", "targetMorphGeometry[0]"})
-            OpenQuarn::evaluate(rig_->plug(into).source()); // calls of other nodes are not looked at
+            OpenQuarn::evaluate(rig->plug(into).source()); // calls of other nodes are not looked at
     }
     void writeFullModel() const {
         writeChanged([](ModelSpec& spec) {
@@ -299,21 +299,21 @@ public:
         });
     }
     Coordinates evaluated() {
-        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
         takeMessages();
-        return result(*rig_);
+        return result(*rig);
     }
     /// One evaluation in which one call fails. False when there is no such call.
     bool expectCall(const std::string& operation, int call, bool isFirst);
 
-    Coordinates right_, withoutModel_;
+    Coordinates right, withoutModel;
 };
 
 bool EveryHostCall::expectCall(const std::string& operation, int call, bool isFirst) {
-    const HPlug output = rig_->output(0);
+    const HPlug output = rig->output(0);
     if (!isFirst) {
-        EXPECT_EQ(evaluated(), right_);
-        nodeOf(*rig_).requestReload(0);
+        EXPECT_EQ(evaluated(), right);
+        nodeOf(*rig).requestReload(0);
     }
     OpenQuarn::makeDirty(output);
     Faults::fail(operation, call);
@@ -324,22 +324,22 @@ bool EveryHostCall::expectCall(const std::string& operation, int call, bool isFi
     if (!isReached)
         return false;
 
-    const Coordinates points = result(*rig_);
-    neuralWarp::neuralWarpData* state = rig_->state(0);
+    const Coordinates points = result(*rig);
+    neuralWarp::neuralWarpData* state = rig->state(0);
     const bool isApplied = state && state->modelApplied;
     // a polygon that the host does not give is left out
     const bool dropsPolygon = operation == "HFnMesh::getPolygonVertices" || operation == "HArray::assign";
     if (status.error() || !isApplied) {
         EXPECT_THAT(messages, testing::Not(IsEmpty()));
-        EXPECT_TRUE(points == came() || (!status.error() && points == withoutModel_));
+        EXPECT_TRUE(points == came() || (!status.error() && points == withoutModel));
     } else if (!dropsPolygon) {
-        EXPECT_EQ(points, right_);
+        EXPECT_EQ(points, right);
     }
     if (state && dropsPolygon)
         state->markAllDirty();
     else if (!status.error() && !isApplied) // it is the loader that failed, and it is not tried again
-        nodeOf(*rig_).requestReload(0);
-    EXPECT_EQ(evaluated(), right_);
+        nodeOf(*rig).requestReload(0);
+    EXPECT_EQ(evaluated(), right);
     return true;
 }
 
@@ -347,7 +347,7 @@ bool EveryHostCall::expectCall(const std::string& operation, int call, bool isFi
 TEST_F(EveryHostCall, AnAttributeThatWasNotFoundIsLookedUpAgain) {
     writeFullModel();
     makeFullRig(false);
-    const HPlug output = rig_->output(0);
+    const HPlug output = rig->output(0);
     for (int attempt = 0; attempt < 3; ++attempt) {
         OpenQuarn::makeDirty(output);
         Faults::fail("HNodeClass::attribute");
@@ -355,10 +355,10 @@ TEST_F(EveryHostCall, AnAttributeThatWasNotFoundIsLookedUpAgain) {
         EXPECT_EQ(status.error(), Faults::fired("HNodeClass::attribute"));
         Faults::clear();
         if (status.error()) {
-            EXPECT_EQ(result(*rig_), came());
+            EXPECT_EQ(result(*rig), came());
         }
         takeMessages();
-        rig_->state(0)->markAllDirty();
+        rig->state(0)->markAllDirty();
         EXPECT_NE(evaluated(), came());
     }
 }
@@ -368,11 +368,11 @@ TEST_F(EveryHostCall, MayFailWithoutHarm) {
     std::vector<std::string> reached;
     for (const bool isMorphed : {false, true}) {
         makeFullRig(isMorphed, false);
-        withoutModel_ = evaluated();
+        withoutModel = evaluated();
         makeFullRig(isMorphed);
-        right_ = evaluated();
-        ASSERT_TRUE(rig_->state(0)->modelApplied);
-        ASSERT_NE(right_, withoutModel_);
+        right = evaluated();
+        ASSERT_TRUE(rig->state(0)->modelApplied);
+        ASSERT_NE(right, withoutModel);
         for (const std::string& operation : Faults::operations())
             for (const bool isFirst : {true, false})
                 for (int call = 1; call < 500; ++call) {

@@ -13,7 +13,6 @@ namespace {
 
 namespace fs = std::filesystem;
 using stateText::never;
-using testing::ElementsAre;
 using testing::IsEmpty;
 
 const std::string unnamedFailure = "failure";
@@ -80,8 +79,8 @@ public:
 
     // --- the rig ---
 
-    void setModelName(const std::string& name) const { rig_->plug("models[0].modelName").setString(name); }
-    void setRoot(const std::string& path) const { rig_->plug("modelRoot").setString(path); }
+    void setModelName(const std::string& name) const { rig->plug("models[0].modelName").setString(name); }
+    void setRoot(const std::string& path) const { rig->plug("modelRoot").setString(path); }
     fs::path file(const std::string& name) const { return modelDirectory() / name; }
 
     // --- ways to spoil the model ---
@@ -119,7 +118,7 @@ public:
     /// What the evaluation prints.
     std::string deform() const {
         StdoutCapture out;
-        const HStatus status = rig_->deform(0);
+        const HStatus status = rig->deform(0);
         std::string printed = withoutFolder(out.take());
         EXPECT_EQ(status, HStatus::kSuccess);
         return printed;
@@ -128,11 +127,11 @@ public:
     void expectStep(const Step& step) {
         EXPECT_EQ(deform(), step.printed);
         EXPECT_EQ(shown(), step.messages);
-        EXPECT_EQ(result(*rig_), step.points == Points::moved     ? moved_
-                                 : step.points == Points::rounded ? rounded()
-                                                                  : came());
-        EXPECT_EQ(stateText::raised(*rig_->state(0)), step.flags);
-        EXPECT_EQ(rig_->state(0)->cacheVersions, step.versions);
+        EXPECT_EQ(result(*rig), step.points == Points::moved     ? moved
+                                : step.points == Points::rounded ? rounded()
+                                                                 : came());
+        EXPECT_EQ(stateText::raised(*rig->state(0)), step.flags);
+        EXPECT_EQ(rig->state(0)->cacheVersions, step.versions);
     }
 
     void expectRow(const Row& row);
@@ -147,16 +146,16 @@ public:
         return report("'ROOT/" + path + "' cannot be looked up: " + reason);
     }
 
-    Coordinates moved_;
+    Coordinates moved;
 };
 
 void LoadingFailures::expectRow(const Row& row) {
     writeModel(modelDirectory(), modelSpec());
     makeRig();
-    if (moved_.empty()) {
-        ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-        moved_ = result(*rig_);
-        ASSERT_NE(moved_, rounded());
+    if (moved.empty()) {
+        ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+        moved = result(*rig);
+        ASSERT_NE(moved, rounded());
         makeRig();
     }
     row.spoil(*this);
@@ -168,13 +167,13 @@ void LoadingFailures::expectRow(const Row& row) {
     for (const Step& step : steps)
         expectStep(step);
     const std::function<void()> triggers[] = {
-        [&] { setModelName(rig_->plug("models[0].modelName").asString().asStdString()); },
-        [&] { setRoot(rig_->plug("modelRoot").asString().asStdString()); },
+        [&] { setModelName(rig->plug("models[0].modelName").asString().asStdString()); },
+        [&] { setRoot(rig->plug("modelRoot").asString().asStdString()); },
         [&] { EXPECT_TRUE(OpenQuarn::runCommand("neuralWarp -multiIndex 0 -reloadModel warp1")); },
     };
     for (const auto& trigger : triggers) {
         trigger();
-        const std::string flags = stateText::raised(*rig_->state(0));
+        const std::string flags = stateText::raised(*rig->state(0));
         EXPECT_EQ(flags.substr(0, 18), "load metadata path");
         EXPECT_EQ(deform(), row.printed);
         EXPECT_EQ(shown(), row.steps.front().messages);
@@ -184,9 +183,9 @@ void LoadingFailures::expectRow(const Row& row) {
     writeModel(modelDirectory(), modelSpec());
     setRoot(folder.path().string());
     setModelName("model");
-    EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
-    EXPECT_EQ(stateText::raised(*rig_->state(0)), "applied valid");
-    EXPECT_EQ(result(*rig_), moved_);
+    EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(stateText::raised(*rig->state(0)), "applied valid");
+    EXPECT_EQ(result(*rig), moved);
     EXPECT_THAT(shown(), IsEmpty());
 }
 
@@ -264,18 +263,34 @@ TEST_F(LoadingFailures, TheExtensionOfANameIsReplaced) {
     makeRig();
     for (const char* name : {"model", "model.nwrp", "model.", "model.onnx"}) {
         setModelName(name);
-        ASSERT_EQ(rig_->deform(0), HStatus::kSuccess);
-        EXPECT_EQ(rig_->state(0)->modelDirectory, modelDirectory()) << name;
-        EXPECT_TRUE(rig_->state(0)->modelApplied) << name;
-        EXPECT_EQ(rig_->state(0)->principalShapeCount, 0U);
+        ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(rig->state(0)->modelDirectory, modelDirectory()) << name;
+        EXPECT_TRUE(rig->state(0)->modelApplied) << name;
+        EXPECT_EQ(rig->state(0)->principalShapeCount, 0U);
     }
+}
+
+TEST_F(LoadingFailures, TheShapesOfTheModelBeforeAreForgotten) {
+    writeChanged([](ModelSpec& spec) { spec.shapes = {spec.bias}; });
+    makeRig();
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(rig->state(0)->principalShapeCount, 1U);
+    EXPECT_EQ(rig->state(0)->principalVertCount, 9U);
+    fs::remove(file("principal_shapes.json"));
+    fs::remove(file("model.onnx")); // not even a failed load leaves them
+    setModelName("model");
+    deform();
+    takeMessages();
+    EXPECT_EQ(rig->state(0)->principalShapeCount, 0U);
+    EXPECT_EQ(rig->state(0)->principalVertCount, 0U);
+    EXPECT_THAT(rig->state(0)->principalShapes, IsEmpty());
 }
 
 TEST_F(LoadingFailures, AModelThatIsOffIsLoadedWhenItIsSwitchedOn) {
     makeRig();
-    rig_->plug("models[0].modelActive").setShort(0);
+    rig->plug("models[0].modelActive").setShort(0);
     expectStep({{}, Points::asTheyCame, "load metadata path", {0, 0, 0, never, never}});
-    rig_->plug("models[0].modelActive").setShort(1);
+    rig->plug("models[0].modelActive").setShort(1);
     expectStep(directoryFails({badPath("ROOT/model.nwrp")}).front());
 }
 
@@ -291,7 +306,7 @@ TEST_F(LoadingFailures, ErrorsAreForWhoIsLooking) {
         OpenQuarn::Animation::setPlaying(isPlaying);
         OpenQuarn::Animation::setScrubbing(isScrubbing);
         setModelName("model");
-        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
         EXPECT_EQ(shown(), messages);
     };
     expect(true, false, ungated);
@@ -299,7 +314,7 @@ TEST_F(LoadingFailures, ErrorsAreForWhoIsLooking) {
     expect(false, false, all);
     OpenQuarn::EvaluationContext context(12.0);
     HStatus status;
-    context.evaluateAt(rig_->output(0), &status);
+    context.evaluateAt(rig->output(0), &status);
     EXPECT_EQ(status, HStatus::kSuccess);
     EXPECT_EQ(shown(), ungated);
 }
@@ -329,17 +344,16 @@ TEST_F(LoadingFailures, FilesThatWereFoundAreCounted) {
 TEST_F(LoadingFailures, OfADescription) {
     writeModel(modelDirectory(), modelSpec());
     makeRig();
-    const warpRig::Rig& rig = *rig_;
-    rig_->addGeometry(1, {.mesh = unevenMesh(), .hasModelElement = false});
-    ASSERT_EQ(rig.deform(0), HStatus::kSuccess);
-    EXPECT_EQ(rig.deform(1), HStatus::kFailure);
+    rig->addGeometry(1, {.mesh = unevenMesh(), .hasModelElement = false});
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(rig->deform(1), HStatus::kFailure);
     takeMessages();
     const auto expect = [&](unsigned index, const std::string& text, const Texts& messages, const std::string& flags) {
         HString described("before");
-        EXPECT_EQ(nodeOf(rig).describeModel(index, described), text.empty() ? HStatus::kFailure : HStatus::kSuccess);
+        EXPECT_EQ(nodeOf(*rig).describeModel(index, described), text.empty() ? HStatus::kFailure : HStatus::kSuccess);
         EXPECT_EQ(withoutFolder(described.asStdString()), text);
         EXPECT_EQ(shown(), messages);
-        const neuralWarp::neuralWarpData* state = rig.state(index);
+        const neuralWarp::neuralWarpData* state = rig->state(index);
         EXPECT_EQ(state ? stateText::raised(*state) : "", flags);
     };
     const std::string found = "{'rootPath' : 'ROOT' ,'modelPath' : 'ROOT/model.nwrp'}";

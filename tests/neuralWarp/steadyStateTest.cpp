@@ -26,8 +26,8 @@ public:
         makeRig();
     }
     void expectEvaluation() {
-        EXPECT_EQ(rig_->deform(0), HStatus::kSuccess);
-        EXPECT_TRUE(rig_->state(0)->modelApplied);
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_TRUE(rig->state(0)->modelApplied);
     }
     static HObject moved(double by) {
         HPointArray points = warpRig::pointsOf(unevenMesh());
@@ -45,10 +45,10 @@ TEST_F(SteadyState, NeedsNoFileAndRebuildsNothing) {
                              (isPartial ? ", partial" : ""));
                 makeRigOf(deltaMode, smoothing, isPartial);
                 expectEvaluation();
-                const Coordinates first = result(*rig_);
+                const Coordinates first = result(*rig);
                 expectEvaluation(); // what was built on the way to the model's settings is released here
                 takeMessages();
-                const neuralWarp::neuralWarpData& state = *rig_->state(0);
+                const neuralWarp::neuralWarpData& state = *rig->state(0);
                 const std::string flags = stateText::raised(state);
                 const std::vector<std::uint32_t> versions = state.cacheVersions;
                 const float* shapes = state.principalShapes.data();
@@ -57,7 +57,7 @@ TEST_F(SteadyState, NeedsNoFileAndRebuildsNothing) {
                 std::filesystem::remove_all(modelDirectory());
                 for (int frame = 0; frame < 2; ++frame) {
                     expectEvaluation();
-                    EXPECT_EQ(result(*rig_), first);
+                    EXPECT_EQ(result(*rig), first);
                     EXPECT_EQ(stateText::raised(state), flags);
                     EXPECT_EQ(state.cacheVersions, versions);
                     EXPECT_EQ(state.principalShapes.data(), shapes);
@@ -77,43 +77,43 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
     };
     const std::vector<std::uint32_t> none(5);
     const Row rows[] = {
-        {"controls", [](T& t) { t.rig_->setControls({0.25}); }, none},
-        {"moved input", [](T& t) { t.rig_->setInput(0, moved(1.0)); }, none},
-        {"envelope", [](T& t) { t.rig_->plug("envelope").setFloat(0.5F); }, none},
-        {"a weight", [](T& t) { t.rig_->plug("weightList[0].weights[4]").setFloat(0.5F); }, none},
+        {"controls", [](T& t) { t.rig->setControls({0.25}); }, none},
+        {"moved input", [](T& t) { t.rig->setInput(0, moved(1.0)); }, none},
+        {"envelope", [](T& t) { t.rig->plug("envelope").setFloat(0.5F); }, none},
+        {"a weight", [](T& t) { t.rig->plug("weightList[0].weights[4]").setFloat(0.5F); }, none},
         {"the model off and on",
          [](T& t) {
-             t.rig_->plug("models[0].modelActive").setShort(0);
-             t.rig_->deform(0);
-             t.rig_->plug("models[0].modelActive").setShort(1);
+             t.rig->plug("models[0].modelActive").setShort(0);
+             t.rig->deform(0);
+             t.rig->plug("models[0].modelActive").setShort(1);
          },
          none},
-        {"training settings", [](T& t) { t.rig_->plug("train[0].batchSize").setInt(3); }, none},
-        {"export attributes", [](T& t) { t.rig_->plug("export[0].deltaMode").setShort(0); }, none},
-        {"the model's name", [](T& t) { t.rig_->plug("models[0].modelName").setString("model"); }, {0, 0, 0, 1, 1}},
-        {"another geometry's name", [](T& t) { t.rig_->plug("models[3].modelName").setString("x"); }, {0, 0, 0, 1, 1}},
-        {"rest points", [](T& t) { t.rig_->setRest(0, moved(2.0)); }, {1, 1, 1, 1, 1}},
+        {"training settings", [](T& t) { t.rig->plug("train[0].batchSize").setInt(3); }, none},
+        {"export attributes", [](T& t) { t.rig->plug("export[0].deltaMode").setShort(0); }, none},
+        {"the model's name", [](T& t) { t.rig->plug("models[0].modelName").setString("model"); }, {0, 0, 0, 1, 1}},
+        {"another geometry's name", [](T& t) { t.rig->plug("models[3].modelName").setString("x"); }, {0, 0, 0, 1, 1}},
+        {"rest points", [](T& t) { t.rig->setRest(0, moved(2.0)); }, {1, 1, 1, 1, 1}},
         {"export with the same settings",
          [](T& t) {
-             t.rig_->plug("export[0].deltaMode").setShort(1);
-             t.rig_->plug("export[0].smoothingIterations").setInt(3);
-             nodeOf(*t.rig_).setExportActive(0, true);
-             t.rig_->deform(0);
-             nodeOf(*t.rig_).setExportActive(0, false);
+             t.rig->plug("export[0].deltaMode").setShort(1);
+             t.rig->plug("export[0].smoothingIterations").setInt(3);
+             nodeOf(*t.rig).setExportActive(0, true);
+             t.rig->deform(0);
+             nodeOf(*t.rig).setExportActive(0, false);
          },
          none},
         {"export with other smoothing",
          [](T& t) {
-             t.rig_->plug("export[0].smoothingIterations").setInt(5);
-             nodeOf(*t.rig_).setExportActive(0, true);
-             nodeOf(*t.rig_).setExportActive(0, false);
+             t.rig->plug("export[0].smoothingIterations").setInt(5);
+             nodeOf(*t.rig).setExportActive(0, true);
+             nodeOf(*t.rig).setExportActive(0, false);
          },
          {0, 0, 1, 0, 0}},
         {"export without frames",
          [](T& t) {
-             t.rig_->plug("export[0].deltaMode").setShort(0);
-             nodeOf(*t.rig_).setExportActive(0, true);
-             nodeOf(*t.rig_).setExportActive(0, false);
+             t.rig->plug("export[0].deltaMode").setShort(0);
+             nodeOf(*t.rig).setExportActive(0, true);
+             nodeOf(*t.rig).setExportActive(0, false);
          },
          {1, 0, 1, 0, 0}},
     };
@@ -121,10 +121,10 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
     expectEvaluation();
     for (const Row& row : rows) {
         SCOPED_TRACE(row.name);
-        const std::vector<std::uint32_t> before = rig_->state(0)->cacheVersions;
+        const std::vector<std::uint32_t> before = rig->state(0)->cacheVersions;
         row.edit(*this);
         expectEvaluation();
-        std::vector<std::uint32_t> advanced = rig_->state(0)->cacheVersions;
+        std::vector<std::uint32_t> advanced = rig->state(0)->cacheVersions;
         for (std::size_t i = 0; i < advanced.size(); ++i)
             advanced[i] -= before[i];
         EXPECT_EQ(advanced, row.advanced);

@@ -22,7 +22,7 @@ public:
         writeModel(modelDirectory(), spec);
     }
     HStatus evaluate(std::size_t refused = 0) {
-        const HPlug output = rig_->output(0);
+        const HPlug output = rig->output(0);
         OpenQuarn::makeDirty(output);
         watch = {n, refused, 0, {}};
         HStatus status = OpenQuarn::evaluate(output);
@@ -38,15 +38,15 @@ TEST_F(Memory, OfASteadyEvaluationIsItsWorkingArrays) {
             for (const bool isMorphed : {false, true}) {
                 writeMyModel(deltaMode, smoothing);
                 makeRig(largeMesh());
-                rig_->setMorphTarget(0, largeMesh());
-                rig_->plug("targetMorphEnabled").setBool(isMorphed);
-                rig_->plug("targetMorphEnvelope").setDouble(0.5);
+                rig->setMorphTarget(0, largeMesh());
+                rig->plug("targetMorphEnabled").setBool(isMorphed);
+                rig->plug("targetMorphEnvelope").setDouble(0.5);
                 for (int warmUp = 0; warmUp < 3; ++warmUp)
                     ASSERT_EQ(evaluate(), HStatus::kSuccess);
-                ASSERT_TRUE(rig_->state(0)->modelApplied);
+                ASSERT_TRUE(rig->state(0)->modelApplied);
                 Sizes taken = large();
                 watch = {n, 0, 0, {}};
-                rig_->state(0)->session.run(std::vector<float>{1.0F});
+                rig->state(0)->session.run(std::vector<float>{1.0F});
                 watch.threshold = SIZE_MAX;
                 Sizes expected = large(); // the outputs, and what else the network takes
                 expected.insert(expected.end(), {32 * n, 12 * n, 12 * n, 12 * n}); // positions, points, deltas, result
@@ -65,7 +65,7 @@ TEST_F(Memory, ThatIsMissingForAnyArrayFailsTheEvaluation) {
     writeMyModel(1, 2);
     makeRig(largeMesh());
     ASSERT_EQ(evaluate(), HStatus::kSuccess);
-    const Coordinates right = result(*rig_);
+    const Coordinates right = result(*rig);
     const Coordinates input = coordinates(warpRig::pointsOf(largeMesh()));
     for (const bool isFirst : {false, true}) { // building the caches, or not
         std::size_t refused = 0;
@@ -73,8 +73,8 @@ TEST_F(Memory, ThatIsMissingForAnyArrayFailsTheEvaluation) {
             ++refused;
             SCOPED_TRACE(std::to_string(refused) + (isFirst ? " of the first evaluation" : ""));
             makeRig(largeMesh());
-            OpenQuarn::evaluate(rig_->plug("originalGeometry[0]").source());
-            OpenQuarn::evaluate(rig_->plug("input[0].inputGeometry").source());
+            OpenQuarn::evaluate(rig->plug("originalGeometry[0]").source());
+            OpenQuarn::evaluate(rig->plug("input[0].inputGeometry").source());
             if (!isFirst) {
                 ASSERT_EQ(evaluate(), HStatus::kSuccess);
             }
@@ -83,14 +83,14 @@ TEST_F(Memory, ThatIsMissingForAnyArrayFailsTheEvaluation) {
             out.take();
             if (watch.count < refused)
                 break;
-            const bool isApplied = !status.error() && rig_->state(0)->modelApplied;
-            EXPECT_EQ(result(*rig_) == right, isApplied);
+            const bool isApplied = !status.error() && rig->state(0)->modelApplied;
+            EXPECT_EQ(result(*rig) == right, isApplied);
             // without its model, an evaluation may go on
-            EXPECT_TRUE(isApplied || result(*rig_) == input || (!status.error() && result(*rig_) == rounded(input)));
+            EXPECT_TRUE(isApplied || result(*rig) == input || (!status.error() && result(*rig) == rounded(input)));
             EXPECT_TRUE(isApplied || !takeMessages().empty());
-            nodeOf(*rig_).requestReload(0);
+            nodeOf(*rig).requestReload(0);
             EXPECT_EQ(evaluate(), HStatus::kSuccess);
-            EXPECT_EQ(result(*rig_), right);
+            EXPECT_EQ(result(*rig), right);
         } while (refused < 1000);
         EXPECT_GT(refused, isFirst ? 12U : 6U);
     }

@@ -31,6 +31,9 @@ void* operator new[](std::size_t size) {
 void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
     return watchedAllocation(size);
 }
+void* operator new[](std::size_t size, const std::nothrow_t&) noexcept {
+    return watchedAllocation(size);
+}
 void operator delete(void* memory) noexcept {
     std::free(memory);
 }
@@ -44,5 +47,8 @@ void operator delete[](void* memory, std::size_t) noexcept {
     std::free(memory);
 }
 void operator delete(void* memory, const std::nothrow_t&) noexcept {
+    std::free(memory);
+}
+void operator delete[](void* memory, const std::nothrow_t&) noexcept {
     std::free(memory);
 }

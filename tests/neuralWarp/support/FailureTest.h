@@ -59,15 +59,15 @@ public: // tables of what to spoil are lambdas, which get the test
             }
         return points;
     }
-    static Coordinates result(const warpRig::Rig& rig) { return coordinates(rig.result(0)); }
+    static Coordinates result(const warpRig::Rig& of) { return coordinates(of.result(0)); }
 
     /// A new scene with one geometry, whose model is switched on.
     void makeRig(const HObject& mesh = unevenMesh()) {
         session.newScene();
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = mesh});
-        rig_->setModelRoot(folder.path());
-        rig_->setControls({1.0});
+        rig.emplace();
+        rig->addGeometry(0, {.mesh = mesh});
+        rig->setModelRoot(folder.path());
+        rig->setControls({1.0});
     }
     /// Writes the model of modelSpec(), changed.
     template <class Change>
@@ -77,8 +77,8 @@ public: // tables of what to spoil are lambdas, which get the test
         writeModel(modelDirectory(), spec);
     }
 
-    static neuralWarp::neuralWarpNode& nodeOf(const warpRig::Rig& rig) {
-        return dynamic_cast<neuralWarp::neuralWarpNode&>(*HFnDependencyNode(rig.node).userNode());
+    static neuralWarp::neuralWarpNode& nodeOf(const warpRig::Rig& of) {
+        return dynamic_cast<neuralWarp::neuralWarpNode&>(*HFnDependencyNode(of.node).userNode());
     }
 
     /// What was shown, with ROOT for the test's folder and N for numbers of source lines.
@@ -95,5 +95,5 @@ public: // tables of what to spoil are lambdas, which get the test
         return "report: API error in " + std::string(unit) + ", line N: " + reason;
     }
 
-    std::optional<warpRig::Rig> rig_;
+    std::optional<warpRig::Rig> rig;
 };
