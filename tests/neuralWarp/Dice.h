@@ -34,7 +34,7 @@ public:
     HPointArray moved(const HPointArray& points, double by) {
         HPointArray result = points;
         for (HPoint& p : result)
-            p += HVector(real(by), real(by), real(by));
+            p += HVector{real(by), real(by), real(by)}; // braces: in this order
         return result;
     }
     /// `count` of the numbers below `limit`, in no order.

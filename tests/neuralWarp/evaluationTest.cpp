@@ -68,7 +68,8 @@ Walk::Walk(const std::filesystem::path& folder, const ZooMesh& mesh, const ZooMe
     const std::size_t count = mesh.vertexCount();
     all_.reserve(3);
     add(0, mesh, {}, false);
-    add(1, mesh, dice_.chosen(std::max<std::size_t>(1, count * 2 / 3), count), dice_.oneIn(2));
+    const std::vector<unsigned> part = dice_.chosen(std::max<std::size_t>(1, count * 2 / 3), count);
+    add(1, mesh, part, dice_.oneIn(2));
     add(4, other, {}, true);
     rig_.setModelRoot(folder);
     changeControls();
@@ -82,9 +83,10 @@ void Walk::add(unsigned index, const ZooMesh& mesh, const expected::Vertices& af
     const HObject held = warpRig::mesh(mesh);
     const HPointArray base = warpRig::pointsOf(held);
     const HPointArray rest = dice_.moved(base, 0.05);
-    all_.push_back({index, held, base, affected, expected::Geometry(mesh, rest, affected)});
+    all_.push_back({index, held, base, affected, expected::Geometry(mesh, affected)});
     Driven& driven = all_.back();
     driven.request.input = base;
+    driven.request.rest = rest;
     driven.request.morphTarget = dice_.moved(base, 0.2);
     if (isWeighted)
         driven.request.weights = dice_.floats(mesh.vertexCount(), 1.7);
@@ -148,7 +150,7 @@ void Walk::changePoints(Driven& driven) {
     switch (dice_.below(4)) {
     case 0:
         rig_.setRest(driven.index, mesh);
-        driven.reference.setRest(points);
+        driven.request.rest = points;
         break;
     case 1:
         rig_.setMorphTarget(driven.index, mesh);
