@@ -1,9 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // Whole evaluations, from a model directory to moved points, against the formulas.
-#include "neuralWarp/Dice.h"
 #include "neuralWarp/reference.h"
 #include "neuralWarp/support/WarpTest.h"
-#include "openquarn_app/Commands.h"
+#include "neuralWarp/sweep.h"
 
 #include <tbb/task_arena.h>
 
@@ -43,13 +42,13 @@ private:
     void change();
     void changePoints(Driven& driven);
     void changeControls();
+    void changeEnvelope();
     void changeMorph();
     void changeExport(Driven& driven);
     void reload(Driven& driven);
     void writeModelOf(Driven& driven);
     void chooseSubset(Driven& driven);
     void compare(Driven& driven);
-    void run(const std::string& command);
     std::string at(const char* attribute, const Driven& driven) const {
         return attribute + ("[" + std::to_string(driven.index) + "]");
     }
@@ -68,7 +67,8 @@ Walk::Walk(const std::filesystem::path& folder, const ZooMesh& mesh, const ZooMe
     const std::size_t count = mesh.vertexCount();
     all_.reserve(3);
     add(0, mesh, {}, false);
-    add(1, mesh, dice_.chosen(std::max<std::size_t>(1, count * 2 / 3), count), dice_.oneIn(2));
+    const std::vector<unsigned> part = dice_.chosen(std::max<std::size_t>(1, count * 2 / 3), count);
+    add(1, mesh, part, dice_.oneIn(2));
     add(4, other, {}, true);
     rig_.setModelRoot(folder);
     changeControls();
@@ -82,9 +82,10 @@ void Walk::add(unsigned index, const ZooMesh& mesh, const expected::Vertices& af
     const HObject held = warpRig::mesh(mesh);
     const HPointArray base = warpRig::pointsOf(held);
     const HPointArray rest = dice_.moved(base, 0.05);
-    all_.push_back({index, held, base, affected, expected::Geometry(mesh, rest, affected)});
+    all_.push_back({index, held, base, affected, expected::Geometry(mesh, affected)});
     Driven& driven = all_.back();
     driven.request.input = base;
+    driven.request.rest = rest;
     driven.request.morphTarget = dice_.moved(base, 0.2);
     if (isWeighted)
         driven.request.weights = dice_.floats(mesh.vertexCount(), 1.7);
@@ -137,18 +138,13 @@ void Walk::writeModelOf(Driven& driven) {
     writeModel(folder_ / (modelName(driven) + ".nwrp"), model);
 }
 
-void Walk::run(const std::string& command) {
-    const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand(command);
-    EXPECT_TRUE(outcome) << outcome.error;
-}
-
 void Walk::changePoints(Driven& driven) {
     const HPointArray points = dice_.moved(driven.base, dice_.pick({0.0, 0.04, 0.3}));
     const HObject mesh = warpRig::withPoints(driven.mesh, points);
     switch (dice_.below(4)) {
     case 0:
         rig_.setRest(driven.index, mesh);
-        driven.reference.setRest(points);
+        driven.request.rest = points;
         break;
     case 1:
         rig_.setMorphTarget(driven.index, mesh);
@@ -171,65 +167,64 @@ void Walk::changeControls() {
 
 void Walk::changeMorph() {
     const bool isOn = !dice_.oneIn(3);
-    const auto envelope = dice_.pick({0.0, 0.5e-6, 0.25, 0.25, 1.0});
-    EXPECT_FALSE(rig_.plug("targetMorphEnabled").setBool(isOn).error());
-    EXPECT_FALSE(rig_.plug("targetMorphEnvelope").setDouble(envelope).error());
+    const std::string envelope = dice_.pick({"0", "0.5e-6", "0.25", "0.25", "1"});
+    script("setAttr warp1.targetMorphEnabled " + std::to_string(isOn) + "; setAttr warp1.targetMorphEnvelope " +
+           envelope);
     for (Driven& driven : all_) {
         driven.request.morphOn = isOn;
-        driven.request.morphEnvelope = envelope;
+        driven.request.morphEnvelope = std::stod(envelope);
     }
 }
 
 void Walk::changeExport(Driven& driven) {
     driven.request.exportMode = dice_.oneIn(3);
-    EXPECT_FALSE(rig_.plug(at("export", driven) + ".deltaMode").setShort(dice_.pick<short>({0, 1})).error());
-    EXPECT_FALSE(rig_.plug(at("export", driven) + ".smoothingIterations").setInt(dice_.pick({0, 2})).error());
-    run("neuralWarp -multiIndex " + std::to_string(driven.index) + " -exportActive " +
-        (driven.request.exportMode ? "on" : "off") + " warp1");
+    const std::string settings = "setAttr warp1." + at("export", driven);
+    script(settings + ".deltaMode " + dice_.pick({"0", "1"}) + ";" + settings + ".smoothingIterations 2");
+    script("neuralWarp warp1 -multiIndex " + std::to_string(driven.index) + " -exportActive " +
+           std::to_string(driven.request.exportMode));
+}
+
+void Walk::changeEnvelope() {
+    const std::string envelope = dice_.pick({"1", "1", "0.5", "-0.4", "1.75", "0"});
+    script("setAttr warp1.envelope " + envelope);
+    for (Driven& driven : all_)
+        driven.request.envelope = std::stof(envelope);
 }
 
 void Walk::reload(Driven& driven) {
     writeModelOf(driven);
     if (driven.index != 4 && dice_.oneIn(2)) {
-        EXPECT_FALSE(rig_.plug(at("models", driven) + ".modelName").setString(modelName(driven)).error());
+        script("setAttr warp1." + at("models", driven) + ".modelName " + modelName(driven));
         for (Driven& each : all_)
             if (each.index < all_.size()) // the reach of an attribute
                 each.reference.requestReload();
     } else {
-        run("neuralWarp -reloadModel -multiIndex " + std::to_string(driven.index) + " warp1");
+        script("neuralWarp warp1 -reloadModel -multiIndex " + std::to_string(driven.index));
         driven.reference.requestReload();
     }
 }
 
 void Walk::change() {
     Driven& driven = all_[dice_.below(all_.size())];
-    const auto envelope = dice_.pick({1.0F, 1.0F, 0.5F, -0.4F, 1.75F, 0.0F});
     switch (dice_.below(12)) {
     case 0:
-        EXPECT_FALSE(rig_.plug("envelope").setFloat(envelope).error());
-        for (Driven& each : all_)
-            each.request.envelope = envelope;
-        break;
+        return changeEnvelope();
     case 1:
         driven.request.modelOn = !dice_.oneIn(3);
-        EXPECT_FALSE(rig_.plug(at("models", driven) + ".modelActive").setShort(driven.request.modelOn ? 1 : 0).error());
-        break;
+        script("setAttr warp1." + at("models", driven) + ".modelActive " + std::to_string(driven.request.modelOn));
+        return;
     case 2:
-        changeControls();
-        break;
+        return changeControls();
     case 3:
-        changeMorph();
-        break;
+        return changeMorph();
     case 4:
-        changeExport(driven);
-        break;
+        return changeExport(driven);
     case 5:
     case 6:
     case 7:
-        changePoints(driven);
-        break;
+        return changePoints(driven);
     default:
-        reload(driven);
+        return reload(driven);
     }
 }
 

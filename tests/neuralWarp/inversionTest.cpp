@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // Training deltas, as the command gives them: what they are, and that the deformer undoes them.
-#include "neuralWarp/Dice.h"
 #include "neuralWarp/TargetDeltaType.h"
 #include "neuralWarp/reference.h"
 #include "neuralWarp/support/WarpTest.h"
-#include "openquarn_app/Commands.h"
+#include "neuralWarp/sweep.h"
 
 #include <cmath>
 #include <limits>
@@ -35,20 +34,14 @@ protected:
         ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
     }
 
-    OpenQuarn::CommandValue run(const std::string& flags) {
-        const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand("neuralWarp " + flags + " warp1");
-        EXPECT_TRUE(outcome) << outcome.error;
-        return outcome.result;
-    }
-
-    void startExport(short deltaMode, int smoothing) {
-        ASSERT_FALSE(rig->plug("export[0].deltaMode").setShort(deltaMode).error());
-        ASSERT_FALSE(rig->plug("export[0].smoothingIterations").setInt(smoothing).error());
-        run("-exportActive on");
+    void startExport(unsigned deltaMode, std::size_t smoothing) {
+        script("setAttr warp1.export[0].deltaMode " + std::to_string(deltaMode) +
+               "; setAttr warp1.export[0].smoothingIterations " + std::to_string(smoothing) +
+               "; neuralWarp warp1 -exportActive on");
     }
 
     std::vector<float> deltas(const std::string& code) {
-        const auto values = std::get<std::vector<double>>(run("-vertexDeltas " + code));
+        const auto values = std::get<std::vector<double>>(script("neuralWarp warp1 -vertexDeltas " + code));
         return {values.begin(), values.end()};
     }
 
@@ -65,8 +58,7 @@ protected:
             spec.affectMap.assign(affected->begin(), affected->end());
         }
         writeModel(modelDirectory(), spec);
-        run("-exportActive off -reloadModel");
-        EXPECT_FALSE(rig->plug("models[0].modelActive").setShort(1).error());
+        script("neuralWarp warp1 -exportActive off -reloadModel; setAttr warp1.models[0].modelActive On");
         EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
         EXPECT_TRUE(rig->state(0)->modelApplied);
         return rig->result(0);
@@ -132,9 +124,9 @@ TEST_F(Inversion, TheDeformerReturnsTheTargetFromWhatTheCommandExtracts) {
     const auto check = [&](const ZooMesh& zooMesh, std::size_t smoothing) {
         const expected::Surface surface(zooMesh, pose.rest, affected);
         const std::vector<bool> regular = regularVertices(surface, pose, smoothing);
-        for (const short mode : std::initializer_list<short>{1, 0}) {
-            ASSERT_FALSE(rig->plug("models[0].modelActive").setShort(0).error());
-            startExport(mode, static_cast<int>(smoothing));
+        for (const unsigned mode : {1U, 0U}) {
+            script("setAttr warp1.models[0].modelActive Off");
+            startExport(mode, smoothing);
             expectSame(deltas("dbp"), trainingDeltas("dbp", surface, pose.input, pose.target, smoothing), "dbp");
             const auto before = snapshot(); // the caches that the settings ask for are there now
             for (const std::string code : {"dop", "dbs", "pos", "dos"}) {
@@ -142,7 +134,7 @@ TEST_F(Inversion, TheDeformerReturnsTheTargetFromWhatTheCommandExtracts) {
                 EXPECT_EQ(snapshot(), before) << code;
             }
             const std::vector<float> shape = deltas(mode == 1 ? "dos" : "dbp");
-            const HPointArray result = applied(shape, static_cast<unsigned>(mode), static_cast<unsigned>(smoothing));
+            const HPointArray result = applied(shape, mode, static_cast<unsigned>(smoothing));
             HPointArray wanted = pose.input;
             const double size = std::max({largest(pose.rest), largest(pose.input), largest(pose.target)});
             const double rounding = 16 * std::numeric_limits<float>::epsilon() * size;
@@ -157,8 +149,8 @@ TEST_F(Inversion, TheDeformerReturnsTheTargetFromWhatTheCommandExtracts) {
             }
             EXPECT_EQ(firstDifference(result, wanted), wanted.length()) << "a vertex that is not affected moved";
             // outside of an export, the settings are the model's
-            startExport(static_cast<short>(1 - mode), static_cast<int>(smoothing) + 1);
-            run("-exportActive off");
+            startExport(1 - mode, smoothing + 1);
+            script("neuralWarp warp1 -exportActive off");
             expectSame(deltas("dbp"), trainingDeltas("dbp", surface, pose.input, pose.target, smoothing), "dbp after");
         }
         if (!zooMesh.degenerate && smoothing == 0) {

@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // Many geometries and nodes at a time: the same bits as one after the other, from any number of threads.
 #include "host/support/recordScene.h"
-#include "neuralWarp/Dice.h"
 #include "neuralWarp/support/WarpTest.h"
-#include "openquarn/HSelectionList.h"
-#include "openquarn_app/Commands.h"
+#include "neuralWarp/sweep.h"
+#include "openquarn/HFnDependencyNode.h"
 #include "openquarn_app/Evaluation.h"
 
 #include <tbb/global_control.h>
@@ -84,11 +83,10 @@ protected:
         writeModel(modelDirectory(name), spec);
     }
 
-    void animate(const HObject& node, int frame) const {
-        for (unsigned control = 0; control < 3; ++control)
-            EXPECT_FALSE(warpRig::plug(node, "controlValues[" + std::to_string(control) + "]")
-                             .setDouble(0.03 * (frame + 1) * (control + 1))
-                             .error());
+    static void animate(const std::string& node, int frame) {
+        const double t = 0.03 * (frame + 1);
+        script("setAttr " + node + ".controlValues " + std::to_string(t) + " " + std::to_string(2 * t) + " " +
+               std::to_string(3 * t));
     }
 };
 
@@ -99,19 +97,17 @@ TEST_F(Parallel, ThreeGeometriesThroughTwoDeformers) {
     expectSameFromAllThreads(3, [&](const Evaluator& evaluate) {
         session.newScene();
         const recordScene::Scene scene = recordScene::build("neuralWarp", "neuralWarp");
-        for (const HObject& node : {scene.first, scene.second}) {
-            EXPECT_FALSE(warpRig::plug(node, "modelRoot").setString(folder.path().string()).error());
+        for (const std::string node : {"firstDeformer", "secondDeformer"}) {
+            script("setAttr " + node + ".modelRoot " + OpenQuarn::quotedWord(folder.path().string()));
             for (const unsigned index : scene.geometries) {
-                const std::string model = "models[" + std::to_string(index) + "]";
-                EXPECT_FALSE(
-                    warpRig::plug(node, model + ".modelName").setString("model" + std::to_string(index)).error());
-                EXPECT_FALSE(warpRig::plug(node, model + ".modelActive").setShort(1).error());
+                const std::string model = "setAttr " + node + ".models[" + std::to_string(index) + "]";
+                script(model + ".modelName model" + std::to_string(index) + ";" + model + ".modelActive On");
             }
         }
         Results results;
         for (int frame = 0; frame < 3; ++frame) {
-            animate(scene.first, frame);
-            animate(scene.second, 3 - frame);
+            animate("firstDeformer", frame);
+            animate("secondDeformer", 3 - frame);
             EXPECT_EQ(evaluate(scene.outputs), HStatus::kSuccess);
             append(results, scene.outputs);
         }
@@ -151,15 +147,15 @@ TEST_F(Parallel, ManyDeformersAndFramesOfChanges) {
         Results results;
         for (int frame = 0; frame < 6; ++frame) {
             for (const warpRig::Rig& rig : rigs) {
-                animate(rig.node, frame);
+                const std::string node = HFnDependencyNode(rig.node).name().asStdString();
+                animate(node, frame);
                 const unsigned index = dice.pick({0U, 1U, 4U});
                 const HObject now = rig.plug("input[" + std::to_string(index) + "].inputGeometry").asHObject();
                 rig.setInput(index, warpRig::withPoints(now, dice.moved(base, 0.02)));
-                EXPECT_FALSE(rig.plug("targetMorphEnabled").setBool(frame % 2 == 1).error());
-                EXPECT_FALSE(rig.plug("targetMorphEnvelope").setDouble(dice.pick({0.3, 1.0})).error());
-                if (dice.oneIn(2)) {
-                    EXPECT_FALSE(rig.plug("modelRoot").setString(folder.path().string()).error()); // loads again
-                }
+                script("setAttr " + node + ".targetMorphEnabled " + std::to_string(frame % 2) + "; setAttr " + node +
+                       ".targetMorphEnvelope " + dice.pick({"0.3", "1"}));
+                if (frame > 0 && dice.oneIn(2))
+                    script("neuralWarp -reloadModel " + node);
             }
             EXPECT_EQ(evaluate(outputs), HStatus::kSuccess);
             append(results, outputs);
@@ -173,17 +169,15 @@ TEST_F(Parallel, ADuplicateDeformsAsItsOriginalAndOnItsOwn) {
     writeModelFor("model0", 21 * 21, 1, 3, 5, 8);
     writeModelFor("model1", 21 * 21, 0, 2, 0, 9);
     const HObject mesh = warpRig::mesh(makeGrid(20, 20));
-    std::optional<warpRig::Rig> rig(std::in_place);
-    rig->addGeometry(0, {.mesh = mesh, .modelName = "model0"});
-    rig->addGeometry(1, {.mesh = mesh, .affected = Dice(1).chosen(100, 441), .modelName = "model1"});
-    rig->setModelRoot(folder.path());
-    animate(rig->node, 0);
-    HPlugArray outputs = {rig->output(0), rig->output(1)};
+    warpRig::Rig rig;
+    rig.addGeometry(0, {.mesh = mesh, .modelName = "model0"});
+    rig.addGeometry(1, {.mesh = mesh, .affected = Dice(1).chosen(100, 441), .modelName = "model1"});
+    rig.setModelRoot(folder.path());
+    animate("warp1", 0);
+    HPlugArray outputs = {rig.output(0), rig.output(1)};
     ASSERT_EQ(serial(outputs), HStatus::kSuccess);
-    ASSERT_TRUE(OpenQuarn::runCommand("duplicate warp1 -name copy1"));
-    HSelectionList list;
-    HObject copy;
-    ASSERT_FALSE(list.add("copy1").error() || list.getDependNode(0, copy).error());
+    script("duplicate warp1 -name copy1");
+    const auto copy = session.nodes().back();
     outputs.push_back(warpRig::plug(copy, "outputGeom[0]"));
     outputs.push_back(warpRig::plug(copy, "outputGeom[1]"));
     const auto evaluateAll = [&] {
@@ -200,18 +194,17 @@ TEST_F(Parallel, ADuplicateDeformsAsItsOriginalAndOnItsOwn) {
         EXPECT_EQ(firstDifference(same[geometry + 2], same[geometry]), 441U);
         EXPECT_LT(firstDifference(same[geometry], warpRig::pointsOf(mesh)), 441U) << "nothing was deformed";
     }
-    animate(copy, 1);
+    animate("copy1", 1);
     const Results apart = evaluateAll();
-    animate(rig->node, 1);
+    animate("warp1", 1);
     const Results again = evaluateAll();
     for (const std::size_t geometry : {0U, 1U}) {
         EXPECT_EQ(firstDifference(apart[geometry], same[geometry]), 441U);
         EXPECT_LT(firstDifference(apart[geometry + 2], same[geometry]), 441U);
         EXPECT_EQ(firstDifference(again[geometry], apart[geometry + 2]), 441U);
     }
-    rig.reset();
     outputs = {outputs[2], outputs[3]};
-    ASSERT_TRUE(OpenQuarn::runCommand("deleteNode warp1"));
+    script("deleteNode warp1");
     const Results alone = evaluateAll();
     EXPECT_EQ(firstDifference(alone[0], apart[2]), 441U);
     EXPECT_EQ(firstDifference(alone[1], apart[3]), 441U);

@@ -114,15 +114,9 @@ std::vector<float> outputsOf(const ModelSpec& model, const std::vector<double>& 
     return outputs;
 }
 
-Geometry::Geometry(ZooMesh mesh, const HPointArray& rest, Vertices affected)
+Geometry::Geometry(ZooMesh mesh, Vertices affected)
     : mesh_(std::move(mesh))
-    , affected_(std::move(affected))
-    , surface_(mesh_, rest, affected_) {}
-
-void Geometry::setRest(const HPointArray& rest) {
-    surface_ = Surface(mesh_, rest, affected_);
-    requestReload(); // with another rest pose everything is made anew
-}
+    , affected_(std::move(affected)) {}
 
 bool Geometry::drivesNothing() const {
     return slots_ && std::all_of(slots_->begin(), slots_->end(), [](auto slot) { return slot == quill::missingIndex; });
@@ -130,7 +124,7 @@ bool Geometry::drivesNothing() const {
 
 void Geometry::load(const ModelSpec& folder) {
     model_ = folder;
-    const quill::IndexMapper& map = surface_.map();
+    const quill::IndexMapper& map = surface_->map();
     std::vector<std::uint32_t> covered; // full indices by slot
     if (folder.subsetState == "complete")
         for (std::uint32_t v = 0; v < folder.fullCount; ++v)
@@ -152,9 +146,9 @@ void Geometry::load(const ModelSpec& folder) {
 Points Geometry::predicted(const Request& request) const {
     const std::vector<float> outputs = outputsOf(model_, request.controls);
     const bool isSurface = model_.deltaMode == 1;
-    Points points = surface_.smoothed(surface_.read(request.input), model_.smoothingIterations);
-    const Frames current = surface_.frames(points, false);
-    const Frames rest = surface_.frames(surface_.smoothed(surface_.rest(), model_.smoothingIterations), true);
+    Points points = surface_->smoothed(surface_->read(request.input), model_.smoothingIterations);
+    const Frames current = surface_->frames(points, false);
+    const Frames rest = surface_->frames(surface_->smoothed(surface_->rest(), model_.smoothingIterations), true);
     for (std::size_t v = 0; v < points.size(); ++v) {
         const std::size_t m = slots_ ? (*slots_)[v] : v;
         if (m == quill::missingIndex)
@@ -165,7 +159,7 @@ Points Geometry::predicted(const Request& request) const {
         for (std::size_t j = 0; j < model_.shapes.size(); ++j)
             for (std::size_t axis = 0; axis < 3; ++axis)
                 delta[axis] += outputs[j] * model_.shapes[j][3 * m + axis];
-        points[v] = isSurface ? quill::transformAsPoint(quill::transformAsPoint(surface_.rest()[v] + delta, rest[v]),
+        points[v] = isSurface ? quill::transformAsPoint(quill::transformAsPoint(surface_->rest()[v] + delta, rest[v]),
                                                         current[v])
                               : points[v] + delta;
     }
@@ -173,6 +167,11 @@ Points Geometry::predicted(const Request& request) const {
 }
 
 HPointArray Geometry::evaluate(const Request& request, const ModelSpec& folder) {
+    if (!surface_ || !std::equal(rest_.begin(), rest_.end(), request.rest.begin())) {
+        rest_ = request.rest;
+        surface_.emplace(mesh_, rest_, affected_);
+        requestReload();
+    }
     if (request.envelope == 0.0F)
         return request.input;
     bool isActive = request.modelOn && !request.exportMode;
@@ -192,12 +191,12 @@ HPointArray Geometry::evaluate(const Request& request, const ModelSpec& folder) 
 }
 
 void Geometry::blend(HPointArray& points, const Request& request, bool isMorphed) const {
-    const Points own = surface_.read(request.input);
+    const Points own = surface_->read(request.input);
     const Points model = modelApplied_ ? predicted(request) : own;
-    const Points target = isMorphed ? surface_.read(request.morphTarget) : own;
+    const Points target = isMorphed ? surface_->read(request.morphTarget) : own;
     const auto morph = static_cast<float>(request.morphEnvelope);
     for (std::size_t v = 0; v < own.size(); ++v) {
-        const unsigned full = surface_.map().toFull(v);
+        const unsigned full = surface_->map().toFull(v);
         const bool isDriven = modelApplied_ && (!slots_ || (*slots_)[v] != quill::missingIndex);
         Vec current = isDriven ? model[v] : own[v];
         if (isMorphed)

@@ -46,7 +46,7 @@ Points trainingDeltas(const std::string& code, const Surface& surface, const HPo
 
 /// What one evaluation is asked for.
 struct Request {
-    HPointArray input;
+    HPointArray input, rest;
     std::vector<float> weights = {}; ///< by vertex of the whole geometry; empty: none
     float envelope = 1.0F;
     bool modelOn = true;
@@ -60,16 +60,14 @@ struct Request {
 /// One geometry, and what it keeps of its model from one evaluation to the next.
 class Geometry {
 public:
-    Geometry(ZooMesh mesh, const HPointArray& rest, Vertices affected);
+    Geometry(ZooMesh mesh, Vertices affected);
 
-    void setRest(const HPointArray& rest);
     void requestReload() { metadataIsDue_ = loadIsDue_ = true; }
-    /// `folder` what the model directory holds.
+    /// `folder` what the model directory holds. Another rest pose than that of before has everything made anew.
     HPointArray evaluate(const Request& request, const ModelSpec& folder);
 
     bool modelApplied() const { return modelApplied_; }
     bool usesAffectMap() const { return slots_.has_value(); }
-    const Surface& surface() const { return surface_; }
 
 private:
     void load(const ModelSpec& folder);
@@ -79,7 +77,8 @@ private:
 
     ZooMesh mesh_;
     Vertices affected_;
-    Surface surface_;
+    HPointArray rest_;
+    std::optional<Surface> surface_;
     bool metadataIsDue_ = true, loadIsDue_ = true, modelApplied_ = false;
     ModelSpec model_;                                 // as loaded
     std::optional<std::vector<std::uint32_t>> slots_; // by deformed vertex, while the vertices are not the model's

@@ -189,7 +189,11 @@ HPointArray Rig::result(unsigned index) const {
     return pointsOf(output(index).asHObject());
 }
 
-neuralWarp::neuralWarpData* Rig::state(unsigned index) const {
+#ifdef __clang__
+__attribute__((no_sanitize("vptr"))) // checking the cast needs the class's type, which a loaded library keeps to itself
+#endif
+neuralWarp::neuralWarpData*
+Rig::state(unsigned index) const {
     const HFnPluginData data(plug("deformerData[" + std::to_string(index) + "]").asHObject());
     return static_cast<neuralWarp::neuralWarpData*>(data.data()); // the attribute holds data of this one type
 }

@@ -1,9 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-// Chance for sweeps, the same on every machine and in every run.
+// What sweeps share: chance, the same on every machine and in every run, scripts, and a comparison of bits.
 #pragma once
 
 #include "neuralWarp/support/modelFolder.h"
 #include "openquarn/HPointArray.h"
+#include "openquarn_app/Commands.h"
+
+#include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstdint>
@@ -11,6 +14,7 @@
 #include <initializer_list>
 #include <iterator>
 #include <random>
+#include <string>
 #include <vector>
 
 class Dice {
@@ -34,7 +38,7 @@ public:
     HPointArray moved(const HPointArray& points, double by) {
         HPointArray result = points;
         for (HPoint& p : result)
-            p += HVector(real(by), real(by), real(by));
+            p += HVector{real(by), real(by), real(by)}; // braces: in this order
         return result;
     }
     /// `count` of the numbers below `limit`, in no order.
@@ -73,4 +77,11 @@ inline unsigned firstDifference(const HPointArray& a, const HPointArray& b) {
            same(a[i].w, b[i].w))
         ++i;
     return i;
+}
+
+/// Runs commands, none of which may fail, and gives the result of the last.
+inline OpenQuarn::CommandValue script(const std::string& text) {
+    const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand(text);
+    EXPECT_TRUE(outcome) << outcome.error;
+    return outcome.result;
 }
