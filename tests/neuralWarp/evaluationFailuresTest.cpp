@@ -131,7 +131,7 @@ EvaluationFailures::Coordinates blended(const EvaluationFailures::Coordinates& f
     EvaluationFailures::Coordinates points = from;
     for (std::size_t i = 0; i < points.size(); ++i)
         for (std::size_t axis = 0; axis < 3; ++axis) {
-            const volatile auto c = static_cast<float>(to[i][axis]); // as in rounded()
+            const auto c = static_cast<float>(to[i][axis]);
             points[i][axis] += (static_cast<double>(c) - points[i][axis]) * static_cast<double>(f);
         }
     return points;
@@ -142,8 +142,8 @@ EvaluationFailures::Coordinates morphed(EvaluationFailures::Coordinates from,
                                         const EvaluationFailures::Coordinates& target, float w) {
     for (std::size_t i = 0; i < from.size(); ++i)
         for (std::size_t axis = 0; axis < 3; ++axis) {
-            const volatile auto c = static_cast<float>(from[i][axis]);
-            const volatile auto t = static_cast<float>(target[i][axis]);
+            const auto c = static_cast<float>(from[i][axis]);
+            const auto t = static_cast<float>(target[i][axis]);
             from[i][axis] = static_cast<double>(c + (t - c) * w);
         }
     return from;

@@ -54,7 +54,7 @@ public: // tables of what to spoil are lambdas, which get the test
     static Coordinates rounded(Coordinates points) {
         for (std::array<double, 3>& point : points)
             for (double& x : point) {
-                const volatile auto single = static_cast<float>(x); // gcc 12 -O3 leaves the rounding of pairs out
+                const auto single = static_cast<float>(x);
                 x += static_cast<double>(single) - x;
             }
         return points;
