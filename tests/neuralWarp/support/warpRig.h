@@ -33,7 +33,7 @@ HPlug plug(const HObject& node, std::string_view name);
 
 /// One deformed geometry, as it is asked for.
 struct GeometrySpec {
-    HObject mesh; ///< comes in
+    HObject mesh;      ///< comes in
     HObject rest = {}; ///< null: the same
     /// Affected vertices in their order; none: all. They become the component tag "part" of both meshes.
     std::optional<std::vector<unsigned>> affected = {};
