@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "geometry/GeometryPoints.h"
 
+#include "geometry/forRanges.h"
+
 #include <algorithm>
 
 namespace OpenQuarn {
@@ -40,22 +42,26 @@ HStatus GeometryPoints::copyTo(HPointArray& points) const {
     if (HStatus status = points.setLength(count()); status.error())
         return status;
     const double* all = current().xyz();
-    for (unsigned i = 0; i < points.length(); ++i) {
-        const double* xyz = all + std::size_t{3} * (*map_->affected)[i];
-        points[i] = HPoint(xyz[0], xyz[1], xyz[2]);
-    }
+    forRanges(points.length(), [&](std::size_t begin, std::size_t end) {
+        for (std::size_t i = begin; i < end; ++i) {
+            const double* xyz = all + std::size_t{3} * (*map_->affected)[i];
+            points[i] = HPoint(xyz[0], xyz[1], xyz[2]);
+        }
+    });
     return HStatus::kSuccess;
 }
 
 void GeometryPoints::copyFrom(const HPointArray& points) {
     const bool whole = isWhole();
     double* xyz = writable(!whole);
-    for (unsigned i = 0; i < points.length(); ++i) {
-        double* to = xyz + std::size_t{3} * (whole ? i : (*map_->affected)[i]);
-        to[0] = points[i].x;
-        to[1] = points[i].y;
-        to[2] = points[i].z;
-    }
+    forRanges(points.length(), [&](std::size_t begin, std::size_t end) {
+        for (std::size_t i = begin; i < end; ++i) {
+            double* to = xyz + std::size_t{3} * (whole ? i : (*map_->affected)[i]);
+            to[0] = points[i].x;
+            to[1] = points[i].y;
+            to[2] = points[i].z;
+        }
+    });
 }
 
 const std::shared_ptr<MeshData>& GeometryPoints::result() {

@@ -2,6 +2,7 @@
 #include "geometry/MeshData.h"
 
 #include "core/text.h"
+#include "geometry/forRanges.h"
 
 #include <limits>
 #include <stdexcept>
@@ -128,8 +129,10 @@ HStatus copyPoints(const Positions& from, HPointArray& points) {
         return status;
     const double* xyz = from.xyz();
     HPoint* to = points.data();
-    for (std::size_t i = 0; i < from.vertexCount(); ++i, xyz += 3)
-        to[i] = HPoint(xyz[0], xyz[1], xyz[2]);
+    forRanges(from.vertexCount(), [&](std::size_t begin, std::size_t end) {
+        for (std::size_t i = begin; i < end; ++i)
+            to[i] = HPoint(xyz[3 * i], xyz[3 * i + 1], xyz[3 * i + 2]);
+    });
     return HStatus::kSuccess;
 }
 

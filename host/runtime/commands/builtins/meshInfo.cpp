@@ -9,19 +9,19 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
 #include <cmath>
-#include <cstdio>
 
 namespace OpenQuarn {
 namespace {
 
 using Triple = std::array<double, 3>;
 
-/// Six digits: for reading.
+/// Six digits, for reading; in every locale.
 std::string rounded(double value) {
     std::array<char, 32> text{};
-    std::snprintf(text.data(), text.size(), "%.6g", value);
-    return text.data();
+    const auto end = std::to_chars(text.data(), text.data() + text.size(), value, std::chars_format::general, 6);
+    return {text.data(), end.ptr};
 }
 
 std::string printed(const Triple& point) {
