@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "rig/registration.h"
+
+#include "openquarn/HFnPlugin.h"
+
+#include <vector>
+
+namespace rig {
+namespace {
+
+struct NodeType {
+    HString name;
+    HTypeId id;
+    HPxNode* (*create)();
+    HStatus (*initialize)();
+    HPxNode::Type kind;
+};
+
+const std::vector<NodeType>& nodeTypes() {
+    static const std::vector<NodeType> types = {};
+    return types;
+}
+
+} // namespace
+
+HStatus registerNodes(HObject object) {
+    HFnPlugin plugin(object, "neuralWarp", "1.0", "Any");
+    for (const NodeType& type : nodeTypes()) {
+        HStatus status = plugin.registerNode(type.name, type.id, type.create, type.initialize, type.kind);
+        status.perror(("registerNode " + type.name).asChar());
+        if (status.error())
+            return status;
+    }
+    return HStatus::kSuccess;
+}
+
+HStatus deregisterNodes(HObject object) {
+    HFnPlugin plugin(object);
+    for (auto type = nodeTypes().rbegin(); type != nodeTypes().rend(); ++type) {
+        HStatus status = plugin.deregisterNode(type->id);
+        status.perror(("deregisterNode " + type->name).asChar());
+        if (status.error())
+            return status;
+    }
+    return HStatus::kSuccess;
+}
+
+} // namespace rig
