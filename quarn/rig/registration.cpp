@@ -1,6 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/registration.h"
 
+#include "rig/animCurveNode.h"
+#include "rig/animCurveQuaternionNode.h"
+#include "rig/jointNode.h"
+#include "rig/skinClusterNode.h"
+
 #include "openquarn/HFnPlugin.h"
 
 #include <vector>
@@ -17,7 +22,15 @@ struct NodeType {
 };
 
 const std::vector<NodeType>& nodeTypes() {
-    static const std::vector<NodeType> types = {};
+    static const std::vector<NodeType> types = {
+        {jointNode::typeName, jointNode::id, jointNode::create, jointNode::initialize, HPxNode::kDependNode},
+        {skinClusterNode::typeName, skinClusterNode::id, skinClusterNode::create, skinClusterNode::initialize,
+         HPxNode::kDeformerNode},
+        {animCurveNode::typeName, animCurveNode::id, animCurveNode::create, animCurveNode::initialize,
+         HPxNode::kDependNode},
+        {animCurveQuaternionNode::typeName, animCurveQuaternionNode::id, animCurveQuaternionNode::create,
+         animCurveQuaternionNode::initialize, HPxNode::kDependNode},
+    };
     return types;
 }
 

@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "rig/animCurveNode.h"
+
+#include "rig/guard.h"
+
+namespace rig {
+
+const HTypeId animCurveNode::id(0x6e770012);
+const HString animCurveNode::typeName("animCurve");
+
+KeyAttributes animCurveNode::keys;
+HObject animCurveNode::output;
+
+animCurveNode::animCurveNode() = default;
+animCurveNode::~animCurveNode() = default;
+
+HPxNode* animCurveNode::create() {
+    return new (std::nothrow) animCurveNode;
+}
+
+HStatus animCurveNode::initialize() {
+    AttributeMaker make;
+    keys.make(make);
+    output = make.number("output", "o", 0.0, Role::output);
+    make.add({output});
+    make.affects(
+        {keys.keyTimes, keys.keyValues, keys.keyInTangents, keys.keyOutTangents, keys.interpolation, keys.time},
+        {output});
+    return make.status();
+}
+
+HStatus animCurveNode::compute(const HPlug& plug, HDataBlock& block) {
+    return guarded([&]() -> HStatus {
+        if (plug.attribute() != output)
+            return HStatus::kUnknownParameter;
+        Inputs inputs(block);
+        const double time = inputs.number(keys.time);
+        Interpolation interpolation{};
+        HStatus status = keys.read(inputs, track_, interpolation);
+        if (status.error())
+            return status;
+        const double value = track_.keyCount() == 0 ? 0.0 : track_.sample(track_.find(time), interpolation, 0);
+        status = block.outputValue(output).set(value);
+        return status.error() ? status : block.setClean(plug);
+    });
+}
+
+} // namespace rig

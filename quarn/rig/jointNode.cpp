@@ -1,0 +1,114 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "rig/jointNode.h"
+
+#include "rig/AttributeMaker.h"
+#include "rig/Inputs.h"
+#include "rig/guard.h"
+
+namespace rig {
+
+using Node = jointNode;
+
+const HTypeId Node::id(0x6e770010);
+const HString Node::typeName("joint");
+
+HObject Node::translateX, Node::translateY, Node::translateZ, Node::translate;
+HObject Node::rotateX, Node::rotateY, Node::rotateZ, Node::rotate;
+HObject Node::rotateOrder;
+HObject Node::jointOrientX, Node::jointOrientY, Node::jointOrientZ, Node::jointOrient;
+HObject Node::scaleX, Node::scaleY, Node::scaleZ, Node::scale;
+HObject Node::parentMatrix;
+HObject Node::restMatrix;
+HObject Node::matrix;
+HObject Node::worldMatrix;
+HObject Node::relativeMatrix;
+
+jointNode::jointNode() = default;
+jointNode::~jointNode() = default;
+
+HPxNode* jointNode::create() {
+    return new (std::nothrow) jointNode;
+}
+
+HStatus jointNode::initialize() {
+    AttributeMaker make;
+    translateX = make.number("translateX", "tx");
+    translateY = make.number("translateY", "ty");
+    translateZ = make.number("translateZ", "tz");
+    translate = make.compound("translate", "t", {translateX, translateY, translateZ});
+    rotateX = make.number("rotateX", "rx");
+    rotateY = make.number("rotateY", "ry");
+    rotateZ = make.number("rotateZ", "rz");
+    rotate = make.compound("rotate", "r", {rotateX, rotateY, rotateZ});
+    rotateOrder = make.rotationOrder("rotateOrder", "ro");
+    jointOrientX = make.number("jointOrientX", "jox");
+    jointOrientY = make.number("jointOrientY", "joy");
+    jointOrientZ = make.number("jointOrientZ", "joz");
+    jointOrient = make.compound("jointOrient", "jo", {jointOrientX, jointOrientY, jointOrientZ});
+    scaleX = make.number("scaleX", "sx", 1.0);
+    scaleY = make.number("scaleY", "sy", 1.0);
+    scaleZ = make.number("scaleZ", "sz", 1.0);
+    scale = make.compound("scale", "s", {scaleX, scaleY, scaleZ});
+    parentMatrix = make.matrix("parentMatrix", "pm");
+    restMatrix = make.matrix("restMatrix", "rsm");
+    matrix = make.matrix("matrix", "m", Role::output);
+    worldMatrix = make.matrix("worldMatrix", "wm", Role::output);
+    relativeMatrix = make.matrix("relativeMatrix", "rm", Role::output);
+    make.add({translate, rotate, rotateOrder, jointOrient, scale, parentMatrix, restMatrix, matrix, worldMatrix,
+              relativeMatrix});
+    make.affects({translate, rotate, rotateOrder, jointOrient, scale}, {matrix, worldMatrix, relativeMatrix});
+    make.affects({parentMatrix}, {worldMatrix});
+    make.affects({restMatrix}, {relativeMatrix});
+    return make.status();
+}
+
+namespace {
+
+HEulerRotation angles(const HVector& vector, HEulerRotation::RotationOrder order) {
+    return {vector.x, vector.y, vector.z, order};
+}
+
+/// S * R * JO * T.
+HMatrix localMatrix(Inputs& inputs) {
+    const HVector turn = inputs.vector(Node::rotateX, Node::rotateY, Node::rotateZ);
+    const HVector orient = inputs.vector(Node::jointOrientX, Node::jointOrientY, Node::jointOrientZ);
+    const HVector size = inputs.vector(Node::scaleX, Node::scaleY, Node::scaleZ);
+    HMatrix local = angles(turn, inputs.rotationOrder(Node::rotateOrder)).asMatrix() *
+                    angles(orient, HEulerRotation::kXYZ).asMatrix();
+    for (unsigned axis = 0; axis < 3; ++axis)
+        local.setRow(axis, local.row(axis) * size[axis]);
+    local.setRow(3, inputs.vector(Node::translateX, Node::translateY, Node::translateZ));
+    return local;
+}
+
+HStatus toRelative(HMatrix& local, const HMatrix& rest) {
+    HStatus status;
+    const HMatrix inverse = rest.inverse(&status);
+    if (status.error())
+        return {HStatus::kFailure, "restMatrix is singular, so that there is no pose relative to it"};
+    local = local * inverse;
+    return HStatus::kSuccess;
+}
+
+} // namespace
+
+HStatus jointNode::compute(const HPlug& plug, HDataBlock& block) {
+    return guarded([&]() -> HStatus {
+        const HObject output = plug.attribute();
+        if (output != matrix && output != worldMatrix && output != relativeMatrix)
+            return HStatus::kUnknownParameter;
+        Inputs inputs(block);
+        HMatrix result = localMatrix(inputs);
+        if (output == worldMatrix)
+            result *= inputs.matrix(parentMatrix);
+        HStatus status = output == relativeMatrix ? toRelative(result, inputs.matrix(restMatrix)) : HStatus();
+        if (inputs.status().error())
+            return inputs.status();
+        if (status.error())
+            return status;
+        status = block.outputValue(output).set(result);
+        return status.error() ? status : block.setClean(plug);
+    });
+}
+
+} // namespace rig

@@ -1,0 +1,60 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/rig/RigTest.h"
+
+#include "openquarn_app/NodeTypes.h"
+
+#include <fstream>
+#include <sstream>
+
+namespace {
+
+class RigNodesPage : public RigTest {
+protected:
+    RigNodesPage() {
+        std::ifstream file(NW_RIG_NODES_PAGE);
+        EXPECT_TRUE(file) << NW_RIG_NODES_PAGE;
+        page << file.rdbuf();
+    }
+
+    std::stringstream page;
+};
+
+TEST_F(RigNodesPage, NamesEveryAttribute) {
+    for (const std::string type : {"joint", "skinCluster", "animCurve", "animCurveQuaternion"}) {
+        const std::string text = page.str();
+        const std::size_t from = text.find("\n## " + type + '\n');
+        ASSERT_NE(from, std::string::npos) << type;
+        const std::string section = text.substr(from, text.find("\n## ", from + 1) - from);
+        for (const OpenQuarn::AttributeInfo& attribute : OpenQuarn::attributesOf(type)) {
+            if (attribute.inherited)
+                continue;
+            const std::string name = (attribute.parent == "skin" ? "skin." : "") + attribute.name;
+            EXPECT_NE(section.find('`' + name + '`'), std::string::npos) << type << ' ' << name;
+            EXPECT_NE(section.find('`' + attribute.shortName + '`'), std::string::npos) << type << ' ' << name;
+        }
+    }
+}
+
+TEST_F(RigNodesPage, ExamplesGiveWhatItSays) {
+    bool inExample = false;
+    int compared = 0;
+    for (std::string line; std::getline(page, line);) {
+        if (line.starts_with("```")) {
+            inExample = line == "```quarn";
+            if (inExample)
+                run("file -new");
+            continue;
+        }
+        if (!inExample)
+            continue;
+        const std::string result = OpenQuarn::printedValue(run(line));
+        const std::string promise = "# gives ";
+        if (const auto at = line.find(promise); at != std::string::npos) {
+            EXPECT_EQ(result, line.substr(at + promise.size())) << line;
+            ++compared;
+        }
+    }
+    EXPECT_GE(compared, 6);
+}
+
+} // namespace
