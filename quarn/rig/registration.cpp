@@ -8,6 +8,7 @@
 
 #include "openquarn/HFnPlugin.h"
 
+#include <algorithm>
 #include <vector>
 
 namespace rig {
@@ -49,9 +50,11 @@ HStatus registerNodes(HObject object) {
 
 HStatus deregisterNodes(HObject object) {
     HFnPlugin plugin(object);
-    for (auto type = nodeTypes().rbegin(); type != nodeTypes().rend(); ++type) {
-        HStatus status = plugin.deregisterNode(type->id);
-        status.perror(("deregisterNode " + type->name).asChar());
+    std::vector<NodeType> types = nodeTypes();
+    std::reverse(types.begin(), types.end());
+    for (const NodeType& type : types) {
+        HStatus status = plugin.deregisterNode(type.id);
+        status.perror(("deregisterNode " + type.name).asChar());
         if (status.error())
             return status;
     }
