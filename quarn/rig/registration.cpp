@@ -4,6 +4,7 @@
 #include "rig/animCurveNode.h"
 #include "rig/animCurveQuaternionNode.h"
 #include "rig/jointNode.h"
+#include "rig/pointCacheNode.h"
 #include "rig/skinClusterNode.h"
 
 #include "openquarn/HFnPlugin.h"
@@ -31,6 +32,8 @@ const std::vector<NodeType>& nodeTypes() {
          HPxNode::kDependNode},
         {animCurveQuaternionNode::typeName, animCurveQuaternionNode::id, animCurveQuaternionNode::create,
          animCurveQuaternionNode::initialize, HPxNode::kDependNode},
+        {pointCacheNode::typeName, pointCacheNode::id, pointCacheNode::create, pointCacheNode::initialize,
+         HPxNode::kDependNode},
     };
     return types;
 }

@@ -1,0 +1,264 @@
+// SPDX-License-Identifier: Apache-2.0
+// Point caches as files: what is read, what is refused and why, and what is left when writing fails.
+#include "fuzz/npyTarget.h"
+#include "support/TemporaryFolder.h"
+#include "support/seedCorpus.h"
+
+#include "rig/NpyFile.h"
+
+#include <gmock/gmock.h>
+
+#include <bit>
+#include <csignal>
+#include <cstring>
+#include <fstream>
+#include <functional>
+#include <random>
+#include <vector>
+
+#include <sys/resource.h>
+#include <sys/stat.h>
+
+namespace {
+
+using rig::NpyFile;
+using rig::NpyWriter;
+using ::testing::AllOf;
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+
+std::string bytesOf(const std::filesystem::path& path) {
+    std::ifstream file(path, std::ios::binary);
+    return {std::istreambuf_iterator<char>(file), {}};
+}
+
+std::vector<double> frameOf(const NpyFile& file, std::size_t frame) {
+    std::vector<double> xyz(3 * file.vertexCount());
+    file.read(frame, 0, xyz);
+    return xyz;
+}
+
+/// A file of format version `major`.0 with that header and so many bytes of zeros behind it.
+std::string npy(const std::string& dictionary, std::size_t dataSize, char major = 1) {
+    std::string bytes = "\x93NUMPY";
+    bytes += {major, '\0', static_cast<char>(dictionary.size()), '\0'};
+    return bytes + std::string(major == 1 ? 0 : 2, '\0') + dictionary + std::string(dataSize, '\0');
+}
+
+class NpyFiles : public ::testing::Test {
+public:
+    std::filesystem::path folder() const { return folder_.path(); }
+    std::string path(const std::string& name = "cache.npy") const { return folder() / name; }
+    std::string write(const std::string& bytes) const {
+        std::ofstream(path(), std::ios::binary) << bytes;
+        return path();
+    }
+    std::size_t entries() const {
+        const std::filesystem::directory_iterator entry(folder());
+        return static_cast<std::size_t>(std::distance(begin(entry), end(entry)));
+    }
+    static std::string why(const std::function<void()>& action) {
+        try {
+            action();
+        } catch (const std::exception& error) {
+            return error.what();
+        }
+        return "";
+    }
+
+private:
+    TemporaryFolder folder_;
+};
+
+// the bytes that numpy.save writes for [[[1, 2.5, -3]], [[4, 5, 0.1]]] as '<f4', and [[0.1, -2, 3]] as '<f8'
+constexpr char numpySingles[] = "\x93NUMPY\x01\0v\0{'descr': '<f4', 'fortran_order': False, 'shape': (2, 1, 3), }"
+                                "                                                       \n"
+                                "\0\0\x80\x3f\0\0\x20\x40\0\0\x40\xc0\0\0\x80\x40\0\0\xa0\x40\xcd\xcc\xcc\x3d";
+constexpr char numpyDoubles[] = "\x93NUMPY\x01\0v\0{'descr': '<f8', 'fortran_order': False, 'shape': (1, 3), }"
+                                "                                                          \n"
+                                "\x9a\x99\x99\x99\x99\x99\xb9\x3f\0\0\0\0\0\0\0\xc0\0\0\0\0\0\0\x08\x40";
+
+TEST_F(NpyFiles, ReadsWhatNumpySaves) {
+    const NpyFile singles(write({numpySingles, sizeof(numpySingles) - 1}));
+    EXPECT_EQ(singles.frameCount(), 2U);
+    EXPECT_EQ(singles.vertexCount(), 1U);
+    EXPECT_THAT(frameOf(singles, 0), ElementsAre(1, 2.5, -3));
+    EXPECT_THAT(frameOf(singles, 1), ElementsAre(4, 5, 0.1F));
+    const NpyFile doubles(write({numpyDoubles, sizeof(numpyDoubles) - 1}));
+    EXPECT_EQ(doubles.frameCount(), 1U);
+    EXPECT_THAT(frameOf(doubles, 0), ElementsAre(0.1, -2, 3));
+}
+
+struct Refused {
+    std::string bytes;
+    const char* why;
+};
+
+TEST_F(NpyFiles, RefusesWhatIsNoPointCache) {
+    const auto shaped = [](const std::string& shape, std::size_t dataSize) {
+        return npy("{'descr': '<f4', 'fortran_order': False, 'shape': " + shape + "}", dataSize);
+    };
+    const std::string good = npy("{'descr': '<f4', 'fortran_order': False, 'shape': (1, 3), } \n", 12);
+    write(good);
+    ASSERT_EQ(why([&] { NpyFile{path()}; }), "") << "the rows differ from this one by what is wrong";
+    const std::vector<Refused> rows = {
+        {"", "does not begin with"},
+        {"\x93NUMPX" + good.substr(6), "does not begin with"},
+        {good.substr(0, 11), "ends within its first 12 bytes"},
+        {good.substr(0, 40), "its header is to end at byte 71, and it has 40"},
+        {npy("{", 0, 4), "version 4.0"},
+        {std::string("\x93NUMPY\x02\0\xff\xff\xff\x7f", 12), "2147483647 bytes: at most 65536"},
+        {good.substr(0, good.size() - 1), "[1, 1, 3] of 4 bytes each, and 11 bytes follow"},
+        {good + '\0', "more than its array"},
+        {npy("{'descr': '>f4'}", 0), "its numbers are '>f4'"},
+        {npy("{'descr': '<f2'}", 0), "its numbers are '<f2'"},
+        {npy("{'descr': '\x1b[2J'}", 0), "its numbers are '?[2J'"},
+        {npy("{'descr': [('x', '<f4')]}", 0), "structures"},
+        {npy("{'fortran_order': True}", 0), "in Fortran order: a point cache is in C order"},
+        {npy("{'fortran_order': 1}", 0), "should have False at byte 18, and has '1}'"},
+        {npy("{'shape': (1, 3), 'shape': (1, 3)}", 12), "'shape' twice"},
+        {npy("{'shape': (1, 3), 'descr': '<f4'}", 12), "no 'fortran_order'"},
+        {npy("{'shape': (1, 3), 'extra': 1}", 12), "unknown key 'extra'"},
+        {npy("{'shape' (1, 3)}", 12), "should have : at byte 9"},
+        {npy("{'sha\\x70e': (1, 3)}", 12), "without '\\'"},
+        {npy("{'shape", 0), "closing quote"},
+        {npy("{'descr': '<f4' 'shape': (1, 3)}", 12), "should have } at byte 16"},
+        {npy("{'descr': '<f4', 'fortran_order': False, 'shape': (1, 3), } x", 12), "nothing more"},
+        {shaped("(3)", 12), "should have ,"},
+        {shaped("(3,)", 12), "its shape is [3]"},
+        {shaped("()", 0), "its shape is []"},
+        {shaped("(1, 4)", 16), "its shape is [1, 4]"},
+        {shaped("(1, 1, 1, 3)", 12), "its shape is [1, 1, 1, 3]"},
+        {shaped("(1, 1, 1, 1, 1, 3)", 12), "its shape is [1, 1, 1, 1, 1, ...]"},
+        {shaped("(-1, 3)", 12), "a number at byte 51"},
+        {shaped("(01, 3)", 12), "a number"},
+        {shaped("(1,, 3)", 12), "a number"},
+        {shaped("(18446744073709551616, 3)", 0), "too large"},
+        // products that wrap to the size of the data
+        {shaped("(1537228672809129302, 3)", 8), "cut short"},
+        {shaped("(4611686018427387904, 1, 3)", 0), "cut short"},
+    };
+    for (const Refused& row : rows) {
+        write(row.bytes);
+        EXPECT_THAT(why([&] { NpyFile{path()}; }),
+                    AllOf(HasSubstr("'" + path() + "' cannot be read: "), HasSubstr(row.why)));
+    }
+}
+
+TEST_F(NpyFiles, RefusesWhatIsNoFile) {
+    ASSERT_EQ(mkfifo(path("pipe").c_str(), 0600), 0);
+    EXPECT_THAT(why([&] { NpyFile{path("pipe")}; }), HasSubstr("no regular file"));
+    EXPECT_THAT(why([&] { NpyFile{folder()}; }), HasSubstr("no regular file"));
+    EXPECT_THAT(why([&] { NpyFile{path("none.npy")}; }), HasSubstr("none.npy' cannot be read: No such file"));
+}
+
+TEST_F(NpyFiles, AFileThatIsCutWhileItIsOpenIsAnError) {
+    const NpyFile file(write(npy("{'descr': '<f4', 'fortran_order': False, 'shape': (2, 1, 3)}", 24)));
+    std::filesystem::resize_file(path(), std::filesystem::file_size(path()) - 4);
+    EXPECT_THAT(frameOf(file, 0), ElementsAre(0, 0, 0));
+    EXPECT_THAT(why([&] { frameOf(file, 1); }), HasSubstr("cut short since it was opened"));
+    EXPECT_FALSE(rig::identityOf(path()) == file.identity());
+    std::vector<double> two(6);
+    EXPECT_THROW(file.read(2, 0, std::span(two).first(3)), std::out_of_range);
+    EXPECT_THROW(file.read(0, 0, two), std::out_of_range);
+    EXPECT_THROW(file.read(0, 2, {}), std::out_of_range);
+}
+
+TEST_F(NpyFiles, WhatIsWrittenIsReadBackToTheBit) {
+    std::mt19937 random(20);
+    const auto anyFloat = [&] { return std::bit_cast<float>(static_cast<std::uint32_t>(random()) & 0xFF7FFFFFU); };
+    for (const std::size_t frames : {0U, 1U, 3U})
+        for (const std::size_t vertices : {0U, 1U, 5U, 4096U, 4097U, 10000U}) {
+            SCOPED_TRACE(std::to_string(frames) + " frames, " + std::to_string(vertices) + " vertices");
+            std::vector<std::vector<float>> given(frames, std::vector<float>(3 * vertices));
+            NpyWriter writer(path(), vertices);
+            for (std::vector<float>& frame : given) {
+                std::generate(frame.begin(), frame.end(), anyFloat);
+                writer.append(frame);
+            }
+            writer.finish();
+            const NpyFile file(path());
+            ASSERT_EQ(file.frameCount(), frames);
+            ASSERT_EQ(file.vertexCount(), vertices);
+            for (std::size_t frame = 0; frame < frames; ++frame)
+                EXPECT_EQ(frameOf(file, frame), std::vector<double>(given[frame].begin(), given[frame].end()));
+            if (frames > 1 && vertices > 4) { // a part of a frame that is not the first
+                double part[6];
+                file.read(1, 2, part);
+                EXPECT_TRUE(std::equal(std::begin(part), std::end(part), given[1].begin() + 6));
+            }
+        }
+    EXPECT_EQ(entries(), 1U);
+}
+
+TEST_F(NpyFiles, NobodySeesAPartOfAFile) {
+    write("before");
+    ASSERT_EQ(chmod(path().c_str(), 0640), 0);
+    std::filesystem::create_symlink("cache.npy", path("link.npy"));
+    const float point[] = {1, 2, 3};
+    {
+        NpyWriter writer(path("link.npy"), 1);
+        writer.append(point);
+        EXPECT_EQ(bytesOf(path()), "before");
+        EXPECT_EQ(entries(), 3U) << "written in the same folder";
+        EXPECT_THROW(writer.append(std::span(point).first(2)), std::invalid_argument);
+    }
+    EXPECT_EQ(bytesOf(path()), "before");
+    EXPECT_EQ(entries(), 2U) << "nothing is left without finish()";
+    NpyWriter writer(path("link.npy"), 1);
+    writer.append(point);
+    writer.finish();
+    EXPECT_THROW(writer.append(point), std::logic_error);
+    EXPECT_THROW(writer.finish(), std::logic_error);
+    EXPECT_EQ(NpyFile(path()).frameCount(), 1U) << "what the link leads to is replaced";
+    EXPECT_TRUE(std::filesystem::is_symlink(path("link.npy")));
+    EXPECT_EQ(std::filesystem::status(path()).permissions(), std::filesystem::perms(0640));
+}
+
+/// Files of this process may have so many bytes while it lives; beyond that writing fails, as on a full disk.
+class FileSizeLimit {
+public:
+    explicit FileSizeLimit(rlim_t bytes)
+        : handler_(std::signal(SIGXFSZ, SIG_IGN)) {
+        getrlimit(RLIMIT_FSIZE, &before_);
+        const rlimit limit{bytes, before_.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    ~FileSizeLimit() {
+        setrlimit(RLIMIT_FSIZE, &before_);
+        std::signal(SIGXFSZ, handler_);
+    }
+    FileSizeLimit(const FileSizeLimit&) = delete;
+    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+
+private:
+    rlimit before_ = {};
+    void (*handler_)(int);
+};
+
+TEST_F(NpyFiles, FailedWritingSaysWhyAndLeavesWhatWasThere) {
+    write("before");
+    std::string reason;
+    {
+        NpyWriter writer(path(), 100);
+        const std::vector<float> frame(300);
+        const FileSizeLimit limit(2000);
+        writer.append(frame);
+        reason = why([&] { writer.append(frame); });
+        EXPECT_THROW(writer.finish(), std::logic_error) << "not a file with the frames of before";
+        EXPECT_EQ(writer.frameCount(), 1U);
+    }
+    EXPECT_EQ(reason, "point cache '" + path() + "' cannot be written: File too large");
+    EXPECT_EQ(bytesOf(path()), "before");
+    EXPECT_EQ(entries(), 1U);
+    EXPECT_THAT(why([&] { NpyWriter(path("none/cache.npy"), 1); }), HasSubstr("none/cache.npy' cannot be written"));
+    std::filesystem::create_directory(path("folder"));
+    EXPECT_THAT(why([&] { NpyWriter(path("folder"), 1); }), HasSubstr("Is a directory"));
+    EXPECT_EQ(entries(), 2U);
+}
+
+TEST(NpySeeds, AreAcceptedOrRefusedAsTheirNamesSay) {
+    EXPECT_GE(runSeedCorpus("fuzz_npy", fuzzNpy), 4);
+}
+
+} // namespace
