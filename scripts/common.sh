@@ -25,6 +25,7 @@ declare -A probe_of=(
   [libgtest-dev]=gtest/gtest.h
   [libgmock-dev]=gmock/gmock.h
   [libeigen3-dev]=eigen3/Eigen/Core
+  [libassimp-dev]=assimp/Importer.hpp
   [npm]=npm
   [clang-14]=clang++-14
   [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/*/include/sanitizer/asan_interface.h

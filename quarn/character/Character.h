@@ -1,0 +1,97 @@
+// SPDX-License-Identifier: Apache-2.0
+// A rigged character as a file gives it, independent of the file's format and of the scene that is built from it.
+//
+// Everything is in the file's own units and axes, in double precision, for row vectors: p' = p * M, and A * B does A
+// first. A skinned point p of a mesh stands at the sum over its influences of
+//     weight * (p * inverseBind(joint) * world(joint)),
+// where world(joint) is local(joint) * world(parent of joint). All indices are checked: they are in range.
+#pragma once
+
+#include "openquarn/HMatrix.h"
+#include "openquarn/HPoint.h"
+#include "openquarn/HQuaternion.h"
+#include "openquarn/HVector.h"
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+/// A joint, or a node above one whose transformation the joint needs.
+struct Joint {
+    std::string name;      ///< not empty, unique among the joints
+    int parent = -1;       ///< index into Character::joints, below that of the joint itself; -1 for a root
+    HMatrix restTransform; ///< to the parent's space, as the file has it at rest; negative and uneven scale included
+};
+
+/// How much a joint moves a vertex.
+struct Influence {
+    std::uint32_t joint = 0; ///< index into Character::joints
+    double weight = 0.0;     ///< finite and not 0
+};
+
+/// What a mesh was bound to a joint with.
+struct Binding {
+    std::uint32_t joint = 0; ///< index into Character::joints
+    HMatrix inverseBind;     ///< from the mesh's space to that of the joint, at the time of binding
+};
+
+/// All that hangs on one node of the file: the parts that a format splits by material are one mesh.
+struct CharacterMesh {
+    std::string name;                        ///< not empty, unique among the meshes
+    std::vector<HPoint> points;              ///< in the mesh's space, w = 1; all finite
+    std::vector<std::uint32_t> polygonSizes; ///< corners of each polygon, 3 or more
+    std::vector<std::uint32_t> corners;      ///< indices into `points`, polygon by polygon
+    /// Those of each point: any number, by rising joint, no joint twice. [points.size()]; all empty in a mesh without
+    /// skin.
+    std::vector<std::vector<Influence>> influences;
+    std::vector<Binding> bindings; ///< by rising joint; every joint of an influence has one. Empty: no skin
+    /// For every vertex of the file, part by part, its index in `points`; see joinVertices().
+    std::vector<std::uint32_t> joinedOf;
+    /// From the mesh's space to the world's, at rest. It places a mesh without skin; a skin does without it.
+    HMatrix worldTransform;
+    int parentJoint = -1; ///< the nearest joint at or above the mesh's node, or -1. A mesh without skin follows it
+};
+
+enum class Interpolation : std::uint8_t {
+    Linear, ///< straight between keys; rotations turn at constant speed by the shorter way
+    Step,   ///< the value of the last key
+};
+
+template <class Value>
+struct Key {
+    double seconds = 0.0; ///< finite, not below that of the key before
+    Value value;          ///< finite
+};
+
+/// Before its first key and after its last a track keeps their values. Without a key it leaves the joint at rest.
+template <class Value>
+struct Track {
+    Interpolation interpolation = Interpolation::Linear;
+    std::vector<Key<Value>> keys;
+};
+
+/// A joint's local transformation over time: scale, then rotation, then translation.
+struct JointChannel {
+    std::uint32_t joint = 0; ///< index into Character::joints
+    Track<HVector> translation;
+    Track<HQuaternion> rotation; ///< unit quaternions
+    Track<HVector> scale;
+};
+
+struct Animation {
+    std::string name;     ///< not empty, unique among the animations
+    double seconds = 0.0; ///< the time of the last key, 0 or above
+    std::vector<JointChannel> channels;
+};
+
+struct Character {
+    std::vector<Joint> joints; ///< parents before their children
+    std::vector<CharacterMesh> meshes;
+    std::vector<Animation> animations;
+    double metersPerUnit = 1.0;        ///< above 0
+    std::vector<std::string> warnings; ///< what the user should know: sentences without a full stop
+};
+
+} // namespace quarn

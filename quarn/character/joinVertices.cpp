@@ -1,0 +1,112 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/character/joinVertices.h"
+
+#include <algorithm>
+#include <numeric>
+#include <tuple>
+#include <utility>
+
+namespace quarn {
+namespace {
+
+int compare(const HPoint& a, const HPoint& b) {
+    const auto left = std::tie(a.x, a.y, a.z);
+    const auto right = std::tie(b.x, b.y, b.z);
+    return left < right ? -1 : right < left ? 1 : 0;
+}
+
+int compare(const std::vector<Influence>& a, const std::vector<Influence>& b) {
+    if (a.size() != b.size())
+        return a.size() < b.size() ? -1 : 1;
+    for (std::size_t i = 0; i < a.size(); ++i) {
+        const auto left = std::tie(a[i].joint, a[i].weight);
+        const auto right = std::tie(b[i].joint, b[i].weight);
+        if (left != right)
+            return left < right ? -1 : 1;
+    }
+    return 0;
+}
+
+int compareVertices(const CharacterMesh& mesh, std::uint32_t a, std::uint32_t b) {
+    const int byPosition = compare(mesh.points[a], mesh.points[b]);
+    return byPosition != 0 ? byPosition : compare(mesh.influences[a], mesh.influences[b]);
+}
+
+// for every vertex the first one of the file that it equals
+std::vector<std::uint32_t> firstEquals(const CharacterMesh& mesh) {
+    std::vector<std::uint32_t> order(mesh.points.size());
+    std::iota(order.begin(), order.end(), 0U);
+    std::sort(order.begin(), order.end(), [&](std::uint32_t a, std::uint32_t b) {
+        const int result = compareVertices(mesh, a, b);
+        return result != 0 ? result < 0 : a < b;
+    });
+
+    std::vector<std::uint32_t> first(order.size());
+    for (std::size_t i = 0; i < order.size(); ++i) {
+        const bool again = i > 0 && compareVertices(mesh, order[i - 1], order[i]) == 0;
+        first[order[i]] = again ? first[order[i - 1]] : order[i];
+    }
+    return first;
+}
+
+void keepFirstVertices(CharacterMesh& mesh) {
+    const std::vector<std::uint32_t> first = firstEquals(mesh);
+    mesh.joinedOf.resize(first.size());
+    std::uint32_t count = 0;
+    for (std::uint32_t vertex = 0; vertex < first.size(); ++vertex) {
+        if (first[vertex] != vertex) {
+            mesh.joinedOf[vertex] = mesh.joinedOf[first[vertex]];
+            continue;
+        }
+        if (count != vertex) {
+            mesh.points[count] = mesh.points[vertex];
+            mesh.influences[count] = std::move(mesh.influences[vertex]);
+        }
+        mesh.joinedOf[vertex] = count++;
+    }
+    mesh.points.resize(count);
+    mesh.influences.resize(count);
+}
+
+// appends the polygon without corners that repeat; false when too little is left
+bool appendPolygon(std::vector<std::uint32_t>& corners, const std::uint32_t* polygon, std::uint32_t size) {
+    const std::size_t begin = corners.size();
+    for (std::uint32_t i = 0; i < size; ++i)
+        if (corners.size() == begin || corners.back() != polygon[i])
+            corners.push_back(polygon[i]);
+    while (corners.size() > begin + 1 && corners.back() == corners[begin])
+        corners.pop_back();
+    if (corners.size() >= begin + 3)
+        return true;
+    corners.resize(begin);
+    return false;
+}
+
+std::size_t renumberPolygons(CharacterMesh& mesh) {
+    for (std::uint32_t& corner : mesh.corners)
+        corner = mesh.joinedOf[corner];
+    std::vector<std::uint32_t> corners;
+    std::vector<std::uint32_t> sizes;
+    corners.reserve(mesh.corners.size());
+    sizes.reserve(mesh.polygonSizes.size());
+    const std::uint32_t* polygon = mesh.corners.data();
+    for (const std::uint32_t size : mesh.polygonSizes) {
+        const std::size_t before = corners.size();
+        if (appendPolygon(corners, polygon, size))
+            sizes.push_back(static_cast<std::uint32_t>(corners.size() - before));
+        polygon += size;
+    }
+    const std::size_t gone = mesh.polygonSizes.size() - sizes.size();
+    mesh.corners = std::move(corners);
+    mesh.polygonSizes = std::move(sizes);
+    return gone;
+}
+
+} // namespace
+
+std::size_t joinVertices(CharacterMesh& mesh) {
+    keepFirstVertices(mesh);
+    return renumberPolygons(mesh);
+}
+
+} // namespace quarn

@@ -1,0 +1,281 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/character/prepareGltf.h"
+
+#include "quarn/character/checkGltf.h"
+
+#include <rapidjson/error/en.h>
+#include <rapidjson/stringbuffer.h>
+#include <rapidjson/writer.h>
+
+#include <string_view>
+
+namespace quarn {
+namespace {
+
+// The binary form, after the glTF 2.0 specification, 4.4 "Binary glTF Layout": magic, version and length, then chunks
+// of length, type and data, the first of them the JSON text. All numbers are little-endian.
+constexpr std::string_view glbMagic = "glTF";
+constexpr std::size_t glbHeader = 12;
+constexpr std::size_t chunkHeader = 8;
+
+std::uint32_t numberAt(std::string_view bytes, std::size_t at) {
+    std::uint32_t value = 0;
+    for (std::size_t i = 4; i-- > 0;)
+        value = value << 8U | static_cast<unsigned char>(bytes[at + i]);
+    return value;
+}
+
+void appendNumber(std::string& bytes, std::size_t value) {
+    for (unsigned shift = 0; shift < 32; shift += 8)
+        bytes.push_back(static_cast<char>(value >> shift & 0xFFU));
+}
+
+struct Parts {
+    std::string_view json;
+    std::string_view chunks; ///< what follows the JSON chunk of the binary form
+};
+
+Parts partsOf(std::string_view bytes) {
+    if (bytes.substr(0, glbMagic.size()) != glbMagic)
+        return {bytes, {}};
+    if (bytes.size() < glbHeader + chunkHeader || numberAt(bytes, 16) != numberAt("JSON", 0))
+        throw std::runtime_error("the binary glTF file does not begin with its JSON text");
+    if (numberAt(bytes, 4) != 2)
+        throw std::runtime_error("binary glTF of version " + std::to_string(numberAt(bytes, 4)) + ", not 2");
+    const std::size_t length = numberAt(bytes, 12);
+    if (length > bytes.size() - glbHeader - chunkHeader)
+        throw std::runtime_error("the binary glTF file ends in its JSON text");
+    std::string_view chunks = bytes.substr(glbHeader + chunkHeader + length);
+    if (!chunks.empty() && (chunks.size() < chunkHeader || numberAt(chunks, 0) > chunks.size() - chunkHeader))
+        throw std::runtime_error("the binary glTF file ends in its binary data");
+    return {bytes.substr(glbHeader + chunkHeader, length), chunks};
+}
+
+std::string joined(std::string json, std::string_view chunks) {
+    json.resize((json.size() + 3) / 4 * 4, ' ');
+    std::string bytes(glbMagic);
+    appendNumber(bytes, 2);
+    appendNumber(bytes, glbHeader + chunkHeader + json.size() + chunks.size());
+    appendNumber(bytes, json.size());
+    return bytes + "JSON" + json + std::string(chunks);
+}
+
+// what reads and writes JSON by recursion must not be led too deep
+void checkDepth(std::string_view json) {
+    constexpr int most = 200;
+    int depth = 0;
+    bool inText = false;
+    for (std::size_t i = 0; i < json.size(); ++i) {
+        const char c = json[i];
+        if (inText && c == '\\')
+            ++i;
+        else if (c == '"')
+            inText = !inText;
+        else if (!inText && (c == '{' || c == '['))
+            ++depth;
+        else if (!inText && (c == '}' || c == ']'))
+            --depth;
+        if (depth > most)
+            throw std::runtime_error("the JSON text is nested more than " + std::to_string(most) + " deep");
+    }
+}
+
+void checkObjects(const JsonValue& list, const std::string& things) {
+    for (const JsonValue& entry : list.GetArray())
+        if (!entry.IsObject())
+            throw std::runtime_error("one of the " + things + " is not an object");
+}
+
+void parse(rapidjson::Document& document, std::string_view json) {
+    checkDepth(json);
+    document.Parse<rapidjson::kParseValidateEncodingFlag | rapidjson::kParseFullPrecisionFlag>(json.data(),
+                                                                                               json.size());
+    if (document.HasParseError())
+        throw std::runtime_error("not JSON at byte " + std::to_string(document.GetErrorOffset()) + ": " +
+                                 rapidjson::GetParseError_En(document.GetParseError()));
+    const JsonValue* asset = member(document, "asset");
+    const std::string version = asset == nullptr ? "" : textOf(*asset, "version");
+    if (version.substr(0, 2) != "2.")
+        throw std::runtime_error("glTF of version \"" + version + "\", not 2");
+}
+
+std::string nodeId(std::size_t index) {
+    return "n" + std::to_string(index);
+}
+
+void renameNodes(rapidjson::Document& document, SourceHints& hints) {
+    const auto nodes = document.FindMember("nodes");
+    if (nodes == document.MemberEnd())
+        return;
+    std::size_t index = 0;
+    for (JsonValue& node : nodes->value.GetArray()) {
+        hints.nodeNames[nodeId(index)] = textOf(node, "name");
+        node.RemoveMember("name");
+        JsonValue id(nodeId(index++).c_str(), document.GetAllocator());
+        node.AddMember("name", id, document.GetAllocator());
+    }
+}
+
+rapidjson::Value& arrayMember(rapidjson::Value& object, const char* key, rapidjson::Document& document) {
+    if (member(object, key) == nullptr)
+        object.AddMember(rapidjson::StringRef(key), rapidjson::Value(rapidjson::kArrayType), document.GetAllocator());
+    return object[key];
+}
+
+// only what is read, and JOINTS_0 before JOINTS_1: the importer counts them as they come
+void keepReadAttributes(JsonValue& primitive, rapidjson::Document& document) {
+    JsonValue& attributes = primitive["attributes"];
+    JsonValue kept(rapidjson::kObjectType);
+    const auto keep = [&](const std::string& name) {
+        const auto found = attributes.FindMember(name.c_str());
+        if (found == attributes.MemberEnd())
+            return false;
+        kept.AddMember(JsonValue(name.c_str(), document.GetAllocator()), found->value, document.GetAllocator());
+        return true;
+    };
+    keep("POSITION");
+    for (unsigned set = 0; keep("JOINTS_" + std::to_string(set)) && keep("WEIGHTS_" + std::to_string(set));)
+        ++set;
+    attributes = kept;
+}
+
+// what is not read had better not be there: the importer would follow its indices
+void removeUnread(rapidjson::Document& document, SourceHints& hints) {
+    for (const char* key : {"materials", "textures", "images", "samplers", "cameras", "extensions", "extensionsUsed",
+                            "extensionsRequired"})
+        document.RemoveMember(key);
+    for (JsonValue& node : arrayMember(document, "nodes", document).GetArray())
+        for (const char* key : {"camera", "extensions", "weights"})
+            node.RemoveMember(key);
+    std::size_t index = 0;
+    for (JsonValue& mesh : arrayMember(document, "meshes", document).GetArray()) {
+        bool morphs = false;
+        mesh.RemoveMember("weights");
+        for (JsonValue& primitive : arrayMember(mesh, "primitives", document).GetArray()) {
+            morphs = primitive.RemoveMember("targets") || morphs;
+            primitive.RemoveMember("material");
+            primitive.RemoveMember("extensions");
+            keepReadAttributes(primitive, document);
+        }
+        if (morphs)
+            hints.warnings.push_back(element("meshes", index) + " has morph targets, which are not read");
+        ++index;
+    }
+}
+
+// three identity matrices in base 64, which take 192 bytes
+std::string threeIdentities() {
+    static constexpr std::string_view digits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+    std::string bytes;
+    for (int value = 0; value < 48; ++value)
+        bytes += value % 16 % 5 == 0 ? std::string("\0\0\x80\x3F", 4) : std::string(4, '\0');
+    std::string text;
+    for (std::size_t i = 0; i < bytes.size(); i += 3) {
+        std::uint32_t three = 0;
+        for (std::size_t k = 0; k < 3; ++k)
+            three = three << 8U | static_cast<unsigned char>(bytes[i + k]);
+        for (const unsigned shift : {18U, 12U, 6U, 0U})
+            text += digits[three >> shift & 63U];
+    }
+    return text;
+}
+
+// the index of a new accessor of at least `count` identity matrices, in a buffer of its own
+rapidjson::SizeType addIdentities(rapidjson::Document& document, std::size_t count) {
+    auto& memory = document.GetAllocator();
+    const std::size_t blocks = (count + 2) / 3;
+    std::string uri = "data:application/octet-stream;base64,";
+    for (std::size_t block = 0; block < blocks; ++block)
+        uri += threeIdentities();
+
+    const auto add = [&](const char* key, JsonValue& value) {
+        JsonValue& values = arrayMember(document, key, document);
+        values.PushBack(value, memory);
+        return values.Size() - 1;
+    };
+    JsonValue buffer(rapidjson::kObjectType);
+    buffer.AddMember("byteLength", std::uint64_t{blocks * 192}, memory);
+    buffer.AddMember("uri", JsonValue(uri.c_str(), memory), memory);
+    JsonValue view(rapidjson::kObjectType);
+    view.AddMember("buffer", add("buffers", buffer), memory);
+    view.AddMember("byteLength", std::uint64_t{blocks * 192}, memory);
+    JsonValue accessor(rapidjson::kObjectType);
+    accessor.AddMember("bufferView", add("bufferViews", view), memory);
+    accessor.AddMember("componentType", 5126, memory);
+    accessor.AddMember("type", "MAT4", memory);
+    accessor.AddMember("count", std::uint64_t{blocks * 3}, memory);
+    return add("accessors", accessor);
+}
+
+// a skin without bind matrices has identities, which the importer does not know
+void addBindMatrices(rapidjson::Document& document) {
+    for (JsonValue& skin : arrayMember(document, "skins", document).GetArray()) {
+        if (member(skin, "inverseBindMatrices") != nullptr)
+            continue;
+        const rapidjson::SizeType accessor = addIdentities(document, listOf(skin, "joints").Size());
+        skin.AddMember("inverseBindMatrices", accessor, document.GetAllocator());
+    }
+}
+
+std::optional<TrackKind> trackKind(const std::string& path) {
+    if (path == "translation")
+        return TrackKind::Translation;
+    if (path == "rotation")
+        return TrackKind::Rotation;
+    if (path == "scale")
+        return TrackKind::Scale;
+    return std::nullopt;
+}
+
+bool movesNode(const JsonValue& channel) {
+    const JsonValue& target = *member(channel, "target");
+    return member(target, "node") != nullptr && trackKind(textOf(target, "path"));
+}
+
+void removeOtherChannels(JsonValue& channels) {
+    for (auto channel = channels.Begin(); channel != channels.End();)
+        channel = movesNode(*channel) ? channel + 1 : channels.Erase(channel);
+}
+
+void noteInterpolations(const JsonValue& animation, std::size_t index, SourceHints& hints) {
+    bool cubic = false;
+    const JsonValue& samplers = listOf(animation, "samplers");
+    for (const JsonValue& channel : listOf(animation, "channels").GetArray()) {
+        const JsonValue& target = *member(channel, "target");
+        const std::size_t node = member(target, "node")->GetUint();
+        const std::string interpolation = textOf(samplers[member(channel, "sampler")->GetUint()], "interpolation");
+        if (interpolation == "STEP")
+            hints.stepTracks.emplace(index, nodeId(node), *trackKind(textOf(target, "path")));
+        cubic = cubic || interpolation == "CUBICSPLINE";
+    }
+    if (cubic)
+        hints.warnings.push_back(element("animations", index) +
+                                 " has cubic splines: their keys are read, and straight lines between them");
+}
+
+} // namespace
+
+std::string prepareGltf(const std::string& bytes, SourceHints& hints) {
+    const Parts parts = partsOf(bytes);
+    rapidjson::Document document;
+    parse(document, parts.json);
+    for (const char* things : {"nodes", "meshes", "animations", "accessors", "bufferViews", "buffers", "skins"})
+        checkObjects(listOf(document, things), things);
+    checkGltf(document);
+    renameNodes(document, hints);
+    removeUnread(document, hints);
+    addBindMatrices(document);
+    std::size_t index = 0;
+    for (JsonValue& animation : arrayMember(document, "animations", document).GetArray()) {
+        removeOtherChannels(arrayMember(animation, "channels", document));
+        noteInterpolations(animation, index++, hints);
+    }
+
+    rapidjson::StringBuffer buffer;
+    rapidjson::Writer<rapidjson::StringBuffer> writer(buffer);
+    document.Accept(writer);
+    std::string json(buffer.GetString(), buffer.GetSize());
+    return bytes.data() == parts.json.data() ? json : joined(std::move(json), parts.chunks);
+}
+
+} // namespace quarn

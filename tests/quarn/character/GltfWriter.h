@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+// Writes small glTF files, sound or not.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+class GltfWriter {
+public:
+    /// Add an accessor, with a buffer view of its own, and give its index. `type` "SCALAR", "VEC3", ...
+    std::size_t floats(const std::string& type, const std::vector<float>& values);
+    std::size_t shorts(const std::string& type, const std::vector<std::uint16_t>& values);
+
+    /// The objects of the lists, as JSON.
+    std::vector<std::string> nodes;
+    std::vector<std::string> meshes;
+    std::vector<std::string> skins;
+    std::vector<std::string> animations;
+    std::string roots = "0"; ///< of the scene
+
+    std::string text() const;   ///< with the buffer in it
+    std::string binary() const; ///< the same as .glb
+
+private:
+    std::size_t add(const std::string& type, int componentType, std::size_t count, const void* data, std::size_t size);
+    std::string json(const std::string& buffer) const;
+
+    std::string bytes_;
+    std::vector<std::string> views_;
+    std::vector<std::string> accessors_;
+};
+
+/// Numbers with commas between them.
+template <class Number>
+std::string list(const std::vector<Number>& numbers) {
+    std::string text;
+    for (const Number number : numbers)
+        text += (text.empty() ? "" : ",") + std::to_string(number);
+    return text;
+}
+
+} // namespace quarn

@@ -1,0 +1,147 @@
+// SPDX-License-Identifier: Apache-2.0
+// Files that are not characters, whether by accident or on purpose.
+#include "quarn/character/characterFiles.h"
+#include "quarn/character/readCharacter.h"
+#include "support/TemporaryFolder.h"
+
+#include <assimp/Exporter.hpp>
+#include <assimp/Importer.hpp>
+#include <gmock/gmock.h>
+
+#include <fstream>
+#include <limits>
+
+namespace quarn {
+namespace {
+
+using testing::AllOf;
+using testing::HasSubstr;
+
+std::string errorOf(const std::function<void()>& action) {
+    try {
+        action();
+    } catch (const std::runtime_error& error) {
+        return error.what();
+    }
+    return "no error";
+}
+
+TEST(DamagedCharacters, PathsThatAreNoFiles) {
+    const TemporaryFolder folder;
+    const std::string base = folder.path().string();
+    std::filesystem::create_directory(base + "/folder.glb");
+    const auto refused = [](const std::string& path, const std::string& reason) {
+        EXPECT_EQ(errorOf([&] { readCharacter(path); }), path + ": " + reason);
+    };
+    refused(base + "/none.gltf", "no such file");
+    refused(base + "/folder.glb", "not a file");
+    refused(base + "/x.obj", "\".obj\" is not one of the endings .gltf, .glb, .fbx and .dae");
+}
+
+struct Damage {
+    const char* reason;
+    std::string what;
+    std::string by;
+};
+
+// one replacement in the text of the strip
+TEST(DamagedCharacters, TextsAreRefusedWithTheReason) {
+    const std::string sound = Strip().write().text();
+    const std::string nested(100000, '[');
+    const std::vector<Damage> damages{
+        {"glTF of version \"1.0\", not 2", "\"2.0\"", "\"1.0\""},
+        {"not JSON at byte", "\"scene\":0", "\"scene\":"},
+        {"nested more than 200 deep", "\"scene\":0", "\"scene\":" + nested},
+        {"\"nodes\" is not an array", "\"nodes\":[{", "\"nodes\":7,\"x\":[{"},
+        {"one of the nodes is not an object", "\"nodes\":[{", "\"nodes\":[1,{"},
+        {"nodes[0] refers to nodes[9], but there are 3", "\"children\":[1]", "\"children\":[9]"},
+        {"names one of the nodes by something that is no index", "\"children\":[1]", "\"children\":[-1]"},
+        {"nodes[0] is its own ancestor", "\"children\":[1]", "\"children\":[0]"},
+        {"nodes[1] is a child twice", "\"children\":[1]", "\"children\":[1,1]"},
+        {"nodes[2] refers to meshes[4], but there are 1", "\"mesh\":0", "\"mesh\":4"},
+        {"nodes[2] refers to skins[1], but there are 1", "\"skin\":0", "\"skin\":1"},
+        {"skins[0] refers to nodes[3], but there are 3", "\"joints\":[0,1]", "\"joints\":[0,3]"},
+        {"skins[0] has nodes[1] twice", "\"joints\":[0,1]", "\"joints\":[1,1]"},
+        {"skins[0] has 3 joints, but 2 inverse bind matrices", "\"joints\":[0,1]", "\"joints\":[0,1,2]"},
+        {"has no positions", "\"POSITION\"", "\"POSITIO\""},
+        {"uses accessors[1], which does not hold floats by fours", "\"WEIGHTS_0\":3", "\"WEIGHTS_0\":1"},
+        {"accessors[0]: 9 elements leave bufferViews[0]", "\"count\":8,\"type\":\"VEC3\"",
+         "\"count\":9,\"type\":\"VEC3\""},
+        {"accessors[0]: 4000000000 elements leave", "\"count\":8,\"type\":\"VEC3\"",
+         "\"count\":4000000000,\"type\":\"VEC3\""},
+        {"accessors[0]: \"count\" is not a size", "\"count\":8,\"type\":\"VEC3\"", "\"count\":-1,\"type\":\"VEC3\""},
+        {"accessors[0]: \"componentType\" is none", "\"componentType\":5126", "\"componentType\":1"},
+        {"bufferViews[0] leaves its buffer", "\"byteOffset\":0", "\"byteOffset\":4000"},
+        {"", "\"indices\":1", "\"indices\":3"},                                   // floats for indices
+        {"", "\"JOINTS_0\":2", "\"JOINTS_0\":3"},                                 // and for joints
+        {"", "\"JOINTS_0\":2,\"WEIGHTS_0\":3", "\"JOINTS_0\":0,\"WEIGHTS_0\":0"}, // of three components
+        {"", "\"POSITION\":0", "\"POSITION\":2"},                                 // joints for positions
+        {"", "base64,", "base64,AAAA!!"},                                         // not base64
+        {"", "\"buffers\":[{\"byteLength\":", "\"buffers\":[{\"byteLength\":9"},  // more than there is
+        {"the file has no mesh", "\"mesh\":0,", ""},
+        {"the file needs the glTF extension \"EXT_x\"", "\"scene\":0",
+         "\"scene\":0,\"extensionsRequired\":[\"EXT_x\"]"},
+    };
+    for (const Damage& damage : damages) {
+        SCOPED_TRACE(damage.by.substr(0, 80));
+        std::string text = sound;
+        const std::size_t at = text.find(damage.what);
+        ASSERT_NE(at, std::string::npos) << damage.what;
+        text.replace(at, damage.what.size(), damage.by);
+        EXPECT_THAT(errorOf([&] { readBytesAs("damaged.gltf", text); }),
+                    AllOf(HasSubstr("damaged.gltf: "), HasSubstr(damage.reason)));
+    }
+}
+
+TEST(DamagedCharacters, NumbersAreRefusedWithTheReason) {
+    constexpr float nan = std::numeric_limits<float>::quiet_NaN();
+    const auto refused = [](const std::string& what, const std::function<std::size_t(GltfWriter&)>& other,
+                            const std::string& reason) {
+        Strip strip;
+        strip.more = [&](GltfWriter& file) {
+            const std::size_t at = file.meshes[0].find(what + ":") + what.size() + 1;
+            file.meshes[0].replace(at, 1, std::to_string(other(file)));
+        };
+        EXPECT_THAT(errorOf([&] { read(strip.write()); }), AllOf(HasSubstr("character.gltf: "), HasSubstr(reason)));
+    };
+    auto points = stripPoints();
+    points[5] = nan;
+    std::vector<float> weights(32, 0.25F);
+    weights[5] = std::numeric_limits<float>::infinity();
+    refused(
+        "\"POSITION\"", [&](GltfWriter& file) { return file.floats("VEC3", points); },
+        "the mesh \"arm\" has a position that is not finite at vertex 1");
+    refused(
+        "\"WEIGHTS_0\"", [&](GltfWriter& file) { return file.floats("VEC4", weights); },
+        "the mesh \"arm\" has a weight that is not finite at vertex 1");
+}
+
+// the importer of these formats is not asked twice where it crashes
+TEST(DamagedCharacters, OtherFormatsAreRefusedToo) {
+    const TemporaryFolder folder;
+    const std::string path = (folder.path() / "strip").string();
+    std::ofstream(path + ".gltf") << Strip().write().text();
+    Assimp::Importer importer;
+    const aiScene* scene = importer.ReadFile(path + ".gltf", 0);
+    ASSERT_NE(scene, nullptr);
+    const std::vector<std::pair<std::string, Damage>> damages{
+        {"collada", {"damaged", "<p>0", "<p>900"}},     {"collada", {"", "<node", "<nod"}},
+        {"fbxa", {"", "a: 0,1,-3", "a: 0,901,-3"}},     {"fbxa", {"", "a: 1,2,4,5,6,7", "a: 1,2,4,5,6,907"}},
+        {"fbxa", {"no mesh", "Geometry:", "Gometry:"}},
+    };
+    for (const auto& [format, damage] : damages) {
+        SCOPED_TRACE(format + " " + damage.by);
+        Assimp::Exporter exporter;
+        const aiExportDataBlob* blob = exporter.ExportToBlob(scene, format);
+        ASSERT_NE(blob, nullptr);
+        std::string text(static_cast<const char*>(blob->data), blob->size);
+        const std::size_t at = text.find(damage.what);
+        ASSERT_NE(at, std::string::npos) << damage.what;
+        text.replace(at, damage.what.size(), damage.by);
+        const std::string name = format == "fbxa" ? "damaged.fbx" : "damaged.dae";
+        EXPECT_THAT(errorOf([&] { readBytesAs(name, text); }), AllOf(HasSubstr(name + ": "), HasSubstr(damage.reason)));
+    }
+}
+
+} // namespace
+} // namespace quarn
