@@ -26,6 +26,7 @@ declare -A probe_of=(
   [libgmock-dev]=gmock/gmock.h
   [libeigen3-dev]=eigen3/Eigen/Core
   [libassimp-dev]=assimp/Importer.hpp
+  [zlib1g-dev]=/usr/include/zlib.h # what Assimp's own configuration links
   [npm]=npm
   [clang-14]=clang++-14
   [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/*/include/sanitizer/asan_interface.h
