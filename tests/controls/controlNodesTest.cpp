@@ -6,6 +6,7 @@
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn_app/Profiling.h"
 #include "support/TemporaryFolder.h"
+#include "support/pageExamples.h"
 
 #include <rapidjson/document.h>
 #include <rapidjson/istreamwrapper.h>
@@ -106,25 +107,7 @@ TEST_F(ControlNodes, OnSeveralThreadsTheyGiveTheSame) {
 TEST_F(ControlNodes, ThePagesExamplesGiveWhatThePageSays) {
     std::ifstream page(NW_CONTROL_NODES_PAGE);
     ASSERT_TRUE(page) << NW_CONTROL_NODES_PAGE;
-    bool inExample = false;
-    int compared = 0;
-    for (std::string line; std::getline(page, line);) {
-        if (line.starts_with("```")) {
-            inExample = line == "```quarn";
-            if (inExample)
-                run("file -new");
-            continue;
-        }
-        if (!inExample)
-            continue;
-        const std::string result = OpenQuarn::printedValue(run(line));
-        const std::string promise = "# gives ";
-        if (const auto at = line.find(promise); at != std::string::npos) {
-            EXPECT_EQ(result, line.substr(at + promise.size())) << line;
-            ++compared;
-        }
-    }
-    EXPECT_GE(compared, 8);
+    EXPECT_GE(comparePageExamples(page, [&](const std::string& line) { return run(line); }), 8);
 }
 
 } // namespace

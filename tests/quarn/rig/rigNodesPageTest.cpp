@@ -2,6 +2,7 @@
 #include "quarn/rig/RigTest.h"
 
 #include "openquarn_app/NodeTypes.h"
+#include "support/pageExamples.h"
 
 #include <fstream>
 #include <sstream>
@@ -36,25 +37,7 @@ TEST_F(RigNodesPage, NamesEveryAttribute) {
 }
 
 TEST_F(RigNodesPage, ExamplesGiveWhatItSays) {
-    bool inExample = false;
-    int compared = 0;
-    for (std::string line; std::getline(page, line);) {
-        if (line.starts_with("```")) {
-            inExample = line == "```quarn";
-            if (inExample)
-                run("file -new");
-            continue;
-        }
-        if (!inExample)
-            continue;
-        const std::string result = OpenQuarn::printedValue(run(line));
-        const std::string promise = "# gives ";
-        if (const auto at = line.find(promise); at != std::string::npos) {
-            EXPECT_EQ(result, line.substr(at + promise.size())) << line;
-            ++compared;
-        }
-    }
-    EXPECT_GE(compared, 6);
+    EXPECT_GE(comparePageExamples(page, [&](const std::string& line) { return run(line); }), 6);
 }
 
 } // namespace
