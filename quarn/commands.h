@@ -1,19 +1,27 @@
 // SPDX-License-Identifier: Apache-2.0
-// What quarn does, one function a sub-command. All throw std::runtime_error with the sentence that the user reads.
+// The sub-commands of quarn: each adds itself to the command line, with a callback that does the work. What is wrong is
+// thrown as std::runtime_error with the sentence that the user reads. Every one has a folder of its own.
 #pragma once
 
-#include <string>
-#include <vector>
+namespace CLI {
+class App;
+}
 
 namespace quarn {
 
-/// Loads the plug-ins, then runs the script. `file` a path, or "-" for standard input.
-void execute(const std::vector<std::string>& plugins, const std::string& file);
+void addImportCommand(CLI::App& app);
+void addPoseCommand(CLI::App& app);
+void addTargetCommand(CLI::App& app);
+void addExportCommand(CLI::App& app);
+void addPlayCommand(CLI::App& app);
+void addBakeCommand(CLI::App& app);
+void addRenderCommand(CLI::App& app);
+void addInfoCommand(CLI::App& app);
+void addExecCommand(CLI::App& app);
+void addListAttrCommand(CLI::App& app);
 
-/// Prints what is in a scene file, for people or as JSON.
-void showInfo(const std::string& scene, bool json);
-
-/// Loads the plug-ins, then prints the attributes of a node type, for people or as JSON.
-void listAttributes(const std::vector<std::string>& plugins, const std::string& nodeType, bool json);
+struct Console;
+/// Adds --quiet, and --json where the command has an answer that a program may read. `console` must outlive `command`.
+void addConsoleOptions(CLI::App& command, Console& console, bool hasAnswer);
 
 } // namespace quarn

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // quarn: the host without a screen.
 #include "quarn/commands.h"
+#include "quarn/console/interrupt.h"
 
 #include <CLI/CLI.hpp>
 
@@ -9,45 +10,21 @@
 
 namespace {
 
+constexpr int endedBySignal = 130; // what shells expect of a program that Ctrl-C has ended
+
 int run(int argc, char** argv) {
     CLI::App app("quarn: the host without a screen");
     app.set_version_flag("--version", "quarn " QUARN_VERSION);
     app.require_subcommand(1);
-
-    std::vector<std::string> plugins;
-    const auto takesPlugins = [&](CLI::App& command) {
-        command.add_option("-p,--plugin", plugins, "Load a plug-in first; may be repeated")
-            ->type_name("PATH")
-            ->allow_extra_args(false);
-    };
-    std::string script;
-    CLI::App* exec = app.add_subcommand("exec", "Run a script of commands");
-    takesPlugins(*exec);
-    exec->add_option("FILE", script, "The script; - for standard input")->required();
-
-    std::string scene;
-    bool json = false;
-    CLI::App* info = app.add_subcommand("info", "Show what is in a scene file");
-    info->add_option("SCENE", scene, "The scene file")->required();
-    info->add_flag("--json", json, "Print JSON");
-
-    std::string nodeType;
-    CLI::App* listAttr = app.add_subcommand("listAttr", "List the attributes of a node type");
-    takesPlugins(*listAttr);
-    listAttr->add_option("TYPE", nodeType, "The node type")->required();
-    listAttr->add_flag("--json", json, "Print JSON");
+    quarn::addExecCommand(app);
+    quarn::addInfoCommand(app);
+    quarn::addListAttrCommand(app);
 
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
         return app.exit(error); // help and version are no failures
     }
-    if (exec->parsed())
-        quarn::execute(plugins, script);
-    if (info->parsed())
-        quarn::showInfo(scene, json);
-    if (listAttr->parsed())
-        quarn::listAttributes(plugins, nodeType, json);
     if (!std::cout.flush())
         throw std::runtime_error("standard output could not be written");
     return 0;
@@ -58,6 +35,9 @@ int run(int argc, char** argv) {
 int main(int argc, char** argv) {
     try {
         return run(argc, argv);
+    } catch (const quarn::Interrupted& interrupted) {
+        std::cerr << "quarn: " << interrupted.what() << '\n';
+        return endedBySignal;
     } catch (const std::exception& error) {
         std::cerr << "quarn: " << error.what() << '\n';
         return 1;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // How attributes are listed, for people and for programs.
-#include "quarn/attributeTexts.h"
+#include "quarn/info/attributeTexts.h"
 
 #include "openquarn/HMatrix.h"
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn/HFnData.h"
-#include "quarn/attributeTexts.h"
-#include "quarn/json.h"
+#include "quarn/console/json.h"
+#include "quarn/info/attributeTexts.h"
 
 #include <array>
 #include <cmath>

@@ -2,7 +2,9 @@
 #include "quarn/commands.h"
 
 #include "openquarn_app/SceneFile.h"
-#include "quarn/json.h"
+#include "quarn/console/json.h"
+
+#include <CLI/CLI.hpp>
 
 #include <iostream>
 #include <stdexcept>
@@ -57,16 +59,29 @@ void printText(const SceneSummary& summary) {
         std::cout << "needs plug-in " << plugin << '\n';
 }
 
-} // namespace
+struct Options {
+    std::string scene;
+    bool json = false;
+};
 
-void showInfo(const std::string& scene, bool json) {
-    const SceneSummary summary = OpenQuarn::readSummary(scene);
+void showInfo(const Options& options) {
+    const SceneSummary summary = OpenQuarn::readSummary(options.scene);
     if (!summary.outcome)
         throw std::runtime_error(summary.outcome.error);
-    if (json)
+    if (options.json)
         printJson(summary);
     else
         printText(summary);
+}
+
+} // namespace
+
+void addInfoCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* info = app.add_subcommand("info", "Show what is in a scene file");
+    info->add_option("SCENE", options->scene, "The scene file")->required();
+    info->add_flag("--json", options->json, "Print JSON");
+    info->callback([options] { showInfo(*options); });
 }
 
 } // namespace quarn

@@ -2,7 +2,7 @@
 #include "openquarn/HFnData.h"
 #include "openquarn/HMatrix.h"
 #include "openquarn_app/Commands.h"
-#include "quarn/attributeTexts.h"
+#include "quarn/info/attributeTexts.h"
 
 #include <algorithm>
 #include <array>

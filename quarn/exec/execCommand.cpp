@@ -5,6 +5,8 @@
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
 
+#include <CLI/CLI.hpp>
+
 #include <iostream>
 #include <iterator>
 #include <stdexcept>
@@ -26,15 +28,30 @@ OpenQuarn::CommandOutcome runFile(const std::string& file) {
     return OpenQuarn::runScript(text, "standard input", print);
 }
 
-} // namespace
+struct Options {
+    std::vector<std::string> plugins;
+    std::string file;
+};
 
-void execute(const std::vector<std::string>& plugins, const std::string& file) {
+void execute(const Options& options) {
     const OpenQuarn::Session session;
-    for (const std::string& path : plugins)
+    for (const std::string& path : options.plugins)
         OpenQuarn::loadPlugin(path);
-    const OpenQuarn::CommandOutcome outcome = runFile(file);
+    const OpenQuarn::CommandOutcome outcome = runFile(options.file);
     if (!outcome)
         throw std::runtime_error(outcome.error);
+}
+
+} // namespace
+
+void addExecCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* exec = app.add_subcommand("exec", "Run a script of commands");
+    exec->add_option("-p,--plugin", options->plugins, "Load a plug-in first; may be repeated")
+        ->type_name("PATH")
+        ->allow_extra_args(false);
+    exec->add_option("FILE", options->file, "The script; - for standard input")->required();
+    exec->callback([options] { execute(*options); });
 }
 
 } // namespace quarn

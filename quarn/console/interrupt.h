@@ -1,0 +1,22 @@
+// SPDX-License-Identifier: Apache-2.0
+// Ctrl-C, and the polite end that a batch system asks for: noticed by the work itself, between two steps.
+#pragma once
+
+#include <stdexcept>
+
+namespace quarn {
+
+/// The user has asked for the end. Everything that was half done is undone on its way up; main() ends with 130.
+struct Interrupted : std::runtime_error {
+    Interrupted()
+        : std::runtime_error("interrupted") {}
+};
+
+/// From now on SIGINT and SIGTERM are remembered instead of ending the process; a second one ends it at once.
+/// Thread: main.
+void watchForInterrupt();
+
+/// Throws Interrupted once SIGINT or SIGTERM has come. Thread: any.
+void throwIfInterrupted();
+
+} // namespace quarn

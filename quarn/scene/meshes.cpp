@@ -1,0 +1,99 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/scene/meshes.h"
+
+#include "openquarn/HDataBlock.h"
+#include "openquarn/HFnMesh.h"
+#include "openquarn/HFnMeshData.h"
+#include "openquarn/HIntArray.h"
+#include "openquarn/HItGeometry.h"
+#include "openquarn/HPlug.h"
+#include "openquarn/HPointArray.h"
+
+#include <algorithm>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+void require(const HStatus& status, const HPlug& plug) {
+    if (status.error())
+        throw std::runtime_error(std::string(plug.name().asChar()) + ": " + status.errorString().asChar());
+}
+
+// the evaluated data of a plug, given back with its owner
+class EvaluatedData {
+public:
+    explicit EvaluatedData(const HPlug& plug)
+        : plug_(plug) {
+        HStatus status;
+        handle_ = plug.asHDataHandle(&status);
+        require(status, plug);
+    }
+    ~EvaluatedData() { plug_.destructHandle(handle_); }
+    EvaluatedData(const EvaluatedData&) = delete;
+    EvaluatedData& operator=(const EvaluatedData&) = delete;
+    const HDataHandle& handle() const { return handle_; }
+
+private:
+    HPlug plug_;
+    HDataHandle handle_;
+};
+
+template <class Number>
+void read(const HPlug& mesh, std::vector<Number>& xyz) {
+    const EvaluatedData data(mesh);
+    HStatus status;
+    const HItGeometry geometry(data.handle(), &status);
+    require(status, mesh);
+    const double* from = geometry.rawPositions(&status);
+    require(status, mesh);
+    xyz.resize(3 * static_cast<std::size_t>(geometry.count()));
+    std::transform(from, from + xyz.size(), xyz.begin(), [](double value) { return static_cast<Number>(value); });
+}
+
+} // namespace
+
+MeshPolygons polygonsOf(const HPlug& plug) {
+    const EvaluatedData data(plug);
+    HStatus status;
+    const HFnMesh mesh(data.handle().asMesh(), &status);
+    require(status, plug);
+    MeshPolygons polygons;
+    polygons.vertexCount = static_cast<std::size_t>(mesh.numVertices());
+    polygons.sizes.reserve(static_cast<std::size_t>(mesh.numPolygons()));
+    HIntArray vertices;
+    for (int polygon = 0; polygon < mesh.numPolygons(); ++polygon) {
+        require(mesh.getPolygonVertices(polygon, vertices), plug);
+        polygons.sizes.push_back(vertices.length());
+        for (unsigned corner = 0; corner < vertices.length(); ++corner)
+            polygons.corners.push_back(static_cast<std::uint32_t>(vertices[corner]));
+    }
+    return polygons;
+}
+
+void readPoints(const HPlug& mesh, std::vector<double>& xyz) {
+    read(mesh, xyz);
+}
+
+void readPoints(const HPlug& mesh, std::vector<float>& xyz) {
+    read(mesh, xyz);
+}
+
+HObject meshData(std::span<const double> xyz, const MeshPolygons& polygons) {
+    HPointArray points(static_cast<unsigned>(xyz.size() / 3));
+    for (unsigned vertex = 0; vertex < points.length(); ++vertex)
+        points[vertex] = HPoint(xyz[3 * vertex], xyz[3 * vertex + 1], xyz[3 * vertex + 2]);
+    HIntArray counts(static_cast<unsigned>(polygons.sizes.size()));
+    for (unsigned polygon = 0; polygon < counts.length(); ++polygon)
+        counts[polygon] = static_cast<int>(polygons.sizes[polygon]);
+    HIntArray corners(static_cast<unsigned>(polygons.corners.size()));
+    for (unsigned corner = 0; corner < corners.length(); ++corner)
+        corners[corner] = static_cast<int>(polygons.corners[corner]);
+    HStatus status;
+    const HObject data = HFnMeshData().create(points, counts, corners, &status);
+    if (status.error())
+        throw std::runtime_error(std::string("the mesh cannot be made: ") + status.errorString().asChar());
+    return data;
+}
+
+} // namespace quarn

@@ -1,0 +1,13 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/scene/units.h"
+
+#include "quarn/scene/plugs.h"
+
+namespace quarn {
+
+double metersPerUnit() {
+    const std::vector<HObject> characters = nodesOfType("character");
+    return characters.empty() ? 1.0 : numberOf(plugOf(characters.front(), "metersPerUnit"));
+}
+
+} // namespace quarn
