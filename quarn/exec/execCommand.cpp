@@ -2,8 +2,8 @@
 #include "quarn/commands.h"
 
 #include "openquarn_app/Commands.h"
-#include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
+#include "quarn/scene/SceneSession.h"
 
 #include <CLI/CLI.hpp>
 
@@ -35,8 +35,7 @@ struct Options {
 
 void execute(const Options& options) {
     const OpenQuarn::Session session;
-    for (const std::string& path : options.plugins)
-        OpenQuarn::loadPlugin(path);
+    loadPlugins(options.plugins, false);
     const OpenQuarn::CommandOutcome outcome = runFile(options.file);
     if (!outcome)
         throw std::runtime_error(outcome.error);

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
 #include "quarn/commands.h"
 #include "quarn/info/attributeTexts.h"
+#include "quarn/scene/SceneSession.h"
 
 #include <CLI/CLI.hpp>
 
@@ -19,8 +19,7 @@ struct Options {
 
 void listAttributes(const Options& options) {
     const OpenQuarn::Session session;
-    for (const std::string& path : options.plugins)
-        OpenQuarn::loadPlugin(path);
+    loadPlugins(options.plugins, false);
     const AttributeList list{OpenQuarn::attributesOf(options.nodeType), OpenQuarn::dependenciesOf(options.nodeType)};
     std::cout << (options.json ? attributeJson(list) + "\n" : attributeLines(list));
 }

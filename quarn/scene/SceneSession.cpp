@@ -9,6 +9,7 @@
 #include <oneapi/tbb/global_control.h>
 
 #include <cstdlib>
+#include <optional>
 #include <stdexcept>
 
 namespace quarn {
@@ -34,6 +35,13 @@ std::vector<fs::path> placesOfDeformer() {
     return places;
 }
 
+std::optional<fs::path> findDeformer() {
+    for (const fs::path& place : placesOfDeformer())
+        if (fs::exists(place))
+            return place;
+    return {};
+}
+
 } // namespace
 
 struct SceneSession::Threads {
@@ -54,13 +62,20 @@ std::string pathForScene(const fs::path& file, const fs::path& folder) {
 
 fs::path deformerPlugin() {
     std::string looked;
-    for (const fs::path& place : placesOfDeformer()) {
-        if (fs::exists(place))
-            return place;
+    for (const fs::path& place : placesOfDeformer())
         looked += (looked.empty() ? "" : ", ") + place.lexically_normal().string();
-    }
+    if (const std::optional<fs::path> found = findDeformer())
+        return *found;
     throw std::runtime_error("the plug-in neuralWarp.so was not found; looked at: " + looked +
                              ". Set NEURALWARP_PLUGIN to its path");
+}
+
+void loadPlugins(const std::vector<std::string>& further, bool deformerRequired) {
+    OpenQuarn::addPlugin("quarnRig", rig::registerNodes, rig::deregisterNodes);
+    if (deformerRequired || findDeformer())
+        OpenQuarn::loadPlugin(deformerPlugin());
+    for (const std::string& path : further)
+        OpenQuarn::loadPlugin(absolutePath(path));
 }
 
 void addSceneOptions(CLI::App& command, SceneOptions& options) {
@@ -76,10 +91,7 @@ void addSceneOptions(CLI::App& command, SceneOptions& options) {
 SceneSession::SceneSession(const std::vector<std::string>& plugins, int threads)
     : threads_(threads > 0 ? std::make_unique<Threads>(threads) : nullptr)
     , folderBefore_(fs::current_path()) {
-    OpenQuarn::addPlugin("quarnRig", rig::registerNodes, rig::deregisterNodes);
-    OpenQuarn::loadPlugin(deformerPlugin());
-    for (const std::string& path : plugins)
-        OpenQuarn::loadPlugin(absolutePath(path));
+    loadPlugins(plugins, true);
 }
 
 SceneSession::SceneSession(const SceneOptions& options)

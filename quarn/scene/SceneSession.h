@@ -5,7 +5,7 @@
 #include "openquarn_app/Session.h"
 
 #include <filesystem>
-#include <optional>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -28,6 +28,11 @@ void addSceneOptions(CLI::App& command, SceneOptions& options);
 /// The plug-in that brings the deformer: $NEURALWARP_PLUGIN, or where this program was built, or installed, beside it.
 /// Throws std::runtime_error that names all of these places when it is at none.
 std::filesystem::path deformerPlugin();
+
+/// Registers the rig nodes, and loads the deformer and further plug-ins, in the session that is open. Without
+/// `deformerRequired`, a deformer that is at none of its places is left out. Throws as OpenQuarn::loadPlugin() does.
+/// Thread: main.
+void loadPlugins(const std::vector<std::string>& further, bool deformerRequired);
 
 /// An open host with the rig nodes, the deformer and further plug-ins; one at a time in a process. Errors are
 /// std::runtime_error with the sentence for the user. Thread: main.
