@@ -2,6 +2,7 @@
 #include "quarn/import/importCharacter.h"
 
 #include "quarn/character/readCharacter.h"
+#include "quarn/character/rootsWarning.h"
 #include "quarn/import/animationCurves.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/import/posedJoints.h"
@@ -79,13 +80,22 @@ public:
 private:
     void readInput() {
         character_ = readCharacter(options_.file.string());
+        if (!options_.parents.empty())
+            changeParents();
         report_.warnings = std::exchange(character_.warnings, {});
         if (options_.metersPerUnit)
             character_.metersPerUnit = *options_.metersPerUnit;
-        if (!options_.parents.empty())
-            reparent(character_, readParents(options_.parents), options_.framesPerSecond);
         if (!options_.limits.empty())
             limits_ = readLimits(options_.limits);
+    }
+
+    // what was said of the roots of the file is no longer so
+    void changeParents() {
+        std::vector<std::string>& warnings = character_.warnings;
+        warnings.erase(std::remove(warnings.begin(), warnings.end(), rootsWarning(character_)), warnings.end());
+        reparent(character_, readParents(options_.parents), options_.framesPerSecond);
+        if (std::string warning = rootsWarning(character_); !warning.empty())
+            warnings.push_back(std::move(warning));
     }
 
     PosedJoints choose(const std::vector<JointRest>& rests, const Animation* animation) {
