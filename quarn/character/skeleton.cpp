@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/skeleton.h"
 
+#include "quarn/character/rootsWarning.h"
 #include "quarn/character/uniqueNames.h"
 
 #include <cmath>
@@ -110,18 +111,6 @@ private:
     Skeleton skeleton_;
 };
 
-void warnOfRoots(Character& character) {
-    std::string names;
-    std::size_t count = 0;
-    for (const Joint& joint : character.joints) {
-        if (joint.parent >= 0)
-            continue;
-        names += (count++ == 0 ? "\"" : ", \"") + joint.name + "\"";
-    }
-    if (count > 1)
-        character.warnings.push_back("the skeleton has " + std::to_string(count) + " roots: " + names);
-}
-
 } // namespace
 
 HMatrix rowVectorMatrix(const aiMatrix4x4& matrix, const std::string& owner) {
@@ -142,7 +131,8 @@ HMatrix rowVectorMatrix(const aiMatrix4x4& matrix, const std::string& owner) {
 
 Skeleton readSkeleton(const aiScene& scene, const SourceHints& hints, Character& character) {
     Skeleton skeleton = SkeletonReader(scene, hints, character).take();
-    warnOfRoots(character);
+    if (const std::string warning = rootsWarning(character); !warning.empty())
+        character.warnings.push_back(warning);
     return skeleton;
 }
 

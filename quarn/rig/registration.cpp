@@ -3,6 +3,7 @@
 
 #include "rig/animCurveNode.h"
 #include "rig/animCurveQuaternionNode.h"
+#include "rig/characterNode.h"
 #include "rig/jointNode.h"
 #include "rig/pointCacheNode.h"
 #include "rig/skinClusterNode.h"
@@ -33,6 +34,8 @@ const std::vector<NodeType>& nodeTypes() {
         {animCurveQuaternionNode::typeName, animCurveQuaternionNode::id, animCurveQuaternionNode::create,
          animCurveQuaternionNode::initialize, HPxNode::kDependNode},
         {pointCacheNode::typeName, pointCacheNode::id, pointCacheNode::create, pointCacheNode::initialize,
+         HPxNode::kDependNode},
+        {characterNode::typeName, characterNode::id, characterNode::create, characterNode::initialize,
          HPxNode::kDependNode},
     };
     return types;

@@ -7,6 +7,7 @@
 #include "openquarn/HMatrix.h"
 #include "openquarn/HSelectionList.h"
 #include "openquarn_app/Commands.h"
+#include "openquarn_app/Evaluation.h"
 
 #include <cctype>
 #include <stdexcept>
@@ -150,6 +151,8 @@ std::vector<unsigned> indicesOf(const HPlug& array) {
 }
 
 std::vector<double> numbersOf(const HPlug& array) {
+    // which elements there are is known only afterwards
+    requireRead(OpenQuarn::evaluate(array), array);
     std::vector<double> values;
     const std::vector<unsigned> indices = indicesOf(array);
     values.reserve(indices.size());

@@ -1,0 +1,22 @@
+// SPDX-License-Identifier: Apache-2.0
+// The animation of a character as curves of the scene.
+#pragma once
+
+#include "quarn/import/characterScene.h"
+
+namespace quarn {
+
+/// The frame of a time of the file.
+constexpr double frameOf(double seconds, double framesPerSecond) {
+    return 1.0 + seconds * framesPerSecond;
+}
+
+/// A rotation of the file is R * JO in the scene: this R.
+HQuaternion rotateOf(const HQuaternion& rotation, const JointRest& rest);
+
+/// Makes a curve for every track that leaves the rest pose, and connects it into its joint. `rests` are those that the
+/// joints were made of. Returns how many curves there are. Throws std::runtime_error, naming the node. Thread: main.
+std::size_t addAnimation(const Animation& animation, const std::vector<JointRest>& rests, double framesPerSecond,
+                         const CharacterScene& scene);
+
+} // namespace quarn

@@ -1,0 +1,165 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/import/importCharacter.h"
+
+#include "quarn/character/readCharacter.h"
+#include "quarn/character/rootsWarning.h"
+#include "quarn/import/animationCurves.h"
+#include "quarn/import/jsonFiles.h"
+#include "quarn/import/posedJoints.h"
+#include "quarn/import/reparent.h"
+#include "quarn/import/vertexMap.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/plugs.h"
+
+#include <algorithm>
+#include <stdexcept>
+#include <utility>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+void append(std::vector<std::string>& texts, std::vector<std::string>&& more) {
+    texts.insert(texts.end(), std::make_move_iterator(more.begin()), std::make_move_iterator(more.end()));
+}
+
+const Animation* chosenAnimation(const Character& character, const ImportOptions& options) {
+    if (options.noAnimation || (options.animation.empty() && character.animations.empty()))
+        return nullptr;
+    std::string names;
+    for (const Animation& animation : character.animations) {
+        if (options.animation.empty() || animation.name == options.animation)
+            return &animation;
+        names += (names.empty() ? "; it has " : ", ") + animation.name;
+    }
+    throw std::runtime_error(options.file.string() + " has no animation \"" + options.animation + "\"" + names);
+}
+
+// where vertex maps go. `{mesh}` in the name of the scene's attribute stands for the mesh, where there are several
+fs::path mapFile(const fs::path& scene, const std::string& mesh, std::size_t meshCount) {
+    const std::string middle = meshCount > 1 ? "." + mesh : "";
+    return scene.parent_path() / (scene.stem().string() + middle + ".vertices.npy");
+}
+
+void checkOutput(const ImportOptions& options) {
+    std::error_code none;
+    if (fs::equivalent(options.file, options.output, none))
+        throw std::runtime_error(options.output.string() + " is the character itself; name another file for the scene");
+    if (fs::is_directory(options.output))
+        throw std::runtime_error(options.output.string() + " is a folder; name a file for the scene");
+    const fs::path folder = options.output.parent_path();
+    if (!fs::is_directory(folder))
+        throw std::runtime_error("there is no folder " + folder.string() + " for the scene");
+}
+
+class Import {
+public:
+    explicit Import(const ImportOptions& options)
+        : options_(options) {}
+
+    ImportReport run() {
+        readInput();
+        const Animation* animation = chosenAnimation(character_, options_);
+        const std::vector<JointRest> rests = splitRests(character_, animation);
+        const PosedJoints posed = options_.neuralWarp ? choose(rests, animation) : PosedJoints();
+
+        SceneSession session(options_.plugins);
+        const WarpNodes nodes = options_.neuralWarp ? makeWarpNodes(options_.warp) : WarpNodes();
+        CharacterScene scene = buildScene(character_, rests);
+        append(report_.warnings, std::move(scene.notes));
+        if (animation != nullptr)
+            report_.curves = addAnimation(*animation, rests, options_.framesPerSecond, scene);
+        if (options_.neuralWarp)
+            connectWarp(nodes, options_.warp, posed.joints, scene);
+        tellWhatThereIs(scene, posed, animation);
+        writeFiles(session, scene);
+        return std::move(report_);
+    }
+
+private:
+    void readInput() {
+        character_ = readCharacter(options_.file.string());
+        if (!options_.parents.empty())
+            changeParents();
+        report_.warnings = std::exchange(character_.warnings, {});
+        if (options_.metersPerUnit)
+            character_.metersPerUnit = *options_.metersPerUnit;
+        if (!options_.limits.empty())
+            limits_ = readLimits(options_.limits);
+    }
+
+    // what was said of the roots of the file is no longer so
+    void changeParents() {
+        std::vector<std::string>& warnings = character_.warnings;
+        warnings.erase(std::remove(warnings.begin(), warnings.end(), rootsWarning(character_)), warnings.end());
+        reparent(character_, readParents(options_.parents), options_.framesPerSecond);
+        if (std::string warning = rootsWarning(character_); !warning.empty())
+            warnings.push_back(std::move(warning));
+    }
+
+    PosedJoints choose(const std::vector<JointRest>& rests, const Animation* animation) {
+        const LimitMap* limits = options_.limits.empty() ? nullptr : &limits_;
+        PosedJoints posed =
+            choosePosedJoints(character_, rests, {limits, animation, options_.framesPerSecond, options_.withRoots});
+        report_.notes = posed.notes;
+        for (const PosedJoint& joint : posed.joints)
+            report_.poseInputs += static_cast<std::size_t>(std::count_if(
+                joint.limits.begin(), joint.limits.end(), [](const auto& axis) { return axis.has_value(); }));
+        return posed;
+    }
+
+    void tellWhatThereIs(const CharacterScene& scene, const PosedJoints& posed, const Animation* used) {
+        report_.scene = options_.output.string();
+        report_.metersPerUnit = character_.metersPerUnit;
+        for (std::size_t i = 0; i < character_.meshes.size(); ++i)
+            tellMesh(character_.meshes[i], scene.meshes[i]);
+        for (std::size_t i = 0; i < character_.joints.size(); ++i)
+            report_.joints.push_back({character_.joints[i].name, nodeName(scene.joints[i]), false});
+        for (const PosedJoint& joint : posed.joints)
+            report_.joints[joint.joint].posed = true;
+        for (const Animation& animation : character_.animations)
+            report_.animations.push_back({animation.name, animation.seconds, &animation == used});
+    }
+
+    void tellMesh(const CharacterMesh& mesh, const SceneMesh& made) {
+        const std::string node = nodeName(made.mesh);
+        const fs::path map = mapFile(options_.output, node, character_.meshes.size());
+        report_.meshes.push_back({mesh.name, node, made.skin.isNull() ? "" : nodeName(made.skin), mesh.joinedOf.size(),
+                                  mesh.points.size(), mesh.polygonSizes.size(), mesh.bindings.size(),
+                                  map.filename().string()});
+        if (made.skin.isNull() && options_.neuralWarp)
+            report_.notes.push_back("the mesh \"" + mesh.name +
+                                    "\" follows no joint and is no geometry of the deformer");
+    }
+
+    void writeFiles(SceneSession& session, const CharacterScene& scene) {
+        const fs::path folder = options_.output.parent_path();
+        const auto set = [&](const char* attribute, const std::string& text) {
+            setText(plugOf(scene.character, attribute), text);
+        };
+        set("sourceFile", pathForScene(options_.file, folder));
+        set("vertexMapFile", mapFile(options_.output, "{mesh}", character_.meshes.size()).filename().string());
+        setNumber(plugOf(scene.character, "framesPerSecond"), options_.framesPerSecond);
+        for (std::size_t i = 0; i < report_.meshes.size(); ++i)
+            writeVertexMap(folder / report_.meshes[i].vertexMap, character_.meshes[i].joinedOf);
+        session.save(options_.output);
+    }
+
+    const ImportOptions& options_;
+    Character character_;
+    LimitMap limits_;
+    ImportReport report_;
+};
+
+} // namespace
+
+ImportReport importCharacter(const ImportOptions& given) {
+    ImportOptions options = given;
+    for (fs::path* path : {&options.file, &options.output, &options.parents, &options.limits})
+        *path = absolutePath(*path);
+    checkOutput(options);
+    return Import(options).run();
+}
+
+} // namespace quarn

@@ -1,0 +1,73 @@
+// SPDX-License-Identifier: Apache-2.0
+// From a character file to a scene file.
+#pragma once
+
+#include "quarn/console/Console.h"
+#include "quarn/import/warpSetup.h"
+
+#include <filesystem>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+/// What the user has said.
+struct ImportOptions {
+    std::filesystem::path file;
+    std::filesystem::path output;
+    double framesPerSecond = 24.0;
+    std::string animation; ///< by name; empty for the first
+    bool noAnimation = false;
+    std::filesystem::path parents; ///< see readParents(); empty for none
+    std::optional<double> metersPerUnit;
+    bool neuralWarp = false;
+    WarpSettings warp;
+    std::filesystem::path limits; ///< see readLimits(); empty for none
+    bool withRoots = false;
+    std::vector<std::string> plugins;
+};
+
+/// What was made: the names of the character's things, and of the nodes that they are now.
+struct ImportReport {
+    struct Mesh {
+        std::string name;
+        std::string node;
+        std::string skin; ///< empty for a mesh that nothing moves
+        std::size_t fileVertices = 0;
+        std::size_t vertices = 0; ///< after joining
+        std::size_t polygons = 0;
+        std::size_t joints = 0;
+        std::string vertexMap; ///< the file, as the scene names it
+    };
+    struct Joint {
+        std::string name;
+        std::string node;
+        bool posed = false; ///< has controls
+    };
+    struct Animation {
+        std::string name;
+        double seconds = 0.0;
+        bool used = false;
+    };
+    std::string scene;
+    std::vector<Mesh> meshes;
+    std::vector<Joint> joints;
+    std::vector<Animation> animations;
+    std::size_t curves = 0;
+    std::size_t poseInputs = 0; ///< angles that sampling sets; 0 without a deformer
+    double metersPerUnit = 1.0;
+    std::vector<std::string> warnings; ///< sentences without a full stop
+    std::vector<std::string> notes;    ///< the same
+};
+
+/// Reads the file and writes the scene and the vertex maps beside it, each as a whole. Throws std::runtime_error with
+/// the sentence for the user; nothing of the scene is then written. Thread: main, with no session open.
+ImportReport importCharacter(const ImportOptions& options);
+
+/// A line a mesh, then joints, animations and files. Without notes and warnings.
+std::string reportText(const ImportReport& report);
+/// All of it.
+std::string reportJson(const ImportReport& report);
+
+} // namespace quarn

@@ -1,0 +1,94 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/import/warpSetup.h"
+
+#include "quarn/scene/plugs.h"
+
+#include <array>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+// the numbers of matrixConverter's rotationConversion
+double conversionOf(const std::string& controls) {
+    return controls == "euler" ? 0.0 : controls == "quaternion" ? 1.0 : 2.0;
+}
+
+HObject makeAxes(const std::string& controls) {
+    if (controls == "ortho")
+        return createNode("orthoAxisFromMatrixArray", "axes");
+    const HObject axes = createNode("matrixConverter", "axes");
+    setNumber(plugOf(axes, "extractScale"), 0.0);
+    setNumber(plugOf(axes, "extractTranslation"), 0.0);
+    setNumber(plugOf(axes, "rotationConversion"), conversionOf(controls));
+    return axes;
+}
+
+void addGeometry(const WarpNodes& nodes, const WarpSettings& settings, const SceneMesh& mesh, unsigned index) {
+    const auto plug = [&](const std::string& array, const std::string& child) {
+        return plugOf(nodes.warp, array + "[" + std::to_string(index) + "]" + child);
+    };
+    connect(plugOf(mesh.skin, "outputGeom[0]"), plug("input", ".inputGeometry"));
+    connect(plugOf(mesh.mesh, "outMesh"), plug("originalGeometry", ""));
+    const std::string name = nodeName(mesh.mesh);
+    setText(plug("models", ".modelName"), name);
+    setText(plug("export", ".trainingDataName"), name);
+    setText(plug("train", ".outputModelName"), name);
+    setNumber(plug("export", ".deltaMode"), settings.deltaMode == "offset" ? 0.0 : 1.0);
+    if (settings.smoothing)
+        setNumber(plug("export", ".smoothingIterations"), *settings.smoothing);
+}
+
+void addPoses(const HObject& poses, const PosedJoint& posed, const HObject& joint, const std::string& list) {
+    constexpr std::array<const char*, 3> angles = {"rotateX", "rotateY", "rotateZ"};
+    unsigned next = 0;
+    for (std::size_t axis = 0; axis < angles.size(); ++axis) {
+        if (!posed.limits.at(axis))
+            continue;
+        const std::string value = "[" + std::to_string(next++) + "]";
+        connect(plugOf(joint, angles.at(axis)), plugOf(poses, "inputList" + list + ".input" + value));
+        const std::string limits = "limitsList" + list + ".limits" + value;
+        setNumber(plugOf(poses, limits + ".minValue"), posed.limits.at(axis)->first);
+        setNumber(plugOf(poses, limits + ".maxValue"), posed.limits.at(axis)->second);
+        setNumber(plugOf(poses, limits + ".defaultValue"), 0.0);
+    }
+}
+
+} // namespace
+
+WarpNodes makeWarpNodes(const WarpSettings& settings) {
+    WarpNodes nodes;
+    nodes.warp = createNode("neuralWarp", "warp");
+    nodes.poses = createNode("controlCollector", "poses");
+    nodes.axes = makeAxes(settings.controls);
+    nodes.controls = createNode("controlCollector", "controls");
+    return nodes;
+}
+
+void connectWarp(const WarpNodes& nodes, const WarpSettings& settings, const std::vector<PosedJoint>& joints,
+                 const CharacterScene& scene) {
+    unsigned geometries = 0;
+    for (const SceneMesh& mesh : scene.meshes)
+        if (!mesh.skin.isNull())
+            addGeometry(nodes, settings, mesh, geometries++);
+    if (geometries == 0)
+        throw std::runtime_error("no mesh follows a joint, so that there is nothing to set --neural-warp up for");
+    setText(plugOf(nodes.warp, "modelRoot"), settings.modelRoot);
+    setText(plugOf(nodes.warp, "trainingDataRoot"), "data");
+    for (std::size_t i = 0; i < joints.size(); ++i) {
+        const HObject& joint = scene.joints[joints[i].joint];
+        const std::string list = "[" + std::to_string(i) + "]";
+        connect(plugOf(joint, "relativeMatrix"), plugOf(nodes.axes, "input" + list));
+        connect(plugOf(nodes.axes, "outputList" + list + ".output"),
+                plugOf(nodes.controls, "inputList" + list + ".input"));
+        addPoses(nodes.poses, joints[i], joint, list);
+    }
+    connect(plugOf(nodes.controls, "output"), plugOf(nodes.warp, "controlValues"));
+    connect(plugOf(nodes.poses, "message"), plugOf(nodes.warp, "poseGenerator"));
+    if (settings.samples)
+        setNumber(plugOf(nodes.poses, "samples"), *settings.samples);
+    if (settings.activationRate)
+        setNumber(plugOf(nodes.poses, "activationRate"), *settings.activationRate);
+}
+
+} // namespace quarn

@@ -1,0 +1,217 @@
+// SPDX-License-Identifier: Apache-2.0
+// From files to files.
+#include "quarn/import/importCharacter.h"
+
+#include "quarn/character/characterFiles.h"
+#include "quarn/import/ImportTest.h"
+#include "quarn/import/jsonFiles.h"
+#include "quarn/scene/Warp.h"
+#include "support/TemporaryFolder.h"
+
+#include <fstream>
+#include <iterator>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+using testing::ElementsAre;
+using testing::HasSubstr;
+using testing::IsEmpty;
+
+class ImportCharacter : public testing::Test {
+protected:
+    ImportCharacter() {
+        findDeformer();
+        options_.file = write("strip.gltf", Strip().write().text());
+        options_.output = path("scene.json");
+    }
+
+    fs::path path(const std::string& name) const { return folder_.path() / name; }
+    fs::path write(const std::string& name, const std::string& text) const {
+        std::ofstream(path(name), std::ios::binary) << text;
+        return path(name);
+    }
+    /// The scene's file may be elsewhere by now.
+    static std::vector<double> points(const std::string& plug) {
+        std::vector<double> xyz;
+        readPoints(findPlug(plug), xyz);
+        return xyz;
+    }
+
+    ImportOptions options_;
+
+private:
+    TemporaryFolder folder_;
+};
+
+// "lower" turns by a right angle about z within a second
+void turnLower(GltfWriter& file) {
+    const std::size_t times = file.floats("SCALAR", {0, 1});
+    const std::size_t turns = file.floats("VEC4", {0, 0, 0, 1, 0, 0, 0.70710678F, 0.70710678F});
+    file.animations = {R"({"name":"wave","samplers":[{"input":)" + std::to_string(times) +
+                       ",\"output\":" + std::to_string(turns) +
+                       R"(}],"channels":[{"sampler":0,"target":{"node":1,"path":"rotation"}}]})"};
+}
+
+std::vector<std::uint32_t> mapOf(const fs::path& file) {
+    std::ifstream stream(file, std::ios::binary);
+    const std::string bytes(std::istreambuf_iterator<char>(stream), {});
+    std::vector<std::uint32_t> map;
+    for (std::size_t at = 128; at + 4 <= bytes.size(); at += 4)
+        map.push_back(static_cast<unsigned char>(bytes[at]));
+    return map;
+}
+
+TEST_F(ImportCharacter, AFolderWithTheSceneCanBeMoved) {
+    Strip strip;
+    strip.more = turnLower;
+    fs::create_directory(path("before"));
+    options_.file = write("before/arm.gltf", strip.write().text());
+    options_.output = path("before/arm.json");
+    options_.framesPerSecond = 10.0;
+    options_.neuralWarp = true;
+    options_.withRoots = true;
+    const ImportReport report = importCharacter(options_);
+    EXPECT_THAT(report.warnings, IsEmpty());
+    EXPECT_EQ(report.curves, 1U);
+    EXPECT_EQ(report.poseInputs, 1U);
+    EXPECT_EQ(report.meshes.at(0).fileVertices, 8U);
+    EXPECT_EQ(report.meshes.at(0).vertices, 6U);
+    fs::rename(path("before"), path("after"));
+
+    SceneSession session(SceneOptions{path("after/arm.json"), {}, 0});
+    session.host().setTime(11.0);
+    // the far end is at 2, 0 and 2, 1 at rest, and turns about 1, 0
+    EXPECT_THAT(points("arm_skin.outputGeom[0]"),
+                testing::Pointwise(testing::DoubleNear(1e-6),
+                                   {0., 0., 0., 1., 0., 0., .5, .5, 0., 0., 1., 0., 1., 1., 0., 0., 1., 0.}));
+    EXPECT_EQ(textOf(findPlug("character.sourceFile")), "arm.gltf");
+    EXPECT_EQ(numberOf(findPlug("character.framesPerSecond")), 10.0);
+    EXPECT_THAT(mapOf(textOf(findPlug("character.vertexMapFile"))), ElementsAre(0, 1, 2, 3, 1, 4, 5, 2));
+}
+
+TEST_F(ImportCharacter, SetsADeformerUp) {
+    options_.neuralWarp = true;
+    options_.limits = write("limits.json", R"({"lower": {"rotateY": [-180, 90], "rotateZ": [0, 45.0]}, "upper": {}})");
+    options_.warp.samples = 77;
+    options_.warp.deltaMode = "offset";
+    options_.warp.smoothing = 4;
+    for (const char* controls : {"double-axis", "ortho", "quaternion", "euler"}) {
+        SCOPED_TRACE(controls);
+        options_.warp.controls = controls;
+        const bool isEuler = options_.warp.controls == "euler";
+        const bool isQuaternion = options_.warp.controls == "quaternion";
+        EXPECT_EQ(importCharacter(options_).poseInputs, 2U);
+
+        const SceneSession session(SceneOptions{options_.output, {}, 0});
+        const Warp warp = Warp::find();
+        EXPECT_EQ(warp.name, "warp");
+        ASSERT_EQ(warp.geometries.size(), 1U);
+        EXPECT_EQ(warp.geometries[0].name, "arm");
+        EXPECT_STREQ(warp.geometries[0].input.name().asChar(), "arm_skin.outputGeom[0]");
+        EXPECT_EQ(textOf(warp.plug("models[0].modelName")), "arm");
+        EXPECT_EQ(textOf(warp.plug("modelRoot")), "models");
+        EXPECT_EQ(numberOf(warp.plug("export[0].deltaMode")), 0.0);
+        EXPECT_EQ(numberOf(warp.plug("export[0].smoothingIterations")), 4.0);
+        EXPECT_EQ(nodeName(warp.plug("poseGenerator").source().node()), "poses");
+        EXPECT_EQ(numberOf(findPlug("poses.samples")), 77.0);
+        EXPECT_EQ(findPlug("poses.inputList[0].input[1]").source(), findPlug("lower.rotateZ"));
+        EXPECT_NEAR(numberOf(findPlug("poses.limitsList[0].limits[0].minValue")), -3.14159265, 1e-8);
+
+        setNumber(findPlug("lower.rotateZ"), 0.5);
+        const double c = std::cos(0.5);
+        const double s = std::sin(0.5);
+        const std::vector<double> axes{c, s, 0.0, -s, c, 0.0};
+        const std::vector<double> quaternion{0.0, 0.0, std::sin(0.25), std::cos(0.25)};
+        const std::vector<double> wanted = isEuler ? std::vector{0.0, 0.0, 0.5} : isQuaternion ? quaternion : axes;
+        EXPECT_THAT(numbersOf(findPlug("warp.controlValues")),
+                    testing::ElementsAreArray(numbersOf(findPlug("controls.output"))));
+        EXPECT_THAT(numbersOf(findPlug("controls.output")), testing::Pointwise(testing::DoubleNear(1e-12), wanted));
+    }
+}
+
+// names of the file that the scene's own nodes have, or that no node may have, and a mesh that stays where it is
+TEST_F(ImportCharacter, SeveralMeshesAndOddNames) {
+    Strip strip;
+    strip.upper = R"({"name":"warp","children":[1]})";
+    strip.lower = R"({"translation":[1,0,0]})";
+    strip.mesh = R"({"name":"1 arm/é","mesh":0,"skin":0})";
+    strip.more = [](GltfWriter& file) {
+        file.nodes.push_back(R"({"name":"controls","mesh":0,"skin":0})");
+        file.nodes.push_back(R"({"name":"table","mesh":1,"translation":[0,3,0]})");
+        file.meshes.push_back(R"({"primitives":[{"attributes":{"POSITION":0},"indices":1}]})");
+        file.roots = "0,2,3,4";
+    };
+    options_.file = write("odd.gltf", strip.write().text());
+    options_.neuralWarp = true;
+    const ImportReport report = importCharacter(options_);
+    EXPECT_THAT(report.notes,
+                testing::Contains("the mesh \"table\" follows no joint and is no geometry of the deformer"));
+    EXPECT_EQ(report.joints.at(0).node, "warp1");
+    EXPECT_EQ(report.meshes.at(0).node, "_1_arm___");
+    EXPECT_EQ(report.meshes.at(1).node, "controls1");
+    EXPECT_THAT(mapOf(path("scene.table.vertices.npy")), ElementsAre(0, 1, 2, 3, 1, 4, 5, 2));
+
+    const SceneSession session(SceneOptions{options_.output, {}, 0});
+    EXPECT_EQ(textOf(findPlug("character.vertexMapFile")), "scene.{mesh}.vertices.npy");
+    EXPECT_EQ(Warp::find().geometries.at(1).name, "controls1");
+    EXPECT_EQ(points("table.outMesh")[1], 3.0);
+    EXPECT_EQ(points("_1_arm____skin.outputGeom[0]"), points("_1_arm___.outMesh"));
+}
+
+TEST_F(ImportCharacter, ParentsMendASkeletonInPieces) {
+    Strip strip;
+    strip.upper = R"({"name":"upper"})";
+    strip.more = [](GltfWriter& file) { file.roots = "0,1,2"; };
+    options_.file = write("flat.gltf", strip.write().text());
+    EXPECT_THAT(importCharacter(options_).warnings, ElementsAre(HasSubstr("2 roots")));
+    options_.parents = write("parents.json", R"({"lower": "upper"})");
+    EXPECT_THAT(importCharacter(options_).warnings, IsEmpty());
+    const SceneSession session(SceneOptions{options_.output, {}, 0});
+    EXPECT_EQ(numberOf(findPlug("lower.translateX")), 1.0);
+    EXPECT_STREQ(findPlug("lower.parentMatrix").source().name().asChar(), "upper.worldMatrix");
+}
+
+TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
+    const auto refused = [&](const std::string& why, const std::function<void(ImportOptions&)>& change) {
+        ImportOptions options = options_;
+        change(options);
+        EXPECT_THAT(errorOf([&] { importCharacter(options); }), HasSubstr(why));
+        EXPECT_FALSE(fs::exists(path("scene.json")));
+    };
+    refused("strip.gltf has no animation \"run\"", [](ImportOptions& options) { options.animation = "run"; });
+    refused("no such file", [&](ImportOptions& options) { options.file = path("none.glb"); });
+    refused("is the character itself", [&](ImportOptions& options) { options.output = options.file; });
+    refused("there is no folder", [&](ImportOptions& options) { options.output = path("none/scene.json"); });
+    refused("is a folder", [&](ImportOptions& options) { options.output = path("."); });
+    refused("no joint is left", [&](ImportOptions& options) {
+        options.file = write("table.gltf", [] {
+            GltfWriter file = Strip().write();
+            file.nodes = {R"({"name":"table","mesh":0})"};
+            file.roots = "0";
+            file.skins.clear();
+            return file.text();
+        }());
+        options.neuralWarp = true;
+    });
+}
+
+TEST_F(ImportCharacter, DamagedJsonFilesAreRefusedByName) {
+    const auto parents = [&](const std::string& text) { return errorOf([&] { readParents(write("p.json", text)); }); };
+    const auto limits = [&](const std::string& text) { return errorOf([&] { readLimits(write("l.json", text)); }); };
+    EXPECT_THAT(parents("{\n\"a\": \"b\",\n}"), HasSubstr("p.json: line 3: "));
+    EXPECT_THAT(parents("[]"), HasSubstr("holds no JSON object"));
+    EXPECT_THAT(parents(""), HasSubstr("line 1"));
+    EXPECT_THAT(parents(R"({"a": 1})"), HasSubstr("\"a\": its parent is not a text"));
+    EXPECT_THAT(parents(R"({"a": "b", "a": "c"})"), HasSubstr("\"a\": the joint stands twice"));
+    EXPECT_THAT(errorOf([&] { readParents(path("none.json")); }), HasSubstr("none.json: cannot be read"));
+    EXPECT_THAT(limits(R"({"a": []})"), HasSubstr("\"a\": not an object of axes"));
+    EXPECT_THAT(limits(R"({"a": {"rotatex": [0, 1]}})"), HasSubstr("\"rotatex\" is not one of"));
+    EXPECT_THAT(limits(R"({"a": {"rotateX": [0, 1, 2]}})"), HasSubstr("rotateX is not [least, largest]"));
+    EXPECT_THAT(limits(R"({"a": {"rotateX": [10, 10]}})"), HasSubstr("rotateX: the first of the two"));
+    EXPECT_THAT(limits(R"({"a": {"rotateX": [0, NaN]}})"), HasSubstr("line 1"));
+}
+
+} // namespace
+} // namespace quarn
