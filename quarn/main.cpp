@@ -20,6 +20,8 @@ int run(int argc, char** argv) {
     quarn::addExecCommand(app);
     quarn::addInfoCommand(app);
     quarn::addListAttrCommand(app);
+    quarn::addPoseCommand(app);
+    quarn::addTargetCommand(app);
 
     try {
         app.parse(argc, argv);

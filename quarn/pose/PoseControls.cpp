@@ -1,0 +1,141 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/pose/PoseControls.h"
+
+#include "openquarn/HFnAttribute.h"
+#include "quarn/scene/plugs.h"
+
+#include <cmath>
+#include <map>
+#include <sstream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+constexpr const char* collectorType = "controlCollector";
+
+std::string element(const std::string& array, unsigned index) {
+    return array + "[" + std::to_string(index) + "]";
+}
+
+// plugs that something is wrong with, for one sentence
+class Complaints {
+public:
+    void add(const std::string& what) {
+        constexpr std::size_t most = 10;
+        if (++count_ <= most)
+            text_ += (text_.empty() ? "" : "; ") + what;
+    }
+    void throwIfAny(const std::string& beginning) const {
+        const std::string more = count_ > 10 ? "; and " + std::to_string(count_ - 10) + " more" : "";
+        if (count_ > 0)
+            throw std::runtime_error(beginning + ": " + text_ + more);
+    }
+
+private:
+    std::size_t count_ = 0;
+    std::string text_;
+};
+
+std::string number(double value) {
+    std::ostringstream text;
+    text.imbue(std::locale::classic());
+    text << value;
+    return text.str();
+}
+
+std::string whatIsWrong(const ValueLimits& limits) {
+    if (!std::isfinite(limits.least) || !std::isfinite(limits.most) || !std::isfinite(limits.rest))
+        return "are not finite";
+    if (limits.least > limits.most)
+        return "are in the wrong order";
+    return std::isfinite(limits.most - limits.least) ? "" : "are too far apart";
+}
+
+ValueLimits limitsOf(const HObject& collector, unsigned list, unsigned value, Complaints& complaints) {
+    const std::string path = element(element("limitsList", list) + ".limits", value);
+    ValueLimits limits;
+    limits.least = numberOf(plugOf(collector, path + ".minValue"));
+    limits.most = numberOf(plugOf(collector, path + ".maxValue"));
+    limits.rest = numberOf(plugOf(collector, path + ".defaultValue"));
+    if (const std::string wrong = whatIsWrong(limits); !wrong.empty())
+        complaints.add(nodeName(collector) + "." + path + " " + wrong + ": " + number(limits.least) + " to " +
+                       number(limits.most) + ", default " + number(limits.rest));
+    return limits;
+}
+
+void checkSource(const PoseControl& control, std::map<std::string, std::string>& inputBySource, Complaints& problems) {
+    if (control.plug.isNull()) {
+        problems.add(control.input + " has no source");
+        return;
+    }
+    const std::string source = control.plug.name().asChar();
+    if (const std::string why = whyNotKeyable(control.plug); !why.empty())
+        problems.add(source + " (into " + control.input + ") " + why);
+    if (const auto [known, isNew] = inputBySource.emplace(source, control.input); !isNew)
+        problems.add(source + " is the source of both " + known->second + " and " + control.input);
+}
+
+HObject collectorAt(const HPlug& source) {
+    const bool fits = !source.isNull() && nodeType(source.node()) == collectorType;
+    return fits ? source.node() : HObject();
+}
+
+} // namespace
+
+HObject poseCollector(const Warp& warp) {
+    if (const HPlug generator = warp.plug("poseGenerator").source(); !generator.isNull()) {
+        const HObject collector = collectorAt(generator);
+        if (collector.isNull())
+            throw std::runtime_error(std::string(generator.name().asChar()) + " is connected into " + warp.name +
+                                     ".poseGenerator, and is no " + collectorType);
+        return collector;
+    }
+    const HPlug values = warp.plug("controlValues");
+    HObject collector = collectorAt(values.source());
+    for (const unsigned index : indicesOf(values))
+        if (collector.isNull())
+            collector = collectorAt(values.elementByLogicalIndex(index).source());
+    if (collector.isNull())
+        throw std::runtime_error(warp.name + " has no controls to sample: connect the message of a " + collectorType +
+                                 " into " + warp.name + ".poseGenerator");
+    return collector;
+}
+
+std::string whyNotKeyable(const HPlug& plug) {
+    const HFnAttribute attribute(plug.attribute());
+    if (plug.isArray() || !plug.attribute().hasFn(HFn::kNumericAttribute))
+        return "is no number";
+    if (!attribute.isWritable())
+        return "is an output";
+    if (!attribute.isConnectable())
+        return "cannot be connected into";
+    for (HPlug place = plug; !place.isNull(); place = place.isElement() ? place.array()
+                                                      : place.isChild() ? place.parent()
+                                                                        : HPlug())
+        if (place.isLocked())
+            return place == plug ? "is locked" : "is locked, as a part of " + std::string(place.name().asChar());
+    return {};
+}
+
+std::vector<PoseControl> poseControls(const HObject& collector) {
+    std::vector<PoseControl> controls;
+    std::map<std::string, std::string> inputBySource;
+    Complaints sources;
+    Complaints limits;
+    for (const unsigned list : indicesOf(plugOf(collector, "inputList")))
+        for (const unsigned value : indicesOf(plugOf(collector, element("inputList", list) + ".input"))) {
+            const HPlug input = plugOf(collector, element(element("inputList", list) + ".input", value));
+            controls.push_back({input.name().asChar(), input.source(), limitsOf(collector, list, value, limits)});
+            checkSource(controls.back(), inputBySource, sources);
+        }
+    const std::string name = nodeName(collector);
+    if (controls.empty())
+        throw std::runtime_error(name + " collects nothing: connect the plugs to sample into " + name +
+                                 ".inputList[0].input[0] and so on");
+    sources.throwIfAny("the controls of " + name + " cannot be sampled");
+    limits.throwIfAny("the limits of " + name + " cannot be used");
+    return controls;
+}
+
+} // namespace quarn

@@ -1,0 +1,31 @@
+// SPDX-License-Identifier: Apache-2.0
+// The values of a rig that are sampled: what a controlCollector collects, with the plugs that they come from.
+#pragma once
+
+#include "quarn/pose/PoseSet.h"
+#include "quarn/scene/Warp.h"
+
+#include <string>
+
+namespace quarn {
+
+/// One value of a collector.
+struct PoseControl {
+    std::string input; ///< name of the collector's plug
+    HPlug plug;        ///< connected into it: set or keyed
+    ValueLimits limits;
+};
+
+/// The collector that is connected into the deformer's poseGenerator, or else the one that feeds its controlValues.
+/// Throws std::runtime_error, with what to connect, when there is none. Thread: main.
+HObject poseCollector(const Warp& warp);
+
+/// All values of the collector in its order. Throws std::runtime_error, naming the plugs, when there are none; when one
+/// has no source, or one that keys cannot be put on; when a source is there twice; and for limits that are in the wrong
+/// order or not finite. Thread: main.
+std::vector<PoseControl> poseControls(const HObject& collector);
+
+/// Why no keys can be put on the plug, as in "is locked"; empty when they can. Thread: main.
+std::string whyNotKeyable(const HPlug& plug);
+
+} // namespace quarn

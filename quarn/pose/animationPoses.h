@@ -1,0 +1,30 @@
+// SPDX-License-Identifier: Apache-2.0
+// Poses out of the scene's own animation.
+#pragma once
+
+#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/frames.h"
+
+#include <functional>
+
+namespace quarn {
+
+/// From the first to the last key of all curves of the scene that drive something, but for those of an earlier
+/// sampling. Throws std::runtime_error when there are none. Thread: main.
+FrameRange animationExtent();
+
+/// What became of the frames.
+struct AnimationPoses {
+    std::size_t dropped = 0;  ///< frames whose pose was near one of the set
+    std::size_t outside = 0;  ///< frames with a value outside of its limits
+    std::string firstOutside; ///< the plug of the first of those
+};
+
+/// Adds the pose of each frame to the set, whose values are those of `controls`; the scene stays as it is. `step` is
+/// called after each frame, and may throw. Throws std::runtime_error, naming plug and frame, when a plug cannot be
+/// evaluated or gives no finite number, and when a plug has keys of an earlier sampling: then its animation is gone.
+/// Thread: main.
+AnimationPoses addAnimationPoses(PoseSet& poses, const std::vector<PoseControl>& controls, const FrameRange& frames,
+                                 const std::function<void(std::size_t)>& step);
+
+} // namespace quarn

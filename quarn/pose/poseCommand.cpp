@@ -1,0 +1,174 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/commands.h"
+
+#include "quarn/console/interrupt.h"
+#include "quarn/console/json.h"
+#include "quarn/pose/keyPoses.h"
+#include "quarn/pose/samplePoses.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/plugs.h"
+
+#include <CLI/CLI.hpp>
+
+#include <cmath>
+#include <iostream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+struct Options {
+    SceneOptions scene;
+    std::filesystem::path output;
+    std::string deformer;
+    SampleOptions sampling;
+    std::string from = "limits";
+    std::filesystem::path keys;
+    std::string others = "rest";
+    Console console;
+};
+
+void writeCount(JsonWriter& writer, const char* key, std::size_t count) {
+    writer.Key(key);
+    writer.Uint64(count);
+}
+
+void writeFrames(JsonWriter& writer, int first, int last) {
+    writer.Key("firstFrame");
+    writer.Int(first);
+    writer.Key("lastFrame");
+    writer.Int(last);
+}
+
+std::string frames(int first, int last) {
+    return "frames " + std::to_string(first) + "-" + std::to_string(last);
+}
+
+void printJson(const SampleReport& report, const Options& options) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeText(writer, "scene", options.output.string());
+    writeText(writer, "collector", report.collector);
+    writeCount(writer, "poses", report.poses);
+    writeCount(writer, "values", report.values);
+    writeCount(writer, "fromLimits", report.fromLimits);
+    writeCount(writer, "fromAnimation", report.fromAnimation);
+    writeCount(writer, "drawnAgain", report.drawnAgain);
+    writeCount(writer, "framesLeftOut", report.framesLeftOut);
+    writeBool(writer, "complete", !report.asked);
+    writer.Key("seed");
+    writer.Uint64(options.sampling.seed);
+    writeFrames(writer, report.firstFrame, report.lastFrame);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void printText(const SampleReport& report) {
+    std::cout << report.poses << " poses of " << report.values << " values in "
+              << frames(report.firstFrame, report.lastFrame) << ": " << report.fromLimits
+              << " from limits, the default pose included, " << report.fromAnimation << " from animation; "
+              << report.drawnAgain << " drawn again and " << report.framesLeftOut
+              << " frames left out, being near another\n";
+}
+
+void printJson(const KeysReport& report, const Options& options) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeText(writer, "scene", options.output.string());
+    writeCount(writer, "plugs", report.plugs);
+    writeCount(writer, "keys", report.keys);
+    writeCount(writer, "held", report.held);
+    writeFrames(writer, report.firstFrame, report.lastFrame);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void printText(const KeysReport& report) {
+    std::cout << report.keys << " keys on " << report.plugs << " plugs in "
+              << frames(report.firstFrame, report.lastFrame) << "; " << report.held
+              << " other controls held at their defaults\n";
+}
+
+template <class Report>
+void print(const Report& report, const Options& options) {
+    if (options.console.json)
+        printJson(report, options);
+    else
+        printText(report);
+}
+
+void sample(SceneSession& session, Options& options) {
+    options.sampling.fromLimits = options.from != "animation";
+    options.sampling.fromAnimation = options.from != "limits";
+    if (!options.sampling.fromAnimation && !options.sampling.frames.empty())
+        throw std::runtime_error("--frames chooses frames of the animation: add --from animation or --from both");
+    if (!options.sampling.fromLimits && (options.sampling.samples || options.sampling.activationRate))
+        throw std::runtime_error("--samples and --activation-rate are for poses from limits: use --from both");
+    if (!std::isfinite(options.sampling.tolerance) || options.sampling.tolerance < 0.0)
+        throw std::runtime_error("--tolerance is a finite number from 0 on");
+    const SampleReport report = samplePoses(Warp::find(options.deformer), options.sampling, options.console);
+    session.save(options.output);
+    print(report, options);
+}
+
+void key(SceneSession& session, const Options& options) {
+    const bool hasWarp = !options.deformer.empty() || !nodesOfType("neuralWarp").empty();
+    const std::optional<Warp> warp = hasWarp ? std::optional(Warp::find(options.deformer)) : std::nullopt;
+    const KeysReport report = keyPoses(warp, readKeys(options.keys), options.others == "rest");
+    session.save(options.output);
+    print(report, options);
+}
+
+void pose(Options& options) {
+    watchForInterrupt();
+    options.output = absolutePath(options.output);
+    options.keys = absolutePath(options.keys);
+    SceneSession session(options.scene);
+    if (options.keys.empty())
+        sample(session, options);
+    else
+        key(session, options);
+}
+
+void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& keys) {
+    SampleOptions& sampling = options.sampling;
+    const std::initializer_list<CLI::Option*> added = {
+        command.add_option("--samples", sampling.samples, "Poses to draw; the collector's samples when not given"),
+        command.add_option("--activation-rate", sampling.activationRate,
+                           "How likely a value leaves its default, 0 to 1; the collector's when not given"),
+        command.add_option("--start", sampling.start,
+                           "Frame of the first pose; the collector's samplesStartFrame when not given"),
+        command.add_option("--seed", sampling.seed, "Another seed gives other poses")->capture_default_str(),
+        command.add_option("--from", options.from, "Where poses come from: limits, animation or both")
+            ->check(CLI::IsMember({"limits", "animation", "both"}))
+            ->capture_default_str(),
+        command.add_option("--frames", sampling.frames, "Frames of the animation, as 1-100 or 1-100x5; all by default"),
+        command
+            .add_option("--tolerance", sampling.tolerance,
+                        "Poses that differ by less, in parts of the range of each value, count as one")
+            ->capture_default_str()};
+    for (CLI::Option* option : added)
+        option->excludes(&keys);
+}
+
+} // namespace
+
+void addPoseCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand("pose", "Sample poses of a rig, or put poses made by hand on it");
+    addSceneOptions(*command, options->scene);
+    command->add_option("-o,--output", options->output, "The scene to write")->required();
+    command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
+    CLI::Option* keys = command->add_option("--keys", options->keys, "Poses made by hand: a JSON file with keys");
+    command->add_option("--others", options->others, "With --keys, controls without keys: rest or keep")
+        ->check(CLI::IsMember({"rest", "keep"}))
+        ->needs(keys)
+        ->capture_default_str();
+    addSamplingOptions(*command, *options, *keys);
+    addConsoleOptions(*command, options->console, true);
+    command->callback([options] { pose(*options); });
+}
+
+} // namespace quarn

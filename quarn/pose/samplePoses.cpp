@@ -1,0 +1,156 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/pose/samplePoses.h"
+
+#include "quarn/pose/animationPoses.h"
+#include "quarn/pose/drawPoses.h"
+#include "quarn/pose/poseKeys.h"
+#include "quarn/scene/plugs.h"
+
+#include <numeric>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+constexpr int largestFrame = 100'000'000;
+constexpr std::size_t mostPoses = 1'000'000;
+constexpr std::size_t mostNumbers = 100'000'000; // 800 MB
+
+DrawSettings drawSettings(const HObject& collector, const SampleOptions& options) {
+    const HPlug samples = plugOf(collector, "samples");
+    const HPlug rate = plugOf(collector, "activationRate");
+    const int count = options.samples ? *options.samples : wholeNumberOf(samples);
+    const double likely = options.activationRate ? *options.activationRate : numberOf(rate);
+    if (count < 1 || static_cast<std::size_t>(count) > mostPoses)
+        throw std::runtime_error("the number of samples is " + std::to_string(count) + ": 1 to " +
+                                 std::to_string(mostPoses) + " poses can be drawn");
+    if (!(likely >= 0.0 && likely <= 1.0))
+        throw std::runtime_error("the activation rate is " + std::to_string(likely) + ", not from 0 to 1");
+    if (options.samples)
+        setNumber(samples, count);
+    if (options.activationRate)
+        setNumber(rate, likely);
+    return {static_cast<std::size_t>(count), likely, options.seed};
+}
+
+int firstFrame(const HObject& collector, const SampleOptions& options) {
+    const HPlug start = plugOf(collector, "samplesStartFrame");
+    const int frame = options.start ? *options.start : wholeNumberOf(start);
+    if (frame > largestFrame || frame < -largestFrame)
+        throw std::runtime_error("the first frame is " + std::to_string(frame) + ", more than " +
+                                 std::to_string(largestFrame) + " from frame 0");
+    if (options.start)
+        setNumber(start, frame);
+    return frame;
+}
+
+void requireRoom(std::size_t poses, std::size_t values) {
+    if (poses > mostPoses || poses > mostNumbers / values)
+        throw std::runtime_error(std::to_string(poses) + " poses of " + std::to_string(values) +
+                                 " values are too many: at most " + std::to_string(mostPoses) + " poses and " +
+                                 std::to_string(mostNumbers) + " numbers can be made");
+}
+
+std::vector<ValueLimits> limitsOf(const std::vector<PoseControl>& controls) {
+    std::vector<ValueLimits> limits;
+    limits.reserve(controls.size());
+    for (const PoseControl& control : controls)
+        limits.push_back(control.limits);
+    return limits;
+}
+
+void addDefaultPose(PoseSet& poses) {
+    std::vector<double> rest;
+    rest.reserve(poses.limits().size());
+    for (const ValueLimits& limits : poses.limits())
+        rest.push_back(limits.rest);
+    poses.add(rest);
+}
+
+void draw(PoseSet& poses, const HObject& collector, const SampleOptions& options, const Console& console,
+          SampleReport& report) {
+    const DrawSettings settings = drawSettings(collector, options);
+    requireRoom(settings.count, poses.limits().size());
+    Progress progress(console, "drawing poses", settings.count);
+    progress.advance(poses.count());
+    report.drawnAgain = drawPoses(poses, settings, [&](std::size_t steps) { progress.advance(steps); });
+    if (poses.count() < settings.count)
+        report.asked = settings.count;
+}
+
+void takeFromAnimation(PoseSet& poses, const std::vector<PoseControl>& controls, const SampleOptions& options,
+                       const Console& console, SampleReport& report) {
+    const FrameRange frames = options.frames.empty() ? animationExtent() : frameRange(options.frames);
+    requireRoom(poses.count() + frames.count(), controls.size());
+    Progress progress(console, "taking poses from the animation", frames.count());
+    const AnimationPoses taken =
+        addAnimationPoses(poses, controls, frames, [&](std::size_t steps) { progress.advance(steps); });
+    report.framesLeftOut = taken.dropped;
+    if (taken.outside > 0)
+        console.warn(std::to_string(taken.outside) + " frames of the animation go beyond the limits, the first with " +
+                     taken.firstOutside + "; their poses are taken as they are");
+}
+
+void warnOfFew(const Console& console, const SampleReport& report, const SampleOptions& options) {
+    if (report.asked)
+        console.warn(std::to_string(report.fromLimits) + " poses were found, not " + std::to_string(*report.asked) +
+                     ": " + std::to_string(drawsInVain) + " draws in a row gave poses that differ by less than " +
+                     std::to_string(options.tolerance) + " of the range of each value from one that there is. Raise " +
+                     "the activation rate, widen the limits or lower --tolerance");
+}
+
+void warnOfDefaults(const Console& console, const std::vector<PoseControl>& controls) {
+    for (const PoseControl& control : controls)
+        if (control.limits.rest < control.limits.least || control.limits.rest > control.limits.most)
+            console.warn("the default of " + control.input + " lies outside of its limits");
+}
+
+// keys go on only when all is known, so that an error changes nothing
+void putKeys(const PoseSet& poses, const std::vector<PoseControl>& controls, int firstFrame) {
+    removePoseKeys();
+    PoseKeys keys;
+    keys.times.resize(poses.count());
+    std::iota(keys.times.begin(), keys.times.end(), static_cast<double>(firstFrame));
+    for (std::size_t i = 0; i < controls.size(); ++i) {
+        keys.values = poses.track(i);
+        putPoseKeys(controls[i].plug, keys);
+    }
+}
+
+void noteWhatStillMoves(const Console& console) {
+    const std::vector<HObject> curves = animationCurves();
+    if (!curves.empty())
+        console.note(std::to_string(curves.size()) + (curves.size() == 1 ? " curve" : " curves") +
+                     " of the scene's animation still drive what is not sampled, " + nodeName(curves.front()) +
+                     (curves.size() == 1 ? "" : " among them"));
+}
+
+} // namespace
+
+SampleReport samplePoses(const Warp& warp, const SampleOptions& options, const Console& console) {
+    const HObject collector = poseCollector(warp);
+    const std::vector<PoseControl> controls = poseControls(collector);
+    warnOfDefaults(console, controls);
+    PoseSet poses(limitsOf(controls), options.tolerance);
+    SampleReport report;
+    report.collector = nodeName(collector);
+    report.values = controls.size();
+    report.firstFrame = firstFrame(collector, options);
+    addDefaultPose(poses);
+    if (options.fromLimits)
+        draw(poses, collector, options, console, report);
+    report.fromLimits = poses.count();
+    warnOfFew(console, report, options);
+    if (options.fromAnimation)
+        takeFromAnimation(poses, controls, options, console, report);
+    report.poses = poses.count();
+    report.fromAnimation = report.poses - report.fromLimits;
+    report.lastFrame = report.firstFrame + static_cast<int>(report.poses) - 1;
+    putKeys(poses, controls, report.firstFrame);
+    setNumber(warp.plug("exportStartFrame"), report.firstFrame);
+    setNumber(warp.plug("exportEndFrame"), report.lastFrame);
+    noteWhatStillMoves(console);
+    return report;
+}
+
+} // namespace quarn

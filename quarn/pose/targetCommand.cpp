@@ -1,0 +1,182 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/commands.h"
+
+#include "quarn/console/interrupt.h"
+#include "quarn/console/json.h"
+#include "quarn/pose/sceneOrder.h"
+#include "quarn/pose/targetCache.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/meshes.h"
+#include "quarn/scene/plugs.h"
+#include "rig/NpyFile.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <cmath>
+#include <iostream>
+#include <sstream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+struct Options {
+    SceneOptions scene;
+    fs::path output;
+    fs::path cache;
+    std::string deformer;
+    std::string geometry;
+    std::optional<double> startFrame;
+    std::string order = "scene";
+    Console console;
+};
+
+// the cache that the scene plays
+struct Cache {
+    fs::path path;
+    std::size_t frames = 0;
+    bool converted = false;
+};
+
+std::string number(double value) {
+    std::ostringstream text;
+    text.imbue(std::locale::classic());
+    text << value;
+    return text.str();
+}
+
+double diagonalOf(const HPlug& mesh) {
+    std::vector<double> xyz;
+    readPoints(mesh, xyz);
+    double squares = 0.0;
+    for (std::size_t axis = 0; axis < 3 && xyz.size() > axis; ++axis) {
+        double least = xyz[axis];
+        double most = least;
+        for (std::size_t i = axis; i < xyz.size(); i += 3) {
+            least = std::min(least, xyz[i]);
+            most = std::max(most, xyz[i]);
+        }
+        squares += (most - least) * (most - least);
+    }
+    return std::sqrt(squares);
+}
+
+std::vector<std::int32_t> characterVertexMap() {
+    for (const HObject& character : nodesOfType("character"))
+        if (const std::string file = textOf(plugOf(character, "vertexMapFile")); !file.empty())
+            return readVertexMap(fs::absolute(file)); // from the scene's folder, which is the current one
+    throw std::runtime_error("--order file needs the vertex map that quarn import writes: the scene has no node of "
+                             "type character with a vertexMapFile");
+}
+
+// beside the output, named after both, so that caches of two meshes or scenes do not meet
+fs::path pathOfConverted(const Options& options, const WarpGeometry& geometry) {
+    fs::path path = options.output;
+    path.replace_filename(options.output.stem().string() + "." + geometry.name + "_target.npy");
+    std::error_code missing;
+    if (path == options.cache || fs::equivalent(path, options.cache, missing))
+        throw std::runtime_error(path.string() + " would be overwritten by its own conversion: give the cache in the " +
+                                 "file's order another name");
+    return path;
+}
+
+Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpGeometry& geometry,
+                   std::size_t vertices) {
+    const std::vector<std::int32_t> map = characterVertexMap();
+    requireFit(map, file.vertexCount(), vertices);
+    const Cache cache{pathOfConverted(options, geometry), file.frameCount(), true};
+    const double apart = writeInSceneOrder(options.cache, cache.path, map, vertices, options.console);
+    constexpr double agrees = 1e-5; // of the mesh's size: what single precision and a solver's noise give
+    if (apart > agrees * diagonalOf(restMesh(geometry)))
+        options.console.warn("vertices of the cache that are one vertex of " + geometry.name + " are up to " +
+                             number(apart) + " apart; the first of each was taken");
+    return cache;
+}
+
+Cache fittingCache(const Options& options, const WarpGeometry& geometry) {
+    const rig::NpyFile file(options.cache.string());
+    const std::size_t vertices = polygonsOf(restMesh(geometry)).vertexCount;
+    if (file.frameCount() == 0)
+        throw std::runtime_error(options.cache.string() + " has no frames");
+    if (options.order == "file")
+        return inSceneOrder(file, options, geometry, vertices);
+    if (file.vertexCount() != vertices)
+        throw std::runtime_error(options.cache.string() + " has " + std::to_string(file.vertexCount()) +
+                                 " vertices, and " + geometry.name + " has " + std::to_string(vertices) +
+                                 "; --order file takes a cache with the vertices of the character's file");
+    return {options.cache, file.frameCount(), false};
+}
+
+void warnOfShortCache(const Options& options, const Warp& warp, double startFrame, std::size_t frames) {
+    const int first = wholeNumberOf(warp.plug("exportStartFrame"));
+    const int last = wholeNumberOf(warp.plug("exportEndFrame"));
+    const double lastOfCache = startFrame + static_cast<double>(frames) - 1.0;
+    if (startFrame > first || lastOfCache < last)
+        options.console.warn("the cache covers frames " + number(startFrame) + "-" + number(lastOfCache) + ", and " +
+                             warp.name + " exports frames " + std::to_string(first) + "-" + std::to_string(last) +
+                             ": its first and last frames are held beyond");
+}
+
+void printJson(const TargetReport& report, const Cache& cache, const Options& options, const std::string& geometry) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeText(writer, "scene", options.output.string());
+    writeText(writer, "geometry", geometry);
+    writeText(writer, "target", report.node);
+    writeText(writer, "cache", cache.path.string());
+    writeBool(writer, "converted", cache.converted);
+    writeBool(writer, "replaced", report.replaced);
+    writer.Key("frames");
+    writer.Uint64(cache.frames);
+    writer.Key("startFrame");
+    writer.Double(report.startFrame);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void target(Options& options) {
+    watchForInterrupt();
+    options.cache = absolutePath(options.cache);
+    options.output = absolutePath(options.output.empty() ? options.scene.scene : options.output);
+    if (options.startFrame && !std::isfinite(*options.startFrame))
+        throw std::runtime_error("--start-frame is a finite number");
+    SceneSession session(options.scene);
+    const Warp warp = Warp::find(options.deformer);
+    const WarpGeometry& geometry = warp.geometry(options.geometry);
+    const Cache cache = fittingCache(options, geometry);
+    const std::string named = pathForScene(cache.path, options.output.parent_path());
+    const TargetReport report = connectTarget(warp, geometry, named, options.startFrame);
+    session.save(options.output);
+    warnOfShortCache(options, warp, report.startFrame, cache.frames);
+    if (options.console.json)
+        printJson(report, cache, options, geometry.name);
+    else
+        std::cout << report.node << " plays " << cache.frames << " frames of " << cache.path.string() << " from frame "
+                  << number(report.startFrame) << " on as the target of " << geometry.name
+                  << (report.replaced ? ", instead of an earlier target\n" : "\n");
+}
+
+} // namespace
+
+void addTargetCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand("target", "Make a point cache the target of a deformer");
+    addSceneOptions(*command, options->scene);
+    command->add_option("--cache", options->cache, "The points: an .npy of [frames, vertices, 3]")->required();
+    command->add_option("-o,--output", options->output, "The scene to write; SCENE itself when not given");
+    command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
+    command->add_option("--geometry", options->geometry, "Index or mesh of the geometry, where there are several");
+    command->add_option("--start-frame", options->startFrame,
+                        "Time of the cache's first frame; the deformer's exportStartFrame when not given");
+    command->add_option("--order", options->order, "Whose vertices the cache has: of the scene's mesh, or of the file")
+        ->check(CLI::IsMember({"scene", "file"}))
+        ->capture_default_str();
+    addConsoleOptions(*command, options->console, true);
+    command->callback([options] { target(*options); });
+}
+
+} // namespace quarn
