@@ -67,11 +67,12 @@ void addFilesLike(const std::string& pattern, HStringArray& files) {
 HStringArray characterNode::getFilesToArchive(bool shortName, bool unresolvedName, bool markSequence) const {
     const HStringArray texts = HPxNode::getFilesToArchive(shortName, unresolvedName, markSequence);
     HStringArray files;
-    for (unsigned i = 0; i < texts.length(); ++i)
-        if (const std::string text = texts[i].asStdString(); unresolvedName || !isPattern(text))
-            files.append(texts[i]);
+    for (const HString& text : texts) {
+        if (unresolvedName || !isPattern(text.asStdString()))
+            files.append(text);
         else
-            addFilesLike(text, files);
+            addFilesLike(text.asStdString(), files);
+    }
     return files;
 }
 
