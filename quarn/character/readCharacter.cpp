@@ -6,6 +6,7 @@
 #include "quarn/character/importerLog.h"
 #include "quarn/character/prepareGltf.h"
 #include "quarn/character/skinnedMeshes.h"
+#include "quarn/character/transfer.h"
 #include "quarn/character/trialProcess.h"
 
 #include <assimp/BaseImporter.h>
@@ -126,9 +127,8 @@ Character readFile(const std::string& path) {
     if (isGltf(ending))
         bytes = prepareGltf(bytes, hints);
 
-    // the importer does not check all that it is given, so what it does with this file is found out at a safe distance
-    runTrial([&] { importFile(path, ending, bytes, hints); });
-    return importFile(path, ending, bytes, hints);
+    // the importer does not check all that it is given: it works at a safe distance, and only its result comes here
+    return unpackCharacter(runTrial([&] { return packCharacter(importFile(path, ending, bytes, hints)); }));
 }
 
 } // namespace

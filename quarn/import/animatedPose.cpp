@@ -4,9 +4,12 @@
 #include "quarn/import/restPose.h"
 
 #include <algorithm>
+#include <stdexcept>
 
 namespace quarn {
 namespace {
+
+constexpr double mostFrames = 100000.0; // more than an hour: a time of the file is wrong
 
 HVector between(const HVector& from, const HVector& to, double t) {
     return from * (1.0 - t) + to * t;
@@ -83,6 +86,8 @@ std::vector<HMatrix> AnimatedPose::worlds(double seconds) const {
 }
 
 std::vector<double> sampleTimes(const Animation& animation, double framesPerSecond) {
+    if (animation.seconds * framesPerSecond > mostFrames)
+        throw std::runtime_error("the animation \"" + animation.name + "\" is more than 100000 frames long");
     std::vector<double> times;
     for (const JointChannel& channel : animation.channels) {
         addTimes(channel.translation, times);

@@ -30,6 +30,7 @@ HVector valueAt(const Track<HVector>& track, double seconds);
 HQuaternion valueAt(const Track<HQuaternion>& track, double seconds);
 
 /// When an animation has a key, and every frame of it: rising, each once. `framesPerSecond` above 0.
+/// Throws std::runtime_error, naming the animation, when it is longer than 100000 frames.
 std::vector<double> sampleTimes(const Animation& animation, double framesPerSecond);
 
 } // namespace quarn

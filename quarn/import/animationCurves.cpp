@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <stdexcept>
 
 namespace quarn {
 namespace {
@@ -41,7 +42,7 @@ std::vector<Key<Value>> framesOf(const Track<Value>& track, double framesPerSeco
 
 HObject makeCurve(const char* type, const std::string& name, Interpolation interpolation,
                   const std::vector<double>& times, const std::vector<double>& values) {
-    const HObject curve = createNode(type, name);
+    HObject curve = createNode(type, name);
     setList(plugOf(curve, "keyTimes"), times);
     setList(plugOf(curve, "keyValues"), values);
     setNumber(plugOf(curve, "interpolation"), interpolation == Interpolation::Step ? 0.0 : 1.0);
@@ -108,6 +109,8 @@ HQuaternion rotateOf(const HQuaternion& rotation, const JointRest& rest) {
 
 std::size_t addAnimation(const Animation& animation, const std::vector<JointRest>& rests, double framesPerSecond,
                          const CharacterScene& scene) {
+    if (!std::isfinite(frameOf(animation.seconds, framesPerSecond)))
+        throw std::runtime_error("the animation \"" + animation.name + "\" has no last frame at this frame rate");
     std::size_t made = 0;
     for (const JointChannel& channel : animation.channels) {
         const HObject& joint = scene.joints[channel.joint];

@@ -20,7 +20,7 @@ void setVector(const HObject& node, const std::string& attribute, const HVector&
 }
 
 HObject makeJoint(const std::string& name, const JointRest& rest) {
-    const HObject node = createNode("joint", name);
+    HObject node = createNode("joint", name);
     const HEulerRotation orient = rest.orient.asEulerRotation();
     setVector(node, "translate", rest.translate);
     setVector(node, "jointOrient", {orient.x, orient.y, orient.z});
@@ -66,7 +66,7 @@ HObject makeMesh(const CharacterMesh& mesh, const HMatrix& toScene) {
         const HPoint placed = point * toScene;
         xyz.insert(xyz.end(), {placed.x, placed.y, placed.z});
     }
-    const HObject node = createNode("mesh", mesh.name);
+    HObject node = createNode("mesh", mesh.name);
     HPlug inMesh = plugOf(node, "inMesh");
     const HStatus status = inMesh.setHObject(meshData(xyz, polygonsOf(mesh, toScene.det3x3() < 0.0)));
     if (status.error())
@@ -75,7 +75,7 @@ HObject makeMesh(const CharacterMesh& mesh, const HMatrix& toScene) {
 }
 
 HObject makeSkin(const SkinBinding& binding, const HObject& mesh, const CharacterScene& scene) {
-    const HObject skin = createNode("skinCluster", nodeName(mesh) + "_skin");
+    HObject skin = createNode("skinCluster", nodeName(mesh) + "_skin");
     connect(plugOf(mesh, "outMesh"), plugOf(skin, "input[0].inputGeometry"));
     for (std::size_t k = 0; k < binding.joints.size(); ++k) {
         const std::string element = "[" + std::to_string(k) + "]";

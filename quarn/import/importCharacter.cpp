@@ -25,7 +25,7 @@ void append(std::vector<std::string>& texts, std::vector<std::string>&& more) {
 }
 
 const Animation* chosenAnimation(const Character& character, const ImportOptions& options) {
-    if (options.noAnimation || (options.animation.empty() && character.animations.empty()))
+    if (options.animation.empty() && character.animations.empty())
         return nullptr;
     std::string names;
     for (const Animation& animation : character.animations) {
@@ -68,11 +68,11 @@ public:
         const WarpNodes nodes = options_.neuralWarp ? makeWarpNodes(options_.warp) : WarpNodes();
         CharacterScene scene = buildScene(character_, rests);
         append(report_.warnings, std::move(scene.notes));
-        if (animation != nullptr)
+        if (animation != nullptr && !options_.noAnimation)
             report_.curves = addAnimation(*animation, rests, options_.framesPerSecond, scene);
         if (options_.neuralWarp)
             connectWarp(nodes, options_.warp, posed.joints, scene);
-        tellWhatThereIs(scene, posed, animation);
+        tellWhatThereIs(scene, posed, options_.noAnimation ? nullptr : animation);
         writeFiles(session, scene);
         return std::move(report_);
     }

@@ -17,8 +17,8 @@ struct ImportOptions {
     std::filesystem::path file;
     std::filesystem::path output;
     double framesPerSecond = 24.0;
-    std::string animation; ///< by name; empty for the first
-    bool noAnimation = false;
+    std::string animation;         ///< by name; empty for the first
+    bool noAnimation = false;      ///< no curves; limits of poses still come from `animation`
     std::filesystem::path parents; ///< see readParents(); empty for none
     std::optional<double> metersPerUnit;
     bool neuralWarp = false;

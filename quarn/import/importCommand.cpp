@@ -27,10 +27,8 @@ void addFiles(CLI::App& command, Options& options) {
 
 void addAnimationFlags(CLI::App& command, Options& options) {
     command.add_option("--fps", options.framesPerSecond, "Frames of a second")->capture_default_str();
-    CLI::Option* name =
-        command.add_option("--animation", options.animation, "The animation to take; default the first")
-            ->type_name("NAME");
-    command.add_flag("--no-animation", options.noAnimation, "Take none")->excludes(name);
+    command.add_option("--animation", options.animation, "The animation to take; default the first")->type_name("NAME");
+    command.add_flag("--no-animation", options.noAnimation, "No curves; limits of poses still come from the animation");
 }
 
 void addWarpFlags(CLI::App& command, Options& options) {

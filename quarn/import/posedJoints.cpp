@@ -80,7 +80,7 @@ std::vector<JointLimits> animatedLimits(const Character& character, const std::v
 }
 
 std::vector<JointLimits> limitsOf(const Character& character, const std::vector<JointRest>& rests,
-                                  const PoseChoice& choice) {
+                                  const PoseChoice& choice, std::vector<std::string>& notes) {
     std::vector<JointLimits> limits(character.joints.size());
     if (choice.limits != nullptr) {
         for (const auto& [name, ranges] : *choice.limits)
@@ -88,11 +88,14 @@ std::vector<JointLimits> limitsOf(const Character& character, const std::vector<
         return limits;
     }
     limits = animatedLimits(character, rests, choice);
-    if (std::none_of(limits.begin(), limits.end(), isAny)) {
-        JointLimits both;
-        both.fill(std::pair(-defaultRange, defaultRange));
-        limits.assign(limits.size(), both);
+    if (std::any_of(limits.begin(), limits.end(), isAny)) {
+        notes.push_back("limits of the poses: the range of the animation \"" + choice.animation->name + "\"");
+        return limits;
     }
+    notes.emplace_back("limits of the poses: 30 degrees to both sides of every axis");
+    JointLimits both;
+    both.fill(std::pair(-defaultRange, defaultRange));
+    limits.assign(limits.size(), both);
     return limits;
 }
 
@@ -122,14 +125,14 @@ private:
 
 PosedJoints choosePosedJoints(const Character& character, const std::vector<JointRest>& rests,
                               const PoseChoice& choice) {
-    const std::vector<JointLimits> limits = limitsOf(character, rests, choice);
+    PosedJoints posed;
+    const std::vector<JointLimits> limits = limitsOf(character, rests, choice, posed.notes);
     const std::vector<bool> moves = movingJoints(character);
     const std::vector<bool> places = placingJoints(character);
     LeftOut still("that move no vertex");
     LeftOut roots("that place the character (--with-roots keeps them)");
     LeftOut unturned(choice.limits != nullptr ? "without limits" : "that the animation does not turn");
     LeftOut flat("with a scale of 0 at rest");
-    PosedJoints posed;
     for (std::size_t joint = 0; joint < limits.size(); ++joint) {
         const std::string& name = character.joints[joint].name;
         const bool isAsked = choice.withRoots || (choice.limits != nullptr && choice.limits->count(name) > 0);

@@ -25,7 +25,7 @@ struct PoseChoice {
 
 struct PosedJoints {
     std::vector<PosedJoint> joints; ///< by rising index
-    std::vector<std::string> notes; ///< which were left out, and why
+    std::vector<std::string> notes; ///< where limits come from; which joints were left out, and why
 };
 
 /// The joints whose turning a deformer has to know of. Limits are the user's, who also chooses the joints by them; or

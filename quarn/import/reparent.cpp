@@ -30,25 +30,30 @@ std::vector<int> changedParents(const Character& character, const ParentMap& map
     return parents;
 }
 
+// from a joint up to, and without, the first that is placed already; ends with the topmost
+std::vector<std::uint32_t> chainOf(std::uint32_t joint, const Character& character, const std::vector<int>& parents,
+                                   const std::vector<bool>& placed) {
+    std::vector<std::uint32_t> chain;
+    for (int at = static_cast<int>(joint); at >= 0 && !placed[static_cast<std::size_t>(at)];
+         at = parents[static_cast<std::size_t>(at)]) {
+        if (chain.size() == parents.size())
+            throw std::runtime_error("the joint " + quoted(character.joints[static_cast<std::size_t>(at)].name) +
+                                     " would hang below itself");
+        chain.push_back(static_cast<std::uint32_t>(at));
+    }
+    return chain;
+}
+
 // parents first, and otherwise as they were
 std::vector<std::uint32_t> hierarchyOrder(const Character& character, const std::vector<int>& parents) {
     std::vector<std::uint32_t> order;
     std::vector<bool> placed(parents.size(), false);
     order.reserve(parents.size());
-    std::vector<std::uint32_t> chain;
     for (std::uint32_t joint = 0; joint < parents.size(); ++joint) {
-        chain.clear();
-        for (int at = static_cast<int>(joint); at >= 0 && !placed[static_cast<std::size_t>(at)];
-             at = parents[static_cast<std::size_t>(at)]) {
-            if (chain.size() == parents.size())
-                throw std::runtime_error("the joint " + quoted(character.joints[static_cast<std::size_t>(at)].name) +
-                                         " would hang below itself");
-            chain.push_back(static_cast<std::uint32_t>(at));
-        }
-        for (auto above = chain.rbegin(); above != chain.rend(); ++above) {
-            placed[*above] = true;
-            order.push_back(*above);
-        }
+        const std::vector<std::uint32_t> chain = chainOf(joint, character, parents, placed);
+        order.insert(order.end(), chain.rbegin(), chain.rend());
+        for (const std::uint32_t each : chain)
+            placed[each] = true;
     }
     return order;
 }

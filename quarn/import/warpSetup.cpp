@@ -17,7 +17,7 @@ double conversionOf(const std::string& controls) {
 HObject makeAxes(const std::string& controls) {
     if (controls == "ortho")
         return createNode("orthoAxisFromMatrixArray", "axes");
-    const HObject axes = createNode("matrixConverter", "axes");
+    HObject axes = createNode("matrixConverter", "axes");
     setNumber(plugOf(axes, "extractScale"), 0.0);
     setNumber(plugOf(axes, "extractTranslation"), 0.0);
     setNumber(plugOf(axes, "rotationConversion"), conversionOf(controls));

@@ -3,6 +3,11 @@
 
 #include "rig/AttributeMaker.h"
 
+#include <filesystem>
+#include <string>
+#include <string_view>
+#include <system_error>
+
 namespace rig {
 
 const HTypeId characterNode::id(0x6e770022);
@@ -32,9 +37,49 @@ HStatus characterNode::initialize() {
     return make.status();
 }
 
+namespace {
+
+constexpr std::string_view meshPlace = "{mesh}";
+
+bool isPattern(const std::string& text) {
+    return text.find(meshPlace) != std::string::npos;
+}
+
+/// The files that are called like the pattern with any text in place of the mesh's name.
+void addFilesLike(const std::string& pattern, HStringArray& files) {
+    const std::filesystem::path path(pattern);
+    const std::string name = path.filename().string();
+    const std::size_t place = name.find(meshPlace);
+    if (place == std::string::npos)
+        return;
+    const std::string_view begin = std::string_view(name).substr(0, place);
+    const std::string_view end = std::string_view(name).substr(place + meshPlace.size());
+    std::error_code none;
+    for (const auto& entry : std::filesystem::directory_iterator(path.parent_path(), none)) {
+        const std::string file = entry.path().filename().string();
+        if (file.size() > begin.size() + end.size() && file.starts_with(begin) && file.ends_with(end))
+            files.append(entry.path().c_str());
+    }
+}
+
+} // namespace
+
+HStringArray characterNode::getFilesToArchive(bool shortName, bool unresolvedName, bool markSequence) const {
+    const HStringArray texts = HPxNode::getFilesToArchive(shortName, unresolvedName, markSequence);
+    HStringArray files;
+    for (const HString& text : texts) {
+        if (unresolvedName || !isPattern(text.asStdString()))
+            files.append(text);
+        else
+            addFilesLike(text.asStdString(), files);
+    }
+    return files;
+}
+
 void characterNode::getExternalContent(HExternalContentInfoTable& table) const {
     addExternalContentForFileAttr(table, sourceFile);
-    addExternalContentForFileAttr(table, vertexMapFile);
+    if (!isPattern(HPlug(thisHObject(), vertexMapFile).asString().asStdString())) // which is no file
+        addExternalContentForFileAttr(table, vertexMapFile);
     HPxNode::getExternalContent(table);
 }
 

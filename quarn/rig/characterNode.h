@@ -19,7 +19,11 @@ public:
     characterNode();
     ~characterNode() override;
 
-    /// The two files can be found, and moved, by the table of external files. [main]
+    /// A vertexMapFile with "{mesh}" in it stands for all files whose names have something in this place. [main]
+    HStringArray getFilesToArchive(bool shortName = false, bool unresolvedName = false,
+                                   bool markCouldBeImageSequence = false) const override;
+    /// The two files can be found, and moved, by the table of external files; but not a vertexMapFile with "{mesh}".
+    /// [main]
     void getExternalContent(HExternalContentInfoTable& table) const override;
     void setExternalContent(const HExternalContentLocationTable& table) override;
 

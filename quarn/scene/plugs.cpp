@@ -41,7 +41,7 @@ std::string usableName(std::string name) {
 
 HObject createNode(const std::string& type, const std::string& name) {
     HStatus status;
-    const HObject node = HFnDependencyNode().create(type.c_str(), usableName(name).c_str(), &status);
+    HObject node = HFnDependencyNode().create(type.c_str(), usableName(name).c_str(), &status);
     require(status, "a node of type " + type + " could not be made");
     return node;
 }

@@ -2,6 +2,7 @@
 // From files to files.
 #include "quarn/import/importCharacter.h"
 
+#include "openquarn_app/SceneFile.h"
 #include "quarn/character/characterFiles.h"
 #include "quarn/import/ImportTest.h"
 #include "quarn/import/jsonFiles.h"
@@ -76,11 +77,16 @@ TEST_F(ImportCharacter, AFolderWithTheSceneCanBeMoved) {
     EXPECT_THAT(report.warnings, IsEmpty());
     EXPECT_EQ(report.curves, 1U);
     EXPECT_EQ(report.poseInputs, 1U);
+    options_.noAnimation = true;
+    options_.output = path("before/still.json");
+    EXPECT_EQ(importCharacter(options_).curves, 0U);
     EXPECT_EQ(report.meshes.at(0).fileVertices, 8U);
     EXPECT_EQ(report.meshes.at(0).vertices, 6U);
     fs::rename(path("before"), path("after"));
 
     SceneSession session(SceneOptions{path("after/arm.json"), {}, 0});
+    EXPECT_THAT(OpenQuarn::filesToArchive(),
+                testing::IsSupersetOf({path("after/arm.gltf").string(), path("after/arm.vertices.npy").string()}));
     session.host().setTime(11.0);
     // the far end is at 2, 0 and 2, 1 at rest, and turns about 1, 0
     EXPECT_THAT(points("arm_skin.outputGeom[0]"),
@@ -155,6 +161,9 @@ TEST_F(ImportCharacter, SeveralMeshesAndOddNames) {
 
     const SceneSession session(SceneOptions{options_.output, {}, 0});
     EXPECT_EQ(textOf(findPlug("character.vertexMapFile")), "scene.{mesh}.vertices.npy");
+    EXPECT_THAT(OpenQuarn::filesToArchive(),
+                testing::AllOf(testing::Contains(path("scene.table.vertices.npy").string()),
+                               testing::Not(testing::Contains(HasSubstr("{mesh}")))));
     EXPECT_EQ(Warp::find().geometries.at(1).name, "controls1");
     EXPECT_EQ(points("table.outMesh")[1], 3.0);
     EXPECT_EQ(points("_1_arm____skin.outputGeom[0]"), points("_1_arm___.outMesh"));

@@ -81,11 +81,12 @@ TEST(PosedJoints, ThoseLeftOutAreTold) {
     const Character character = leg();
     const Animation animation = bending();
     EXPECT_THAT(choosePosedJoints(character, splitRests(character, nullptr), {}).notes,
-                ElementsAre("no controls of joints that move no vertex: toe",
+                ElementsAre(HasSubstr("30 degrees"), "no controls of joints that move no vertex: toe",
                             HasSubstr("--with-roots keeps them): root"),
                             "no controls of joints with a scale of 0 at rest: prop"));
     EXPECT_THAT(choosePosedJoints(character, splitRests(character, nullptr), {nullptr, &animation, 24.0, true}).notes,
-                testing::Contains("no controls of joints that the animation does not turn: root, prop"));
+                testing::IsSupersetOf({"limits of the poses: the range of the animation \"bend\"",
+                                       "no controls of joints that the animation does not turn: root, prop"}));
 }
 
 } // namespace

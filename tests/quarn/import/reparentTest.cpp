@@ -69,6 +69,9 @@ TEST(Reparent, WhatCannotBeIsRefusedByName) {
     refused({{"joint1", "none"}}, HasSubstr("no joint \"none\""));
     refused({{"joint1", "joint1"}}, HasSubstr("\"joint1\" would hang below itself"));
     refused({{"joint1", "joint2"}, {"joint2", "joint4"}, {"joint4", "joint1"}}, HasSubstr("would hang below itself"));
+    Character endless = randomCharacter(1, {6, true, true, true});
+    endless.animations[0].seconds = 1e12;
+    EXPECT_THAT(errorOf([&] { reparent(endless, chain, testFrameRate); }), HasSubstr("\"dance\" is more than"));
     refused({{"joint1", "joint3"}}, HasSubstr("nothing can hang below the joint \"joint3\""));
 }
 

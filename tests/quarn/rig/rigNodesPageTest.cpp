@@ -21,7 +21,7 @@ protected:
 };
 
 TEST_F(RigNodesPage, NamesEveryAttribute) {
-    for (const std::string type : {"joint", "skinCluster", "animCurve", "animCurveQuaternion"}) {
+    for (const std::string type : {"joint", "skinCluster", "animCurve", "animCurveQuaternion", "character"}) {
         const std::string text = page.str();
         const std::size_t from = text.find("\n## " + type + '\n');
         ASSERT_NE(from, std::string::npos) << type;
@@ -37,7 +37,7 @@ TEST_F(RigNodesPage, NamesEveryAttribute) {
 }
 
 TEST_F(RigNodesPage, ExamplesGiveWhatItSays) {
-    EXPECT_GE(comparePageExamples(page, [&](const std::string& line) { return run(line); }), 6);
+    EXPECT_GE(comparePageExamples(page, [&](const std::string& line) { return run(line); }), 7);
 }
 
 } // namespace

@@ -1,0 +1,77 @@
+// SPDX-License-Identifier: Apache-2.0
+// How a character comes over from the process that the importer may crash.
+#include "quarn/character/transfer.h"
+
+#include "quarn/character/characterFiles.h"
+#include "quarn/character/trialProcess.h"
+
+#include <gmock/gmock.h>
+
+#include <cstdlib>
+#include <new>
+
+namespace quarn {
+namespace {
+
+Character moving() {
+    Character character = read(Strip().write());
+    JointChannel channel;
+    channel.joint = 1;
+    channel.rotation.interpolation = Interpolation::Step;
+    channel.rotation.keys = {{0.5, HQuaternion(1.0, {0, 0, 1})}};
+    character.animations.push_back({"wave", 0.5, {channel}});
+    character.warnings.emplace_back("something is odd");
+    return character;
+}
+
+TEST(Transfer, ACharacterComesOverAsItIs) {
+    const Character before = moving();
+    const Character after = unpackCharacter(packCharacter(before));
+    EXPECT_EQ(packCharacter(after), packCharacter(before));
+    EXPECT_EQ(after.meshes.at(0).points, before.meshes[0].points);
+    EXPECT_EQ(after.meshes[0].influences.at(1).at(1).weight, before.meshes[0].influences[1][1].weight);
+    EXPECT_EQ(after.joints.at(1).restTransform, before.joints[1].restTransform);
+    EXPECT_EQ(after.animations.at(0).channels.at(0).rotation.keys.at(0).value,
+              before.animations[0].channels[0].rotation.keys[0].value);
+    EXPECT_EQ(after.warnings, before.warnings);
+}
+
+// every byte changed, and every length: refused, or a character that says just that
+TEST(Transfer, DamagedBytesDoNoHarm) {
+    const std::string sound = packCharacter(moving());
+    for (std::size_t length = 0; length < sound.size(); ++length)
+        EXPECT_THROW(unpackCharacter(sound.substr(0, length)), std::runtime_error) << length;
+    EXPECT_THROW(unpackCharacter(sound + '\0'), std::runtime_error);
+    std::size_t refused = 0;
+    for (std::size_t at = 0; at < sound.size(); ++at)
+        for (const char change : {'\x01', '\x7f', '\xff'}) {
+            std::string damaged = sound;
+            damaged[at] = static_cast<char>(damaged[at] ^ change);
+            try {
+                EXPECT_EQ(packCharacter(unpackCharacter(damaged)), damaged) << at;
+            } catch (const std::runtime_error&) {
+                ++refused;
+            }
+        }
+    EXPECT_GT(refused, sound.size() / 2); // sizes and indices; the rest are numbers and letters
+}
+
+TEST(TrialProcess, GivesWhatTheActionGivesAndSurvivesIt) {
+    const std::string large(3000000, 'x');
+    EXPECT_EQ(runTrial([&] { return large; }), large);
+    EXPECT_EQ(runTrial([] { return std::string(); }), "");
+    EXPECT_THROW(runTrial([]() -> std::string { throw std::bad_alloc(); }), std::bad_alloc);
+    const auto errorOf = [](const std::function<std::string()>& action) {
+        try {
+            return "no error: " + runTrial(action);
+        } catch (const std::runtime_error& error) {
+            return std::string(error.what());
+        }
+    };
+    EXPECT_EQ(errorOf([]() -> std::string { throw std::runtime_error("a reason"); }), "a reason");
+    EXPECT_THAT(errorOf([]() -> std::string { std::abort(); }), testing::HasSubstr("does not survive"));
+    EXPECT_THAT(errorOf([]() -> std::string { std::_Exit(0); }), testing::HasSubstr("does not survive"));
+}
+
+} // namespace
+} // namespace quarn

@@ -1,0 +1,47 @@
+#!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# import.sh QUARN: what the command line of quarn import takes, and what it writes to which stream.
+set -euo pipefail
+quarn=$1
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+bad=0
+
+# expect STATUS OUT-PATTERN ERR-PATTERN ARGS...: patterns are regular expressions, "" for an empty stream
+expect() {
+  local status=0 wanted=$1 out=$2 err=$3
+  shift 3
+  "$quarn" import "$@" >"$work/out" 2>"$work/err" || status=$?
+  if [[ $status != "$wanted" ]] || ! fits "$out" "$work/out" || ! fits "$err" "$work/err"; then
+    printf 'quarn import %s: status %s, not %s, or the streams do not fit /%s/ and /%s/:\n' "$*" "$status" "$wanted" "$out" "$err"
+    cat "$work/out" "$work/err"
+    bad=1
+  fi
+}
+fits() { if [[ $1 ]]; then grep -Pqz -- "$1" "$2"; else [[ ! -s $2 ]]; fi; }
+
+# a triangle that joint "bone" moves, below "root"
+cd "$work"
+buffer=AAAAAAAAAAAAAAAAAACAPwAAAAAAAAAAAAAAAAAAgD8AAAAAAAAAAAAAAAAAAAAAAACAPwAAAAAAAAAAAAAAAAAAgD8AAAAAAAAAAAAAAAAAAIA/AAAAAAAAAAAAAAAA
+cat >bone.gltf <<EOF
+{"asset":{"version":"2.0"},"scene":0,"scenes":[{"nodes":[0,2]}],
+"nodes":[{"name":"root","translation":[0,1,0],"children":[1]},{"name":"bone"},{"name":"skin","mesh":0,"skin":0}],
+"meshes":[{"primitives":[{"attributes":{"POSITION":0,"JOINTS_0":1,"WEIGHTS_0":2}}]}],"skins":[{"joints":[1,0]}],
+"buffers":[{"byteLength":96,"uri":"data:application/octet-stream;base64,$buffer"}],
+"bufferViews":[{"buffer":0,"byteLength":36},{"buffer":0,"byteOffset":36,"byteLength":12},
+{"buffer":0,"byteOffset":48,"byteLength":48}],
+"accessors":[{"bufferView":0,"componentType":5126,"count":3,"type":"VEC3"},
+{"bufferView":1,"componentType":5121,"count":3,"type":"VEC4"},
+{"bufferView":2,"componentType":5126,"count":3,"type":"VEC4"}]}
+EOF
+expect 0 'mesh skin: 3 vertices in the file, joined to 3; 1 polygons(.|\n)*scene .*/bone\.json\n$' '' bone.gltf -o bone.json
+expect 0 '"poseInputs": 3(.|\n)*"notes": \[\n' '(?s)place the character.*: root' bone.gltf -o bone.json --neural-warp --json
+expect 0 'deformer warp: 6 angles' '' bone.gltf -o bone.json --neural-warp --with-roots -q
+expect 1 '' '^quarn: .*none\.glb: no such file\n$' none.glb -o bone.json
+expect 1 '' '^quarn: --fps must be a number above 0\n$' bone.gltf -o bone.json --fps 0
+expect 1 '' '^quarn: --meters-per-unit must be' bone.gltf -o bone.json --meters-per-unit -1
+expect 106 '' '--output is required' bone.gltf
+expect 107 '' '--limits requires --neural-warp' bone.gltf -o bone.json --limits limits.json
+expect 105 '' '--controls' bone.gltf -o bone.json --neural-warp --controls axis
+[[ $(ls) == $'bone.gltf\nbone.json\nbone.vertices.npy\nerr\nout' ]] || { ls; bad=1; }
+exit $bad
