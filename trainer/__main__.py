@@ -91,14 +91,15 @@ def add_settings(group):
 # --- the commands ---
 
 def command_train(options):
+    if not 0 <= options.seed < 2**32:
+        raise TrainerError(f"--seed is {options.seed}, not a whole number from 0 to {2**32 - 1}")
+    pin_threads(options.threads)
     from trainer import evaluator, pipeline
     from trainer.dataset import load_dataset
     from trainer.measure import as_lines
     from trainer.settings import KINDS, override
 
     say = speaker(options)
-    if options.seed < 0 or not 1 <= options.threads <= 256:
-        raise TrainerError(f"the seed is {options.seed} and threads are {options.threads}: they are from 0, and 1 to 256")
     quarn = evaluator.find_quarn(options.quarn)
     dataset = load_dataset(options.dataset)
     changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
@@ -112,6 +113,14 @@ def command_train(options):
     say(f"wrote {model} and {report}")
     if options.json:
         print(json.dumps(result, indent=1))
+
+
+def pin_threads(count):
+    """Before NumPy is loaded: its libraries take their threads from the environment, and sums depend on them."""
+    if not 1 <= count <= 256:
+        raise TrainerError(f"--threads is {count}, not a whole number from 1 to 256")
+    for name in ("OPENBLAS_NUM_THREADS", "OMP_NUM_THREADS", "MKL_NUM_THREADS"):
+        os.environ[name] = str(count)
 
 
 def output_path(options, settings):
@@ -206,11 +215,17 @@ def main():
         return complain(f"Python's {error.name} is missing in {sys.executable}: install it (Debian: "
                         f"{' '.join(PACKAGES.values())}), or choose another Python")
     except (OSError, MemoryError) as error:
-        return complain(error if isinstance(error, OSError) and str(error) else "there is not enough memory")
+        return complain(reason_of(error))
     except KeyboardInterrupt:
         return 130
     except Terminated:
         return 143
+
+
+def reason_of(error):
+    if isinstance(error, MemoryError):
+        return "there is not enough memory"
+    return f"{error.filename}: {error.strerror}" if error.strerror and error.filename else error
 
 
 def complain(error):

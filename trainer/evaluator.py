@@ -111,7 +111,9 @@ class ModelDirectory:
             self.shapes = None
             if shapes.exists():
                 self.shapes = np.array(json.loads(shapes.read_bytes())["principalShapes"], np.float32)
-        except (OSError, ValueError, KeyError) as error:
+        except FileNotFoundError as error:
+            raise TrainerError(f"{folder} is not a model directory: it has no metadata.json") from error
+        except (OSError, ValueError, KeyError, TypeError) as error:
             raise TrainerError(f"{folder} is not a model directory: {error}") from error
         if not isinstance(self.metadata, dict) or (self.shapes is not None and self.shapes.ndim != 2):
             raise TrainerError(f"{folder} is not a model directory: a file in it is of another form")
