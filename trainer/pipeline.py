@@ -3,6 +3,7 @@
 
 import sys
 import time
+from contextlib import contextmanager
 from dataclasses import dataclass
 
 import numpy as np
@@ -130,16 +131,25 @@ def train_network(job, targets, split):
     job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
             f"{len(split[0])} frames, validating on {len(split[1])}")
     network = build(settings, dataset.control_count, targets.count, normalisation.still)
-    shown = job.progress and sys.stderr.isatty()
-    with tqdm(total=settings.epochs, unit="epoch", disable=not shown, leave=False) as bar:
-        def on_epoch(history):
-            bar.set_postfix(loss=f"{history.train[-1]:.2e}", best=f"{history.best_loss:.2e}", refresh=False)
-            bar.update()
-
+    with progress_bar(settings.epochs, job.progress and sys.stderr.isatty()) as on_epoch:
         history = fit(network, normalisation.normalised(dataset.controls), targets.of, split, settings, job.seed,
                       on_epoch)
     job.say(f"{len(history.train)} epochs, the best is {history.best_epoch} with a loss of {history.best_loss:.3e}")
     return network, normalisation, history
+
+
+@contextmanager
+def progress_bar(epochs, shown):
+    """Gives what fit() calls after each epoch."""
+    if not shown:
+        yield lambda history: None
+        return
+    with tqdm(total=epochs, unit="epoch", leave=False) as bar:
+        def on_epoch(history):
+            bar.set_postfix(loss=f"{history.train[-1]:.2e}", best=f"{history.best_loss:.2e}", refresh=False)
+            bar.update()
+
+        yield on_epoch
 
 
 def export_and_verify(job, part, network, normalisation, targets, split):
