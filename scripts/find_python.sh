@@ -1,16 +1,16 @@
 #!/usr/bin/env bash
-# Finds a Python 3 that has what the trainer needs: $NW_PYTHON if that is set (and no other), else /usr/bin/python3, else
-# the python3 of the PATH. Its path goes to standard output, a line that says which to standard error; status 1 and a
-# sentence if there is none.
+# Finds a Python 3 that has what the trainer needs: $NW_PYTHON if that is set (and no other), else /usr/bin/python3,
+# else the python3 of the PATH. Its path goes to standard output, a line that says which to standard error; status 1
+# and a sentence if there is none.
 set -euo pipefail
 
-modules='numpy scipy torch onnx tqdm matplotlib'
-packages='python3-numpy python3-scipy python3-torch python3-onnx python3-tqdm python3-matplotlib'
+modules=(numpy scipy torch onnx tqdm matplotlib)
 
-# The first of the modules that the interpreter lacks; nothing if it has them all. Finding is enough: importing takes seconds.
+# The first of the modules that the interpreter lacks, or nothing. Finding is enough: importing takes seconds.
 missing_of() {
   "$1" -c 'import sys, importlib.util as u
-print(next((m for m in sys.argv[1:] if u.find_spec(m) is None), ""))' $modules 2>/dev/null || echo 'a working interpreter'
+print(next((m for m in sys.argv[1:] if u.find_spec(m) is None), ""))' "${modules[@]}" 2>/dev/null ||
+    echo 'a working interpreter'
 }
 
 reasons=
@@ -29,5 +29,6 @@ for candidate in "${candidates[@]}"; do
   fi
   reasons+="$path lacks $missing; "
 done
-printf 'find_python: no Python for the trainer: %sinstall (Debian) %s, or set NW_PYTHON\n' "$reasons" "$packages" >&2
+printf 'find_python: no Python for the trainer: %sinstall (Debian) %s, or set NW_PYTHON\n' \
+  "$reasons" "${modules[*]/#/python3-}" >&2
 exit 1

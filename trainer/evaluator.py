@@ -19,7 +19,7 @@ BUILT = Path(__file__).resolve().parent.parent / "build" / "release" / "quarn" /
 
 
 def find_quarn(wanted):
-    """Path of the executable: `wanted` ("none" for none), $QUARN, the release build, the PATH; None if there is none."""
+    """Path of the executable: `wanted` ("none" for none), $QUARN, the release build, the PATH; or None."""
     for name, called in ((wanted, "--quarn"), (os.environ.get("QUARN"), "$QUARN")):
         if name == "none":
             return None

@@ -51,18 +51,15 @@ def measure(dataset, rows, deltas_of, shapes=None):
     shapes     float32 [S, 3 * D], any basis, or none
     """
     base, basis, network = Distances(), Distances(), Distances()
+    if shapes is not None:
+        shapes = np.linalg.qr(shapes.T.astype(np.float64))[0].T.astype(np.float32)  # orthonormal rows
     for part, deltas in dataset.blocks(rows):
         base.add(part, deltas)
         network.add(part, deltas_of(dataset.controls[part]) - deltas)
         if shapes is not None:
-            basis.add(part, project(deltas, shapes) - deltas)
+            basis.add(part, deltas @ shapes.T @ shapes - deltas)  # nearest that the shapes can make
     return {"frames": len(rows), "base": base.summary(dataset),
             "basis": None if shapes is None else basis.summary(dataset), "network": network.summary(dataset)}
-
-
-def project(deltas, shapes):
-    """The nearest deltas that the shapes can make."""
-    return np.linalg.lstsq(shapes.T.astype(np.float64), deltas.T, rcond=None)[0].T.astype(np.float32) @ shapes
 
 
 def as_lines(errors):

@@ -54,8 +54,7 @@ def train(job):
     dataset, settings = job.dataset, job.settings
     if dataset.delta_count == 0:
         raise TrainerError(f"{dataset.folder} has no deltas: its subset is {dataset.description['subsetState']}")
-    if not settings.principalShapesEnabled:
-        check_size(settings, dataset.control_count, 3 * dataset.delta_count)
+    check_size(settings, dataset.control_count, 1 if settings.principalShapesEnabled else 3 * dataset.delta_count)
     make_deterministic(job.seed, job.threads)
     memory.warn_of_slow_blas(job.say)
     split = split_rows(dataset.frame_count, settings.validationRatio, job.seed)
@@ -63,8 +62,8 @@ def train(job):
     with files.whole_folder(job.report, report.NAMES) as report_part:
         with files.whole_folder(job.model, MODEL_NAMES) as part:
             history, result = train_into(job, part, split)
-        result["seconds"] = time.monotonic() - start
-        report.write_report(report_part, result, history)
+            result["seconds"] = time.monotonic() - start
+            report.write_report(report_part, result, history)
     return result
 
 
@@ -164,7 +163,8 @@ def export_and_verify(job, part, network, normalisation, targets, split):
         job.say("there is no quarn: the model is not verified with the deformer's own runtime")
         return
     with evaluator.model_link(part, job.model.name) as link:
-        compare(evaluator.run_with_quarn(job.quarn, link, controls), wanted, targets.unit, "the network as quarn runs it")
+        outputs = evaluator.run_with_quarn(job.quarn, link, controls)
+    compare(outputs, wanted, targets.unit, "the network as quarn runs it")
 
 
 def compare(found, wanted, unit, called):

@@ -43,7 +43,8 @@ class ModelTest(unittest.TestCase):
                         {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"}):
             with self.subTest(changes):
                 report = self.train(data, **changes)
-                self.assertLess(report["errors"]["network"]["mean"]["mm"], 0.25 * report["errors"]["base"]["mean"]["mm"])
+                errors = report["errors"]
+                self.assertLess(errors["network"]["mean"]["mm"], 0.25 * errors["base"]["mean"]["mm"])
                 self.assertEqual(report["heldOut"], "validationRatio" not in changes)
                 self.assertEqual(self.read("model.report/report.json"), json.loads(json.dumps(report)))
                 self.assertTrue((self.place / "model.report/loss.png").read_bytes().startswith(b"\x89PNG"))
