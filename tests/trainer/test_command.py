@@ -1,0 +1,163 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The command line as a user has it: exit codes, streams, the same files again, and processes that are killed."""
+
+import hashlib
+import json
+import os
+import random
+import signal
+import stat
+import subprocess
+import sys
+import tempfile
+import time
+import unittest
+from pathlib import Path
+
+import synthetic
+
+ROOT = Path(__file__).resolve().parents[2]
+TRAIN = ("train", "data", "-o", "m/arm", "--quarn", "none")
+
+# a quarn that runs the network with NumPy, and adds what $WRONG says
+STAND_IN = f"""#!{sys.executable}
+import os, sys
+import numpy as np
+from trainer.evaluator import NumpyModel
+assert sys.argv[1] == "info" and sys.argv[2].endswith(".nwrp") and sys.argv[3] == "--run" and sys.argv[5] == "--outputs"
+if os.environ.get("WRONG") == "crash":
+    sys.exit("quarn: the model cannot be loaded")
+outputs = NumpyModel(sys.argv[2] + "/model.onnx").run(np.load(sys.argv[4]))
+np.save(sys.argv[6], outputs + np.float32(os.environ.get("WRONG", "0")))
+"""
+
+
+class CommandTest(unittest.TestCase):
+    def setUp(self):
+        place = tempfile.TemporaryDirectory()
+        self.addCleanup(place.cleanup)
+        self.place = Path(place.name)
+        synthetic.make(self.place / "data", frames=60, train={"epochs": 4})
+
+    def environment(self, **more):
+        kept = {key: value for key, value in os.environ.items() if key != "QUARN"}
+        return {**kept, "PYTHONPATH": f"{ROOT}", **more}
+
+    def start(self, *arguments, **environment):
+        return subprocess.Popen([sys.executable, "-m", "trainer", *map(str, arguments)], cwd=self.place, text=True,
+                                stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
+                                env=self.environment(**environment))
+
+    def run_trainer(self, *arguments, status=0, **environment):
+        process = self.start(*arguments, **environment)
+        out, err = process.communicate()
+        self.assertEqual(process.returncode, status, out + err)
+        return out, err
+
+    def refused(self, *arguments, **environment):
+        out, err = self.run_trainer(*arguments, status=1, **environment)
+        self.assertRegex(err, r"\Atrainer: [^\n]+\n\Z")
+        return err
+
+    def digest(self, name="arm.nwrp"):
+        """Of the names and bytes of a model directory."""
+        digest = hashlib.sha256()
+        for path in sorted((self.place / "m" / name).iterdir()):
+            digest.update(path.name.encode() + path.read_bytes())
+        return digest.hexdigest()
+
+    def test_same_data_and_seed_give_the_same_files(self):
+        for more in ((), ("--principal-shapes", "--principal-accuracy", "0.95", "--dropout", "0.1")):
+            digests = []
+            for last, environment in ((("--no-preload",), {}), ((), {"OMP_NUM_THREADS": "2"}), (("--seed", "2"), {})):
+                self.run_trainer(*TRAIN, *more, *last, **environment)
+                digests.append(self.digest())
+            self.assertEqual(digests[0], digests[1])
+            self.assertNotEqual(digests[0], digests[2])
+        self.run_trainer(*TRAIN, "--direct")
+        self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
+        self.assertFalse((self.place / "m/arm.nwrp/principal_shapes.json").exists())
+
+    def test_killed_at_any_time(self):
+        self.run_trainer(*TRAIN, "--epochs", "30")
+        wanted = self.digest()
+        self.run_trainer(*TRAIN, "--seed", "2")
+        before = self.digest()
+        moments = random.Random(4)
+        for _ in range(6):
+            process = self.start(*TRAIN, "--epochs", "30")
+            time.sleep(moments.uniform(0, 2.5))
+            process.kill()
+            process.communicate()
+            self.assertIn(self.digest(), (before, wanted))
+        self.run_trainer(*TRAIN, "--epochs", "30")
+        self.assertEqual(self.digest(), wanted)
+        self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
+
+    def test_interrupted_leaves_nothing(self):
+        for number, status in ((signal.SIGINT, 130), (signal.SIGTERM, 143)):
+            process = self.start(*TRAIN, "--epochs", "100000", "--patience", "100000")
+            while "validating on" not in process.stdout.readline():
+                self.assertIsNone(process.poll())
+            process.send_signal(number)
+            self.assertEqual((process.communicate()[1], process.returncode), ("", status))
+            self.assertEqual(os.listdir(self.place / "m"), [])
+
+    def test_streams_and_errors(self):
+        self.assertEqual(self.run_trainer(*TRAIN, "--quiet"), ("", ""))
+        out, err = self.run_trainer(*TRAIN, "--json", "--report", "elsewhere")
+        self.assertEqual(json.loads(out), json.loads((self.place / "elsewhere/report.json").read_text()))
+        self.assertIn("not verified", err)
+        self.assertIn("60 frames, 3 controls, 48 deltas (Surface", self.run_trainer("info", "data")[0])
+        self.assertEqual(json.loads(self.run_trainer("info", "data", "--json")[0])["frameCount"], 60)
+        for arguments, wanted in (
+                ((), "required"), (("dance",), "dance"), (("train", "nowhere", "-o", "m"), "nowhere is not a training"),
+                ((*TRAIN, "--learning-rate", "0"), "learning rate is 0"),
+                ((*TRAIN, "--epochs", "many"), "invalid int value: 'many'"),
+                ((*TRAIN, "--activation", "swish"), "--activation is 'swish'"),
+                ((*TRAIN, "--neurons", "100000"), "40.06 GB"), ((*TRAIN, "--threads", "0"), "--threads is 0"),
+                ((*TRAIN, "--quarn", "nowhere"), "--quarn names nowhere"),
+                (("evaluate", "data", "data", "--quarn", "none"), "data is not a model directory"),
+                (("train", "data", "-o", "data/dataset.json/m"), "dataset.json")):
+            self.assertIn(wanted, self.refused(*arguments))
+
+    def test_zero_model_and_evaluation(self):
+        self.run_trainer("zero", "data", "-o", "m/zero")
+        self.run_trainer(*TRAIN)
+        zero = json.loads(self.run_trainer("evaluate", "data", "m/zero.nwrp", "--json", "--quarn", "none")[0])
+        arm = json.loads(self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", "none")[0])
+        self.assertEqual(zero["network"], zero["base"])
+        self.assertLess(arm["network"]["mean"]["mm"], arm["base"]["mean"]["mm"])
+        synthetic.make(self.place / "part", affect=[1, 2])
+        self.assertIn("do not belong together", self.refused("evaluate", "part", "m/arm.nwrp", "--quarn", "none"))
+
+    def test_quarn_has_the_last_word(self):
+        quarn = self.place / "quarn"
+        quarn.write_text(STAND_IN)
+        quarn.chmod(quarn.stat().st_mode | stat.S_IXUSR)
+        train = ("train", "data", "-o", "m/arm")
+        out, _ = self.run_trainer(*train, "--json", QUARN=str(quarn))
+        self.assertTrue(json.loads(out)["verifiedWithQuarn"])
+        before = self.digest()
+        self.assertIn("is not published", self.refused(*train, "--seed", "2", QUARN=str(quarn), WRONG="0.001"))
+        self.assertIn("the model cannot be loaded", self.refused(*train, "--quarn", quarn, WRONG="crash"))
+        self.assertEqual(self.digest(), before)
+        self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
+        self.assertIn("ran with quarn", self.run_trainer("evaluate", "data", "m/arm.nwrp", QUARN=str(quarn))[0])
+
+    def test_the_real_quarn_runs_every_kind_of_model(self):
+        quarn = os.environ.get("NW_TEST_QUARN", "")
+        if not quarn or "--run" not in subprocess.run([quarn, "info", "--help"], capture_output=True, text=True,
+                                                      check=False).stdout:
+            self.skipTest("the quarn of this build cannot run models")
+        for more in (("--activation", "Sigmoid"), ("--activation", "Tanh"), ("--activation", "ReLU"),
+                     ("--activation", "Linear"), ("--principal-shapes",)):
+            out, _ = self.run_trainer("train", "data", "-o", "m/arm", "--quarn", quarn, "--json", *more)
+            self.assertTrue(json.loads(out)["verifiedWithQuarn"])
+        by_quarn = json.loads(self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", quarn)[0])
+        by_numpy = json.loads(self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", "none")[0])
+        self.assertAlmostEqual(by_quarn["network"]["mean"]["mm"], by_numpy["network"]["mean"]["mm"], places=5)
+
+
+if __name__ == "__main__":
+    unittest.main()

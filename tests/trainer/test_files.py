@@ -1,0 +1,87 @@
+# SPDX-License-Identifier: Apache-2.0
+"""Folders are whole or not there, whatever happens while they are written."""
+
+import os
+import tempfile
+import unittest
+from pathlib import Path
+from unittest import mock
+
+from trainer import files
+from trainer.errors import TrainerError
+
+NAMES = ("a", "b")
+
+
+class WholeFolderTest(unittest.TestCase):
+    def setUp(self):
+        place = tempfile.TemporaryDirectory()
+        self.addCleanup(place.cleanup)
+        self.place = Path(place.name)
+        self.target = self.place / "deep" / "model.nwrp"
+
+    def write(self, text):
+        with files.whole_folder(self.target, NAMES) as part:
+            (part / "a").write_text(text)
+
+    def content(self):
+        self.assertEqual(os.listdir(self.target.parent), ["model.nwrp"])
+        return {path.name: path.read_text() for path in self.target.iterdir()}
+
+    def test_replaces_with_and_without_an_exchange(self):
+        for exchange in (files.exchange, lambda *_: False):
+            with mock.patch.object(files, "exchange", exchange):
+                for text in ("one", "two"):
+                    self.write(text)
+                    self.assertEqual(self.content(), {"a": text})
+
+    def test_an_exception_leaves_what_was_there(self):
+        for error in (ValueError, KeyboardInterrupt):
+            with self.assertRaises(error), files.whole_folder(self.target, NAMES) as part:
+                (part / "a").write_text("half")
+                raise error
+            self.assertEqual(os.listdir(self.target.parent), [])
+        self.write("one")
+        with self.assertRaises(ValueError), files.whole_folder(self.target, NAMES) as part:
+            (part / "b").write_text("half")
+            raise ValueError
+        self.assertEqual(self.content(), {"a": "one"})
+
+    def test_what_killed_processes_left_is_removed(self):
+        left = self.target.with_name("model.nwrp.part")
+        (left / "folder").mkdir(parents=True)
+        (left / "b").write_text("half")
+        self.write("one")
+        self.assertEqual(self.content(), {"a": "one"})
+        # killed between the two renames: the old folder comes back, then is replaced
+        self.target.rename(self.target.with_name("model.nwrp.old"))
+        with self.assertRaises(ValueError), files.whole_folder(self.target, NAMES):
+            raise ValueError
+        self.assertEqual(self.content(), {"a": "one"})
+
+    def test_nothing_of_others_is_replaced(self):
+        self.target.mkdir(parents=True)
+        (self.target / "thesis.txt").write_text("years")
+        with self.assertRaisesRegex(TrainerError, "thesis.txt, which would be lost"):
+            self.write("one")
+        self.assertEqual(self.content(), {"thesis.txt": "years"})
+        (self.place / "file.nwrp").write_text("years")
+        with self.assertRaisesRegex(TrainerError, "is a file"), files.whole_folder(self.place / "file.nwrp", NAMES):
+            pass
+
+    def test_one_writer_at_a_time(self):
+        with files.whole_folder(self.target, NAMES) as part:
+            (part / "a").write_text("first")
+            with self.assertRaisesRegex(TrainerError, "another process is writing"):
+                self.write("second")
+        self.assertEqual(self.content(), {"a": "first"})
+
+    def test_names_of_models(self):
+        for text, wanted in (("m/arm", "m/arm.nwrp"), ("m/arm.nwrp", "m/arm.nwrp"), ("arm.v2", "arm.v2.nwrp")):
+            self.assertEqual(str(files.model_path(text)), wanted)
+        with self.assertRaises(TrainerError):
+            files.model_path("..")
+
+
+if __name__ == "__main__":
+    unittest.main()

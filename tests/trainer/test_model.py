@@ -1,0 +1,181 @@
+# SPDX-License-Identifier: Apache-2.0
+"""What is learned and what is written, against NumPy and against the data."""
+
+import json
+import tempfile
+import unittest
+from dataclasses import replace
+from pathlib import Path
+from unittest import mock
+
+import numpy as np
+
+import synthetic
+from trainer import export, memory, pipeline, shapes
+from trainer.dataset import load_dataset
+from trainer.errors import TrainerError
+from trainer.evaluator import ModelDirectory, NumpyModel
+from trainer.measure import Distances
+from trainer.network import check_size
+from trainer.settings import ACTIVATIONS, Settings
+
+
+class ModelTest(unittest.TestCase):
+    def setUp(self):
+        place = tempfile.TemporaryDirectory()
+        self.addCleanup(place.cleanup)
+        self.place = Path(place.name)
+        self.said = []
+
+    def train(self, data, name="model", **changes):
+        dataset = load_dataset(data)
+        job = pipeline.Job(dataset, replace(dataset.settings, **changes), 1, 1, self.place / f"{name}.nwrp",
+                           self.place / f"{name}.report", None, self.said.append, False)
+        return pipeline.train(job)
+
+    def read(self, name):
+        return json.loads((self.place / name).read_text())
+
+    def test_errors_fall_well_below_the_base(self):
+        data = synthetic.make(self.place / "data")
+        motion = load_dataset(synthetic.make(self.place / "motion", seed=8, frames=50))
+        for changes in ({}, {"principalShapesEnabled": True, "principalShapesAccuracy": 0.999},
+                        {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"}):
+            with self.subTest(changes):
+                report = self.train(data, **changes)
+                errors = report["errors"]
+                self.assertLess(errors["network"]["mean"]["mm"], 0.25 * errors["base"]["mean"]["mm"])
+                self.assertEqual(report["heldOut"], "validationRatio" not in changes)
+                self.assertEqual(self.read("model.report/report.json"), json.loads(json.dumps(report)))
+                self.assertTrue((self.place / "model.report/loss.png").read_bytes().startswith(b"\x89PNG"))
+                # the published files alone, on poses that were in no training
+                model = ModelDirectory(self.place / "model.nwrp", None)
+                model.check_fits(motion)
+                left = np.abs(model.deltas(motion.controls) - motion.deltas).mean()
+                self.assertLess(left, 0.3 * np.abs(motion.deltas).mean())
+
+    def test_every_activation_exports_what_was_trained(self):
+        # pipeline.train() itself compares the file with PyTorch; a comparison that cannot fail would show here
+        data = synthetic.make(self.place / "data", frames=30)
+        for activation in ACTIVATIONS:
+            for layers in (1, 3):
+                with self.subTest(activation, layers=layers):
+                    self.train(data, activationFunction=activation, hiddenLayerCount=layers, epochs=2, dropoutRatio=0.2)
+        spoiled = lambda parameter, scale: 1.001 * parameter.detach().numpy() * scale
+        with mock.patch.object(export, "scaled", spoiled), self.assertRaisesRegex(TrainerError, "is not published"):
+            self.train(data, "other", epochs=2)
+        self.assertFalse(any(self.place.glob("other*")))
+
+    def test_graph_is_of_the_form_that_the_deformer_reads(self):
+        self.train(synthetic.make(self.place / "data", frames=20), epochs=1)
+        graph = NumpyModel(self.place / "model.nwrp/model.onnx").graph
+        dims = [[d.dim_value for d in value.type.tensor_type.shape.dim] for value in (graph.input[0], graph.output[0])]
+        self.assertEqual((graph.input[0].name, graph.output[0].name, dims), ("controls", "deltas", [[3], [144]]))
+
+    def test_metadata_of_a_partial_subset(self):
+        affect = [40, 3, 17, 21]
+        report = self.train(synthetic.make(self.place / "data", affect=affect), epochs=2)
+        metadata = self.read("model.nwrp/metadata.json")
+        wanted = {"subsetState": "partial", "affectMap": affect, "affectCount": 4, "deltaCount": 4, "fullCount": 48,
+                  "deltaMode": 1, "smoothingIterations": 2, "geometry": "grid", "componentTagExpression": "*"}
+        self.assertEqual({key: metadata[key] for key in wanted}, wanted)
+        self.assertIn(report["errors"]["network"]["worstVertex"], affect)
+        self.assertTrue(101 <= report["errors"]["network"]["worstFrame"] < 261)
+
+    def test_a_control_that_never_moves_has_no_influence(self):
+        data = synthetic.make(self.place / "data", constant_control=True)
+        self.train(data, epochs=3)
+        self.assertTrue(any("never move" in line and "joint3.rotateX" in line for line in self.said))
+        model = ModelDirectory(self.place / "model.nwrp", None)
+        controls = load_dataset(data).controls[:5]
+        moved = controls + np.float32([0, 0, 0, 100])
+        np.testing.assert_array_equal(model.deltas(controls), model.deltas(moved))
+
+    def test_small_and_empty_data(self):
+        self.assertEqual(self.train(synthetic.make(self.place / "one", frames=1), epochs=3)["heldOut"], False)
+        self.train(synthetic.make(self.place / "two", frames=2), epochs=3, principalShapesEnabled=True)
+        still = synthetic.make(self.place / "still")
+        np.save(still / "deltas.npy", np.zeros((160, 48, 3), "<f4"))
+        with self.assertRaisesRegex(TrainerError, "every delta .* is 0"):
+            self.train(still)
+
+    def test_training_ends_early_and_keeps_the_best(self):
+        data = synthetic.make(self.place / "data", frames=30)
+        report = self.train(data, epochs=200, patience=3, learningRate=0.5)
+        self.assertEqual(report["epochs"], report["bestEpoch"] + 3)
+        with mock.patch("trainer.training.mean_loss", lambda *_: float("nan")):
+            with self.assertRaisesRegex(TrainerError, "epoch 1 is nan.*learning rate below 0.003"):
+                self.train(data)
+
+    def test_data_that_does_not_fit_stays_on_the_disk(self):
+        data = synthetic.make(self.place / "data", frames=40)
+        self.train(data, epochs=2)
+        held = (self.place / "model.nwrp/model.onnx").read_bytes()
+        with mock.patch.object(memory, "available", lambda: 1000):
+            self.train(data, epochs=2)
+        self.assertTrue(any("do not fit" in line for line in self.said))
+        self.assertEqual((self.place / "model.nwrp/model.onnx").read_bytes(), held)
+
+
+class ShapesTest(unittest.TestCase):
+    def test_fewest_shapes_by_limit_and_accuracy(self):
+        """Against NumPy's own decomposition, for tall, wide and (by a smaller limit) randomized cases."""
+        with tempfile.TemporaryDirectory() as place:
+            for frames in (20, 160, 400):
+                dataset = load_dataset(synthetic.make(Path(place) / str(frames), frames=frames))
+                rows = np.arange(0, frames, 2)
+                _, values, vectors = np.linalg.svd(dataset.deltas[rows].astype(float), full_matrices=False)
+                parts = np.cumsum(values**2) / np.sum(values**2)
+                for exact_side in (shapes.EXACT_SIDE, 1):
+                    for limit, accuracy in ((20, 0.8), (20, 0.95), (2, 1.0), (1, 0.0), (500, 0.9999)):
+                        with self.subTest(frames=frames, side=exact_side, limit=limit, accuracy=accuracy), \
+                                mock.patch.object(shapes, "EXACT_SIDE", exact_side):
+                            basis = shapes.principal_basis(dataset, rows, limit, accuracy, 1)
+                            count = min(limit, int(np.searchsorted(parts, accuracy)) + 1)
+                            self.check(basis, count, parts, vectors)
+
+    def check(self, basis, count, parts, vectors):
+        self.assertEqual(len(basis.shapes), count)
+        self.assertAlmostEqual(basis.explained, parts[count - 1], places=5)
+        np.testing.assert_allclose(basis.shapes @ basis.shapes.T, np.eye(count), atol=1e-5)
+        # the same space: the shapes' own and NumPy's differ by sign only
+        np.testing.assert_allclose(np.abs(np.sum(basis.shapes * vectors[:count], axis=1)), 1, atol=1e-3)
+        self.assertTrue((np.max(basis.shapes, axis=1) >= -np.min(basis.shapes, axis=1)).all())
+
+    def test_text_of_shapes_gives_the_same_floats(self):
+        random = np.random.default_rng(3)
+        values = (random.standard_normal((3, 300)) * 10.0 ** random.integers(-30, 30, (3, 300))).astype(np.float32)
+        with tempfile.TemporaryDirectory() as place:
+            export.write_shapes(Path(place) / "shapes.json", values)
+            read = json.loads((Path(place) / "shapes.json").read_text())
+        self.assertEqual((read["principalShapeCount"], read["principalVertCount"]), (3, 100))
+        np.testing.assert_array_equal(np.array(read["principalShapes"], np.float32), values)
+
+
+class SizesTest(unittest.TestCase):
+    def test_what_no_file_could_hold_is_refused(self):
+        settings = Settings(neuronsPerLayer=2000)
+        check_size(settings, 100, 180000)
+        with self.assertRaisesRegex(TrainerError, r"1\.62 GB.*--principal-shapes.*--neurons"):
+            check_size(settings, 100, 200000)
+        with self.assertRaisesRegex(TrainerError, "--principal-limit"):
+            export.check_shapes_size(500, 100000)
+
+
+class DistancesTest(unittest.TestCase):
+    def test_percentile_is_near_the_exact_one(self):
+        random = np.random.default_rng(5)
+        for scale in (1e-4, 1.0, 1e4):
+            differences = (scale * random.standard_normal((50, 3 * 40))).astype(np.float32)
+            distances = Distances()
+            for first in range(0, 50, 7):
+                distances.add(np.arange(first, min(first + 7, 50)), differences[first:first + 7])
+            lengths = np.linalg.norm(differences.reshape(50, 40, 3), axis=2)
+            wanted = np.sort(lengths.ravel())[int(0.99 * lengths.size) - 1]
+            self.assertAlmostEqual(distances.percentile(0.99) / wanted, 1, delta=1e-3)
+            self.assertEqual(distances.where, np.unravel_index(np.argmax(lengths), lengths.shape))
+            self.assertAlmostEqual(distances.total / lengths.sum(), 1, places=5)
+
+
+if __name__ == "__main__":
+    unittest.main()

@@ -1,0 +1,242 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The command line: python3 -m trainer COMMAND ..."""
+
+import argparse
+import json
+import os
+import signal
+import sys
+from pathlib import Path
+
+import trainer
+from trainer.errors import Terminated, TrainerError
+
+# Debian's packages by module, for whoever has to install them
+PACKAGES = {name: f"python3-{name}" for name in ("numpy", "scipy", "torch", "onnx", "tqdm", "matplotlib")}
+
+
+class Parser(argparse.ArgumentParser):
+    def error(self, message):
+        raise TrainerError(f"{message} (see {self.prog} --help)")
+
+
+def parser():
+    main = Parser(prog="trainer", description="Trains models for the neuralWarp deformer.", allow_abbrev=False)
+    main.add_argument("--version", action="version", version=f"trainer {trainer.__version__}")
+    commands = main.add_subparsers(dest="command", required=True, metavar="COMMAND")
+    add_train(commands)
+
+    evaluate = commands.add_parser("evaluate", help="errors of a model on a data set", allow_abbrev=False)
+    add_dataset(evaluate)
+    evaluate.add_argument("model", metavar="MODEL.nwrp")
+    add_quarn(evaluate)
+    evaluate.add_argument("--json", action="store_true", help="write the errors as JSON")
+
+    zero = commands.add_parser("zero", help="write a model that outputs zeros", allow_abbrev=False)
+    add_dataset(zero)
+    zero.add_argument("-o", "--output", required=True, metavar="MODEL.nwrp")
+    zero.add_argument("--quiet", action="store_true")
+
+    info = commands.add_parser("info", help="check a data set and say what is in it", allow_abbrev=False)
+    add_dataset(info)
+    info.add_argument("--json", action="store_true", help="write dataset.json without its long lists, and the digest")
+    return main
+
+
+def add_dataset(command):
+    command.add_argument("dataset", metavar="DATASET", help="folder that 'quarn export' wrote")
+
+
+def add_quarn(command):
+    command.add_argument("--quarn", metavar="PATH", help="the quarn to run the model with, or 'none'; if not given: "
+                         "$QUARN, build/release/quarn/quarn, the PATH")
+
+
+def add_train(commands):
+    train = commands.add_parser("train", help="train a model", allow_abbrev=False)
+    add_dataset(train)
+    train.add_argument("-o", "--output", metavar="MODEL.nwrp",
+                       help="model directory; if not given: models/NAME.nwrp with the data set's outputModelName")
+    train.add_argument("--seed", type=int, default=1)
+    train.add_argument("--threads", type=int, default=1, help="of the arithmetic; the model depends on it (default 1)")
+    train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model")
+    add_quarn(train)
+    train.add_argument("--quiet", action="store_true", help="only errors")
+    train.add_argument("--json", action="store_true", help="write the report to standard output as well")
+    add_settings(train.add_argument_group("settings", "instead of those of the data set"))
+
+
+# flags of the settings, in the order of the node's attributes
+SETTING_FLAGS = {
+    "batchSize": "--batch-size", "epochs": "--epochs", "learningRate": "--learning-rate",
+    "validationRatio": "--validation-ratio", "hiddenLayerCount": "--hidden-layers", "neuronsPerLayer": "--neurons",
+    "activationFunction": "--activation", "dropoutRatio": "--dropout", "principalShapesLimit": "--principal-limit",
+    "principalShapesAccuracy": "--principal-accuracy", "patience": "--patience",
+}
+
+
+def add_settings(group):
+    from trainer.settings import KINDS
+
+    for name, flag in SETTING_FLAGS.items():
+        group.add_argument(flag, dest=name, type=KINDS[name], metavar=name)
+    kind = group.add_mutually_exclusive_group()
+    kind.add_argument("--principal-shapes", dest="principalShapesEnabled", action="store_true", default=None,
+                      help="learn coefficients of principal shapes")
+    kind.add_argument("--direct", dest="principalShapesEnabled", action="store_false", help="learn the deltas")
+    group.add_argument("--preload", dest="preloadData", action=argparse.BooleanOptionalAction,
+                       help="hold the deltas in memory")
+
+
+# --- the commands ---
+
+def command_train(options):
+    if not 0 <= options.seed < 2**32:
+        raise TrainerError(f"--seed is {options.seed}, not a whole number from 0 to {2**32 - 1}")
+    pin_threads(options.threads)
+    from trainer import evaluator, pipeline
+    from trainer.dataset import load_dataset
+    from trainer.measure import as_lines
+    from trainer.settings import KINDS, override
+
+    say = speaker(options)
+    quarn = evaluator.find_quarn(options.quarn)
+    dataset = load_dataset(options.dataset)
+    changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
+    settings = override(dataset.settings, changes, lambda name: SETTING_FLAGS.get(name, name))
+    model = output_path(options, settings)
+    report = Path(options.report) if options.report else model.with_suffix(".report")
+    result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
+                                         not options.quiet))
+    for line in as_lines(result["errors"]):
+        say(line)
+    say(f"wrote {model} and {report}")
+    if options.json:
+        print(json.dumps(result, indent=1))
+
+
+def pin_threads(count):
+    """Before NumPy is loaded: its libraries take their threads from the environment, and sums depend on them."""
+    if not 1 <= count <= 256:
+        raise TrainerError(f"--threads is {count}, not a whole number from 1 to 256")
+    for name in ("OPENBLAS_NUM_THREADS", "OMP_NUM_THREADS", "MKL_NUM_THREADS"):
+        os.environ[name] = str(count)
+
+
+def output_path(options, settings):
+    from trainer.files import model_path
+
+    if options.output:
+        return model_path(options.output)
+    if not settings.outputModelName:
+        raise TrainerError("the data set names no model (train.outputModelName is empty): give one with -o NAME.nwrp")
+    return model_path(str(Path("models") / Path(settings.outputModelName).name))
+
+
+def speaker(options):
+    """Where lines for the user go: nowhere when quiet, to standard error when standard output is JSON."""
+    if options.quiet:
+        return lambda line: None
+    return lambda line: print(line, file=sys.stderr if getattr(options, "json", False) else sys.stdout, flush=True)
+
+
+def command_evaluate(options):
+    import numpy as np
+
+    from trainer import evaluator
+    from trainer.dataset import load_dataset
+    from trainer.measure import as_lines, measure
+
+    quarn = evaluator.find_quarn(options.quarn)
+    dataset = load_dataset(options.dataset)
+    if dataset.delta_count == 0:
+        raise TrainerError(f"{options.dataset} has no deltas to compare with")
+    model = evaluator.ModelDirectory(options.model, quarn)
+    model.check_fits(dataset)
+    errors = measure(dataset, np.arange(dataset.frame_count), model.deltas, model.shapes)
+    errors["ranWith"] = "quarn" if quarn else "numpy"
+    if options.json:
+        print(json.dumps(errors, indent=1))
+    else:
+        print("\n".join([*as_lines(errors), f"the network ran with {errors['ranWith']}"]))
+
+
+def command_zero(options):
+    from trainer import export, files, pipeline
+    from trainer.dataset import load_dataset
+
+    dataset = load_dataset(options.dataset)
+    if dataset.delta_count == 0:
+        raise TrainerError(f"{options.dataset} has no deltas, and a network without outputs cannot be loaded")
+    target = files.model_path(options.output)
+    with files.whole_folder(target, pipeline.MODEL_NAMES) as part:
+        export.write_model(part, export.zero_model(dataset.control_count, 3 * dataset.delta_count),
+                           export.metadata(dataset, None, None))
+    speaker(options)(f"wrote {target}")
+
+
+def command_info(options):
+    from trainer.dataset import load_dataset
+
+    dataset = load_dataset(options.dataset)
+    description = dataset.description
+    if options.json:
+        print(json.dumps({**description, "affectMap": None, "digest": dataset.digest}, indent=1))
+        return
+    print(f"{options.dataset}: {dataset.frame_count} frames, {dataset.control_count} controls, "
+          f"{dataset.delta_count} deltas ({'Surface' if description['deltaMode'] else 'Offset'}, "
+          f"{description['smoothingIterations']} smoothing passes)")
+    print(f"geometry {description['geometry']}, {description['subsetState']}: {description['affectCount']} of "
+          f"{description['fullCount']} vertices")
+    for name, value in vars(dataset.settings).items():
+        print(f"  {name} {value}")
+    print(f"sha256 {dataset.digest}")
+
+
+COMMANDS = {"train": command_train, "evaluate": command_evaluate, "zero": command_zero, "info": command_info}
+
+
+def on_terminate(number, frame):
+    raise Terminated
+
+
+def main():
+    signal.signal(signal.SIGTERM, on_terminate)
+    try:
+        options = parser().parse_args()
+        COMMANDS[options.command](options)
+        sys.stdout.flush()
+        return 0
+    except TrainerError as error:
+        return complain(error)
+    except ModuleNotFoundError as error:
+        if error.name not in PACKAGES:
+            raise
+        return complain(f"Python's {error.name} is missing in {sys.executable}: install it (Debian: "
+                        f"{' '.join(PACKAGES.values())}), or choose another Python")
+    except (OSError, MemoryError) as error:
+        return complain(reason_of(error))
+    except KeyboardInterrupt:
+        return 130
+    except Terminated:
+        return 143
+
+
+def reason_of(error):
+    if isinstance(error, MemoryError):
+        return "there is not enough memory"
+    return f"{error.filename}: {error.strerror}" if error.strerror and error.filename else error
+
+
+def complain(error):
+    print(f"trainer: {error}", file=sys.stderr)
+    return 1
+
+
+if __name__ == "__main__":
+    status = main()
+    try:
+        sys.stdout.flush()
+    except BrokenPipeError:
+        os.dup2(os.open(os.devnull, os.O_WRONLY), sys.stdout.fileno())
+    sys.exit(status)

@@ -1,0 +1,130 @@
+# SPDX-License-Identifier: Apache-2.0
+"""Writes the files of a model directory. They carry no time and no path: the same training gives the same bytes."""
+
+import json
+
+import numpy as np
+import onnx
+from onnx import TensorProto, helper, numpy_helper
+from torch import nn
+
+import trainer
+from trainer.errors import TrainerError
+from trainer.settings import WITHOUT_EFFECT
+
+OPSET = 16
+IR_VERSION = 8
+METADATA_LIMIT, SHAPES_LIMIT = 64 << 20, 1 << 30  # bytes that the deformer reads
+BYTES_OF_A_NUMBER = 13                            # of a float32 in a JSON list, at most about
+METADATA_KEYS = ("deltaCount", "deltaMode", "smoothingIterations", "affectCount", "fullCount", "subsetState",
+                 "componentTagExpression", "geometry")
+
+ACTIVATION_NODES = {nn.Sigmoid: ("Sigmoid", {}), nn.Tanh: ("Tanh", {}), nn.ReLU: ("Relu", {})}
+
+
+# --- model.onnx ---
+
+def onnx_model(network, normalisation, output_name):
+    """The network from raw controls, float32 [C], to outputs, float32 [K]: one pose, as the deformer runs it."""
+    graph = GraphWriter("controls")
+    graph.add("Sub", normalisation.center)
+    graph.add("Mul", np.float32(1 / normalisation.deviation))
+    layers = list(network)
+    for layer in layers:
+        if isinstance(layer, nn.Linear):
+            scale = normalisation.unit if layer is layers[-1] else 1.0
+            graph.add("MatMul", scaled(layer.weight, scale).T)
+            graph.add("Add", scaled(layer.bias, scale))
+        elif isinstance(layer, nn.LeakyReLU):
+            graph.add("LeakyRelu", alpha=layer.negative_slope)
+        elif type(layer) in ACTIVATION_NODES:
+            name, attributes = ACTIVATION_NODES[type(layer)]
+            graph.add(name, **attributes)
+    return graph.finish(output_name, layers[0].in_features, layers[-1].out_features)
+
+
+def scaled(parameter, scale):
+    return (parameter.detach().numpy().astype(np.float64) * scale).astype(np.float32)
+
+
+def zero_model(control_count, output_count):
+    """A network of the right shapes whose outputs are 0."""
+    graph = GraphWriter("controls")
+    graph.add("MatMul", np.zeros((control_count, 1), np.float32))
+    graph.add("MatMul", np.zeros((1, output_count), np.float32))
+    return graph.finish("deltas", control_count, output_count)
+
+
+class GraphWriter:
+    """A chain of nodes, each fed by the one before and at most one constant."""
+
+    def __init__(self, input_name):
+        self.nodes, self.constants = [], []
+        self.input_name = self.value = input_name
+
+    def add(self, kind, constant=None, **attributes):
+        name = f"{kind.lower()}{len(self.nodes)}"
+        inputs = [self.value]
+        if constant is not None:
+            self.constants.append(numpy_helper.from_array(np.ascontiguousarray(constant, np.float32),
+                                                          f"{name}_constant"))
+            inputs.append(self.constants[-1].name)
+        self.nodes.append(helper.make_node(kind, inputs, [name], name=name, **attributes))
+        self.value = name
+
+    def finish(self, output_name, input_count, output_count):
+        self.nodes[-1].output[0] = output_name
+        graph = helper.make_graph(
+            self.nodes, "neuralWarp",
+            [helper.make_tensor_value_info(self.input_name, TensorProto.FLOAT, [input_count])],
+            [helper.make_tensor_value_info(output_name, TensorProto.FLOAT, [output_count])], self.constants)
+        model = helper.make_model(graph, opset_imports=[helper.make_opsetid("", OPSET)], ir_version=IR_VERSION,
+                                  producer_name="neuralWarp trainer", producer_version=trainer.__version__)
+        onnx.checker.check_model(model, full_check=True)
+        return model
+
+
+# --- metadata.json, principal_shapes.json ---
+
+def metadata(dataset, settings, seed):
+    """What the deformer needs to know of the data set, and where the model comes from."""
+    description = dataset.description
+    result = {key: description[key] for key in METADATA_KEYS}
+    if description["subsetState"] == "partial":
+        result["affectMap"] = description["affectMap"]
+    result["controlNames"] = description["controlNames"]
+    result["trainer"] = f"neuralWarp trainer {trainer.__version__}"
+    result["dataSet"] = f"sha256:{dataset.digest}"
+    if settings is not None:
+        result["seed"] = seed
+        result["settings"] = {name: value for name, value in vars(settings).items() if name not in WITHOUT_EFFECT}
+    return result
+
+
+def check_shapes_size(shape_count, delta_count):
+    size = BYTES_OF_A_NUMBER * 3 * shape_count * delta_count
+    if size > SHAPES_LIMIT:
+        raise TrainerError(f"{shape_count} principal shapes of {delta_count} vertices would take about "
+                           f"{size / 1e9:.1f} GB of text, more than the {SHAPES_LIMIT / 1e9:.1f} GB that the deformer "
+                           "reads: give fewer (--principal-limit)")
+
+
+def write_model(folder, model, metadata_, shapes=None):
+    """Writes the files into an existing folder. shapes: float32 [S, 3 * D], in scene units, or none."""
+    text = json.dumps(metadata_, indent=1, allow_nan=False) + "\n"
+    if len(text) > METADATA_LIMIT:
+        raise TrainerError(f"metadata.json would have {len(text)} bytes, more than the {METADATA_LIMIT} that the "
+                           "deformer reads: the partial subset has too many vertices")
+    (folder / "metadata.json").write_text(text, encoding="utf-8")
+    (folder / "model.onnx").write_bytes(model.SerializeToString(deterministic=True))
+    if shapes is not None:
+        write_shapes(folder / "principal_shapes.json", shapes)
+
+
+def write_shapes(path, shapes):
+    with open(path, "w", encoding="ascii") as file:
+        file.write(f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
+                   '"principalShapes": [\n')
+        # as text a float32 has the fewest digits that give it back
+        file.write(",\n".join("[" + ",".join(shape.astype(str).tolist()) + "]" for shape in shapes))
+        file.write("\n]}\n")

@@ -1,0 +1,85 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The network: a chain of dense layers from normalised controls to normalised outputs, and what normalises them."""
+
+from dataclasses import dataclass
+
+import numpy as np
+import torch
+from torch import nn
+
+from trainer.errors import TrainerError
+
+WEIGHT_BYTES_LIMIT = 1_500_000_000  # an ONNX file of one piece ends at 2 GiB
+LEAKY_SLOPE = 0.01
+CONSTANT = 1e-6  # a control whose deviation is below this part of the common one counts as never moved
+
+MODULES = {"Sigmoid": nn.Sigmoid, "Tanh": nn.Tanh, "ReLU": nn.ReLU, "LeakyReLU": lambda: nn.LeakyReLU(LEAKY_SLOPE),
+           "Linear": None}
+
+
+@dataclass(frozen=True)
+class Normalisation:
+    """(controls - center) / deviation goes in, outputs * unit come out. One deviation and one unit for all of them:
+    with one for each channel, noise of channels that hardly move would count as much as motion."""
+
+    center: np.ndarray   # float32 [C]
+    deviation: float
+    unit: float
+    still: np.ndarray    # bool [C]: controls that never move
+
+    def normalised(self, controls):
+        return (controls - self.center) * np.float32(1 / self.deviation)
+
+
+def measure_controls(controls, unit):
+    """Normalisation for the rows of `controls` [rows, C] and outputs whose root mean square is `unit`."""
+    variances = np.var(controls, axis=0, dtype=np.float64)
+    deviation = float(np.sqrt(np.mean(variances))) or 1.0
+    center = np.mean(controls, axis=0, dtype=np.float64).astype(np.float32)
+    return Normalisation(center, deviation, unit, np.sqrt(variances) <= CONSTANT * deviation)
+
+
+def layer_sizes(settings, inputs, outputs):
+    sizes = [inputs] + [settings.neuronsPerLayer] * settings.hiddenLayerCount + [outputs]
+    return list(zip(sizes[:-1], sizes[1:]))
+
+
+def parameter_count(settings, inputs, outputs):
+    return sum((before + 1) * after for before, after in layer_sizes(settings, inputs, outputs))
+
+
+def check_size(settings, inputs, outputs):
+    """Refuses a network that no model file could hold, before anything is allocated."""
+    size = 4 * parameter_count(settings, inputs, outputs)
+    if size <= WEIGHT_BYTES_LIMIT:
+        return
+    advice = "give fewer neurons (--neurons) or layers (--hidden-layers)"
+    if not settings.principalShapesEnabled:
+        advice = f"train principal shapes instead (--principal-shapes), or {advice}"
+    raise TrainerError(f"the network's weights would take {size / 1e9:.2f} GB, more than the "
+                       f"{WEIGHT_BYTES_LIMIT / 1e9} GB a model may have: {advice}")
+
+
+def build(settings, inputs, outputs, still):
+    """The layers, initialised by torch's generator. `still` [inputs]: controls that must have no influence."""
+    layers = []
+    for before, after in layer_sizes(settings, inputs, outputs):
+        layers.append(nn.Linear(before, after))
+        if MODULES[settings.activationFunction]:
+            layers.append(MODULES[settings.activationFunction]())
+        if settings.dropoutRatio > 0:
+            layers.append(nn.Dropout(settings.dropoutRatio))
+    while not isinstance(layers[-1], nn.Linear):  # nothing follows the last layer
+        layers.pop()
+    network = nn.Sequential(*layers)
+    with torch.no_grad():
+        # their input is 0 all through the training, so the weights would stay as random as they began
+        network[0].weight[:, torch.from_numpy(still)] = 0
+    return network
+
+
+def predict(network, normalisation, controls):
+    """Outputs of the network, float32 [rows, K] in units of the model, for raw controls [rows, C]."""
+    network.eval()
+    with torch.no_grad():
+        return network(torch.from_numpy(normalisation.normalised(controls))).numpy() * np.float32(normalisation.unit)

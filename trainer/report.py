@@ -1,0 +1,34 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The report folder: report.json and loss.png."""
+
+import json
+import os
+
+NAMES = ("report.json", "loss.png")
+
+
+def write_report(folder, report, history):
+    (folder / "report.json").write_text(json.dumps(report, indent=1, allow_nan=False) + "\n", encoding="utf-8")
+    draw_losses(folder / "loss.png", history)
+
+
+def draw_losses(path, history):
+    os.environ.setdefault("MPLBACKEND", "Agg")
+    from matplotlib.backends.backend_agg import FigureCanvasAgg
+    from matplotlib.figure import Figure
+    from matplotlib.ticker import MaxNLocator
+
+    figure = Figure(figsize=(8, 5), layout="constrained")
+    FigureCanvasAgg(figure)
+    axes = figure.add_subplot()
+    epochs = range(1, len(history.train) + 1)
+    marker = "." if len(history.train) < 20 else None
+    axes.plot(epochs, history.train, label="training", marker=marker)
+    if history.validation:
+        axes.plot(epochs, history.validation, label="validation", marker=marker)
+    axes.axvline(history.best_epoch, color="grey", linestyle=":", label=f"best: epoch {history.best_epoch}")
+    axes.set(xlabel="epoch", ylabel="mean squared error (1 = the outputs' own)", yscale="log")
+    axes.xaxis.set_major_locator(MaxNLocator(integer=True))
+    axes.grid(True, which="both", alpha=0.3)
+    axes.legend()
+    figure.savefig(path, dpi=100)

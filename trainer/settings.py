@@ -1,0 +1,83 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The settings of a training run: names, kinds, limits and defaults, as the node's `train` attributes have them."""
+
+import math
+from dataclasses import dataclass, fields, replace
+
+from trainer.errors import TrainerError
+
+ACTIVATIONS = ("Sigmoid", "Tanh", "ReLU", "LeakyReLU", "Linear")
+
+# settings by which the model does not change: where it goes, and where the data lies while it is trained
+WITHOUT_EFFECT = ("outputModelName", "preloadData")
+
+
+@dataclass(frozen=True)
+class Settings:
+    outputModelName: str = ""
+    batchSize: int = 128
+    epochs: int = 250
+    learningRate: float = 0.0005
+    validationRatio: float = 0.2
+    hiddenLayerCount: int = 2
+    neuronsPerLayer: int = 512
+    activationFunction: str = "LeakyReLU"
+    dropoutRatio: float = 0.0
+    principalShapesEnabled: bool = False
+    principalShapesLimit: int = 20
+    principalShapesAccuracy: float = 0.8
+    preloadData: bool = True
+    patience: int = 50  # epochs without a better validation loss until training stops; not an attribute of the node
+
+
+LIMITS = {
+    "batchSize": (1, 100000), "epochs": (1, 100000), "learningRate": (0, 1), "validationRatio": (0, 0.99),
+    "hiddenLayerCount": (1, 100), "neuronsPerLayer": (1, 100000), "dropoutRatio": (0, 1),
+    "principalShapesLimit": (1, 500), "principalShapesAccuracy": (0, 1), "patience": (1, 100000),
+}
+KINDS = {field.name: field.type for field in fields(Settings)}
+WORDS = {bool: "true or false", int: "a whole number", float: "a number", str: "a text"}
+
+
+def read_settings(train, where):
+    """Settings from the "train" object of a data set; what it lacks has the defaults. `where` names it in errors."""
+    if not isinstance(train, dict):
+        raise TrainerError(f"{where} is {train!r}, not an object of settings")
+    known = {name: train[name] for name in KINDS if name in train}
+    return checked(known, lambda name: f"{where}.{name}")
+
+
+def override(settings, changes, flag_of):
+    """Settings with `changes`, a dictionary; `flag_of` gives the name by which an error calls a setting."""
+    checked(changes, flag_of)
+    changed = replace(settings, **normalised(changes))
+    if changed.learningRate == 0:
+        raise TrainerError("the learning rate is 0, with which nothing is learned: give one, such as "
+                           "--learning-rate 0.001")
+    if changed.dropoutRatio == 1:
+        raise TrainerError("the dropout ratio is 1, which leaves no neuron to learn: give less, such as --dropout 0.1")
+    return changed
+
+
+def checked(values, name_of):
+    for name, value in values.items():
+        check_value(name, value, name_of(name))
+    return Settings(**normalised(values))
+
+
+def check_value(name, value, called):
+    kind = KINDS[name]
+    fits = isinstance(value, (int, float) if kind is float else kind) and (kind is bool or not isinstance(value, bool))
+    if not fits:
+        raise TrainerError(f"{called} is {value!r}, not {WORDS[kind]}")
+    if name == "activationFunction" and value.lower() not in [label.lower() for label in ACTIVATIONS]:
+        raise TrainerError(f"{called} is {value!r}, not one of {', '.join(ACTIVATIONS)}")
+    low, high = LIMITS.get(name, (-math.inf, math.inf))
+    if kind in (int, float) and not low <= value <= high:
+        raise TrainerError(f"{called} is {value}, not between {low} and {high}")
+
+
+def normalised(values):
+    """The activation function with the capitals of its label."""
+    labels = {label.lower(): label for label in ACTIVATIONS}
+    return {name: labels[value.lower()] if name == "activationFunction" else value for name, value in values.items()}

@@ -1,0 +1,105 @@
+# SPDX-License-Identifier: Apache-2.0
+"""Principal shapes: an orthonormal basis that holds as much of the deltas as few shapes can.
+
+The deltas are not centred: a model directory has no mean shape, so the shapes have to span the mean as well.
+The basis is a truncated singular value decomposition of the deltas X [rows, 3 * D], by the eigenvectors of the smaller
+of X X^T and X^T X where that is small, else by random projection with power iterations (Halko, Martinsson, Tropp,
+"Finding structure with randomness", SIAM Review 53, 2011, algorithms 4.4 and 5.1).
+"""
+
+from dataclasses import dataclass
+
+import numpy as np
+import scipy.linalg
+
+EXACT_SIDE = 2048        # largest matrix whose eigenvectors are computed: some seconds
+OVERSAMPLING = 10        # Halko et al., section 4.2: 5 or 10
+POWER_ITERATIONS = 3
+RELATIVE_FLOOR = 1e-6    # singular values below this part of the largest are rounding of float32 data
+
+
+@dataclass(frozen=True)
+class Basis:
+    shapes: np.ndarray   # float32 [S, 3 * D], orthonormal rows
+    explained: float     # part of the sum of squares of the deltas that the shapes hold
+
+    def coefficients(self, deltas):
+        return deltas @ self.shapes.T
+
+
+def principal_basis(dataset, rows, limit, accuracy, seed):
+    """The fewest shapes, at most `limit`, that hold `accuracy` (0 to 1) of the sum of squares of the deltas of `rows`.
+
+    At least one. The same arguments give the same bits on one machine.
+    """
+    limit = min(limit, len(rows), dataset.deltas.shape[1])
+    if min(len(rows), dataset.deltas.shape[1]) <= EXACT_SIDE:
+        vectors, values, total = exact(dataset, rows, limit)
+    else:
+        vectors, values, total = randomized(dataset, rows, limit, seed)
+    parts = np.cumsum(values**2) / total
+    usable = max(1, int(np.count_nonzero(values > RELATIVE_FLOOR * values[0])))
+    count = min(usable, int(np.searchsorted(parts[:usable], accuracy - 1e-9)) + 1)
+    return Basis(with_fixed_signs(vectors[:count]).astype(np.float32), float(min(1.0, parts[count - 1])))
+
+
+def exact(dataset, rows, limit):
+    """The first right singular vectors [limit, 3 * D], singular values and the sum of squares of all deltas."""
+    tall = len(rows) > dataset.deltas.shape[1]
+    gram = inner_products(dataset, rows) if tall else outer_products(dataset, rows)
+    side = len(gram)
+    squares, vectors = scipy.linalg.eigh(gram, subset_by_index=[side - limit, side - 1])
+    values, vectors = np.sqrt(np.maximum(squares[::-1], 0)), vectors[:, ::-1].T
+    if not tall:
+        # from left to right singular vectors; orthonormal again, as small singular values lose digits on the way
+        vectors = np.linalg.qr(times_deltas(dataset, rows, vectors).T)[0].T
+    return vectors, values, np.trace(gram)
+
+
+def inner_products(dataset, rows):
+    gram = np.zeros((dataset.deltas.shape[1],) * 2)
+    for _, block in dataset.blocks(rows):
+        block = block.astype(np.float64)
+        gram += block.T @ block
+    return gram
+
+
+def outer_products(dataset, rows):
+    """X X^T, by columns: each product sees all rows of a few columns."""
+    gram = np.zeros((len(rows),) * 2)
+    step = max(1, (64 << 20) // (8 * len(rows)))
+    for first in range(0, dataset.deltas.shape[1], step):
+        block = dataset.deltas[:, first:first + step][rows].astype(np.float64)
+        gram += block @ block.T
+    return gram
+
+
+def times_deltas(dataset, rows, left):
+    """left [k, rows] times X: [k, 3 * D]."""
+    product, done = np.zeros((len(left), dataset.deltas.shape[1])), 0
+    for part, block in dataset.blocks(rows):
+        product += left[:, done:done + len(part)] @ block.astype(np.float64)
+        done += len(part)
+    return product
+
+
+def randomized(dataset, rows, limit, seed):
+    size = min(limit + OVERSAMPLING, len(rows), dataset.deltas.shape[1])
+    right = np.linalg.qr(np.random.default_rng(seed).standard_normal((dataset.deltas.shape[1], size)))[0]
+    for _ in range(POWER_ITERATIONS):
+        left = np.linalg.qr(deltas_times(dataset, rows, right))[0]
+        right = np.linalg.qr(times_deltas(dataset, rows, left.T).T)[0]
+    projected = deltas_times(dataset, rows, right)
+    _, values, turn = np.linalg.svd(projected, full_matrices=False)
+    total = sum(float(np.sum(np.square(block, dtype=np.float64))) for _, block in dataset.blocks(rows))
+    return (turn @ right.T)[:limit], values[:limit], total
+
+
+def deltas_times(dataset, rows, right):
+    return np.concatenate([block.astype(np.float64) @ right for _, block in dataset.blocks(rows)])
+
+
+def with_fixed_signs(vectors):
+    """A singular vector has no sign of its own: the entry of largest magnitude becomes positive."""
+    largest = np.argmax(np.abs(vectors), axis=1)
+    return vectors * np.where(vectors[np.arange(len(vectors)), largest] < 0, -1.0, 1.0)[:, None]

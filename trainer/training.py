@@ -1,0 +1,97 @@
+# SPDX-License-Identifier: Apache-2.0
+"""Training: the split of the rows, the loop over epochs, early stopping. The same seed gives the same bits."""
+
+import copy
+import math
+from dataclasses import dataclass, field
+
+import numpy as np
+import torch
+
+from trainer.errors import TrainerError
+
+
+@dataclass
+class History:
+    train: list = field(default_factory=list)       # mean loss of each epoch
+    validation: list = field(default_factory=list)  # empty without validation rows
+    best_epoch: int = 0                             # from 1
+    best_loss: float = math.inf
+
+
+def make_deterministic(seed, threads):
+    torch.manual_seed(seed)
+    torch.use_deterministic_algorithms(True)
+    torch.set_num_threads(threads)
+
+
+def split_rows(count, ratio, seed):
+    """Sorted rows to train on, and rows to validate on, drawn at random: the poses of a data set are in no order.
+
+    At least one row is left to train on; with a ratio above 0 and two rows, one validates."""
+    held = min(count - 1, max(1, round(count * ratio))) if ratio > 0 else 0
+    order = np.random.default_rng(seed).permutation(count)
+    return np.sort(order[held:]), np.sort(order[:held])
+
+
+def fit(network, inputs, targets_of, split, settings, seed, on_epoch):
+    """Trains `network` and leaves it with its best weights.
+
+    inputs      float32 [F, C], normalised controls of all rows
+    targets_of  gives float32 [n, K], normalised outputs, for an array of sorted rows
+    split       rows to train on, rows to validate on (may be none: then the training loss decides)
+    on_epoch    called with the History after each epoch; what it raises ends the training
+    """
+    rows, held = split
+    order = np.random.default_rng((seed, 1))
+    optimizer = torch.optim.Adam(network.parameters(), lr=settings.learningRate)
+    steps = settings.epochs * math.ceil(len(rows) / settings.batchSize)
+    history, best = History(), None
+    for epoch in range(1, settings.epochs + 1):
+        batches = cut(order.permutation(rows), settings.batchSize)
+        history.train.append(train_epoch(network, inputs, targets_of, batches, optimizer, settings, (epoch - 1), steps))
+        if len(held):
+            history.validation.append(mean_loss(network, inputs, targets_of, cut(held, settings.batchSize)))
+        loss = (history.validation or history.train)[-1]
+        if not math.isfinite(loss):
+            raise TrainerError(f"the loss of epoch {epoch} is {loss}: the training has diverged; give a learning rate "
+                               f"below {settings.learningRate:g}")
+        if loss < history.best_loss:
+            history.best_loss, history.best_epoch = loss, epoch
+            best = copy.deepcopy(network.state_dict())
+        on_epoch(history)
+        if epoch - history.best_epoch >= settings.patience:
+            break
+    network.load_state_dict(best)
+    return history
+
+
+def cut(rows, size):
+    """Batches, each in ascending order, in which rows are best read from a file."""
+    return [np.sort(rows[first:first + size]) for first in range(0, len(rows), size)]
+
+
+def train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch, steps):
+    network.train()
+    total = 0.0
+    for index, batch in enumerate(batches):
+        # half a cosine from the full rate to 0 over all steps
+        step = epoch * len(batches) + index
+        optimizer.param_groups[0]["lr"] = settings.learningRate * 0.5 * (1 + math.cos(math.pi * step / steps))
+        optimizer.zero_grad()
+        loss = batch_loss(network, inputs, targets_of, batch)
+        loss.backward()
+        optimizer.step()
+        total += float(loss.detach()) * len(batch)
+    return total / sum(map(len, batches))
+
+
+def mean_loss(network, inputs, targets_of, batches):
+    network.eval()
+    with torch.no_grad():
+        total = sum(float(batch_loss(network, inputs, targets_of, batch)) * len(batch) for batch in batches)
+    return total / sum(map(len, batches))
+
+
+def batch_loss(network, inputs, targets_of, batch):
+    return torch.nn.functional.mse_loss(network(torch.from_numpy(inputs[batch])), torch.from_numpy(targets_of(batch)))
