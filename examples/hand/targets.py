@@ -10,9 +10,10 @@ import sys
 import tempfile
 
 for variable in ("OMP_NUM_THREADS", "OPENBLAS_NUM_THREADS", "MKL_NUM_THREADS"):
-    os.environ[variable] = "1"  # a process is one thread: sums are made in one order, and jobs do not get in each other's way
+    os.environ[variable] = "1"  # a process is one thread: sums are made in one order, and jobs stay out of each other's way
 
-import multiprocessing  # noqa: E402
+from concurrent.futures import ProcessPoolExecutor  # noqa: E402
+from concurrent.futures.process import BrokenProcessPool  # noqa: E402
 
 import numpy as np  # noqa: E402
 from relaxation import Relaxation  # noqa: E402
@@ -32,6 +33,8 @@ def main():
         sys.exit(f"targets.py: {error}")
     except OSError as error:
         sys.exit(f"targets.py: {error.filename or arguments.output}: {error.strerror}")
+    except BrokenProcessPool:
+        sys.exit("targets.py: one of the processes was ended from outside; fewer --jobs need less memory")
     except KeyboardInterrupt:
         sys.exit(130)
 
@@ -87,14 +90,14 @@ def start_worker(mesh, path):
 
 
 def relax_chunk(first):
-    """The first frame and the relaxed frames from there on; the sums over vertices of the distances moved."""
+    """The relaxed frames from `first` on; of the distances that vertices moved the sum and the largest."""
     skin = np.array(Worker.skin[first:first + CHUNK], dtype=float)
     if not np.isfinite(skin).all():
         bad = first + int(np.argmin(np.isfinite(skin).all(axis=(1, 2))))
-        raise BadInput(f"frame {bad} of the skin (counted from 0) has positions that are not finite")
+        raise BadInput(f"{Worker.skin.filename}: frame {bad} (counted from 0) has positions that are not finite")
     relaxed = np.stack([Worker.relaxation.relax(frame) for frame in skin])
     distances = np.linalg.norm(relaxed - skin, axis=2)
-    return first, relaxed.astype("<f4"), distances.sum(), distances.max()
+    return relaxed.astype("<f4"), distances.sum(), distances.max()
 
 
 # --- the file ---
@@ -102,30 +105,35 @@ def relax_chunk(first):
 def write_targets(mesh, skin_path, frame_count, arguments):
     """The output appears when it is complete, or not at all."""
     folder, name = os.path.split(os.path.abspath(arguments.output))
+    if not os.path.isdir(folder):
+        raise BadInput(f"{folder}: there is no such folder")
     handle, part = tempfile.mkstemp(prefix=f".{name}.", suffix=".part", dir=folder)
-    os.close(handle)
     try:
-        out = np.lib.format.open_memmap(part, "w+", "<f4", (frame_count, len(mesh.points), 3))
-        total, largest = fill(out, mesh, skin_path, arguments)
-        out.flush()
-        del out
+        with os.fdopen(handle, "wb") as file:
+            shape = (frame_count, len(mesh.points), 3)
+            np.lib.format.write_array_header_1_0(file, {"descr": "<f4", "fortran_order": False, "shape": shape})
+            total, largest = write_frames(file, mesh, skin_path, frame_count, arguments)
         os.chmod(part, 0o666 & ~current_umask())
         os.replace(part, arguments.output)
     finally:
         if os.path.exists(part):
             os.unlink(part)
     if not arguments.quiet:
-        print(f"{arguments.output}: {frame_count} frames of {len(mesh.points)} vertices, {total / frame_count / len(mesh.points):.3g} "
-              f"from the skin in the mean, {largest:.3g} at most (scene units)")
+        mean = total / frame_count / len(mesh.points)
+        print(f"{arguments.output}: {frame_count} frames of {len(mesh.points)} vertices, {mean:.3g} from the skin in the "
+              f"mean, {largest:.3g} at most (scene units)")
 
 
-def fill(out, mesh, skin_path, arguments):
+def write_frames(file, mesh, skin_path, frame_count, arguments):
     total, largest, done = 0.0, 0.0, 0
-    with multiprocessing.Pool(arguments.jobs, start_worker, (mesh, skin_path)) as pool:
-        for first, frames, distance_sum, distance_max in pool.imap(relax_chunk, range(0, len(out), CHUNK)):
-            out[first:first + len(frames)] = frames
-            total, largest, done = total + distance_sum, max(largest, distance_max), first + len(frames)
-            show_progress(done, len(out), arguments.quiet)
+    pool = ProcessPoolExecutor(arguments.jobs, initializer=start_worker, initargs=(mesh, skin_path))
+    try:
+        for frames, distance_sum, distance_max in pool.map(relax_chunk, range(0, frame_count, CHUNK)):
+            file.write(frames.tobytes())
+            total, largest, done = total + distance_sum, max(largest, distance_max), done + len(frames)
+            show_progress(done, frame_count, arguments.quiet)
+    finally:
+        pool.shutdown(cancel_futures=True)
     return total, largest
 
 
