@@ -9,8 +9,9 @@ import signal
 import sys
 import tempfile
 
+# a process is one thread: sums are made in one order, and jobs stay out of each other's way
 for variable in ("OMP_NUM_THREADS", "OPENBLAS_NUM_THREADS", "MKL_NUM_THREADS"):
-    os.environ[variable] = "1"  # a process is one thread: sums are made in one order, and jobs stay out of each other's way
+    os.environ[variable] = "1"
 
 from concurrent.futures import ProcessPoolExecutor  # noqa: E402
 from concurrent.futures.process import BrokenProcessPool  # noqa: E402
@@ -64,7 +65,8 @@ def open_skin(path, mesh):
     except (ValueError, EOFError) as error:
         raise BadInput(f"{path}: not a NumPy array file, or cut short ({error})") from error
     if skin.ndim != 3 or skin.shape[2] != 3 or skin.dtype.str != "<f4":
-        raise BadInput(f"{path}: has the shape {list(skin.shape)} of {skin.dtype.str}, not [frames, vertices, 3] of <f4")
+        raise BadInput(f"{path}: has the shape {list(skin.shape)} of {skin.dtype.str}, "
+                       "not [frames, vertices, 3] of <f4")
     if skin.shape[1] != len(mesh.points):
         raise BadInput(f"{path}: has {skin.shape[1]} vertices, but mesh '{mesh.name}' has {len(mesh.points)}; "
                        "bake the skin from the same scene")
@@ -120,8 +122,8 @@ def write_targets(mesh, skin_path, frame_count, arguments):
             os.unlink(part)
     if not arguments.quiet:
         mean = total / frame_count / len(mesh.points)
-        print(f"{arguments.output}: {frame_count} frames of {len(mesh.points)} vertices, {mean:.3g} from the skin in the "
-              f"mean, {largest:.3g} at most (scene units)")
+        print(f"{arguments.output}: {frame_count} frames of {len(mesh.points)} vertices, {mean:.3g} from the skin "
+              f"in the mean, {largest:.3g} at most (scene units)")
 
 
 def write_frames(file, mesh, skin_path, frame_count, arguments):

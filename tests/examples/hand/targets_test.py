@@ -103,7 +103,7 @@ class TargetsTest(unittest.TestCase):
         spoiled = np.repeat(rest, 3, axis=0)
         spoiled[2, 7, 1] = np.nan
         for name, skin, more, expected in [
-                ("other mesh", rest[:, 1:], [], f"skin.npy: has {len(POINTS) - 1} vertices, but mesh 'tube' has {len(POINTS)}"),
+                ("other mesh", rest[:, 1:], [], "skin.npy: has 299 vertices, but mesh 'tube' has 300"),
                 ("one frame, no axis", rest[0], [], "not \\[frames, vertices, 3\\]"),
                 ("doubles", POINTS[None], [], "of <f8, not"),
                 ("no frames", rest[:0], [], "no frames"),
@@ -117,24 +117,27 @@ class TargetsTest(unittest.TestCase):
                 self.assertEqual(sorted(p.name for p in self.folder.iterdir()), ["scene.json", "skin.npy"])
 
     def test_refuses_scenes(self):
+        rest = POINTS[None].astype("<f4")
+
         def changed(change):
             other = scene()
-            change(other)
+            mesh, skin = other["nodes"]
+            change(other, mesh["values"]["inMesh"], skin["values"])
             return json.dumps(other)
 
         for name, text, expected in [
                 ("cut short", json.dumps(scene())[:-9], "not JSON"),
                 ("a list", "[]", "not a scene"),
-                ("not skinned", changed(lambda s: s["connections"].clear()), "no mesh node is connected"),
-                ("no weights", changed(lambda s: s["nodes"][1].pop("values")), "not a scene .*values"),
-                ("too few weights", changed(lambda s: s["nodes"][1]["values"]["skin[0].skinWeights"].pop()), "does not fit"),
-                ("corner", changed(lambda s: s["nodes"][0]["values"]["inMesh"]["corners"].__setitem__(3, 999)), "polygons"),
-                ("influence", changed(lambda s: s["nodes"][1]["values"]["skin[0].influences"].__setitem__(3, -1)), "scene")]:
+                ("not skinned", changed(lambda s, mesh, skin: s["connections"].clear()), "no mesh node is connected"),
+                ("no weights", changed(lambda s, mesh, skin: s["nodes"][1].pop("values")), "not a scene .*values"),
+                ("too few weights", changed(lambda s, mesh, skin: skin["skin[0].skinWeights"].pop()), "does not fit"),
+                ("corner", changed(lambda s, mesh, skin: mesh["corners"].append(999)), "polygons"),
+                ("influence", changed(lambda s, mesh, skin: skin["skin[0].influences"].__setitem__(3, -1)), "scene")]:
             with self.subTest(name):
                 (self.folder / "scene.json").write_text(text)
-                self.assertRegex(self.run_script(POINTS[None].astype("<f4"), status=1), f"^targets.py: .*{expected}.*\n$")
+                self.assertRegex(self.run_script(rest, status=1), f"^targets.py: .*{expected}.*\n$")
         (self.folder / "scene.json").unlink()
-        self.assertRegex(self.run_script(POINTS[None].astype("<f4"), status=1), "scene.json: No such file")
+        self.assertRegex(self.run_script(rest, status=1), "scene.json: No such file")
 
 
 if __name__ == "__main__":
