@@ -4,6 +4,7 @@
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/common.sh
+. scripts/npm_package.sh
 
 package=com.github.asus4.onnxruntime
 version=0.4.9
@@ -23,25 +24,6 @@ is_given() {
   [[ -n ${ONNXRUNTIME_ROOT:-} ]] || return 1
   compgen -G "$ONNXRUNTIME_ROOT/lib*/libonnxruntime.so*" >/dev/null ||
     fail "ONNXRUNTIME_ROOT=$ONNXRUNTIME_ROOT holds no lib/libonnxruntime.so; unset it to fetch the pinned one"
-}
-
-is_intact() {
-  local expected actual
-  expected=$(base64 -d <<<"$integrity" | od -An -v -tx1 | tr -d ' \n')
-  actual=$(sha512sum <"$1" | cut -d ' ' -f 1)
-  [[ $actual == "$expected" ]]
-}
-
-# Leaves the verified archive in the cache; the last step of a download is a rename, so a broken one leaves nothing.
-download() {
-  local archive=$1 log=$scratch/npm.log
-  need_packages npm
-  say "fetching $package $version (150 MB)"
-  (cd "$scratch" && npm pack --loglevel=error "$package@$version" </dev/null >"$log" 2>&1) ||
-    fail "npm could not fetch $package@$version ($(grep -m 1 -i 'err' "$log" || tail -n 1 "$log")); check the network and npm's registry, or set ONNXRUNTIME_ROOT"
-  is_intact "$scratch/$package-$version.tgz" ||
-    fail "$package-$version.tgz does not have the pinned hash: check npm's registry, or set ONNXRUNTIME_ROOT"
-  mv "$scratch/$package-$version.tgz" "$archive"
 }
 
 unpack() {
@@ -66,12 +48,7 @@ is_given && exit 0
   fail "the pinned ONNX Runtime is for x86-64 processors: set ONNXRUNTIME_ROOT to one for this machine"
 
 cache=$(cache_folder)
-archive=$cache/$package-$version.tgz
 scratch=$(mktemp -d "$cache/fetch.XXXXXX")
 trap 'rm -rf "$scratch"' EXIT
-if [[ -e $archive ]] && ! is_intact "$archive"; then
-  say "the cached $archive is damaged: fetching it again"
-  rm -f "$archive"
-fi
-[[ -e $archive ]] || download "$archive"
+npm_package "$package" "$version" "$integrity" "$scratch" ", or set ONNXRUNTIME_ROOT"
 unpack "$archive"
