@@ -6,6 +6,7 @@
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HMatrix.h"
 #include "openquarn/HTransformationMatrix.h"
+#include "quarn/pose/PoseControls.h"
 #include "quarn/scene/plugs.h"
 
 #include <algorithm>
@@ -17,7 +18,7 @@ namespace quarn {
 namespace {
 
 std::string curveName(const HPlug& plug) {
-    std::string name = plug.name().asChar();
+    std::string name = writtenName(plug);
     for (char& letter : name)
         if (std::isalnum(static_cast<unsigned char>(letter)) == 0)
             letter = '_';
@@ -94,10 +95,6 @@ void goToRest(const HPlug& compound) {
     for (unsigned axis = 0; axis < 3; ++axis)
         if (const HPlug child = compound.child(axis); !child.isLocked() && !child.isDestination())
             setNumber(child, std::abs(values[axis]) < rounding ? 0.0 : values[axis]);
-}
-
-HPlug wholeOf(const HPlug& plug) {
-    return plug.isElement() ? plug.array() : plug.isChild() ? plug.parent() : HPlug();
 }
 
 void release(const HPlug& plug) {
