@@ -148,6 +148,8 @@ void target(Options& options) {
     const Warp warp = Warp::find(options.deformer);
     const WarpGeometry& geometry = warp.geometry(options.geometry);
     const Cache cache = fittingCache(options, geometry);
+    if (const fs::path folder = options.output.parent_path(); fs::is_directory(folder))
+        session.moveTo(folder); // before the cache is named: its path counts from there
     const std::string named = pathForScene(cache.path, options.output.parent_path());
     const TargetReport report = connectTarget(warp, geometry, named, options.startFrame);
     session.save(options.output);

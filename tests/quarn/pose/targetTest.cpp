@@ -64,6 +64,16 @@ TEST_F(TargetTest, TargetsPlayFromTheFirstExportedFrameAndAreReplaced) {
     EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", two, "--geometry", "strip", "--start-frame", "6", "-o",
                                    path("caches/other.json"), "--json"}),
                 HasSubstr("\"replaced\": true"));
+    // what a scene names by a path from its folder is found from the folder that it is saved in
+    stripScene::quarn({"target", scene(), "--cache", one});
+    std::filesystem::create_directory(path("elsewhere"));
+    stripScene::quarn({"pose", scene(), "-o", path("elsewhere/posed.json"), "--samples", "3", "--start", "5"});
+    EXPECT_EQ(first(*open("elsewhere/posed.json"), 6, "strip_target.outMesh"), 11.0);
+    stripScene::quarn({"pose", scene(), "-o", path("caches/posed.json"), "--samples", "3", "--start", "5"});
+    {
+        const auto moved = open("caches/posed.json");
+        EXPECT_EQ(quarn::textOf(quarn::findPlug("strip_target.cacheFile")), "one.npy");
+    }
     const auto session = open("caches/other.json"); // from where two.npy is outside
     EXPECT_EQ(quarn::nodesOfType("pointCache").size(), 1U);
     EXPECT_EQ(first(*session, 7, "strip_target.outMesh"), 21.0);
