@@ -4,11 +4,11 @@
 #include "openquarn/HFnAttribute.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/NodeTypes.h"
+#include "quarn/pose/numberText.h"
 #include "quarn/scene/plugs.h"
 
 #include <cmath>
 #include <map>
-#include <sstream>
 #include <stdexcept>
 
 namespace quarn {
@@ -39,13 +39,6 @@ private:
     std::string text_;
 };
 
-std::string number(double value) {
-    std::ostringstream text;
-    text.imbue(std::locale::classic());
-    text << value;
-    return text.str();
-}
-
 std::string whatIsWrong(const ValueLimits& limits) {
     if (!std::isfinite(limits.least) || !std::isfinite(limits.most) || !std::isfinite(limits.rest))
         return "are not finite";
@@ -61,8 +54,8 @@ ValueLimits limitsOf(const HObject& collector, unsigned list, unsigned value, Co
     limits.most = numberOf(plugOf(collector, path + ".maxValue"));
     limits.rest = numberOf(plugOf(collector, path + ".defaultValue"));
     if (const std::string wrong = whatIsWrong(limits); !wrong.empty())
-        complaints.add(nodeName(collector) + "." + path + " " + wrong + ": " + number(limits.least) + " to " +
-                       number(limits.most) + ", default " + number(limits.rest));
+        complaints.add(nodeName(collector) + "." + path + " " + wrong + ": " + numberText(limits.least) + " to " +
+                       numberText(limits.most) + ", default " + numberText(limits.rest));
     return limits;
 }
 
