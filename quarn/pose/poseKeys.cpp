@@ -70,7 +70,10 @@ HEulerRotation restRotation(const HObject& joint, const HTransformationMatrix& r
     return HEulerRotation::fromMatrix(turn, order);
 }
 
-HVector restValues(const HObject& joint, const std::string& channel, const HMatrix& restMatrix) {
+HVector restValues(const HObject& joint, const std::string& channel) {
+    const HMatrix restMatrix = plugOf(joint, "restMatrix").asMatrix();
+    if (restMatrix == HMatrix()) // nobody has said what the rest pose is
+        return channel == "scale" ? HVector(1.0, 1.0, 1.0) : HVector();
     const HTransformationMatrix rest(restMatrix);
     if (channel == "translate")
         return rest.translation(HSpace::kTransform);
@@ -87,10 +90,7 @@ void goToRest(const HPlug& compound) {
     const std::string channel = compound.partialName().asChar();
     if (nodeType(node) != "joint" || (channel != "translate" && channel != "rotate" && channel != "scale"))
         return;
-    const HMatrix restMatrix = plugOf(node, "restMatrix").asMatrix();
-    if (restMatrix == HMatrix())
-        return; // nobody has said what the rest pose is
-    const HVector values = restValues(node, channel, restMatrix);
+    const HVector values = restValues(node, channel);
     constexpr double rounding = 1e-12;
     for (unsigned axis = 0; axis < 3; ++axis)
         if (const HPlug child = compound.child(axis); !child.isLocked() && !child.isDestination())
