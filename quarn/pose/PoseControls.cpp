@@ -2,11 +2,13 @@
 #include "quarn/pose/PoseControls.h"
 
 #include "openquarn/HFnAttribute.h"
+#include "openquarn_app/Evaluation.h"
+#include "openquarn_app/NodeTypes.h"
+#include "quarn/pose/numberText.h"
 #include "quarn/scene/plugs.h"
 
 #include <cmath>
 #include <map>
-#include <sstream>
 #include <stdexcept>
 
 namespace quarn {
@@ -37,13 +39,6 @@ private:
     std::string text_;
 };
 
-std::string number(double value) {
-    std::ostringstream text;
-    text.imbue(std::locale::classic());
-    text << value;
-    return text.str();
-}
-
 std::string whatIsWrong(const ValueLimits& limits) {
     if (!std::isfinite(limits.least) || !std::isfinite(limits.most) || !std::isfinite(limits.rest))
         return "are not finite";
@@ -59,8 +54,8 @@ ValueLimits limitsOf(const HObject& collector, unsigned list, unsigned value, Co
     limits.most = numberOf(plugOf(collector, path + ".maxValue"));
     limits.rest = numberOf(plugOf(collector, path + ".defaultValue"));
     if (const std::string wrong = whatIsWrong(limits); !wrong.empty())
-        complaints.add(nodeName(collector) + "." + path + " " + wrong + ": " + number(limits.least) + " to " +
-                       number(limits.most) + ", default " + number(limits.rest));
+        complaints.add(nodeName(collector) + "." + path + " " + wrong + ": " + numberText(limits.least) + " to " +
+                       numberText(limits.most) + ", default " + numberText(limits.rest));
     return limits;
 }
 
@@ -69,11 +64,23 @@ void checkSource(const PoseControl& control, std::map<std::string, std::string>&
         problems.add(control.input + " has no source");
         return;
     }
-    const std::string source = control.plug.name().asChar();
+    const std::string source = writtenName(control.plug);
     if (const std::string why = whyNotKeyable(control.plug); !why.empty())
         problems.add(source + " (into " + control.input + ") " + why);
     if (const auto [known, isNew] = inputBySource.emplace(source, control.input); !isNew)
         problems.add(source + " is the source of both " + known->second + " and " + control.input);
+}
+
+// some outputs can be set, but what their node computes is written over that
+bool isComputed(const HPlug& plug) {
+    const std::vector<OpenQuarn::AffectsInfo> dependencies = OpenQuarn::dependenciesOf(nodeType(plug.node()));
+    for (HObject attribute = plug.attribute(); !attribute.isNull(); attribute = HFnAttribute(attribute).parent()) {
+        const std::string name = HFnAttribute(attribute).name().asChar();
+        for (const OpenQuarn::AffectsInfo& dependency : dependencies)
+            if (dependency.affected == name)
+                return true;
+    }
+    return false;
 }
 
 HObject collectorAt(const HPlug& source) {
@@ -102,23 +109,35 @@ HObject poseCollector(const Warp& warp) {
     return collector;
 }
 
+HPlug wholeOf(const HPlug& plug) {
+    return plug.isElement() ? plug.array() : plug.isChild() ? plug.parent() : HPlug();
+}
+
+std::string writtenName(const HPlug& plug) {
+    for (HPlug place = plug; !place.isNull(); place = wholeOf(place))
+        if (place.isElement())
+            return plug.name().asChar();
+    return nodeName(plug.node()) + "." + HFnAttribute(plug.attribute()).name().asChar();
+}
+
 std::string whyNotKeyable(const HPlug& plug) {
     const HFnAttribute attribute(plug.attribute());
     if (plug.isArray() || !plug.attribute().hasFn(HFn::kNumericAttribute))
         return "is no number";
-    if (!attribute.isWritable())
+    if (!attribute.isWritable() || isComputed(plug))
         return "is an output";
     if (!attribute.isConnectable())
         return "cannot be connected into";
-    for (HPlug place = plug; !place.isNull(); place = place.isElement() ? place.array()
-                                                      : place.isChild() ? place.parent()
-                                                                        : HPlug())
+    for (HPlug place = plug; !place.isNull(); place = wholeOf(place))
         if (place.isLocked())
-            return place == plug ? "is locked" : "is locked, as a part of " + std::string(place.name().asChar());
+            return place == plug ? "is locked" : "is locked, as a part of " + writtenName(place);
     return {};
 }
 
 std::vector<PoseControl> poseControls(const HObject& collector) {
+    // what a connection of a whole list brings is there once it has been evaluated
+    if (const HStatus status = OpenQuarn::evaluate(plugOf(collector, "output")); status.error())
+        throw std::runtime_error(nodeName(collector) + ": " + status.errorString().asChar());
     std::vector<PoseControl> controls;
     std::map<std::string, std::string> inputBySource;
     Complaints sources;

@@ -25,6 +25,12 @@ HObject poseCollector(const Warp& warp);
 /// order or not finite. Thread: main.
 std::vector<PoseControl> poseControls(const HObject& collector);
 
+/// What the plug is a part of: its array or its compound; null when it is neither an element nor a child.
+HPlug wholeOf(const HPlug& plug);
+
+/// The plug as users write it: "joint.rotateX", without the compounds on the way where no array is among them.
+std::string writtenName(const HPlug& plug);
+
 /// Why no keys can be put on the plug, as in "is locked"; empty when they can. Thread: main.
 std::string whyNotKeyable(const HPlug& plug);
 

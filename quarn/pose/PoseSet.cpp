@@ -26,7 +26,11 @@ std::vector<double> projectionWeights(std::size_t count) {
 PoseSet::PoseSet(std::vector<ValueLimits> limits, double tolerance)
     : limits_(std::move(limits))
     , tolerance_(tolerance)
-    , weights_(projectionWeights(limits_.size())) {}
+    , weights_(projectionWeights(limits_.size())) {
+    reach_.reserve(limits_.size());
+    for (std::size_t i = 0; i < limits_.size(); ++i)
+        reach_.push_back(tolerance * range(i));
+}
 
 double PoseSet::range(std::size_t value) const {
     const double range = limits_[value].most - limits_[value].least;
@@ -42,7 +46,7 @@ double PoseSet::projection(std::span<const double> pose) const {
 
 bool PoseSet::near(std::span<const double> one, std::span<const double> other) const {
     for (std::size_t i = 0; i < one.size(); ++i)
-        if (std::abs(one[i] - other[i]) / range(i) >= tolerance_)
+        if (std::abs(one[i] - other[i]) >= reach_[i])
             return false;
     return true;
 }

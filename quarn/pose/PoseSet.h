@@ -44,6 +44,7 @@ private:
 
     std::vector<ValueLimits> limits_;
     double tolerance_;
+    std::vector<double> reach_;                  ///< of each value: what the tolerance is in its unit
     std::vector<double> weights_;                ///< of the values in the projection; above 0, their sum is 1
     std::vector<double> values_;                 ///< pose by pose
     std::multimap<double, std::size_t> byPlace_; ///< poses by their projection

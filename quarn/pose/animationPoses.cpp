@@ -20,18 +20,10 @@ constexpr double largestFrame = 1e8;
 // a key may miss its frame by a hair, having been seconds
 constexpr double hair = 1e-6;
 
-void requireOwnAnimation(const PoseControl& control) {
-    const HPlug source = control.plug.source();
-    if (!source.isNull() && isPoseCurve(source.node()))
-        throw std::runtime_error(std::string(control.plug.name().asChar()) +
-                                 " has the keys of an earlier quarn pose, which took the animation off; sample the "
-                                 "animation from the scene before that");
-}
-
 double valueAt(OpenQuarn::EvaluationContext& context, const PoseControl& control, int frame) {
     HStatus status;
     const double value = context.evaluateAt(control.plug, &status).asDouble();
-    const std::string where = std::string(control.plug.name().asChar()) + " at frame " + std::to_string(frame);
+    const std::string where = writtenName(control.plug) + " at frame " + std::to_string(frame);
     if (status.error())
         throw std::runtime_error(where + " could not be evaluated: " + status.errorString().asChar());
     if (!std::isfinite(value))
@@ -45,6 +37,14 @@ bool isOutside(double value, const ValueLimits& limits) {
 }
 
 } // namespace
+
+void requireOwnAnimation(const std::vector<PoseControl>& controls) {
+    for (const PoseControl& control : controls)
+        if (const HPlug source = control.plug.source(); !source.isNull() && isPoseCurve(source.node()))
+            throw std::runtime_error(writtenName(control.plug) +
+                                     " has the keys of an earlier quarn pose, which took the animation off; sample "
+                                     "the animation from the scene before that");
+}
 
 FrameRange animationExtent() {
     double first = std::numeric_limits<double>::infinity();
@@ -68,7 +68,6 @@ FrameRange animationExtent() {
 
 AnimationPoses addAnimationPoses(PoseSet& poses, const std::vector<PoseControl>& controls, const FrameRange& frames,
                                  const std::function<void(std::size_t)>& step) {
-    std::for_each(controls.begin(), controls.end(), requireOwnAnimation);
     AnimationPoses result;
     OpenQuarn::EvaluationContext context(frames.first);
     std::vector<double> pose(controls.size());
@@ -79,7 +78,7 @@ AnimationPoses addAnimationPoses(PoseSet& poses, const std::vector<PoseControl>&
             pose[i] = valueAt(context, controls[i], frames.frame(number));
             outside = outside || isOutside(pose[i], controls[i].limits);
             if (outside && result.firstOutside.empty())
-                result.firstOutside = controls[i].plug.name().asChar();
+                result.firstOutside = writtenName(controls[i].plug);
         }
         result.outside += outside ? 1U : 0U;
         result.dropped += poses.add(pose) ? 0U : 1U;

@@ -9,6 +9,10 @@
 
 namespace quarn {
 
+/// Throws std::runtime_error, naming the plug, when one has keys of an earlier sampling: then its animation is gone.
+/// Thread: main.
+void requireOwnAnimation(const std::vector<PoseControl>& controls);
+
 /// From the first to the last key of all curves of the scene that drive something, but for those of an earlier
 /// sampling. Throws std::runtime_error when there are none. Thread: main.
 FrameRange animationExtent();
@@ -22,8 +26,7 @@ struct AnimationPoses {
 
 /// Adds the pose of each frame to the set, whose values are those of `controls`; the scene stays as it is. `step` is
 /// called after each frame, and may throw. Throws std::runtime_error, naming plug and frame, when a plug cannot be
-/// evaluated or gives no finite number, and when a plug has keys of an earlier sampling: then its animation is gone.
-/// Thread: main.
+/// evaluated or gives no finite number. Thread: main.
 AnimationPoses addAnimationPoses(PoseSet& poses, const std::vector<PoseControl>& controls, const FrameRange& frames,
                                  const std::function<void(std::size_t)>& step);
 

@@ -6,6 +6,7 @@
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HMatrix.h"
 #include "openquarn/HTransformationMatrix.h"
+#include "quarn/pose/PoseControls.h"
 #include "quarn/scene/plugs.h"
 
 #include <algorithm>
@@ -17,7 +18,7 @@ namespace quarn {
 namespace {
 
 std::string curveName(const HPlug& plug) {
-    std::string name = plug.name().asChar();
+    std::string name = writtenName(plug);
     for (char& letter : name)
         if (std::isalnum(static_cast<unsigned char>(letter)) == 0)
             letter = '_';
@@ -69,7 +70,10 @@ HEulerRotation restRotation(const HObject& joint, const HTransformationMatrix& r
     return HEulerRotation::fromMatrix(turn, order);
 }
 
-HVector restValues(const HObject& joint, const std::string& channel, const HMatrix& restMatrix) {
+HVector restValues(const HObject& joint, const std::string& channel) {
+    const HMatrix restMatrix = plugOf(joint, "restMatrix").asMatrix();
+    if (restMatrix == HMatrix()) // nobody has said what the rest pose is
+        return channel == "scale" ? HVector(1.0, 1.0, 1.0) : HVector();
     const HTransformationMatrix rest(restMatrix);
     if (channel == "translate")
         return rest.translation(HSpace::kTransform);
@@ -86,18 +90,11 @@ void goToRest(const HPlug& compound) {
     const std::string channel = compound.partialName().asChar();
     if (nodeType(node) != "joint" || (channel != "translate" && channel != "rotate" && channel != "scale"))
         return;
-    const HMatrix restMatrix = plugOf(node, "restMatrix").asMatrix();
-    if (restMatrix == HMatrix())
-        return; // nobody has said what the rest pose is
-    const HVector values = restValues(node, channel, restMatrix);
+    const HVector values = restValues(node, channel);
     constexpr double rounding = 1e-12;
     for (unsigned axis = 0; axis < 3; ++axis)
         if (const HPlug child = compound.child(axis); !child.isLocked() && !child.isDestination())
             setNumber(child, std::abs(values[axis]) < rounding ? 0.0 : values[axis]);
-}
-
-HPlug wholeOf(const HPlug& plug) {
-    return plug.isElement() ? plug.array() : plug.isChild() ? plug.parent() : HPlug();
 }
 
 void release(const HPlug& plug) {

@@ -19,8 +19,9 @@ struct PoseKeys {
 /// All throw std::runtime_error, naming the plug. Thread: main.
 
 /// Takes whatever drives the plug away: what is connected into it, or into a plug that it is a part of. The other parts
-/// of that one keep their value, but those of translate, rotate and scale of a joint with a restMatrix go to the rest
-/// pose. Then puts the keys on, driven by the scene's time. Keys that putPoseKeys() put on before are gone.
+/// of that one keep their value, but those of translate, rotate and scale of a joint go to the pose of its restMatrix,
+/// or, when that is the identity, to the defaults of the attributes. Then puts the keys on, driven by the scene's time.
+/// Keys that putPoseKeys() put on before are gone.
 void putPoseKeys(const HPlug& plug, const PoseKeys& keys);
 
 /// The same without keys: the plug has that value, at any time.

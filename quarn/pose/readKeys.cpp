@@ -133,7 +133,7 @@ private:
         } catch (const std::runtime_error& error) {
             fail("names a plug that is not in the scene: " + std::string(error.what()));
         }
-        const std::string fullName = plug.name().asChar();
+        const std::string fullName = writtenName(plug);
         if (const std::string why = whyNotKeyable(plug); !why.empty())
             fail("names " + name + ", which " + why);
         if (const auto [known, isNew] = nameByPlug_.emplace(fullName, name); !isNew)

@@ -3,6 +3,7 @@
 
 #include "quarn/pose/animationPoses.h"
 #include "quarn/pose/drawPoses.h"
+#include "quarn/pose/numberText.h"
 #include "quarn/pose/poseKeys.h"
 #include "quarn/scene/plugs.h"
 
@@ -25,7 +26,7 @@ DrawSettings drawSettings(const HObject& collector, const SampleOptions& options
         throw std::runtime_error("the number of samples is " + std::to_string(count) + ": 1 to " +
                                  std::to_string(mostPoses) + " poses can be drawn");
     if (!(likely >= 0.0 && likely <= 1.0))
-        throw std::runtime_error("the activation rate is " + std::to_string(likely) + ", not from 0 to 1");
+        throw std::runtime_error("the activation rate is " + numberText(likely) + ", not from 0 to 1");
     if (options.samples)
         setNumber(samples, count);
     if (options.activationRate)
@@ -80,6 +81,7 @@ void draw(PoseSet& poses, const HObject& collector, const SampleOptions& options
 
 void takeFromAnimation(PoseSet& poses, const std::vector<PoseControl>& controls, const SampleOptions& options,
                        const Console& console, SampleReport& report) {
+    requireOwnAnimation(controls);
     const FrameRange frames = options.frames.empty() ? animationExtent() : frameRange(options.frames);
     requireRoom(poses.count() + frames.count(), controls.size());
     Progress progress(console, "taking poses from the animation", frames.count());
@@ -95,7 +97,7 @@ void warnOfFew(const Console& console, const SampleReport& report, const SampleO
     if (report.asked)
         console.warn(std::to_string(report.fromLimits) + " poses were found, not " + std::to_string(*report.asked) +
                      ": " + std::to_string(drawsInVain) + " draws in a row gave poses that differ by less than " +
-                     std::to_string(options.tolerance) + " of the range of each value from one that there is. Raise " +
+                     numberText(options.tolerance) + " of the range of each value from one that there is. Raise " +
                      "the activation rate, widen the limits or lower --tolerance");
 }
 

@@ -3,6 +3,7 @@
 
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
+#include "quarn/pose/numberText.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/pose/targetCache.h"
 #include "quarn/scene/SceneSession.h"
@@ -15,7 +16,6 @@
 #include <algorithm>
 #include <cmath>
 #include <iostream>
-#include <sstream>
 #include <stdexcept>
 
 namespace quarn {
@@ -40,13 +40,6 @@ struct Cache {
     std::size_t frames = 0;
     bool converted = false;
 };
-
-std::string number(double value) {
-    std::ostringstream text;
-    text.imbue(std::locale::classic());
-    text << value;
-    return text.str();
-}
 
 double diagonalOf(const HPlug& mesh) {
     std::vector<double> xyz;
@@ -92,7 +85,7 @@ Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpG
     constexpr double agrees = 1e-5; // of the mesh's size: what single precision and a solver's noise give
     if (apart > agrees * diagonalOf(restMesh(geometry)))
         options.console.warn("vertices of the cache that are one vertex of " + geometry.name + " are up to " +
-                             number(apart) + " apart; the first of each was taken");
+                             numberText(apart) + " apart; the first of each was taken");
     return cache;
 }
 
@@ -115,9 +108,9 @@ void warnOfShortCache(const Options& options, const Warp& warp, double startFram
     const int last = wholeNumberOf(warp.plug("exportEndFrame"));
     const double lastOfCache = startFrame + static_cast<double>(frames) - 1.0;
     if (startFrame > first || lastOfCache < last)
-        options.console.warn("the cache covers frames " + number(startFrame) + "-" + number(lastOfCache) + ", and " +
-                             warp.name + " exports frames " + std::to_string(first) + "-" + std::to_string(last) +
-                             ": its first and last frames are held beyond");
+        options.console.warn("the cache covers frames " + numberText(startFrame) + "-" + numberText(lastOfCache) +
+                             ", and " + warp.name + " exports frames " + std::to_string(first) + "-" +
+                             std::to_string(last) + ": its first and last frames are held beyond");
 }
 
 void printJson(const TargetReport& report, const Cache& cache, const Options& options, const std::string& geometry) {
@@ -148,6 +141,8 @@ void target(Options& options) {
     const Warp warp = Warp::find(options.deformer);
     const WarpGeometry& geometry = warp.geometry(options.geometry);
     const Cache cache = fittingCache(options, geometry);
+    if (const fs::path folder = options.output.parent_path(); fs::is_directory(folder))
+        session.moveTo(folder); // before the cache is named: its path counts from there
     const std::string named = pathForScene(cache.path, options.output.parent_path());
     const TargetReport report = connectTarget(warp, geometry, named, options.startFrame);
     session.save(options.output);
@@ -156,7 +151,7 @@ void target(Options& options) {
         printJson(report, cache, options, geometry.name);
     else
         std::cout << report.node << " plays " << cache.frames << " frames of " << cache.path.string() << " from frame "
-                  << number(report.startFrame) << " on as the target of " << geometry.name
+                  << numberText(report.startFrame) << " on as the target of " << geometry.name
                   << (report.replaced ? ", instead of an earlier target\n" : "\n");
 }
 

@@ -109,10 +109,28 @@ void SceneSession::open(const fs::path& scene) {
     const OpenQuarn::FileOutcome outcome = OpenQuarn::openScene(path);
     if (!outcome)
         throw std::runtime_error(outcome.error);
-    fs::current_path(path.parent_path());
+    sceneFolder_ = path.parent_path();
+    fs::current_path(sceneFolder_);
+}
+
+void SceneSession::moveTo(const fs::path& folder) {
+    if (sceneFolder_.empty() || folder == sceneFolder_)
+        return;
+    std::vector<OpenQuarn::Relocation> moved;
+    for (const OpenQuarn::ExternalContent& content : OpenQuarn::externalContent()) {
+        const fs::path file = (sceneFolder_ / content.unresolved).lexically_normal();
+        if (!content.unresolved.empty() && fs::path(content.unresolved).is_relative() && fs::exists(file))
+            moved.push_back({content.node, content.key, pathForScene(file, folder)});
+    }
+    if (const OpenQuarn::FileOutcome outcome = OpenQuarn::relocate(moved); !outcome)
+        throw std::runtime_error(outcome.error);
+    fs::current_path(folder);
+    sceneFolder_ = folder;
 }
 
 void SceneSession::save(const fs::path& scene) {
+    if (const fs::path folder = absolutePath(scene).parent_path(); fs::is_directory(folder))
+        moveTo(folder); // where there is no folder, saving says so
     const OpenQuarn::FileOutcome outcome = OpenQuarn::saveScene(absolutePath(scene));
     if (!outcome)
         throw std::runtime_error(outcome.error);

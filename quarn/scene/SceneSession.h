@@ -49,7 +49,11 @@ public:
     /// Opens a scene, and goes to its folder: what is relative in a scene counts from there, so that a folder can be
     /// moved. Paths of the command line must have been made absolute before (`absolutePath`).
     void open(const std::filesystem::path& scene);
+    /// Moves the scene to the folder of that path first.
     void save(const std::filesystem::path& scene);
+    /// For a scene that has been opened and is to be saved in another folder: goes there, and has the nodes name the
+    /// files that lie in or below the former folder so that they find them. `folder` absolute; the same one is fine.
+    void moveTo(const std::filesystem::path& folder);
     OpenQuarn::Session& host() { return session_; }
 
 private:
@@ -57,6 +61,7 @@ private:
     OpenQuarn::Session session_;
     std::unique_ptr<Threads> threads_;
     std::filesystem::path folderBefore_;
+    std::filesystem::path sceneFolder_; ///< empty until a scene is opened
 };
 
 /// As it is seen from the folder in which the program was started, whatever SceneSession::open() did since.

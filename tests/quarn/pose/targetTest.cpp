@@ -1,0 +1,198 @@
+// SPDX-License-Identifier: Apache-2.0
+// quarn target: caches that fit, caches that do not, and vertices that a scene has joined.
+#include "PoseTest.h"
+
+#include "quarn/pose/sceneOrder.h"
+#include "quarn/scene/meshes.h"
+#include "rig/NpyFile.h"
+
+#include "openquarn_app/NodeTypes.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace {
+
+using ::testing::AllOf;
+using ::testing::HasSubstr;
+
+constexpr std::size_t vertices = stripScene::vertexCount;
+
+class TargetTest : public PoseTest {
+protected:
+    /// Every coordinate of a frame is base + frame.
+    std::string cache(const std::string& name, std::size_t frames, std::size_t count, float base) const {
+        rig::NpyWriter writer(path(name), count);
+        for (std::size_t frame = 0; frame < frames; ++frame)
+            writer.append(std::vector<float>(3 * count, base + static_cast<float>(frame)));
+        writer.finish();
+        return path(name);
+    }
+    std::string map(const std::string& name, const std::vector<std::int32_t>& numbers,
+                    const std::string& descr = "<i4") const {
+        std::string header =
+            "{'descr': '" + descr + "', 'fortran_order': False, 'shape': (" + std::to_string(numbers.size()) + ",), }";
+        header.resize(117, ' ');
+        std::string text = std::string("\x93NUMPY\x01\x00\x76\x00", 10) + header + "\n";
+        text.append(reinterpret_cast<const char*>(numbers.data()), 4 * numbers.size());
+        return write(name, text);
+    }
+    static double first(quarn::SceneSession& session, double frame, const std::string& plug) {
+        session.host().setTime(frame);
+        std::vector<double> xyz;
+        quarn::readPoints(quarn::findPlug(plug), xyz);
+        EXPECT_EQ(xyz.size(), 3 * vertices);
+        return xyz.front();
+    }
+};
+
+TEST_F(TargetTest, TargetsPlayFromTheFirstExportedFrameAndAreReplaced) {
+    stripScene::write(scene(), "setAttr warp.exportStartFrame 5; setAttr warp.exportEndFrame 7");
+    std::filesystem::create_directory(path("caches"));
+    const std::string one = cache("caches/one.npy", 3, vertices, 10.0F);
+    stripScene::quarn({"target", scene(), "--cache", one});
+    {
+        const auto session = open("scene.json");
+        const HObject node = quarn::sourceOf(quarn::findNode("warp"), "targetGeometry[0]").node();
+        EXPECT_EQ(quarn::nodeName(node), "strip_target");
+        EXPECT_EQ(quarn::sourceOf(quarn::findNode("warp"), "targetMorphGeometry[0]").node(), node);
+        EXPECT_EQ(quarn::textOf(quarn::plugOf(node, "cacheFile")), "caches/one.npy"); // the folder can be moved
+        EXPECT_EQ(first(*session, 5, "strip_target.outMesh"), 10.0);
+        EXPECT_EQ(first(*session, 7, "strip_target.outMesh"), 12.0);
+    }
+    const std::string two = cache("two.npy", 3, vertices, 20.0F);
+    EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", two, "--geometry", "strip", "--start-frame", "6", "-o",
+                                   path("caches/other.json"), "--json"}),
+                HasSubstr("\"replaced\": true"));
+    // what a scene names by a path from its folder is found from the folder that it is saved in
+    stripScene::quarn({"target", scene(), "--cache", one});
+    std::filesystem::create_directory(path("elsewhere"));
+    stripScene::quarn({"pose", scene(), "-o", path("elsewhere/posed.json"), "--samples", "3", "--start", "5"});
+    EXPECT_EQ(first(*open("elsewhere/posed.json"), 6, "strip_target.outMesh"), 11.0);
+    stripScene::quarn({"pose", scene(), "-o", path("caches/posed.json"), "--samples", "3", "--start", "5"});
+    {
+        const auto moved = open("caches/posed.json");
+        EXPECT_EQ(quarn::textOf(quarn::findPlug("strip_target.cacheFile")), "one.npy");
+    }
+    const auto session = open("caches/other.json"); // from where two.npy is outside
+    EXPECT_EQ(quarn::nodesOfType("pointCache").size(), 1U);
+    EXPECT_EQ(first(*session, 7, "strip_target.outMesh"), 21.0);
+}
+
+TEST_F(TargetTest, OtherTargetsAreTakenOffAndStay) {
+    stripScene::write(scene(), "connectAttr strip.outMesh warp.targetGeometry[0]");
+    stripScene::quarn({"target", scene(), "--cache", cache("one.npy", 1, vertices, 1.0F)});
+    const auto session = open("scene.json");
+    EXPECT_EQ(first(*session, 1, "strip.outMesh"), 0.0);
+    EXPECT_EQ(first(*session, 1, "strip_target.outMesh"), 1.0);
+    EXPECT_EQ(quarn::sourceOf(quarn::findNode("warp"), "targetGeometry[0]"), quarn::findPlug("strip_target.outMesh"));
+}
+
+TEST_F(TargetTest, CachesThatDoNotFitAreRefusedAndTheSceneStays) {
+    stripScene::write(scene());
+    const std::string before = bytes(scene());
+    const struct {
+        std::vector<std::string> arguments;
+        std::vector<const char*> says;
+    } rows[] = {
+        {{"--cache", cache("more.npy", 2, vertices + 1, 0.0F)}, {"more.npy", "19", "18", "--order file"}},
+        {{"--cache", cache("none.npy", 0, vertices, 0.0F)}, {"none.npy", "no frames"}},
+        {{"--cache", path("missing.npy")}, {"missing.npy"}},
+        {{"--cache", write("text.npy", "points")}, {"text.npy", "NumPy"}},
+        {{"--cache", cache("fits.npy", 2, vertices, 0.0F), "--geometry", "arm"}, {"arm", "0 (strip)"}},
+        {{"--cache", path("fits.npy"), "--deformer", "w"}, {"w", "warp"}},
+        {{"--cache", path("fits.npy"), "--start-frame", "inf"}, {"--start-frame"}},
+        {{"--cache", path("fits.npy"), "--order", "file"}, {"character", "vertexMapFile"}},
+    };
+    for (const auto& row : rows) {
+        std::vector<std::string> arguments{"target", scene()};
+        arguments.insert(arguments.end(), row.arguments.begin(), row.arguments.end());
+        const std::string failure = stripScene::failureOf(arguments);
+        for (const char* part : row.says)
+            EXPECT_THAT(failure, HasSubstr(part));
+    }
+    EXPECT_EQ(bytes(scene()), before);
+}
+
+// the file's vertices are the scene's in reverse, and the first of them once more
+std::vector<std::int32_t> reversedMap() {
+    std::vector<std::int32_t> map;
+    for (std::size_t vertex = vertices; vertex-- > 0;)
+        map.push_back(static_cast<std::int32_t>(vertex));
+    map.push_back(static_cast<std::int32_t>(vertices) - 1);
+    return map;
+}
+
+TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
+    std::vector<float> points(3 * (vertices + 1));
+    for (std::size_t i = 0; i < points.size(); ++i)
+        points[i] = static_cast<float>(i / 3);
+    points[3 * vertices] = 0.125F; // joined with vertex 0, at a distance
+    points[3 * vertices + 1] = points[3 * vertices + 2] = 0.0F;
+    rig::NpyWriter writer(path("file.npy"), vertices + 1);
+    writer.append(points);
+    writer.finish();
+    const std::vector<std::int32_t> map = quarn::readVertexMap(this->map("map.npy", reversedMap()));
+    EXPECT_EQ(map, reversedMap());
+    EXPECT_EQ(quarn::writeInSceneOrder(path("file.npy"), path("scene.npy"), map, vertices, {true, false}), 0.125);
+    const rig::NpyFile converted(path("scene.npy"));
+    ASSERT_EQ(converted.vertexCount(), vertices);
+    std::vector<double> xyz(3 * vertices);
+    converted.read(0, 0, xyz);
+    for (std::size_t i = 0; i < xyz.size(); ++i)
+        EXPECT_EQ(xyz[i], double(vertices - 1 - i / 3));
+
+    points[3 * vertices] = std::nanf("");
+    rig::NpyWriter again(path("file.npy"), vertices + 1);
+    again.append(points);
+    again.finish();
+    EXPECT_TRUE(
+        std::isinf(quarn::writeInSceneOrder(path("file.npy"), path("scene.npy"), map, vertices, {true, false})));
+}
+
+TEST_F(TargetTest, TheCommandFindsTheMapOfTheCharacter) {
+    ::setenv("NEURALWARP_PLUGIN", NW_PLUGIN, 1);
+    {
+        const quarn::SceneSession session;
+        const std::vector<std::string> types = OpenQuarn::nodeTypes();
+        if (std::find(types.begin(), types.end(), "character") == types.end())
+            GTEST_SKIP() << "this build has no node type character";
+    }
+    map("map.npy", reversedMap());
+    stripScene::write(scene(), "createNode character; setAttr character1.vertexMapFile map.npy");
+    const std::string file = cache("file.npy", 2, vertices + 1, 3.0F);
+    EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", file, "--order", "file", "--json"}),
+                AllOf(HasSubstr("scene.strip_target.npy"), HasSubstr("\"converted\": true")));
+    EXPECT_EQ(first(*open("scene.json"), 2, "strip_target.outMesh"), 4.0);
+}
+
+// each row: a map, and what is wrong
+TEST_F(TargetTest, MapsThatDoNotFitAreRefused) {
+    std::vector<std::int32_t> map = reversedMap();
+    const auto problem = [&](std::size_t fileVertices) -> std::string {
+        try {
+            quarn::requireFit(map, fileVertices, vertices);
+        } catch (const std::runtime_error& error) {
+            return error.what();
+        }
+        return {};
+    };
+    EXPECT_EQ(problem(19), "");
+    EXPECT_THAT(problem(20), AllOf(HasSubstr("20"), HasSubstr("19")));
+    map[3] = 18;
+    EXPECT_THAT(problem(19), AllOf(HasSubstr("vertex 3 of"), HasSubstr("vertex 18")));
+    map[3] = -1;
+    EXPECT_THAT(problem(19), AllOf(HasSubstr("vertex 3 of"), HasSubstr("vertex -1")));
+    map[3] = 0;
+    EXPECT_THAT(problem(19), HasSubstr("no vertex of the file for vertex 14"));
+
+    const std::string whole = bytes(this->map("map.npy", reversedMap()));
+    const std::string files[] = {this->map("map.npy", reversedMap(), "<i8"), write("a.npy", whole + "x"),
+                                 write("b.npy", ""), write("c.npy", "{}"), path("missing.npy")};
+    for (const std::string& file : files)
+        EXPECT_THROW(quarn::readVertexMap(file), std::runtime_error) << file;
+    for (std::size_t length = 0; length < whole.size(); length += 7)
+        EXPECT_THROW(quarn::readVertexMap(write("cut.npy", whole.substr(0, length))), std::runtime_error) << length;
+}
+
+} // namespace
