@@ -19,6 +19,7 @@ int run(int argc, char** argv) {
     quarn::addExecCommand(app);
     quarn::addInfoCommand(app);
     quarn::addListAttrCommand(app);
+    quarn::addRenderCommand(app);
 
     try {
         app.parse(argc, argv);
