@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Tracing with a few rays a pixel: 4 into the scene and, from what they meet, one to the key light and 2 to the sky
+// Tracing with a few rays a pixel: 8 into the scene and, from what they meet, one to the key light and 2 to the sky
 // each. The rays of 4 x 4 neighbouring pixels complement one another; smoothLight() brings them together.
 #include "quarn/render/gather.h"
 
@@ -20,13 +20,19 @@
 namespace quarn {
 namespace {
 
-constexpr unsigned raysPerPixel = 4;
+constexpr unsigned raysPerPixel = 8;
 constexpr unsigned skyRaysPerHit = 2;
 constexpr float offset = 1e-4F; // rays begin this far from the surface; the viewer is 1 away
 
-// a rotated grid: no two rays in a row or column
-constexpr std::array<Sample2, raysPerPixel> inPixel = {
-    {{0.375F, 0.125F}, {0.875F, 0.375F}, {0.125F, 0.625F}, {0.625F, 0.875F}}};
+// no two rays in a row or column of an 8 x 8 grid
+constexpr std::array<Sample2, raysPerPixel> inPixel = {{{0.0625F, 0.4375F},
+                                                        {0.1875F, 0.8125F},
+                                                        {0.3125F, 0.1875F},
+                                                        {0.4375F, 0.6875F},
+                                                        {0.5625F, 0.3125F},
+                                                        {0.6875F, 0.9375F},
+                                                        {0.8125F, 0.0625F},
+                                                        {0.9375F, 0.5625F}}};
 
 // which of the 16 patterns a pixel has
 std::uint32_t patternOf(int x, int y) {
@@ -189,7 +195,7 @@ void smoothPixel(const PanelSight& from, PixelSight& pixel, int x, int y) {
 } // namespace
 
 PanelSight gather(const Surface& surface, const Camera& camera, int width, int height) {
-    PanelSight sight{width, height, {}};
+    PanelSight sight{width, height, {}, !surface.heat.empty()};
     sight.pixels.resize(static_cast<std::size_t>(width) * static_cast<std::size_t>(height));
     const Tracer tracer(surface, camera, width, height);
     forEachRow(height, [&](int y) {

@@ -25,6 +25,7 @@ struct PanelSight {
     int width = 0;
     int height = 0;
     std::vector<PixelSight> pixels;
+    bool isHeat = false; ///< shows a colour scale
 };
 
 /// Traces a panel, on all threads that oneTBB has; the result does not depend on their number. Throws

@@ -39,13 +39,14 @@ Vec3 backgroundColour(float down) {
     return mix(backgroundTop, backgroundBottom, down);
 }
 
-Vec3 lightOf(const PixelSight& pixel) {
+Vec3 lightOf(const PixelSight& pixel, float evenLight) {
     const Vec3 normal = normalized(pixel.normal);
     const Vec3 toViewer = normalized(-pixel.position);
     const Vec3 sky = mix(lights::skyBelow, lights::skyAbove, 0.5F + 0.5F * normal.y);
     const Vec3 open{openWithBounces(pixel.skyOpen, pixel.albedo.x), openWithBounces(pixel.skyOpen, pixel.albedo.y),
                     openWithBounces(pixel.skyOpen, pixel.albedo.z)};
-    const Vec3 arriving = lights::key * (pixel.keyLight * pixel.keyOpen) + sky * open;
+    const Vec3 even{evenLight, evenLight, evenLight};
+    const Vec3 arriving = lights::key * (pixel.keyLight * pixel.keyOpen) + sky * open + even;
     const Vec3 halfway = normalized(toViewer + lights::towardsKey);
     const float highlight = power(std::max(0.0F, dot(normal, halfway)), 24) * pixel.keyOpen;
     const float turnedAway = power(1.0F - std::clamp(dot(normal, toViewer), 0.0F, 1.0F), 4);
@@ -55,6 +56,7 @@ Vec3 lightOf(const PixelSight& pixel) {
 }
 
 void shade(const PanelSight& sight, Picture& picture, int left) {
+    const float evenLight = sight.isHeat ? lights::evenLight : 0.0F;
     for (int y = 0; y < sight.height; ++y) {
         const Vec3 background = backgroundColour((static_cast<float>(y) + 0.5F) / static_cast<float>(sight.height));
         for (int x = 0; x < sight.width; ++x) {
@@ -62,7 +64,7 @@ void shade(const PanelSight& sight, Picture& picture, int left) {
                                                    static_cast<std::size_t>(x)];
             picture.paint(left + x, y, background);
             if (pixel.cover > 0.0F)
-                picture.paint(left + x, y, encoded(lightOf(pixel)), pixel.cover);
+                picture.paint(left + x, y, encoded(lightOf(pixel, evenLight)), pixel.cover);
         }
     }
 }
