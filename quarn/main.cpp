@@ -22,6 +22,7 @@ int run(int argc, char** argv) {
     quarn::addListAttrCommand(app);
     quarn::addPoseCommand(app);
     quarn::addTargetCommand(app);
+    quarn::addRenderCommand(app);
 
     try {
         app.parse(argc, argv);

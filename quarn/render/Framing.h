@@ -1,0 +1,59 @@
+// SPDX-License-Identifier: Apache-2.0
+// Where the camera stands so that everything is seen.
+//
+// Camera space: the viewer at the origin, x to the right, y up, looking along -z; its unit is the distance from the
+// viewer to the middle of what is framed.
+#pragma once
+
+#include "quarn/render/Vec3.h"
+#include "quarn/render/View.h"
+
+#include <array>
+#include <span>
+#include <vector>
+
+namespace quarn {
+
+/// A perspective camera; the picture reaches from -tangentX to tangentX, and from -tangentY to tangentY, at z = -1.
+struct Camera {
+    View view;
+    HVector position; ///< object space
+    double unit = 1.0;
+    float tangentX = 1.0F;
+    float tangentY = 1.0F;
+
+    /// From object space, x, y, z of each vertex, to camera space.
+    std::vector<Vec3> toCamera(std::span<const double> xyz) const;
+};
+
+/// Parts of the picture's width and height that stay free.
+struct Margins {
+    double sides = 0.05;
+    double top = 0.05;
+    double bottom = 0.05;
+};
+
+/// Finds the nearest camera of a view that sees all points it was shown, within the margins. The sides of what a camera
+/// sees have directions that do not depend on where it stands; so it is enough to know how far the points reach in
+/// those four, and nothing else is kept of them.
+class Framing {
+public:
+    /// `width`, `height` of the picture, above 0; the shorter one spans 35 degrees.
+    Framing(const View& view, int width, int height, const Margins& margins);
+    /// x, y, z of each vertex, finite.
+    void include(std::span<const double> xyz);
+    /// Without any extent, a camera that stands one unit away.
+    Camera camera() const;
+
+private:
+    View view_;
+    double tangentX_;
+    double tangentY_;
+    std::array<double, 3> tangents_{}; ///< of the free parts: to both sides, to the top, to the bottom
+    std::array<double, 4> reach_{};    ///< right, left, top, bottom
+    double nearest_ = 0.0;             ///< along view_.viewer
+    double farthest_ = 0.0;
+    bool empty_ = true;
+};
+
+} // namespace quarn

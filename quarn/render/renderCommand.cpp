@@ -1,0 +1,311 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/commands.h"
+
+#include "quarn/console/Console.h"
+#include "quarn/console/interrupt.h"
+#include "quarn/console/json.h"
+#include "quarn/files/WholeFile.h"
+#include "quarn/render/drawPanel.h"
+#include "quarn/render/heat.h"
+#include "quarn/render/pictureNames.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/frames.h"
+#include "quarn/scene/plugs.h"
+#include "quarn/scene/units.h"
+#include "quarn/scene/useModel.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <cmath>
+#include <iostream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+constexpr std::size_t mostFramesLookedAt = 200; // before the first picture, for the camera and the range of colours
+constexpr int smallestSide = 16;
+constexpr int largestSide = 16384;
+
+struct PanelText {
+    std::string text;
+    bool isHeat = false;
+};
+
+struct Options {
+    SceneOptions scene;
+    Console console;
+    std::string output;
+    std::string frames;
+    std::string plug;
+    std::string deformer;
+    std::string geometry;
+    std::string model;
+    std::vector<PanelText> panels;
+    double range = 0.0; // millimetres; 0 for the largest distance
+    std::string size = "480x480";
+    std::string view = "25,10";
+    std::string up = "y";
+};
+
+// what all pictures have in common
+struct Shot {
+    std::vector<Panel> panels;
+    FrameRange frames;
+    Layout layout;
+    Camera camera;
+    HeatScale scale;
+};
+
+// over all vertices and pictures of a panel, in object space
+struct Measure {
+    double sum = 0.0;
+    double largest = 0.0;
+    std::size_t count = 0;
+
+    void add(const std::vector<double>& distances) {
+        for (const double distance : distances) {
+            sum += distance;
+            largest = std::max(largest, distance);
+        }
+        count += distances.size();
+    }
+    double mean() const { return count > 0 ? sum / static_cast<double>(count) : 0.0; }
+};
+
+struct Answer {
+    std::vector<std::filesystem::path> pictures;
+    std::vector<Measure> measures; // of each panel
+};
+
+void setSize(Layout& layout, const std::string& text, std::size_t panels) {
+    const char* const end = text.data() + text.size();
+    const auto width = std::from_chars(text.data(), end, layout.width);
+    const bool hasHeight = width.ec == std::errc() && width.ptr != end && *width.ptr == 'x';
+    const auto height = std::from_chars(hasHeight ? width.ptr + 1 : end, end, layout.height);
+    if (!hasHeight || height.ec != std::errc() || height.ptr != end)
+        throw std::runtime_error("\"" + text + "\" is no size of a panel: write WIDTHxHEIGHT, as in 480x480");
+    const auto [smaller, larger] = std::minmax(layout.width, layout.height);
+    if (smaller < smallestSide || larger > largestSide ||
+        static_cast<std::size_t>(layout.width) * panels > static_cast<std::size_t>(largestSide))
+        throw std::runtime_error("a picture of " + std::to_string(panels) + " panel(s) of " + text +
+                                 " pixels cannot be made: a panel's sides are at least " +
+                                 std::to_string(smallestSide) + ", the picture's at most " +
+                                 std::to_string(largestSide));
+}
+
+std::vector<Panel> panelsOf(const Options& options) {
+    std::vector<Panel> panels;
+    for (const PanelText& panel : options.panels)
+        panels.push_back(panel.isHeat ? heatPanelFrom(panel.text) : panelFrom(panel.text));
+    if (!options.plug.empty())
+        panels.insert(panels.begin(), {"", findPlug(options.plug), HPlug()});
+    if (panels.empty())
+        panels.push_back({"", Warp::find(options.deformer).geometry(options.geometry).output, HPlug()});
+    return panels;
+}
+
+FrameRange framesOf(const Options& options, SceneSession& session) {
+    if (!options.frames.empty())
+        return frameRange(options.frames);
+    const int now = static_cast<int>(std::lround(std::clamp(session.host().time(), -1e8, 1e8)));
+    return {now, now, 1};
+}
+
+bool hasHeat(const std::vector<Panel>& panels) {
+    return std::any_of(panels.begin(), panels.end(), [](const Panel& panel) { return panel.isHeat(); });
+}
+
+Shot plan(const Options& options, SceneSession& session) {
+    Shot shot;
+    shot.frames = framesOf(options, session);
+    shot.panels = panelsOf(options);
+    shot.layout.hasLabels =
+        std::any_of(shot.panels.begin(), shot.panels.end(), [](const Panel& panel) { return !panel.label.empty(); });
+    shot.layout.hasColourBar = hasHeat(shot.panels);
+    setSize(shot.layout, options.size, shot.panels.size());
+    return shot;
+}
+
+// looks at the frames before any is drawn: where the camera has to stand, and how far the colours have to reach
+void look(Shot& shot, const View& view, const Options& options, SceneSession& session) {
+    Framing framing(view, shot.layout.width, shot.layout.height, shot.layout.margins());
+    double largest = 0.0;
+    const std::size_t count = shot.frames.count();
+    const std::size_t looks = std::min(count, mostFramesLookedAt);
+    Progress progress(options.console, "looking at the frames", looks);
+    for (std::size_t number = 0; number < looks; ++number) {
+        // with more frames than looks, spread evenly from the first to the last
+        const int frame = shot.frames.frame(looks == count ? number : number * (count - 1) / (looks - 1));
+        session.host().setTime(frame);
+        for (const Panel& panel : shot.panels) {
+            const PanelFrame shown = evaluatePanel(panel, frame);
+            framing.include(shown.points);
+            for (const double distance : shown.distances)
+                largest = std::max(largest, distance);
+        }
+        progress.advance();
+    }
+    shot.camera = framing.camera();
+    const double millimetresPerUnit = 1000.0 * metersPerUnit();
+    shot.scale.millimetres = options.range > 0.0 ? options.range : roundedUp(largest * millimetresPerUnit);
+    shot.scale.range = shot.scale.millimetres / millimetresPerUnit;
+}
+
+void warnOfEmptyPanels(const Shot& shot, const Console& console) {
+    for (const Panel& panel : shot.panels)
+        if (polygonsOf(panel.mesh).sizes.empty())
+            console.warn(std::string(panel.mesh.name().asChar()) + " has no polygons: there is nothing to see of it");
+}
+
+void drawPictures(const Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
+    const std::filesystem::path pattern = absolutePath(options.output);
+    const std::size_t count = shot.frames.count();
+    Progress progress(options.console, "drawing", count);
+    for (std::size_t number = 0; number < count; ++number) {
+        const int frame = shot.frames.frame(number);
+        session.host().setTime(frame);
+        Picture picture(shot.layout.width * static_cast<int>(shot.panels.size()), shot.layout.height);
+        int left = 0;
+        for (std::size_t panel = 0; panel < shot.panels.size(); ++panel) {
+            const PanelFrame shown = evaluatePanel(shot.panels[panel], frame);
+            answer.measures[panel].add(shown.distances);
+            drawPanel(picture, shot.layout, left, shot.camera, shot.panels[panel], shown, shot.scale);
+            left += shot.layout.width;
+        }
+        WholeFile file(pictureName(pattern, frame, count > 1));
+        writePng(file.stream(), picture);
+        file.finish();
+        answer.pictures.push_back(pictureName(pattern, frame, count > 1));
+        progress.advance();
+    }
+}
+
+void writePanels(JsonWriter& writer, const Shot& shot, const Answer& answer) {
+    const double millimetres = shot.scale.millimetres / shot.scale.range;
+    writer.Key("panels");
+    writer.StartArray();
+    for (std::size_t panel = 0; panel < shot.panels.size(); ++panel) {
+        writer.StartObject();
+        writeText(writer, "label", shot.panels[panel].label);
+        writeText(writer, "plug", shot.panels[panel].mesh.name().asChar());
+        if (shot.panels[panel].isHeat()) {
+            writeText(writer, "reference", shot.panels[panel].reference.name().asChar());
+            writer.Key("rangeMillimetres");
+            writer.Double(shot.scale.millimetres);
+            writer.Key("meanMillimetres");
+            writer.Double(answer.measures[panel].mean() * millimetres);
+            writer.Key("largestMillimetres");
+            writer.Double(answer.measures[panel].largest * millimetres);
+        }
+        writer.EndObject();
+    }
+    writer.EndArray();
+}
+
+void printJson(const Shot& shot, const Answer& answer) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writer.Key("pictures");
+    writer.StartArray();
+    for (const std::filesystem::path& picture : answer.pictures)
+        writeText(writer, picture.string());
+    writer.EndArray();
+    writer.Key("width");
+    writer.Uint64(static_cast<std::uint64_t>(shot.layout.width) * shot.panels.size());
+    writer.Key("height");
+    writer.Int(shot.layout.height);
+    writePanels(writer, shot, answer);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void tell(const Shot& shot, const Answer& answer, const Console& console) {
+    if (shot.frames.count() > mostFramesLookedAt)
+        console.note("the camera and the range of colours are those of " + std::to_string(mostFramesLookedAt) +
+                     " of the " + std::to_string(shot.frames.count()) + " frames");
+    const std::string last = answer.pictures.back().string();
+    console.note(answer.pictures.size() == 1 ? "drew " + last
+                                             : "drew " + std::to_string(answer.pictures.size()) + " pictures, " +
+                                                   answer.pictures.front().string() + " to " + last);
+}
+
+void render(const Options& options) {
+    watchForInterrupt();
+    const View view = viewFrom(options.view, options.up);
+    checkPictureName(absolutePath(options.output));
+    SceneSession session(options.scene);
+    if (!options.model.empty()) {
+        const Warp warp = Warp::find(options.deformer);
+        useModel(warp, warp.geometry(options.geometry), options.model);
+    }
+    Shot shot = plan(options, session);
+    Answer answer;
+    answer.measures.resize(shot.panels.size());
+    look(shot, view, options, session);
+    warnOfEmptyPanels(shot, options.console);
+    drawPictures(shot, options, session, answer);
+    tell(shot, answer, options.console);
+    if (options.console.json)
+        printJson(shot, answer);
+}
+
+void addWhatIsShown(CLI::App& command, Options& options) {
+    command.add_option("--plug", options.plug, "The mesh to show; by default what the deformer gives")
+        ->type_name("PLUG");
+    // in the order in which they are written, whichever of the two they are
+    const auto add = [&options](bool isHeat) {
+        return [&options, isHeat](const std::vector<std::string>& texts) {
+            for (const std::string& text : texts)
+                options.panels.push_back({text, isHeat});
+        };
+    };
+    command
+        .add_option_function<std::vector<std::string>>("--panel", add(false), "A panel with a mesh; may be repeated")
+        ->type_name("LABEL=PLUG")
+        ->allow_extra_args(false)
+        ->trigger_on_parse();
+    command
+        .add_option_function<std::vector<std::string>>(
+            "--heat", add(true), "A panel with the distance of a mesh from another; may be repeated")
+        ->type_name("LABEL=PLUG:PLUG")
+        ->allow_extra_args(false)
+        ->trigger_on_parse();
+    command.add_option("--range", options.range, "Distance of the last colour; by default the largest, rounded up")
+        ->type_name("MM")
+        ->check(CLI::PositiveNumber);
+    command.add_option("--deformer", options.deformer, "The deformer, where the scene has several")->type_name("NAME");
+    command.add_option("--geometry", options.geometry, "The deformer's geometry, where it has several")
+        ->type_name("INDEX|NAME");
+    command.add_option("--model", options.model, "Show the deformer with this model; the scene stays as it is")
+        ->type_name("NAME");
+}
+
+} // namespace
+
+void addRenderCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand("render", "Draw pictures of the meshes of a scene");
+    addSceneOptions(*command, options->scene);
+    command->add_option("-o,--output", options->output, "The picture; #### in its name is the frame")
+        ->type_name("PICTURE.png")
+        ->required();
+    command->add_option("--frames", options->frames, "Frames to draw; by default the scene's current one")
+        ->type_name("A-B[xS]");
+    addWhatIsShown(*command, *options);
+    command->add_option("--size", options->size, "Size of one panel in pixels")
+        ->type_name("WxH")
+        ->capture_default_str();
+    command
+        ->add_option("--view", options->view, "front, back, left, right, top, bottom, or AZIMUTH,ELEVATION in degrees")
+        ->capture_default_str();
+    command->add_option("--up", options->up, "The axis that points up: x, y or z")->capture_default_str();
+    addConsoleOptions(*command, options->console, true);
+    command->callback([options] { render(*options); });
+}
+
+} // namespace quarn

@@ -1,0 +1,19 @@
+// SPDX-License-Identifier: Apache-2.0
+// The colours of a panel.
+#pragma once
+
+#include "quarn/render/Picture.h"
+#include "quarn/render/gather.h"
+
+namespace quarn {
+
+/// sRGB of the plain background, by the part of the picture's height that is above: 0 at the top, 1 at the bottom.
+Vec3 backgroundColour(float down);
+
+/// Linear light of a pixel that sees the surface; `evenLight` comes from everywhere besides.
+Vec3 lightOf(const PixelSight& pixel, float evenLight);
+
+/// Paints a panel into a picture, its left edge at `left`, its top at 0, over the background.
+void shade(const PanelSight& sight, Picture& picture, int left);
+
+} // namespace quarn

@@ -1,0 +1,65 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "host/support/SceneTest.h"
+
+#include "quarn/render/Panel.h"
+#include "quarn/scene/plugs.h"
+
+#include <limits>
+
+namespace {
+
+using namespace quarn;
+using ::testing::HasSubstr;
+using ::testing::ThrowsMessage;
+
+class PanelTest : public SceneTest {
+protected:
+    // a mesh node of one triangle and further vertices that nobody uses
+    static void addMesh(const std::string& name, const std::vector<double>& xyz) {
+        MeshPolygons polygons;
+        polygons.vertexCount = xyz.size() / 3;
+        polygons.sizes = {3};
+        polygons.corners = {0, 1, 2};
+        HPlug plug = plugOf(createNode("mesh", name), "inMesh");
+        ASSERT_FALSE(plug.setHObject(meshData(xyz, polygons)).error());
+    }
+};
+
+TEST_F(PanelTest, LabelsAndPlugsAreTakenApart) {
+    addMesh("a", {0, 0, 0, 1, 0, 0, 0, 1, 0});
+    addMesh("b", {0, 0, 2, 1, 0, 0, 0, 1, 0});
+    const Panel plain = panelFrom("error = 0=a.outMesh");
+    EXPECT_EQ(plain.label, "error = 0");
+    EXPECT_FALSE(plain.isHeat());
+    const Panel heat = heatPanelFrom("a: to b=a.outMesh:b.outMesh");
+    EXPECT_EQ(heat.label, "a: to b");
+    EXPECT_EQ(evaluatePanel(heat, 1).distances, (std::vector<double>{2.0, 0.0, 0.0}));
+    for (const char* text : {"a.outMesh", "label=", ""})
+        EXPECT_THAT([&] { panelFrom(text); }, ThrowsMessage<std::runtime_error>(HasSubstr("write LABEL=PLUG")));
+    for (const char* text : {"x=a.outMesh", "x=a.outMesh:", "x=:a.outMesh"})
+        EXPECT_THAT([&] { heatPanelFrom(text); },
+                    ThrowsMessage<std::runtime_error>(HasSubstr("write LABEL=PLUG:PLUG")));
+    EXPECT_THAT([] { panelFrom("x=c.outMesh"); },
+                ThrowsMessage<std::runtime_error>(HasSubstr("there is no plug c.outMesh")));
+}
+
+TEST_F(PanelTest, WhatDoesNotFitIsRefusedByName) {
+    addMesh("a", {0, 0, 0, 1, 0, 0, 0, 1, 0});
+    addMesh("more", {0, 0, 0, 1, 0, 0, 0, 1, 0, 5, 5, 5});
+    addMesh("broken", {0, 0, 0, 1, 0, 0, 0, std::numeric_limits<double>::quiet_NaN(), 0});
+    EXPECT_THAT([] { evaluatePanel(heatPanelFrom("x=a.outMesh:more.outMesh"), 1); },
+                ThrowsMessage<std::runtime_error>("the distance of a.outMesh from more.outMesh cannot be shown: "
+                                                  "they have 3 and 4 vertices"));
+    const std::string problem = "broken.outMesh cannot be drawn at frame 12: its vertex 2 has a position that is no "
+                                "number";
+    EXPECT_THAT([] { evaluatePanel(panelFrom("x=broken.outMesh"), 12); }, ThrowsMessage<std::runtime_error>(problem));
+    EXPECT_THAT([] { evaluatePanel(heatPanelFrom("x=a.outMesh:broken.outMesh"), 12); },
+                ThrowsMessage<std::runtime_error>(problem));
+    EXPECT_THAT(
+        [] {
+            requireDrawable(std::vector<double>{0, 0, 1e200}, "p", -3);
+        },
+        ThrowsMessage<std::runtime_error>("p cannot be drawn at frame -3: its vertex 0 is too far away"));
+}
+
+} // namespace

@@ -1,0 +1,37 @@
+#!/usr/bin/env bash
+# render.sh QUARN: pictures of the example scene, by the command line: names, sizes, threads, and what is refused.
+set -euo pipefail
+quarn=$1 scene=examples/wave/wave.json
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+
+fail() { echo "$1" >&2; exit 1; }
+# the four bytes of width and height in a PNG file, in hexadecimal
+size_of() { od -An -tx1 -j16 -N8 "$1" | tr -d ' \n'; }
+draw() { "$quarn" render "$scene" --plug strip.outMesh --size 40x30 "$@" 2>>"$work/err"; }
+refused() {
+    local expected=$1
+    shift
+    if "$quarn" render "$scene" "$@" >"$work/out" 2>"$work/refused"; then fail "not refused: $*"; fi
+    grep -qF -- "$expected" "$work/refused" || { cat "$work/refused" >&2; fail "another reason for: $*"; }
+}
+
+draw -o "$work/one.png"
+[ "$(size_of "$work/one.png")" = 000000280000001e ] || fail "the picture has another size"
+draw -o "$work/single.png" --threads 1
+cmp "$work/one.png" "$work/single.png"
+
+draw -o "$work/pic.###.png" --frames 1-5x2 --heat "moved=wave.outputGeom[0]:strip.outMesh" --quiet --json >"$work/json"
+[ "$(cd "$work" && echo pic.*)" = "pic.001.png pic.003.png pic.005.png" ] || fail "the pictures have other names"
+[ "$(size_of "$work/pic.003.png")" = 000000500000001e ] || fail "two panels are not twice as wide"
+cmp "$work/pic.001.png" "$work/pic.005.png" # nothing moves in this scene
+grep -q '"rangeMillimetres"' "$work/json"
+
+refused "must end in .png" -o "$work/no.jpg"
+refused "does not exist" -o "$work/no/no.png"
+refused '"10x" is no size' -o "$work/no.png" --size 10x
+refused "cannot be made" -o "$work/no.png" --size 9000x100 --panel a=strip.outMesh --panel b=strip.outMesh
+refused "there is no plug strip.none" -o "$work/no.png" --plug strip.none
+refused "no deformer none" -o "$work/no.png" --model x --deformer none
+[ ! -e "$work/no.png" ] || fail "a refused picture was written"
+if ls "$work"/*.part* 2>/dev/null; then fail "a part of a picture is left"; fi

@@ -1,0 +1,204 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/render/drawPanel.h"
+#include "quarn/render/gather.h"
+#include "quarn/render/heat.h"
+#include "quarn/render/shade.h"
+
+#include <gtest/gtest.h>
+#include <oneapi/tbb/global_control.h>
+
+#include <algorithm>
+#include <numbers>
+#include <sstream>
+
+#define STB_IMAGE_IMPLEMENTATION
+#define STB_IMAGE_STATIC
+#define STBI_ONLY_PNG
+#include <stb_image.h>
+
+namespace {
+
+using namespace quarn;
+using std::numbers::pi;
+
+constexpr int side = 96;
+
+// of quads, and triangles at the poles
+PanelFrame sphere() {
+    constexpr std::uint32_t rings = 48;
+    constexpr std::uint32_t segments = 96;
+    PanelFrame frame;
+    for (std::uint32_t ring = 0; ring <= rings; ++ring)
+        for (std::uint32_t segment = 0; segment < segments; ++segment) {
+            const double down = pi * ring / rings;
+            const double around = 2 * pi * segment / segments;
+            frame.points.insert(frame.points.end(),
+                                {std::sin(down) * std::sin(around), std::cos(down), std::sin(down) * std::cos(around)});
+        }
+    for (std::uint32_t ring = 0; ring < rings; ++ring)
+        for (std::uint32_t segment = 0; segment < segments; ++segment) {
+            const std::uint32_t next = (segment + 1) % segments;
+            frame.polygons.sizes.push_back(4);
+            frame.polygons.corners.insert(frame.polygons.corners.end(),
+                                          {ring * segments + segment, (ring + 1) * segments + segment,
+                                           (ring + 1) * segments + next, ring * segments + next});
+        }
+    frame.polygons.vertexCount = frame.points.size() / 3;
+    return frame;
+}
+
+Camera cameraFor(const PanelFrame& frame) {
+    Framing framing(viewFrom("front", "y"), side, side, {});
+    framing.include(frame.points);
+    return framing.camera();
+}
+
+PanelSight sightOf(const PanelFrame& frame, const Camera& camera) {
+    return gather(makeSurface(frame.polygons, camera.toCamera(frame.points)), camera, side, side);
+}
+
+double cover(const PanelSight& sight) {
+    double sum = 0.0;
+    for (const PixelSight& pixel : sight.pixels)
+        sum += pixel.cover;
+    return sum;
+}
+
+Picture pictureOf(const PanelFrame& frame, const Camera& camera) {
+    Layout layout;
+    layout.width = layout.height = side;
+    Picture picture(side, side);
+    drawPanel(picture, layout, 0, camera, {}, frame, {});
+    return picture;
+}
+
+Picture background() {
+    const PanelFrame nothing;
+    return pictureOf(nothing, cameraFor(nothing));
+}
+
+TEST(Trace, ASphereCoversItsSilhouette) {
+    const PanelFrame ball = sphere();
+    const Camera camera = cameraFor(ball);
+    const double distance = camera.position.length();
+    // the cone that touches a sphere of radius 1, cut at z = -1
+    const double radius = 1.0 / std::sqrt(distance * distance - 1.0) / camera.tangentX * side / 2.0;
+    EXPECT_NEAR(cover(sightOf(ball, camera)), pi * radius * radius, 0.005 * pi * radius * radius);
+}
+
+TEST(Trace, ASphereIsRoundAndLitFromTheKeyLight) {
+    const PanelFrame ball = sphere();
+    const PanelSight sight = sightOf(ball, cameraFor(ball));
+    const auto at = [&](int x, int y) { return sight.pixels[static_cast<std::size_t>(y * side + x)]; };
+    const PixelSight middle = at(side / 2, side / 2);
+    EXPECT_EQ(middle.cover, 1.0F);
+    EXPECT_EQ(middle.skyOpen, 1.0F); // nothing hides the sky from a ball
+    EXPECT_EQ(middle.keyOpen, 1.0F);
+    EXPECT_GT(normalized(middle.normal).z, 0.999F);
+    for (const PixelSight& pixel : sight.pixels)
+        if (pixel.cover == 1.0F) {
+            ASSERT_EQ(pixel.skyOpen, 1.0F);
+        }
+    EXPECT_GT(lightOf(at(side / 3, side / 3), 0.0F).y, 2.0F * lightOf(at(side * 2 / 3, side * 3 / 4), 0.0F).y);
+}
+
+TEST(Trace, ALidHidesTheSkyAndTheKeyLight) {
+    PanelFrame floorAndLid;
+    floorAndLid.points = {-1, 0, -1, 1, 0, -1, 1, 0, 1, -1, 0, 1, -1, 0.1, -1, 1, 0.1, -1, 1, 0.1, 1, -1, 0.1, 1};
+    floorAndLid.polygons = {8, {4, 4}, {0, 1, 2, 3, 4, 5, 6, 7}};
+    const Camera camera = cameraFor(floorAndLid);
+    Surface surface = makeSurface(floorAndLid.polygons, camera.toCamera(floorAndLid.points));
+    PanelSight sight = gather(surface, camera, side, side);
+    smoothLight(sight);
+    bool found = false;
+    for (const PixelSight& pixel : sight.pixels)
+        if (pixel.cover == 1.0F && pixel.position.z < -0.9F && pixel.position.z > -1.0F) {
+            found = true;
+            EXPECT_TRUE(pixel.skyOpen < 0.6F || pixel.skyOpen > 0.9F);
+        }
+    EXPECT_TRUE(found);
+    EXPECT_TRUE(std::any_of(sight.pixels.begin(), sight.pixels.end(),
+                            [](const PixelSight& pixel) { return pixel.cover == 1.0F && pixel.keyOpen < 0.1F; }));
+}
+
+TEST(Trace, TheSameBytesWithAnyNumberOfThreads) {
+    PanelFrame ball = sphere();
+    ball.distances.assign(ball.points.size() / 3, 0.3);
+    const Camera camera = cameraFor(ball);
+    const std::vector<std::uint8_t> expected = pictureOf(ball, camera).rgb;
+    for (const std::size_t threads : {1U, 2U, 7U}) {
+        const oneapi::tbb::global_control limit(oneapi::tbb::global_control::max_allowed_parallelism, threads);
+        EXPECT_TRUE(pictureOf(ball, camera).rgb == expected) << threads;
+    }
+}
+
+TEST(Trace, BothSidesAreShownAlike) {
+    const PanelFrame ball = sphere();
+    PanelFrame insideOut = ball;
+    std::reverse(insideOut.polygons.corners.begin(), insideOut.polygons.corners.end());
+    const Camera camera = cameraFor(ball);
+    const std::vector<std::uint8_t> outside = pictureOf(ball, camera).rgb;
+    const std::vector<std::uint8_t> inside = pictureOf(insideOut, camera).rgb;
+    int largest = 0;
+    for (std::size_t i = 0; i < outside.size(); ++i)
+        largest = std::max(largest, std::abs(outside[i] - inside[i]));
+    EXPECT_LE(largest, 12); // other diagonals of the quads: the last of the lit rim may differ a little
+}
+
+TEST(Trace, HeatOfAKnownDistanceHasItsColour) {
+    PanelFrame ball = sphere();
+    ball.distances.assign(ball.points.size() / 3, 0.25);
+    const Camera camera = cameraFor(ball);
+    Surface surface = makeSurface(ball.polygons, camera.toCamera(ball.points));
+    surface.heat.assign(surface.points.size(), 0.25F);
+    const PanelSight sight = gather(surface, camera, side, side);
+    const Vec3 colour = encoded(sight.pixels[static_cast<std::size_t>(side / 2 * side + side / 2)].albedo);
+    const Vec3 expected = heatColour(0.25F);
+    EXPECT_NEAR(colour.x, expected.x, 1e-4);
+    EXPECT_NEAR(colour.y, expected.y, 1e-4);
+    EXPECT_NEAR(colour.z, expected.z, 1e-4);
+}
+
+TEST(Trace, NothingToSeeIsTheBackground) {
+    const std::vector<std::uint8_t> empty = background().rgb;
+    PanelFrame lines;
+    lines.points = {0, 0, 0, 1, 0, 0, 0, 1, 0};
+    lines.polygons = {3, {2, 2}, {0, 1, 1, 2}};
+    EXPECT_EQ(pictureOf(lines, cameraFor(lines)).rgb, empty);
+    lines.polygons = {3, {3, 4}, {0, 0, 0, 1, 1, 2, 2}}; // without any area
+    EXPECT_EQ(pictureOf(lines, cameraFor(lines)).rgb, empty);
+    lines.points.assign(9, 5.0);
+    lines.polygons = {3, {3}, {0, 1, 2}};
+    EXPECT_EQ(pictureOf(lines, cameraFor(lines)).rgb, empty);
+}
+
+TEST(Trace, DegenerateTrianglesChangeNothing) {
+    PanelFrame ball = sphere();
+    const Camera camera = cameraFor(ball);
+    const double before = cover(sightOf(ball, camera));
+    ball.polygons.sizes.insert(ball.polygons.sizes.end(), {3, 2, 3});
+    ball.polygons.corners.insert(ball.polygons.corners.end(), {500, 500, 500, 600, 601, 700, 701, 700});
+    EXPECT_EQ(cover(sightOf(ball, camera)), before);
+}
+
+TEST(Png, ReadsBackAsItWasPainted) {
+    Picture picture(37, 11);
+    for (int y = 0; y < 11; ++y)
+        for (int x = 0; x < 37; ++x)
+            picture.paint(x, y, {static_cast<float>(x) / 37.0F, static_cast<float>(y) / 11.0F, 0.5F});
+    std::ostringstream stream;
+    writePng(stream, picture);
+    const std::string bytes = stream.str();
+    int width = 0;
+    int height = 0;
+    int channels = 0;
+    stbi_uc* pixels = stbi_load_from_memory(reinterpret_cast<const stbi_uc*>(bytes.data()),
+                                            static_cast<int>(bytes.size()), &width, &height, &channels, 3);
+    ASSERT_NE(pixels, nullptr);
+    EXPECT_EQ(width, 37);
+    EXPECT_EQ(height, 11);
+    EXPECT_TRUE(std::equal(picture.rgb.begin(), picture.rgb.end(), pixels));
+    stbi_image_free(pixels);
+}
+
+} // namespace
