@@ -17,6 +17,7 @@ int run(int argc, char** argv) {
     app.set_version_flag("--version", "quarn " QUARN_VERSION);
     app.require_subcommand(1);
     quarn::addImportCommand(app);
+    quarn::addExportCommand(app);
     quarn::addExecCommand(app);
     quarn::addInfoCommand(app);
     quarn::addListAttrCommand(app);

@@ -1,0 +1,168 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/dataset/DatasetFolder.h"
+
+#include "quarn/dataset/DatasetWriter.h"
+#include "quarn/dataset/FolderLock.h"
+#include "quarn/files/WholeFile.h"
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <stdexcept>
+#include <system_error>
+
+#include <sys/statvfs.h>
+#include <unistd.h>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::array ourFiles = {datasetFile::controls, datasetFile::deltas, datasetFile::frames,
+                                 descriptionFile,       setupFile,           datasetFile::progress,
+                                 FolderLock::fileName};
+constexpr std::uint64_t roomForTexts = 1U << 20U; // the JSON files, and what the file system needs for itself
+
+bool isOneOf(const std::string& name, const char* file) {
+    return name == file || name.starts_with(std::string(file) + ".part"); // what a WholeFile was before its end
+}
+
+bool isOurs(const std::string& name) {
+    return std::any_of(ourFiles.begin(), ourFiles.end(), [&](const char* file) { return isOneOf(name, file); });
+}
+
+void removeFile(const fs::path& file) {
+    std::error_code error;
+    fs::remove_all(file, error);
+    if (error)
+        throw std::runtime_error(file.string() + " could not be removed: " + error.message());
+}
+
+void move(const fs::path& from, const fs::path& to) {
+    std::error_code error;
+    fs::rename(from, to, error);
+    if (error)
+        throw std::runtime_error(from.string() + " could not be renamed to " + to.string() + ": " + error.message());
+}
+
+// what belongs to the making of a data set, and not to it
+bool isTool(const std::string& name) {
+    return isOneOf(name, datasetFile::progress) || name == FolderLock::fileName || name.find(".part") != name.npos;
+}
+
+void removeTools(const fs::path& folder, bool lockToo) {
+    std::vector<fs::path> tools;
+    for (const fs::directory_entry& entry : fs::directory_iterator(folder)) {
+        const std::string name = entry.path().filename();
+        if (isOurs(name) && isTool(name) && (lockToo || name != FolderLock::fileName))
+            tools.push_back(entry.path());
+    }
+    std::for_each(tools.begin(), tools.end(), removeFile);
+}
+
+fs::path withoutLinks(const fs::path& path) {
+    std::error_code error;
+    fs::path real = fs::weakly_canonical(path, error);
+    if (error)
+        real = path.lexically_normal();
+    return real.filename().empty() ? real.parent_path() : real; // "folder/" is "folder"
+}
+
+} // namespace
+
+DatasetFolder::DatasetFolder(const fs::path& folder, bool replaces)
+    : folder_(withoutLinks(folder))
+    , part_(folder_.string() + ".part")
+    , replaces_(replaces) {}
+
+bool DatasetFolder::isDone(const Setup& setup) const {
+    std::error_code error;
+    if (!fs::exists(folder_, error) || fs::is_empty(folder_, error))
+        return false;
+    if (!fs::exists(folder_ / descriptionFile))
+        throw std::runtime_error(folder_.string() + " is no training data set; choose another place with -o");
+    if (replaces_) {
+        requireOursOnly(folder_);
+        return false;
+    }
+    const std::optional<Setup> earlier = Setup::read(folder_ / setupFile);
+    const std::string difference =
+        earlier ? setup.differenceFrom(*earlier) : std::string(setupFile) + " cannot be read";
+    if (!difference.empty())
+        throw std::runtime_error(folder_.string() + " holds another data set (" + difference +
+                                 "); choose another place with -o, or replace it with --overwrite");
+    removeTools(folder_, true);
+    return true;
+}
+
+DatasetFolder::Begun DatasetFolder::begun(const Setup& setup) const {
+    requireOursOnly(part_);
+    if (!fs::exists(part_ / setupFile))
+        return Begun::no;
+    const std::optional<Setup> earlier = Setup::read(part_ / setupFile);
+    if (!earlier)
+        return Begun::damaged;
+    const std::string difference = setup.differenceFrom(*earlier);
+    if (difference.empty())
+        return Begun::yes;
+    if (replaces_)
+        return Begun::no;
+    throw std::runtime_error(part_.string() + " was begun with another set-up (" + difference +
+                             "); choose another place with -o, or begin again with --overwrite");
+}
+
+void DatasetFolder::begin(const Setup& setup) const {
+    for (const char* file : ourFiles)
+        if (file != FolderLock::fileName)
+            removeFile(part_ / file);
+    removeTools(part_, false);
+    writeWhole(part_ / setupFile, setup.json());
+}
+
+void DatasetFolder::requireSpace(std::uint64_t bytes) const {
+    struct statvfs disk = {};
+    if (::statvfs(part_.c_str(), &disk) != 0)
+        return; // writing will tell
+    const std::uint64_t free = std::uint64_t{disk.f_bavail} * disk.f_frsize;
+    if (free < bytes + roomForTexts)
+        throw std::runtime_error("the disk of " + part_.string() + " has " + std::to_string(free) +
+                                 " bytes free, and the data set needs " + std::to_string(bytes + roomForTexts));
+}
+
+void DatasetFolder::publish(FolderLock& lock) const {
+    syncToDisk(part_);
+    const fs::path old = folder_.string() + ".old" + std::to_string(::getpid());
+    const bool isThere = fs::exists(folder_);
+    if (isThere) {
+        // it may have come, or may have got more in it, since the beginning
+        if (!replaces_ && !fs::is_empty(folder_))
+            throw std::runtime_error(folder_.string() +
+                                     " was not there at the beginning; the data set is complete in " + part_.string());
+        requireOursOnly(folder_);
+        move(folder_, old);
+    }
+    move(part_, folder_);
+    lock.follow(folder_);
+    syncToDisk(folder_.parent_path());
+    removeTools(folder_, false);
+    if (isThere)
+        removeFile(old);
+}
+
+void DatasetFolder::requireOursOnly(const fs::path& folder) const {
+    for (const fs::directory_entry& entry : fs::directory_iterator(folder))
+        if (!isOurs(entry.path().filename()))
+            throw std::runtime_error(entry.path().string() + " is no part of a training data set, and " +
+                                     folder.string() +
+                                     " is not removed with it; move it, or choose another place with -o");
+}
+
+std::uintmax_t bytesOfDataset(const fs::path& folder) {
+    std::uintmax_t bytes = 0;
+    for (const char* file : {datasetFile::controls, datasetFile::deltas, datasetFile::frames, descriptionFile})
+        bytes += fs::file_size(folder / file);
+    return bytes;
+}
+
+} // namespace quarn

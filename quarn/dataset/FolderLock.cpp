@@ -1,0 +1,62 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/dataset/FolderLock.h"
+
+#include <cerrno>
+#include <stdexcept>
+#include <system_error>
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+
+namespace quarn {
+namespace {
+
+[[noreturn]] void fail(const std::filesystem::path& folder, int error) {
+    throw std::runtime_error(folder.string() + " could not be locked: " + std::generic_category().message(error));
+}
+
+bool isAt(const std::filesystem::path& path, int file) {
+    struct stat named = {};
+    struct stat open = {};
+    return ::stat(path.c_str(), &named) == 0 && ::fstat(file, &open) == 0 && named.st_dev == open.st_dev &&
+           named.st_ino == open.st_ino;
+}
+
+} // namespace
+
+FolderLock::FolderLock(const std::filesystem::path& folder)
+    : folder_(folder) {
+    // another process may finish with the folder between two of these steps
+    constexpr int attempts = 100;
+    for (int attempt = 0; attempt < attempts; ++attempt)
+        if (take())
+            return;
+    fail(folder_, EAGAIN);
+}
+
+// false: the file that was locked is not the folder's any more
+bool FolderLock::take() {
+    std::error_code error;
+    std::filesystem::create_directories(folder_, error);
+    if (error)
+        throw std::runtime_error("the folder " + folder_.string() + " could not be made: " + error.message());
+    lock_ = std::make_unique<rig::FileDescriptor>(::open(file().c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0666));
+    if (!lock_->isOpen() && errno == ENOENT)
+        return false;
+    if (!lock_->isOpen())
+        fail(folder_, errno);
+    if (::flock(lock_->number(), LOCK_EX | LOCK_NB) != 0) {
+        if (errno == EWOULDBLOCK)
+            throw std::runtime_error("another quarn export is writing " + folder_.string() + "; wait until it is done");
+        fail(folder_, errno);
+    }
+    return isAt(file(), lock_->number());
+}
+
+FolderLock::~FolderLock() {
+    ::unlink(file().c_str());
+    ::rmdir(folder_.c_str()); // refused when there is more in it
+}
+
+} // namespace quarn

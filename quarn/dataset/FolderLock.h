@@ -1,0 +1,35 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "rig/FileDescriptor.h"
+
+#include <filesystem>
+#include <memory>
+
+namespace quarn {
+
+/// Keeps a folder for this process, against others that ask for the same, by a lock on a file "lock" in it. The system
+/// takes the lock away with the process, however that ends. Thread: one at a time.
+class FolderLock {
+public:
+    /// Makes the folder when there is none. Throws std::runtime_error when it is taken, or cannot be made.
+    explicit FolderLock(const std::filesystem::path& folder);
+    /// Removes its file, and the folder when nothing else is in it.
+    ~FolderLock();
+    FolderLock(const FolderLock&) = delete;
+    FolderLock& operator=(const FolderLock&) = delete;
+
+    /// The folder has another name now.
+    void follow(const std::filesystem::path& folder) { folder_ = folder; }
+
+    static constexpr const char* fileName = "lock";
+
+private:
+    bool take();
+    std::filesystem::path file() const { return folder_ / fileName; }
+
+    std::filesystem::path folder_;
+    std::unique_ptr<rig::FileDescriptor> lock_;
+};
+
+} // namespace quarn

@@ -1,0 +1,183 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/dataset/FrameSampler.h"
+
+#include "quarn/dataset/HostMessages.h"
+#include "quarn/dataset/controlNames.h"
+#include "quarn/scene/meshes.h"
+#include "quarn/scene/plugs.h"
+
+#include "openquarn/HFnDependencyNode.h"
+#include "openquarn/HPxDeformerNode.h"
+#include "openquarn_app/Commands.h"
+#include "openquarn_app/Evaluation.h"
+#include "openquarn_app/Session.h"
+
+#include <cmath>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+[[noreturn]] void fail(const std::string& why) {
+    throw std::runtime_error(why);
+}
+
+// does the work; whatever the host says against it becomes the error of the frame
+template <class Work>
+void strictly(int frame, Work work) {
+    const HostMessages messages;
+    std::string error;
+    try {
+        work();
+    } catch (const std::runtime_error& thrown) {
+        error = thrown.what();
+    }
+    // what the host says is nearer to the cause
+    if (const std::string said = messages.failures(); !said.empty())
+        error = said;
+    if (!error.empty())
+        fail("frame " + std::to_string(frame) + ": " + error);
+}
+
+void evaluate(const HPlug& plug) {
+    if (const HStatus status = OpenQuarn::evaluate(plug); status.error())
+        fail(std::string(plug.name().asChar()) + " could not be evaluated: " + status.errorString().asChar());
+}
+
+std::string elementName(const Warp& warp, const char* array, const WarpGeometry& geometry) {
+    return warp.name + "." + array + "[" + std::to_string(geometry.index) + "]";
+}
+
+DeltaKind deltaKind(const Warp& warp, const WarpGeometry& geometry) {
+    const HPlug mode = warp.plug("export", geometry, "deltaMode");
+    DeltaKind kind;
+    kind.mode = wholeNumberOf(mode);
+    kind.smoothingIterations = wholeNumberOf(warp.plug("export", geometry, "smoothingIterations"));
+    if (kind.mode != 0 && kind.mode != 1)
+        fail(std::string(mode.name().asChar()) + " is " + std::to_string(kind.mode) + "; set it to Offset or Surface");
+    setNumber(mode, kind.mode); // export mode needs the element, which may be there by its defaults only
+    return kind;
+}
+
+float narrowed(double value, const std::string& what) {
+    const auto number = static_cast<float>(value);
+    if (!std::isfinite(number))
+        fail(what + " is " + std::to_string(value) + ", which is no number to train with");
+    return number;
+}
+
+} // namespace
+
+FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, int firstFrame)
+    : host_(host)
+    , warp_(warp)
+    , geometry_(geometry) {
+    if (geometry.target.isNull())
+        fail(elementName(warp, "targetGeometry", geometry) +
+             " has no target; quarn target SCENE --cache FILE.npy connects one");
+    kind_ = deltaKind(warp, geometry);
+    host.setTime(firstFrame);
+    strictly(firstFrame, [&] { evaluateInputs(); });
+    {
+        const HostMessages ofTheModel; // it may not have been trained, and has no part in this
+        OpenQuarn::evaluate(geometry.output);
+    }
+    strictly(firstFrame, [&] {
+        names_ = controlNames(warp);
+        if (names_.empty())
+            fail(warp.name + ".controlValues has no values; connect the controls into it");
+        readMap();
+    });
+    strictly(firstFrame, [&] { switchExport(true); });
+}
+
+FrameSampler::~FrameSampler() {
+    if (!isExporting_)
+        return;
+    OpenQuarn::runCommand(command("-exportActive off"));
+    OpenQuarn::makeDirty(warp_.node);
+}
+
+std::string FrameSampler::command(const std::string& flags) const {
+    return "neuralWarp -multiIndex " + std::to_string(geometry_.index) + " " + flags + " " +
+           OpenQuarn::quotedWord(warp_.name);
+}
+
+void FrameSampler::switchExport(bool on) {
+    const OpenQuarn::CommandOutcome outcome =
+        OpenQuarn::runCommand(command(on ? "-exportActive on" : "-exportActive off"));
+    if (!outcome)
+        fail(outcome.error);
+    isExporting_ = on;
+    OpenQuarn::makeDirty(warp_.node);
+}
+
+void FrameSampler::evaluateInputs() {
+    evaluate(geometry_.input);
+    evaluate(geometry_.target);
+    takeControls();
+}
+
+void FrameSampler::readMap() {
+    HStatus status;
+    const auto* deformer = dynamic_cast<HPxDeformerNode*>(HFnDependencyNode(warp_.node).userNode());
+    if (deformer == nullptr)
+        fail(warp_.name + " is no deformer of this plug-in");
+    map_ = deformer->indexMapper(geometry_.index, &status);
+    if (status.error())
+        fail(elementName(warp_, "input", geometry_) + ": " + status.errorString().asChar());
+}
+
+void FrameSampler::sample(int frame) {
+    host_.setTime(frame);
+    strictly(frame, [&] {
+        evaluateInputs();
+        evaluate(geometry_.output);
+        takeDeltas();
+    });
+}
+
+void FrameSampler::takeControls() {
+    const HPlug values = warp_.plug("controlValues");
+    const std::vector<unsigned> indices = indicesOf(values);
+    if (!names_.empty() && indices.size() != names_.size())
+        fail(warp_.name + ".controlValues has " + std::to_string(indices.size()) + " values, and had " +
+             std::to_string(names_.size()) + " in the first frame");
+    controls_.clear();
+    controls_.reserve(indices.size());
+    for (std::size_t i = 0; i < indices.size(); ++i) {
+        const HPlug value = values.elementByLogicalIndex(indices[i]);
+        const std::string name = value.name().asChar();
+        controls_.push_back(narrowed(numberOf(value), names_.empty() ? name : name + " (" + names_[i] + ")"));
+    }
+}
+
+void FrameSampler::takeDeltas() {
+    const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand(command("-vertexDeltas " + kind_.code()));
+    if (!outcome)
+        fail(outcome.error);
+    const auto* given = std::get_if<std::vector<double>>(&outcome.result);
+    const std::size_t count = given == nullptr ? 0 : given->size();
+    if (count != 3 * std::size_t{map_.affectCount()})
+        fail(targetSizes() + ", and " + std::to_string(count / 3) + " deltas were given for " +
+             std::to_string(map_.affectCount()) + " deformed vertices");
+    deltas_.resize(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        const auto affected = static_cast<unsigned>(i / 3);
+        if (!std::isfinite((*given)[i]))
+            fail("the delta of vertex " + std::to_string(map_.isIdentityMap() ? affected : map_.affectMap()[affected]) +
+                 " of " + geometry_.name + " is no finite number");
+        deltas_[i] = static_cast<float>((*given)[i]);
+    }
+}
+
+std::string FrameSampler::targetSizes() const {
+    std::vector<float> points;
+    readPoints(geometry_.target, points);
+    const std::size_t target = points.size() / 3;
+    readPoints(geometry_.input, points);
+    return "the target " + std::string(geometry_.target.name().asChar()) + " has " + std::to_string(target) +
+           " vertices, and " + geometry_.name + " has " + std::to_string(points.size() / 3);
+}
+
+} // namespace quarn

@@ -1,0 +1,65 @@
+// SPDX-License-Identifier: Apache-2.0
+// The deformer in export mode, and what it gives frame by frame.
+#pragma once
+
+#include "quarn/scene/Warp.h"
+
+#include "openquarn/HIndexMapper.h"
+
+#include <string>
+#include <vector>
+
+namespace OpenQuarn {
+class Session;
+}
+
+namespace quarn {
+
+/// Which of the training deltas are taken, as export[i] says.
+struct DeltaKind {
+    int mode = 1; ///< 0 Offset, 1 Surface
+    int smoothingIterations = 0;
+    std::string code() const { return mode == 0 ? "dbp" : "dos"; } ///< of the command -vertexDeltas
+};
+
+/// Steps a scene through frames and takes control values and training deltas of one geometry. The geometry is in export
+/// mode as long as this lives. One frame is held. Errors are std::runtime_error with a sentence that begins with the
+/// frame. Thread: main.
+class FrameSampler {
+public:
+    /// Goes to the frame and evaluates everything once. Throws for a geometry without a target, or without controls.
+    FrameSampler(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, int firstFrame);
+    ~FrameSampler();
+    FrameSampler(const FrameSampler&) = delete;
+    FrameSampler& operator=(const FrameSampler&) = delete;
+
+    const DeltaKind& kind() const { return kind_; }
+    const HIndexMapper& map() const { return map_; }
+    const std::vector<std::string>& names() const { return names_; }
+
+    /// Afterwards controls() and deltas() are those of the frame; all of them are numbers.
+    void sample(int frame);
+    const std::vector<float>& controls() const { return controls_; } ///< as many as names()
+    const std::vector<float>& deltas() const { return deltas_; } ///< x, y, z of each affected vertex, in their order
+
+private:
+    void switchExport(bool on);
+    void evaluateInputs();
+    void readMap();
+    void takeControls();
+    void takeDeltas();
+    std::string targetSizes() const;
+    std::string command(const std::string& flags) const;
+
+    OpenQuarn::Session& host_;
+    const Warp& warp_;
+    const WarpGeometry& geometry_;
+    DeltaKind kind_;
+    HIndexMapper map_;
+    std::vector<std::string> names_;
+    std::vector<float> controls_;
+    std::vector<float> deltas_;
+    bool isExporting_ = false;
+};
+
+} // namespace quarn

@@ -1,0 +1,55 @@
+// SPDX-License-Identifier: Apache-2.0
+// A NumPy array that grows on the disk, row by row, and can be taken up again after the program has died.
+#pragma once
+
+#include "quarn/dataset/Fnv64.h"
+#include "rig/FileDescriptor.h"
+
+#include <cstdint>
+#include <filesystem>
+#include <memory>
+#include <span>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+/// What the array is when it is complete: shape[0] rows, in C order.
+struct ArrayLayout {
+    std::string type;                 ///< of its numbers, "<f4" or "<i4": 4 bytes each
+    std::vector<std::uint64_t> shape; ///< one to three dimensions
+
+    std::uint64_t rowBytes() const;
+    /// The 128 bytes before the numbers: a header of NPY format version 1.0.
+    std::string head() const;
+};
+
+/// Errors are std::runtime_error with a sentence that names the path and the reason. Thread: one at a time.
+class RowFile {
+public:
+    RowFile(std::filesystem::path path, ArrayLayout layout);
+
+    /// An array without rows, whose header says how many there are going to be. What was at the path is replaced.
+    void begin();
+    /// Takes up the file with its first `rows` rows, when `sum` is their sum(); what comes after them is cut off. False
+    /// when the file is not there, too short, longer than the complete array, or other bytes; it is then as it was.
+    bool resume(std::uint64_t rows, const std::string& sum);
+    /// `row` rowBytes() bytes. After an error only destruction is left.
+    void append(std::span<const std::byte> row);
+    /// Brings the rows to the disk.
+    void sync();
+    /// Of the header and all rows appended.
+    std::string sum() const { return sum_.text(); }
+
+private:
+    void cut(std::uint64_t rows);
+    bool hasSum(std::uint64_t bytes, const std::string& sum);
+    [[noreturn]] void fail(int error) const;
+
+    std::filesystem::path path_;
+    ArrayLayout layout_;
+    std::unique_ptr<rig::FileDescriptor> file_;
+    Fnv64 sum_;
+};
+
+} // namespace quarn

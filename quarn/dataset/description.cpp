@@ -1,0 +1,209 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/dataset/description.h"
+
+#include "quarn/console/json.h"
+#include "quarn/scene/meshes.h"
+#include "quarn/scene/plugs.h"
+#include "quarn/scene/units.h"
+
+#include "openquarn_app/Commands.h"
+
+#include <algorithm>
+#include <array>
+#include <charconv>
+#include <cmath>
+#include <fstream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+constexpr std::streamoff headSize = 128; // of the array files
+
+struct Range {
+    float least = 0;
+    float largest = 0;
+};
+
+// reads the file again: rows of an earlier run count as well
+std::vector<Range> rangesOf(const std::filesystem::path& controls, const DatasetShape& shape) {
+    std::ifstream file(controls, std::ios::binary);
+    file.seekg(headSize);
+    std::vector<Range> ranges(shape.controls);
+    std::vector<float> row(shape.controls);
+    for (std::size_t number = 0; number < shape.rows; ++number) {
+        file.read(reinterpret_cast<char*>(row.data()), static_cast<std::streamsize>(row.size() * sizeof(float)));
+        for (std::size_t i = 0; i < row.size(); ++i) {
+            const Range before = number == 0 ? Range{row[i], row[i]} : ranges[i];
+            ranges[i] = {std::min(before.least, row[i]), std::max(before.largest, row[i])};
+        }
+    }
+    if (!file)
+        throw std::runtime_error(controls.string() + " could not be read");
+    return ranges;
+}
+
+// in the fewest digits that make the same float
+void writeFloat(JsonWriter& writer, float value) {
+    std::array<char, 32> text = {};
+    const auto [end, error] = std::to_chars(text.data(), text.data() + text.size(), value);
+    writer.RawValue(text.data(), static_cast<std::size_t>(end - text.data()), rapidjson::kNumberType);
+}
+
+void writeCount(JsonWriter& writer, const char* key, std::size_t count) {
+    writer.Key(key);
+    writer.Uint64(count);
+}
+
+std::string labelOf(const HPlug& plug) {
+    const auto outcome = OpenQuarn::runCommand("getAttr -asString " + OpenQuarn::quotedWord(plug.name().asChar()));
+    const auto* label = std::get_if<std::string>(&outcome.result);
+    if (label == nullptr)
+        throw std::runtime_error(outcome.error);
+    return *label;
+}
+
+// the training settings of the geometry, one key each
+class TrainWriter {
+public:
+    TrainWriter(JsonWriter& writer, const Warp& warp, const WarpGeometry& geometry)
+        : writer_(writer)
+        , warp_(warp)
+        , geometry_(geometry) {}
+
+    void text(const char* name) { writeText(writer_, name, textOf(plug(name))); }
+    void label(const char* name) { writeText(writer_, name, labelOf(plug(name))); }
+    void truth(const char* name) { writeBool(writer_, name, wholeNumberOf(plug(name)) != 0); }
+    void whole(const char* name) {
+        writer_.Key(name);
+        writer_.Int(wholeNumberOf(plug(name)));
+    }
+    void number(const char* name) {
+        writer_.Key(name);
+        writer_.Double(numberOf(plug(name)));
+    }
+    void single(const char* name) {
+        writer_.Key(name);
+        writeFloat(writer_, static_cast<float>(numberOf(plug(name))));
+    }
+
+private:
+    HPlug plug(const char* name) const { return warp_.plug("train", geometry_, name); }
+    JsonWriter& writer_;
+    const Warp& warp_;
+    const WarpGeometry& geometry_;
+};
+
+void writeTrain(JsonWriter& writer, const Warp& warp, const WarpGeometry& geometry) {
+    TrainWriter train(writer, warp, geometry);
+    writer.Key("train");
+    writer.StartObject();
+    train.text("outputModelName");
+    train.whole("batchSize");
+    train.whole("epochs");
+    train.number("learningRate");
+    train.single("validationRatio");
+    train.whole("hiddenLayerCount");
+    train.whole("neuronsPerLayer");
+    train.label("activationFunction");
+    train.single("dropoutRatio");
+    train.truth("principalShapesEnabled");
+    train.whole("principalShapesLimit");
+    train.single("principalShapesAccuracy");
+    train.truth("preloadData");
+    writer.EndObject();
+}
+
+void writeSubset(JsonWriter& writer, const HIndexMapper& map) {
+    const bool isComplete = map.isIdentityMap();
+    const bool isEmpty = map.affectCount() == 0;
+    writeText(writer, "subsetState", isEmpty ? "empty" : isComplete ? "complete" : "partial");
+    writeCount(writer, "affectCount", map.affectCount());
+    writeCount(writer, "fullCount", map.fullCount());
+    if (isComplete || isEmpty)
+        return;
+    writer.Key("affectMap");
+    writer.StartArray();
+    for (const unsigned vertex : map.affectMap())
+        writer.Uint(vertex);
+    writer.EndArray();
+}
+
+void writeControls(JsonWriter& writer, const std::vector<std::string>& names, const std::vector<Range>& ranges) {
+    writer.Key("controlNames");
+    writer.StartArray();
+    for (const std::string& name : names)
+        writeText(writer, name);
+    writer.EndArray();
+    writer.Key("controlRanges");
+    writer.StartArray();
+    for (const Range& range : ranges) {
+        writer.StartArray();
+        writeFloat(writer, range.least);
+        writeFloat(writer, range.largest);
+        writer.EndArray();
+    }
+    writer.EndArray();
+}
+
+void writeFiles(JsonWriter& writer) {
+    writer.Key("files");
+    writer.StartObject();
+    writeText(writer, "controls", datasetFile::controls);
+    writeText(writer, "deltas", datasetFile::deltas);
+    writeText(writer, "frames", datasetFile::frames);
+    writer.EndObject();
+}
+
+} // namespace
+
+double boundingBoxDiagonal(const HPlug& mesh) {
+    std::vector<double> xyz;
+    readPoints(mesh, xyz);
+    double squares = 0;
+    for (std::size_t axis = 0; axis < 3 && !xyz.empty(); ++axis) {
+        double least = xyz[axis];
+        double largest = least;
+        for (std::size_t i = axis; i < xyz.size(); i += 3) {
+            least = std::min(least, xyz[i]);
+            largest = std::max(largest, xyz[i]);
+        }
+        squares += (largest - least) * (largest - least);
+    }
+    return std::sqrt(squares);
+}
+
+std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, const WarpGeometry& geometry,
+                               const FrameSampler& sampler, const std::filesystem::path& controls) {
+    const DatasetShape& shape = facts.shape;
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.SetFormatOptions(rapidjson::kFormatSingleLineArray);
+    writer.StartObject();
+    writeText(writer, "format", "neuralWarp training data");
+    writeCount(writer, "version", 1);
+    writeText(writer, "writtenBy", "quarn " QUARN_VERSION);
+    writeText(writer, "scene", facts.scene);
+    writeText(writer, "deformer", warp.name);
+    writeText(writer, "geometry", geometry.name);
+    writeCount(writer, "geometryIndex", geometry.index);
+    writeCount(writer, "frameCount", shape.rows);
+    writeCount(writer, "controlCount", shape.controls);
+    writeCount(writer, "deltaCount", shape.deltas);
+    writeText(writer, "deltaType", sampler.kind().code());
+    writeCount(writer, "deltaMode", static_cast<std::size_t>(sampler.kind().mode));
+    writeCount(writer, "smoothingIterations", static_cast<std::size_t>(sampler.kind().smoothingIterations));
+    writeSubset(writer, sampler.map());
+    writeText(writer, "componentTagExpression", textOf(warp.plug("input", geometry, "componentTagExpression")));
+    writeControls(writer, sampler.names(), rangesOf(controls, shape));
+    writer.Key("metersPerUnit");
+    writer.Double(metersPerUnit());
+    writer.Key("boundingBoxDiagonal");
+    writer.Double(facts.diagonal);
+    writeTrain(writer, warp, geometry);
+    writeFiles(writer);
+    writer.EndObject();
+    return buffer.GetString() + std::string("\n");
+}
+
+} // namespace quarn

@@ -1,0 +1,27 @@
+// SPDX-License-Identifier: Apache-2.0
+// dataset.json: what a trainer has to know of a data set beside its numbers.
+#pragma once
+
+#include "quarn/dataset/DatasetWriter.h"
+#include "quarn/dataset/FrameSampler.h"
+
+#include <filesystem>
+#include <string>
+
+namespace quarn {
+
+struct DatasetFacts {
+    std::string scene;   ///< name of its file
+    double diagonal = 0; ///< of the rest mesh's bounding box, in units of the scene
+    DatasetShape shape;
+};
+
+/// Evaluates the rest mesh. Throws std::runtime_error, naming the plug, when there is none. Thread: main.
+double boundingBoxDiagonal(const HPlug& mesh);
+
+/// The text of dataset.json; docs/dataset.md lists what is in it. `controls` the complete controls.npy, whose ranges it
+/// states. Throws std::runtime_error. Thread: main.
+std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, const WarpGeometry& geometry,
+                               const FrameSampler& sampler, const std::filesystem::path& controls);
+
+} // namespace quarn

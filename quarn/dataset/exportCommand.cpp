@@ -1,0 +1,74 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/commands.h"
+#include "quarn/console/interrupt.h"
+#include "quarn/console/json.h"
+#include "quarn/dataset/exportDatasets.h"
+
+#include <CLI/CLI.hpp>
+
+#include <iostream>
+
+namespace quarn {
+namespace {
+
+void writeCount(JsonWriter& writer, const char* key, std::uint64_t count) {
+    writer.Key(key);
+    writer.Uint64(count);
+}
+
+void printJson(const std::vector<ExportAnswer>& answers) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartArray();
+    for (const ExportAnswer& answer : answers) {
+        writer.StartObject();
+        writeText(writer, "geometry", answer.geometry);
+        writeText(writer, "folder", answer.folder.string());
+        writeCount(writer, "rows", answer.rows);
+        writeCount(writer, "rowsBefore", answer.rowsBefore);
+        writeCount(writer, "controls", answer.controls);
+        writeCount(writer, "vertices", answer.vertices);
+        writeCount(writer, "bytes", answer.bytes);
+        writer.EndObject();
+    }
+    writer.EndArray();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void printText(const std::vector<ExportAnswer>& answers) {
+    for (const ExportAnswer& answer : answers)
+        std::cout << answer.geometry << ": " << answer.rows << " rows of " << answer.controls << " controls and "
+                  << answer.vertices << " vertices, " << answer.bytes << " bytes, in " << answer.folder.string()
+                  << '\n';
+}
+
+void execute(const ExportOptions& options) {
+    watchForInterrupt();
+    const std::vector<ExportAnswer> answers = exportDatasets(options);
+    if (options.console.json)
+        printJson(answers);
+    else
+        printText(answers);
+}
+
+} // namespace
+
+void addExportCommand(CLI::App& app) {
+    const auto options = std::make_shared<ExportOptions>();
+    CLI::App* command = app.add_subcommand("export", "Write training data: control values and deltas, frame by frame");
+    addSceneOptions(*command, options->scene);
+    command
+        ->add_option("-o,--output", options->output,
+                     "The folder to make; of several geometries, a folder of folders [trainingDataRoot and "
+                     "trainingDataName of the deformer]")
+        ->type_name("FOLDER");
+    command->add_option("--deformer", options->deformer, "The deformer [the only one]")->type_name("NAME");
+    command->add_option("--geometry", options->geometry, "One of its geometries [all]")->type_name("INDEX|NAME");
+    command->add_option("--frames", options->frames, "[exportStartFrame to exportEndFrame of the deformer]")
+        ->type_name("A-B[xS]");
+    command->add_flag("--overwrite", options->overwrite, "Replace another data set, or give up a begun one");
+    addConsoleOptions(*command, options->console, true);
+    command->callback([options] { execute(*options); });
+}
+
+} // namespace quarn

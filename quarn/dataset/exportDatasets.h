@@ -1,0 +1,43 @@
+// SPDX-License-Identifier: Apache-2.0
+// Training data sets of the geometries of a deformer.
+#pragma once
+
+#include "quarn/console/Console.h"
+#include "quarn/scene/SceneSession.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <filesystem>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+/// What `quarn export` is told by its flags.
+struct ExportOptions {
+    SceneOptions scene;
+    std::filesystem::path output; ///< of the one geometry, or the folder of the folders of several; empty: by the scene
+    std::string deformer;         ///< empty: the only one
+    std::string geometry;         ///< index or name; empty: all of them
+    std::string frames;           ///< as frameRange() reads them; empty: exportStartFrame to exportEndFrame
+    bool overwrite = false;
+    Console console;
+};
+
+/// What has come of a geometry.
+struct ExportAnswer {
+    std::string geometry;
+    std::filesystem::path folder;
+    std::size_t rows = 0;
+    std::size_t rowsBefore = 0; ///< of these, rows that an earlier run had made; all of them when it was complete
+    std::size_t controls = 0;
+    std::size_t vertices = 0;
+    std::uintmax_t bytes = 0;
+};
+
+/// Opens the scene and writes a complete data set for each geometry. Rows that an earlier run of the same set-up has
+/// left in FOLDER.part are gone on from; docs/dataset.md says when they are not. Whatever ends it early, an error or
+/// Ctrl-C, leaves FOLDER as it was. Errors are std::runtime_error with the sentence for the user. Thread: main.
+std::vector<ExportAnswer> exportDatasets(const ExportOptions& options);
+
+} // namespace quarn
