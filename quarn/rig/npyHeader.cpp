@@ -128,42 +128,24 @@ Shape shapeFrom(Tokens& tokens) {
     return shape;
 }
 
-std::string shapeText(const Shape& shape) {
-    std::string text;
-    for (std::size_t i = 0; i < std::min<std::size_t>(shape.size(), 5); ++i)
-        text += (i > 0 ? ", " : "") + std::to_string(shape[i]);
-    return "[" + text + (shape.size() > 5 ? ", ...]" : "]");
-}
-
-void readShape(Tokens& tokens, NpyHeader& header) {
-    const Shape shape = shapeFrom(tokens);
-    if (shape.size() < 2 || shape.size() > 3 || shape.back() != 3)
-        fail("its shape is " + shapeText(shape) + ": a point cache has [frames, vertices, 3] or [vertices, 3]");
-    header.vertices = shape[shape.size() - 2];
-    header.frames = shape.size() == 3 ? shape.front() : 1;
-}
-
-void readDescr(Tokens& tokens, NpyHeader& header) {
+void readDescr(Tokens& tokens, NpyArray& array) {
     if (tokens.accept("["))
-        fail("its elements are structures: a point cache has plain numbers, '<f4' or '<f8'");
-    const std::string_view descr = tokens.text();
-    if (descr != "<f4" && descr != "<f8")
-        fail("its numbers are " + quoted(descr) + ": a point cache has '<f4' or '<f8', little-endian floats");
-    header.scalarSize = descr == "<f4" ? 4 : 8;
+        fail("its elements are structures: plain numbers are read, such as '<f4'");
+    array.descr = tokens.text();
 }
 
 void readOrder(Tokens& tokens) {
     if (tokens.truth())
-        fail("it is in Fortran order: a point cache is in C order, as numpy.ascontiguousarray makes it");
+        fail("it is in Fortran order: arrays in C order are read, as numpy.ascontiguousarray makes it");
 }
 
-void readValue(Tokens& tokens, std::string_view key, NpyHeader& header) {
+void readValue(Tokens& tokens, std::string_view key, NpyArray& array) {
     if (key == "descr")
-        readDescr(tokens, header);
+        readDescr(tokens, array);
     else if (key == "fortran_order")
         readOrder(tokens);
     else if (key == "shape")
-        readShape(tokens, header);
+        array.shape = shapeFrom(tokens);
     else
         fail("its header has an unknown key " + quoted(key));
 }
@@ -188,9 +170,9 @@ NpyPlace findNpyHeader(std::string_view bytes) {
     return place;
 }
 
-NpyHeader parseNpyHeader(std::string_view text) {
+NpyArray parseNpyArray(std::string_view text) {
     constexpr std::string_view keys[] = {"descr", "fortran_order", "shape"};
-    NpyHeader header;
+    NpyArray array;
     std::vector<std::string_view> seen;
     Tokens tokens(text);
     tokens.expect("{");
@@ -199,7 +181,7 @@ NpyHeader parseNpyHeader(std::string_view text) {
         if (std::find(seen.begin(), seen.end(), key) != seen.end())
             fail("its header has " + quoted(key) + " twice");
         tokens.expect(":");
-        readValue(tokens, key, header);
+        readValue(tokens, key, array);
         seen.push_back(key);
         if (!tokens.accept(",")) {
             tokens.expect("}");
@@ -210,17 +192,44 @@ NpyHeader parseNpyHeader(std::string_view text) {
     for (const std::string_view key : keys)
         if (std::find(seen.begin(), seen.end(), key) == seen.end())
             fail("its header has no " + quoted(key));
+    return array;
+}
+
+NpyHeader parseNpyHeader(std::string_view text) {
+    const NpyArray array = parseNpyArray(text);
+    if (array.descr != "<f4" && array.descr != "<f8")
+        fail("its numbers are " + quoted(array.descr) + ": a point cache has '<f4' or '<f8', little-endian floats");
+    const std::vector<std::uint64_t>& shape = array.shape;
+    if (shape.size() < 2 || shape.size() > 3 || shape.back() != 3)
+        fail("its shape is " + npyShapeText(shape) + ": a point cache has [frames, vertices, 3] or [vertices, 3]");
+    NpyHeader header;
+    header.scalarSize = array.descr == "<f4" ? 4 : 8;
+    header.vertices = shape[shape.size() - 2];
+    header.frames = shape.size() == 3 ? shape.front() : 1;
     return header;
 }
 
-std::string makeNpyHead(std::uint64_t frames, std::uint64_t vertices) {
+std::string npyShapeText(const std::vector<std::uint64_t>& shape) {
+    std::string text;
+    for (std::size_t i = 0; i < std::min<std::size_t>(shape.size(), 5); ++i)
+        text += (i > 0 ? ", " : "") + std::to_string(shape[i]);
+    return "[" + text + (shape.size() > 5 ? ", ...]" : "]");
+}
+
+std::string makeNpyHead(std::string_view descr, const std::vector<std::uint64_t>& shape) {
     constexpr std::size_t textLength = npyHeadSize - 10;
     std::string head(magic);
     head += {'\1', '\0', static_cast<char>(textLength), '\0'};
-    head += "{'descr': '<f4', 'fortran_order': False, 'shape': (" + std::to_string(frames) + ", " +
-            std::to_string(vertices) + ", 3), }";
+    head += "{'descr': '" + std::string(descr) + "', 'fortran_order': False, 'shape': (";
+    for (std::size_t i = 0; i < shape.size(); ++i)
+        head += (i > 0 ? " " : "") + std::to_string(shape[i]) + (i + 1 < shape.size() || i == 0 ? "," : "");
+    head += "), }";
     head.resize(npyHeadSize - 1, ' ');
     return head += '\n';
+}
+
+std::string makeNpyHead(std::uint64_t frames, std::uint64_t vertices) {
+    return makeNpyHead("<f4", {frames, vertices, 3});
 }
 
 } // namespace rig

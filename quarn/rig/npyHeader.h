@@ -10,6 +10,7 @@
 #include <cstdint>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace rig {
 
@@ -19,6 +20,12 @@ struct NpyHeader {
     std::uint64_t frames = 1;    ///< as the header says: not checked against anything
     std::uint64_t vertices = 0;  ///< of one frame; the same
     std::uint64_t dataStart = 0; ///< byte of the file where the numbers begin
+};
+
+/// What the header of any array says; none of it is checked against anything.
+struct NpyArray {
+    std::string descr; ///< such as "<f4"
+    std::vector<std::uint64_t> shape;
 };
 
 /// So many bytes of a file tell where its header is.
@@ -36,6 +43,12 @@ struct NpyPlace {
 /// alone, when these are not the first bytes of a file that is read here. [any]
 NpyPlace findNpyHeader(std::string_view bytes);
 
+/// Reads the header's text, of any array in C order whose elements are plain. Throws std::runtime_error, with the
+/// reason alone, for anything but the three keys. [any]
+NpyArray parseNpyArray(std::string_view text);
+/// "[2, 3]"; of more than five numbers the first five. [any]
+std::string npyShapeText(const std::vector<std::uint64_t>& shape);
+
 /// Reads the header's text; `dataStart` stays 0. A shape [vertices, 3] is one frame. Throws std::runtime_error, with
 /// the reason alone, for anything but the three keys with values that are read here. [any]
 NpyHeader parseNpyHeader(std::string_view text);
@@ -43,7 +56,9 @@ NpyHeader parseNpyHeader(std::string_view text);
 /// Size of what makeNpyHead() gives: room for any shape, and a multiple of 64, which keeps the numbers aligned.
 constexpr std::size_t npyHeadSize = 128;
 
-/// All bytes before the numbers of a file of version 1.0 with [frames, vertices, 3] '<f4'. [any]
+/// All bytes before the numbers of a file of version 1.0. `shape` at most 3 numbers. [any]
+std::string makeNpyHead(std::string_view descr, const std::vector<std::uint64_t>& shape);
+/// The same of [frames, vertices, 3] '<f4'. [any]
 std::string makeNpyHead(std::uint64_t frames, std::uint64_t vertices);
 
 } // namespace rig

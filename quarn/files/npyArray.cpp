@@ -1,0 +1,108 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/files/npyArray.h"
+
+#include "quarn/files/WholeFile.h"
+#include "rig/npyHeader.h"
+
+#include <algorithm>
+#include <fstream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+using Shape = std::vector<std::uint64_t>;
+
+[[noreturn]] void fail(const std::filesystem::path& path, const std::string& why) {
+    throw std::runtime_error("array '" + path.string() + "' cannot be read: " + why);
+}
+
+// all bytes of a regular file
+std::string bytesOf(const std::filesystem::path& path) {
+    std::error_code error;
+    const std::uint64_t size = std::filesystem::file_size(path, error);
+    if (error)
+        fail(path, error.message());
+    if (size > npyArrayFileLimit)
+        fail(path, "it has " + std::to_string(size) + " bytes, and at most " + std::to_string(npyArrayFileLimit) +
+                       " are read");
+    std::ifstream file(path, std::ios::binary);
+    std::string bytes(size, '\0');
+    if (!file.read(bytes.data(), static_cast<std::streamsize>(size)))
+        fail(path, "it cannot be opened, or has been cut short meanwhile");
+    return bytes;
+}
+
+struct Body {
+    Shape shape;
+    std::string_view numbers; ///< of 4 bytes each, as many as the shape says
+};
+
+// what follows the header, once it is found to be as long as the shape says
+Body bodyOf(std::string_view bytes, const std::string& descr, std::size_t dimensions) {
+    const rig::NpyPlace place = rig::findNpyHeader(bytes.substr(0, rig::npyPreambleSize));
+    if (place.start + place.length > bytes.size())
+        throw std::runtime_error("it is cut short within its header");
+    const rig::NpyArray array = rig::parseNpyArray(bytes.substr(place.start, place.length));
+    if (array.descr != descr || array.shape.size() != dimensions)
+        throw std::runtime_error("it has numbers '" + array.descr + "' in the shape " + rig::npyShapeText(array.shape) +
+                                 ", where '" + descr + "' in " + std::to_string(dimensions) +
+                                 (dimensions == 1 ? " dimension is" : " dimensions are") + " expected");
+    const std::string_view numbers = bytes.substr(place.start + place.length);
+    std::uint64_t needed = sizeof(float);
+    for (const std::uint64_t size : array.shape)
+        if (__builtin_mul_overflow(needed, size, &needed))
+            throw std::runtime_error("its shape " + rig::npyShapeText(array.shape) + " is too large");
+    if (needed != numbers.size())
+        throw std::runtime_error("its shape " + rig::npyShapeText(array.shape) + " takes " + std::to_string(needed) +
+                                 " bytes, and " + std::to_string(numbers.size()) + " follow the header");
+    return {array.shape, numbers};
+}
+
+template <class Number>
+Shape read(const std::filesystem::path& path, const char* descr, std::size_t dimensions, std::vector<Number>& values) {
+    const std::string bytes = bytesOf(path);
+    try {
+        const Body body = bodyOf(bytes, descr, dimensions);
+        values.resize(body.numbers.size() / sizeof(Number));
+        std::copy(body.numbers.begin(), body.numbers.end(), reinterpret_cast<char*>(values.data()));
+        return body.shape;
+    } catch (const std::runtime_error& error) {
+        fail(path, error.what());
+    }
+}
+
+template <class Number>
+void write(const std::filesystem::path& path, const char* descr, const Shape& shape, std::span<const Number> values) {
+    WholeFile file(path);
+    file.stream() << rig::makeNpyHead(descr, shape);
+    file.stream().write(reinterpret_cast<const char*>(values.data()),
+                        static_cast<std::streamsize>(values.size_bytes()));
+    file.finish();
+}
+
+} // namespace
+
+FloatTable readFloatTable(const std::filesystem::path& path) {
+    FloatTable table;
+    const Shape shape = read(path, "<f4", 2, table.values);
+    table.rows = shape[0];
+    table.columns = shape[1];
+    return table;
+}
+
+std::vector<std::int32_t> readIntegers(const std::filesystem::path& path) {
+    std::vector<std::int32_t> values;
+    read(path, "<i4", 1, values);
+    return values;
+}
+
+void writeFloatTable(const std::filesystem::path& path, const FloatTable& table) {
+    write<float>(path, "<f4", {table.rows, table.columns}, table.values);
+}
+
+void writeIntegers(const std::filesystem::path& path, std::span<const std::int32_t> values) {
+    write(path, "<i4", {values.size()}, values);
+}
+
+} // namespace quarn
