@@ -41,6 +41,8 @@ declare -A probe_of=(
   [python3-scipy]=/usr/lib/python3/dist-packages/scipy/__init__.py
   [python3-tqdm]=/usr/lib/python3/dist-packages/tqdm/__init__.py
   [python3-matplotlib]=/usr/lib/python3/dist-packages/matplotlib/__init__.py
+  [python3-pil]=/usr/lib/python3/dist-packages/PIL/__init__.py
+  [libopenblas0-pthread]=/usr/lib/*/openblas-pthread/libblas.so.3 # ten times as fast as the reference one
   [dpkg-dev]=dpkg-source
   [git]=git
 )
