@@ -92,7 +92,7 @@ HObject collectorAt(const HPlug& source) {
 
 HObject poseCollector(const Warp& warp) {
     if (const HPlug generator = warp.plug("poseGenerator").source(); !generator.isNull()) {
-        const HObject collector = collectorAt(generator);
+        HObject collector = collectorAt(generator);
         if (collector.isNull())
             throw std::runtime_error(std::string(generator.name().asChar()) + " is connected into " + warp.name +
                                      ".poseGenerator, and is no " + collectorType);

@@ -42,8 +42,9 @@ public:
         degrees_ = choice(document, "unit", {"radians", "degrees"}) == 1;
         constexpr std::array kinds{PoseKeys::Kind::linear, PoseKeys::Kind::spline, PoseKeys::Kind::step};
         kind_ = kinds[static_cast<std::size_t>(choice(document, "interpolation", {"linear", "smooth", "step"}))];
-        const auto keys = document.FindMember("keys");
-        if (keys == document.MemberEnd() || !keys->value.IsObject() || keys->value.ObjectEmpty())
+        const rapidjson::Value& file = document; // its iterators compare in both compilers only where it is const
+        const auto keys = file.FindMember("keys");
+        if (keys == file.MemberEnd() || !keys->value.IsObject() || keys->value.ObjectEmpty())
             fail(R"(has no "keys", an object with a list of [frame, value] for each plug)");
         std::vector<PlugKeys> plugs;
         plugs.reserve(keys->value.MemberCount());

@@ -80,7 +80,7 @@ Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpG
                    std::size_t vertices) {
     const std::vector<std::int32_t> map = characterVertexMap();
     requireFit(map, file.vertexCount(), vertices);
-    const Cache cache{pathOfConverted(options, geometry), file.frameCount(), true};
+    Cache cache{pathOfConverted(options, geometry), file.frameCount(), true};
     const double apart = writeInSceneOrder(options.cache, cache.path, map, vertices, options.console);
     constexpr double agrees = 1e-5; // of the mesh's size: what single precision and a solver's noise give
     if (apart > agrees * diagonalOf(restMesh(geometry)))

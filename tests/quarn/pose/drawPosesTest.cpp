@@ -11,7 +11,6 @@
 
 namespace {
 
-using quarn::DrawSettings;
 using quarn::PoseSet;
 using quarn::ValueLimits;
 
@@ -41,6 +40,7 @@ TEST(PoseSetTest, AgreesWithComparingAll) {
         std::vector<std::vector<double>> taken;
         for (int i = 0; i < 400; ++i) {
             std::vector<double> pose;
+            pose.reserve(limits.size());
             for (const ValueLimits& limit : limits)
                 pose.push_back(limit.least + (limit.most - limit.least) * double(random() % 8 + random() % 3) / 9.0);
             const bool isNew = std::none_of(taken.begin(), taken.end(), [&](const auto& known) {

@@ -125,8 +125,8 @@ std::vector<std::int32_t> reversedMap() {
 
 TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
     std::vector<float> points(3 * (vertices + 1));
-    for (std::size_t i = 0; i < points.size(); ++i)
-        points[i] = static_cast<float>(i / 3);
+    for (std::size_t vertex = 0; vertex < vertices; ++vertex)
+        std::fill_n(points.begin() + std::ptrdiff_t(3 * vertex), 3, static_cast<float>(vertex));
     points[3 * vertices] = 0.125F; // joined with vertex 0, at a distance
     points[3 * vertices + 1] = points[3 * vertices + 2] = 0.0F;
     rig::NpyWriter writer(path("file.npy"), vertices + 1);
@@ -139,8 +139,10 @@ TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
     ASSERT_EQ(converted.vertexCount(), vertices);
     std::vector<double> xyz(3 * vertices);
     converted.read(0, 0, xyz);
-    for (std::size_t i = 0; i < xyz.size(); ++i)
-        EXPECT_EQ(xyz[i], double(vertices - 1 - i / 3));
+    for (std::size_t i = 0; i < xyz.size(); ++i) {
+        const std::size_t vertex = i / 3;
+        EXPECT_EQ(xyz[i], double(vertices - 1 - vertex));
+    }
 
     points[3 * vertices] = std::nanf("");
     rig::NpyWriter again(path("file.npy"), vertices + 1);
