@@ -37,7 +37,7 @@ constexpr std::array<Sample2, raysPerPixel> inPixel = {{{0.0625F, 0.4375F},
 // which of the 16 patterns a pixel has
 std::uint32_t patternOf(int x, int y) {
     constexpr std::array<std::uint32_t, 16> patterns = {0, 8, 2, 10, 12, 4, 14, 6, 3, 11, 1, 9, 15, 7, 13, 5};
-    return patterns[static_cast<std::size_t>((y & 3) * 4 + (x & 3))];
+    return patterns[4 * static_cast<std::size_t>(y & 3) + static_cast<std::size_t>(x & 3)];
 }
 
 // a place on the surface, seen from the viewer's side

@@ -5,6 +5,7 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/files/WholeFile.h"
+#include "quarn/render/ErrorWatch.h"
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
@@ -136,6 +137,7 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
     double largest = 0.0;
     const std::size_t count = shot.frames.count();
     const std::size_t looks = std::min(count, mostFramesLookedAt);
+    const ErrorWatch errors;
     Progress progress(options.console, "looking at the frames", looks);
     for (std::size_t number = 0; number < looks; ++number) {
         // with more frames than looks, spread evenly from the first to the last
@@ -147,6 +149,7 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
             for (const double distance : shown.distances)
                 largest = std::max(largest, distance);
         }
+        errors.throwIfAny(frame);
         progress.advance();
     }
     shot.camera = framing.camera();
@@ -164,6 +167,7 @@ void warnOfEmptyPanels(const Shot& shot, const Console& console) {
 void drawPictures(const Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
     const std::filesystem::path pattern = absolutePath(options.output);
     const std::size_t count = shot.frames.count();
+    const ErrorWatch errors;
     Progress progress(options.console, "drawing", count);
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
@@ -176,6 +180,7 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
             drawPanel(picture, shot.layout, left, shot.camera, shot.panels[panel], shown, shot.scale);
             left += shot.layout.width;
         }
+        errors.throwIfAny(frame);
         WholeFile file(pictureName(pattern, frame, count > 1));
         writePng(file.stream(), picture);
         file.finish();

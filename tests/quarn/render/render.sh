@@ -21,7 +21,7 @@ draw -o "$work/one.png"
 draw -o "$work/single.png" --threads 1
 cmp "$work/one.png" "$work/single.png"
 
-draw -o "$work/pic.###.png" --frames 1-5x2 --heat "moved=wave.outputGeom[0]:strip.outMesh" --quiet --json >"$work/json"
+draw -o "$work/pic.###.png" --frames 1-5x2 --heat "moved=strip.outMesh:wave.originalGeometry[0]" --quiet --json >"$work/json"
 [ "$(cd "$work" && echo pic.*)" = "pic.001.png pic.003.png pic.005.png" ] || fail "the pictures have other names"
 [ "$(size_of "$work/pic.003.png")" = 000000500000001e ] || fail "two panels are not twice as wide"
 cmp "$work/pic.001.png" "$work/pic.005.png" # nothing moves in this scene
@@ -33,5 +33,6 @@ refused '"10x" is no size' -o "$work/no.png" --size 10x
 refused "cannot be made" -o "$work/no.png" --size 9000x100 --panel a=strip.outMesh --panel b=strip.outMesh
 refused "there is no plug strip.none" -o "$work/no.png" --plug strip.none
 refused "no deformer none" -o "$work/no.png" --model x --deformer none
+refused "Unable to access the ML model" -o "$work/no.png" --model none
 [ ! -e "$work/no.png" ] || fail "a refused picture was written"
 if ls "$work"/*.part* 2>/dev/null; then fail "a part of a picture is left"; fi
