@@ -112,11 +112,15 @@ DatasetFolder::Begun DatasetFolder::begun(const Setup& setup) const {
                              "); choose another place with -o, or begin again with --overwrite");
 }
 
-void DatasetFolder::begin(const Setup& setup) const {
+void DatasetFolder::discard() const {
     for (const char* file : ourFiles)
         if (file != FolderLock::fileName)
             removeFile(part_ / file);
     removeTools(part_, false);
+}
+
+void DatasetFolder::begin(const Setup& setup) const {
+    discard();
     writeWhole(part_ / setupFile, setup.json());
 }
 

@@ -30,7 +30,9 @@ public:
     enum class Begun { no, yes, damaged };
     /// Whether FOLDER.part was begun with this set-up. Throws when it was begun with another, without `replaces`.
     Begun begun(const Setup& setup) const;
-    /// Removes what was begun, and writes the set-up.
+    /// Removes what was begun.
+    void discard() const;
+    /// The same, and writes the set-up.
     void begin(const Setup& setup) const;
 
     /// Throws, with both numbers, unless the disk has room for so many bytes.

@@ -12,6 +12,7 @@
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Session.h"
 
+#include <algorithm>
 #include <cmath>
 #include <stdexcept>
 
@@ -55,8 +56,15 @@ DeltaKind deltaKind(const Warp& warp, const WarpGeometry& geometry) {
     kind.smoothingIterations = wholeNumberOf(warp.plug("export", geometry, "smoothingIterations"));
     if (kind.mode != 0 && kind.mode != 1)
         fail(std::string(mode.name().asChar()) + " is " + std::to_string(kind.mode) + "; set it to Offset or Surface");
-    setNumber(mode, kind.mode); // export mode needs the element, which may be there by its defaults only
     return kind;
+}
+
+// the deformer needs the elements to be there, also where everything in them is as it is by default
+void makeElement(const Warp& warp, const WarpGeometry& geometry, const char* array, const char* child) {
+    const std::vector<unsigned> indices = indicesOf(warp.plug(array));
+    const HPlug plug = warp.plug(array, geometry, child);
+    if (std::find(indices.begin(), indices.end(), geometry.index) == indices.end())
+        setNumber(plug, numberOf(plug));
 }
 
 float narrowed(double value, const std::string& what) {
@@ -76,6 +84,8 @@ FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const War
         fail(elementName(warp, "targetGeometry", geometry) +
              " has no target; quarn target SCENE --cache FILE.npy connects one");
     kind_ = deltaKind(warp, geometry);
+    makeElement(warp, geometry, "export", "deltaMode");
+    makeElement(warp, geometry, "models", "modelActive");
     host.setTime(firstFrame);
     strictly(firstFrame, [&] { evaluateInputs(); });
     {
@@ -87,15 +97,18 @@ FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const War
         if (names_.empty())
             fail(warp.name + ".controlValues has no values; connect the controls into it");
         readMap();
+        startExport();
     });
-    strictly(firstFrame, [&] { switchExport(true); });
+    try {
+        sample(firstFrame);
+    } catch (...) {
+        endExport(); // there is no destructor after this
+        throw;
+    }
 }
 
 FrameSampler::~FrameSampler() {
-    if (!isExporting_)
-        return;
-    OpenQuarn::runCommand(command("-exportActive off"));
-    OpenQuarn::makeDirty(warp_.node);
+    endExport();
 }
 
 std::string FrameSampler::command(const std::string& flags) const {
@@ -103,18 +116,22 @@ std::string FrameSampler::command(const std::string& flags) const {
            OpenQuarn::quotedWord(warp_.name);
 }
 
-void FrameSampler::switchExport(bool on) {
-    const OpenQuarn::CommandOutcome outcome =
-        OpenQuarn::runCommand(command(on ? "-exportActive on" : "-exportActive off"));
-    if (!outcome)
+void FrameSampler::startExport() {
+    if (const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand(command("-exportActive on")); !outcome)
         fail(outcome.error);
-    isExporting_ = on;
+    OpenQuarn::makeDirty(warp_.node);
+}
+
+void FrameSampler::endExport() {
+    OpenQuarn::runCommand(command("-exportActive off"));
     OpenQuarn::makeDirty(warp_.node);
 }
 
 void FrameSampler::evaluateInputs() {
     evaluate(geometry_.input);
     evaluate(geometry_.target);
+    if (geometry_.target.asHObject().isNull())
+        fail("the target " + std::string(geometry_.target.name().asChar()) + " holds no mesh");
     takeControls();
 }
 
@@ -139,6 +156,7 @@ void FrameSampler::sample(int frame) {
 
 void FrameSampler::takeControls() {
     const HPlug values = warp_.plug("controlValues");
+    evaluate(values); // elements that come along a connection are there afterwards
     const std::vector<unsigned> indices = indicesOf(values);
     if (!names_.empty() && indices.size() != names_.size())
         fail(warp_.name + ".controlValues has " + std::to_string(indices.size()) + " values, and had " +

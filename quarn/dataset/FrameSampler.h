@@ -27,7 +27,8 @@ struct DeltaKind {
 /// frame. Thread: main.
 class FrameSampler {
 public:
-    /// Goes to the frame and evaluates everything once. Throws for a geometry without a target, or without controls.
+    /// Goes to the frame and samples it. Throws as sample() does, and for a geometry without a target, or without
+    /// controls.
     FrameSampler(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, int firstFrame);
     ~FrameSampler();
     FrameSampler(const FrameSampler&) = delete;
@@ -43,7 +44,8 @@ public:
     const std::vector<float>& deltas() const { return deltas_; } ///< x, y, z of each affected vertex, in their order
 
 private:
-    void switchExport(bool on);
+    void startExport();
+    void endExport();
     void evaluateInputs();
     void readMap();
     void takeControls();
@@ -59,7 +61,6 @@ private:
     std::vector<std::string> names_;
     std::vector<float> controls_;
     std::vector<float> deltas_;
-    bool isExporting_ = false;
 };
 
 } // namespace quarn

@@ -10,8 +10,11 @@
 namespace quarn {
 namespace {
 
+// without the compounds on the way, which a plug can be found without: "arm.rotateZ"
 std::string nameOf(const HPlug& plug) {
-    return plug.name().asChar();
+    const std::string path = plug.partialName().asChar();
+    const bool isPlain = path.find('[') == std::string::npos;
+    return nodeName(plug.node()) + "." + (isPlain ? path.substr(path.rfind('.') + 1) : path);
 }
 
 std::string list(const char* name, unsigned index) {

@@ -43,8 +43,9 @@ std::vector<Range> rangesOf(const std::filesystem::path& controls, const Dataset
     return ranges;
 }
 
-// in the fewest digits that make the same float
-void writeFloat(JsonWriter& writer, float value) {
+// in the fewest digits that make the same number
+template <class Number>
+void writeNumber(JsonWriter& writer, Number value) {
     std::array<char, 32> text = {};
     const auto [end, error] = std::to_chars(text.data(), text.data() + text.size(), value);
     writer.RawValue(text.data(), static_cast<std::size_t>(end - text.data()), rapidjson::kNumberType);
@@ -80,11 +81,11 @@ public:
     }
     void number(const char* name) {
         writer_.Key(name);
-        writer_.Double(numberOf(plug(name)));
+        writeNumber(writer_, numberOf(plug(name)));
     }
     void single(const char* name) {
         writer_.Key(name);
-        writeFloat(writer_, static_cast<float>(numberOf(plug(name))));
+        writeNumber(writer_, static_cast<float>(numberOf(plug(name))));
     }
 
 private:
@@ -139,8 +140,8 @@ void writeControls(JsonWriter& writer, const std::vector<std::string>& names, co
     writer.StartArray();
     for (const Range& range : ranges) {
         writer.StartArray();
-        writeFloat(writer, range.least);
-        writeFloat(writer, range.largest);
+        writeNumber(writer, range.least);
+        writeNumber(writer, range.largest);
         writer.EndArray();
     }
     writer.EndArray();
@@ -197,9 +198,9 @@ std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, cons
     writeText(writer, "componentTagExpression", textOf(warp.plug("input", geometry, "componentTagExpression")));
     writeControls(writer, sampler.names(), rangesOf(controls, shape));
     writer.Key("metersPerUnit");
-    writer.Double(metersPerUnit());
+    writeNumber(writer, metersPerUnit());
     writer.Key("boundingBoxDiagonal");
-    writer.Double(facts.diagonal);
+    writeNumber(writer, facts.diagonal);
     writeTrain(writer, warp, geometry);
     writeFiles(writer);
     writer.EndObject();

@@ -165,6 +165,8 @@ private:
     void keepRows(DatasetWriter& writer) const {
         try {
             writer.save();
+            if (writer.savedRows() == 0)
+                return folder_.discard(); // nothing that would be worth going on from
         } catch (const std::exception&) { // NOLINT(bugprone-empty-catch): what ended the rows is what the user reads
         }
         options_.console.note(std::to_string(writer.savedRows()) + " of " + std::to_string(facts_.shape.rows) +

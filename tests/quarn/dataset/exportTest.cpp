@@ -1,0 +1,243 @@
+// SPDX-License-Identifier: Apache-2.0
+// What is in a data set, and what is refused.
+#include "quarn/dataset/ExportScene.h"
+
+#include "quarn/dataset/FrameSampler.h"
+#include "quarn/scene/meshes.h"
+#include "quarn/scene/plugs.h"
+
+#include "openquarn/HFnMeshData.h"
+#include "openquarn_app/Commands.h"
+
+#include <rapidjson/pointer.h>
+#include <rapidjson/stringbuffer.h>
+#include <rapidjson/writer.h>
+
+#include <cmath>
+#include <limits>
+
+namespace {
+
+using ::testing::AllOf;
+using ::testing::ElementsAre;
+using ::testing::EndsWith;
+using ::testing::FloatNear;
+using ::testing::HasSubstr;
+using ::testing::Pointwise;
+using ::testing::StartsWith;
+
+class ExportTest : public ExportScene {
+protected:
+    /// What stands at a place of dataset.json, as text: "/controlNames/5".
+    static std::string described(const std::filesystem::path& data, const char* place) {
+        rapidjson::Document json;
+        json.Parse(contentOf(data / "dataset.json").c_str());
+        const rapidjson::Value* value = rapidjson::Pointer(place).Get(json);
+        if (value == nullptr || value->IsString())
+            return value == nullptr ? "(none)" : value->GetString();
+        rapidjson::StringBuffer buffer;
+        rapidjson::Writer<rapidjson::StringBuffer> writer(buffer);
+        value->Accept(writer);
+        return buffer.GetString();
+    }
+
+    /// The points as the joint has them in a frame that counts from 0.
+    static std::vector<float> turned(const std::vector<float>& xyz, std::size_t frame) {
+        const double angle = turn * static_cast<double>(frame);
+        std::vector<float> result = xyz;
+        for (std::size_t i = 0; i < xyz.size(); i += 3) {
+            const double x = static_cast<double>(xyz[i]);
+            const double y = static_cast<double>(xyz[i + 1]);
+            result[i] = static_cast<float>(x * std::cos(angle) - y * std::sin(angle));
+            result[i + 1] = static_cast<float>(x * std::sin(angle) + y * std::cos(angle));
+        }
+        return result;
+    }
+
+    static std::vector<float> sum(const std::vector<float>& a, std::span<const float> b) {
+        std::vector<float> result = a;
+        for (std::size_t i = 0; i < a.size(); ++i)
+            result[i] += b[i];
+        return result;
+    }
+};
+
+// of a strip that turns as a whole, Surface mode turns rest plus delta, and Offset mode adds the delta to the input
+TEST_F(ExportTest, DeltasLeadToTheTargetInBothModes) {
+    constexpr std::size_t frames = 7;
+    writeTarget(frames);
+    for (const std::string mode : {"Surface", "Offset"}) {
+        SCOPED_TRACE(mode);
+        save(frames, "setAttr warp.export[0].deltaMode " + mode);
+        quarn::ExportOptions flags = options();
+        flags.output = folder.path() / mode;
+        const quarn::ExportAnswer answer = quarn::exportDatasets(flags).at(0);
+        EXPECT_EQ(answer.rows, frames);
+        const std::vector<float> deltas = numbersOf<float>(answer.folder / "deltas.npy");
+        ASSERT_EQ(deltas.size(), frames * vertexCount * 3);
+        for (std::size_t frame = 0; frame < frames; ++frame) {
+            const auto row = std::span(deltas).subspan(frame * vertexCount * 3, vertexCount * 3);
+            const std::vector<float> reached =
+                mode == "Surface" ? turned(sum(restPoints(), row), frame) : sum(turned(restPoints(), frame), row);
+            EXPECT_THAT(reached, Pointwise(FloatNear(2e-6F), targetAt(frame)));
+        }
+        EXPECT_EQ(described(answer.folder, "/deltaType"), mode == "Surface" ? "dos" : "dbp");
+    }
+}
+
+TEST_F(ExportTest, SaysWhatIsInIt) {
+    writeTarget(5);
+    save(5, "setAttr warp.train[0].validationRatio 0.3; setAttr warp.train[0].outputModelName arm");
+    quarn::ExportOptions flags = options();
+    flags.frames = "2-5x3";
+    const quarn::ExportAnswer answer = quarn::exportDatasets(flags).at(0);
+    EXPECT_EQ(answer.folder, std::filesystem::canonical(data()));
+    EXPECT_EQ(answer.bytes, 3 * 128 + 2 * (4 + 8 * 4 + 36 * 4) + contentOf(data() / "dataset.json").size());
+    EXPECT_THAT(numbersOf<int>(data() / "frames.npy"), ElementsAre(2, 5));
+    const auto angle = [](int frame) { return static_cast<float>(turn * (frame - 1)); };
+    const float c = std::cos(angle(5)), s = std::sin(angle(5));
+    const std::vector<float> controls = numbersOf<float>(data() / "controls.npy");
+    ASSERT_EQ(controls.size(), 16U);
+    EXPECT_THAT(std::vector<float>(controls.begin() + 8, controls.end()),
+                Pointwise(FloatNear(1e-6F), {c, s, 0.0F, -s, c, 0.0F, angle(5), 0.25F}));
+
+    EXPECT_THAT(contentOf(data() / "controls.npy").substr(10, 100),
+                HasSubstr("'<f4', 'fortran_order': False, 'shape': (2, 8)"));
+    EXPECT_THAT(contentOf(data() / "deltas.npy").substr(10, 100), HasSubstr("(2, 12, 3)"));
+    EXPECT_THAT(contentOf(data() / "frames.npy").substr(10, 100),
+                HasSubstr("'<i4', 'fortran_order': False, 'shape': (2,)"));
+    const std::map<const char*, std::string> expected = {
+        {"/geometry", "strip"},
+        {"/subsetState", "complete"},
+        {"/affectMap", "(none)"},
+        {"/controlNames/5", "arm.relativeMatrix:5"},
+        {"/controlNames/6", "arm.rotateZ"},
+        {"/controlNames/7", "controls.inputList[5].input[0]"},
+        {"/controlRanges/6", "[0.05,0.2]"},
+        {"/boundingBoxDiagonal", "5.0990195135927845"},
+        {"/train/validationRatio", "0.3"},
+        {"/train/activationFunction", "LeakyReLU"},
+        {"/train/outputModelName", "arm"},
+    };
+    for (const auto& [place, text] : expected)
+        EXPECT_EQ(described(data(), place), text) << place;
+}
+
+TEST_F(ExportTest, DeformedVerticesKeepTheirOrder) {
+    writeTarget(2);
+    {
+        quarn::SceneSession session;
+        build(2, "setAttr warp.input[0].componentTagExpression tip; setAttr warp.export[0].deltaMode Offset");
+        const HPlug mesh = quarn::findPlug("strip.inMesh");
+        HFnMeshData tagged(mesh.asHObject());
+        HUintArray tip(2);
+        tip[0] = 7, tip[1] = 3;
+        ASSERT_FALSE(tagged.setComponentTag("tip", tip).error());
+        HPlug(mesh).setHObject(tagged.object());
+        session.save(scene());
+    }
+    quarn::exportDatasets(options());
+    EXPECT_EQ(described(data(), "/subsetState"), "partial");
+    EXPECT_EQ(described(data(), "/affectMap"), "[7,3]");
+    EXPECT_EQ(described(data(), "/fullCount"), "12");
+    const std::vector<float> deltas = numbersOf<float>(data() / "deltas.npy");
+    ASSERT_EQ(deltas.size(), 12U);
+    EXPECT_FLOAT_EQ(deltas[0], targetAt(0)[21] - restPoints()[21]);
+    EXPECT_FLOAT_EQ(deltas[3], targetAt(0)[9] - restPoints()[9]);
+}
+
+TEST_F(ExportTest, SeveralGeometriesHaveAFolderEach) {
+    writeTarget(3);
+    save(3, R"(
+duplicate strip -name sleeve
+connectAttr sleeve.outMesh warp.input[4].inputGeometry
+connectAttr sleeve.outMesh warp.originalGeometry[4]
+connectAttr strip_target.outMesh warp.targetGeometry[4]
+)");
+    EXPECT_EQ(quarn::exportDatasets(options()).at(1).folder.filename(), "sleeve") << "without a name of its own";
+    quarn::ExportOptions flags = options();
+    flags.output = folder.path() / "both";
+    const std::vector<quarn::ExportAnswer> answers = quarn::exportDatasets(flags);
+    ASSERT_EQ(answers.size(), 2U);
+    EXPECT_EQ(contentsOf(flags.output / "strip"), contentsOf(data()));
+    EXPECT_EQ(described(flags.output / "sleeve", "/geometryIndex"), "4");
+    flags.geometry = "sleeve";
+    flags.output = folder.path() / "one";
+    quarn::exportDatasets(flags);
+    EXPECT_EQ(contentsOf(flags.output), contentsOf(folder.path() / "both" / "sleeve"));
+
+    save(3, "connectAttr strip.outMesh warp.input[1].inputGeometry");
+    EXPECT_THAT(errorOf(options()), HasSubstr("strip (0) and strip (1) would both be exported to"));
+}
+
+TEST_F(ExportTest, ErrorsNameTheFrameAndTheThing) {
+    constexpr float notANumber = std::numeric_limits<float>::quiet_NaN();
+    writeTarget(3);
+    const auto errorAfter = [&](const std::string& change) {
+        save(3, change);
+        return errorOf(options());
+    };
+    EXPECT_THAT(errorAfter("disconnectAttr strip_target.outMesh warp.targetGeometry[0]"),
+                AllOf(HasSubstr("warp.targetGeometry[0] has no target"), HasSubstr("quarn target")));
+    EXPECT_THAT(errorAfter("disconnectAttr controls.output warp.controlValues"), HasSubstr("connect the controls"));
+    EXPECT_THAT(errorAfter("createNode mesh -name none; connectAttr -force none.outMesh warp.targetGeometry[0]"),
+                AllOf(StartsWith("frame 1: "), HasSubstr("the target none.outMesh holds no mesh")));
+    EXPECT_THAT(errorAfter("setAttr warp.exportStartFrame 9"), HasSubstr("is 9, after exportEndFrame 3"));
+    EXPECT_THAT(errorAfter("setAttr warp.trainingDataRoot ''"), HasSubstr("warp.trainingDataRoot is empty"));
+    EXPECT_THAT(errorAfter("setAttr warp.export[0].deltaMode 7"), HasSubstr("warp.export[0].deltaMode is 7"));
+    EXPECT_THAT(errorAfter("setAttr arm.restMatrix 0 0 0 0 0 0 0 0 0 0 0 0 0 0 0 0"),
+                AllOf(StartsWith("frame 1: "), HasSubstr("restMatrix is singular")));
+    {
+        quarn::SceneSession session;
+        build(3, "createNode mesh -name small; connectAttr -force small.outMesh warp.targetGeometry[0]");
+        const quarn::MeshPolygons triangle{3, {3}, {0, 1, 2}};
+        quarn::findPlug("small.inMesh").setHObject(quarn::meshData(std::vector<double>(9), triangle));
+        session.save(scene());
+    }
+    EXPECT_THAT(errorOf(options()), StartsWith("frame 1: the target small.outMesh has 3 vertices, and strip has 12"));
+    EXPECT_FALSE(std::filesystem::exists(folder.path() / "data")) << "nothing was begun";
+
+    writeTarget(3, [](std::size_t frame, std::vector<float>& xyz) {
+        if (frame == 1)
+            xyz[15] = notANumber;
+    });
+    save(3);
+    EXPECT_EQ(errorOf(options()), "frame 2: the delta of vertex 5 of strip is no finite number");
+    EXPECT_FALSE(std::filesystem::exists(data()));
+    writeTarget(3);
+    {
+        quarn::SceneSession session;
+        build(3);
+        quarn::setList(quarn::findPlug("swing.keyTimes"), {1, 2, 3});
+        quarn::setList(quarn::findPlug("swing.keyValues"), {0, 0, 1e300});
+        session.save(scene());
+    }
+    quarn::ExportOptions flags = options();
+    flags.overwrite = true;
+    EXPECT_THAT(errorOf(flags), AllOf(StartsWith("frame 3: "), HasSubstr("controlValues[6] (arm.rotateZ) is ")));
+}
+
+TEST_F(ExportTest, ExportModeEndsAlsoAfterAFailure) {
+    writeTarget(2);
+    save(2, "connectAttr strip_target.outMesh warp.targetMorphGeometry[0]; setAttr warp.targetMorphEnabled on");
+    quarn::SceneSession session(options().scene);
+    const quarn::Warp warp = quarn::Warp::find();
+    const quarn::WarpGeometry& geometry = warp.geometry("");
+    std::vector<float> points;
+    {
+        quarn::FrameSampler sampler(session.host(), warp, geometry, 1);
+        sampler.sample(1);
+        quarn::readPoints(geometry.output, points);
+        EXPECT_EQ(points, restPoints()) << "in export mode";
+        writeCache({std::vector<float>(15)});
+        const auto failing = [&] { sampler.sample(2); };
+        EXPECT_THAT(failing, ::testing::ThrowsMessage<std::runtime_error>(
+                                 AllOf(StartsWith("frame 2: "), HasSubstr("has 5 vertices"), HasSubstr("has 12"))));
+        writeTarget(2);
+        session.host().setTime(1);
+    }
+    quarn::readPoints(geometry.output, points);
+    EXPECT_THAT(points, Pointwise(FloatNear(1e-6F), targetAt(0))) << "the morph is back";
+}
+
+} // namespace
