@@ -16,6 +16,8 @@ int run(int argc, char** argv) {
     CLI::App app("quarn: the host without a screen");
     app.set_version_flag("--version", "quarn " QUARN_VERSION);
     app.require_subcommand(1);
+    quarn::addPlayCommand(app);
+    quarn::addBakeCommand(app);
     quarn::addExecCommand(app);
     quarn::addInfoCommand(app);
     quarn::addListAttrCommand(app);
