@@ -18,6 +18,8 @@ int run(int argc, char** argv) {
     app.require_subcommand(1);
     quarn::addImportCommand(app);
     quarn::addExportCommand(app);
+    quarn::addPlayCommand(app);
+    quarn::addBakeCommand(app);
     quarn::addExecCommand(app);
     quarn::addInfoCommand(app);
     quarn::addListAttrCommand(app);

@@ -1,0 +1,69 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/play/FrameFiles.h"
+
+#include "quarn/play/meshFiles.h"
+#include "rig/NpyFile.h"
+
+#include <cstdlib>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+bool isCache(const std::filesystem::path& path) {
+    return path.extension() == ".npy";
+}
+
+} // namespace
+
+std::filesystem::path frameFile(const std::filesystem::path& pattern, int frame) {
+    std::string name = pattern.filename().string();
+    const std::size_t begin = name.find('#');
+    if (begin == std::string::npos)
+        return pattern;
+    const std::size_t end = std::min(name.find_first_not_of('#', begin), name.size());
+    std::string digits = std::to_string(std::abs(frame));
+    if (digits.size() < end - begin)
+        digits.insert(0, end - begin - digits.size(), '0');
+    return pattern.parent_path() / name.replace(begin, end - begin, (frame < 0 ? "-" : "") + digits);
+}
+
+void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& frames) {
+    if (isCache(pattern))
+        return;
+    if (!isMeshFile(pattern))
+        throw std::runtime_error(
+            "\"" + pattern.string() +
+            "\" is no file that is written here: its name ends in .npy, .obj, .ply, .gltf or .glb");
+    if (frames.count() > 1 && pattern.filename().string().find('#') == std::string::npos)
+        throw std::runtime_error("\"" + pattern.string() + "\" would be written for each of " +
+                                 std::to_string(frames.count()) +
+                                 " frames: put #### where the number of the frame goes, as in \"" +
+                                 pattern.stem().string() + ".####" + pattern.extension().string() + "\"");
+}
+
+FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, VertexOrder order)
+    : pattern_(std::move(pattern))
+    , order_(std::move(order)) {
+    const std::vector<float> any(3 * polygons.vertexCount);
+    if (isCache(pattern_))
+        cache_ = std::make_unique<rig::NpyWriter>(pattern_.string(), order_.points(any).size() / 3);
+    else
+        polygons_ = order_.polygons(polygons);
+}
+
+FrameFiles::~FrameFiles() = default;
+
+void FrameFiles::add(int frame, std::span<const float> xyz) {
+    if (cache_)
+        cache_->append(order_.points(xyz));
+    else
+        writeMeshFile(frameFile(pattern_, frame), order_.points(xyz), polygons_);
+}
+
+void FrameFiles::finish() {
+    if (cache_)
+        cache_->finish();
+}
+
+} // namespace quarn

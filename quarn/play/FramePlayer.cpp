@@ -1,0 +1,72 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/play/FramePlayer.h"
+
+#include "openquarn_app/Evaluation.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/meshes.h"
+
+#include <chrono>
+#include <cmath>
+#include <iostream>
+#include <stdexcept>
+
+namespace quarn {
+
+HostErrors::HostErrors()
+    : before_(OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) {
+        std::string* const kept = message.severity == OpenQuarn::Severity::error    ? &error_
+                                  : message.severity == OpenQuarn::Severity::report ? &report_
+                                                                                    : nullptr;
+        if (kept == nullptr)
+            std::cerr << severityName(message.severity) + std::string(": ") + message.text + "\n";
+        else if (kept->empty())
+            *kept = message.text;
+    })) {}
+
+HostErrors::~HostErrors() {
+    OpenQuarn::setMessageSink(std::move(before_));
+}
+
+void HostErrors::clear() {
+    error_.clear();
+    report_.clear();
+}
+
+FramePlayer::FramePlayer(SceneSession& session, HPlug mesh)
+    : session_(session)
+    , mesh_(std::move(mesh)) {}
+
+double FramePlayer::show(int frame) {
+    using Clock = std::chrono::steady_clock;
+    errors_.clear();
+    frame_ = frame;
+    const Clock::time_point begin = Clock::now();
+    session_.host().setTime(frame);
+    const HStatus status = OpenQuarn::evaluate(mesh_);
+    const std::chrono::duration<double> seconds = Clock::now() - begin;
+    requireNoErrors();
+    if (status.error())
+        throw std::runtime_error("frame " + std::to_string(frame) + ": " + mesh_.name().asChar() +
+                                 " could not be evaluated: " + status.errorString().asChar());
+    return seconds.count();
+}
+
+void FramePlayer::read(const HPlug& mesh, std::vector<float>& xyz) {
+    errors_.clear();
+    readPoints(mesh, xyz);
+    requireNoErrors();
+}
+
+void FramePlayer::requireNoErrors() const {
+    if (const std::string text = errors_.text(); !text.empty())
+        throw std::runtime_error("frame " + std::to_string(frame_) + ": " + text);
+}
+
+void requireFinite(const std::vector<float>& xyz, const HPlug& mesh, int frame) {
+    for (std::size_t i = 0; i < xyz.size(); ++i)
+        if (!std::isfinite(xyz[i]))
+            throw std::runtime_error("frame " + std::to_string(frame) + ": vertex " + std::to_string(i / 3) + " of " +
+                                     mesh.name().asChar() + " has a coordinate that is no finite number");
+}
+
+} // namespace quarn

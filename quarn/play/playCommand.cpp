@@ -1,0 +1,198 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/commands.h"
+
+#include "openquarn_app/Plugins.h"
+#include "quarn/console/Console.h"
+#include "quarn/console/StdoutAside.h"
+#include "quarn/console/interrupt.h"
+#include "quarn/play/playReport.h"
+#include "quarn/play/playing.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/Warp.h"
+#include "quarn/scene/meshes.h"
+#include "quarn/scene/modelDirectory.h"
+#include "quarn/scene/plugs.h"
+#include "quarn/scene/units.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <iostream>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+struct Options {
+    SceneOptions scene;
+    Console console;
+    std::string deformer, geometry, plug, model, frames, against;
+    std::string order = "scene", evaluator = "cpu";
+    fs::path output, trace;
+    int repeats = 1;
+};
+
+// with --plug alone a scene needs no deformer
+std::optional<Warp> warpFor(const Options& options) {
+    const bool isNeeded = options.plug.empty() || !options.deformer.empty() || !options.model.empty();
+    if (!isNeeded && nodesOfType("neuralWarp").empty())
+        return {};
+    return Warp::find(options.deformer);
+}
+
+void requireEvaluator(const Options& options) {
+    if (options.evaluator != "gpu")
+        return;
+    const auto hasOne = [](const std::string& plugin) {
+        const std::vector<std::string> types = OpenQuarn::pluginInfo(plugin).gpuDeformers;
+        return std::find(types.begin(), types.end(), "neuralWarp") != types.end();
+    };
+    const std::vector<std::string> plugins = OpenQuarn::loadedPlugins();
+    const bool isRegistered = std::any_of(plugins.begin(), plugins.end(), hasOne);
+    throw std::runtime_error(isRegistered
+                                 ? "quarn play cannot evaluate on the GPU yet: use --evaluator cpu"
+                                 : "no loaded plug-in registers a GPU deformer for neuralWarp: use --evaluator cpu, or "
+                                   "load a plug-in that does with --plugin");
+}
+
+void useModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
+    if (!name.empty()) {
+        setText(warp.plug("models", geometry, "modelName"), name);
+        setNumber(warp.plug("models", geometry, "modelActive"), 1.0);
+    }
+    if (!isModelActive(warp, geometry))
+        return;
+    // the one thing that the deformer says nothing about
+    const fs::path directory = modelDirectory(warp, geometry);
+    if (fs::is_directory(directory) && !fs::exists(directory / "metadata.json"))
+        throw std::runtime_error("the model " + directory.string() + " of " + warp.name +
+                                 " has no metadata.json: train or copy it again");
+}
+
+HPlug targetOf(const Warp* warp, const WarpGeometry* geometry, const std::string& against) {
+    if (against != "target")
+        return findPlug(against);
+    if (geometry == nullptr)
+        throw std::runtime_error("--against target compares with the target of a deformer, and none is played");
+    if (geometry->target.isNull())
+        throw std::runtime_error(geometry->name + " has no target: connect one into " + warp->name +
+                                 ".targetGeometry[" + std::to_string(geometry->index) + "], or let quarn target do it");
+    return geometry->target;
+}
+
+void addComparison(PlayPlan& plan, const Options& options, const Warp* warp, const WarpGeometry* geometry) {
+    if (options.against.empty())
+        return;
+    plan.against = targetOf(warp, geometry, options.against);
+    if (geometry == nullptr)
+        return;
+    if (options.plug.empty())
+        plan.before = geometry->input;
+    if (!geometry->original.source().isNull())
+        readPoints(geometry->original, plan.rest.emplace());
+}
+
+void addOrder(PlayPlan& plan, const std::string& order, const std::string& meshName) {
+    if (order == "file")
+        plan.order = VertexOrder::ofFile(meshName, polygonsOf(plan.mesh).vertexCount);
+}
+
+PlayPlan planFor(const Options& options) {
+    requireEvaluator(options);
+    const std::optional<Warp> warp = warpFor(options);
+    const bool isDeformed = options.plug.empty() || !options.geometry.empty() || !options.model.empty();
+    const WarpGeometry* const geometry = warp && isDeformed ? &warp->geometry(options.geometry) : nullptr;
+    PlayPlan plan;
+    plan.mesh = options.plug.empty() ? geometry->output : findPlug(options.plug);
+    plan.frames = framesToPlay(options.frames, warp ? &*warp : nullptr);
+    plan.repeats = options.repeats;
+    plan.output = options.output;
+    plan.trace = options.trace;
+    if (geometry != nullptr)
+        useModel(*warp, *geometry, options.model);
+    addComparison(plan, options, warp ? &*warp : nullptr, geometry);
+    addOrder(plan, options.order, geometry != nullptr ? geometry->name : nodeName(plan.mesh.node()));
+    return plan;
+}
+
+void play(Options& options) {
+    watchForInterrupt();
+    options.output = absolutePath(options.output);
+    options.trace = absolutePath(options.trace);
+    std::string answer;
+    {
+        const StdoutAside aside;
+        SceneSession session(options.scene);
+        const PlayPlan plan = planFor(options);
+        const double meters = metersPerUnit();
+        const PlayResult result = playFrames(session, plan, options.console);
+        answer = options.console.json ? playJson(result, plan.frames, meters) : playText(result, plan.frames, meters);
+    }
+    std::cout << answer;
+}
+
+void bake(Options& options) {
+    watchForInterrupt();
+    options.output = absolutePath(options.output);
+    if (options.output.extension() != ".npy")
+        throw std::runtime_error("\"" + options.output.string() +
+                                 "\" is no point cache: its name ends in .npy. quarn play writes meshes");
+    const StdoutAside aside;
+    SceneSession session(options.scene);
+    const PlayResult result = playFrames(session, planFor(options), options.console);
+    options.console.note("wrote " + std::to_string(result.times.count()) + " frames of " +
+                         std::to_string(result.vertexCount) + " vertices to " + options.output.string());
+}
+
+void addFrameOptions(CLI::App& command, Options& options) {
+    command.add_option("--frames", options.frames, "As 5, 1-100 or 1-100x5; the deformer's export range by default");
+    command.add_option("--order", options.order, "Order of written vertices: scene, or file as they were imported")
+        ->check(CLI::IsMember({"scene", "file"}))
+        ->capture_default_str();
+}
+
+void addMeasureOptions(CLI::App& command, Options& options) {
+    command.add_option("--against", options.against, "Compare with this mesh plug, or with the deformer's target")
+        ->type_name("PLUG|target");
+    command.add_option("--evaluator", options.evaluator, "Where deformers run")
+        ->check(CLI::IsMember({"cpu", "gpu"}))
+        ->capture_default_str();
+    command.add_option("--profile", options.trace, "Record, and write a trace for Perfetto or chrome://tracing")
+        ->type_name("FILE");
+    command.add_option("--repeat", options.repeats, "Play so many times, and time all but the first")
+        ->check(CLI::Range(1, 1'000'000))
+        ->capture_default_str();
+}
+
+} // namespace
+
+void addPlayCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand("play", "Play a deformed mesh: time it, compare it, write its frames");
+    addSceneOptions(*command, options->scene);
+    command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
+    command->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");
+    command->add_option("--plug", options->plug, "Play this mesh plug instead of what the deformer gives out");
+    command->add_option("--model", options->model, "Use this model for this run, switched on");
+    command->add_option("-o,--output", options->output, "FILE.npy, or FILE.####.obj, .ply, .gltf or .glb")
+        ->type_name("FILE");
+    addFrameOptions(*command, *options);
+    addMeasureOptions(*command, *options);
+    addConsoleOptions(*command, options->console, true);
+    command->callback([options] { play(*options); });
+}
+
+void addBakeCommand(CLI::App& app) {
+    const auto options = std::make_shared<Options>();
+    CLI::App* command = app.add_subcommand("bake", "Write a mesh plug, frame by frame, to a point cache");
+    addSceneOptions(*command, options->scene);
+    command->add_option("PLUG", options->plug, "The mesh, as skin.outputGeom[0]")->required();
+    command->add_option("-o,--output", options->output, "The point cache to write")->type_name("FILE.npy")->required();
+    addFrameOptions(*command, *options);
+    addConsoleOptions(*command, options->console, false);
+    command->callback([options] { bake(*options); });
+}
+
+} // namespace quarn

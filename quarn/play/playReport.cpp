@@ -1,0 +1,141 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/play/playReport.h"
+
+#include "quarn/console/json.h"
+#include "quarn/play/playing.h"
+
+#include <locale>
+#include <sstream>
+#include <utility>
+
+namespace quarn {
+namespace {
+
+constexpr double inMilliseconds = 1000.0;
+constexpr double inMillimetres = 1000.0;
+constexpr double inPercent = 100.0;
+
+struct Scale {
+    double millimetres; ///< of a unit of the scene
+    double percent;     ///< of the diagonal; 0 where it is 0
+};
+
+Scale scaleOf(const PlayResult& result, double metersPerUnit) {
+    return {inMillimetres * metersPerUnit, result.boxDiagonal > 0.0 ? inPercent / result.boxDiagonal : 0.0};
+}
+
+using Measure = std::pair<const char*, double>;
+
+std::vector<Measure> measuresOf(const Distances& distances) {
+    return {{"mean", distances.mean()},
+            {"p99", distances.percentile(0.99)},
+            {"p99.99", distances.percentile(0.9999)},
+            {"max", distances.largest()}};
+}
+
+double framesPerSecond(const FrameTimes& times) {
+    const double total = times.total();
+    return total > 0.0 ? static_cast<double>(times.count()) / total : 0.0;
+}
+
+void printDistances(std::ostream& out, const char* what, const Comparison& comparison, const Scale& scale) {
+    const Distances& distances = comparison.distances;
+    out << what << ':';
+    for (const auto& [name, value] : measuresOf(distances))
+        out << ' ' << name << ' ' << value * scale.millimetres << " mm (" << value * scale.percent << " %)"
+            << (std::string(name) == "max" ? "" : ",");
+    out << " at vertex " << distances.worstVertex() << " in frame " << distances.worstFrame() << '\n';
+}
+
+void number(JsonWriter& json, const char* key, double value) {
+    json.Key(key);
+    json.Double(value);
+}
+
+void whole(JsonWriter& json, const char* key, std::int64_t value) {
+    json.Key(key);
+    json.Int64(value);
+}
+
+void writeTimes(JsonWriter& json, const PlayResult& result) {
+    number(json, "framesPerSecond", framesPerSecond(result.times));
+    number(json, "medianMs", result.times.median() * inMilliseconds);
+    number(json, "p99Ms", result.times.percentile(0.99) * inMilliseconds);
+    number(json, "worstMs", result.times.percentile(1.0) * inMilliseconds);
+    whole(json, "worstFrame", result.times.worstFrame());
+    json.Key("phaseMediansMs");
+    json.StartObject();
+    for (const auto& [name, seconds] : result.phases)
+        number(json, name.c_str(), percentileOf(seconds, 0.5) * inMilliseconds);
+    json.EndObject();
+}
+
+void writeComparison(JsonWriter& json, const char* key, const std::optional<Comparison>& comparison,
+                     const Scale& scale) {
+    json.Key(key);
+    if (!comparison)
+        return static_cast<void>(json.Null());
+    const Distances& distances = comparison->distances;
+    json.StartObject();
+    for (const auto& [unit, factor] : {Measure{"mm", scale.millimetres}, Measure{"percent", scale.percent}}) {
+        json.Key(unit);
+        json.StartObject();
+        for (const auto& [name, value] : measuresOf(distances))
+            number(json, name, value * factor);
+        json.EndObject();
+    }
+    whole(json, "worstVertex", static_cast<std::int64_t>(distances.worstVertex()));
+    whole(json, "worstFrame", distances.worstFrame());
+    number(json, "jitterMm", comparison->jitter.largest() * scale.millimetres);
+    json.EndObject();
+}
+
+} // namespace
+
+std::string playText(const PlayResult& result, const FrameRange& frames, double metersPerUnit) {
+    std::ostringstream out;
+    out.imbue(std::locale::classic());
+    out.precision(4);
+    const FrameTimes& times = result.times;
+    out << "played frames " << frames.first << " to " << frames.last << ", " << result.vertexCount << " vertices\n"
+        << times.count() << " frames timed: " << framesPerSecond(times) << " frames a second, median "
+        << times.median() * inMilliseconds << " ms, p99 " << times.percentile(0.99) * inMilliseconds << " ms, worst "
+        << times.percentile(1.0) * inMilliseconds << " ms in frame " << times.worstFrame() << '\n';
+    for (const auto& [name, seconds] : result.phases)
+        out << "  " << name << ": median " << percentileOf(seconds, 0.5) * inMilliseconds << " ms\n";
+    if (!result.mesh)
+        return out.str();
+    const Scale scale = scaleOf(result, metersPerUnit);
+    out << "in brackets: of the diagonal of the rest mesh's box, " << result.boxDiagonal * scale.millimetres << " mm\n";
+    printDistances(out, "distance", *result.mesh, scale);
+    if (result.before)
+        printDistances(out, "distance before the deformer", *result.before, scale);
+    out << "jitter: " << result.mesh->jitter.largest() * scale.millimetres << " mm";
+    if (result.before)
+        out << ", before the deformer " << result.before->jitter.largest() * scale.millimetres << " mm";
+    out << ", of the other mesh " << result.targetJitter.largest() * scale.millimetres << " mm\n";
+    return out.str();
+}
+
+std::string playJson(const PlayResult& result, const FrameRange& frames, double metersPerUnit) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter json(buffer);
+    const Scale scale = scaleOf(result, metersPerUnit);
+    json.StartObject();
+    whole(json, "firstFrame", frames.first);
+    whole(json, "lastFrame", frames.last);
+    whole(json, "step", frames.step);
+    whole(json, "vertices", static_cast<std::int64_t>(result.vertexCount));
+    whole(json, "framesTimed", static_cast<std::int64_t>(result.times.count()));
+    writeTimes(json, result);
+    writeComparison(json, "distance", result.mesh, scale);
+    writeComparison(json, "before", result.before, scale);
+    if (result.mesh) {
+        number(json, "otherJitterMm", result.targetJitter.largest() * scale.millimetres);
+        number(json, "boxDiagonalMm", result.boxDiagonal * scale.millimetres);
+    }
+    json.EndObject();
+    return std::string(buffer.GetString()) + "\n";
+}
+
+} // namespace quarn

@@ -1,0 +1,136 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/play/playing.h"
+
+#include "openquarn_app/Profiling.h"
+#include "quarn/console/Console.h"
+#include "quarn/play/FrameFiles.h"
+#include "quarn/play/FramePlayer.h"
+#include "quarn/play/phaseTimes.h"
+#include "quarn/scene/SceneSession.h"
+#include "quarn/scene/Warp.h"
+#include "quarn/scene/plugs.h"
+
+#include <memory>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+// a recording ends with its owner, whatever happens
+struct RecordingEnd {
+    ~RecordingEnd() { OpenQuarn::Profiling::stop(); }
+};
+
+class Playing {
+public:
+    Playing(SceneSession& session, PlayPlan plan, const Console& console)
+        : plan_(std::move(plan))
+        , player_(session, plan_.mesh)
+        , progress_(console, "playing", plan_.frames.count() * static_cast<std::size_t>(plan_.repeats)) {
+        if (!plan_.output.empty())
+            checkFramePattern(plan_.output, plan_.frames);
+    }
+
+    PlayResult play() {
+        for (int repeat = 0; repeat < plan_.repeats; ++repeat) {
+            const bool isTimed = repeat > 0 || plan_.repeats == 1;
+            if (isTimed && !plan_.trace.empty() && !OpenQuarn::Profiling::isRecording())
+                OpenQuarn::Profiling::start();
+            for (std::size_t i = 0; i < plan_.frames.count(); ++i)
+                playOne(plan_.frames.frame(i), isTimed, repeat == 0);
+        }
+        if (files_)
+            files_->finish();
+        if (!plan_.trace.empty())
+            result_.phases = writeTraceAndReadPhases(plan_.trace);
+        return std::move(result_);
+    }
+
+private:
+    void playOne(int frame, bool isTimed, bool isLookedAt) {
+        const double seconds = player_.show(frame);
+        if (isTimed)
+            result_.times.add(frame, seconds);
+        if (isLookedAt)
+            lookAt(frame);
+        progress_.advance();
+    }
+
+    // once is enough: each repeat shows the same
+    void lookAt(int frame) {
+        player_.read(points_);
+        const std::size_t count = points_.size() / 3;
+        if (result_.vertexCount != 0 && result_.vertexCount != count)
+            throw std::runtime_error("frame " + std::to_string(frame) + ": " + plan_.mesh.name().asChar() + " has " +
+                                     std::to_string(count) + " vertices, and had " +
+                                     std::to_string(result_.vertexCount) + " before");
+        result_.vertexCount = count;
+        if (!plan_.output.empty())
+            write(frame);
+        if (!plan_.against.isNull())
+            compare(frame);
+    }
+
+    void write(int frame) {
+        if (plan_.output.extension() != ".npy")
+            requireFinite(points_, plan_.mesh, frame);
+        if (!files_)
+            files_ = std::make_unique<FrameFiles>(plan_.output, polygonsOf(plan_.mesh), plan_.order);
+        files_->add(frame, points_);
+    }
+
+    void compare(int frame) {
+        readChecked(plan_.against, target_, frame);
+        if (result_.boxDiagonal == 0.0)
+            result_.boxDiagonal = boxDiagonal(plan_.rest ? *plan_.rest : target_);
+        result_.targetJitter.add(target_);
+        requireFinite(points_, plan_.mesh, frame);
+        addTo(result_.mesh, frame, points_);
+        if (plan_.before.isNull())
+            return;
+        readChecked(plan_.before, before_, frame);
+        addTo(result_.before, frame, before_);
+    }
+
+    void readChecked(const HPlug& mesh, std::vector<float>& xyz, int frame) {
+        player_.read(mesh, xyz);
+        requireFinite(xyz, mesh, frame);
+        if (xyz.size() != points_.size())
+            throw std::runtime_error("frame " + std::to_string(frame) + ": " + mesh.name().asChar() + " has " +
+                                     std::to_string(xyz.size() / 3) + " vertices, and " + plan_.mesh.name().asChar() +
+                                     " has " + std::to_string(points_.size() / 3) + ": they cannot be compared");
+    }
+
+    void addTo(std::optional<Comparison>& comparison, int frame, const std::vector<float>& xyz) {
+        if (!comparison)
+            comparison.emplace();
+        comparison->distances.add(frame, xyz, target_);
+        comparison->jitter.add(xyz);
+    }
+
+    PlayPlan plan_;
+    FramePlayer player_;
+    Progress progress_;
+    RecordingEnd recordingEnd_;
+    PlayResult result_;
+    std::unique_ptr<FrameFiles> files_;
+    std::vector<float> points_, target_, before_;
+};
+
+} // namespace
+
+PlayResult playFrames(SceneSession& session, PlayPlan plan, const Console& console) {
+    return Playing(session, std::move(plan), console).play();
+}
+
+FrameRange framesToPlay(const std::string& text, const Warp* warp) {
+    if (!text.empty())
+        return frameRange(text);
+    if (warp == nullptr)
+        throw std::runtime_error(
+            "the scene has no neuralWarp deformer that says which frames: give --frames, as 1-100");
+    return frameRange(std::to_string(wholeNumberOf(warp->plug("exportStartFrame"))) + "-" +
+                      std::to_string(wholeNumberOf(warp->plug("exportEndFrame"))));
+}
+
+} // namespace quarn

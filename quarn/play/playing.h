@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+// Playing a mesh over a range of frames: what is timed, compared and written on the way.
+#pragma once
+
+#include "openquarn/HPlug.h"
+#include "quarn/play/Distances.h"
+#include "quarn/play/FrameTimes.h"
+#include "quarn/play/VertexOrder.h"
+#include "quarn/scene/frames.h"
+
+#include <filesystem>
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+struct Console;
+class SceneSession;
+struct Warp;
+
+/// What is played.
+struct PlayPlan {
+    HPlug mesh;
+    FrameRange frames;
+    int repeats = 1;                        ///< above 0; the first is not timed where there are several
+    std::filesystem::path output;           ///< pattern as for FrameFiles; empty: nothing is written
+    VertexOrder order;                      ///< of what is written
+    std::filesystem::path trace;            ///< recording of all that is timed; empty: none
+    HPlug against;                          ///< mesh to compare with; null: none
+    HPlug before;                           ///< compared as well, where there is `against`; may be null
+    std::optional<std::vector<float>> rest; ///< whose box lengths are compared with; none: `against` in the first frame
+};
+
+/// A mesh compared with `against`, in units of the scene.
+struct Comparison {
+    Distances distances;
+    Jitter jitter;
+};
+
+struct PlayResult {
+    std::size_t vertexCount = 0;
+    FrameTimes times;
+    std::map<std::string, std::vector<double>> phases; ///< seconds; only with a trace
+    std::optional<Comparison> mesh, before;
+    Jitter targetJitter;
+    double boxDiagonal = 0.0; ///< 0 without a comparison
+};
+
+/// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. Thread: main.
+PlayResult playFrames(SceneSession& session, PlayPlan plan, const Console& console);
+
+/// The frames that the text says; with an empty one exportStartFrame to exportEndFrame of the deformer. Throws
+/// std::runtime_error when there is neither, or they are in the wrong order.
+FrameRange framesToPlay(const std::string& text, const Warp* warp);
+
+} // namespace quarn
