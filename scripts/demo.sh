@@ -9,7 +9,7 @@ demo_usage() {
 usage: ./run demo [--output FOLDER] [--samples N] [--epochs N]
 
   --output FOLDER   where the results go (default: demo-out); results of an earlier demo there are replaced
-  --samples N       training poses (default 2000)
+  --samples N       training poses (default 3000)
   --epochs N        passes over them (default 250)
 TEXT
 }
@@ -31,7 +31,7 @@ step() {
 }
 
 demo_options() {
-  demo_out=demo-out demo_samples=2000 demo_epochs=250
+  demo_out=demo-out demo_samples=3000 demo_epochs=250
   while (($#)); do
     case $1 in
       --output) demo_out=${2:?--output needs a folder} ;;
@@ -156,12 +156,12 @@ demo_pictures() {
 
 command_demo() {
   local data logs python demo_out demo_samples demo_epochs
-  local surface_smoothing=20 activation_rate=0.6 skin_plug target_plug start=$SECONDS
+  local surface_smoothing=20 activation_rate=0.8 skin_plug target_plug start=$SECONDS
   demo_options "$@"
   demo_prepare
   say "the demo; its results go to $demo_out"
   demo_import
-  skin_plug=hand_skin.outputGeom[0] target_plug=hand_target.outMesh
+  skin_plug=l_handMeshNode_skin.outputGeom[0] target_plug=l_handMeshNode_target.outMesh
   demo_poses
   demo_rows_of_report
   demo_pictures

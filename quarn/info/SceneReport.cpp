@@ -1,0 +1,169 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/info/SceneReport.h"
+
+#include "openquarn/HDataBlock.h"
+#include "openquarn/HFnGeometryData.h"
+#include "openquarn_app/Evaluation.h"
+#include "openquarn_app/SceneFile.h"
+#include "quarn/info/attributeTexts.h"
+#include "quarn/scene/Warp.h"
+#include "quarn/scene/modelDirectory.h"
+#include "quarn/scene/plugs.h"
+#include "quarn/scene/units.h"
+
+#include <numeric>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+// the vertices of a tag; all for "*" and none
+std::vector<std::uint32_t> affectedOf(const HFnGeometryData& data, const std::string& tag) {
+    HUintArray listed;
+    if (!tag.empty() && tag != "*") {
+        if (data.getComponentTag(tag.c_str(), listed).error())
+            throw std::runtime_error("the geometry has no component tag " + tag);
+        std::vector<std::uint32_t> affected;
+        affected.reserve(listed.length());
+        for (unsigned i = 0; i < listed.length(); ++i)
+            affected.push_back(listed[i]);
+        return affected;
+    }
+    std::vector<std::uint32_t> all(data.vertexCount());
+    std::iota(all.begin(), all.end(), 0U);
+    return all;
+}
+
+DeformedGeometry describe(const Warp& warp, const WarpGeometry& geometry) {
+    DeformedGeometry report;
+    report.facts = factsOf(warp, geometry);
+    report.index = geometry.index;
+    report.modelName = textOf(warp.plug("models", geometry, "modelName"));
+    report.modelDirectory = modelDirectory(warp, geometry).string();
+    report.isModelActive = isModelActive(warp, geometry);
+    return report;
+}
+
+DeformerReport describe(const Warp& warp) {
+    DeformerReport report;
+    report.name = warp.name;
+    report.firstFrame = wholeNumberOf(warp.plug("exportStartFrame"));
+    report.lastFrame = wholeNumberOf(warp.plug("exportEndFrame"));
+    for (const WarpGeometry& geometry : warp.geometries)
+        report.geometries.push_back(describe(warp, geometry));
+    return report;
+}
+
+std::vector<std::string> missingFiles() {
+    std::vector<std::string> missing;
+    for (const OpenQuarn::ExternalContent& file : OpenQuarn::externalContent()) {
+        const std::string& path = file.resolved.empty() ? file.unresolved : file.resolved;
+        std::error_code error;
+        if (!path.empty() && !std::filesystem::exists(path, error))
+            missing.push_back(file.node + ": " + path);
+    }
+    return missing;
+}
+
+std::string geometryLine(const DeformedGeometry& geometry) {
+    const GeometryFacts& facts = geometry.facts;
+    std::string line = "  geometry " + std::to_string(geometry.index) + " (" + facts.name +
+                       "): " + std::to_string(facts.vertices) + " vertices, " + std::to_string(facts.affected.size()) +
+                       " affected, " + std::to_string(facts.controls) + " controls, ";
+    if (geometry.modelName.empty())
+        return line + "no model\n";
+    return line + "model " + geometry.modelName + (geometry.isModelActive ? " On\n" : " Off\n");
+}
+
+void writeCount(JsonWriter& json, const char* key, std::int64_t count) {
+    json.Key(key);
+    json.Int64(count);
+}
+
+void writeGeometry(JsonWriter& json, const DeformedGeometry& geometry) {
+    json.StartObject();
+    writeCount(json, "index", geometry.index);
+    writeText(json, "name", geometry.facts.name);
+    writeCount(json, "vertices", static_cast<std::int64_t>(geometry.facts.vertices));
+    writeCount(json, "affected", static_cast<std::int64_t>(geometry.facts.affected.size()));
+    writeCount(json, "controls", static_cast<std::int64_t>(geometry.facts.controls));
+    writeText(json, "modelName", geometry.modelName);
+    writeText(json, "modelDirectory", geometry.modelDirectory);
+    writeBool(json, "modelActive", geometry.isModelActive);
+    json.EndObject();
+}
+
+} // namespace
+
+GeometryFacts factsOf(const Warp& warp, const WarpGeometry& geometry) {
+    HStatus status;
+    const HObject mesh = geometry.input.asHObject(&status);
+    const HFnGeometryData data(mesh, &status);
+    if (status.error())
+        throw std::runtime_error(std::string(geometry.input.name().asChar()) + " holds no mesh: connect one into " +
+                                 warp.name + ".input[" + std::to_string(geometry.index) + "].inputGeometry");
+    GeometryFacts facts;
+    facts.name = geometry.name;
+    facts.vertices = data.vertexCount();
+    facts.affected = affectedOf(data, textOf(warp.plug("input", geometry, "componentTagExpression")));
+    // what is connected tells only when it is evaluated how many elements there are
+    const HPlug controls = warp.plug("controlValues");
+    if (OpenQuarn::evaluate(controls).error())
+        throw std::runtime_error(std::string(controls.name().asChar()) + " could not be evaluated");
+    facts.controls = indicesOf(controls).size();
+    return facts;
+}
+
+SceneReport describeScene() {
+    SceneReport report;
+    if (const std::vector<HObject> characters = nodesOfType("character"); !characters.empty())
+        report.character = nodeName(characters.front());
+    report.metersPerUnit = metersPerUnit();
+    for (const HObject& node : nodesOfType("neuralWarp"))
+        report.deformers.push_back(describe(Warp::find(nodeName(node))));
+    report.missingFiles = missingFiles();
+    return report;
+}
+
+void writeScene(JsonWriter& json, const SceneReport& scene) {
+    writeText(json, "character", scene.character);
+    json.Key("metersPerUnit");
+    json.Double(scene.metersPerUnit);
+    json.Key("deformers");
+    json.StartArray();
+    for (const DeformerReport& deformer : scene.deformers) {
+        json.StartObject();
+        writeText(json, "name", deformer.name);
+        writeCount(json, "firstFrame", deformer.firstFrame);
+        writeCount(json, "lastFrame", deformer.lastFrame);
+        json.Key("geometries");
+        json.StartArray();
+        for (const DeformedGeometry& geometry : deformer.geometries)
+            writeGeometry(json, geometry);
+        json.EndArray();
+        json.EndObject();
+    }
+    json.EndArray();
+    json.Key("missingFiles");
+    json.StartArray();
+    for (const std::string& file : scene.missingFiles)
+        writeText(json, file);
+    json.EndArray();
+}
+
+std::string sceneText(const SceneReport& scene) {
+    std::string text;
+    if (!scene.character.empty())
+        text += "character " + scene.character + ", " + numberText(scene.metersPerUnit, false) + " metres a unit\n";
+    for (const DeformerReport& deformer : scene.deformers) {
+        text += "deformer " + deformer.name + ", frames " + std::to_string(deformer.firstFrame) + " to " +
+                std::to_string(deformer.lastFrame) + "\n";
+        for (const DeformedGeometry& geometry : deformer.geometries)
+            text += geometryLine(geometry);
+    }
+    for (const std::string& file : scene.missingFiles)
+        text += "missing file of " + file + "\n";
+    return text;
+}
+
+} // namespace quarn

@@ -1,0 +1,92 @@
+#!/usr/bin/env bash
+# play.sh QUARN: playing, baking and looking at the example scene, whose first control is made to follow the time.
+set -euo pipefail
+quarn=$1
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+bad=0
+
+fail() { echo "$*"; cat "$work/out" "$work/err"; bad=1; }
+# expect STATUS OUT-PATTERN ERR-PATTERN ARGS...: patterns are regular expressions, "" for an empty stream
+expect() {
+  local status=0 wanted=$1 out=$2 err=$3
+  shift 3
+  "$quarn" "$@" >"$work/out" 2>"$work/err" || status=$?
+  [[ $status == "$wanted" ]] && fits "$out" "$work/out" && fits "$err" "$work/err" ||
+    fail "quarn $*: status $status, not $wanted, or not /$out/ and /$err/:"
+}
+fits() { if [[ $1 ]]; then grep -Pqz -- "$1" "$2"; else [[ ! -s $2 ]]; fi; }
+
+cp -r examples/wave/models examples/wave/wave.json "$work"
+sed -i 's#"examples/wave/models"#"models"#' "$work/wave.json"
+cat >"$work/setup.txt" <<'EOF'
+file -open wave.json
+createNode animCurve -name ramp
+setAttr ramp.keyTimes 1 11
+setAttr ramp.keyValues 0 1
+connectAttr time1.outTime ramp.time
+connectAttr ramp.output controls.inputList[0].input[0]
+file -saveAs moving.json
+createNode pointCache -name lost
+connectAttr strip.outMesh lost.inMesh
+connectAttr time1.outTime lost.time
+setAttr lost.cacheFile none.npy
+file -saveAs lost.json
+EOF
+plugins=(--plugin "$(realpath "$2")" --plugin "$(realpath "$3")")
+(cd "$work" && "$quarn" exec "${plugins[@]}" setup.txt >/dev/null)
+scene=$work/moving.json
+
+# the wave of the first control at 1 is 0.4 units high, as the scene's own page says; half of it half-way
+expect 0 'max 400 mm .* in frame 11\n' '' play "$scene" --frames 1-11 --against strip.outMesh --repeat 2
+expect 0 '"otherJitterMm": 0.0' '' play "$scene" --frames 1-11 --against strip.outMesh --json
+expect 0 'InferenceDeltas: median' '' play "$scene" --frames 1-3 --profile "$work/trace.json"
+grep -q traceEvents "$work/trace.json" || fail "no trace"
+expect 0 '' 'wrote 3 frames of 369 vertices' bake "$scene" 'wave.outputGeom[0]' --frames 1-3 -o "$work/a.npy"
+expect 0 '3 frames timed' '' play "$scene" --frames 1-11x5 -o "$work/a.####.obj"
+for file in a.0001.obj a.0006.obj a.0011.obj a.npy; do [[ -s $work/$file ]] || fail "no $file"; done
+[[ $(grep -c '^v ' "$work/a.0006.obj") == 369 && $(grep -c '^f' "$work/a.0006.obj") == 320 ]] || fail "not the mesh"
+
+expect 1 '' 'registers a GPU deformer.*--evaluator cpu' play "$scene" --evaluator gpu
+expect 1 '' 'put #### where' play "$scene" --frames 1-3 -o "$work/a.obj"
+expect 1 '' '\.npy, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
+expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
+expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
+expect 1 '' 'no node of type character' bake "$scene" strip.outMesh --frames 1 --order file -o "$work/lost.npy"
+expect 1 '' 'models/other\.nwrp' play "$scene" --frames 1 --model other
+[[ ! -e $work/lost.npy ]] || fail "a file of a play that failed"
+
+# the model in memory goes on while its directory is replaced under it, and Ctrl-C leaves nothing
+cp -r "$work/models/wave.nwrp" "$work/next"
+"$quarn" play "$scene" --frames 1-400000 -o "$work/long.npy" >"$work/out" 2>"$work/err" &
+player=$!
+for _ in {1..600}; do
+  if compgen -G "$work/long*" >/dev/null || ! kill -0 "$player"; then break; fi
+  sleep 0.05
+done
+for _ in 1 2 3 4 5 6; do
+  mv "$work/models/wave.nwrp" "$work/last"
+  mv "$work/next" "$work/models/wave.nwrp"
+  mv "$work/last" "$work/next"
+  sleep 0.05
+done
+kill -INT "$player"
+status=0
+wait "$player" || status=$?
+[[ $status == 130 ]] && grep -q interrupted "$work/err" || fail "interrupted: status $status"
+! compgen -G "$work/long*" >/dev/null || fail "something is left of an interrupted play"
+
+expect 0 'geometry 0 \(strip\): 369 vertices, 369 affected, 2 controls, model wave On' '' info "$scene"
+expect 0 'missing file of lost: .*none\.npy' '' info "$work/lost.json"
+expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\nfits\n' '' \
+  info "$work/models/wave.nwrp" --scene "$scene"
+rm -r "$work/models/wave.nwrp"
+expect 1 '' 'frame 1: .*wave\.nwrp' play "$scene" --frames 1
+mkdir "$work/models/wave.nwrp"
+expect 1 '' 'has no metadata\.json' play "$scene" --frames 1
+echo 'no model' >"$work/models/wave.nwrp/model.onnx"
+echo '[' >"$work/models/wave.nwrp/principal_shapes.json"
+expect 1 'damaged: metadata(.|\n)*damaged: model\.onnx cannot be used(.|\n)*damaged: principal' 'is damaged' \
+  info "$work/models/wave.nwrp"
+expect 1 '' 'is no model directory' info "$scene" --scene "$scene"
+exit $bad

@@ -1,0 +1,171 @@
+// SPDX-License-Identifier: Apache-2.0
+// Statistics against a plain computation, and files read back.
+#include "quarn/files/npyArray.h"
+#include "quarn/play/Distances.h"
+#include "quarn/play/FrameFiles.h"
+#include "quarn/play/FrameTimes.h"
+#include "quarn/play/VertexOrder.h"
+#include "quarn/play/meshFiles.h"
+#include "support/TemporaryFolder.h"
+
+#include <assimp/Importer.hpp>
+#include <assimp/scene.h>
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <fstream>
+#include <random>
+#include <sstream>
+
+namespace {
+
+using namespace quarn;
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+
+// what the body throws; "" when it does not
+template <class Body>
+std::string why(Body body) {
+    try {
+        body();
+    } catch (const std::runtime_error& error) {
+        return error.what();
+    }
+    return "";
+}
+
+// two at the same place, one that no polygon uses, a quad and a triangle
+const std::vector<float> points{0, 0, 0, 1, 0, 0, 1, 1, 0.1F, 0, 1, 0, 0, 0, 0, 2e-8F, -3, 4};
+const MeshPolygons polygons{6, {4, 3}, {0, 1, 2, 3, 4, 3, 2}};
+
+TEST(Distances, AgreeWithAPlainComputation) {
+    std::mt19937 random(7);
+    std::lognormal_distribution<float> size(-3.0F, 2.0F);
+    Distances distances;
+    std::vector<double> all;
+    for (int frame = 0; frame < 50; ++frame) {
+        std::vector<float> a(300);
+        const std::vector<float> b(300);
+        for (float& value : a)
+            value = size(random);
+        for (std::size_t i = 0; i < a.size(); i += 3)
+            all.push_back(
+                std::hypot(static_cast<double>(a[i]), static_cast<double>(a[i + 1]), static_cast<double>(a[i + 2])));
+        distances.add(frame, a, b);
+    }
+    const auto largest = std::max_element(all.begin(), all.end()) - all.begin();
+    EXPECT_EQ(distances.worstFrame(), largest / 100);
+    EXPECT_EQ(distances.worstVertex(), static_cast<std::size_t>(largest % 100));
+    double sum = 0.0;
+    for (const double distance : all)
+        sum += distance;
+    EXPECT_NEAR(distances.mean(), sum / 5000.0, 1e-12);
+    std::sort(all.begin(), all.end());
+    for (const double part : {0.01, 0.5, 0.99, 0.9999, 1.0}) {
+        const double exact = all[static_cast<std::size_t>(std::ceil(part * 5000.0)) - 1];
+        EXPECT_GE(distances.percentile(part), exact * (1.0 - 1e-7)) << part; // bins are of single precision
+        EXPECT_LE(distances.percentile(part), exact * (1.0 + 1.0 / 1024.0)) << part;
+    }
+    EXPECT_EQ(distances.percentile(1.0), distances.largest());
+}
+
+TEST(Distances, OfEqualMeshesAreNought) {
+    Distances distances;
+    EXPECT_EQ(distances.percentile(0.5), 0.0);
+    distances.add(3, points, points);
+    EXPECT_EQ(distances.percentile(0.99), 0.0);
+    EXPECT_EQ(distances.largest(), 0.0);
+    EXPECT_EQ(distances.worstFrame(), 3);
+}
+
+TEST(Jitter, IsTheLargestSecondDifference) {
+    Jitter jitter;
+    for (const float x : {0.0F, 1.0F, 2.0F}) // steady motion does not tremble
+        jitter.add(std::vector<float>{x, 0, 0, -x, 2 * x, 0});
+    EXPECT_EQ(jitter.largest(), 0.0);
+    jitter.add(std::vector<float>{3, 0, 0, -3, 9, 4});
+    EXPECT_EQ(jitter.largest(), 5.0);
+}
+
+TEST(FrameTimes, AreRankedNotInterpolated) {
+    FrameTimes times;
+    for (int frame = 1; frame <= 100; ++frame)
+        times.add(frame, frame == 40 ? 500 : frame);
+    EXPECT_EQ(times.median(), 51.0);
+    EXPECT_EQ(times.percentile(0.99), 100.0);
+    EXPECT_EQ(times.worstFrame(), 40);
+}
+
+TEST(MeshFiles, ObjKeepsVerticesAndPolygons) {
+    std::stringstream file;
+    writeObj(file, points, polygons);
+    std::vector<float> read;
+    std::vector<std::string> faces;
+    for (std::string line; std::getline(file, line);) {
+        std::istringstream words(line.substr(2));
+        if (line[0] == 'f')
+            faces.push_back(words.str());
+        else
+            for (std::string word; words >> word;)
+                read.push_back(std::stof(word));
+    }
+    EXPECT_EQ(read, points);
+    EXPECT_THAT(faces, ElementsAre("1 2 3 4", "5 4 3"));
+}
+
+TEST(MeshFiles, PlyAndGltfAreReadByAnotherProgram) {
+    const TemporaryFolder folder;
+    for (const char* ending : {"ply", "gltf", "glb"}) {
+        const auto path = folder.path() / (std::string("mesh.") + ending);
+        writeMeshFile(path, points, polygons);
+        Assimp::Importer importer;
+        const aiScene* scene = importer.ReadFile(path.string(), 0);
+        ASSERT_NE(scene, nullptr) << ending << ": " << importer.GetErrorString();
+        const aiMesh& mesh = *scene->mMeshes[0];
+        ASSERT_EQ(mesh.mNumVertices, 6U) << ending;
+        for (unsigned i = 0; i < 18; ++i)
+            EXPECT_EQ(mesh.mVertices[i / 3][i % 3], points[i]) << ending;
+        const bool keepsQuads = std::string(ending) == "ply";
+        ASSERT_EQ(mesh.mNumFaces, keepsQuads ? 2U : 3U);
+        const aiFace& last = mesh.mFaces[mesh.mNumFaces - 1];
+        EXPECT_THAT(std::vector<unsigned>(last.mIndices, last.mIndices + last.mNumIndices), ElementsAre(4, 3, 2));
+    }
+}
+
+TEST(VertexOrder, WritesEveryVertexOfTheFile) {
+    VertexOrder order({2, 0, 1, 0}, 3);
+    EXPECT_THAT(order.points(std::vector<float>{0, 0, 0, 1, 1, 1, 2, 2, 2}),
+                ElementsAre(2, 2, 2, 0, 0, 0, 1, 1, 1, 0, 0, 0));
+    EXPECT_THAT(order.polygons({3, {3}, {0, 1, 2}}).corners, ElementsAre(1, 2, 0));
+    EXPECT_THAT(why([] { VertexOrder({0, 3}, 3); }), HasSubstr("from vertex 1 to 3, and the mesh has 3"));
+    EXPECT_THAT(why([] {
+                    static_cast<void>(VertexOrder({0, 1}, 3).polygons({3, {3}, {0, 1, 2}}));
+                }),
+                HasSubstr("vertex 2 of the scene"));
+}
+
+TEST(FrameFiles, AreNamedByTheFrame) {
+    EXPECT_EQ(frameFile("a/b.####.obj", 12), "a/b.0012.obj");
+    EXPECT_EQ(frameFile("a#/b.##.obj", 123), "a#/b.123.obj");
+    EXPECT_EQ(frameFile("b#.obj", -7), "b-7.obj");
+    EXPECT_EQ(frameFile("b.obj", 7), "b.obj");
+}
+
+TEST(NpyArrays, ComeBackAndAreChecked) {
+    const TemporaryFolder folder;
+    const auto path = folder.path() / "a.npy";
+    writeIntegers(path, std::vector<std::int32_t>{3, -1});
+    EXPECT_THAT(readIntegers(path), ElementsAre(3, -1));
+    EXPECT_THAT(why([&] { readFloatTable(path); }), HasSubstr("'<i4' in the shape [2], where '<f4' in 2 dimensions"));
+    writeFloatTable(path, {2, 3, {1, 2, 3, 4, 5, 0.1F}});
+    const FloatTable table = readFloatTable(path);
+    EXPECT_EQ(table.columns, 3U);
+    EXPECT_THAT(table.values, ElementsAre(1, 2, 3, 4, 5, 0.1F));
+    std::ofstream(path, std::ios::app) << "x";
+    EXPECT_THAT(why([&] { readFloatTable(path); }), HasSubstr("takes 24 bytes, and 25 follow"));
+    EXPECT_THAT(why([&] { readFloatTable(folder.path() / "none"); }), HasSubstr("No such file"));
+}
+
+} // namespace
