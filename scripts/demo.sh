@@ -46,7 +46,8 @@ demo_options() {
   done
 }
 
-demo_prepare() {
+# everything that a demo needs; sets `python` and QUARN
+demo_install() {
   need_packages "${build_packages[@]}" "${python_packages[@]}"
   scripts/fetch_onnxruntime.sh
   scripts/fetch_hand.sh
@@ -54,14 +55,15 @@ demo_prepare() {
   configure release
   say "building quarn and the plug-in"
   cmake --build --preset release --parallel "$(job_count)" --target quarn neuralWarp
+  export QUARN=$PWD/build/release/quarn/quarn
+}
 
-  # only what a demo makes: a folder of the user's keeps whatever else is in it
-  rm -rf "$demo_out/data" "$demo_out/pictures" "$demo_out/log"
-  rm -f "$demo_out"/report.{html,json} "$demo_out"/table.txt
-  mkdir -p "$demo_out/data/models" "$demo_out/data/results" "$demo_out/pictures" "$demo_out/log"
+# only what a demo makes goes: a folder of the user's keeps whatever else is in it
+demo_folders() {
   data=$demo_out/data logs=$demo_out/log
-  QUARN=$PWD/build/release/quarn/quarn
-  export QUARN
+  rm -rf "$data" "$demo_out/pictures" "$logs"
+  rm -f "$demo_out"/report.{html,json} "$demo_out"/{table.txt,preview.webp}
+  mkdir -p "$data"/{models,results,preview} "$demo_out/pictures" "$logs"
 }
 
 # the rig, its controls and the deformer, from the file as it was published
@@ -156,7 +158,6 @@ demo_pictures() {
   step "pictures" \
     "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --size 480x480 --frames 20-100x20 \
     -o "$demo_out/pictures/motion.####.png"
-  mkdir -p "$data/preview"
   step "the moving picture" \
     "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --size 300x300 --frames 1-120x2 \
     -o "$data/preview/frame.####.png"
@@ -166,7 +167,8 @@ command_demo() {
   local data logs python demo_out demo_samples demo_epochs
   local surface_smoothing=5 activation_rate=0.8 skin_plug target_plug start=$SECONDS judge=()
   demo_options "$@"
-  demo_prepare
+  demo_install
+  demo_folders
   say "the demo; its results go to $demo_out"
   demo_import
   skin_plug=l_handMeshNode_skin.outputGeom[0] target_plug=l_handMeshNode_target.outMesh

@@ -1,0 +1,41 @@
+#!/usr/bin/env bash
+# demo.sh QUARN: the demo's own steps on a reduced set; then its report is computed once more from the files, and a model
+# that outputs zeros has to leave just the error that the report gives for no correction.
+set -euo pipefail
+cd "$(dirname "$0")/../.."
+. scripts/common.sh
+. scripts/demo.sh
+quarn=$1
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+
+# shellcheck disable=SC2317 # called by command_demo
+demo_install() {
+  scripts/fetch_hand.sh
+  # shellcheck disable=SC2034 # command_demo's
+  python=$(scripts/find_python.sh)
+  export QUARN=$quarn
+}
+python=$(scripts/find_python.sh) || {
+  echo "no Python with PyTorch here: the demo is not tried"
+  exit 77
+}
+command_demo --output "$work/demo" --samples 40 --epochs 3
+for file in report.html preview.webp table.txt pictures/motion.0060.png; do
+  [[ -s $work/demo/$file ]] || fail "the demo made no $file"
+done
+"$python" tests/demo/recompute.py "$work/demo"
+
+# zero_errors MODE FIGURE: what a model of zeros leaves
+for mode in surface offset; do
+  "$python" -m trainer zero "$work/demo/data/sets/motion_$mode" -o "$work/demo/data/models/zero.nwrp"
+  "$quarn" play "$work/demo/data/motion_$mode.json" --model zero --against target --json >"$work/zero.json"
+  "$python" - "$work/zero.json" "$work/demo/report.json" "$mode" <<'PYTHON'
+import json, sys
+zero = json.load(open(sys.argv[1]))["distance"]["mm"]
+base = next(row["base"] for row in json.load(open(sys.argv[2]))["rows"] if row["mode"] == sys.argv[3])
+for figure in ("mean", "max"):
+    if not abs(zero[figure] - base[f"{figure}_mm"]) <= 1e-5:
+        sys.exit(f"{sys.argv[3]}: a model of zeros leaves {figure} {zero[figure]} mm, the base is {base[f'{figure}_mm']}")
+PYTHON
+done
