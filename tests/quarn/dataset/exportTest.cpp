@@ -114,7 +114,7 @@ TEST_F(ExportTest, SaysWhatIsInIt) {
         {"/controlNames/6", "arm.rotateZ"},
         {"/controlNames/7", "controls.inputList[5].input[0]"},
         {"/controlRanges/6", "[0.05,0.2]"},
-        {"/boundingBoxDiagonal", "5.0990195135927845"},
+        {"/boundingBoxDiagonal", "5.0990195135927849"},
         {"/train/validationRatio", "0.3"},
         {"/train/activationFunction", "LeakyReLU"},
         {"/train/outputModelName", "arm"},

@@ -55,7 +55,8 @@ protected:
             writer.append(static_cast<int>(row) + 1, std::span(controls).subspan(row * 8, 8),
                           std::span(deltas).subspan(row * 36, 36));
         }
-        std::ofstream(part() / "deltas.npy", std::ios::binary | std::ios::app) << "half a row";
+        if (rows + 1 < frames)
+            std::ofstream(part() / "deltas.npy", std::ios::binary | std::ios::app) << "half a row";
         std::ofstream(part() / "progress.json.part77") << "{";
     }
 
