@@ -154,7 +154,7 @@ demo_models() {
 
 demo_pictures() {
   local panels=(--panel "skin=$skin_plug" --panel "target=$target_plug" --panel "neural=warp.outputGeom[0]"
-    --heat "error=warp.outputGeom[0]:$target_plug" --model surface_principal --range 2)
+    --heat "error=warp.outputGeom[0]:$target_plug" --model surface_principal --range 2 --view 90,20)
   step "pictures" \
     "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --size 480x480 --frames 20-100x20 \
     -o "$demo_out/pictures/motion.####.png"

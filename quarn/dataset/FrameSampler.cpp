@@ -84,6 +84,7 @@ FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const War
         fail(elementName(warp, "targetGeometry", geometry) +
              " has no target; quarn target SCENE --cache FILE.npy connects one");
     kind_ = deltaKind(warp, geometry);
+    longestDelta_ = 10.0 * diagonalOf(geometry.original);
     makeElement(warp, geometry, "export", "deltaMode");
     makeElement(warp, geometry, "models", "modelActive");
     host.setTime(firstFrame);
@@ -180,13 +181,27 @@ void FrameSampler::takeDeltas() {
         fail(targetSizes() + ", and " + std::to_string(count / 3) + " deltas were given for " +
              std::to_string(map_.affectCount()) + " deformed vertices");
     deltas_.resize(count);
-    for (std::size_t i = 0; i < count; ++i) {
-        const auto affected = static_cast<unsigned>(i / 3);
-        if (!std::isfinite((*given)[i]))
-            fail("the delta of vertex " + std::to_string(map_.isIdentityMap() ? affected : map_.affectMap()[affected]) +
-                 " of " + geometry_.name + " is no finite number");
-        deltas_[i] = static_cast<float>((*given)[i]);
-    }
+    std::transform(given->begin(), given->end(), deltas_.begin(), [](double x) { return static_cast<float>(x); });
+    for (unsigned affected = 0; affected < map_.affectCount(); ++affected)
+        requirePlausible(affected);
+}
+
+// a frame of the deformer that has collapsed gives deltas of any size, and one of them spoils a whole training
+void FrameSampler::requirePlausible(unsigned affected) const {
+    const float* delta = &deltas_[3 * std::size_t{affected}];
+    const double length = std::hypot(double{delta[0]}, double{delta[1]}, double{delta[2]});
+    if (length <= longestDelta_)
+        return;
+    const unsigned vertex = map_.isIdentityMap() ? affected : map_.affectMap()[affected];
+    const std::string which = "the delta of vertex " + std::to_string(vertex) + " of " + geometry_.name;
+    if (!std::isfinite(length))
+        fail(which + " is no finite number");
+    std::string advice = "; is the target where the mesh is?";
+    if (kind_.mode == 1)
+        advice = ". Where smoothing folds the surface its frames collapse: lower " +
+                 elementName(warp_, "export", geometry_) + ".smoothingIterations (" +
+                 std::to_string(kind_.smoothingIterations) + "), or take Offset deltas";
+    fail(which + " is " + std::to_string(length) + " long, more than ten times the mesh" + advice);
 }
 
 std::string FrameSampler::targetSizes() const {

@@ -50,6 +50,7 @@ private:
     void readMap();
     void takeControls();
     void takeDeltas();
+    void requirePlausible(unsigned affected) const;
     std::string targetSizes() const;
     std::string command(const std::string& flags) const;
 
@@ -57,6 +58,7 @@ private:
     const Warp& warp_;
     const WarpGeometry& geometry_;
     DeltaKind kind_;
+    double longestDelta_ = 0.0; ///< that is taken for one, in units of the scene
     HIndexMapper map_;
     std::vector<std::string> names_;
     std::vector<float> controls_;

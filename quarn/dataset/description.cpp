@@ -158,22 +158,6 @@ void writeFiles(JsonWriter& writer) {
 
 } // namespace
 
-double boundingBoxDiagonal(const HPlug& mesh) {
-    std::vector<double> xyz;
-    readPoints(mesh, xyz);
-    double squares = 0;
-    for (std::size_t axis = 0; axis < 3 && !xyz.empty(); ++axis) {
-        double least = xyz[axis];
-        double largest = least;
-        for (std::size_t i = axis; i < xyz.size(); i += 3) {
-            least = std::min(least, xyz[i]);
-            largest = std::max(largest, xyz[i]);
-        }
-        squares += (largest - least) * (largest - least);
-    }
-    return std::sqrt(squares);
-}
-
 std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, const WarpGeometry& geometry,
                                const FrameSampler& sampler, const std::filesystem::path& controls) {
     const DatasetShape& shape = facts.shape;

@@ -16,9 +16,6 @@ struct DatasetFacts {
     DatasetShape shape;
 };
 
-/// Evaluates the rest mesh. Throws std::runtime_error, naming the plug, when there is none. Thread: main.
-double boundingBoxDiagonal(const HPlug& mesh);
-
 /// The text of dataset.json; docs/dataset.md lists what is in it. `controls` the complete controls.npy, whose ranges it
 /// states. Throws std::runtime_error. Thread: main.
 std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, const WarpGeometry& geometry,

@@ -75,19 +75,4 @@ void Jitter::add(std::span<const float> xyz) {
     last_.assign(xyz.begin(), xyz.end());
 }
 
-double boxDiagonal(std::span<const float> xyz) {
-    double squares = 0.0;
-    for (std::size_t axis = 0; axis < 3 && axis < xyz.size(); ++axis) {
-        float low = xyz[axis];
-        float high = xyz[axis];
-        for (std::size_t i = axis; i < xyz.size(); i += 3) {
-            low = std::min(low, xyz[i]);
-            high = std::max(high, xyz[i]);
-        }
-        const double side = static_cast<double>(high) - static_cast<double>(low);
-        squares += side * side;
-    }
-    return std::sqrt(squares);
-}
-
 } // namespace quarn

@@ -49,7 +49,4 @@ private:
     double largest_ = 0.0;
 };
 
-/// The length of the diagonal of the box around the points.
-double boxDiagonal(std::span<const float> xyz);
-
 } // namespace quarn

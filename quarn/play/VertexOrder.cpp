@@ -2,27 +2,11 @@
 #include "quarn/play/VertexOrder.h"
 
 #include "quarn/files/npyArray.h"
-#include "quarn/scene/plugs.h"
+#include "quarn/scene/vertexMap.h"
 
-#include <filesystem>
 #include <stdexcept>
 
 namespace quarn {
-namespace {
-
-std::string mapFileFor(const std::string& meshName) {
-    const std::vector<HObject> characters = nodesOfType("character");
-    std::string path = characters.empty() ? "" : textOf(plugOf(characters.front(), "vertexMapFile"));
-    if (path.empty())
-        throw std::runtime_error("the scene does not know the vertices of the file it came from: no node of type "
-                                 "character has a vertexMapFile. quarn import sets it; else use --order scene");
-    constexpr std::string_view place = "{mesh}";
-    if (const std::size_t at = path.find(place); at != std::string::npos)
-        path.replace(at, place.size(), meshName);
-    return std::filesystem::absolute(path).string();
-}
-
-} // namespace
 
 VertexOrder::VertexOrder(std::vector<std::int32_t> sceneVertexOf, std::size_t sceneVertices)
     : sceneVertexOf_(std::move(sceneVertexOf)) {
@@ -36,7 +20,7 @@ VertexOrder::VertexOrder(std::vector<std::int32_t> sceneVertexOf, std::size_t sc
 }
 
 VertexOrder VertexOrder::ofFile(const std::string& meshName, std::size_t sceneVertices) {
-    const std::string path = mapFileFor(meshName);
+    const std::string path = vertexMapFile(meshName).string();
     std::vector<std::int32_t> map = readIntegers(path);
     try {
         return {std::move(map), sceneVertices};

@@ -4,7 +4,7 @@
 #include "openquarn/HFnAttribute.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/NodeTypes.h"
-#include "quarn/pose/numberText.h"
+#include "quarn/console/numberText.h"
 #include "quarn/scene/plugs.h"
 
 #include <cmath>

@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/samplePoses.h"
 
+#include "quarn/console/numberText.h"
 #include "quarn/pose/animationPoses.h"
 #include "quarn/pose/drawPoses.h"
-#include "quarn/pose/numberText.h"
 #include "quarn/pose/poseKeys.h"
 #include "quarn/scene/plugs.h"
 

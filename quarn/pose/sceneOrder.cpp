@@ -4,53 +4,12 @@
 #include "rig/NpyFile.h"
 
 #include <algorithm>
-#include <charconv>
 #include <cmath>
-#include <fstream>
-#include <iterator>
 #include <limits>
 #include <stdexcept>
 
 namespace quarn {
 namespace {
-
-constexpr std::uintmax_t largestMap = std::uintmax_t{1} << 31U; // bytes
-
-[[noreturn]] void fail(const std::filesystem::path& file, const std::string& why) {
-    throw std::runtime_error(file.string() + " is no map of vertices: " + why);
-}
-
-std::string bytesOf(const std::filesystem::path& file) {
-    std::error_code error;
-    const std::uintmax_t size = std::filesystem::file_size(file, error);
-    if (error)
-        throw std::runtime_error(file.string() + " could not be read: " + error.message());
-    if (size > largestMap)
-        fail(file, "it has " + std::to_string(size) + " bytes");
-    std::ifstream stream(file, std::ios::binary);
-    std::string bytes(std::istreambuf_iterator<char>(stream), {});
-    if (!stream || bytes.size() != size)
-        throw std::runtime_error(file.string() + " could not be read");
-    return bytes;
-}
-
-// the header without its blanks, up to the length of the only dimension
-std::size_t lengthIn(const std::filesystem::path& file, std::string header) {
-    std::replace(header.begin(), header.end(), '"', '\'');
-    header.erase(std::remove_if(header.begin(), header.end(), [](char c) { return c == ' ' || c == '\n'; }),
-                 header.end());
-    constexpr std::string_view beforeLength = "'shape':(";
-    const std::size_t place = header.find(beforeLength);
-    if (header.find("'descr':'<i4'") == std::string::npos || place == std::string::npos)
-        fail(file, "its numbers are not '<i4', 32-bit integers");
-    const char* begin = header.data() + place + beforeLength.size();
-    const char* end = header.data() + header.size();
-    std::size_t length = 0;
-    const auto [rest, error] = std::from_chars(begin, end, length);
-    if (error != std::errc() || !std::string_view(rest, static_cast<std::size_t>(end - rest)).starts_with(",)"))
-        fail(file, "it does not have one dimension");
-    return length;
-}
 
 double distanceTo(std::span<const float> point, std::span<const double> other) {
     double sum = 0.0;
@@ -100,31 +59,6 @@ private:
 };
 
 } // namespace
-
-std::vector<std::int32_t> readVertexMap(const std::filesystem::path& file) {
-    const std::string bytes = bytesOf(file);
-    rig::NpyPlace place;
-    try {
-        place = rig::findNpyHeader(std::string_view(bytes).substr(0, rig::npyPreambleSize));
-    } catch (const std::runtime_error& error) {
-        fail(file, error.what());
-    }
-    const std::size_t start = place.start + place.length;
-    if (start > bytes.size())
-        fail(file, "it is cut short within its header");
-    const std::size_t length = lengthIn(file, bytes.substr(place.start, place.length));
-    const std::size_t rest = bytes.size() - start;
-    if (rest % 4 != 0 || rest / 4 != length)
-        fail(file, "it has " + std::to_string(rest) + " bytes for " + std::to_string(length) + " numbers of four");
-    std::vector<std::int32_t> map(length);
-    for (std::size_t i = 0; i < length; ++i) {
-        std::uint32_t number = 0;
-        for (unsigned byte = 0; byte < 4; ++byte)
-            number |= std::uint32_t{static_cast<unsigned char>(bytes[start + 4 * i + byte])} << (8U * byte);
-        map[i] = static_cast<std::int32_t>(number);
-    }
-    return map;
-}
 
 void requireFit(const std::vector<std::int32_t>& map, std::size_t fileVertices, std::size_t sceneVertices) {
     if (map.size() != fileVertices)

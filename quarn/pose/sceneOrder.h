@@ -11,10 +11,6 @@
 
 namespace quarn {
 
-/// Reads a NumPy array of one dimension, '<i4': for each vertex of the file the one of the scene's mesh. Throws
-/// std::runtime_error, naming the path, for anything else and for a file that is shorter or longer than it says.
-std::vector<std::int32_t> readVertexMap(const std::filesystem::path& file);
-
 /// Throws std::runtime_error, with both numbers, unless the map has `fileVertices` entries that are each below
 /// `sceneVertices` and cover all of them.
 void requireFit(const std::vector<std::int32_t>& map, std::size_t fileVertices, std::size_t sceneVertices);

@@ -3,17 +3,18 @@
 
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
-#include "quarn/pose/numberText.h"
+#include "quarn/console/numberText.h"
+#include "quarn/files/npyArray.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/pose/targetCache.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/vertexMap.h"
 #include "rig/NpyFile.h"
 
 #include <CLI/CLI.hpp>
 
-#include <algorithm>
 #include <cmath>
 #include <iostream>
 #include <stdexcept>
@@ -41,30 +42,6 @@ struct Cache {
     bool converted = false;
 };
 
-double diagonalOf(const HPlug& mesh) {
-    std::vector<double> xyz;
-    readPoints(mesh, xyz);
-    double squares = 0.0;
-    for (std::size_t axis = 0; axis < 3 && xyz.size() > axis; ++axis) {
-        double least = xyz[axis];
-        double most = least;
-        for (std::size_t i = axis; i < xyz.size(); i += 3) {
-            least = std::min(least, xyz[i]);
-            most = std::max(most, xyz[i]);
-        }
-        squares += (most - least) * (most - least);
-    }
-    return std::sqrt(squares);
-}
-
-std::vector<std::int32_t> characterVertexMap() {
-    for (const HObject& character : nodesOfType("character"))
-        if (const std::string file = textOf(plugOf(character, "vertexMapFile")); !file.empty())
-            return readVertexMap(fs::absolute(file)); // from the scene's folder, which is the current one
-    throw std::runtime_error("--order file needs the vertex map that quarn import writes: the scene has no node of "
-                             "type character with a vertexMapFile");
-}
-
 // beside the output, named after both, so that caches of two meshes or scenes do not meet
 fs::path pathOfConverted(const Options& options, const WarpGeometry& geometry) {
     fs::path path = options.output;
@@ -78,7 +55,7 @@ fs::path pathOfConverted(const Options& options, const WarpGeometry& geometry) {
 
 Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpGeometry& geometry,
                    std::size_t vertices) {
-    const std::vector<std::int32_t> map = characterVertexMap();
+    const std::vector<std::int32_t> map = readIntegers(vertexMapFile(geometry.name));
     requireFit(map, file.vertexCount(), vertices);
     Cache cache{pathOfConverted(options, geometry), file.frameCount(), true};
     const double apart = writeInSceneOrder(options.cache, cache.path, map, vertices, options.console);

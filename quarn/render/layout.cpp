@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/layout.h"
 
+#include "quarn/console/numberText.h"
+
 #include "quarn/render/heat.h"
 #include "quarn/render/text.h"
 
@@ -27,13 +29,6 @@ void drawCentred(Picture& picture, const std::string& text, float middle, float 
 }
 
 } // namespace
-
-std::string numberText(double value) {
-    std::array<char, 32> text{};
-    const auto [end, error] =
-        std::to_chars(text.data(), text.data() + text.size(), value, std::chars_format::general, 4);
-    return error == std::errc() ? std::string(text.data(), end) : "?";
-}
 
 Margins Layout::margins() const {
     Margins margins;

@@ -26,7 +26,4 @@ void drawLabel(Picture& picture, const Layout& layout, int left, const std::stri
 /// The colour bar at the bottom of that panel, from 0 to `range` millimetres.
 void drawColourBar(Picture& picture, const Layout& layout, int left, double range);
 
-/// In the fewest digits that say it: "0.5", "20", "1e+06".
-std::string numberText(double value);
-
 } // namespace quarn

@@ -10,6 +10,7 @@
 #include "openquarn/HPointArray.h"
 
 #include <algorithm>
+#include <cmath>
 #include <stdexcept>
 
 namespace quarn {
@@ -77,6 +78,27 @@ void readPoints(const HPlug& mesh, std::vector<double>& xyz) {
 
 void readPoints(const HPlug& mesh, std::vector<float>& xyz) {
     read(mesh, xyz);
+}
+
+double boxDiagonal(std::span<const float> xyz) {
+    double squares = 0.0;
+    for (std::size_t axis = 0; axis < 3 && axis < xyz.size(); ++axis) {
+        float low = xyz[axis];
+        float high = xyz[axis];
+        for (std::size_t i = axis; i < xyz.size(); i += 3) {
+            low = std::min(low, xyz[i]);
+            high = std::max(high, xyz[i]);
+        }
+        const double side = static_cast<double>(high) - static_cast<double>(low);
+        squares += side * side;
+    }
+    return std::sqrt(squares);
+}
+
+double diagonalOf(const HPlug& mesh) {
+    std::vector<float> xyz;
+    readPoints(mesh, xyz);
+    return boxDiagonal(xyz);
 }
 
 HObject meshData(std::span<const double> xyz, const MeshPolygons& polygons) {

@@ -28,6 +28,11 @@ MeshPolygons polygonsOf(const HPlug& mesh);
 void readPoints(const HPlug& mesh, std::vector<double>& xyz);
 void readPoints(const HPlug& mesh, std::vector<float>& xyz);
 
+/// The length of the diagonal of the box around the points; 0 without points. Thread: any.
+double boxDiagonal(std::span<const float> xyz);
+/// The same of an evaluated mesh, in the scene's unit. Throws as polygonsOf() does. Thread: main.
+double diagonalOf(const HPlug& mesh);
+
 /// Mesh data for a plug. `xyz` 3 * polygons.vertexCount numbers. Throws std::runtime_error for what is no mesh.
 HObject meshData(std::span<const double> xyz, const MeshPolygons& polygons);
 

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/heat.h"
+#include "quarn/console/numberText.h"
 #include "quarn/render/Picture.h"
 #include "quarn/render/layout.h"
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/pose/numberText.h"
+#include "quarn/console/numberText.h"
 
 #include <sstream>
 
