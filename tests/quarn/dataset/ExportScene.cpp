@@ -14,7 +14,7 @@
 
 namespace {
 
-constexpr unsigned columns = 6;
+constexpr std::uint32_t columns = 6;
 
 // controls: the axes of the joint, its angle, and a number that is set; with gaps between the lists
 constexpr const char* script = R"(
@@ -50,7 +50,7 @@ void run(const std::string& text) {
 
 quarn::MeshPolygons polygons() {
     quarn::MeshPolygons result;
-    result.vertexCount = 2 * columns;
+    result.vertexCount = std::size_t{2} * columns;
     for (unsigned column = 0; column + 1 < columns; ++column) {
         result.sizes.push_back(4);
         result.corners.insert(result.corners.end(), {column, column + 1, columns + column + 1, columns + column});
@@ -67,7 +67,7 @@ ExportScene::ExportScene() {
 std::vector<float> ExportScene::restPoints() {
     std::vector<float> xyz;
     for (unsigned vertex = 0; vertex < vertexCount; ++vertex)
-        xyz.insert(xyz.end(), {static_cast<float>(vertex % columns), static_cast<float>(vertex / columns), 0.0F});
+        xyz.insert(xyz.end(), {static_cast<float>(vertex % columns), vertex < columns ? 0.0F : 1.0F, 0.0F});
     return xyz;
 }
 

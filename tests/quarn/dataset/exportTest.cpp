@@ -20,7 +20,6 @@ namespace {
 
 using ::testing::AllOf;
 using ::testing::ElementsAre;
-using ::testing::EndsWith;
 using ::testing::FloatNear;
 using ::testing::HasSubstr;
 using ::testing::Pointwise;
@@ -46,8 +45,8 @@ protected:
         const double angle = turn * static_cast<double>(frame);
         std::vector<float> result = xyz;
         for (std::size_t i = 0; i < xyz.size(); i += 3) {
-            const double x = static_cast<double>(xyz[i]);
-            const double y = static_cast<double>(xyz[i + 1]);
+            const auto x = static_cast<double>(xyz[i]);
+            const auto y = static_cast<double>(xyz[i + 1]);
             result[i] = static_cast<float>(x * std::cos(angle) - y * std::sin(angle));
             result[i + 1] = static_cast<float>(x * std::sin(angle) + y * std::cos(angle));
         }
@@ -76,7 +75,7 @@ TEST_F(ExportTest, DeltasLeadToTheTargetInBothModes) {
         const std::vector<float> deltas = numbersOf<float>(answer.folder / "deltas.npy");
         ASSERT_EQ(deltas.size(), frames * vertexCount * 3);
         for (std::size_t frame = 0; frame < frames; ++frame) {
-            const auto row = std::span(deltas).subspan(frame * vertexCount * 3, vertexCount * 3);
+            const auto row = std::span(deltas).subspan(frame * restPoints().size(), restPoints().size());
             const std::vector<float> reached =
                 mode == "Surface" ? turned(sum(restPoints(), row), frame) : sum(turned(restPoints(), frame), row);
             EXPECT_THAT(reached, Pointwise(FloatNear(2e-6F), targetAt(frame)));

@@ -184,7 +184,7 @@ TEST_F(ResumeTest, AFullDiskIsSaidAndGoneOnFrom) {
     while (writer.rows() < shape.rows)
         writer.append(1, controls, deltas);
     writer.save();
-    EXPECT_EQ(numbersOf<float>(disk / "deltas.npy"), std::vector<float>(300U * 1500U, 2.0F));
+    EXPECT_EQ(numbersOf<float>(disk / "deltas.npy"), std::vector<float>(std::size_t{300} * 1500, 2.0F));
 
     // and before anything is begun: this needs more than there is
     quarn::ExportOptions flags = options();
