@@ -2,13 +2,10 @@
 #include "quarn/render/layout.h"
 
 #include "quarn/console/numberText.h"
-
 #include "quarn/render/heat.h"
 #include "quarn/render/text.h"
 
 #include <algorithm>
-#include <array>
-#include <charconv>
 
 namespace quarn {
 namespace {
