@@ -33,8 +33,7 @@ connectAttr time1.outTime lost.time
 setAttr lost.cacheFile none.npy
 file -saveAs lost.json
 EOF
-plugins=(--plugin "$(realpath "$2")" --plugin "$(realpath "$3")")
-(cd "$work" && "$quarn" exec "${plugins[@]}" setup.txt >/dev/null)
+(cd "$work" && "$quarn" exec setup.txt >/dev/null)
 scene=$work/moving.json
 
 # the wave of the first control at 1 is 0.4 units high, as the scene's own page says; half of it half-way
