@@ -13,201 +13,198 @@
 #include <map>
 #include <stdexcept>
 
-    namespace quarn {
-    namespace {
+namespace quarn {
+namespace {
 
-    namespace fs = std::filesystem;
+namespace fs = std::filesystem;
 
-    FrameRange framesOf(const Warp& warp, const ExportOptions& options) {
-        if (!options.frames.empty())
-            return frameRange(options.frames);
-        const int first = wholeNumberOf(warp.plug("exportStartFrame"));
-        const int last = wholeNumberOf(warp.plug("exportEndFrame"));
-        if (last < first)
-            throw std::runtime_error(warp.name + ".exportStartFrame is " + std::to_string(first) +
-                                     ", after exportEndFrame " + std::to_string(last) + "; set them, or give --frames");
-        return frameRange(std::to_string(first) + "-" + std::to_string(last));
+FrameRange framesOf(const Warp& warp, const ExportOptions& options) {
+    if (!options.frames.empty())
+        return frameRange(options.frames);
+    const int first = wholeNumberOf(warp.plug("exportStartFrame"));
+    const int last = wholeNumberOf(warp.plug("exportEndFrame"));
+    if (last < first)
+        throw std::runtime_error(warp.name + ".exportStartFrame is " + std::to_string(first) +
+                                 ", after exportEndFrame " + std::to_string(last) + "; set them, or give --frames");
+    return frameRange(std::to_string(first) + "-" + std::to_string(last));
+}
+
+std::vector<WarpGeometry> chosenGeometries(const Warp& warp, const std::string& choice) {
+    if (choice.empty() && warp.geometries.size() > 1)
+        return warp.geometries;
+    return {warp.geometry(choice)};
+}
+
+fs::path folderByScene(const Warp& warp, const WarpGeometry& geometry) {
+    const std::string root = textOf(warp.plug("trainingDataRoot"));
+    const std::string name = textOf(warp.plug("export", geometry, "trainingDataName"));
+    if (root.empty())
+        throw std::runtime_error(warp.name + ".trainingDataRoot is empty; set it, or say with -o where to export to");
+    return fs::current_path() / root / (name.empty() ? geometry.name : name);
+}
+
+// one folder each: two geometries that are to go into the same are refused
+std::vector<fs::path> foldersOf(const Warp& warp, const std::vector<WarpGeometry>& geometries,
+                                const ExportOptions& options) {
+    std::map<fs::path, std::string> taken;
+    std::vector<fs::path> folders;
+    folders.reserve(geometries.size());
+    for (const WarpGeometry& geometry : geometries) {
+        const fs::path output = absolutePath(options.output);
+        fs::path folder = output.empty()           ? folderByScene(warp, geometry)
+                          : geometries.size() == 1 ? output
+                                                   : output / geometry.name;
+        folder = folder.lexically_normal();
+        const std::string label = geometry.name + " (" + std::to_string(geometry.index) + ")";
+        if (const auto [other, isNew] = taken.emplace(folder, label); !isNew)
+            throw std::runtime_error(other->second + " and " + label + " would both be exported to " + folder.string() +
+                                     "; choose one with --geometry, and a folder with -o");
+        folders.push_back(folder);
+    }
+    return folders;
+}
+
+/// The export of one geometry.
+class GeometryExport {
+public:
+    GeometryExport(SceneSession& session, const Warp& warp, const WarpGeometry& geometry, const fs::path& folder,
+                   const ExportOptions& options)
+        : session_(session)
+        , options_(options)
+        , warp_(warp)
+        , geometry_(geometry)
+        , frames_(framesOf(warp, options))
+        , sceneFile_(absolutePath(options.scene.scene))
+        , folder_(folder, options.overwrite)
+        , sampler_(session.host(), warp, geometry, frames_.first)
+        , setup_(setupNow()) {
+        facts_.scene = sceneFile_.filename().string();
+        facts_.diagonal = diagonalOf(geometry.original);
+        facts_.shape = {frames_.count(), sampler_.names().size(), sampler_.map().affectCount()};
     }
 
-    std::vector<WarpGeometry> chosenGeometries(const Warp& warp, const std::string& choice) {
-        if (choice.empty() && warp.geometries.size() > 1)
-            return warp.geometries;
-        return {warp.geometry(choice)};
+    ExportAnswer run() {
+        if (folder_.isDone(setup_))
+            return alreadyDone();
+        FolderLock lock(folder_.part());
+        if (folder_.isDone(setup_)) // by now, by another process
+            return alreadyDone();
+        const std::size_t before = write();
+        folder_.publish(lock);
+        return answer(before);
     }
 
-    fs::path folderByScene(const Warp& warp, const WarpGeometry& geometry) {
-        const std::string root = textOf(warp.plug("trainingDataRoot"));
-        const std::string name = textOf(warp.plug("export", geometry, "trainingDataName"));
-        if (root.empty())
-            throw std::runtime_error(warp.name +
-                                     ".trainingDataRoot is empty; set it, or say with -o where to export to");
-        return fs::current_path() / root / (name.empty() ? geometry.name : name);
+private:
+    Setup setupNow() const { return sceneSetup(sceneFile_, warp_, geometry_, sampler_, frames_); }
+
+    ExportAnswer alreadyDone() {
+        options_.console.note(folder_.path().string() + " is complete: there is nothing to do");
+        return answer(facts_.shape.rows);
     }
 
-    // one folder each: two geometries that are to go into the same are refused
-    std::vector<fs::path> foldersOf(const Warp& warp, const std::vector<WarpGeometry>& geometries,
-                                    const ExportOptions& options) {
-        std::map<fs::path, std::string> taken;
-        std::vector<fs::path> folders;
-        folders.reserve(geometries.size());
-        for (const WarpGeometry& geometry : geometries) {
-            const fs::path output = absolutePath(options.output);
-            fs::path folder = output.empty()           ? folderByScene(warp, geometry)
-                              : geometries.size() == 1 ? output
-                                                       : output / geometry.name;
-            folder = folder.lexically_normal();
-            const std::string label = geometry.name + " (" + std::to_string(geometry.index) + ")";
-            if (const auto [other, isNew] = taken.emplace(folder, label); !isNew)
-                throw std::runtime_error(other->second + " and " + label + " would both be exported to " +
-                                         folder.string() + "; choose one with --geometry, and a folder with -o");
-            folders.push_back(folder);
-        }
-        return folders;
+    ExportAnswer answer(std::size_t before) const {
+        const DatasetShape& shape = facts_.shape;
+        return {geometry_.name,
+                folder_.path(),
+                shape.rows,
+                before,
+                shape.controls,
+                shape.deltas,
+                bytesOfDataset(folder_.path())};
     }
 
-    /// The export of one geometry.
-    class GeometryExport {
-    public:
-        GeometryExport(SceneSession& session, const Warp& warp, const WarpGeometry& geometry, const fs::path& folder,
-                       const ExportOptions& options)
-            : session_(session)
-            , options_(options)
-            , warp_(warp)
-            , geometry_(geometry)
-            , frames_(framesOf(warp, options))
-            , sceneFile_(absolutePath(options.scene.scene))
-            , folder_(folder, options.overwrite)
-            , sampler_(session.host(), warp, geometry, frames_.first)
-            , setup_(setupNow()) {
-            facts_.scene = sceneFile_.filename().string();
-            facts_.diagonal = diagonalOf(geometry.original);
-            facts_.shape = {frames_.count(), sampler_.names().size(), sampler_.map().affectCount()};
+    // answers how many rows there were
+    std::size_t write() {
+        DatasetWriter writer(folder_.part(), facts_.shape);
+        const bool resumes = resume(writer);
+        folder_.requireSpace(facts_.shape.bytes() - writer.rows() * facts_.shape.rowBytes());
+        if (!resumes) {
+            folder_.begin(setup_);
+            writer.begin();
         }
-
-        ExportAnswer run() {
-            if (folder_.isDone(setup_))
-                return alreadyDone();
-            FolderLock lock(folder_.part());
-            if (folder_.isDone(setup_)) // by now, by another process
-                return alreadyDone();
-            const std::size_t before = write();
-            folder_.publish(lock);
-            return answer(before);
+        const std::size_t before = writer.rows();
+        try {
+            writeRows(writer);
+        } catch (...) {
+            keepRows(writer);
+            throw;
         }
+        writer.save();
+        requireUnchanged();
+        session_.host().setTime(frames_.first); // whatever frame it ended with
+        writeWhole(folder_.part() / descriptionFile,
+                   datasetDescription(facts_, warp_, geometry_, sampler_, folder_.part() / datasetFile::controls));
+        return before;
+    }
 
-    private:
-        Setup setupNow() const { return sceneSetup(sceneFile_, warp_, geometry_, sampler_, frames_); }
+    bool resume(DatasetWriter& writer) const {
+        const DatasetFolder::Begun begun = folder_.begun(setup_);
+        if (begun == DatasetFolder::Begun::no)
+            return false;
+        const std::string damage =
+            begun == DatasetFolder::Begun::damaged ? std::string(setupFile) + " cannot be read" : writer.resume();
+        if (!damage.empty())
+            options_.console.note(folder_.part().string() + " cannot be gone on from (" + damage +
+                                  "): beginning again");
+        else
+            options_.console.note("going on after " + std::to_string(writer.rows()) + " of " +
+                                  std::to_string(facts_.shape.rows) + " rows in " + folder_.part().string());
+        return damage.empty();
+    }
 
-        ExportAnswer alreadyDone() {
-            options_.console.note(folder_.path().string() + " is complete: there is nothing to do");
-            return answer(facts_.shape.rows);
+    void writeRows(DatasetWriter& writer) {
+        Progress progress(options_.console, "exporting " + geometry_.name, facts_.shape.rows);
+        progress.advance(writer.rows());
+        while (writer.rows() < facts_.shape.rows) {
+            const int frame = frames_.frame(writer.rows());
+            sampler_.sample(frame);
+            writer.append(frame, sampler_.controls(), sampler_.deltas());
+            progress.advance();
         }
+    }
 
-        ExportAnswer answer(std::size_t before) const {
-            const DatasetShape& shape = facts_.shape;
-            return {geometry_.name,
-                    folder_.path(),
-                    shape.rows,
-                    before,
-                    shape.controls,
-                    shape.deltas,
-                    bytesOfDataset(folder_.path())};
-        }
-
-        // answers how many rows there were
-        std::size_t write() {
-            DatasetWriter writer(folder_.part(), facts_.shape);
-            const bool resumes = resume(writer);
-            folder_.requireSpace(facts_.shape.bytes() - writer.rows() * facts_.shape.rowBytes());
-            if (!resumes) {
-                folder_.begin(setup_);
-                writer.begin();
-            }
-            const std::size_t before = writer.rows();
-            try {
-                writeRows(writer);
-            } catch (...) {
-                keepRows(writer);
-                throw;
-            }
+    void keepRows(DatasetWriter& writer) const {
+        try {
             writer.save();
-            requireUnchanged();
-            session_.host().setTime(frames_.first); // whatever frame it ended with
-            writeWhole(folder_.part() / descriptionFile,
-                       datasetDescription(facts_, warp_, geometry_, sampler_, folder_.part() / datasetFile::controls));
-            return before;
+            if (writer.savedRows() == 0)
+                return folder_.discard(); // nothing that would be worth going on from
+        } catch (const std::exception&) { // NOLINT(bugprone-empty-catch): what ended the rows is what the user reads
         }
-
-        bool resume(DatasetWriter& writer) const {
-            const DatasetFolder::Begun begun = folder_.begun(setup_);
-            if (begun == DatasetFolder::Begun::no)
-                return false;
-            const std::string damage =
-                begun == DatasetFolder::Begun::damaged ? std::string(setupFile) + " cannot be read" : writer.resume();
-            if (!damage.empty())
-                options_.console.note(folder_.part().string() + " cannot be gone on from (" + damage +
-                                      "): beginning again");
-            else
-                options_.console.note("going on after " + std::to_string(writer.rows()) + " of " +
-                                      std::to_string(facts_.shape.rows) + " rows in " + folder_.part().string());
-            return damage.empty();
-        }
-
-        void writeRows(DatasetWriter& writer) {
-            Progress progress(options_.console, "exporting " + geometry_.name, facts_.shape.rows);
-            progress.advance(writer.rows());
-            while (writer.rows() < facts_.shape.rows) {
-                const int frame = frames_.frame(writer.rows());
-                sampler_.sample(frame);
-                writer.append(frame, sampler_.controls(), sampler_.deltas());
-                progress.advance();
-            }
-        }
-
-        void keepRows(DatasetWriter& writer) const {
-            try {
-                writer.save();
-                if (writer.savedRows() == 0)
-                    return folder_.discard(); // nothing that would be worth going on from
-            } catch (
-                const std::exception&) { // NOLINT(bugprone-empty-catch): what ended the rows is what the user reads
-            }
-            options_.console.note(std::to_string(writer.savedRows()) + " of " + std::to_string(facts_.shape.rows) +
-                                  " rows are kept in " + folder_.part().string() +
-                                  "; the same command goes on from there");
-        }
-
-        // a cache that is written while it is read gives rows that do not go together
-        void requireUnchanged() const {
-            if (const std::string difference = setupNow().differenceFrom(setup_); !difference.empty())
-                throw std::runtime_error("what is exported has changed meanwhile (" + difference +
-                                         "); export again with --overwrite");
-        }
-
-        SceneSession& session_;
-        const ExportOptions& options_;
-        const Warp& warp_;
-        const WarpGeometry& geometry_;
-        FrameRange frames_;
-        fs::path sceneFile_;
-        DatasetFolder folder_;
-        FrameSampler sampler_;
-        Setup setup_;
-        DatasetFacts facts_;
-    };
-
-    } // namespace
-
-    std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
-        SceneSession session(options.scene);
-        const Warp warp = Warp::find(options.deformer);
-        const std::vector<WarpGeometry> geometries = chosenGeometries(warp, options.geometry);
-        const std::vector<fs::path> folders = foldersOf(warp, geometries, options);
-        std::vector<ExportAnswer> answers;
-        answers.reserve(geometries.size());
-        for (std::size_t i = 0; i < geometries.size(); ++i)
-            answers.push_back(GeometryExport(session, warp, geometries[i], folders[i], options).run());
-        return answers;
+        options_.console.note(std::to_string(writer.savedRows()) + " of " + std::to_string(facts_.shape.rows) +
+                              " rows are kept in " + folder_.part().string() + "; the same command goes on from there");
     }
+
+    // a cache that is written while it is read gives rows that do not go together
+    void requireUnchanged() const {
+        if (const std::string difference = setupNow().differenceFrom(setup_); !difference.empty())
+            throw std::runtime_error("what is exported has changed meanwhile (" + difference +
+                                     "); export again with --overwrite");
+    }
+
+    SceneSession& session_;
+    const ExportOptions& options_;
+    const Warp& warp_;
+    const WarpGeometry& geometry_;
+    FrameRange frames_;
+    fs::path sceneFile_;
+    DatasetFolder folder_;
+    FrameSampler sampler_;
+    Setup setup_;
+    DatasetFacts facts_;
+};
+
+} // namespace
+
+std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
+    SceneSession session(options.scene);
+    const Warp warp = Warp::find(options.deformer);
+    const std::vector<WarpGeometry> geometries = chosenGeometries(warp, options.geometry);
+    const std::vector<fs::path> folders = foldersOf(warp, geometries, options);
+    std::vector<ExportAnswer> answers;
+    answers.reserve(geometries.size());
+    for (std::size_t i = 0; i < geometries.size(); ++i)
+        answers.push_back(GeometryExport(session, warp, geometries[i], folders[i], options).run());
+    return answers;
+}
 
 } // namespace quarn

@@ -7,7 +7,6 @@
 #include "quarn/scene/meshes.h"
 #include "rig/NpyFile.h"
 
-
 #include <algorithm>
 #include <cmath>
 
