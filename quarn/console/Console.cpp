@@ -3,6 +3,7 @@
 
 #include "quarn/console/interrupt.h"
 
+#include <cmath>
 #include <iostream>
 #include <sstream>
 
@@ -15,7 +16,7 @@ constexpr std::size_t barWidth = 30;
 constexpr auto redrawAfter = std::chrono::milliseconds(100);
 
 std::string timeText(double seconds) {
-    const auto whole = static_cast<long>(seconds + 0.5);
+    const long whole = std::lround(seconds);
     std::ostringstream text;
     text.imbue(std::locale::classic());
     if (whole >= 60)

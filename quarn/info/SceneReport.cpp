@@ -25,8 +25,8 @@ std::vector<std::uint32_t> affectedOf(const HFnGeometryData& data, const std::st
             throw std::runtime_error("the geometry has no component tag " + tag);
         std::vector<std::uint32_t> affected;
         affected.reserve(listed.length());
-        for (unsigned i = 0; i < listed.length(); ++i)
-            affected.push_back(listed[i]);
+        for (const auto vertex : listed)
+            affected.push_back(vertex);
         return affected;
     }
     std::vector<std::uint32_t> all(data.vertexCount());
