@@ -2,6 +2,7 @@
 #include "quarn/render/Picture.h"
 
 #include <algorithm>
+#include <cmath>
 #include <stdexcept>
 
 #define STB_IMAGE_WRITE_IMPLEMENTATION
@@ -14,7 +15,7 @@ namespace {
 
 std::uint8_t blended(std::uint8_t below, float above, float cover) {
     const float value = static_cast<float>(below) / 255.0F * (1.0F - cover) + above * cover;
-    return static_cast<std::uint8_t>(std::clamp(value, 0.0F, 1.0F) * 255.0F + 0.5F);
+    return static_cast<std::uint8_t>(std::lround(std::clamp(value, 0.0F, 1.0F) * 255.0F));
 }
 
 // IEC 61966-2-1

@@ -66,8 +66,8 @@ MeshPolygons polygonsOf(const HPlug& plug) {
     for (int polygon = 0; polygon < mesh.numPolygons(); ++polygon) {
         require(mesh.getPolygonVertices(polygon, vertices), plug);
         polygons.sizes.push_back(vertices.length());
-        for (unsigned corner = 0; corner < vertices.length(); ++corner)
-            polygons.corners.push_back(static_cast<std::uint32_t>(vertices[corner]));
+        for (const int vertex : vertices)
+            polygons.corners.push_back(static_cast<std::uint32_t>(vertex));
     }
     return polygons;
 }
@@ -103,8 +103,10 @@ double diagonalOf(const HPlug& mesh) {
 
 HObject meshData(std::span<const double> xyz, const MeshPolygons& polygons) {
     HPointArray points(static_cast<unsigned>(xyz.size() / 3));
-    for (unsigned vertex = 0; vertex < points.length(); ++vertex)
-        points[vertex] = HPoint(xyz[3 * vertex], xyz[3 * vertex + 1], xyz[3 * vertex + 2]);
+    for (unsigned vertex = 0; vertex < points.length(); ++vertex) {
+        const std::span<const double> point = xyz.subspan(3 * std::size_t{vertex}, 3);
+        points[vertex] = HPoint(point[0], point[1], point[2]);
+    }
     HIntArray counts(static_cast<unsigned>(polygons.sizes.size()));
     for (unsigned polygon = 0; polygon < counts.length(); ++polygon)
         counts[polygon] = static_cast<int>(polygons.sizes[polygon]);
@@ -112,7 +114,7 @@ HObject meshData(std::span<const double> xyz, const MeshPolygons& polygons) {
     for (unsigned corner = 0; corner < corners.length(); ++corner)
         corners[corner] = static_cast<int>(polygons.corners[corner]);
     HStatus status;
-    const HObject data = HFnMeshData().create(points, counts, corners, &status);
+    HObject data = HFnMeshData().create(points, counts, corners, &status);
     if (status.error())
         throw std::runtime_error(std::string("the mesh cannot be made: ") + status.errorString().asChar());
     return data;

@@ -57,8 +57,7 @@ TEST(Transfer, DamagedBytesDoNoHarm) {
 }
 
 TEST(TrialProcess, GivesWhatTheActionGivesAndSurvivesIt) {
-    const std::string large(3000000, 'x');
-    EXPECT_EQ(runTrial([&] { return large; }), large);
+    EXPECT_EQ(runTrial([] { return std::string(3000000, 'x'); }), std::string(3000000, 'x'));
     EXPECT_EQ(runTrial([] { return std::string(); }), "");
     EXPECT_THROW(runTrial([]() -> std::string { throw std::bad_alloc(); }), std::bad_alloc);
     const auto errorOf = [](const std::function<std::string()>& action) {
