@@ -144,9 +144,9 @@ TEST_F(ImportCharacter, SeveralMeshesAndOddNames) {
     strip.lower = R"({"translation":[1,0,0]})";
     strip.mesh = R"({"name":"1 arm/é","mesh":0,"skin":0})";
     strip.more = [](GltfWriter& file) {
-        file.nodes.push_back(R"({"name":"controls","mesh":0,"skin":0})");
-        file.nodes.push_back(R"({"name":"table","mesh":1,"translation":[0,3,0]})");
-        file.meshes.push_back(R"({"primitives":[{"attributes":{"POSITION":0},"indices":1}]})");
+        file.nodes.emplace_back(R"({"name":"controls","mesh":0,"skin":0})");
+        file.nodes.emplace_back(R"({"name":"table","mesh":1,"translation":[0,3,0]})");
+        file.meshes.emplace_back(R"({"primitives":[{"attributes":{"POSITION":0},"indices":1}]})");
         file.roots = "0,2,3,4";
     };
     options_.file = write("odd.gltf", strip.write().text());

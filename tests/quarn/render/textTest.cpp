@@ -25,7 +25,7 @@ TEST(Text, EveryCharacterHasInkOfItsOwnWithinItsWidth) {
         std::size_t ink = 0;
         for (int y = 0; y < picture.height; ++y)
             for (int x = 0; x < picture.width; ++x)
-                if (picture.rgb[static_cast<std::size_t>(3 * (y * picture.width + x))] > 0) {
+                if (picture.rgb[3 * (std::size_t(y) * std::size_t(picture.width) + std::size_t(x))] > 0) {
                     ++ink;
                     EXPECT_TRUE(x >= 2 && x <= right && y >= 4 && y <= 33) << text << ' ' << x << ' ' << y;
                 }

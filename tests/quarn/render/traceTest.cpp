@@ -89,7 +89,7 @@ TEST(Trace, ASphereCoversItsSilhouette) {
 TEST(Trace, ASphereIsRoundAndLitFromTheKeyLight) {
     const PanelFrame ball = sphere();
     const PanelSight sight = sightOf(ball, cameraFor(ball));
-    const auto at = [&](int x, int y) { return sight.pixels[static_cast<std::size_t>(y * side + x)]; };
+    const auto at = [&](int x, int y) { return sight.pixels[std::size_t(y) * side + std::size_t(x)]; };
     const PixelSight middle = at(side / 2, side / 2);
     EXPECT_EQ(middle.cover, 1.0F);
     EXPECT_EQ(middle.skyOpen, 1.0F); // nothing hides the sky from a ball
@@ -149,7 +149,7 @@ TEST(Trace, HeatOfAKnownDistanceHasItsColour) {
     Surface surface = makeSurface(ball.polygons, camera.toCamera(ball.points));
     surface.heat.assign(surface.points.size(), 0.25F);
     const PanelSight sight = gather(surface, camera, side, side);
-    const Vec3 colour = encoded(sight.pixels[static_cast<std::size_t>(side / 2 * side + side / 2)].albedo);
+    const Vec3 colour = encoded(sight.pixels[std::size_t(side) * (side / 2) + side / 2].albedo);
     const Vec3 expected = heatColour(0.25F);
     EXPECT_NEAR(colour.x, expected.x, 1e-4);
     EXPECT_NEAR(colour.y, expected.y, 1e-4);
