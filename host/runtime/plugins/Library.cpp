@@ -3,6 +3,8 @@
 
 #include "openquarn/HApi.h"
 
+#include <oneapi/tbb/global_control.h>
+
 #include <algorithm>
 #include <charconv>
 #include <dlfcn.h>
@@ -19,6 +21,13 @@ constexpr std::size_t versionLength = sizeof hostVersion;
 std::string loaderError() {
     const char* text = dlerror();
     return text ? text : "the loader gives no reason";
+}
+
+// A parallel loop ends for its caller while a worker may still be on its way out of the loop's code, which lies in the
+// library: nobody may be there when it goes. The workers come back with the next loop.
+void sendWorkersHome() {
+    oneapi::tbb::task_scheduler_handle workers{oneapi::tbb::attach{}};
+    oneapi::tbb::finalize(workers, std::nothrow);
 }
 
 // the loader's record of the library that an address lies in
@@ -64,6 +73,7 @@ Library::~Library() {
 bool Library::close() {
     if (!handle_)
         return true;
+    sendWorkersHome();
     dlclose(std::exchange(handle_, nullptr));
     void* const present = dlopen(path_.c_str(), RTLD_NOW | RTLD_NOLOAD);
     if (present)

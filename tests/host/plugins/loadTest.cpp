@@ -17,6 +17,8 @@
 #include <filesystem>
 #include <fstream>
 #include <functional>
+#include <iterator>
+#include <thread>
 
 namespace {
 
@@ -219,16 +221,24 @@ TEST_F(Loading, SaysSoWhenALibraryCannotGo) {
 
 TEST(Unloading, FiftyRoundsWithThreadsAtWorkInThePlugin) {
     Session session;
+    const auto threads = [] {
+        return std::distance(fs::directory_iterator("/proc/self/task"), fs::directory_iterator());
+    };
+    const auto before = threads();
+    bool hadWorkers = false;
     for (int round = 0; round < 50; ++round) {
         loadPlugin(module("tinyWorker"));
         HFnDependencyNode node;
         ASSERT_FALSE(node.create("tinyWorker").isNull());
         node.findPlug("count").setInt(1000);
         EXPECT_EQ(node.findPlug("total").asInt(), 499500);
+        hadWorkers = hadWorkers || threads() > before;
         session.newScene();
         unloadPlugin("tinyWorker");
+        ASSERT_EQ(threads(), before) << "a worker may still be in the library's code, round " << round;
         ASSERT_FALSE(isMapped("tinyWorker")) << "round " << round;
     }
+    EXPECT_TRUE(hadWorkers || std::thread::hardware_concurrency() == 1);
 }
 
 TEST(Unloading, TheEndOfASessionUnloadsEverything) {
