@@ -13,6 +13,7 @@
 #include "quarn/scene/modelDirectory.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
+#include "quarn/scene/useModel.h"
 
 #include <CLI/CLI.hpp>
 
@@ -57,11 +58,9 @@ void requireEvaluator(const Options& options) {
                                    "load a plug-in that does with --plugin");
 }
 
-void useModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
-    if (!name.empty()) {
-        setText(warp.plug("models", geometry, "modelName"), name);
-        setNumber(warp.plug("models", geometry, "modelActive"), 1.0);
-    }
+void chooseModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
+    if (!name.empty())
+        useModel(warp, geometry, name);
     if (!isModelActive(warp, geometry))
         return;
     // the one thing that the deformer says nothing about
@@ -111,7 +110,7 @@ PlayPlan planFor(const Options& options) {
     plan.output = options.output;
     plan.trace = options.trace;
     if (geometry != nullptr)
-        useModel(*warp, *geometry, options.model);
+        chooseModel(*warp, *geometry, options.model);
     addComparison(plan, options, warp ? &*warp : nullptr, geometry);
     addOrder(plan, options.order, geometry != nullptr ? geometry->name : nodeName(plan.mesh.node()));
     return plan;
