@@ -2,6 +2,7 @@
 // Base class of deformers: geometry filters with a weight for each vertex.
 #pragma once
 
+#include "openquarn/HObjectArray.h"
 #include "openquarn/HPxGeometryFilter.h"
 
 /// The attributes below belong to the node class "deformer" and to every type registered as HPxNode::kDeformerNode, in
@@ -20,6 +21,11 @@ public:
     /// A buffer that the node publishes for a GPU deformer, by name; null for a name it does not know. The base
     /// publishes none. [eval]
     virtual HObject getNamedBuffer(const HString& name, unsigned multiIndex);
+
+    /// Appends the attributes of which a new value has to be evaluated on the CPU once before the GPU deformer of the
+    /// type can go on: numbers, of which the host reads the element of the geometry below an array. `envelope` always
+    /// is one. The base adds nothing. [eval]
+    virtual void primingAttributes(HObjectArray& attributes) const;
 
     /// A weight for each affected vertex, in the order of the index mapper; null when the geometry has no weights,
     /// which is not a failure: all are 1 then. Owned by the host, valid until the next evaluation of this geometry or

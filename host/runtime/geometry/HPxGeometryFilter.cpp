@@ -77,6 +77,8 @@ HObject HPxDeformerNode::getNamedBuffer(const HString&, unsigned) {
     return {};
 }
 
+void HPxDeformerNode::primingAttributes(HObjectArray&) const {}
+
 const float* HPxDeformerNode::envelopeWeights(HDataBlock& block, unsigned multiIndex, HStatus* status) {
     const float* none = nullptr;
     return apiValue(FaultPoint::HPxDeformerNode_envelopeWeights, status, none, [&](HStatus& outcome) {
