@@ -20,8 +20,8 @@ struct Device {
     cl_context context = nullptr;
     cl_command_queue queue = nullptr; ///< in order
     bool hasDoubles = false;
-    bool isTimed = false; ///< the queue records when commands ran
-    std::size_t preferredMultiple = 1;
+    bool isTimed = false;         ///< the queue records when commands ran
+    bool roundsCorrectly = false; ///< can divide and take roots of floats as the CPU does
     std::string name;
 };
 
@@ -30,7 +30,12 @@ struct Device {
 std::shared_ptr<Device> currentDevice();
 /// The open device; null when none is.
 std::shared_ptr<Device> openDevice();
-/// The next currentDevice() opens one anew. Thread: any.
+/// The next currentDevice() opens one anew. Compiled programs and times that are not measured yet go too. Thread: any.
 void closeDevice();
+
+/// The choice of Gpu::chooseDevice(), which is known to mean a device; closes the one that is open.
+void setDeviceChoice(const std::string& choice);
+/// Whether queues record times from now on; closes the open device when that changes.
+void setDeviceTiming(bool isTimed);
 
 } // namespace OpenQuarn

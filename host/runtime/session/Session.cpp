@@ -3,6 +3,7 @@
 
 #include "core/threads.h"
 #include "geometry/filterAttributes.h"
+#include "gpu/Device.h"
 #include "graph/Graph.h"
 #include "plugins/PluginTable.h"
 #include "services/SceneFileState.h"
@@ -27,6 +28,7 @@ Session::Session() {
 Session::~Session() {
     newScene();
     PluginTable::instance().unloadAll();
+    closeDevice();
 }
 
 void Session::newScene() {

@@ -1,0 +1,105 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn/gpu/HOpenCLBuffer.h"
+
+#include "gpu/Buffer.h"
+#include "gpu/Device.h"
+#include "gpu/failure.h"
+
+#include <exception>
+#include <new>
+#include <string>
+#include <utility>
+
+using OpenQuarn::noteFailure;
+
+HOpenCLBuffer::Impl::~Impl() {
+    waitForCopy();
+    if (memory)
+        noteFailure(clReleaseMemObject(memory), "clReleaseMemObject");
+}
+
+cl_int HOpenCLBuffer::Impl::waitForCopy() {
+    if (copyRead.isNull())
+        return CL_SUCCESS;
+    const cl_event event = copyRead.get();
+    const cl_int status = noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
+    copyRead.reset();
+    return status;
+}
+
+std::byte* HOpenCLBuffer::Impl::takeCopy(std::size_t bytes) {
+    if (waitForCopy() != CL_SUCCESS)
+        return nullptr;
+    if (bytes > copyCapacity) {
+        copyCapacity = 0;
+        copy.reset(new (std::nothrow) std::byte[bytes]);
+        if (!copy) {
+            noteFailure(CL_OUT_OF_HOST_MEMORY, "upload", std::to_string(bytes) + " bytes");
+            return nullptr;
+        }
+        copyCapacity = bytes;
+    }
+    return copy.get();
+}
+
+bool HOpenCLBuffer::isNull() const noexcept {
+    return !impl_;
+}
+cl_mem HOpenCLBuffer::get() const noexcept {
+    return impl_ ? impl_->memory : nullptr;
+}
+std::size_t HOpenCLBuffer::bufferSize() const noexcept {
+    return impl_ ? impl_->size : 0;
+}
+std::size_t HOpenCLBuffer::capacity() const noexcept {
+    return impl_ ? impl_->capacity : 0;
+}
+
+namespace {
+
+cl_int allocate(HOpenCLBuffer::Impl& made, std::size_t bytes) {
+    cl_int status = CL_SUCCESS;
+    made.memory = clCreateBuffer(made.device->context, CL_MEM_READ_WRITE, bytes, nullptr, &status);
+    if (status != CL_SUCCESS)
+        return noteFailure(status, "clCreateBuffer", std::to_string(bytes) + " bytes");
+    made.size = made.capacity = bytes;
+    return CL_SUCCESS;
+}
+
+} // namespace
+
+cl_int HOpenCLBuffer::ensureBufferSize(std::size_t bytes) try {
+    const auto device = OpenQuarn::currentDevice();
+    if (!device) {
+        impl_.reset();
+        return CL_DEVICE_NOT_FOUND;
+    }
+    if (impl_ && (impl_->device != device || impl_->capacity < bytes))
+        impl_.reset();
+    if (impl_)
+        impl_->size = bytes;
+    if (impl_ || bytes == 0)
+        return CL_SUCCESS;
+    auto made = std::make_shared<Impl>();
+    made->device = device;
+    const cl_int status = allocate(*made, bytes);
+    if (status == CL_SUCCESS)
+        impl_ = std::move(made);
+    return status;
+} catch (const std::exception& error) {
+    impl_.reset();
+    return noteFailure(CL_OUT_OF_HOST_MEMORY, "a buffer", error.what());
+}
+
+HOpenCLEvent HOpenCLBuffer::bufferReadyEvent() const {
+    return impl_ ? impl_->ready : HOpenCLEvent();
+}
+
+void HOpenCLBuffer::setBufferReadyEvent(const HOpenCLEvent& event) {
+    if (impl_)
+        impl_->ready = event;
+}
+
+void HOpenCLBuffer::reset() noexcept {
+    impl_.reset();
+}

@@ -1,0 +1,120 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn/gpu/HOpenCLKernelInfo.h"
+
+#include "gpu/Device.h"
+#include "gpu/activity.h"
+#include "gpu/failure.h"
+#include "gpu/programs.h"
+#include "openquarn/gpu/HOpenCLUtils.h"
+
+#include <algorithm>
+#include <exception>
+#include <string>
+#include <utility>
+
+using OpenQuarn::noteFailure;
+
+struct HOpenCLKernelInfo::Impl {
+    Impl() = default;
+    ~Impl() {
+        if (kernel)
+            noteFailure(clReleaseKernel(kernel), "clReleaseKernel");
+    }
+    Impl(const Impl&) = delete;
+    Impl& operator=(const Impl&) = delete;
+
+    std::shared_ptr<const OpenQuarn::Program> program;
+    std::string name;
+    cl_kernel kernel = nullptr;
+    std::size_t localSize = 1;
+    std::size_t workItems = 0;
+
+    bool create(const std::string& file);
+    std::size_t globalSize() const { return (workItems + localSize - 1) / localSize * localSize; }
+};
+
+bool HOpenCLKernelInfo::Impl::create(const std::string& file) {
+    constexpr std::size_t usualLocalSize = 64; // a multiple of what the devices run at once
+    cl_int status = CL_SUCCESS;
+    kernel = clCreateKernel(program->id, name.c_str(), &status);
+    if (status != CL_SUCCESS) {
+        noteFailure(status, "clCreateKernel", "kernel \"" + name + "\" of " + file);
+        return false;
+    }
+    std::size_t largest = 0;
+    status = clGetKernelWorkGroupInfo(kernel, program->device->id, CL_KERNEL_WORK_GROUP_SIZE, sizeof largest, &largest,
+                                      nullptr);
+    localSize = std::clamp<std::size_t>(largest, 1, usualLocalSize);
+    return noteFailure(status, "clGetKernelWorkGroupInfo", name) == CL_SUCCESS;
+}
+
+HOpenCLKernelInfo::HOpenCLKernelInfo() noexcept = default;
+HOpenCLKernelInfo::~HOpenCLKernelInfo() = default;
+
+bool HOpenCLKernelInfo::loadOrUpdate(const HString& file, const HString& kernel, std::size_t workItems,
+                                     const HStringArray* includeDirectories) try {
+    auto program = OpenQuarn::loadProgram(file.asStdString(), includeDirectories);
+    if (!program) {
+        reset();
+        return false;
+    }
+    if (!impl_ || impl_->program != program || impl_->name != kernel.asStdString()) {
+        impl_ = std::make_unique<Impl>();
+        impl_->program = std::move(program);
+        impl_->name = kernel.asStdString();
+        if (!impl_->create(file.asStdString())) {
+            reset();
+            return false;
+        }
+    }
+    impl_->workItems = workItems;
+    return true;
+} catch (const std::exception& error) {
+    noteFailure(error.what());
+    reset();
+    return false;
+}
+
+bool HOpenCLKernelInfo::isLoaded() const noexcept {
+    return impl_ != nullptr;
+}
+cl_kernel HOpenCLKernelInfo::kernel() const noexcept {
+    return impl_ ? impl_->kernel : nullptr;
+}
+std::size_t HOpenCLKernelInfo::workItems() const noexcept {
+    return impl_ ? impl_->workItems : 0;
+}
+void HOpenCLKernelInfo::reset() noexcept {
+    impl_.reset();
+}
+
+void HOpenCLKernelInfo::setKernelArgBuffer(cl_uint index, const HOpenCLBuffer& buffer, cl_int& status, bool isValid) {
+    const cl_mem memory = isValid ? buffer.get() : nullptr;
+    HOpenCLUtils::setKernelArg(*this, index, sizeof memory, &memory, status);
+}
+
+cl_int HOpenCLKernelInfo::enqueueKernel(const HOpenCLEventList& waitFor, HOpenCLEvent* done) {
+    if (!impl_)
+        return noteFailure(CL_INVALID_KERNEL, "clEnqueueNDRangeKernel", "no kernel is loaded");
+    const OpenQuarn::Device& device = *impl_->program->device;
+    HOpenCLEvent ran;
+    if (impl_->workItems == 0) {
+        if (!done)
+            return CL_SUCCESS;
+        const cl_int status =
+            clEnqueueMarkerWithWaitList(device.queue, waitFor.length(), waitFor.data(), ran.receive());
+        *done = std::move(ran);
+        return noteFailure(status, "clEnqueueMarkerWithWaitList", impl_->name);
+    }
+    const std::size_t global = impl_->globalSize();
+    const bool isAsked = done || device.isTimed;
+    const cl_int status = clEnqueueNDRangeKernel(device.queue, impl_->kernel, 1, nullptr, &global, &impl_->localSize,
+                                                 waitFor.length(), waitFor.data(), isAsked ? ran.receive() : nullptr);
+    if (noteFailure(status, "clEnqueueNDRangeKernel", impl_->name) == CL_SUCCESS) {
+        OpenQuarn::countLaunch(impl_->name);
+        OpenQuarn::timeCommand(device, impl_->name, ran.get());
+    }
+    if (done)
+        *done = std::move(ran);
+    return status;
+}

@@ -1,0 +1,169 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "gpu/transfer.h"
+
+#include "core/Object.h"
+#include "geometry/forRanges.h"
+#include "gpu/Buffer.h"
+#include "gpu/Device.h"
+#include "gpu/activity.h"
+#include "gpu/failure.h"
+#include "openquarn/gpu/HOpenCLUtils.h"
+
+#include <cstring>
+#include <string>
+#include <utility>
+
+namespace OpenQuarn {
+namespace {
+
+using Buffer = HOpenCLBuffer::Impl;
+
+constexpr std::size_t bytesPerVertex = 3 * sizeof(float);
+
+Buffer& implOf(const HOpenCLBuffer& buffer) {
+    return *Access::impl(buffer);
+}
+
+cl_int write(Buffer& buffer, cl_bool isBlocking, std::size_t bytes, const void* data, HOpenCLEvent& written) {
+    return noteFailure(clEnqueueWriteBuffer(buffer.device->queue, buffer.memory, isBlocking, 0, bytes, data, 0, nullptr,
+                                            written.receive()),
+                       "clEnqueueWriteBuffer");
+}
+
+// What is large is not worth a second copy: the caller waits.
+cl_int writeOwnCopy(Buffer& buffer, std::size_t bytes, const void* data, HOpenCLEvent& written) {
+    constexpr std::size_t large = std::size_t{1} << 20U;
+    if (bytes > large)
+        return write(buffer, CL_TRUE, bytes, data, written);
+    std::byte* copy = buffer.takeCopy(bytes);
+    if (!copy)
+        return CL_OUT_OF_HOST_MEMORY;
+    std::memcpy(copy, data, bytes);
+    const cl_int status = write(buffer, CL_FALSE, bytes, copy, written);
+    buffer.copyRead = written;
+    return status;
+}
+
+cl_int writeAll(HOpenCLBuffer& buffer, std::string_view name, std::size_t bytes, const void* data, int mode) {
+    Buffer& impl = implOf(buffer);
+    HOpenCLEvent written;
+    const cl_int status = mode == HOpenCLUtils::kKeepData ? write(impl, CL_FALSE, bytes, data, written)
+                                                          : writeOwnCopy(impl, bytes, data, written);
+    if (status != CL_SUCCESS)
+        return status;
+    countUpload(name, bytes);
+    timeCommand(*impl.device, "upload", written.get());
+    impl.ready = std::move(written);
+    return CL_SUCCESS;
+}
+
+bool isUploadable(std::size_t bytes, const void* data, int mode) {
+    if (mode != HOpenCLUtils::kKeepData && mode != HOpenCLUtils::kCopyData)
+        noteFailure(CL_INVALID_VALUE, "upload", "mode " + std::to_string(mode));
+    else if (!data && bytes > 0)
+        noteFailure(CL_INVALID_VALUE, "upload", "no data for " + std::to_string(bytes) + " bytes");
+    else
+        return true;
+    return false;
+}
+
+// A buffer that is mapped, until it goes out of sight or is unmapped.
+class Mapped {
+public:
+    Mapped(const Buffer& buffer, cl_map_flags flags, std::size_t bytes, HOpenCLEvent* mapped)
+        : buffer_(buffer) {
+        const HOpenCLEventList waitFor = {buffer.ready};
+        cl_int status = CL_SUCCESS;
+        at_ = clEnqueueMapBuffer(buffer.device->queue, buffer.memory, CL_TRUE, flags, 0, bytes, waitFor.length(),
+                                 waitFor.data(), mapped ? mapped->receive() : nullptr, &status);
+        status_ = noteFailure(status, "clEnqueueMapBuffer", flags == CL_MAP_READ ? "download" : "upload");
+    }
+    Mapped(const Mapped&) = delete;
+    Mapped& operator=(const Mapped&) = delete;
+
+    cl_int status() const { return status_; }
+    float* floats() const { return static_cast<float*>(at_); }
+    cl_int unmap(HOpenCLEvent* done) {
+        return noteFailure(clEnqueueUnmapMemObject(buffer_.device->queue, buffer_.memory, at_, 0, nullptr,
+                                                   done ? done->receive() : nullptr),
+                           "clEnqueueUnmapMemObject");
+    }
+
+private:
+    const Buffer& buffer_;
+    void* at_ = nullptr;
+    cl_int status_ = CL_SUCCESS;
+};
+
+cl_int writePositions(const Positions& positions, Buffer& buffer) {
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    Mapped mapped(buffer, CL_MAP_WRITE_INVALIDATE_REGION, bytes, nullptr);
+    if (mapped.status() != CL_SUCCESS)
+        return mapped.status();
+    const double* from = positions.xyz();
+    float* to = mapped.floats();
+    forRanges(positions.vertexCount(), [=](std::size_t begin, std::size_t end) {
+        for (std::size_t i = 3 * begin; i < 3 * end; ++i)
+            to[i] = static_cast<float>(from[i]);
+    });
+    HOpenCLEvent written;
+    const cl_int status = mapped.unmap(&written);
+    if (status != CL_SUCCESS)
+        return status;
+    countUpload("positions", bytes);
+    timeCommand(*buffer.device, "upload", written.get());
+    buffer.ready = std::move(written);
+    return CL_SUCCESS;
+}
+
+cl_int readPositions(const Buffer& buffer, Positions& positions) {
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    HOpenCLEvent read;
+    Mapped mapped(buffer, CL_MAP_READ, bytes, buffer.device->isTimed ? &read : nullptr);
+    if (mapped.status() != CL_SUCCESS)
+        return mapped.status();
+    const float* from = mapped.floats();
+    double* to = positions.xyz();
+    forRanges(positions.vertexCount(), [=](std::size_t begin, std::size_t end) {
+        for (std::size_t i = 3 * begin; i < 3 * end; ++i)
+            to[i] = from[i];
+    });
+    countDownload(bytes);
+    timeCommand(*buffer.device, "download", read.get());
+    return mapped.unmap(nullptr);
+}
+
+} // namespace
+
+cl_int uploadNamed(std::string_view name, std::size_t bytes, const void* data, HOpenCLBuffer& buffer, int mode) {
+    cl_int status = isUploadable(bytes, data, mode) ? buffer.ensureBufferSize(bytes) : CL_INVALID_VALUE;
+    if (status == CL_SUCCESS && bytes > 0)
+        status = writeAll(buffer, name, bytes, data, mode);
+    else if (status == CL_SUCCESS)
+        buffer.setBufferReadyEvent({});
+    if (status != CL_SUCCESS)
+        buffer.reset();
+    return status;
+}
+
+cl_int uploadPositions(const Positions& positions, HOpenCLBuffer& buffer) {
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    cl_int status = buffer.ensureBufferSize(bytes);
+    if (status == CL_SUCCESS && bytes > 0)
+        status = writePositions(positions, implOf(buffer));
+    if (status != CL_SUCCESS)
+        buffer.reset();
+    return status;
+}
+
+cl_int downloadPositions(const HOpenCLBuffer& buffer, Positions& positions) {
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    if (bytes == 0)
+        return CL_SUCCESS;
+    if (buffer.bufferSize() < bytes)
+        return noteFailure(CL_INVALID_BUFFER_SIZE, "download",
+                           std::to_string(bytes) + " bytes from a buffer of " + std::to_string(buffer.bufferSize()));
+    return readPositions(implOf(buffer), positions);
+}
+
+} // namespace OpenQuarn
