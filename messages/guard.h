@@ -13,6 +13,8 @@ namespace neuralWarp {
 /// The status of the exception that is being handled, for an operation of a node: kInsufficientMemory for a lack of
 /// memory, else kFailure with "node 'NAME', OPERATION: WHAT". [any]
 HStatus statusOfException(const HPxNode& node, const char* operation) noexcept;
+/// The same for an operation of something that is no node: "OPERATION: WHAT". [any]
+HStatus statusOfException(const char* operation) noexcept;
 
 /// Runs `body`, which returns a status; what it throws becomes one. [any]
 template <class Body>

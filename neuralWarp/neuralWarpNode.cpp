@@ -165,6 +165,11 @@ HObject neuralWarpNode::getNamedBuffer(const HString& name, unsigned multiIndex)
     return buffer;
 }
 
+void neuralWarpNode::primingAttributes(HObjectArray& attributes) const {
+    for (const HObject& attribute : {modelActive, targetMorphEnabled, targetMorphEnvelope})
+        attributes.append(attribute);
+}
+
 HStatus neuralWarpNode::setExportActive(std::uint32_t multiIndex, bool active) {
     return guarded(*this, "switching export mode", [&]() -> HStatus {
         HDataBlock block = forceCache();

@@ -46,6 +46,9 @@ public:
     /// A copy of one of the geometry's buffers, by its name (namedBuffers.h); null without such a name or geometry.
     /// [eval]
     HObject getNamedBuffer(const HString& name, unsigned multiIndex) override;
+    /// What decides whether the model is applied, which the GPU deformer takes from the last evaluation on the CPU.
+    /// [eval]
+    void primingAttributes(HObjectArray& attributes) const override;
 
     // --- what the command calls ---
 

@@ -5,6 +5,7 @@
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
 #include "neuralWarp/blend.h"
+#include "neuralWarp/checkOutputs.h"
 #include "neuralWarp/deltas.h"
 #include "neuralWarp/neuralWarpNode.h"
 #include "neuralWarp/neuralWarpUtils.h"
@@ -17,10 +18,6 @@
 namespace neuralWarp {
 namespace {
 
-bool usesPrincipalShapes(const neuralWarpData& data) {
-    return data.principalShapeCount != 0 && data.principalVertCount != 0;
-}
-
 HStatus noDeltas(const std::string& reason) {
     raiseMessage<Text::kErrorMLModelNoDeltas>(displayErrorGated);
     return {HStatus::kFailure, reason};
@@ -32,20 +29,21 @@ HStatus tooFewDeltas(std::size_t predicted, std::size_t needed) {
             "the model gives " + std::to_string(predicted) + " deltas where " + std::to_string(needed) + " are needed"};
 }
 
-/// A failure, which the user is told of, when what the network gave, or the basis of shapes, does not reach the highest
-/// slot that a vertex is driven from.
-HStatus checkOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {
-    if (outputs.empty())
+/// A failure, which the user is told of, when there is not enough to drive every vertex from.
+HStatus requireOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {
+    const OutputCheck check = checkOutputs(data, outputs.size());
+    switch (check.outcome) {
+    case Outputs::kEnough:
+        break;
+    case Outputs::kNone:
         return noDeltas("the model gave no values: " + data.session.errorText());
-    const std::size_t slots = data.slotCount();
-    if (!usesPrincipalShapes(data))
-        return outputs.size() / 3 >= slots ? HStatus() : tooFewDeltas(outputs.size() / 3, slots);
-    const auto shapes = static_cast<std::size_t>(data.principalShapeCount);
-    if (outputs.size() < shapes)
-        return noDeltas("the model gives " + std::to_string(outputs.size()) + " coefficients for " +
-                        std::to_string(shapes) + " principal shapes");
-    const std::size_t covered = data.principalShapes.size() / 3 / shapes;
-    return covered >= slots ? HStatus() : tooFewDeltas(covered, slots);
+    case Outputs::kTooFewCoefficients:
+        return noDeltas("the model gives " + std::to_string(check.has) + " coefficients for " +
+                        std::to_string(check.needed) + " principal shapes");
+    case Outputs::kTooFewDeltas:
+        return tooFewDeltas(check.has, check.needed);
+    }
+    return HStatus::kSuccess;
 }
 
 void extractDeltas(Points& deltas, const neuralWarpData& data, const std::vector<float>& outputs,
@@ -165,7 +163,7 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
     const std::size_t count = data.componentMap.affectCount();
     if (points.size() != count)
         return misfit("the input geometry", points.size(), count);
-    if (HStatus status = checkOutputs(data, outputs); status.error())
+    if (HStatus status = requireOutputs(data, outputs); status.error())
         return status;
     data.endPhase(Phase::points);
     result.resize(count);

@@ -7,7 +7,9 @@
 #include "messages/catalogue.h"
 #include "neuralWarp/neuralWarpCmd.h"
 #include "neuralWarp/neuralWarpNode.h"
+#include "neuralWarp/neuralWarpNodeGPUDeformerInfo.h"
 #include "openquarn/HFnPlugin.h"
+#include "openquarn/gpu/HGPUDeformerRegistry.h"
 
 #include <initializer_list>
 
@@ -60,6 +62,17 @@ HStatus registerDeformer(HFnPlugin& plugin) {
     return registerNode<neuralWarpNode>(plugin, HPxNode::kDeformerNode);
 }
 
+HStatus registerGPUDeformer(HFnPlugin&) {
+    return HGPUDeformerRegistry::registerGPUDeformerCreator(neuralWarpNode::typeName,
+                                                            neuralWarpNodeGPUDeformerInfo::registrantId,
+                                                            &neuralWarpNodeGPUDeformerInfo::instance());
+}
+
+HStatus deregisterGPUDeformer(HFnPlugin&) {
+    return HGPUDeformerRegistry::deregisterGPUDeformerCreator(neuralWarpNode::typeName,
+                                                              neuralWarpNodeGPUDeformerInfo::registrantId);
+}
+
 HStatus registerDeformerCommand(HFnPlugin& plugin) {
     return plugin.registerCommand(neuralWarpCmd::commandName, neuralWarpCmd::create, neuralWarpCmd::makeSyntax);
 }
@@ -79,6 +92,7 @@ HStatus registerPlugin(HObject object) {
     return runSteps(plugin, {
                                 {"registerData neuralWarpData", registerStateData},
                                 {"registerNode neuralWarp", registerDeformer},
+                                {"registerGPUDeformerCreator neuralWarp", registerGPUDeformer},
                                 {"registerCommand neuralWarp", registerDeformerCommand},
                                 {"registerUIStrings neuralWarp", registerTexts, true},
                                 {"registerNode controlCollectorNode", registerControl<controlCollectorNode>},
@@ -93,6 +107,7 @@ HStatus deregisterPlugin(HObject object) {
                                 {"deregisterNode matrixConverterNode", deregisterNode<matrixConverterNode>},
                                 {"deregisterNode orthoAxisFromMatrixArray", deregisterNode<orthoAxisFromMatrixArray>},
                                 {"deregisterNode controlCollectorNode", deregisterNode<controlCollectorNode>},
+                                {"deregisterGPUDeformerCreator neuralWarp", deregisterGPUDeformer},
                                 {"deregisterNode neuralWarp", deregisterNode<neuralWarpNode>},
                                 {"deregisterData neuralWarpData", deregisterStateData},
                                 {"deregisterCommand neuralWarp", deregisterDeformerCommand},

@@ -7,9 +7,9 @@
 
 namespace neuralWarp {
 
-/// Registers the data type, the deformer, the command, the message catalogue and the control nodes, in this order. The
-/// first step that fails is printed and returned, and nothing after it is tried; only the catalogue may fail: its texts
-/// then show as they are written in the code. [main]
+/// Registers the data type, the deformer, its GPU deformer, the command, the message catalogue and the control nodes,
+/// in this order. The first step that fails is printed and returned, and nothing after it is tried; only the catalogue
+/// may fail: its texts then show as they are written in the code. [main]
 HStatus registerPlugin(HObject plugin);
 
 /// Deregisters all of it but the catalogue, until a step fails, which is printed and returned. [main]

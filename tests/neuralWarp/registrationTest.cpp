@@ -34,6 +34,7 @@ struct Step {
 constexpr Step registering[] = {
     {"registerData neuralWarpData", "HFnPlugin::registerData", 1, "data neuralWarpData"},
     {"registerNode neuralWarp", "HFnPlugin::registerNode", 1, "node neuralWarp"},
+    {"registerGPUDeformerCreator neuralWarp", "HGPUDeformerRegistry::registerGPUDeformerCreator", 1, "GPU neuralWarp"},
     {"registerCommand neuralWarp", "HFnPlugin::registerCommand", 1, "command neuralWarp"},
     {"registerUIStrings neuralWarp", "HFnPlugin::registerUIStrings", 1, nullptr},
     {"registerNode controlCollectorNode", "HFnPlugin::registerNode", 2, "node controlCollector"},
@@ -45,6 +46,8 @@ constexpr Step deregistering[] = {
     {"deregisterNode matrixConverterNode", "HFnPlugin::deregisterNode", 1, "node matrixConverter"},
     {"deregisterNode orthoAxisFromMatrixArray", "HFnPlugin::deregisterNode", 2, "node orthoAxisFromMatrixArray"},
     {"deregisterNode controlCollectorNode", "HFnPlugin::deregisterNode", 3, "node controlCollector"},
+    {"deregisterGPUDeformerCreator neuralWarp", "HGPUDeformerRegistry::deregisterGPUDeformerCreator", 1,
+     "GPU neuralWarp"},
     {"deregisterNode neuralWarp", "HFnPlugin::deregisterNode", 4, "node neuralWarp"},
     {"deregisterData neuralWarpData", "HFnPlugin::deregisterData", 1, "data neuralWarpData"},
     {"deregisterCommand neuralWarp", "HFnPlugin::deregisterCommand", 1, "command neuralWarp"},
@@ -60,6 +63,7 @@ Names registered() {
     add("data", info.dataTypes);
     add("node", info.nodeTypes);
     add("command", info.commands);
+    add("GPU", info.gpuDeformers);
     return items;
 }
 
