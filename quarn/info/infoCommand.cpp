@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/commands.h"
 
+#include "openquarn_app/Gpu.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/SceneFile.h"
 #include "quarn/console/StdoutAside.h"
@@ -121,8 +122,37 @@ void printText(const SceneSummary& summary, const OpenedScene& opened) {
 struct Options {
     fs::path path, scene, controls, outputs;
     std::string deformer, geometry;
-    bool json = false;
+    bool json = false, devices = false;
 };
+
+void showDevices(bool asJson) {
+    const std::vector<OpenQuarn::GpuDevice> devices = OpenQuarn::Gpu::devices();
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartArray();
+    for (const OpenQuarn::GpuDevice& device : devices) {
+        writer.StartObject();
+        writeText(writer, "name", device.name);
+        writeText(writer, "platform", device.platform);
+        writeText(writer, "driver", device.driver);
+        writeBool(writer, "gpu", device.isGpu);
+        writeBool(writer, "doubles", device.hasDoubles);
+        writer.Key("memory");
+        writer.Uint64(device.memory);
+        writer.EndObject();
+    }
+    writer.EndArray();
+    if (asJson) {
+        std::cout << buffer.GetString() << '\n';
+        return;
+    }
+    for (std::size_t i = 0; i < devices.size(); ++i)
+        std::cout << i << ": " << devices[i].name << (devices[i].isGpu ? ", a GPU" : "") << " of "
+                  << devices[i].platform << ", driver " << devices[i].driver << ", " << (devices[i].memory >> 20U)
+                  << " MiB" << (devices[i].hasDoubles ? "" : ", without doubles") << '\n';
+    if (devices.empty())
+        std::cout << "no OpenCL device: deformers run on the CPU\n";
+}
 
 void showScene(const Options& options) {
     const SceneSummary summary = OpenQuarn::readSummary(options.path);
@@ -183,6 +213,10 @@ void showModel(const Options& options) {
 
 void showInfo(const Options& options) {
     watchForInterrupt();
+    if (options.devices)
+        return showDevices(options.json);
+    if (options.path.empty())
+        throw std::runtime_error("quarn info needs the path of a scene file or a model directory, or --devices");
     if (fs::is_directory(options.path))
         return showModel(options);
     if (!options.scene.empty() || !options.controls.empty())
@@ -195,7 +229,8 @@ void showInfo(const Options& options) {
 void addInfoCommand(CLI::App& app) {
     const auto options = std::make_shared<Options>();
     CLI::App* info = app.add_subcommand("info", "Show what is in a scene file or a model directory");
-    info->add_option("PATH", options->path, "The scene file, or the directory NAME.nwrp of a model")->required();
+    info->add_option("PATH", options->path, "The scene file, or the directory NAME.nwrp of a model");
+    info->add_flag("--devices", options->devices, "List the OpenCL devices that quarn play --evaluator gpu can use");
     info->add_option("--scene", options->scene, "Tell whether the model fits the deformer of this scene");
     info->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     info->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/commands.h"
 
-#include "openquarn_app/Plugins.h"
 #include "quarn/console/Console.h"
 #include "quarn/console/StdoutAside.h"
 #include "quarn/console/interrupt.h"
+#include "quarn/play/evaluator.h"
 #include "quarn/play/playReport.h"
 #include "quarn/play/playing.h"
 #include "quarn/scene/SceneSession.h"
@@ -17,7 +17,6 @@
 
 #include <CLI/CLI.hpp>
 
-#include <algorithm>
 #include <iostream>
 #include <stdexcept>
 
@@ -30,7 +29,7 @@ struct Options {
     SceneOptions scene;
     Console console;
     std::string deformer, geometry, plug, model, frames, against;
-    std::string order = "scene", evaluator = "cpu";
+    std::string order = "scene", evaluator = "cpu", device;
     fs::path output, trace;
     int repeats = 1;
 };
@@ -41,21 +40,6 @@ std::optional<Warp> warpFor(const Options& options) {
     if (!isNeeded && nodesOfType("neuralWarp").empty())
         return {};
     return Warp::find(options.deformer);
-}
-
-void requireEvaluator(const Options& options) {
-    if (options.evaluator != "gpu")
-        return;
-    const auto hasOne = [](const std::string& plugin) {
-        const std::vector<std::string> types = OpenQuarn::pluginInfo(plugin).gpuDeformers;
-        return std::find(types.begin(), types.end(), "neuralWarp") != types.end();
-    };
-    const std::vector<std::string> plugins = OpenQuarn::loadedPlugins();
-    const bool isRegistered = std::any_of(plugins.begin(), plugins.end(), hasOne);
-    throw std::runtime_error(isRegistered
-                                 ? "quarn play cannot evaluate on the GPU yet: use --evaluator cpu"
-                                 : "no loaded plug-in registers a GPU deformer for neuralWarp: use --evaluator cpu, or "
-                                   "load a plug-in that does with --plugin");
 }
 
 void chooseModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
@@ -99,7 +83,7 @@ void addOrder(PlayPlan& plan, const std::string& order, const std::string& meshN
 }
 
 PlayPlan planFor(const Options& options) {
-    requireEvaluator(options);
+    chooseEvaluator(options.evaluator, options.device);
     const std::optional<Warp> warp = warpFor(options);
     const bool isDeformed = options.plug.empty() || !options.geometry.empty() || !options.model.empty();
     const WarpGeometry* const geometry = warp && isDeformed ? &warp->geometry(options.geometry) : nullptr;
@@ -109,6 +93,7 @@ PlayPlan planFor(const Options& options) {
     plan.repeats = options.repeats;
     plan.output = options.output;
     plan.trace = options.trace;
+    plan.isOnGpu = options.evaluator == "gpu";
     if (geometry != nullptr)
         chooseModel(*warp, *geometry, options.model);
     addComparison(plan, options, warp ? &*warp : nullptr, geometry);
@@ -158,6 +143,10 @@ void addMeasureOptions(CLI::App& command, Options& options) {
     command.add_option("--evaluator", options.evaluator, "Where deformers run")
         ->check(CLI::IsMember({"cpu", "gpu"}))
         ->capture_default_str();
+    command
+        .add_option("--device", options.device,
+                    "OpenCL device: its number or a part of its name (quarn info --devices)")
+        ->type_name("DEVICE");
     command.add_option("--profile", options.trace, "Record, and write a trace for Perfetto or chrome://tracing")
         ->type_name("FILE");
     command.add_option("--repeat", options.repeats, "Play so many times, and time all but the first")

@@ -47,6 +47,14 @@ void printDistances(std::ostream& out, const char* what, const Comparison& compa
     out << " at vertex " << distances.worstVertex() << " in frame " << distances.worstFrame() << '\n';
 }
 
+void printGpu(std::ostream& out, const GpuUse& gpu) {
+    out << "GPU: " << gpu.onGpu << " deformations on " << (gpu.device.empty() ? "no device" : gpu.device) << ", "
+        << gpu.onCpu << " on the CPU";
+    if (gpu.fallbacks > 0)
+        out << ", " << gpu.fallbacks << " of them since the GPU failed";
+    out << '\n';
+}
+
 void number(JsonWriter& json, const char* key, double value) {
     json.Key(key);
     json.Double(value);
@@ -67,6 +75,18 @@ void writeTimes(JsonWriter& json, const PlayResult& result) {
     json.StartObject();
     for (const auto& [name, seconds] : result.phases)
         number(json, name.c_str(), percentileOf(seconds, 0.5) * inMilliseconds);
+    json.EndObject();
+}
+
+void writeGpu(JsonWriter& json, const std::optional<GpuUse>& gpu) {
+    json.Key("gpu");
+    if (!gpu)
+        return static_cast<void>(json.Null());
+    json.StartObject();
+    writeText(json, "device", gpu->device);
+    whole(json, "onGpu", static_cast<std::int64_t>(gpu->onGpu));
+    whole(json, "onCpu", static_cast<std::int64_t>(gpu->onCpu));
+    whole(json, "fallbacks", static_cast<std::int64_t>(gpu->fallbacks));
     json.EndObject();
 }
 
@@ -101,6 +121,8 @@ std::string playText(const PlayResult& result, const FrameRange& frames, double 
         << times.count() << " frames timed: " << framesPerSecond(times) << " frames a second, median "
         << times.median() * inMilliseconds << " ms, p99 " << times.percentile(0.99) * inMilliseconds << " ms, worst "
         << times.percentile(1.0) * inMilliseconds << " ms in frame " << times.worstFrame() << '\n';
+    if (result.gpu)
+        printGpu(out, *result.gpu);
     for (const auto& [name, seconds] : result.phases)
         out << "  " << name << ": median " << percentileOf(seconds, 0.5) * inMilliseconds << " ms\n";
     if (!result.mesh)
@@ -128,6 +150,7 @@ std::string playJson(const PlayResult& result, const FrameRange& frames, double 
     whole(json, "vertices", static_cast<std::int64_t>(result.vertexCount));
     whole(json, "framesTimed", static_cast<std::int64_t>(result.times.count()));
     writeTimes(json, result);
+    writeGpu(json, result.gpu);
     writeComparison(json, "distance", result.mesh, scale);
     writeComparison(json, "before", result.before, scale);
     if (result.mesh) {

@@ -43,6 +43,8 @@ public:
             files_->finish();
         if (!plan_.trace.empty())
             result_.phases = writeTraceAndReadPhases(plan_.trace);
+        if (plan_.isOnGpu)
+            result_.gpu = gpuUse();
         return std::move(result_);
     }
 

@@ -6,6 +6,7 @@
 #include "quarn/play/Distances.h"
 #include "quarn/play/FrameTimes.h"
 #include "quarn/play/VertexOrder.h"
+#include "quarn/play/evaluator.h"
 #include "quarn/scene/frames.h"
 
 #include <filesystem>
@@ -27,6 +28,7 @@ struct PlayPlan {
     int repeats = 1;                        ///< above 0; the first is not timed where there are several
     std::filesystem::path output;           ///< pattern as for FrameFiles; empty: nothing is written
     VertexOrder order;                      ///< of what is written
+    bool isOnGpu = false;                   ///< chooseEvaluator() was told so
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none
     HPlug before;                           ///< compared as well, where there is `against`; may be null
@@ -43,6 +45,7 @@ struct PlayResult {
     std::size_t vertexCount = 0;
     FrameTimes times;
     std::map<std::string, std::vector<double>> phases; ///< seconds; only with a trace
+    std::optional<GpuUse> gpu;                         ///< none: the GPU was not asked for
     std::optional<Comparison> mesh, before;
     Jitter targetJitter;
     double boxDiagonal = 0.0; ///< 0 without a comparison

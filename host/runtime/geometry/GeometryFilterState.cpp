@@ -2,6 +2,7 @@
 #include "geometry/GeometryFilterState.h"
 
 #include "geometry/filterAttributes.h"
+#include "gpu/GpuGeometry.h"
 #include "graph/arrayLock.h"
 #include "graph/values.h"
 
@@ -54,6 +55,9 @@ bool GeometrySources::sameAs(const GeometrySources& other) const {
 
 // --- GeometryState ---
 
+GeometryState::GeometryState() = default;
+GeometryState::~GeometryState() = default;
+
 std::shared_ptr<const IndexMap> GeometryState::affectedVertices(const MeshData& mesh,
                                                                 const std::shared_ptr<Data>& expression) {
     const std::scoped_lock lock(mutex_);
@@ -95,6 +99,7 @@ const float* GeometryState::weights(const Slot* list, const std::shared_ptr<cons
             }
         }
         weightsMap_ = affected;
+        ++weightsVersion_;
     }
     return weights_.empty() ? nullptr : weights_.data();
 }
@@ -107,6 +112,26 @@ void GeometryFilterState::changed(Slot& slot) {
         weightsChanged(slot);
     if (slot.field.attribute == attributes.inputGeometry || slot.field.attribute == attributes.input)
         makeOutputs(slot);
+}
+
+// what belongs to one geometry is known of the host's own attributes only
+void GeometryFilterState::edited(Slot& slot) {
+    const FilterAttributes& attributes = filterAttributes();
+    const Slot* element = nullptr;
+    for (const auto* own :
+         {&attributes.input, &attributes.originalGeometry, &attributes.weightList, &attributes.outputGeom})
+        if (isAtOrBelow(slot, **own))
+            element = outermostElement(slot);
+    const std::scoped_lock lock(mutex_);
+    for (const auto& [index, geometry] : geometries_)
+        if (geometry->gpu && (!element || element->index == index))
+            geometry->gpu->isPrimed = false;
+}
+
+void GeometryFilterState::takeFromDevice() {
+    const std::scoped_lock lock(mutex_);
+    for (const auto& [index, geometry] : geometries_)
+        geometry->gpu.reset();
 }
 
 void GeometryFilterState::connectionsChanged() {

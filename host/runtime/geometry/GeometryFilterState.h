@@ -11,6 +11,8 @@
 
 namespace OpenQuarn {
 
+class GpuGeometry;
+
 /// What a geometry's first state was built from: when it is no longer the same, the plug-in builds it anew.
 struct GeometrySources {
     std::weak_ptr<Slot> inputConnection, restConnection; ///< the plugs it comes from; empty for none
@@ -26,6 +28,11 @@ struct GeometrySources {
 /// Thread: the one that evaluates the geometry, or main; affectedVertices() any.
 class GeometryState {
 public:
+    GeometryState();
+    ~GeometryState();
+    GeometryState(const GeometryState&) = delete;
+    GeometryState& operator=(const GeometryState&) = delete;
+
     /// The vertices that an expression (text data, or null) stands for on a mesh; the last answer is kept. Null when
     /// there is no such component tag.
     std::shared_ptr<const IndexMap> affectedVertices(const MeshData& mesh, const std::shared_ptr<Data>& expression);
@@ -39,8 +46,11 @@ public:
     /// is up to date; null for none.
     const float* weights(const Slot* list, const std::shared_ptr<const IndexMap>& affected);
     void weightsChanged() { weightsMap_ = nullptr; }
+    /// Another one after each time that weights() gathered them anew; above 0.
+    std::uint64_t weightsVersion() const { return weightsVersion_; }
 
     const std::shared_ptr<PositionPool> pool = std::make_shared<PositionPool>();
+    std::unique_ptr<GpuGeometry> gpu; ///< null: not evaluated yet since the pipeline is on
 
 private:
     std::mutex mutex_; // of the three below
@@ -51,6 +61,7 @@ private:
     bool initialized_ = false;
     GeometrySources sources_;
     std::vector<float> weights_;
+    std::uint64_t weightsVersion_ = 1;
     std::shared_ptr<const IndexMap> weightsMap_; // what the weights were gathered for; null: not up to date
 };
 
@@ -59,10 +70,13 @@ public:
     explicit GeometryFilterState(NodeData& data)
         : data_(data) {}
     void changed(Slot& slot) override;
+    void edited(Slot& slot) override;
     void connectionsChanged() override;
 
     /// Made when there is none yet. Thread: any.
     std::shared_ptr<GeometryState> geometry(unsigned index);
+    /// Takes all geometries from the device. Thread: main, outside of evaluations.
+    void takeFromDevice();
     /// Forgets a geometry that has no input any more. Thread: any.
     void forget(unsigned index);
 

@@ -3,6 +3,7 @@
 
 #include "geometry/GeometryPoints.h"
 #include "geometry/filterAttributes.h"
+#include "gpu/pipeline.h"
 #include "graph/Context.h"
 #include "graph/evaluation.h"
 #include "graph/values.h"
@@ -62,9 +63,11 @@ public:
 
     HStatus run(const Slot& input, const std::shared_ptr<MeshData>& mesh, Slot& output) {
         HStatus status;
-        const std::shared_ptr<const IndexMap> affected = resolve(*state_, input, *mesh, status);
-        if (affected)
-            status = initialize(sources(input, *mesh, affected));
+        std::optional<GeometrySources> sources = sourcesOf(data_, index_, input, *mesh, status);
+        if (!sources)
+            return status;
+        const std::shared_ptr<const IndexMap> affected = sources->affected;
+        status = initialize(std::move(*sources));
         if (status.error())
             return status;
         GeometryPoints points(mesh, affected, state_->pool);
@@ -75,22 +78,6 @@ public:
     }
 
 private:
-    GeometrySources sources(const Slot& input, const MeshData& mesh, const std::shared_ptr<const IndexMap>& affected) {
-        GeometrySources now;
-        const std::shared_ptr<Slot> rest = elementOf(data_, *filterAttributes().originalGeometry, index_);
-        const std::shared_ptr<MeshData> restMesh = evaluatedMesh(rest);
-        now.inputConnection = connectionInto(childOf(input, *filterAttributes().inputGeometry).get());
-        now.restConnection = connectionInto(rest.get());
-        now.input = mesh.topology;
-        if (restMesh) {
-            now.rest = restMesh->topology;
-            now.restPoints = restMesh->points;
-        }
-        now.expression = textIn(*childOf(input, *filterAttributes().componentTagExpression));
-        now.affected = affected;
-        return now;
-    }
-
     HStatus initialize(GeometrySources now) {
         if (state_->isStale(now)) {
             state_->notInitialized();
@@ -118,19 +105,56 @@ private:
 
 } // namespace
 
+std::optional<GeometrySources> sourcesOf(const NodeData& data, unsigned index, const Slot& input, const MeshData& mesh,
+                                         HStatus& status) {
+    GeometrySources now;
+    now.affected = resolve(*filterStateOf(data).geometry(index), input, mesh, status);
+    if (!now.affected)
+        return {};
+    const std::shared_ptr<Slot> rest = elementOf(data, *filterAttributes().originalGeometry, index);
+    const std::shared_ptr<MeshData> restMesh = evaluatedMesh(rest);
+    now.inputConnection = connectionInto(childOf(input, *filterAttributes().inputGeometry).get());
+    now.restConnection = connectionInto(rest.get());
+    now.input = mesh.topology;
+    if (restMesh) {
+        now.rest = restMesh->topology;
+        now.restPoints = restMesh->points;
+    }
+    now.expression = textIn(*childOf(input, *filterAttributes().componentTagExpression));
+    return now;
+}
+
+namespace {
+
+HStatus evaluateOnCpu(HPxGeometryFilter& filter, NodeData& data, HDataBlock& block, Slot& output, bool deviceFailed) {
+    const CpuOnly cpuOnly(deviceFailed);
+    const FilterAttributes& attributes = filterAttributes();
+    const unsigned index = output.index;
+    const std::shared_ptr<Slot> input = elementOf(data, *attributes.input, index);
+    const std::shared_ptr<MeshData> mesh = input ? evaluatedMesh(childOf(*input, *attributes.inputGeometry)) : nullptr;
+    output.data = mesh; // what stays when something fails
+    if (!mesh) {
+        filterStateOf(data).forget(index);
+        return HStatus::kSuccess;
+    }
+    HStatus status = Evaluation(filter, data, block, index).run(*input, mesh, output);
+    evaluatedOnCpu(data, block, index, status, deviceFailed);
+    return status;
+}
+
+} // namespace
+
 HStatus evaluateGeometry(HPxGeometryFilter& filter, NodeData& data, HDataBlock& block, unsigned index) {
     const FilterAttributes& attributes = filterAttributes();
     const std::shared_ptr<Slot> output = elementOf(data, *attributes.outputGeom, index);
     if (!output)
         return {HStatus::kFailure, "'" + data.node.name() + ".outputGeom[" + std::to_string(index) + "]' is not there"};
-    const std::shared_ptr<Slot> input = elementOf(data, *attributes.input, index);
-    const std::shared_ptr<MeshData> mesh = input ? evaluatedMesh(childOf(*input, *attributes.inputGeometry)) : nullptr;
-    output->data = mesh; // what stays when something fails
+    bool deviceFailed = false;
     HStatus status;
-    if (mesh)
-        status = Evaluation(filter, data, block, index).run(*input, mesh, *output);
+    if (const std::shared_ptr<MeshData> deformed = evaluateOnDevice(data, index, deviceFailed))
+        output->data = deformed;
     else
-        filterStateOf(data).forget(index);
+        status = evaluateOnCpu(filter, data, block, *output, deviceFailed);
     output->markClean();
     return status;
 }

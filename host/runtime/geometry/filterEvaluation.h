@@ -5,7 +5,15 @@
 #include "geometry/GeometryFilterState.h"
 #include "openquarn/HPxGeometryFilter.h"
 
+#include <optional>
+
 namespace OpenQuarn {
+
+/// What the first state of a geometry would be built from now, on a mesh with these polygons and tags that comes in;
+/// evaluates its rest geometry. None, with a status that names node, geometry and tag, when the component tag is
+/// unknown. Thread: as below.
+std::optional<GeometrySources> sourcesOf(const NodeData& data, unsigned index, const Slot& input, const MeshData& mesh,
+                                         HStatus& status);
 
 /// Computes one element of outputGeom. Thread: one that evaluates, which holds the lock of the graph.
 HStatus evaluateGeometry(HPxGeometryFilter& filter, NodeData& data, HDataBlock& block, unsigned index);

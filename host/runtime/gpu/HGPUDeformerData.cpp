@@ -3,39 +3,46 @@
 
 #include "core/threads.h"
 
-#include <algorithm>
+#include <utility>
 
-struct HGPUDeformerData::Entry {
-    HPlug plug;
-    HString name;
-    HOpenCLBuffer buffer;
-
-    bool isFor(const HPlug& otherPlug, const HString& otherName) const {
-        return name == otherName && plug == otherPlug;
-    }
-};
+using OpenQuarn::requireEval;
 
 HGPUDeformerData::HGPUDeformerData() = default;
 HGPUDeformerData::~HGPUDeformerData() = default;
 
-HOpenCLBuffer HGPUDeformerData::getBuffer(const HPlug& plug, const HString& name) const {
-    OpenQuarn::requireEval("HGPUDeformerData::getBuffer");
-    const auto found =
-        std::find_if(entries_.begin(), entries_.end(), [&](const Entry& entry) { return entry.isFor(plug, name); });
-    return found == entries_.end() ? HOpenCLBuffer() : found->buffer;
+HOpenCLBuffer HGPUDeformerData::getBuffer(const HPlug& plug, const HString& name, cl_int* status) const {
+    requireEval("HGPUDeformerData::getBuffer");
+    cl_int outcome = CL_SUCCESS;
+    HOpenCLBuffer buffer;
+    for (const Entry& entry : entries_)
+        if (entry.plug == plug && entry.name == name)
+            buffer = entry.supplier ? entry.supplier(outcome) : entry.buffer;
+    if (status)
+        *status = outcome;
+    return buffer;
+}
+
+HGPUDeformerData::Entry& HGPUDeformerData::entryOf(const HPlug& plug, const HString& name) {
+    for (Entry& entry : entries_)
+        if (entry.plug == plug && entry.name == name)
+            return entry;
+    entries_.push_back({plug, name, {}, {}});
+    return entries_.back();
 }
 
 void HGPUDeformerData::setBuffer(const HPlug& plug, const HString& name, const HOpenCLBuffer& buffer) {
-    OpenQuarn::requireEval("HGPUDeformerData::setBuffer");
-    const auto found =
-        std::find_if(entries_.begin(), entries_.end(), [&](const Entry& entry) { return entry.isFor(plug, name); });
-    if (found == entries_.end())
-        entries_.push_back({plug, name, buffer});
-    else
-        found->buffer = buffer;
+    requireEval("HGPUDeformerData::setBuffer");
+    Entry& entry = entryOf(plug, name);
+    entry.buffer = buffer;
+    entry.supplier = nullptr;
+}
+
+void HGPUDeformerData::setSupplier(const HPlug& plug, const HString& name, Supplier supplier) {
+    requireEval("HGPUDeformerData::setSupplier");
+    entryOf(plug, name).supplier = std::move(supplier);
 }
 
 void HGPUDeformerData::clear() noexcept {
-    OpenQuarn::requireEval("HGPUDeformerData::clear");
+    requireEval("HGPUDeformerData::clear");
     entries_.clear();
 }

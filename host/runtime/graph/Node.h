@@ -28,6 +28,9 @@ public:
     /// Called for each slot of the node that has another value or has become dirty, before what depends on it becomes
     /// dirty. Thread: main.
     virtual void changed(Slot& slot) = 0;
+    /// Called before that for a slot that was set, connected or disconnected itself, or that somebody asked to be made
+    /// anew; not for one whose new value comes along a connection. Thread: main.
+    virtual void edited(Slot& slot) = 0;
     /// Everything that is connected may have another value. Thread: main.
     virtual void connectionsChanged() = 0;
 

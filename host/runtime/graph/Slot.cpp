@@ -158,6 +158,10 @@ void Slot::markDirtyBelow() {
 
 void Slot::markDirty() {
     markDirtyBelow();
+    tellAbove();
+}
+
+void Slot::tellAbove() {
     for (Slot* above = parent; above; above = above->parent)
         if (above->state_.fetch_or(belowBit, std::memory_order_acq_rel) & belowBit)
             break;
@@ -168,6 +172,12 @@ void Slot::markClean() {
     // what is above is no longer dirty as a whole
     for (Slot* above = parent; above; above = above->parent)
         above->state_.fetch_and(static_cast<std::uint8_t>(~dirtyBit), std::memory_order_acq_rel);
+}
+
+void Slot::markPassedOver() {
+    markClean();
+    state_.fetch_or(passedOverBit, std::memory_order_acq_rel);
+    tellAbove();
 }
 
 void Slot::markCleanBelow() {

@@ -95,7 +95,9 @@ public:
     /// It and everything below has to be evaluated before it is read.
     bool isDirty() const { return (state_.load(std::memory_order_acquire) & dirtyBit) != 0; }
     /// It or something below may have to be evaluated.
-    bool mayBeDirty() const { return (state_.load(std::memory_order_acquire) & (dirtyBit | belowBit)) != 0; }
+    bool mayBeDirty() const {
+        return (state_.load(std::memory_order_acquire) & (dirtyBit | belowBit | passedOverBit)) != 0;
+    }
     /// Its last compute failed.
     bool hasFailed() const { return (state_.load(std::memory_order_acquire) & failedBit) != 0; }
     void setFailed(bool failed);
@@ -103,6 +105,9 @@ public:
     void markDirty();
     /// Marks this slot and everything below as up to date.
     void markClean();
+    /// Marks a slot whose value was not made although what depends on it is up to date: who reads it has to evaluate
+    /// it, and a change that reaches it still makes everything dirty that depends on it.
+    void markPassedOver();
     /// Everything below has been evaluated.
     void clearBelow() { state_.fetch_and(static_cast<std::uint8_t>(~belowBit), std::memory_order_acq_rel); }
 
@@ -110,10 +115,12 @@ private:
     static constexpr std::uint8_t dirtyBit = 1;  // everything here and below
     static constexpr std::uint8_t belowBit = 2;  // something below, perhaps
     static constexpr std::uint8_t failedBit = 4; // the last compute failed
+    static constexpr std::uint8_t passedOverBit = 8;
 
     void attach(NodeData* newOwner);
     void cutOff();
     void markDirtyBelow();
+    void tellAbove();
     void markCleanBelow();
     void makeChildren();
 

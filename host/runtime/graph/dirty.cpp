@@ -23,7 +23,15 @@ public:
     explicit DirtyWalk(bool force)
         : force_(force) {}
 
-    void start(Slot& slot) { queue_.push_back(&slot); }
+    void start(Slot& slot) {
+        edited(slot);
+        queue_.push_back(&slot);
+    }
+    /// What is not told by a change further up: a value was set, a connection made or broken.
+    static void edited(Slot& slot) {
+        if (slot.owner && slot.owner->filterState)
+            slot.owner->filterState->edited(slot);
+    }
 
     void run() {
         for (std::size_t next = 0; next < queue_.size(); ++next) // NOLINT(modernize-loop-convert): it grows meanwhile
@@ -43,6 +51,8 @@ private:
         if (force_ ? !seen_.insert(&slot).second : slot.isDirty())
             return;
         slot.markDirty();
+        if (force_)
+            edited(slot);
         if (slot.owner)
             slot.owner->node.graph().recordDirty(slot);
         pushDependents(slot);
@@ -82,6 +92,7 @@ std::shared_ptr<Slot> dependentSlot(const Slot& slot, const Field::Dependent& de
 
 void propagateFrom(Slot& changed, bool force) {
     DirtyWalk walk(force);
+    DirtyWalk::edited(changed);
     walk.pushDependents(changed);
     walk.run();
 }

@@ -22,15 +22,6 @@ constexpr int deepest = 100;
 thread_local int depth = 0;
 thread_local std::vector<const Slot*> computing; // on this thread, outermost first
 
-struct DepthCount {
-    DepthCount() { ++depth; }
-    ~DepthCount() { --depth; }
-    DepthCount(const DepthCount&) = delete;
-    DepthCount& operator=(const DepthCount&) = delete;
-};
-
-HStatus pullLocked(const std::shared_ptr<Slot>& slot);
-
 EvaluationLock::Part partOf(const Slot& slot) {
     if (slot.owner->node.kind() == HFn::kGeometryFilter)
         for (const Slot* at = &slot; at; at = at->parent)
@@ -39,24 +30,14 @@ EvaluationLock::Part partOf(const Slot& slot) {
     return {slot.owner, -1};
 }
 
-/// Takes the part of the node that a slot belongs to, for as long as it is computed.
-class ComputeClaim {
-public:
-    explicit ComputeClaim(const Slot& slot)
-        : part_(partOf(slot)) {
-        EvaluationLock::instance().claim(part_);
-        computing.push_back(&slot);
-    }
-    ~ComputeClaim() {
-        computing.pop_back();
-        EvaluationLock::instance().disclaim(part_);
-    }
-    ComputeClaim(const ComputeClaim&) = delete;
-    ComputeClaim& operator=(const ComputeClaim&) = delete;
-
-private:
-    EvaluationLock::Part part_;
+struct DepthCount {
+    DepthCount() { ++depth; }
+    ~DepthCount() { --depth; }
+    DepthCount(const DepthCount&) = delete;
+    DepthCount& operator=(const DepthCount&) = delete;
 };
+
+HStatus pullLocked(const std::shared_ptr<Slot>& slot);
 
 HStatus failedStatus(const Slot& slot) {
     return {HStatus::kFailure, "the last compute of '" + slot.name() + "' failed"};
@@ -203,6 +184,17 @@ HStatus pullLocked(const std::shared_ptr<Slot>& slot) {
 }
 
 } // namespace
+
+ComputeClaim::ComputeClaim(const Slot& slot)
+    : part_(partOf(slot)) {
+    EvaluationLock::instance().claim(part_);
+    computing.push_back(&slot);
+}
+
+ComputeClaim::~ComputeClaim() {
+    computing.pop_back();
+    EvaluationLock::instance().disclaim(part_);
+}
 
 bool isEvaluating() {
     return depth > 0;

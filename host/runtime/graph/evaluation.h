@@ -5,6 +5,8 @@
 #include "graph/Slot.h"
 #include "openquarn/HStatus.h"
 
+#include <utility>
+
 namespace OpenQuarn {
 
 /// Brings the slot, and everything below it, up to date: takes values along connections and runs compute() where it has
@@ -17,6 +19,19 @@ HStatus pull(const std::shared_ptr<Slot>& slot);
 
 /// True on a thread that is inside pull().
 bool isEvaluating();
+
+/// Takes the part of the node that a slot belongs to, for as long as it is computed; the last one taken goes first.
+/// Thread: one that holds the lock of the graph.
+class ComputeClaim {
+public:
+    explicit ComputeClaim(const Slot& slot);
+    ~ComputeClaim();
+    ComputeClaim(const ComputeClaim&) = delete;
+    ComputeClaim& operator=(const ComputeClaim&) = delete;
+
+private:
+    std::pair<const NodeData*, long long> part_;
+};
 
 /// Lets other threads evaluate while this one works inside a plug-in's function that needs no graph of its own.
 class OutsideOfGraph {

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "plugins/GPUDeformers.h"
 
+#include "gpu/pipeline.h"
+
 #include <map>
 #include <stdexcept>
 
@@ -27,6 +29,7 @@ void addGPUDeformer(const std::string& nodeType, const std::string& registrant, 
 }
 
 void removeGPUDeformer(const std::string& nodeType) {
+    takeFromDevice(nodeType);
     entries().erase(nodeType);
 }
 

@@ -21,7 +21,8 @@ public:
     DeformerStatus prepareEvaluation(HDataBlock& block, const HEvaluationNode& evaluationNode, const HPlug& outputPlug,
                                      const HPlugArray& inputPlugs, const HGPUDeformerData& inputData,
                                      HGPUDeformerData& outputData, HOpenCLEvent& event);
-    /// Uploads the affected vertices when they are others than last time. A failure shows in the buffer. [eval]
+    /// Uploads the affected vertices when they are others than last time. initializeOutputPositions() answers for a
+    /// failure. [eval]
     void prepareAffectMapBuffer();
     /// The same for the weights. [eval]
     void prepareWeightsBuffer(const HEvaluationNode& evaluationNode);

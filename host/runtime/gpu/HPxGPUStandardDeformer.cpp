@@ -1,0 +1,171 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "openquarn/gpu/HPxGPUStandardDeformer.h"
+
+#include "core/threads.h"
+#include "gpu/Device.h"
+#include "gpu/activity.h"
+#include "gpu/deformerImpl.h"
+#include "gpu/failure.h"
+#include "gpu/transfer.h"
+#include "openquarn/HPxGeometryFilter.h"
+#include "openquarn/TArray.h"
+#include "openquarn/gpu/HOpenCLInfo.h"
+#include "openquarn/gpu/HOpenCLUtils.h"
+
+#include <vector>
+
+using OpenQuarn::requireEval;
+
+struct HPxGPUStandardDeformer::Standard {
+    HPlug outputPlug;
+    HOpenCLBuffer input, output, affectMap, weights;
+    std::shared_ptr<const OpenQuarn::IndexMap> uploadedMap; ///< null: none
+    std::uint64_t uploadedWeights = 0;                      ///< their version; 0: none
+    unsigned vertexCount = 0;
+    float envelope = 1.0F;
+    cl_int status = CL_SUCCESS; ///< of the preparations of this evaluation
+};
+
+HPxGPUStandardDeformer::HPxGPUStandardDeformer()
+    : standard_(std::make_unique<Standard>()) {}
+HPxGPUStandardDeformer::~HPxGPUStandardDeformer() = default;
+
+void HPxGPUStandardDeformer::terminate() {
+    requireEval("HPxGPUStandardDeformer::terminate");
+    *standard_ = Standard();
+    HPxGPUDeformer::terminate();
+}
+
+namespace {
+
+/// The envelope of a geometry filter, else 1.
+float envelopeOf(HDataBlock& block, bool isGeometryFilter, HStatus& status) {
+    return isGeometryFilter ? block.inputValue(HPxGeometryFilter::envelope, &status).asFloat() : 1.0F;
+}
+
+} // namespace
+
+HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::prepareEvaluation(
+    HDataBlock& block, const HEvaluationNode& /*evaluationNode*/, const HPlug& outputPlug, const HPlugArray& inputPlugs,
+    const HGPUDeformerData& inputData, HGPUDeformerData& outputData, HOpenCLEvent& event) {
+    requireEval("HPxGPUStandardDeformer::prepareEvaluation");
+    Standard& now = *standard_;
+    now.status = CL_SUCCESS;
+    now.outputPlug = outputPlug;
+    outputData.clear();
+    now.input = inputPlugs.empty() ? HOpenCLBuffer() : inputData.getBuffer(inputPlugs.front(), sPositionsName);
+    now.vertexCount = static_cast<unsigned>(now.input.bufferSize() / sizeof(T3dFltVector));
+    if (now.input.isNull() || !impl_->affected || impl_->affected->fullCount != now.vertexCount) {
+        OpenQuarn::noteFailure("the geometry has no positions on the device");
+        return kDeformerFailure;
+    }
+    HStatus status;
+    now.envelope = envelopeOf(block, impl_->isGeometryFilter, status);
+    if (status.error())
+        return kDeformerFailure;
+    if (now.envelope == 0.0F && passThroughWithZeroEnvelope())
+        return kDeformerPassThrough;
+    if (now.output.ensureBufferSize(now.input.bufferSize()) != CL_SUCCESS)
+        return kDeformerFailure;
+    event = now.input.bufferReadyEvent();
+    return kDeformerSuccess;
+}
+
+void HPxGPUStandardDeformer::prepareAffectMapBuffer() {
+    requireEval("HPxGPUStandardDeformer::prepareAffectMapBuffer");
+    Standard& now = *standard_;
+    if (isIdentityMap() || now.uploadedMap == impl_->affected || now.status != CL_SUCCESS)
+        return;
+    const HUintArray& map = *impl_->affected->affected;
+    const std::vector<cl_uint> indices(map.begin(), map.end());
+    now.status = OpenQuarn::uploadNamed("affectMap", indices.size() * sizeof(cl_uint), indices.data(), now.affectMap,
+                                        HOpenCLUtils::kCopyData);
+    now.uploadedMap = now.status == CL_SUCCESS ? impl_->affected : nullptr;
+}
+
+void HPxGPUStandardDeformer::prepareWeightsBuffer(const HEvaluationNode& /*evaluationNode*/) {
+    requireEval("HPxGPUStandardDeformer::prepareWeightsBuffer");
+    Standard& now = *standard_;
+    if (!hasEnvelopeWeights() || now.uploadedWeights == impl_->weightsVersion || now.status != CL_SUCCESS)
+        return;
+    now.status = OpenQuarn::uploadNamed("weights", affectCount() * sizeof(float), impl_->weights, now.weights,
+                                        HOpenCLUtils::kCopyData);
+    now.uploadedWeights = now.status == CL_SUCCESS ? impl_->weightsVersion : 0;
+}
+
+cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
+    requireEval("HPxGPUStandardDeformer::initializeOutputPositions");
+    Standard& now = *standard_;
+    if (now.status != CL_SUCCESS || isIdentityMap())
+        return now.status;
+    const std::shared_ptr<OpenQuarn::Device> device = OpenQuarn::currentDevice();
+    if (!device)
+        return CL_DEVICE_NOT_AVAILABLE;
+    const HOpenCLEventList waitFor{event};
+    HOpenCLEvent copied;
+    const cl_int status =
+        clEnqueueCopyBuffer(device->queue, now.input.get(), now.output.get(), 0, 0, now.input.bufferSize(),
+                            waitFor.length(), waitFor.data(), copied.receive());
+    if (status == CL_SUCCESS) {
+        OpenQuarn::timeCommand(*device, "copy", copied.get());
+        event = copied;
+    }
+    return OpenQuarn::noteFailure(status, "clEnqueueCopyBuffer");
+}
+
+HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::finishEvaluation(const HOpenCLEvent& event,
+                                                                        HGPUDeformerData& outputData) {
+    requireEval("HPxGPUStandardDeformer::finishEvaluation");
+    standard_->output.setBufferReadyEvent(event);
+    outputData.setBuffer(standard_->outputPlug, sPositionsName, standard_->output);
+    return kDeformerSuccess;
+}
+
+const HOpenCLBuffer& HPxGPUStandardDeformer::inputPositions() const {
+    requireEval("HPxGPUStandardDeformer::inputPositions");
+    return standard_->input;
+}
+
+HOpenCLBuffer& HPxGPUStandardDeformer::outputPositions() {
+    requireEval("HPxGPUStandardDeformer::outputPositions");
+    return standard_->output;
+}
+
+unsigned HPxGPUStandardDeformer::vertexCount() const {
+    requireEval("HPxGPUStandardDeformer::vertexCount");
+    return standard_->vertexCount;
+}
+
+unsigned HPxGPUStandardDeformer::affectCount() const {
+    requireEval("HPxGPUStandardDeformer::affectCount");
+    return impl_->affected ? impl_->affected->affectCount() : 0;
+}
+
+namespace {
+const HOpenCLBuffer noBuffer;
+} // namespace
+
+const HOpenCLBuffer& HPxGPUStandardDeformer::affectMapBuffer() const {
+    requireEval("HPxGPUStandardDeformer::affectMapBuffer");
+    return isIdentityMap() ? noBuffer : standard_->affectMap;
+}
+
+bool HPxGPUStandardDeformer::isIdentityMap() const {
+    requireEval("HPxGPUStandardDeformer::isIdentityMap");
+    return !impl_->affected || impl_->affected->isIdentity();
+}
+
+const HOpenCLBuffer& HPxGPUStandardDeformer::weightsBuffer() const {
+    requireEval("HPxGPUStandardDeformer::weightsBuffer");
+    return hasEnvelopeWeights() ? standard_->weights : noBuffer;
+}
+
+bool HPxGPUStandardDeformer::hasEnvelopeWeights() const {
+    requireEval("HPxGPUStandardDeformer::hasEnvelopeWeights");
+    return impl_->weights != nullptr;
+}
+
+float HPxGPUStandardDeformer::envelope() const {
+    requireEval("HPxGPUStandardDeformer::envelope");
+    return standard_->envelope;
+}

@@ -1,0 +1,189 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "gpu/pipeline.h"
+
+#include "core/threads.h"
+#include "geometry/filterAttributes.h"
+#include "gpu/Chain.h"
+#include "gpu/activity.h"
+#include "gpu/chainRun.h"
+#include "gpu/failure.h"
+#include "graph/Graph.h"
+#include "graph/plugImpl.h"
+#include "openquarn/HPxGeometryFilter.h"
+#include "openquarn_app/Gpu.h"
+#include "openquarn_app/Messages.h"
+#include "plugins/GPUDeformers.h"
+
+#include <atomic>
+
+namespace OpenQuarn {
+namespace {
+
+std::atomic<bool> isOn{false};
+// the user has been told that there is no device
+std::atomic<bool> saidNoDevice{false};
+thread_local int cpuOnly = 0;
+
+bool mayUseDevice(const NodeData& data) {
+    return isOn.load(std::memory_order_relaxed) && cpuOnly == 0 && !data.context;
+}
+
+void sayOnce(GpuGeometry& gpu, const Slot& output, const std::string& reason) {
+    if (!gpu.isFailing)
+        showMessage(Severity::warning, "'" + output.name() + "' is evaluated on the CPU: " + reason);
+    gpu.isFailing = true;
+}
+
+void sayNoDevice(GpuGeometry& gpu) {
+    const std::string reason = takeFailure();
+    gpu.isFailing = true;
+    if (!saidNoDevice.exchange(true))
+        showMessage(Severity::warning, "deformers are evaluated on the CPU: " + reason);
+}
+
+/// Nothing of a failed frame stays on the device, nor the device where it does not answer any more.
+void clearAfterFailure(const Chain& chain, const std::shared_ptr<Device>& device) {
+    if (clFinish(device->queue) != CL_SUCCESS) // what was handed over may still be read until then
+        closeDevice();
+    for (const Link& link : chain.links)
+        link.gpu().leaveDevice();
+}
+
+/// What is between the links was not made: it is evaluated when somebody asks for it.
+void markPassedOver(const Chain& chain) {
+    for (std::size_t i = 1; i < chain.links.size(); ++i) {
+        chain.links[i - 1].output->markPassedOver();
+        chain.links[i].geometry->markPassedOver();
+    }
+}
+
+std::shared_ptr<MeshData> runOn(const std::shared_ptr<Device>& device, Chain& chain) {
+    takeFailure(); // of before
+    std::shared_ptr<MeshData> mesh = runChain(chain, device);
+    const Link& last = chain.links.back();
+    if (!mesh) {
+        const std::string reason = takeFailure();
+        clearAfterFailure(chain, device);
+        sayOnce(last.gpu(), *last.output, reason.empty() ? "its GPU deformer failed" : reason);
+        return nullptr;
+    }
+    for (const Link& link : chain.links) {
+        link.gpu().isFailing = false;
+        countEvaluation(true);
+    }
+    markPassedOver(chain);
+    return mesh;
+}
+
+DeformerTraits traitsOf(const HGPUDeformerRegistrationInfo& info, const HObject& node) {
+    DeformerTraits traits;
+    traits.output = info.outputMeshAttribute(node);
+    traits.input = info.inputMeshAttribute(node);
+    traits.passThrough = info.passThroughInputMeshAttribute(node);
+    info.additionalInputMeshAttributes(node, traits.additional);
+    traits.matchesIndices = info.matchAncestorLogicalIndices();
+    traits.isGeometryFilter = info.isGeometryFilter();
+    return traits;
+}
+
+std::string joined(const HStringArray& texts) {
+    std::string all;
+    for (const HString& text : texts)
+        all += (all.empty() ? "" : "; ") + text.asStdString();
+    return all.empty() ? "its GPU deformer does not take it" : all;
+}
+
+/// Whether the plug-in lets the node be moved, as it is now.
+bool isAccepted(GpuGeometry& gpu, const NodeData& data, HDataBlock& block, const Slot& output, std::string& refusal) {
+    const HObject node = Access::object(data.node.shared_from_this());
+    const HPlug plug = makePlug(output);
+    HStringArray reasons;
+    bool isAccepted = false;
+    callPlugin(data.node, "validateNodeInGraph", [&] {
+        isAccepted = gpu.info.validateNodeInGraph(block, node, plug, &reasons) &&
+                     gpu.info.validateNodeValues(block, node, plug, &reasons);
+        gpu.traits = traitsOf(gpu.info, node);
+        return HStatus();
+    });
+    if (!isAccepted)
+        refusal = joined(reasons);
+    return isAccepted && gpu.traits.output == HPxGeometryFilter::outputGeom;
+}
+
+} // namespace
+
+CpuOnly::CpuOnly(bool on)
+    : on_(on) {
+    if (on_)
+        ++cpuOnly;
+}
+
+CpuOnly::~CpuOnly() {
+    if (on_)
+        --cpuOnly;
+}
+
+std::shared_ptr<MeshData> evaluateOnDevice(NodeData& data, unsigned index, bool& failed) {
+    failed = false;
+    if (!mayUseDevice(data))
+        return nullptr;
+    std::optional<Chain> chain = findChain(data, index);
+    if (!chain)
+        return nullptr;
+    failed = true;
+    takeFailure();
+    const std::shared_ptr<Device> device = currentDevice();
+    if (!device) {
+        sayNoDevice(chain->links.back().gpu());
+        return nullptr;
+    }
+    saidNoDevice = false;
+    std::shared_ptr<MeshData> mesh = runOn(device, *chain);
+    failed = !mesh;
+    return mesh;
+}
+
+void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HStatus& status, bool isFallback) {
+    if (!isOn.load(std::memory_order_relaxed) || data.context)
+        return;
+    HGPUDeformerRegistrationInfo* info = findGPUDeformer(data.node.type().name);
+    if (!info)
+        return;
+    countEvaluation(false, isFallback);
+    GeometryState& state = *filterStateOf(data).geometry(index);
+    if (!state.gpu)
+        state.gpu = std::make_unique<GpuGeometry>(*info);
+    GpuGeometry& gpu = *state.gpu;
+    gpu.isPrimed = false;
+    if (status.error())
+        return;
+    gpu.primedValues = primingValues(data, index);
+    const std::shared_ptr<Slot> output = elementOf(data, *filterAttributes().outputGeom, index);
+    std::string refusal;
+    gpu.isPrimed = output && isAccepted(gpu, data, block, *output, refusal);
+    if (!refusal.empty())
+        sayOnce(gpu, *output, refusal);
+}
+
+void takeFromDevice(const std::string& nodeType) {
+    Graph* graph = Graph::current();
+    if (!graph)
+        return;
+    for (const std::shared_ptr<Node>& node : graph->nodes())
+        if (node->data()->filterState && (nodeType.empty() || node->type().name == nodeType))
+            filterStateOf(*node->data()).takeFromDevice();
+}
+
+void Gpu::setEnabled(bool enabled) {
+    requireMain("Gpu::setEnabled");
+    if (!enabled)
+        takeFromDevice("");
+    isOn = enabled;
+    saidNoDevice = false;
+}
+
+bool Gpu::isEnabled() noexcept {
+    return isOn;
+}
+
+} // namespace OpenQuarn

@@ -1,0 +1,300 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the host asks of a GPU deformer and its registration info, and what it does when they fail.
+#include "host/gpu/PipelineTest.h"
+
+#include "openquarn/HFnDependencyNode.h"
+#include "openquarn/gpu/HOpenCLInfo.h"
+#include "openquarn_app/Plugins.h"
+
+#include <stdexcept>
+
+namespace {
+
+using namespace testNodes;
+using gpuDeformers::Hooks;
+using gpuDeformers::Seen;
+using gpuDeformers::Status;
+using OpenQuarn::Gpu;
+using testDeformers::grid;
+using testDeformers::meshNode;
+using ::testing::AllOf;
+using ::testing::Each;
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+
+class DeformerTest : public PipelineTest {
+protected:
+    void SetUp() override {
+        PipelineTest::SetUp();
+        meshNode("m", mesh);
+        makePusher("d", "m.outMesh");
+        EXPECT_EQ(evaluatedOn("d"), "cpu");
+    }
+    /// The next frame; what comes out has to be right wherever it was made.
+    std::string nextFrame() {
+        animate("d", ++frame_);
+        const std::string where = evaluatedOn("d");
+        EXPECT_THAT(pushedBy("d", mesh), Each(frame_));
+        return where;
+    }
+    const HObject mesh = grid(4, 3);
+
+private:
+    double frame_ = 0.0;
+};
+
+TEST_F(DeformerTest, FailuresGiveTheFrameOfTheCpuAndOneMessage) {
+    struct Case {
+        const char* name;
+        std::function<void()> breakIt;
+        const char* message;
+    };
+    const Case cases[] = {
+        {"fails", [] { Hooks::deform = [](auto&&...) { return HPxGPUDeformer::kDeformerFailure; }; },
+         "its GPU deformer failed"},
+        {"says what failed",
+         [] {
+             Hooks::deform = [](auto&&...) {
+                 HOpenCLInfo::checkCLErrorStatus(CL_OUT_OF_RESOURCES);
+                 return HPxGPUDeformer::kDeformerFailure;
+             };
+         },
+         "CL_OUT_OF_RESOURCES"},
+        {"throws", [] { Hooks::deform = [](auto&&...) -> Status { throw std::runtime_error("broken"); }; },
+         "its GPU deformer failed"},
+        {"is none", [] { Hooks::create = [] { return static_cast<HPxGPUDeformer*>(nullptr); }; },
+         "its plug-in made no GPU deformer"},
+        {"answers nonsense", [] { Hooks::deform = [](auto&&...) { return static_cast<Status>(17); }; },
+         "its GPU deformer failed"},
+    };
+    EXPECT_EQ(nextFrame(), "gpu");
+    for (const Case& one : cases) {
+        SCOPED_TRACE(one.name);
+        one.breakIt();
+        Gpu::setEnabled(false); // so that a new deformer is made
+        Gpu::setEnabled(true);
+        nextFrame();
+        std::vector<std::string> said;
+        for (int i = 0; i < 3; ++i) {
+            EXPECT_EQ(nextFrame(), "cpu");
+            EXPECT_EQ(Gpu::counts().fallbacks, 1U);
+        }
+        for (const std::string& message : takeMessages())
+            if (message.find("warning") == 0) // what was thrown is a message of its own
+                said.push_back(message);
+        EXPECT_THAT(
+            said, ElementsAre(AllOf(HasSubstr("'d.outputGeom[0]' is evaluated on the CPU: "), HasSubstr(one.message))));
+        Hooks::reset();
+        EXPECT_EQ(nextFrame(), "gpu") << "as soon as it works again";
+    }
+}
+
+TEST_F(DeformerTest, ARefusedNodeStaysOnTheCpuAndSaysWhy) {
+    const auto refuse = [](HStringArray* reasons) {
+        reasons->append("too pretty");
+        return false;
+    };
+    for (std::function<bool(HStringArray*)>* hook : {&Hooks::validateGraph, &Hooks::validateValues}) {
+        *hook = refuse;
+        plug("d.weightList[0].weights[0]").setDouble(1.0);
+        EXPECT_EQ(nextFrame(), "cpu");
+        EXPECT_EQ(nextFrame(), "cpu");
+        EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("'d.outputGeom[0]' is evaluated on the CPU: too pretty")));
+        *hook = nullptr;
+        EXPECT_EQ(nextFrame(), "cpu");
+        EXPECT_EQ(nextFrame(), "gpu");
+    }
+    Hooks::outputMesh = [](const HObject&) { return HPxGeometryFilter::inputGeometry; };
+    plug("d.weightList[0].weights[0]").setDouble(1.0);
+    EXPECT_EQ(nextFrame(), "cpu");
+    EXPECT_EQ(nextFrame(), "cpu") << "another attribute is its output";
+}
+
+TEST_F(DeformerTest, InputPlugsAreThoseThatMakeTheOutput) {
+    meshNode("n", grid(2, 2));
+    connect("n.outMesh", input("d", 3));
+    HPlugArray seen;
+    class Looks final : public HPxGPUDeformer {
+    public:
+        explicit Looks(HPlugArray& to)
+            : seen_(to) {}
+        using HPxGPUDeformer::evaluate;
+        DeformerStatus evaluate(HDataBlock&, const HEvaluationNode&, const HPlug&, const HPlugArray& inputs,
+                                const HGPUDeformerData&, HGPUDeformerData&) override {
+            seen_ = inputs;
+            return kDeformerPassThrough;
+        }
+        HPlugArray& seen_;
+    };
+    Hooks::create = [&seen] { return new Looks(seen); };
+    for (const bool matches : {true, false}) {
+        Hooks::matchesIndices = matches;
+        plug("d.weightList[0].weights[0]").setDouble(1.0);
+        animate("d", 1.0);
+        EXPECT_EQ(evaluatedOn("d"), "cpu");
+        animate("d", 2.0);
+        EXPECT_EQ(evaluatedOn("d"), "gpu");
+        std::vector<std::string> names;
+        for (const HPlug& one : seen)
+            names.push_back(one.name().asStdString());
+        EXPECT_THAT(pushedBy("d", mesh), Each(0.0)) << "passed through";
+        if (matches)
+            EXPECT_THAT(names, ElementsAre("d.input[0].inputGeometry"));
+        else
+            EXPECT_THAT(names, ElementsAre("d.input[0].inputGeometry", "d.input[3].inputGeometry"));
+    }
+}
+
+/// A deformer that overrides one of the three variants, and copies the positions.
+template <int variant>
+class Copies final : public HPxGPUDeformer {
+public:
+    Copies() { ++Seen::alive; }
+    ~Copies() override { --Seen::alive; }
+    using HPxGPUDeformer::evaluate;
+
+    DeformerStatus evaluate(HDataBlock& block, const HEvaluationNode& node, const HPlug& output,
+                            const HPlugArray& inputs, const HGPUDeformerData& in, HGPUDeformerData& out) override {
+        if (variant != 1)
+            return HPxGPUDeformer::evaluate(block, node, output, inputs, in, out);
+        return copy(in.getBuffer(inputs.front(), sPositionsName), output, out);
+    }
+    DeformerStatus evaluate(HDataBlock& block, const HEvaluationNode& node, const HPlug& output, const HPlug& input,
+                            const HGPUDeformerData& in, HGPUDeformerData& out) override {
+        if (variant != 2)
+            return HPxGPUDeformer::evaluate(block, node, output, input, in, out);
+        return copy(in.getBuffer(input, sPositionsName), output, out);
+    }
+    DeformerStatus evaluate(HDataBlock& block, const HEvaluationNode& node, const HPlug& output, unsigned vertexCount,
+                            const HOpenCLBuffer& in, HOpenCLBuffer& out) override {
+        if (variant != 3)
+            return HPxGPUDeformer::evaluate(block, node, output, vertexCount, in, out);
+        EXPECT_EQ(vertexCount, 12U);
+        return copyTo(in, out);
+    }
+
+private:
+    static DeformerStatus copyTo(const HOpenCLBuffer& in, HOpenCLBuffer& out) {
+        ++Seen::evaluations;
+        HOpenCLEvent done;
+        const cl_int status = clEnqueueCopyBuffer(HOpenCLInfo::getQuarnDefaultOpenCLCommandQueue(), in.get(), out.get(),
+                                                  0, 0, in.bufferSize(), 0, nullptr, done.receive());
+        out.setBufferReadyEvent(done);
+        return HOpenCLInfo::checkCLErrorStatus(status) == CL_SUCCESS ? kDeformerSuccess : kDeformerFailure;
+    }
+    DeformerStatus copy(const HOpenCLBuffer& in, const HPlug& output, HGPUDeformerData& out) {
+        if (made_.ensureBufferSize(in.bufferSize()) != CL_SUCCESS)
+            return kDeformerFailure;
+        out.setBuffer(output, sPositionsName, made_);
+        return copyTo(in, made_);
+    }
+    HOpenCLBuffer made_;
+};
+
+TEST_F(DeformerTest, EachVariantOfEvaluateCanBeTheOneThatWorks) {
+    const std::function<HPxGPUDeformer*()> variants[] = {[] { return new Copies<1>; }, [] { return new Copies<2>; },
+                                                         [] { return new Copies<3>; }};
+    for (const auto& make : variants) {
+        Hooks::create = make;
+        Gpu::setEnabled(false);
+        Gpu::setEnabled(true);
+        Seen::reset();
+        OpenQuarn::makeDirty(plug(output("d", 0)));
+        EXPECT_EQ(evaluatedOn("d"), "cpu");
+        for (const double depth : {2.0, 3.0}) {
+            const HObject moved = grid(4, 3, depth);
+            set("m.inMesh", moved);
+            EXPECT_EQ(evaluatedOn("d"), "gpu");
+            EXPECT_THAT(pushedBy("d", moved), Each(0.0));
+        }
+        EXPECT_EQ(Seen::evaluations, 2);
+    }
+    Hooks::create = [] { return new Copies<0>; };
+    Gpu::setEnabled(false);
+    Gpu::setEnabled(true);
+    set("m.inMesh", mesh);
+    OpenQuarn::makeDirty(plug(output("d", 0)));
+    nextFrame();
+    EXPECT_EQ(nextFrame(), "cpu") << "no variant at all";
+    EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("its GPU deformer failed")));
+}
+
+TEST_F(DeformerTest, AdditionalMeshesAreUploadedWhenTheyAreAskedFor) {
+    meshNode("target", grid(2, 2));
+    connect("target.outMesh", "d.originalGeometry[0]");
+    Hooks::additional = [](const HObject&, HObjectArray& attributes) {
+        attributes.append(HPxGeometryFilter::originalGeometry);
+    };
+    EXPECT_EQ(nextFrame(), "cpu");
+    EXPECT_EQ(nextFrame(), "gpu");
+    EXPECT_EQ(Gpu::counts().uploads.at("positions"), 1U) << "nobody asked";
+    std::size_t bytes = 0;
+    Hooks::deform = [&](HPxGPUStandardDeformer& deformer, const HGPUDeformerData& data, HDataBlock& block) {
+        block.inputValue(HFnDependencyNode(deformer.dependencyNode()).attribute("push")); // what it depends on
+        HPlug target(deformer.dependencyNode(), HPxGeometryFilter::originalGeometry);
+        target.selectAncestorLogicalIndex(deformer.multiIndex());
+        cl_int status = -1;
+        bytes = data.getBuffer(target, HPxGPUDeformer::sPositionsName, &status).bufferSize();
+        EXPECT_EQ(status, CL_SUCCESS);
+        EXPECT_TRUE(data.getBuffer(target, "normals", &status).isNull());
+        EXPECT_EQ(status, CL_SUCCESS);
+        return HPxGPUDeformer::kDeformerPassThrough;
+    };
+    for (const std::uint64_t uploads : {1U, 0U}) {
+        animate("d", 50.0 + static_cast<double>(uploads));
+        EXPECT_EQ(evaluatedOn("d"), "gpu");
+        EXPECT_EQ(bytes, 48U);
+        EXPECT_EQ(Gpu::counts().bytesUp, uploads * 48U);
+    }
+}
+
+TEST_F(DeformerTest, PassingThroughGivesTheMeshOfTheAttribute) {
+    const HObject other = grid(4, 3, 9.0);
+    set("d.originalGeometry[0]", other);
+    Hooks::passThroughMesh = [](const HObject&) { return HPxGeometryFilter::originalGeometry; };
+    Hooks::deform = [](auto&&...) { return HPxGPUDeformer::kDeformerPassThrough; };
+    EXPECT_EQ(nextFrame(), "cpu");
+    animate("d", 2.0);
+    EXPECT_EQ(evaluatedOn("d"), "gpu");
+    EXPECT_THAT(pushedBy("d", other), Each(0.0));
+}
+
+TEST_F(DeformerTest, WithoutAFilterThereIsNoEnvelope) {
+    Hooks::isGeometryFilter = false;
+    plug("d.envelope").setDouble(0.0);
+    plug("d.weightList[0].weights[0]").setDouble(0.0);
+    animate("d", 1.0);
+    EXPECT_EQ(evaluatedOn("d"), "cpu");
+    animate("d", 2.0);
+    EXPECT_EQ(evaluatedOn("d"), "gpu");
+    EXPECT_THAT(pushedBy("d", mesh), Each(2.0)) << "neither envelope nor weights count";
+}
+
+TEST_F(DeformerTest, TerminateMayBeFollowedByAnotherEvaluation) {
+    HPxGPUDeformer* made = nullptr;
+    Hooks::create = [&] { return made = gpuDeformers::makePush(); };
+    plug("d.weightList[0].weights[0]").setDouble(1.0);
+    EXPECT_EQ(nextFrame(), "cpu");
+    EXPECT_EQ(nextFrame(), "gpu");
+    ASSERT_NE(made, nullptr);
+    made->terminate();
+    EXPECT_EQ(nextFrame(), "gpu");
+    EXPECT_EQ(Gpu::counts().uploads.at("weights"), 1U) << "everything anew";
+    EXPECT_EQ(Seen::terminations, 1);
+}
+
+TEST_F(DeformerTest, DeformersGoWithTheirNodeAndTheirPlugin) {
+    EXPECT_EQ(nextFrame(), "gpu");
+    EXPECT_EQ(Seen::alive, 1);
+    OpenQuarn::unloadPlugin("gpuDeformers");
+    EXPECT_EQ(Seen::alive, 0);
+    EXPECT_EQ(nextFrame(), "nowhere") << "no GPU deformer, nothing to count";
+    gpuDeformers::registerPush(::testing::TempDir());
+    EXPECT_EQ(nextFrame(), "cpu");
+    EXPECT_EQ(nextFrame(), "gpu");
+    EXPECT_EQ(Seen::alive, 1);
+    session.newScene();
+    EXPECT_EQ(Seen::alive, 0);
+}
+
+} // namespace

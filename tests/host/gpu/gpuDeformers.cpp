@@ -1,0 +1,158 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "host/gpu/gpuDeformers.h"
+
+#include "host/support/testNodes.h"
+
+#include "openquarn/HFnDependencyNode.h"
+#include "openquarn/HFnPlugin.h"
+#include "openquarn/gpu/HGPUDeformerRegistry.h"
+#include "openquarn/gpu/HOpenCLKernelInfo.h"
+#include "openquarn/gpu/HOpenCLUtils.h"
+#include "openquarn_app/Plugins.h"
+
+#include <fstream>
+
+namespace gpuDeformers {
+namespace {
+
+std::string kernelFile;
+
+constexpr const char* kernelSource = R"(
+kernel void push(global float* out, global const float* in, global const uint* map, global const float* weights,
+                 float distance, uint count) {
+    size_t i = get_global_id(0);
+    if (i >= count)
+        return;
+    size_t g = map ? map[i] : i;
+    float3 p = vload3(g, in);
+    p.x += distance * (weights ? weights[i] : 1.0f);
+    vstore3(p, g, out);
+}
+)";
+
+class Push final : public HPxGPUStandardDeformer {
+public:
+    Push() { ++Seen::alive; }
+    ~Push() override { --Seen::alive; }
+
+    using HPxGPUStandardDeformer::evaluate;
+    DeformerStatus evaluate(HDataBlock& block, const HEvaluationNode& node, const HPlug& output,
+                            const HPlugArray& inputs, const HGPUDeformerData& inputData,
+                            HGPUDeformerData& outputData) override {
+        ++Seen::evaluations;
+        HOpenCLEvent event;
+        const DeformerStatus status = prepareEvaluation(block, node, output, inputs, inputData, outputData, event);
+        if (status != kDeformerSuccess)
+            return status;
+        prepareAffectMapBuffer();
+        prepareWeightsBuffer(node);
+        if (initializeOutputPositions(event) != CL_SUCCESS)
+            return kDeformerFailure;
+        const DeformerStatus made = Hooks::deform ? Hooks::deform(*this, inputData, block) : push(block, event);
+        return made == kDeformerSuccess ? finishEvaluation(event, outputData) : made;
+    }
+    void terminate() override {
+        ++Seen::terminations;
+        kernel_.reset();
+        HPxGPUStandardDeformer::terminate();
+    }
+
+private:
+    DeformerStatus push(HDataBlock& block, HOpenCLEvent& event) {
+        const HFnDependencyNode node(dependencyNode());
+        const auto distance = static_cast<float>(block.inputValue(node.attribute("push")).asDouble()) * envelope();
+        const cl_uint count = affectCount();
+        if (!kernel_.loadOrUpdate(HString(kernelFile), "push", count))
+            return kDeformerFailure;
+        cl_int status = CL_SUCCESS;
+        kernel_.setKernelArgBuffer(0, outputPositions(), status);
+        kernel_.setKernelArgBuffer(1, inputPositions(), status);
+        kernel_.setKernelArgBuffer(2, affectMapBuffer(), status);
+        kernel_.setKernelArgBuffer(3, weightsBuffer(), status);
+        HOpenCLUtils::setKernelArg(kernel_, 4, sizeof distance, &distance, status);
+        HOpenCLUtils::setKernelArg(kernel_, 5, sizeof count, &count, status);
+        if (status == CL_SUCCESS)
+            status = kernel_.enqueueKernel({event, affectMapBuffer().bufferReadyEvent()}, &event);
+        return status == CL_SUCCESS ? kDeformerSuccess : kDeformerFailure;
+    }
+
+    HOpenCLKernelInfo kernel_;
+};
+
+class PushInfo final : public HGPUDeformerRegistrationInfo {
+public:
+    HPxGPUDeformer* createGPUDeformer() override { return Hooks::create ? Hooks::create() : makePush(); }
+    bool validateNodeInGraph(HDataBlock&, const HObject&, const HPlug&, HStringArray* messages) override {
+        return !Hooks::validateGraph || Hooks::validateGraph(messages);
+    }
+    bool validateNodeValues(HDataBlock&, const HObject&, const HPlug&, HStringArray* messages) override {
+        return !Hooks::validateValues || Hooks::validateValues(messages);
+    }
+    HObject outputMeshAttribute(const HObject& node) const override {
+        return Hooks::outputMesh ? Hooks::outputMesh(node) : HGPUDeformerRegistrationInfo::outputMeshAttribute(node);
+    }
+    void additionalInputMeshAttributes(const HObject& node, HObjectArray& attributes) const override {
+        if (Hooks::additional)
+            Hooks::additional(node, attributes);
+    }
+    bool matchAncestorLogicalIndices() const override { return Hooks::matchesIndices; }
+    HObject passThroughInputMeshAttribute(const HObject& node) const override {
+        return Hooks::passThroughMesh ? Hooks::passThroughMesh(node)
+                                      : HGPUDeformerRegistrationInfo::passThroughInputMeshAttribute(node);
+    }
+    bool isGeometryFilter() const override { return Hooks::isGeometryFilter; }
+};
+
+PushInfo& info() {
+    static PushInfo theInfo;
+    return theInfo;
+}
+
+HStatus initializePlugin(HObject) {
+    return HGPUDeformerRegistry::registerGPUDeformerCreator("testDeformer", "tests", &info());
+}
+
+HStatus uninitializePlugin(HObject) {
+    return HGPUDeformerRegistry::deregisterGPUDeformerCreator("testDeformer", "tests");
+}
+
+} // namespace
+
+int Seen::alive = 0;
+int Seen::evaluations = 0;
+int Seen::terminations = 0;
+
+void Seen::reset() {
+    evaluations = terminations = 0;
+}
+
+std::function<HPxGPUDeformer*()> Hooks::create;
+std::function<Status(HPxGPUStandardDeformer&, const HGPUDeformerData&, HDataBlock&)> Hooks::deform;
+std::function<bool(HStringArray*)> Hooks::validateGraph, Hooks::validateValues;
+std::function<HObject(const HObject&)> Hooks::outputMesh, Hooks::passThroughMesh;
+std::function<void(const HObject&, HObjectArray&)> Hooks::additional;
+bool Hooks::matchesIndices = true;
+bool Hooks::isGeometryFilter = true;
+
+void Hooks::reset() {
+    create = nullptr;
+    deform = nullptr;
+    validateGraph = validateValues = nullptr;
+    outputMesh = passThroughMesh = nullptr;
+    additional = nullptr;
+    matchesIndices = isGeometryFilter = true;
+}
+
+HPxGPUDeformer* makePush() {
+    return new Push;
+}
+
+void registerPush(const std::string& folder) {
+    Hooks::reset();
+    Seen::reset();
+    kernelFile = folder + "/push.cl";
+    std::ofstream(kernelFile) << kernelSource;
+    OpenQuarn::addPlugin("gpuDeformers", initializePlugin, uninitializePlugin);
+}
+
+} // namespace gpuDeformers
