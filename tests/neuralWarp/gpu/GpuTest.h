@@ -44,7 +44,8 @@ public:
         input.setBuffer(in, HPxGPUDeformer::sPositionsName, uploaded(coordinates(warpRig::pointsOf(in.asHObject()))));
         if (!target.empty())
             input.setBuffer(rig->plug("targetMorphGeometry[0]"), HPxGPUDeformer::sPositionsName, uploaded(target));
-        const Status status = gpu->evaluate(block, HEvaluationNode(rig->node), rig->output(0), {in}, input, output);
+        const Status status =
+            gpu->evaluate(block, HEvaluationNode(rig->node), rig->output(0), HPlugArray{in}, input, output);
         positions = downloaded(output.getBuffer(rig->output(0), HPxGPUDeformer::sPositionsName));
         return status;
     }

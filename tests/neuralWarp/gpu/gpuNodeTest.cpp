@@ -63,7 +63,12 @@ TEST_F(GpuTest, AnswersAndSaysWhatIsWrong) {
          passThrough,
          {"error: [NEURAL WARP] No ML model initialized for index 0"}},
         {"not its model", inState([](Data& d) { d.modelValid = false; }), passThrough, invalid},
-        {"no model file", inState([](Data& d) { d.session.load("/nowhere.pt", true); }), passThrough, invalid},
+        {"no network",
+         [](T& t) {
+             writeFile(t.folder.path() / "model.pt", "");
+             t.state().session.load(t.folder.path() / "model.pt", true);
+         },
+         passThrough, invalid},
         {"no controls",
          [](T& t) { t.rig->setControls({}); },
          passThrough,
@@ -80,7 +85,14 @@ TEST_F(GpuTest, AnswersAndSaysWhatIsWrong) {
         {"no frames", inState([](Data& d) { d.vertexFrames = {}; }), failure, {}},
         {"no rest frames", inState([](Data& d) { d.restFramesInverse.clear(); }), failure, {}},
         {"a rest point less", inState([](Data& d) { d.restPoints.pop_back(); }), failure, {}},
-        {"no connections", inState([](Data& d) { d.activeSettings.smoothingIterations = 2; }), failure, {}},
+        {"no connections",
+         inState([](Data& d) {
+             d.activeSettings.smoothingIterations = 2;
+             d.vertexConnections = {};
+             d.connectionWeights.clear();
+         }),
+         failure,
+         {}},
         {"too short a map",
          inState([](Data& d) {
              d.useAffectMap = true;
@@ -282,14 +294,27 @@ TEST_F(GpuTest, TheHostMovesItsGeometryToTheDeviceAndBack) {
         const OpenQuarn::GpuCounts counts = Gpu::counts();
         return std::string(counts.gpuEvaluations ? "gpu" : "") + (counts.cpuEvaluations ? "cpu" : "");
     };
+    rig->setMorphTarget(0, unevenMesh());
     EXPECT_EQ(where(), "cpu");
+    const std::pair<const char*, double> priming[] = {{"models[0].modelActive", 0.0},
+                                                      {"models[0].modelActive", 1.0},
+                                                      {"targetMorphEnabled", 1.0},
+                                                      {"targetMorphEnvelope", 0.5},
+                                                      {"envelope", 0.5}};
+    for (const auto& [name, value] : priming) {
+        rig->setInput(0, unevenMesh());
+        EXPECT_EQ(where(), "gpu") << "before " << name;
+        rig->plug(name).setDouble(value);
+        EXPECT_EQ(where(), "cpu") << name;
+    }
     rig->setInput(0, unevenMesh());
     EXPECT_EQ(where(), "gpu");
-    for (const char* priming : {"models[0].modelActive", "targetMorphEnabled", "targetMorphEnvelope", "envelope"}) {
-        rig->setMorphTarget(0, unevenMesh());
-        rig->plug(priming).setDouble(rig->plug(priming).asDouble() == 0.0 ? 1.0 : 0.5);
-        EXPECT_EQ(where(), "cpu") << priming;
-    }
+    state().vertexFrames = {}; // freed, and due again on the CPU
+    state().framesTopologyDirty = true;
+    state().bump(Data::framesCache);
+    rig->setInput(0, unevenMesh());
+    EXPECT_EQ(where(), "cpu");
+    EXPECT_THAT(shown(), testing::ElementsAre(testing::HasSubstr("CL_INVALID_BUFFER_SIZE")));
     rig->setInput(0, unevenMesh());
     EXPECT_EQ(where(), "gpu");
     outputs(26)(*this); // the CPU says so, and the geometry stays as it came
