@@ -87,7 +87,11 @@ Status neuralWarpGPUNode::findMorph(HDataBlock& block, const HEvaluationNode& ev
     morphEnvelope_ = status.error() ? 0.0F : static_cast<float>(wanted);
     if (!isEnabled || std::abs(morphEnvelope_) < smallestMorphEnvelope)
         return kDeformerSuccess;
-    morphActive_ = findTarget(evaluationNode, inputData);
+    if (findTarget(evaluationNode, inputData) != CL_SUCCESS)
+        return kDeformerFailure;
+    morphActive_ = !targetPositionsBuffer_.isNull();
+    if (!morphActive_)
+        raiseMessage<Text::kErrorMLTargetBuffer>(displayErrorGated);
     if (std::abs(morphEnvelope_ - 1.0F) < smallestMorphEnvelope)
         deltasActive_ = false;
     // a target is read by the vertex's index in the geometry: more points do no harm
@@ -95,13 +99,12 @@ Status neuralWarpGPUNode::findMorph(HDataBlock& block, const HEvaluationNode& ev
     return morphActive_ && points < vertexCount() ? kDeformerFailure : kDeformerSuccess;
 }
 
-bool neuralWarpGPUNode::findTarget(const HEvaluationNode& evaluationNode, const HGPUDeformerData& inputData) {
+cl_int neuralWarpGPUNode::findTarget(const HEvaluationNode& evaluationNode, const HGPUDeformerData& inputData) {
     HPlug target(evaluationNode.dependencyNode(), neuralWarpNode::targetMorphGeometry);
     target.selectAncestorLogicalIndex(multiIndex());
-    targetPositionsBuffer_ = inputData.getBuffer(target, sPositionsName);
-    if (targetPositionsBuffer_.isNull())
-        raiseMessage<Text::kErrorMLTargetBuffer>(displayErrorGated);
-    return !targetPositionsBuffer_.isNull();
+    cl_int status = CL_SUCCESS;
+    targetPositionsBuffer_ = inputData.getBuffer(target, sPositionsName, &status);
+    return status;
 }
 
 Status neuralWarpGPUNode::computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs) {

@@ -47,7 +47,7 @@ private:
     void takeSettings(const neuralWarpData& data);
     DeformerStatus findMorph(HDataBlock& block, const HEvaluationNode& evaluationNode,
                              const HGPUDeformerData& inputData);
-    bool findTarget(const HEvaluationNode& evaluationNode, const HGPUDeformerData& inputData);
+    cl_int findTarget(const HEvaluationNode& evaluationNode, const HGPUDeformerData& inputData);
     DeformerStatus computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs);
     bool runInference(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs);
     DeformerStatus deformPrepared(const HEvaluationNode& evaluationNode, const neuralWarpData& data,
