@@ -45,7 +45,7 @@ cl_int writeOwnCopy(Buffer& buffer, std::size_t bytes, const void* data, HOpenCL
     buffer.copyRead = written;
     if (!buffer.copyRead.isNull())
         return CL_SUCCESS;
-    const cl_event event = written.get(); // the event could not be kept, so nobody could wait for it later
+    cl_event event = written.get(); // the event could not be kept, so nobody could wait for it later
     return noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
 }
 
