@@ -43,6 +43,10 @@ void check(cl_int status, const char* call) {
         throw std::runtime_error(std::string(call) + ": " + std::to_string(status));
 }
 
+const char* folder() {
+    return NW_KERNELS;
+}
+
 std::unique_ptr<Device> Device::first() {
     auto device = std::make_unique<Device>();
     device->id = firstDevice();
@@ -107,8 +111,7 @@ Buffer::Buffer(const Device& device, const void* contents, std::size_t bytes)
     check(status, "clCreateBuffer");
     // nothing has no region of its own: a byte of the guard stands for it
     const cl_buffer_region region{guardBytes, std::max<std::size_t>(bytes, 1)};
-    payload_.reset(
-        clCreateSubBuffer(whole_.get(), CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION, &region, &status));
+    payload_.reset(clCreateSubBuffer(whole_.get(), CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION, &region, &status));
     check(status, "clCreateSubBuffer");
     write(contents);
 }
