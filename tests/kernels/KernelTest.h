@@ -67,7 +67,8 @@ public:
     // What the kernel leaves in its output after n work items and those that fill the last group.
     template <typename T = quill::val3<float>>
     std::vector<T> run(std::size_t n, std::size_t local = 64) {
-        kernels::launch(*KernelTest::device(), kernel_.get(), n, local);
+        kernels::enqueue(*KernelTest::device(), kernel_.get(), n, local);
+        kernels::finish(*KernelTest::device());
         for (std::size_t b = 0; b < buffers_.size(); ++b)
             if (buffers_[b]) {
                 EXPECT_TRUE(buffers_[b]->guardsAreWhole()) << "buffer " << b;

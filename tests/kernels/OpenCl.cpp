@@ -154,11 +154,13 @@ Arguments& Arguments::add(const void* value, std::size_t size) {
     return *this;
 }
 
-void launch(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local, std::size_t times) {
+void enqueue(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local) {
     const std::size_t global = (n + local - 1) / local * local;
-    for (std::size_t i = 0; i < times; ++i)
-        check(clEnqueueNDRangeKernel(device.queue.get(), kernel, 1, nullptr, &global, &local, 0, nullptr, nullptr),
-              "clEnqueueNDRangeKernel");
+    check(clEnqueueNDRangeKernel(device.queue.get(), kernel, 1, nullptr, &global, &local, 0, nullptr, nullptr),
+          "clEnqueueNDRangeKernel");
+}
+
+void finish(const Device& device) {
     check(clFinish(device.queue.get()), "clFinish");
 }
 

@@ -108,8 +108,8 @@ private:
     cl_uint index_ = 0;
 };
 
-// One work item for each of n elements, and as many beyond as fill the last group of `local`, one or several times
-// over; waits for them.
-void launch(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local, std::size_t times = 1);
+// One work item for each of n elements, and as many beyond as fill the last group of `local`.
+void enqueue(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local);
+void finish(const Device& device);
 
 } // namespace kernels

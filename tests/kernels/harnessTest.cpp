@@ -14,7 +14,8 @@ TEST_F(Harness, SeesWritesBesideTheOutputAndIntoInputs) {
         const kernels::Buffer buffer(*device(), eight);
         const auto kernel = program.kernel("stray");
         kernels::Arguments(kernel.get()).add(buffer).add(static_cast<std::uint32_t>(at));
-        kernels::launch(*device(), kernel.get(), 1, 1);
+        kernels::enqueue(*device(), kernel.get(), 1, 1);
+        kernels::finish(*device());
         EXPECT_EQ(buffer.guardsAreWhole(), at >= 0 && at < 8) << at;
         EXPECT_EQ(buffer.isUnchanged(), at < 0 || at >= 8) << at;
     }
