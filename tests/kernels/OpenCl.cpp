@@ -30,7 +30,7 @@ cl_device_id firstDevice() {
     cl_uint count = 0;
     if (clGetPlatformIDs(16, platforms, &count) != CL_SUCCESS)
         return nullptr;
-    for (const cl_platform_id platform : std::span(platforms, std::min(count, 16U)))
+    for (cl_platform_id platform : std::span(platforms, std::min(count, 16U)))
         if (cl_device_id id = nullptr; clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 1, &id, nullptr) == CL_SUCCESS)
             return id;
     return nullptr;
@@ -145,8 +145,8 @@ bool Buffer::isUnchanged() const {
 }
 
 Arguments& Arguments::add(const Buffer* buffer) {
-    const cl_mem handle = buffer ? buffer->handle() : nullptr;
-    return add(&handle, sizeof handle);
+    cl_mem handle = buffer ? buffer->handle() : nullptr;
+    return add(&handle, sizeof(cl_mem));
 }
 
 Arguments& Arguments::add(const void* value, std::size_t size) {
