@@ -133,11 +133,14 @@ train_both_modes() {
   return "$failed"
 }
 
-# the motion through the plug-in against the target, and what the trainer says of the same frames
+# the motion through the plug-in against the target, on the CPU and on the OpenCL device, and what the trainer says of
+# the same frames
 measure_row() {
-  local row=$1
-  "$QUARN" play "$data/motion_${row%_*}.json" --model "$row" --against target --repeat 3 \
-    -o "$data/motion_$row.npy" --json >"$data/results/$row/play.json"
+  local row=$1 evaluator
+  for evaluator in cpu gpu; do
+    "$QUARN" play "$data/motion_${row%_*}.json" --model "$row" --against target --repeat 3 --evaluator "$evaluator" \
+      -o "$data/motion_${row}_$evaluator.npy" --json >"$data/results/$row/play_$evaluator.json"
+  done
   "$python" -m trainer evaluate "$data/sets/motion_${row%_*}" "$data/models/$row.nwrp" --json \
     >"$data/results/$row/evaluate.json"
 }

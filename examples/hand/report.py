@@ -71,11 +71,29 @@ def require_agreement(name, measured, by_quarn):
             sys.exit(f"report.py: {name}: {figure} differs by {difference:g} mm from what quarn play measured")
 
 
+def times(played):
+    return {"median_ms": played["medianMs"], "p99_ms": played["p99Ms"]}
+
+
+def gpu_of_row(played, on_cpu, on_gpu, scale, diagonal_mm):
+    """Where and how fast the OpenCL device played the motion, and how far it came out from the CPU."""
+    use = played["gpu"]
+    return {
+        "device": use["device"],
+        "deformations": use["onGpu"],
+        "fallbacks": use["fallbacks"],
+        **times(played),
+        "difference": statistics(distances(on_gpu, on_cpu, scale), diagonal_mm),
+    }
+
+
 def row_of_report(data, mode, kind):
     name = f"{mode}_{kind}"
-    played, evaluated = (read_json(data / "results" / name / f"{what}.json") for what in ("play", "evaluate"))
+    played, on_device, evaluated = (read_json(data / "results" / name / f"{what}.json")
+                                    for what in ("play_cpu", "play_gpu", "evaluate"))
     scale = 1000 * read_json(data / "sets" / f"motion_{mode}" / "dataset.json")["metersPerUnit"]
-    skin, target, network = (np.load(data / f"motion_{what}.npy") for what in ("skin", "target", name))
+    skin, target, network, network_gpu = (np.load(data / f"motion_{what}.npy")
+                                          for what in ("skin", "target", f"{name}_cpu", f"{name}_gpu"))
     diagonal = played["boxDiagonalMm"]
     errors = {
         "skin": statistics(distances(skin, target, scale), diagonal),
@@ -93,7 +111,8 @@ def row_of_report(data, mode, kind):
         "ratio": {figure: errors["network"][f"{figure}_mm"] / best[f"{figure}_mm"] for figure in ("mean", "max")},
         "jitter_mm": {what: jitter(points, scale) for what, points in
                       (("skin", skin), ("target", target), ("network", network))},
-        "cpu": {"median_ms": played["medianMs"], "p99_ms": played["p99Ms"]},
+        "cpu": times(played),
+        "gpu": gpu_of_row(on_device, network, network_gpu, scale, diagonal),
     }
 
 
@@ -123,12 +142,23 @@ def cell(stage):
 
 def table(report):
     """The errors in mm as text: a line a row, mean, p99 and maximum of each stage."""
-    lines = [f"{'mm: mean, p99, max':18}" + "".join(f" | {stage:^23}" for stage in STAGES) + " |  mean   max | ms/frame"]
+    lines = [f"{'mm: mean, p99, max':18}" + "".join(f" | {stage:^23}" for stage in STAGES) +
+             " |  mean   max | ms CPU   GPU | GPU from CPU, max"]
     for row in report["rows"]:
         line = f"{row['mode'] + ', ' + row['kind']:18}" + "".join(f" | {cell(row[stage])}" for stage in STAGES)
         ratio = row["ratio"]
-        lines.append(line + f" | {ratio['mean']:5.3f} {ratio['max']:5.3f} | {row['cpu']['median_ms']:.3f}")
-    return "\n".join(lines) + "\n"
+        gpu = row["gpu"]
+        lines.append(line + f" | {ratio['mean']:5.3f} {ratio['max']:5.3f} | {row['cpu']['median_ms']:6.3f} "
+                     f"{gpu['median_ms']:5.3f} | {gpu['difference']['max_mm']:.2g} mm")
+    return "\n".join(lines) + "\n" + device_line(report) + "\n"
+
+
+def device_line(report):
+    """What "GPU" stands for in this report."""
+    used = [row["gpu"] for row in report["rows"]]
+    if any(gpu["deformations"] == 0 for gpu in used):
+        return "GPU: there was none to be used, and those frames ran on the CPU as well"
+    return f"GPU: {used[0]['device']}"
 
 
 def write_preview(folder):
@@ -169,13 +199,16 @@ def html_cells(stage, best=False):
 def html_table(report):
     head = "".join(f'<th colspan="3">{stage}</th>' for stage in STAGES)
     names = "<th>mean</th><th>p99</th><th>max</th>" * len(STAGES)
-    lines = [f"<tr><th></th>{head}<th colspan='2'>network, part of before</th><th colspan='2'>CPU, ms a frame</th></tr>",
-             f"<tr><th></th>{names}<th>mean</th><th>max</th><th>median</th><th>p99</th></tr>"]
+    lines = [f"<tr><th></th>{head}<th colspan='2'>network, part of before</th><th colspan='2'>CPU, ms a frame</th>"
+             "<th colspan='2'>GPU, ms a frame</th><th>GPU from CPU</th></tr>",
+             f"<tr><th></th>{names}<th>mean</th><th>max</th>" + "<th>median</th><th>p99</th>" * 2 + "<th>max</th></tr>"]
     for row in report["rows"]:
         cells = "".join(html_cells(row[stage], stage == "network") for stage in STAGES)
         lines.append(f"<tr><td>{row['mode']}, {row['kind']}</td>{cells}"
                      f"<td>{row['ratio']['mean']:.3f}</td><td>{row['ratio']['max']:.3f}</td>"
-                     f"<td>{row['cpu']['median_ms']:.3f}</td><td>{row['cpu']['p99_ms']:.3f}</td></tr>")
+                     + "".join(f"<td>{row[where]['median_ms']:.3f}</td><td>{row[where]['p99_ms']:.3f}</td>"
+                               for where in ("cpu", "gpu"))
+                     + f"<td>{row['gpu']['difference']['max_mm']:.2g} mm</td></tr>")
     return "<table>" + "\n".join(lines) + "</table>"
 
 
@@ -204,7 +237,8 @@ with a network, and the distance that is left. {report['vertices']} vertices, {r
 {html_table(report)}
 <p><small>skin: linear skinning alone. base: the deformer with deltas of zero (in surface mode the rest surface carried by
 smoothed frames). basis: the best that the principal shapes could do. network: the trained model, through the plug-in.
-The part of before is of the smaller of skin and base; asked for are {MEAN_LIMIT:g} in the mean and {MAX_LIMIT:g} at most.</small></p>
+The part of before is of the smaller of skin and base; asked for are {MEAN_LIMIT:g} in the mean and {MAX_LIMIT:g} at most.
+{html.escape(device_line(report))}. GPU from CPU: the largest distance of a vertex between the two.</small></p>
 <h2>Where it is worst, and how smooth</h2>
 {html_worst(report)}
 <h2>Frames of the motion</h2>

@@ -30,6 +30,6 @@ struct HOpenCLBuffer::Impl {
 
     /// Waits until the device has read the copy.
     cl_int waitForCopy();
-    /// A place for `bytes` that nobody reads; null, with the reason noted, when there is none.
-    std::byte* takeCopy(std::size_t bytes);
+    /// Makes `copy` a place for `bytes` that nobody reads.
+    cl_int takeCopy(std::size_t bytes);
 };

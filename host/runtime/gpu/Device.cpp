@@ -53,7 +53,7 @@ bool askAbilities(Device& device) {
         return false;
     device.hasDoubles = doubles != 0;
     device.roundsCorrectly = (singles & CL_FP_CORRECTLY_ROUNDED_DIVIDE_SQRT) != 0;
-    device.name = describeDevice(device.id).name;
+    device.name = deviceName(device.id);
     return true;
 }
 

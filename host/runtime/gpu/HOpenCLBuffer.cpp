@@ -6,14 +6,29 @@
 #include "gpu/failure.h"
 
 #include <exception>
+#include <mutex>
 #include <new>
 #include <string>
 #include <utility>
+#include <vector>
 
 using OpenQuarn::noteFailure;
 
+namespace {
+
+// for good: whoever cannot be waited for may still read it
+void abandon(std::unique_ptr<std::byte[]> copy) {
+    static auto& abandoned = *new std::vector<std::unique_ptr<std::byte[]>>;
+    static std::mutex mutex;
+    const std::scoped_lock lock(mutex);
+    abandoned.push_back(std::move(copy));
+}
+
+} // namespace
+
 HOpenCLBuffer::Impl::~Impl() {
-    waitForCopy();
+    if (waitForCopy() != CL_SUCCESS)
+        abandon(std::move(copy));
     if (memory)
         noteFailure(clReleaseMemObject(memory), "clReleaseMemObject");
 }
@@ -23,23 +38,21 @@ cl_int HOpenCLBuffer::Impl::waitForCopy() {
         return CL_SUCCESS;
     const cl_event event = copyRead.get();
     const cl_int status = noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
-    copyRead.reset();
+    if (status == CL_SUCCESS || status == CL_EXEC_STATUS_ERROR_FOR_EVENTS_IN_WAIT_LIST) // it is over, either way
+        copyRead.reset();
     return status;
 }
 
-std::byte* HOpenCLBuffer::Impl::takeCopy(std::size_t bytes) {
-    if (waitForCopy() != CL_SUCCESS)
-        return nullptr;
-    if (bytes > copyCapacity) {
-        copyCapacity = 0;
-        copy.reset(new (std::nothrow) std::byte[bytes]);
-        if (!copy) {
-            noteFailure(CL_OUT_OF_HOST_MEMORY, "upload", std::to_string(bytes) + " bytes");
-            return nullptr;
-        }
-        copyCapacity = bytes;
-    }
-    return copy.get();
+cl_int HOpenCLBuffer::Impl::takeCopy(std::size_t bytes) {
+    const cl_int status = waitForCopy();
+    if (status != CL_SUCCESS || bytes <= copyCapacity)
+        return status;
+    copyCapacity = 0;
+    copy.reset(new (std::nothrow) std::byte[bytes]);
+    if (!copy)
+        return noteFailure(CL_OUT_OF_HOST_MEMORY, "an upload's copy", std::to_string(bytes) + " bytes");
+    copyCapacity = bytes;
+    return CL_SUCCESS;
 }
 
 bool HOpenCLBuffer::isNull() const noexcept {

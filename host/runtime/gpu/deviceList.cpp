@@ -109,9 +109,13 @@ std::vector<cl_device_id> findDevices() {
     return all;
 }
 
+std::string deviceName(cl_device_id id) {
+    return deviceText(id, CL_DEVICE_NAME);
+}
+
 GpuDevice describeDevice(cl_device_id id) {
     GpuDevice device;
-    device.name = deviceText(id, CL_DEVICE_NAME);
+    device.name = deviceName(id);
     device.platform = platformName(id);
     device.driver = deviceText(id, CL_DRIVER_VERSION);
     device.isGpu = isGpu(id);

@@ -15,6 +15,7 @@ namespace OpenQuarn {
 std::vector<cl_device_id> findDevices();
 /// What cannot be asked stays empty.
 GpuDevice describeDevice(cl_device_id id);
+std::string deviceName(cl_device_id id);
 /// The device that a choice means (Gpu::chooseDevice); none when there is no such device.
 std::optional<std::size_t> matchDevice(const std::vector<GpuDevice>& devices, const std::string& choice);
 /// "0: NAME (PLATFORM), 1: ...", or that there is none.

@@ -10,6 +10,7 @@
 #include <stdexcept>
 #include <string_view>
 #include <system_error>
+#include <utility>
 
 #include <sys/stat.h>
 
@@ -79,7 +80,10 @@ public:
 
 private:
     void mark(std::size_t line, const std::string& path) {
-        source_.text.append("#line ").append(std::to_string(line)).append(" \"").append(path).append("\"\n");
+        source_.text.append("#line ").append(std::to_string(line)).append(" \"");
+        for (const char letter : path)
+            source_.text.append(letter == '"' || letter == '\\' ? "\\" : "") += letter;
+        source_.text.append("\"\n");
     }
 
     void add(std::string_view line, std::size_t number, const std::string& path) {

@@ -35,13 +35,18 @@ cl_int writeOwnCopy(Buffer& buffer, std::size_t bytes, const void* data, HOpenCL
     constexpr std::size_t large = std::size_t{1} << 20U;
     if (bytes > large)
         return write(buffer, CL_TRUE, bytes, data, written);
-    std::byte* copy = buffer.takeCopy(bytes);
-    if (!copy)
-        return CL_OUT_OF_HOST_MEMORY;
-    std::memcpy(copy, data, bytes);
-    const cl_int status = write(buffer, CL_FALSE, bytes, copy, written);
+    cl_int status = buffer.takeCopy(bytes);
+    if (status != CL_SUCCESS)
+        return status;
+    std::memcpy(buffer.copy.get(), data, bytes);
+    status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), written);
+    if (status != CL_SUCCESS)
+        return status;
     buffer.copyRead = written;
-    return status;
+    if (!buffer.copyRead.isNull())
+        return CL_SUCCESS;
+    const cl_event event = written.get(); // the event could not be kept, so nobody could wait for it later
+    return noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
 }
 
 cl_int writeAll(HOpenCLBuffer& buffer, std::string_view name, std::size_t bytes, const void* data, int mode) {
@@ -67,7 +72,7 @@ bool isUploadable(std::size_t bytes, const void* data, int mode) {
     return false;
 }
 
-// A buffer that is mapped, until it goes out of sight or is unmapped.
+// A buffer that is mapped, until it is unmapped or this goes.
 class Mapped {
 public:
     Mapped(const Buffer& buffer, cl_map_flags flags, std::size_t bytes, HOpenCLEvent* mapped)
@@ -78,13 +83,18 @@ public:
                                  waitFor.data(), mapped ? mapped->receive() : nullptr, &status);
         status_ = noteFailure(status, "clEnqueueMapBuffer", flags == CL_MAP_READ ? "download" : "upload");
     }
+    ~Mapped() {
+        if (at_)
+            unmap(nullptr);
+    }
     Mapped(const Mapped&) = delete;
     Mapped& operator=(const Mapped&) = delete;
 
     cl_int status() const { return status_; }
     float* floats() const { return static_cast<float*>(at_); }
     cl_int unmap(HOpenCLEvent* done) {
-        return noteFailure(clEnqueueUnmapMemObject(buffer_.device->queue, buffer_.memory, at_, 0, nullptr,
+        void* mapped = std::exchange(at_, nullptr);
+        return noteFailure(clEnqueueUnmapMemObject(buffer_.device->queue, buffer_.memory, mapped, 0, nullptr,
                                                    done ? done->receive() : nullptr),
                            "clEnqueueUnmapMemObject");
     }
@@ -151,6 +161,8 @@ cl_int uploadPositions(const Positions& positions, HOpenCLBuffer& buffer) {
     cl_int status = buffer.ensureBufferSize(bytes);
     if (status == CL_SUCCESS && bytes > 0)
         status = writePositions(positions, implOf(buffer));
+    else if (status == CL_SUCCESS)
+        buffer.setBufferReadyEvent({});
     if (status != CL_SUCCESS)
         buffer.reset();
     return status;

@@ -46,7 +46,17 @@ expect 0 '3 frames timed' '' play "$scene" --frames 1-11x5 -o "$work/a.####.obj"
 for file in a.0001.obj a.0006.obj a.0011.obj a.npy; do [[ -s $work/$file ]] || fail "no $file"; done
 [[ $(grep -c '^v ' "$work/a.0006.obj") == 369 && $(grep -c '^f' "$work/a.0006.obj") == 320 ]] || fail "not the mesh"
 
-expect 1 '' 'registers a GPU deformer.*--evaluator cpu' play "$scene" --evaluator gpu
+# on the GPU, or without one on the CPU with a warning, the same motion
+expect 0 'GPU: ' '' play "$scene" --frames 1-11 --evaluator gpu -o "$work/gpu.npy"
+expect 0 '' 'wrote 11 frames' bake "$scene" 'wave.outputGeom[0]' --frames 1-11 -o "$work/cpu.npy"
+[[ $(stat -c %s "$work/gpu.npy") == $(stat -c %s "$work/cpu.npy") ]] || fail "not the same frames"
+OCL_ICD_VENDORS=$work/none expect 0 'GPU: 0 deformations on no device, 11 on the CPU, 10 of them' \
+  'warning: deformers are evaluated on the CPU: no OpenCL device' \
+  play "$scene" --frames 1-11 --evaluator gpu -o "$work/fallback.npy"
+cmp "$work/fallback.npy" "$work/cpu.npy" || fail "the CPU's frames come out otherwise when the GPU was asked for"
+expect 1 '' 'no OpenCL device "no such thing": ' play "$scene" --evaluator gpu --device 'no such thing'
+expect 1 '' '--device 0 goes with --evaluator gpu' play "$scene" --device 0
+OCL_ICD_VENDORS=$work/none expect 0 'no OpenCL device' '' info --devices
 expect 1 '' 'put #### where' play "$scene" --frames 1-3 -o "$work/a.obj"
 expect 1 '' '\.npy, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
 expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target

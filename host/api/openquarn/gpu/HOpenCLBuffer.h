@@ -20,7 +20,7 @@ public:
     cl_mem get() const noexcept;
     /// Bytes that are in use: what ensureBufferSize() or an upload asked for last. 0 when null.
     std::size_t bufferSize() const noexcept;
-    /// Bytes that are allocated: never fewer than before, until reset().
+    /// Bytes that are allocated: never fewer than before, until reset() or a change of the device.
     std::size_t capacity() const noexcept;
 
     /// Makes room for `bytes`, of which nothing is written. A buffer that has it already, on the device in use, is

@@ -24,6 +24,7 @@ public:
     };
 
     /// Makes the buffer hold `bytes` of `data`, and sets its ready event. With 0 bytes, `data` may be null: the buffer
-    /// then has the size 0. A failure leaves the buffer without contents.
+    /// then has the size 0, and nothing crosses. Up to 1 MiB does not wait for the work in flight. A failure lets go of
+    /// the buffer.
     static cl_int uploadToGPU(std::size_t bytes, const void* data, HOpenCLBuffer& buffer, int mode = kCopyData);
 };

@@ -28,8 +28,8 @@ struct GpuCounts {
     std::uint64_t cpuEvaluations = 0; ///< deformed on the CPU while the pipeline was on and could have taken them
     std::uint64_t fallbacks = 0;      ///< of these, after a failure on the device
     std::map<std::string, std::uint64_t> launches; ///< by name of the kernel
-    /// Of buffers, by name: a published buffer's, "positions", "weights", "affectMap", or "values" for what a deformer
-    /// uploads itself.
+    /// Of buffers that are not empty, by name: a published buffer's, "positions", "weights", "affectMap", or "values"
+    /// for what a deformer uploads itself.
     std::map<std::string, std::uint64_t> uploads;
     std::uint64_t downloads = 0;
     std::uint64_t bytesUp = 0, bytesDown = 0;
@@ -52,14 +52,14 @@ public:
     static std::vector<GpuDevice> devices();
     /// Which one is used from now on: "" for the first, its number in devices(), or a part of its name or its
     /// platform's in any case, the first that has it. Throws std::invalid_argument, which lists what there is, when
-    /// there is no such device; what was chosen then stays.
+    /// there is no such device; what was chosen then stays. "" is never refused. Closes the device in use.
     static void chooseDevice(const std::string& choice);
     /// The device in use; none before it was used.
     static std::optional<GpuDevice> currentDevice();
 
     /// For tests: kernels are compiled as for a device without double precision.
     static void assumeNoDoubles(bool assume);
-    /// Measures what runs on the device (GpuCounts::seconds), which costs time itself.
+    /// Measures what runs on the device (GpuCounts::seconds), which costs time itself. A change closes the device.
     static void setTiming(bool on);
 
     static GpuCounts counts();

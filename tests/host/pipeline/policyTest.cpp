@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Which evaluations run on the device, and which on the CPU.
-#include "host/gpu/PipelineTest.h"
+#include "host/pipeline/PipelineTest.h"
 
 #include "openquarn/HFnMesh.h"
 #include "openquarn_app/Commands.h"

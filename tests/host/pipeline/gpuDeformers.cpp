@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "host/gpu/gpuDeformers.h"
+#include "host/pipeline/gpuDeformers.h"
 
 #include "host/support/testNodes.h"
 

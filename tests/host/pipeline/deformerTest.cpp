@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // What the host asks of a GPU deformer and its registration info, and what it does when they fail.
-#include "host/gpu/PipelineTest.h"
+#include "host/pipeline/PipelineTest.h"
 
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/gpu/HOpenCLInfo.h"

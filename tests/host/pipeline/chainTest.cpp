@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Deformers one after the other: positions stay on the device in between.
-#include "host/gpu/PipelineTest.h"
+#include "host/pipeline/PipelineTest.h"
 
 #include <map>
 

@@ -3,7 +3,7 @@
 #pragma once
 
 #include "host/geometry/FilterTest.h"
-#include "host/gpu/gpuDeformers.h"
+#include "host/pipeline/gpuDeformers.h"
 
 #include "openquarn_app/Gpu.h"
 
