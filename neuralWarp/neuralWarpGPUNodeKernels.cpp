@@ -54,7 +54,7 @@ bool neuralWarpGPUNode::uploadSetupBuffers() {
     if (!syncState_.isDirty())
         return true;
     struct Upload {
-        neuralWarpData::Cache slot;
+        unsigned slot; ///< of neuralWarpData::cacheVersions
         const char* name;
         HOpenCLBuffer& buffer;
     };
