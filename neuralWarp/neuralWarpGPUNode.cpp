@@ -13,6 +13,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cmath>
 #include <limits>
 #include <utility>
 
@@ -57,8 +58,6 @@ Status neuralWarpGPUNode::evaluate(HDataBlock& block, const HEvaluationNode& eva
         Status status = prepareEvaluation(block, evaluationNode, outputPlug, inputPlugs, inputData, outputData, event);
         if (status == kDeformerSuccess)
             status = findMorph(block, evaluationNode, inputData);
-        if (status == kDeformerSuccess && isDueOnCpu(block, *data))
-            status = kDeformerFailure;
         std::vector<float> outputs;
         if (status == kDeformerSuccess && deltasActive_)
             status = computeOutputs(block, *data, outputs);
@@ -94,7 +93,7 @@ Status neuralWarpGPUNode::findMorph(HDataBlock& block, const HEvaluationNode& ev
     morphActive_ = !targetPositionsBuffer_.isNull();
     if (!morphActive_)
         raiseMessage<Text::kErrorMLTargetBuffer>(displayErrorGated);
-    if (hidesModel())
+    if (std::abs(morphEnvelope_ - 1.0F) < smallestMorphEnvelope)
         deltasActive_ = false;
     // a target is read by the vertex's index in the geometry: more points do no harm
     const std::size_t points = targetPositionsBuffer_.bufferSize() / sizeof(quill::val3<float>);
@@ -107,20 +106,6 @@ cl_int neuralWarpGPUNode::findTarget(const HEvaluationNode& evaluationNode, cons
     cl_int status = CL_SUCCESS;
     targetPositionsBuffer_ = inputData.getBuffer(target, sPositionsName, &status);
     return status;
-}
-
-bool neuralWarpGPUNode::hidesModel() const {
-    return std::abs(morphEnvelope_ - 1.0F) < smallestMorphEnvelope;
-}
-
-/// A reload or other settings were asked for since the last evaluation on the CPU: the next one there sees to it.
-bool neuralWarpGPUNode::isDueOnCpu(HDataBlock& block, const neuralWarpData& data) const {
-    const bool isLoadDue = data.modelLoadPending && !(morphActive_ && hidesModel());
-    if (data.hasDueCaches() || !(data.modelPathDirty || data.metadataDirty || isLoadDue))
-        return data.hasDueCaches();
-    HStatus status;
-    const HDataHandle model = existingElement(block, neuralWarpNode::models, multiIndex(), status);
-    return !status.error() && model.child(neuralWarpNode::modelActive).asShort() == 1;
 }
 
 Status neuralWarpGPUNode::computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs) {

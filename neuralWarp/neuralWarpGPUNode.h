@@ -48,8 +48,6 @@ private:
     DeformerStatus findMorph(HDataBlock& block, const HEvaluationNode& evaluationNode,
                              const HGPUDeformerData& inputData);
     cl_int findTarget(const HEvaluationNode& evaluationNode, const HGPUDeformerData& inputData);
-    bool hidesModel() const;
-    bool isDueOnCpu(HDataBlock& block, const neuralWarpData& data) const;
     DeformerStatus computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs);
     bool runInference(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs);
     DeformerStatus deformPrepared(const HEvaluationNode& evaluationNode, const neuralWarpData& data,
