@@ -120,8 +120,8 @@ bool neuralWarpGPUNode::areConnectionsUsable() const {
 }
 
 bool neuralWarpGPUNode::areFramesUsable() const {
-    if (deltaMode_ != kSurfaceMode) // the CPU does what is to be done in a mode that is neither
-        return deltaMode_ == kOffsetMode || !deltasActive_;
+    if (deltaMode_ != kSurfaceMode)
+        return true;
     if (framesIndexerBuffer_.bufferSize() == 0 || framesPairsBuffer_.bufferSize() == 0)
         return false;
     const std::size_t count = affectCount();

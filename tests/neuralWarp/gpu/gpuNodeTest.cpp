@@ -82,7 +82,6 @@ TEST_F(GpuTest, AnswersAndSaysWhatIsWrong) {
         {"a basis without the last slot", shapes(1, 8, 27), failure, {}},
         {"a basis that says too much", shapes(1, 10, 27), failure, {}},
         {"other vertices", inState([](Data& d) { d.componentMap.setIdentity(8); }), failure, {}},
-        {"no mode that there is", inState([](Data& d) { d.activeSettings.deltaMode = 2; }), failure, {}},
         {"no frames", inState([](Data& d) { d.vertexFrames = {}; }), failure, {}},
         {"no rest frames", inState([](Data& d) { d.restFramesInverse.clear(); }), failure, {}},
         {"a rest point less", inState([](Data& d) { d.restPoints.pop_back(); }), failure, {}},
