@@ -108,8 +108,6 @@ cl_int neuralWarpGPUNode::findTarget(const HEvaluationNode& evaluationNode, cons
 }
 
 Status neuralWarpGPUNode::computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs) {
-    if (deltaMode_ != kOffsetMode && deltaMode_ != kSurfaceMode) // what that comes to is decided on the CPU
-        return kDeformerFailure;
     if (!runInference(block, data, outputs))
         return kDeformerPassThrough;
     const bool isSameGeometry = data.componentMap.affectCount() == affectCount();
