@@ -28,7 +28,7 @@
 /// anything else in the plug-in: `extern "C" OPENQUARN_API const char HApiVersion[8];`, initialised with this.
 /// The part before the dot changes with every incompatible change, the part after it with every addition.
 #define OPENQUARN_API_VERSION                                                                                          \
-    { '1', '.', '0', '\0', '\0', '\0', '\0', '\0' }
+    { '2', '.', '0', '\0', '\0', '\0', '\0', '\0' }
 
 namespace OpenQuarn {
 class Access; // the runtime's way into the handles

@@ -126,7 +126,7 @@ TEST_F(Loading, TellsWhatIsLoadedAndLoadsAgainAfterUnloading) {
         EXPECT_EQ(info.path, fs::canonical(module("tinyGood")).string());
         EXPECT_EQ(info.vendor, "Tiny Makers");
         EXPECT_EQ(info.version, "3.1");
-        EXPECT_EQ(info.apiVersion, "1.0");
+        EXPECT_EQ(info.apiVersion, "2.0");
         EXPECT_THAT(info.nodeTypes, ElementsAre("tinyNode"));
         EXPECT_THAT(info.dataTypes, ElementsAre("tinyNodeData"));
         EXPECT_THAT(info.commands, ElementsAre("tinyCommand"));
