@@ -2,6 +2,7 @@
 // bench_kernels: every OpenCL kernel on the first device, launched and waited for, beside the library's own code on the
 // same data and beside a kernel that only copies. See Report::legend for the columns.
 #include "harness.h"
+#include "kernelBytes.h"
 #include "kernels/OpenCl.h"
 #include "neuralWarp/deltas.h"
 #include "options.h"
@@ -19,6 +20,7 @@
 
 namespace {
 
+using bench::bytesOf;
 using bench::Phase;
 using kernels::Arguments;
 using kernels::Buffer;
@@ -98,10 +100,6 @@ struct Row {
     std::size_t launches = 1; // in one call
 };
 
-std::size_t bytesOf(std::size_t points, std::size_t words) {
-    return 12 * points + 4 * words;
-}
-
 Row copying(Subject& s, OnDevice& d) {
     Row row{{"copy", "grid", s.n, bytesOf(2 * s.n, 0)}, d.copy.kernel("copy")};
     Arguments(row.kernel.get()).add(d.result).add(d.points).add(static_cast<std::uint32_t>(s.n));
@@ -117,8 +115,9 @@ Row gathering(Subject& s, OnDevice& d) {
 }
 
 Row smoothing(Subject& s, OnDevice& d) {
-    const std::size_t words = s.n + 2 * s.weights.size();
-    Row row{{"smoothing pass", "grid", s.n, bytesOf(2 * s.n, words)}, d.smooth.kernel("averageVertKernel"), 10};
+    Row row{{"smoothing pass", "grid", s.n, bench::smoothingBytes(s.n, s.weights.size())},
+            d.smooth.kernel("averageVertKernel"),
+            10};
     row.phase.perCall = row.launches;
     const std::uint64_t noMask = 0;
     Arguments(row.kernel.get())
@@ -135,7 +134,8 @@ Row smoothing(Subject& s, OnDevice& d) {
 }
 
 Row shapes(Subject& s, OnDevice& d) {
-    Row row{{"principal 50", "grid", s.n, bytesOf(s.n, s.basis.size())}, d.apply.kernel("gpu_principal_shapes_kernel")};
+    Row row{{"principal 50", "grid", s.n, bench::shapesBytes(s.n, shapeCount)},
+            d.apply.kernel("gpu_principal_shapes_kernel")};
     Arguments(row.kernel.get())
         .add(d.deltas)
         .add(d.coefficients)
@@ -158,8 +158,9 @@ void blend(Subject& s) {
 }
 
 Row applying(Subject& s, OnDevice& d, bool surface) {
-    const std::size_t words = surface ? 32 * s.n + s.n + s.frames.framesPairs().size() : 0;
-    Row row{{surface ? "apply surface" : "apply offset", "grid", s.n, bytesOf(surface ? 5 * s.n : 4 * s.n, words)},
+    const std::size_t bytes =
+        surface ? bench::surfaceBytes(s.n, s.frames.framesPairs().size()) : bench::offsetBytes(s.n);
+    Row row{{surface ? "apply surface" : "apply offset", "grid", s.n, bytes},
             d.apply.kernel("gpu_apply_deltas_kernel")};
     const auto n = static_cast<std::uint32_t>(s.n);
     Arguments arguments(row.kernel.get());

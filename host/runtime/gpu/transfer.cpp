@@ -106,6 +106,7 @@ private:
 };
 
 cl_int writePositions(const Positions& positions, Buffer& buffer) {
+    const TimedStep step(*buffer.device, "upload");
     const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
     Mapped mapped(buffer, CL_MAP_WRITE_INVALIDATE_REGION, bytes, nullptr);
     if (mapped.status() != CL_SUCCESS)
@@ -126,7 +127,17 @@ cl_int writePositions(const Positions& positions, Buffer& buffer) {
     return CL_SUCCESS;
 }
 
+/// So that the time of a download is not that of the kernels before it.
+void waitWhenTimed(const Buffer& buffer) {
+    if (!buffer.device->isTimed)
+        return;
+    const TimedStep step(*buffer.device, "wait");
+    noteFailure(clFinish(buffer.device->queue), "clFinish");
+}
+
 cl_int readPositions(const Buffer& buffer, Positions& positions) {
+    waitWhenTimed(buffer);
+    const TimedStep step(*buffer.device, "download");
     const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
     HOpenCLEvent read;
     Mapped mapped(buffer, CL_MAP_READ, bytes, buffer.device->isTimed ? &read : nullptr);
