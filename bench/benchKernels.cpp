@@ -12,7 +12,6 @@
 #include "quill/VertexFrames.h"
 #include "quill/parallelFor.h"
 
-#include <array>
 #include <exception>
 #include <string>
 #include <thread>
@@ -20,7 +19,6 @@
 
 namespace {
 
-using bench::bytesOf;
 using bench::Phase;
 using kernels::Arguments;
 using kernels::Buffer;
@@ -28,6 +26,8 @@ using kernels::Device;
 using Points = std::vector<quill::val3<float>>;
 
 constexpr std::uint32_t shapeCount = 50;
+constexpr std::size_t passes = 10;
+constexpr float envelope = 0.5F;
 
 // What the processor's code runs on.
 struct Subject {
@@ -70,16 +70,17 @@ const char* const copySource = "kernel void copy(global float* to, global const 
 struct OnDevice {
     const Device& device;
     kernels::Program gather{device, "quillBuffers.cl", false}, smooth{device, "quillUtils.cl", true},
-        apply{device, "neuralWarpGPUNode.cl", true};
+        deformer{device, "neuralWarpGPUNode.cl", true};
     kernels::Program copy = kernels::Program::fromText(device, "copy", copySource);
-    Buffer points, result, smoothed, deltas, rest, map, indexer, connections, weights, framesIndexer, framesPairs,
-        restFramesInverse, coefficients, basis;
+    Buffer points, result, smoothed, other, deltas, rest, map, indexer, connections, weights, framesIndexer,
+        framesPairs, restFramesInverse, coefficients, basis;
 
     OnDevice(const Device& deviceIn, const Subject& s)
         : device(deviceIn)
         , points(device, s.points)
         , result(device, s.points)
         , smoothed(device, s.points)
+        , other(device, s.points)
         , deltas(device, s.deltas)
         , rest(device, s.rest)
         , map(device, s.list)
@@ -93,88 +94,122 @@ struct OnDevice {
         , basis(device, s.basis) {}
 };
 
-// One measured kernel, ready to be launched.
+// What is measured in one row: launches one after the other, waited for at the end.
 struct Row {
     Phase phase;
-    kernels::Owned<cl_kernel> kernel;
-    std::size_t launches = 1; // in one call
+    std::vector<kernels::Owned<cl_kernel>> launches{};
 };
 
+Phase phaseOf(const char* name, const Subject& s, std::size_t bytes) {
+    return {name, "grid", s.n, bytes};
+}
+
+kernels::Owned<cl_kernel> gather(const Subject& s, const OnDevice& d) {
+    auto kernel = d.gather.kernel("copyToAffectBuffer");
+    Arguments(kernel.get()).add(d.smoothed).add(d.points).add(d.map).add(static_cast<std::uint32_t>(s.n));
+    return kernel;
+}
+
+kernels::Owned<cl_kernel> smoothingPass(const Subject& s, const OnDevice& d, const Buffer& to, const Buffer& from) {
+    auto kernel = d.smooth.kernel("averageVertKernel");
+    Arguments arguments(kernel.get());
+    arguments.add(to).add(from).add(std::uint64_t{0}).add(1.0F);
+    arguments.add(d.indexer).add(d.connections).add(d.weights).add(static_cast<std::uint32_t>(s.n));
+    return kernel;
+}
+
+kernels::Owned<cl_kernel> principalShapes(const Subject& s, const OnDevice& d) {
+    auto kernel = d.deformer.kernel("gpu_principal_shapes_kernel");
+    Arguments arguments(kernel.get());
+    arguments.add(d.deltas).add(d.coefficients).add(d.basis).add(shapeCount).add(static_cast<std::uint32_t>(s.n));
+    return kernel;
+}
+
+kernels::Owned<cl_kernel> apply(const Subject& s, const OnDevice& d, bool surface) {
+    auto kernel = d.deformer.kernel("gpu_apply_deltas_kernel");
+    const auto n = static_cast<std::uint32_t>(s.n);
+    Arguments arguments(kernel.get());
+    arguments.add(d.result).add(d.points).add(d.smoothed).add(nullptr).add(nullptr).add(envelope);
+    arguments.add(d.deltas).add(nullptr).add(n);
+    for (const Buffer* buffer : {&d.framesIndexer, &d.framesPairs, &d.rest, &d.restFramesInverse})
+        arguments.add(surface ? buffer : nullptr);
+    arguments.add(nullptr).add(0.0F).add(n);
+    return kernel;
+}
+
 Row copying(Subject& s, OnDevice& d) {
-    Row row{{"copy", "grid", s.n, bytesOf(2 * s.n, 0)}, d.copy.kernel("copy")};
-    Arguments(row.kernel.get()).add(d.result).add(d.points).add(static_cast<std::uint32_t>(s.n));
+    Row row{phaseOf("copy", s, bench::bytesOf(2 * s.n, 0))};
+    row.launches.push_back(d.copy.kernel("copy"));
+    Arguments(row.launches[0].get()).add(d.result).add(d.points).add(static_cast<std::uint32_t>(s.n));
     row.phase.plain = [&s] { quill::parallelFor(s.n, [&](std::size_t i) { s.result[i] = s.points[i]; }); };
     return row;
 }
 
 Row gathering(Subject& s, OnDevice& d) {
-    Row row{{"gather", "grid", s.n, bytesOf(2 * s.n, s.n)}, d.gather.kernel("copyToAffectBuffer")};
-    Arguments(row.kernel.get()).add(d.result).add(d.points).add(d.map).add(static_cast<std::uint32_t>(s.n));
+    Row row{phaseOf("gather", s, bench::bytesOf(2 * s.n, s.n))};
+    row.launches.push_back(gather(s, d));
     row.phase.plain = [&s] { quill::parallelFor(s.n, [&](std::size_t i) { s.result[i] = s.points[s.list[i]]; }); };
     return row;
 }
 
+void smooth(Subject& s) {
+    s.connections.mushArray(s.smoothed, s.scratch, passes, 1.0F, nullptr, &s.weights, false);
+}
+
 Row smoothing(Subject& s, OnDevice& d) {
-    Row row{{"smoothing pass", "grid", s.n, bench::smoothingBytes(s.n, s.weights.size())},
-            d.smooth.kernel("averageVertKernel"),
-            10};
-    row.phase.perCall = row.launches;
-    const std::uint64_t noMask = 0;
-    Arguments(row.kernel.get())
-        .add(d.result)
-        .add(d.smoothed)
-        .add(&noMask, sizeof noMask)
-        .add(1.0F)
-        .add(d.indexer)
-        .add(d.connections)
-        .add(d.weights)
-        .add(static_cast<std::uint32_t>(s.n));
-    row.phase.plain = [&s] { s.connections.mushArray(s.smoothed, s.scratch, 10, 1.0F, nullptr, &s.weights, false); };
+    Row row{phaseOf("smoothing pass", s, bench::smoothingBytes(s.n, s.weights.size()))};
+    row.phase.perCall = passes;
+    for (std::size_t pass = 0; pass < passes; ++pass)
+        row.launches.push_back(smoothingPass(s, d, pass % 2 ? d.smoothed : d.other, pass % 2 ? d.other : d.smoothed));
+    row.phase.plain = [&s] { smooth(s); };
     return row;
+}
+
+void extract(Subject& s) {
+    neuralWarp::extractPrincipalDeltas(s.deltas, s.coefficients, shapeCount, s.basis,
+                                       neuralWarp::DrivenVertices(s.data));
 }
 
 Row shapes(Subject& s, OnDevice& d) {
-    Row row{{"principal 50", "grid", s.n, bench::shapesBytes(s.n, shapeCount)},
-            d.apply.kernel("gpu_principal_shapes_kernel")};
-    Arguments(row.kernel.get())
-        .add(d.deltas)
-        .add(d.coefficients)
-        .add(d.basis)
-        .add(shapeCount)
-        .add(static_cast<std::uint32_t>(s.n));
-    row.phase.plain = [&s] {
-        neuralWarp::extractPrincipalDeltas(s.deltas, s.coefficients, shapeCount, s.basis,
-                                           neuralWarp::DrivenVertices(s.data));
-    };
+    Row row{phaseOf("principal 50", s, bench::shapesBytes(s.n, shapeCount))};
+    row.launches.push_back(principalShapes(s, d));
+    row.phase.plain = [&s] { extract(s); };
     return row;
 }
 
-// The processor blends as the kernel does: in single precision.
-void blend(Subject& s) {
+// By the library, and a blend in single precision as the kernel's.
+void applyOnProcessor(Subject& s, bool surface) {
+    if (surface)
+        s.frames.transportDeltas(s.scratch, s.deltas, s.rest, s.restFramesInverse, s.smoothed, nullptr);
+    else
+        quill::parallelFor(s.n, [&](std::size_t i) { s.scratch[i] = s.smoothed[i] + s.deltas[i]; });
     quill::parallelFor(s.n, [&](std::size_t i) {
         const auto p = s.points[i];
-        s.result[i] = p + 0.5F * (s.scratch[i] - p);
+        s.result[i] = p + envelope * (s.scratch[i] - p);
     });
 }
 
 Row applying(Subject& s, OnDevice& d, bool surface) {
     const std::size_t bytes =
         surface ? bench::surfaceBytes(s.n, s.frames.framesPairs().size()) : bench::offsetBytes(s.n);
-    Row row{{surface ? "apply surface" : "apply offset", "grid", s.n, bytes},
-            d.apply.kernel("gpu_apply_deltas_kernel")};
-    const auto n = static_cast<std::uint32_t>(s.n);
-    Arguments arguments(row.kernel.get());
-    arguments.add(d.result).add(d.points).add(d.smoothed).add(nullptr).add(nullptr).add(0.5F);
-    arguments.add(d.deltas).add(nullptr).add(n);
-    for (const Buffer* buffer : {&d.framesIndexer, &d.framesPairs, &d.rest, &d.restFramesInverse})
-        arguments.add(surface ? buffer : nullptr);
-    arguments.add(nullptr).add(0.0F).add(n);
-    row.phase.plain = [&s, surface] {
-        if (surface)
-            s.frames.transportDeltas(s.scratch, s.deltas, s.rest, s.restFramesInverse, s.smoothed, nullptr);
-        else
-            quill::parallelFor(s.n, [&](std::size_t i) { s.scratch[i] = s.smoothed[i] + s.deltas[i]; });
-        blend(s);
+    Row row{phaseOf(surface ? "apply surface" : "apply offset", s, bytes)};
+    row.launches.push_back(apply(s, d, surface));
+    row.phase.plain = [&s, surface] { applyOnProcessor(s, surface); };
+    return row;
+}
+
+// All that one frame launches in surface mode with shapes and smoothing.
+Row wholeFrame(Subject& s, OnDevice& d) {
+    Row row{phaseOf("frame", s, 0)};
+    row.launches = smoothing(s, d).launches;
+    row.launches.insert(row.launches.begin(), gather(s, d));
+    row.launches.push_back(principalShapes(s, d));
+    row.launches.push_back(apply(s, d, true));
+    row.phase.plain = [&s] {
+        quill::parallelFor(s.n, [&](std::size_t i) { s.smoothed[i] = s.points[s.list[i]]; });
+        smooth(s);
+        extract(s);
+        applyOnProcessor(s, true);
     };
     return row;
 }
@@ -182,15 +217,19 @@ Row applying(Subject& s, OnDevice& d, bool surface) {
 void runSize(const Device& device, std::size_t side, const bench::Options& options, bench::Report& report) {
     Subject s(side);
     OnDevice d(device, s);
-    std::array<Row, 6> rows{copying(s, d), gathering(s, d),       smoothing(s, d),
-                            shapes(s, d),  applying(s, d, false), applying(s, d, true)};
-    for (Row& row : rows)
+    const Row rows[] = {copying(s, d),         gathering(s, d),      smoothing(s, d), shapes(s, d),
+                        applying(s, d, false), applying(s, d, true), wholeFrame(s, d)};
+    for (const Row& row : rows)
         for (const std::size_t local : {64U, 128U, 256U}) {
             Phase phase = row.phase;
             phase.name += "/" + std::to_string(local);
             if (!options.wants(phase.name) || (options.isQuick && local != 64))
                 continue;
-            phase.ours = [&, local] { kernels::launch(device, row.kernel.get(), s.n, local, row.launches); };
+            phase.ours = [&, local] {
+                for (const auto& kernel : row.launches)
+                    kernels::enqueue(device, kernel.get(), s.n, local);
+                kernels::finish(device);
+            };
             report.add(bench::measure(phase, std::thread::hardware_concurrency(), options.seconds));
         }
 }
@@ -217,7 +256,8 @@ int main(int argc, char** argv) {
         return 1;
     }
     bench::Report::legend("the library's own code for the processor (for copy and gather: a plain loop)");
-    std::puts("A phase is KERNEL/LOCAL SIZE. A kernel's time is from its launch until it is waited for.");
+    std::puts("frame: gathering, 10 smoothing passes, the principal shapes and the surface mode, in one go");
+    std::puts("A phase is KERNEL/LOCAL SIZE. Times are from a launch until it is waited for.");
     std::printf("CSV: %s\n", options->csvPath.c_str());
     return 0;
 }

@@ -2,16 +2,13 @@
 #include "quillDoubles.clh"
 #include "quillVertexFrames.clh"
 
-// No model slot belongs to the vertex.
-#define NO_SLOT 0xffffffffu
-
 // deltas[m] = the sum over the shapes j of coefficients[j] * basis[m][j].
 //   deltas        [slotCount][3]
 //   coefficients  [shapeCount]
 //   basis         [slotCount][shapeCount][3]
 kernel void gpu_principal_shapes_kernel(global float* restrict deltas, global const float* restrict coefficients,
                                         global const float* restrict basis, uint shapeCount, uint slotCount) {
-    const uint m = get_global_id(0);
+    const uint m = (uint)get_global_id(0);
     if (m >= slotCount)
         return;
     global const float* shapes = basis + (size_t)m * shapeCount * 3;
@@ -40,7 +37,7 @@ QuillFrame loadMatrix(global const ulong* matrices, uint i) {
 //   weights           [count]; null: all 1
 //   affectMap         [count] vertex of each affected index; null: the index itself
 //   deltas            [slotCount][3]; null: no model
-//   slots             [count] slot of each affected index or NO_SLOT; null: the index itself
+//   slots             [count] slot of each affected index, not below slotCount for none; null: the index itself
 //   framesIndexer, framesPairs, restPoints, restFramesInverse
 //                     [count + 1], [pairs][2], [count][3], [count][4][4] doubles; all null: deltas are offsets
 //   target            [vertices of the geometry][3]; null: no morph
@@ -50,16 +47,16 @@ kernel void gpu_apply_deltas_kernel(global float* restrict output, global const 
                                     global const float* restrict deltas, global const uint* restrict slots,
                                     uint slotCount, global const uint* restrict framesIndexer,
                                     global const uint* restrict framesPairs, global const float* restrict restPoints,
-                                    global const ulong* restrict restFramesInverse,
-                                    global const float* restrict target, float morphEnvelope, uint count) {
-    const uint i = get_global_id(0);
+                                    global const ulong* restrict restFramesInverse, global const float* restrict target,
+                                    float morphEnvelope, uint count) {
+    const uint i = (uint)get_global_id(0);
     if (i >= count)
         return;
     const uint g = affectMap ? affectMap[i] : i;
     const float4 p = quillLoad(input, g);
     float4 c = p;
     const uint m = slots ? slots[i] : i;
-    if (deltas && m != NO_SLOT && m < slotCount) {
+    if (deltas && m < slotCount) {
         const float4 delta = quillLoad(deltas, m);
         if (framesIndexer) {
             const float4 q = quillTransform(quillLoad(restPoints, i) + delta, loadMatrix(restFramesInverse, i));

@@ -7,7 +7,7 @@
 //   map       [count] vertex of each affected index; null: the index itself
 kernel void copyToAffectBuffer(global float* restrict affected, global const float* restrict input,
                                global const uint* restrict map, uint count) {
-    const uint i = get_global_id(0);
+    const uint i = (uint)get_global_id(0);
     if (i >= count)
         return;
     vstore3(vload3(map ? map[i] : i, input), i, affected);

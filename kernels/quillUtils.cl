@@ -12,7 +12,7 @@ kernel void averageVertKernel(global float* restrict destination, global const f
                               global const uchar* restrict mask, float step, global const uint* restrict indexer,
                               global const uint* restrict connections, global const float* restrict weights,
                               uint count) {
-    const uint i = get_global_id(0);
+    const uint i = (uint)get_global_id(0);
     if (i >= count)
         return;
     const uint first = indexer[i];

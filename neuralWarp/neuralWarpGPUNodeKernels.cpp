@@ -72,7 +72,7 @@ bool neuralWarpGPUNode::uploadSetupBuffers() {
     cl_int status = CL_SUCCESS;
     unsigned elements = 0;
     for (const Upload& upload : uploads)
-        if (syncState_.isDirty(upload.slot))
+        if (syncState_.isDirty(static_cast<unsigned>(upload.slot)))
             uploadFixedSetupData(upload.name, upload.buffer, status, elements);
     if (status == CL_SUCCESS)
         syncState_.uploaded = syncState_.captured;

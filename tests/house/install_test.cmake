@@ -12,6 +12,12 @@ must_run(${CMAKE_COMMAND} --install "${BUILD}" --prefix "${WORK}/prefix")
 if(NOT EXISTS "${WORK}/prefix/share/doc/neuralWarp/LICENSE")
   message(FATAL_ERROR "the licence is not installed")
 endif()
+file(GLOB installed RELATIVE "${WORK}/prefix/share/OpenQuarn/GPUBuiltInDeformer/kernels"
+  "${WORK}/prefix/share/OpenQuarn/GPUBuiltInDeformer/kernels/*")
+file(GLOB kernels RELATIVE "${CMAKE_CURRENT_LIST_DIR}/../../kernels" "${CMAKE_CURRENT_LIST_DIR}/../../kernels/*.cl*")
+if(NOT installed STREQUAL kernels)
+  message(FATAL_ERROR "kernels installed: ${installed}\nsources of kernels: ${kernels}")
+endif()
 
 # moved after the installation: a package that remembers where it was installed does not survive that
 file(RENAME "${WORK}/prefix" "${WORK}/moved")

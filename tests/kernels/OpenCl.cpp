@@ -30,7 +30,7 @@ cl_device_id firstDevice() {
     cl_uint count = 0;
     if (clGetPlatformIDs(16, platforms, &count) != CL_SUCCESS)
         return nullptr;
-    for (const cl_platform_id platform : std::span(platforms, std::min(count, 16U)))
+    for (cl_platform_id platform : std::span(platforms, std::min(count, 16U)))
         if (cl_device_id id = nullptr; clGetDeviceIDs(platform, CL_DEVICE_TYPE_ALL, 1, &id, nullptr) == CL_SUCCESS)
             return id;
     return nullptr;
@@ -41,6 +41,10 @@ cl_device_id firstDevice() {
 void check(cl_int status, const char* call) {
     if (status != CL_SUCCESS)
         throw std::runtime_error(std::string(call) + ": " + std::to_string(status));
+}
+
+const char* folder() {
+    return NW_KERNELS;
 }
 
 std::unique_ptr<Device> Device::first() {
@@ -107,8 +111,7 @@ Buffer::Buffer(const Device& device, const void* contents, std::size_t bytes)
     check(status, "clCreateBuffer");
     // nothing has no region of its own: a byte of the guard stands for it
     const cl_buffer_region region{guardBytes, std::max<std::size_t>(bytes, 1)};
-    payload_.reset(
-        clCreateSubBuffer(whole_.get(), CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION, &region, &status));
+    payload_.reset(clCreateSubBuffer(whole_.get(), CL_MEM_READ_WRITE, CL_BUFFER_CREATE_TYPE_REGION, &region, &status));
     check(status, "clCreateSubBuffer");
     write(contents);
 }
@@ -142,8 +145,8 @@ bool Buffer::isUnchanged() const {
 }
 
 Arguments& Arguments::add(const Buffer* buffer) {
-    const cl_mem handle = buffer ? buffer->handle() : nullptr;
-    return add(&handle, sizeof handle);
+    cl_mem handle = buffer ? buffer->handle() : nullptr;
+    return add(&handle, sizeof(cl_mem));
 }
 
 Arguments& Arguments::add(const void* value, std::size_t size) {
@@ -151,11 +154,13 @@ Arguments& Arguments::add(const void* value, std::size_t size) {
     return *this;
 }
 
-void launch(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local, std::size_t times) {
+void enqueue(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local) {
     const std::size_t global = (n + local - 1) / local * local;
-    for (std::size_t i = 0; i < times; ++i)
-        check(clEnqueueNDRangeKernel(device.queue.get(), kernel, 1, nullptr, &global, &local, 0, nullptr, nullptr),
-              "clEnqueueNDRangeKernel");
+    check(clEnqueueNDRangeKernel(device.queue.get(), kernel, 1, nullptr, &global, &local, 0, nullptr, nullptr),
+          "clEnqueueNDRangeKernel");
+}
+
+void finish(const Device& device) {
     check(clFinish(device.queue.get()), "clFinish");
 }
 

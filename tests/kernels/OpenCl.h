@@ -29,6 +29,9 @@ using Owned = std::unique_ptr<std::remove_pointer_t<Handle>, Release>;
 
 void check(cl_int status, const char* call);
 
+// Where the sources are.
+const char* folder();
+
 // The first device of any kind, with an in-order queue.
 struct Device {
     // Null when there is none.
@@ -96,6 +99,7 @@ public:
     Arguments& add(const Buffer* buffer); // null: a null buffer
     Arguments& add(const Buffer& buffer) { return add(&buffer); }
     Arguments& add(std::uint32_t value) { return add(&value, sizeof value); }
+    Arguments& add(std::uint64_t value) { return add(&value, sizeof value); }
     Arguments& add(float value) { return add(&value, sizeof value); }
     Arguments& add(const void* value, std::size_t size);
 
@@ -104,8 +108,8 @@ private:
     cl_uint index_ = 0;
 };
 
-// One work item for each of n elements, and as many beyond as fill the last group of `local`, one or several times over;
-// waits for them.
-void launch(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local, std::size_t times = 1);
+// One work item for each of n elements, and as many beyond as fill the last group of `local`.
+void enqueue(const Device& device, cl_kernel kernel, std::size_t n, std::size_t local);
+void finish(const Device& device);
 
 } // namespace kernels

@@ -36,7 +36,7 @@ HOpenCLBuffer::Impl::~Impl() {
 cl_int HOpenCLBuffer::Impl::waitForCopy() {
     if (copyRead.isNull())
         return CL_SUCCESS;
-    const cl_event event = copyRead.get();
+    cl_event event = copyRead.get();
     const cl_int status = noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
     if (status == CL_SUCCESS || status == CL_EXEC_STATUS_ERROR_FOR_EVENTS_IN_WAIT_LIST) // it is over, either way
         copyRead.reset();

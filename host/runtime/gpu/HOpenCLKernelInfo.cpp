@@ -89,8 +89,8 @@ void HOpenCLKernelInfo::reset() noexcept {
 }
 
 void HOpenCLKernelInfo::setKernelArgBuffer(cl_uint index, const HOpenCLBuffer& buffer, cl_int& status, bool isValid) {
-    const cl_mem memory = isValid ? buffer.get() : nullptr;
-    HOpenCLUtils::setKernelArg(*this, index, sizeof memory, &memory, status);
+    cl_mem memory = isValid ? buffer.get() : nullptr;
+    HOpenCLUtils::setKernelArg(*this, index, sizeof(cl_mem), &memory, status);
 }
 
 cl_int HOpenCLKernelInfo::enqueueKernel(const HOpenCLEventList& waitFor, HOpenCLEvent* done) {

@@ -7,12 +7,10 @@
 
 #include <algorithm>
 #include <atomic>
-#include <compare>
 #include <filesystem>
 #include <map>
 #include <mutex>
-#include <stdexcept>
-#include <string_view>
+#include <tuple>
 #include <utility>
 #include <vector>
 
@@ -24,7 +22,10 @@ struct Key {
     std::vector<std::string> folders;
     bool hasDoubles;
     const Device* device; // which the program keeps
-    auto operator<=>(const Key&) const = default;
+    bool operator<(const Key& other) const {
+        return std::tie(file, folders, hasDoubles, device) <
+               std::tie(other.file, other.folders, other.hasDoubles, other.device);
+    }
 };
 
 // A program, or the text of its compiler: one of them is there.

@@ -39,14 +39,9 @@ cl_int writeOwnCopy(Buffer& buffer, std::size_t bytes, const void* data, HOpenCL
     if (status != CL_SUCCESS)
         return status;
     std::memcpy(buffer.copy.get(), data, bytes);
-    status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), written);
-    if (status != CL_SUCCESS)
-        return status;
-    buffer.copyRead = written;
-    if (!buffer.copyRead.isNull())
-        return CL_SUCCESS;
-    const cl_event event = written.get(); // the event could not be kept, so nobody could wait for it later
-    return noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
+    status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), buffer.copyRead);
+    written = buffer.copyRead; // a copy that cannot be made is noted; the queue keeps the order without it
+    return status;
 }
 
 cl_int writeAll(HOpenCLBuffer& buffer, std::string_view name, std::size_t bytes, const void* data, int mode) {

@@ -29,7 +29,7 @@ public:
         if (uploadPositions(*in, positions_) != CL_SUCCESS || !kernel_.loadOrUpdate(file_, "count", 3))
             return false;
         HOpenCLEvent done;
-        if (HOpenCLUtils::uploadToGPU(sizeof add_, &add_, add, HOpenCLUtils::kCopyData) != CL_SUCCESS ||
+        if (HOpenCLUtils::uploadToGPU(sizeof seven_, &seven_, add_, HOpenCLUtils::kCopyData) != CL_SUCCESS ||
             enqueue(done) != CL_SUCCESS)
             return false;
         positions_.setBufferReadyEvent(done);
@@ -44,7 +44,7 @@ public:
     }
     void reset() {
         positions_.reset();
-        add.reset();
+        add_.reset();
         kernel_.reset();
     }
 
@@ -53,17 +53,17 @@ private:
         cl_int status = CL_SUCCESS;
         const cl_uint count = 3;
         kernel_.setKernelArgBuffer(0, positions_, status);
-        kernel_.setKernelArgBuffer(1, add, status);
+        kernel_.setKernelArgBuffer(1, add_, status);
         HOpenCLUtils::setKernelArg(kernel_, 2, sizeof count, &count, status);
         if (status != CL_SUCCESS)
             return status;
-        return kernel_.enqueueKernel({positions_.bufferReadyEvent(), add.bufferReadyEvent()}, &done);
+        return kernel_.enqueueKernel({positions_.bufferReadyEvent(), add_.bufferReadyEvent()}, &done);
     }
 
     const HString file_;
-    const int add_ = 7;
+    const int seven_ = 7;
     HOpenCLBuffer positions_;
-    HOpenCLBuffer add;
+    HOpenCLBuffer add_;
     HOpenCLKernelInfo kernel_;
 };
 

@@ -3,7 +3,10 @@
 
 #include <gmock/gmock.h>
 
+#include <array>
+#include <functional>
 #include <numeric>
+#include <thread>
 
 using namespace OpenQuarn;
 using testing::AllOf;
@@ -75,12 +78,12 @@ TEST_F(GpuKernels, TakeNullBuffersAndKeepTheFirstFailure) {
         bool isValid;
         int expected;
     } cases[] = {{to, true, 2}, {to, false, 3}, {{}, true, 3}};
-    const cl_mem null = nullptr;
+    cl_mem null = nullptr;
     for (const auto& arguments : cases) {
         cl_int status = CL_SUCCESS;
         kernel.setKernelArgBuffer(0, to, status);
         kernel.setKernelArgBuffer(1, arguments.a, status, arguments.isValid);
-        HOpenCLUtils::setKernelArg(kernel, 2, sizeof null, &null, status);
+        HOpenCLUtils::setKernelArg(kernel, 2, sizeof(cl_mem), &null, status);
         ASSERT_EQ(status, CL_SUCCESS);
         ASSERT_EQ(kernel.enqueueKernel({}, nullptr), CL_SUCCESS);
         EXPECT_EQ(contents<int>(to, 1).front(), arguments.expected);
@@ -91,12 +94,12 @@ TEST_F(GpuKernels, TakeNullBuffersAndKeepTheFirstFailure) {
     EXPECT_EQ(status, CL_INVALID_ARG_INDEX);
     const std::uint64_t calls = clshim::calls();
     kernel.setKernelArgBuffer(0, to, status);
-    HOpenCLUtils::setKernelArg(kernel, 1, sizeof null, &null, status);
+    HOpenCLUtils::setKernelArg(kernel, 1, sizeof(cl_mem), &null, status);
     EXPECT_EQ(status, CL_INVALID_ARG_INDEX);
     EXPECT_EQ(clshim::calls(), calls);
     EXPECT_EQ(takeFailure(), "clSetKernelArg: CL_INVALID_ARG_INDEX (-49), argument 3");
     status = CL_SUCCESS;
-    HOpenCLUtils::setKernelArg(HOpenCLKernelInfo(), 0, sizeof null, &null, status);
+    HOpenCLUtils::setKernelArg(HOpenCLKernelInfo(), 0, sizeof(cl_mem), &null, status);
     EXPECT_EQ(status, CL_INVALID_KERNEL);
     takeFailure();
 }
@@ -214,6 +217,20 @@ TEST_F(GpuKernels, ABrokenTextIsCompiledOnceAndAFailureOfTheDeviceIsNotKept) {
     EXPECT_EQ(clshim::failedCall(), "clBuildProgram");
     EXPECT_THAT(takeFailure(), AllOf(HasSubstr("clBuildProgram: CL_OUT_OF_HOST_MEMORY (-6)"), HasSubstr("b.cl")));
     EXPECT_EQ(answerOf(other), 6);
+}
+
+TEST_F(GpuKernels, AreCompiledOnceForAllThreads) {
+    const HString file = writeAnswer("a.cl", "", "5");
+    const std::uint64_t before = clshim::calls("clBuildProgram");
+    std::array<int, 4> answers = {};
+    std::vector<std::thread> threads;
+    threads.reserve(answers.size());
+    for (int& answer : answers)
+        threads.emplace_back([&] { answer = answerOf(file); });
+    for (std::thread& thread : threads)
+        thread.join();
+    EXPECT_THAT(answers, testing::Each(5));
+    EXPECT_EQ(clshim::calls("clBuildProgram"), before + 1);
 }
 
 TEST_F(GpuKernels, KnowWhetherThereAreDoubles) {

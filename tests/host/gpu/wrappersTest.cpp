@@ -35,7 +35,7 @@ TEST_F(GpuBuffers, OnlyGrowAndAreSharedByCopies) {
     } steps[] = {{12, 12, false}, {4, 12, true}, {12, 12, true}, {0, 12, true}, {100, 100, false}, {99, 100, true}};
     for (const auto& step : steps) {
         SCOPED_TRACE(step.asked);
-        const cl_mem before = buffer.get();
+        const auto* before = buffer.get();
         const HOpenCLBuffer copy = buffer;
         ASSERT_EQ(buffer.ensureBufferSize(step.asked), CL_SUCCESS);
         EXPECT_EQ(buffer.bufferSize(), step.asked);
@@ -117,7 +117,7 @@ TEST_F(GpuUploads, MayKeepTheDataAndMayBeEmpty) {
     HOpenCLBuffer buffer;
     const std::vector<int> data = {1, 2, 3};
     ASSERT_EQ(upload(data, buffer, HOpenCLUtils::kKeepData), CL_SUCCESS);
-    const cl_event ready = buffer.bufferReadyEvent().get();
+    cl_event ready = buffer.bufferReadyEvent().get();
     EXPECT_EQ(clWaitForEvents(1, &ready), CL_SUCCESS);
     EXPECT_EQ(contents<int>(buffer, 3), data);
 
