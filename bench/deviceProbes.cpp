@@ -70,7 +70,8 @@ DeviceProbes::DeviceProbes()
 
 double DeviceProbes::timeEmptyLaunch() {
     const auto start = std::chrono::steady_clock::now();
-    kernels::launch(device_, empty_.get(), 1, localSize);
+    kernels::enqueue(device_, empty_.get(), 1, localSize);
+    kernels::finish(device_);
     return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
 }
 
