@@ -19,6 +19,7 @@ namespace {
 using Buffer = HOpenCLBuffer::Impl;
 
 constexpr std::size_t bytesPerVertex = 3 * sizeof(float);
+constexpr std::size_t small = std::size_t{1} << 18U; // copied through the host's own memory; what is more is mapped
 
 Buffer& implOf(const HOpenCLBuffer& buffer) {
     return *Access::impl(buffer);
@@ -131,7 +132,6 @@ cl_int writeMapped(const Positions& positions, Buffer& buffer, std::size_t bytes
 
 // To map means to wait for the device, which takes longer than to copy what is small.
 cl_int writePositions(const Positions& positions, Buffer& buffer) {
-    constexpr std::size_t small = std::size_t{1} << 18U;
     const TimedStep step(*buffer.device, "upload");
     const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
     HOpenCLEvent written;
@@ -145,7 +145,7 @@ cl_int writePositions(const Positions& positions, Buffer& buffer) {
     return CL_SUCCESS;
 }
 
-/// So that the time of a download is not that of the kernels before it.
+// So that the time of a download is not that of the kernels before it.
 void waitWhenTimed(const Buffer& buffer) {
     if (!buffer.device->isTimed)
         return;
@@ -153,23 +153,48 @@ void waitWhenTimed(const Buffer& buffer) {
     noteFailure(clFinish(buffer.device->queue), "clFinish");
 }
 
-cl_int readPositions(const Buffer& buffer, Positions& positions) {
-    waitWhenTimed(buffer);
-    const TimedStep step(*buffer.device, "download");
-    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
-    HOpenCLEvent read;
-    Mapped mapped(buffer, CL_MAP_READ, bytes, buffer.device->isTimed ? &read : nullptr);
-    if (mapped.status() != CL_SUCCESS)
-        return mapped.status();
-    const float* from = mapped.floats();
+void widen(const float* from, Positions& positions) {
     double* to = positions.xyz();
     forRanges(positions.vertexCount(), [=](std::size_t begin, std::size_t end) {
         for (std::size_t i = 3 * begin; i < 3 * end; ++i)
             to[i] = from[i];
     });
-    countDownload(bytes);
-    timeCommand(*buffer.device, "download", read.get());
+}
+
+cl_int readCopy(Buffer& buffer, std::size_t bytes, Positions& positions, HOpenCLEvent* read) {
+    cl_int status = buffer.takeCopy(bytes);
+    if (status != CL_SUCCESS)
+        return status;
+    const HOpenCLEventList waitFor = {buffer.ready};
+    status = clEnqueueReadBuffer(buffer.device->queue, buffer.memory, CL_TRUE, 0, bytes, buffer.copy.get(),
+                                 waitFor.length(), waitFor.data(), read ? read->receive() : nullptr);
+    if (status == CL_SUCCESS)
+        widen(reinterpret_cast<const float*>(buffer.copy.get()), positions);
+    return noteFailure(status, "clEnqueueReadBuffer", "download");
+}
+
+cl_int readMapped(const Buffer& buffer, std::size_t bytes, Positions& positions, HOpenCLEvent* read) {
+    Mapped mapped(buffer, CL_MAP_READ, bytes, read);
+    if (mapped.status() != CL_SUCCESS)
+        return mapped.status();
+    widen(mapped.floats(), positions);
     return mapped.unmap(nullptr);
+}
+
+// What is mapped has to be given back, which is another command for the device.
+cl_int readPositions(Buffer& buffer, Positions& positions) {
+    waitWhenTimed(buffer);
+    const TimedStep step(*buffer.device, "download");
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    HOpenCLEvent event;
+    HOpenCLEvent* read = buffer.device->isTimed ? &event : nullptr;
+    const cl_int status =
+        bytes <= small ? readCopy(buffer, bytes, positions, read) : readMapped(buffer, bytes, positions, read);
+    if (status != CL_SUCCESS)
+        return status;
+    countDownload(bytes);
+    timeCommand(*buffer.device, "download", event.get());
+    return CL_SUCCESS;
 }
 
 } // namespace

@@ -214,8 +214,10 @@ TEST_F(GpuCounting, NamesWhatHappenedAndMeasuresWhenAsked) {
         if (isTimed) {
             EXPECT_THAT(counts.seconds, ElementsAre(Pair("count", testing::Gt(0)), Pair("download", testing::Ge(0)),
                                                     Pair("upload", testing::Gt(0))));
+            EXPECT_THAT(counts.hostSeconds, ElementsAre(Pair("download", testing::Gt(0)),
+                                                        Pair("upload", testing::Gt(0)), Pair("wait", testing::Ge(0))));
         } else {
-            EXPECT_TRUE(counts.seconds.empty());
+            EXPECT_TRUE(counts.seconds.empty() && counts.hostSeconds.empty());
         }
     }
     Gpu::resetCounts();
