@@ -23,7 +23,7 @@ public:
         return *this;
     }
     /// A buffer that the kernel can do without, and that there never is.
-    KernelCall& nullBuffer() { return value<cl_mem>(nullptr); }
+    KernelCall& nullBuffer() { return buffer({}, false); }
     template <class Value>
     KernelCall& value(Value value) {
         HOpenCLUtils::setKernelArg(kernel_, index_++, sizeof value, &value, status_);

@@ -127,6 +127,11 @@ void neuralWarpData::releaseUnusedCaches() {
     }
 }
 
+bool neuralWarpData::hasDueCaches() const {
+    return indexMapDirty || ((framesTopologyDirty || restFramesDirty) && activeSettings.isSurface()) ||
+           (connectionsDirty && activeSettings.isSmoothed());
+}
+
 bool neuralWarpData::canApplyModel() const {
     return session.lastResult() == LoadResult::Loaded && session.isLoaded() && modelValid;
 }

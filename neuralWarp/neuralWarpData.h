@@ -56,6 +56,8 @@ public:
     void releaseUnusedCaches();
     /// The network can be run, and was trained on this geometry.
     bool canApplyModel() const;
+    /// Some rest cache is due, and the settings in force have a use for it.
+    bool hasDueCaches() const;
     /// The model is in use and drives none of the deformed vertices.
     bool drivesNothing() const { return useAffectMap && affectMap.empty(); }
     /// The model drives deformed vertex `i`. False for an index that no vertex has.

@@ -24,8 +24,8 @@ public:
 
     using HPxGPUStandardDeformer::evaluate;
     /// kDeformerPassThrough in export mode, and when the network cannot be run, which is then shown; kDeformerFailure,
-    /// without a message, when something on the device fails and when the outputs or the target are too small: the
-    /// evaluation on the CPU, which follows, says so. [eval]
+    /// without a message, when something on the device fails, when the outputs or the target are too small, and when
+    /// something was asked for that only an evaluation on the CPU does: that one follows, and says so. [eval]
     DeformerStatus evaluate(HDataBlock& block, const HEvaluationNode& evaluationNode, const HPlug& outputPlug,
                             const HPlugArray& inputPlugs, const HGPUDeformerData& inputData,
                             HGPUDeformerData& outputData) override;

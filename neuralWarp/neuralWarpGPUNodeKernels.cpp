@@ -54,7 +54,7 @@ bool neuralWarpGPUNode::uploadSetupBuffers() {
     if (!syncState_.isDirty())
         return true;
     struct Upload {
-        neuralWarpData::Cache slot;
+        unsigned slot; ///< of neuralWarpData::cacheVersions
         const char* name;
         HOpenCLBuffer& buffer;
     };
@@ -116,7 +116,6 @@ bool neuralWarpGPUNode::areConnectionsUsable() const {
     if (smoothingIterations_ <= 0)
         return true;
     return holds(connectionsIndexerBuffer_, std::size_t{affectCount()} + 1, sizeof(cl_uint)) &&
-           connectionsBuffer_.bufferSize() != 0 &&
            connectionWeightsBuffer_.bufferSize() == connectionsBuffer_.bufferSize();
 }
 

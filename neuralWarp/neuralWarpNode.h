@@ -49,6 +49,8 @@ public:
     /// What decides whether the model is applied, which the GPU deformer takes from the last evaluation on the CPU.
     /// [eval]
     void primingAttributes(HObjectArray& attributes) const override;
+    /// A reload or other settings were asked for since the last evaluation on the CPU. [eval]
+    bool isDueOnCpu(HDataBlock& block, unsigned multiIndex) override;
 
     // --- what the command calls ---
 

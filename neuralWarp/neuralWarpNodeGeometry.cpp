@@ -21,13 +21,6 @@ namespace {
 /// Below this, a target morph is off.
 constexpr double smallestMorphEnvelope = 1e-6;
 
-/// Some rest cache is due, and the settings in force have a use for it.
-bool needsWork(const neuralWarpData& data) {
-    return data.indexMapDirty ||
-           ((data.framesTopologyDirty || data.restFramesDirty) && data.activeSettings.isSurface()) ||
-           (data.connectionsDirty && data.activeSettings.isSmoothed());
-}
-
 HStatus invalidRest() {
     raiseMessage<Text::kErrorMLOriginalGeomInvalid>(displayErrorGated);
     return HStatus::kFailure;
@@ -64,12 +57,12 @@ struct PlugData {
 } // namespace
 
 HStatus neuralWarpNode::prepareRestState(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex) {
-    if (!needsWork(data))
+    if (!data.hasDueCaches())
         return HStatus::kSuccess;
     if (data.indexMapDirty)
         if (HStatus status = updateComponentMap(data); status.error())
             return status;
-    return needsWork(data) ? rebuildRestCaches(data, block, multiIndex) : HStatus();
+    return data.hasDueCaches() ? rebuildRestCaches(data, block, multiIndex) : HStatus();
 }
 
 HStatus neuralWarpNode::updateComponentMap(neuralWarpData& data) {

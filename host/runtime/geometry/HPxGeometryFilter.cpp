@@ -79,6 +79,10 @@ HObject HPxDeformerNode::getNamedBuffer(const HString&, unsigned) {
 
 void HPxDeformerNode::primingAttributes(HObjectArray&) const {}
 
+bool HPxDeformerNode::isDueOnCpu(HDataBlock&, unsigned) {
+    return false;
+}
+
 const float* HPxDeformerNode::envelopeWeights(HDataBlock& block, unsigned multiIndex, HStatus* status) {
     const float* none = nullptr;
     return apiValue(FaultPoint::HPxDeformerNode_envelopeWeights, status, none, [&](HStatus& outcome) {

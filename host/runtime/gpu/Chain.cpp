@@ -31,6 +31,20 @@ std::shared_ptr<Slot> childOf(const Slot& element, const Attribute& attribute) {
     return nullptr;
 }
 
+/// The plug-in says so.
+bool isDueOnCpu(NodeData& data, unsigned index) {
+    auto* deformer = dynamic_cast<HPxDeformerNode*>(data.node.userNode());
+    if (!deformer)
+        return false;
+    bool isDue = true; // also when it throws
+    auto block = Access::make<HDataBlock>(data.shared_from_this());
+    callPlugin(data.node, "isDueOnCpu", [&] {
+        isDue = deformer->isDueOnCpu(block, index);
+        return HStatus();
+    });
+    return isDue;
+}
+
 /// The geometry as a link, as far as can be told without its mesh; none when it has to be evaluated on the CPU.
 std::optional<Link> linkOf(NodeData& data, unsigned index) {
     const FilterAttributes& attributes = filterAttributes();
@@ -44,7 +58,7 @@ std::optional<Link> linkOf(NodeData& data, unsigned index) {
     if (!link.input || !link.output || !link.state->gpu || !link.state->gpu->isPrimed)
         return {};
     link.geometry = childOf(*link.input, *attributes.inputGeometry);
-    if (primingValues(data, index) != link.gpu().primedValues)
+    if (primingValues(data, index) != link.gpu().primedValues || isDueOnCpu(data, index))
         return {};
     return link;
 }
