@@ -171,7 +171,8 @@ Walls measureWalls(WarpFrame& frame, const bench::Options& options) {
 struct Phases {
     std::map<std::string, Seconds> device, host;
     std::map<std::string, Seconds> copies; // beside the kernel of that name
-    Seconds kernels;                       // all commands but uploads and downloads
+    Seconds buffers;                       // a copy from buffer to buffer, as the deformer makes before it smooths
+    Seconds kernels;                       // all commands but uploads and downloads, and that copy
 };
 
 std::map<std::string, std::size_t> bytesOf(WarpFrame& frame, const WarpSetting& setting) {
@@ -191,7 +192,7 @@ std::map<std::string, std::size_t> bytesOf(WarpFrame& frame, const WarpSetting& 
 }
 
 void addCounts(Phases& phases, const GpuCounts& counts, const PhaseClock& clock) {
-    double kernels = 0.0;
+    double kernels = phases.buffers.empty() ? 0.0 : phases.buffers.back();
     for (const auto& [name, seconds] : counts.seconds) {
         phases.device[name].push_back(seconds);
         if (name != "upload" && name != "download")
@@ -228,6 +229,7 @@ Phases measurePhases(WarpFrame& frame, const WarpSetting& setting, const bench::
         runFrames(frame, 1);
         bench::DeviceProbes probes;
         addCopies(phases, probes, setting, bytes); // the first time, memory is new
+        probes.timeBufferCopy(bench::bytesOf(frame.vertices(), 0));
         phases.copies.clear();
         frame.state().phases = &clock;
         const auto start = std::chrono::steady_clock::now();
@@ -235,6 +237,8 @@ Phases measurePhases(WarpFrame& frame, const WarpSetting& setting, const bench::
         for (double last = 0.0; phases.kernels.size() < 10 || std::chrono::steady_clock::now() - start < wanted;) {
             Gpu::resetCounts();
             last = runAfter(frame, last);
+            if (setting.smoothing > 0)
+                phases.buffers.push_back(probes.timeBufferCopy(bench::bytesOf(frame.vertices(), 0)));
             addCounts(phases, Gpu::counts(), clock);
             addCopies(phases, probes, setting, bytes);
         }
@@ -252,11 +256,12 @@ void addPhases(const Table& table, const Phases& phases, const std::map<std::str
         return found == bytes.end() ? 0 : found->second;
     };
     const std::pair<const char*, const char*> device[] = {
-        {"upload", "upload"},     {"copyToAffectBuffer", "gather"}, {"copy", "copy of the gathered"},
+        {"upload", "upload"},     {"copyToAffectBuffer", "gather"}, {"copy", "copy of the input"},
         {smoothing, "smoothing"}, {shapes, "principal shapes"},     {apply, "apply"},
         {"download", "download"}};
     for (const auto& [name, values] : phases.host)
         table.add({name, "host", values, bytesIn(name)});
+    table.add({"copy before smoothing", "device", phases.buffers, bytesIn("copyToAffectBuffer")});
     for (const auto& [name, text] : device)
         if (const auto found = phases.device.find(name); found != phases.device.end()) {
             const auto copies = phases.copies.find(name);
@@ -289,16 +294,13 @@ void benchFixedCost(unsigned passes, const bench::Options& options, Table& table
     addPhases(table, phases, {});
     const double kernels = quantile(phases.kernels, 0.5);
     const PipelineOn on;
-    for (const Pace pace : {Pace::inARow, Pace::single}) {
-        Seconds fixed = runFrames(frame, 1000, pace);
-        std::for_each(fixed.begin(), fixed.end(), [&](double& seconds) { seconds -= kernels; });
-        table.add({pace == Pace::single ? "fixed cost, after a pause" : "fixed cost, in a row",
-                   "host",
-                   fixed,
-                   0,
-                   {},
-                   largestFixedCost});
-    }
+    std::map<Pace, Seconds> fixed;
+    for (int round = 0; round < 5; ++round)
+        for (const Pace pace : {Pace::inARow, Pace::single})
+            for (const double seconds : runFrames(frame, 300, pace))
+                fixed[pace].push_back(seconds - kernels);
+    table.add({"fixed cost, in a row", "host", fixed[Pace::inARow], 0, {}, largestFixedCost});
+    table.add({"fixed cost, after a pause", "host", fixed[Pace::single], 0, {}, largestFixedCost});
 }
 
 void benchEmptyLaunch(const Table& table) {

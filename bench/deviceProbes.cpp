@@ -96,4 +96,13 @@ double DeviceProbes::timeCopy(std::size_t bytes) {
     return secondsOf(event);
 }
 
+double DeviceProbes::timeBufferCopy(std::size_t bytes) {
+    const Ends& ends = endsOf(bytes);
+    HOpenCLEvent event;
+    check(clEnqueueCopyBuffer(device_.queue.get(), ends.from.get(), ends.to.get(), 0, 0, bytes, 0, nullptr,
+                              event.receive()),
+          "clEnqueueCopyBuffer");
+    return secondsOf(event);
+}
+
 } // namespace bench

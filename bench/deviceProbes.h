@@ -18,6 +18,8 @@ public:
     double timeEmptyLaunch();
     // Seconds on the device of a kernel that reads half the bytes and writes the other half. Needs Gpu::setTiming().
     double timeCopy(std::size_t bytes);
+    // The same of a copy of that many bytes from one buffer to another, without a kernel.
+    double timeBufferCopy(std::size_t bytes);
 
 private:
     struct Ends {
