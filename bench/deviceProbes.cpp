@@ -27,9 +27,10 @@ kernels::Device hostsDevice() {
     if (!queue)
         throw std::runtime_error("there is no OpenCL device");
     cl_context context = nullptr;
-    check(clGetCommandQueueInfo(queue, CL_QUEUE_DEVICE, sizeof device.id, &device.id, nullptr),
+    check(clGetCommandQueueInfo(queue, CL_QUEUE_DEVICE, sizeof(cl_device_id), &device.id, nullptr),
           "clGetCommandQueueInfo");
-    check(clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof context, &context, nullptr), "clGetCommandQueueInfo");
+    check(clGetCommandQueueInfo(queue, CL_QUEUE_CONTEXT, sizeof(cl_context), &context, nullptr),
+          "clGetCommandQueueInfo");
     check(clRetainCommandQueue(queue), "clRetainCommandQueue");
     device.queue.reset(queue);
     check(clRetainContext(context), "clRetainContext");
@@ -48,7 +49,7 @@ kernels::Owned<cl_mem> allocate(const kernels::Device& device, std::size_t bytes
 }
 
 double secondsOf(const HOpenCLEvent& event) {
-    const cl_event handle = event.get();
+    cl_event handle = event.get();
     cl_ulong start = 0, end = 0;
     check(clWaitForEvents(1, &handle), "clWaitForEvents");
     check(clGetEventProfilingInfo(handle, CL_PROFILING_COMMAND_START, sizeof start, &start, nullptr),
@@ -87,7 +88,10 @@ double DeviceProbes::timeCopy(std::size_t bytes) {
     const std::size_t count = std::max<std::size_t>(bytes / 2 / vectorBytes, 1);
     const Ends& ends = endsOf(count * vectorBytes);
     cl_mem to = ends.to.get(), from = ends.from.get();
-    kernels::Arguments(copy_.get()).add(&to, sizeof to).add(&from, sizeof from).add(static_cast<std::uint32_t>(count));
+    kernels::Arguments(copy_.get())
+        .add(&to, sizeof(cl_mem))
+        .add(&from, sizeof(cl_mem))
+        .add(static_cast<std::uint32_t>(count));
     const std::size_t global = (count + localSize - 1) / localSize * localSize;
     HOpenCLEvent event;
     check(clEnqueueNDRangeKernel(device_.queue.get(), copy_.get(), 1, nullptr, &global, &localSize, 0, nullptr,

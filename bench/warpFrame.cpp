@@ -97,7 +97,7 @@ double quantile(std::vector<double> values, double q) {
     if (values.empty())
         return 0.0;
     std::sort(values.begin(), values.end());
-    return values[static_cast<std::size_t>(q * static_cast<double>(values.size() - 1) + 0.5)];
+    return values[static_cast<std::size_t>(std::lround(q * static_cast<double>(values.size() - 1)))];
 }
 
 } // namespace bench
