@@ -58,6 +58,9 @@ public:
     bool canApplyModel() const;
     /// Some rest cache is due, and the settings in force have a use for it.
     bool hasDueCaches() const;
+    /// A load was asked for since the last evaluation on the CPU: one that it left due is not tried again by itself.
+    bool hasNewLoads() const { return (loadsDue() & ~loadsLeft) != 0; }
+    void leaveLoads() { loadsLeft = loadsDue(); }
     /// The model is in use and drives none of the deformed vertices.
     bool drivesNothing() const { return useAffectMap && affectMap.empty(); }
     /// The model drives deformed vertex `i`. False for an index that no vertex has.
@@ -107,6 +110,12 @@ public:
     DeltaSettings modelSettings;  ///< what the metadata asks for
     DeltaSettings exportSettings; ///< what the export attributes ask for
     std::vector<std::uint32_t> cacheVersions = std::vector<std::uint32_t>(5, 0xFFFFFFFF);
+
+    /// The flags of the three loads, one bit each, and those that the last evaluation on the CPU left raised.
+    unsigned loadsDue() const {
+        return (modelPathDirty ? 1U : 0U) | (metadataDirty ? 2U : 0U) | (modelLoadPending ? 4U : 0U);
+    }
+    unsigned loadsLeft = 0;
 
     /// How many slots of the model are read: the highest in use + 1. Follows componentMap and affectMap.
     std::size_t slotCount() const { return useAffectMap ? mappedSlotCount : componentMap.affectCount(); }

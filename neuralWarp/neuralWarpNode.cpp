@@ -165,32 +165,11 @@ HObject neuralWarpNode::getNamedBuffer(const HString& name, unsigned multiIndex)
     return buffer;
 }
 
-namespace {
-
-/// A target morph that leaves nothing of the model to see: the CPU does not load it then.
-bool isMorphedWhole(HDataBlock& block) {
-    HStatus status;
-    return block.inputValue(neuralWarpNode::targetMorphEnabled, &status).asBool() &&
-           block.inputValue(neuralWarpNode::targetMorphEnvelope, &status).asDouble() == 1.0;
-}
-
-bool isModelOn(HDataBlock& block, std::uint32_t multiIndex) {
-    HStatus status;
-    const HDataHandle model = existingElement(block, neuralWarpNode::models, multiIndex, status);
-    return !status.error() && model.child(neuralWarpNode::modelActive).asShort() == 1;
-}
-
-} // namespace
-
 bool neuralWarpNode::isDueOnCpu(HDataBlock& block, unsigned multiIndex) {
     const neuralWarpData* data = fetchNodeData(block, multiIndex);
     if (!data || data->exportMode)
         return false;
-    if (data->hasDueCaches())
-        return true;
-    if (!data->modelPathDirty && !data->metadataDirty && !data->modelLoadPending)
-        return false;
-    return isModelOn(block, multiIndex) && (data->modelPathDirty || data->metadataDirty || !isMorphedWhole(block));
+    return data->hasDueCaches() || data->hasNewLoads();
 }
 
 void neuralWarpNode::primingAttributes(HObjectArray& attributes) const {

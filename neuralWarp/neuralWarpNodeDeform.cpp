@@ -113,8 +113,10 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
             loadModel(*data, false); // a failure shows in canApplyModel()
     } else if (!isMorphed) {
         data->modelApplied = false;
+        data->leaveLoads();
         return HStatus::kSuccess;
     }
+    data->leaveLoads();
     isActive = isActive && data->canApplyModel() && !data->drivesNothing();
     data->modelApplied = isActive;
 

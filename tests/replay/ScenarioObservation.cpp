@@ -87,13 +87,6 @@ Json settingsToJson(const neuralWarp::DeltaSettings& settings, JsonAllocator& al
     return pair;
 }
 
-Json positionsToJson(const HPointArray& positions, JsonAllocator& allocator) {
-    std::vector<quill::val3<double>> converted;
-    for (const HPoint& p : positions)
-        converted.emplace_back(p.x, p.y, p.z);
-    return toJson(converted, allocator);
-}
-
 } // namespace
 
 int observedStatus(const HStatus& status) {
@@ -102,9 +95,16 @@ int observedStatus(const HStatus& status) {
     return status == HStatus::kInvalidParameter ? HStatus::kInvalidParameter : HStatus::kFailure;
 }
 
+Json observePositions(const ScenarioScene& scene, unsigned index, JsonAllocator& allocator) {
+    std::vector<quill::val3<double>> converted;
+    for (const HPoint& p : scene.rig().result(index))
+        converted.emplace_back(p.x, p.y, p.z);
+    return toJson(converted, allocator);
+}
+
 void observeGeometry(Output& out, const ScenarioScene& scene, unsigned index, JsonAllocator& allocator) {
     const neuralWarpData& state = *scene.rig().state(index); // deform() has seen to it that there is one
-    out.set("positions", positionsToJson(scene.rig().result(index), allocator));
+    out.set("positions", observePositions(scene, index, allocator));
     out.set("flags", flagsToJson(state, allocator));
     out.set("activeSettings", settingsToJson(state.activeSettings, allocator));
     out.set("modelOutputs", scene.modelOutputs());

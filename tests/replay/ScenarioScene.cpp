@@ -7,6 +7,7 @@
 #include "openquarn/HFnMeshData.h"
 #include "openquarn/HGlobal.h"
 #include "openquarn/HPxDeformerNode.h"
+#include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Plugins.h"
 
 #include <algorithm>
@@ -159,6 +160,15 @@ HStatus ScenarioScene::deform(unsigned index) {
     observeOutputs(index);
     modelOutputs_.clear();
     return rig_.deform(index);
+}
+
+HStatus ScenarioScene::deformNextFrame(unsigned index) const {
+    rig_.setInput(index, rig_.plug("input[" + std::to_string(index) + "].inputGeometry").asHObject());
+    return OpenQuarn::evaluate(rig_.output(index));
+}
+
+double ScenarioScene::morphWeight() const {
+    return rig_.plug("targetMorphEnabled").asBool() ? rig_.plug("targetMorphEnvelope").asDouble() : 0.0;
 }
 
 // The host makes the state in the first evaluation, which is to be observed as well: so it is made now, with the same

@@ -27,6 +27,11 @@ public:
     void setElement(const std::string& attribute, unsigned index, const Json& value);
     // Computes the geometry, also when nothing is dirty. The network's outputs are in modelOutputs() afterwards.
     HStatus deform(unsigned index);
+    // Computes the geometry because its mesh arrives anew along the connection, and nothing else does: as in the next
+    // frame of an animation. After deform() of that geometry.
+    HStatus deformNextFrame(unsigned index) const;
+    // How much of the target morph is asked for: 0 when it is off.
+    double morphWeight() const;
     // Runs the command: these words, a flag for each of `indices` (none when null) and the name of the node.
     HStatus runCommand(const std::string& words, const Json* indices, HCommandResult& result) const;
     // Empties the scene and unloads the plug-in.

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// replay_cases DIR [--exact | --self-check] [--skip-if-absent]: replays reference cases through the real code.
+// replay_cases DIR: replays reference cases through the real code; `usage` lists the options.
+#include "replayOnDevice.h"
 #include "run.h"
 #include "selfCheck.h"
 
@@ -16,11 +17,13 @@ using replay::Kind;
 using CasesByKind = std::map<std::string, std::vector<Case*>>;
 
 constexpr const char* usage =
-    "usage: replay_cases DIR [--exact | --self-check] [--skip-if-absent]\n"
+    "usage: replay_cases DIR [--exact | --self-check | --evaluator gpu [--device DEVICE]] [--skip-if-absent]\n"
     "  DIR               a folder of reference cases, one JSON file each\n"
     "  --exact           compare with tolerance 0\n"
     "  --self-check      change one expected value per key and kind: each change must be noticed\n"
-    "  --skip-if-absent  exit 77 instead of 2 when DIR is not there\n"
+    "  --evaluator gpu   replay the scenarios alone, and compare the positions that an OpenCL device gives\n"
+    "  --device DEVICE   which device: a number, or a part of its name; else the first\n"
+    "  --skip-if-absent  exit 77 instead of 2 when DIR, or a device, is not there\n"
     "Exit status: 0 all passed, 1 a failure, 2 the cases or the arguments are unusable.\n";
 
 struct Options {
@@ -28,12 +31,29 @@ struct Options {
     bool exact = false;
     bool selfCheck = false;
     bool skipIfAbsent = false;
+    std::string evaluator = "cpu";
+    std::string device;
 };
+
+// Takes what is given to "--evaluator" and "--device"; null for every other argument, which has nothing.
+std::string* valueOf(const std::string& argument, Options& options) {
+    if (argument == "--evaluator")
+        return &options.evaluator;
+    return argument == "--device" ? &options.device : nullptr;
+}
+
+bool isConsistent(const Options& options) {
+    const bool isGpu = options.evaluator == "gpu";
+    return !options.folder.empty() && (isGpu || options.evaluator == "cpu") && (isGpu || options.device.empty()) &&
+           options.exact + options.selfCheck + isGpu <= 1;
+}
 
 bool parse(int argc, char** argv, Options& options) {
     for (int i = 1; i < argc; ++i) {
         const std::string argument = argv[i];
-        if (argument == "--exact")
+        if (std::string* value = valueOf(argument, options); value && i + 1 < argc)
+            *value = argv[++i];
+        else if (argument == "--exact")
             options.exact = true;
         else if (argument == "--self-check")
             options.selfCheck = true;
@@ -44,7 +64,7 @@ bool parse(int argc, char** argv, Options& options) {
         else
             options.folder = argument;
     }
-    return !options.folder.empty() && !(options.exact && options.selfCheck);
+    return isConsistent(options);
 }
 
 // Passes and failures so far.
@@ -106,12 +126,34 @@ void runAll(CasesByKind& byKind, const Options& options, Tally& tally) {
             tally.failure(std::to_string(cases.size()) + " cases of the unknown kind " + name);
 }
 
+int replayScenariosOnDevice(const std::vector<Case>& cases, const Options& options) {
+    if (!replay::chooseDevice(options.device)) {
+        std::printf("there is no OpenCL device: nothing was compared\n");
+        return options.skipIfAbsent ? 77 : 2;
+    }
+    Tally tally;
+    replay::DeviceTally steps;
+    for (const Case& testCase : cases) {
+        if (testCase.kind != "scenario")
+            continue;
+        const auto disagreements = replay::replayOnDevice(testCase, steps);
+        reportDisagreements(testCase, disagreements);
+        tally.count(disagreements.empty());
+    }
+    std::printf("%s: %zu steps compared, of which %zu passed through; %zu more were the CPU's, %zu left out\n",
+                steps.device.c_str(), steps.compared, steps.passedThrough, steps.onCpu, steps.leftOut);
+    std::printf("%zu passed, %zu failed\n", tally.passed, tally.failed);
+    return tally.failed == 0 && steps.compared > steps.passedThrough ? 0 : 1;
+}
+
 int run(const Options& options) {
     if (!std::filesystem::is_directory(options.folder)) {
         std::printf("the reference cases were not there: %s\n", options.folder.c_str());
         return options.skipIfAbsent ? 77 : 2;
     }
     auto cases = replay::readCases(options.folder);
+    if (options.evaluator == "gpu")
+        return replayScenariosOnDevice(cases, options);
     CasesByKind byKind;
     for (Case& testCase : cases)
         byKind[testCase.kind].push_back(&testCase);

@@ -21,6 +21,7 @@ struct State {
     std::int64_t live = 0;
     std::uint64_t firstToFail = 0, endOfFailing = 0; // numbers of calls
     cl_int status = CL_SUCCESS;
+    std::string function; // the only one whose calls fail; "" for all
     std::string failed;
 };
 
@@ -33,9 +34,11 @@ State& state() {
 cl_int begin(const char* function) {
     State& all = state();
     const std::scoped_lock lock(all.mutex);
-    ++all.callsOf[function];
+    const std::uint64_t ofFunction = ++all.callsOf[function];
     ++all.calls;
-    if (all.calls < all.firstToFail || all.calls >= all.endOfFailing)
+    const std::uint64_t number = all.function.empty() ? all.calls : ofFunction;
+    const bool isMeant = all.function.empty() || all.function == function;
+    if (!isMeant || number < all.firstToFail || number >= all.endOfFailing)
         return CL_SUCCESS;
     all.failed = function;
     return all.status;
@@ -55,11 +58,13 @@ void* realFunction(const char* name) {
     std::abort();
 }
 
-void failFrom(std::uint64_t number, cl_int status, std::uint64_t times) {
+void failFrom(std::uint64_t number, cl_int status, std::uint64_t times, const std::string& function = {}) {
     State& all = state();
     const std::scoped_lock lock(all.mutex);
-    const std::uint64_t most = std::numeric_limits<std::uint64_t>::max() - all.calls - number;
-    all.firstToFail = all.calls + number;
+    const std::uint64_t calls = function.empty() ? all.calls : all.callsOf[function];
+    const std::uint64_t most = std::numeric_limits<std::uint64_t>::max() - calls - number;
+    all.function = function;
+    all.firstToFail = calls + number;
     all.endOfFailing = all.firstToFail + (times < most ? times : most);
     all.status = status;
     all.failed.clear();
@@ -85,6 +90,10 @@ std::int64_t liveObjects() {
 
 void failCall(std::uint64_t number, int status, std::uint64_t times) {
     failFrom(number, status, times);
+}
+
+void failCallOf(const std::string& function, std::uint64_t number, int status) {
+    failFrom(number, status, 1, function);
 }
 
 void loseDevice() {

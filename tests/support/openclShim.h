@@ -18,6 +18,8 @@ std::int64_t liveObjects();
 /// The `number`-th call from now on, 1 for the next, and the `times` - 1 after it answer with `status` and do nothing;
 /// those that release still do. Replaces what was asked for before.
 void failCall(std::uint64_t number, int status, std::uint64_t times = 1);
+/// The same for the `number`-th call of one function.
+void failCallOf(const std::string& function, std::uint64_t number, int status);
 /// Every call fails, as on a device that has gone, until heal().
 void loseDevice();
 void heal();

@@ -15,6 +15,7 @@
 #include "plugins/GPUDeformers.h"
 
 #include <atomic>
+#include <utility>
 
 namespace OpenQuarn {
 namespace {
@@ -36,8 +37,8 @@ void sayOnce(GpuGeometry& gpu, const Slot& output, const std::string& reason) {
 
 void sayNoDevice(GpuGeometry& gpu) {
     const std::string reason = takeFailure();
-    gpu.isFailing = true;
-    if (!saidNoDevice.exchange(true))
+    // whoever was told that a frame failed has been told that the device has gone
+    if (!std::exchange(gpu.isFailing, true) && !saidNoDevice.exchange(true))
         showMessage(Severity::warning, "deformers are evaluated on the CPU: " + reason);
 }
 
