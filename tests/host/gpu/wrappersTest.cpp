@@ -81,6 +81,7 @@ TEST_F(GpuBuffers, EventsHoldOneReferenceEach) {
 
         HOpenCLEventList list = {HOpenCLEvent(), moved};
         list.append(HOpenCLEvent());
+        list.append(moved);
         EXPECT_EQ(list.length(), 1U);
         EXPECT_EQ(*list.data(), moved.get());
         EXPECT_EQ(HOpenCLEventList().data(), nullptr);
