@@ -163,7 +163,7 @@ bool Scene::isForTheCpu(std::size_t geometry) const {
     const GeometryWish& wish = all_[geometry].wish;
     if (!wish.isModelOn)
         return false;
-    return wish.deltaMode > 1 || (wish.deltaMode == 1 && state(geometry).vertexFrames.framesPairs().empty());
+    return wish.deltaMode == 1 && state(geometry).vertexFrames.framesPairs().empty();
 }
 
 std::map<std::string, std::uint64_t> Scene::launches(std::size_t geometry) const {

@@ -22,7 +22,8 @@ constexpr double flushed = FLT_MIN;
 
 /// Offsets and target morphs. The CPU keeps the input and the last step of the blend in double precision; the device
 /// rounds the input, the difference, the product and the sum. The smoothed points and the deltas are sums of the same
-/// floats in the same order. On PoCL one half is seen.
+/// floats in the same order. On PoCL one half is seen. The host has quotients rounded correctly where the device can;
+/// one that cannot may be further away by 2.5 units in the last place for each smoothing pass, and is not allowed for.
 constexpr Limits offset{flushed, 2 * half, half / 2};
 
 /// Surface frames. The rest frames' inverses and the transport are doubles on the CPU. The device rounds each element
