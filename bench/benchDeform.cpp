@@ -3,20 +3,15 @@
 // principal shapes beside the memory's own speed.
 #include "harness.h"
 #include "options.h"
+#include "warpFrame.h"
 
 #include "neuralWarp/deltas.h"
-#include "neuralWarp/support/modelFolder.h"
-#include "neuralWarp/support/warpRig.h"
-#include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Messages.h"
-#include "openquarn_app/Session.h"
-#include "support/TemporaryFolder.h"
 
 #include <oneapi/tbb/global_control.h>
 
-#include <algorithm>
+#include <array>
 #include <chrono>
-#include <cmath>
 #include <exception>
 #include <sched.h>
 #include <sys/wait.h>
@@ -25,92 +20,12 @@
 
 namespace {
 
+using bench::modelName;
+using bench::quantile;
+using bench::WarpFrame;
+using bench::WarpSetting;
 using neuralWarp::PhaseClock;
 using neuralWarp::phaseCount;
-
-constexpr std::size_t controlCount = 16;
-
-struct Setting {
-    std::size_t side; // of the grid, in vertices
-    bool isSurface;
-    std::size_t shapes; // 0: a direct model
-    unsigned smoothing;
-};
-
-std::string modelName(const Setting& setting) {
-    return setting.shapes == 0 ? "direct" : "S=" + std::to_string(setting.shapes);
-}
-
-float noise(std::size_t i) {
-    return 0.01F * std::sin(static_cast<float>(i % 10007));
-}
-
-ModelSpec modelOf(const Setting& setting, std::size_t vertices) {
-    ModelSpec spec;
-    const std::size_t outputs = setting.shapes == 0 ? 3 * vertices : setting.shapes;
-    spec.controls = controlCount;
-    spec.bias.assign(outputs, 0.125F);
-    spec.weights.resize(controlCount * outputs);
-    for (std::size_t i = 0; i < spec.weights.size(); ++i)
-        spec.weights[i] = noise(i);
-    spec.deltaMode = setting.isSurface ? 1 : 0;
-    spec.smoothingIterations = setting.smoothing;
-    spec.fullCount = spec.affectCount = static_cast<std::uint32_t>(vertices);
-    return spec;
-}
-
-// A deformed grid whose model has been loaded.
-class Frame {
-public:
-    explicit Frame(const Setting& setting)
-        : setting_(setting)
-        , vertices_(setting.side * setting.side) {
-        warpRig::registerPlugin();
-        writeModel(folder_.path() / "model.nwrp", modelOf(setting, vertices_));
-        rig_.emplace();
-        rig_->addGeometry(0, {.mesh = warpRig::mesh(makeGrid(setting.side - 1, setting.side - 1))});
-        rig_->setModelRoot(folder_.path());
-        rig_->setControls(std::vector<double>(controlCount, 0.25));
-        output_ = rig_->output(0);
-        control_ = rig_->plug("controlValues[0]");
-        OpenQuarn::evaluate(output_); // without shapes yet, when it needs some
-        addShapes();
-        run();
-    }
-
-    // The control changes before the clock starts.
-    double run() {
-        control_.setDouble(0.001 * static_cast<double>(++frame_ % 1000));
-        const auto start = std::chrono::steady_clock::now();
-        const HStatus status = OpenQuarn::evaluate(output_);
-        const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-        if (status.error() || !state().modelApplied)
-            throw std::runtime_error("a frame failed: " + status.errorString().asStdString());
-        return seconds;
-    }
-
-    neuralWarp::neuralWarpData& state() { return *rig_->state(0); }
-    std::size_t vertices() const { return vertices_; }
-
-private:
-    // past the file: as text, a large basis takes longer to read than all frames together
-    void addShapes() {
-        neuralWarp::neuralWarpData& data = state();
-        data.principalShapeCount = setting_.shapes;
-        data.principalVertCount = setting_.shapes == 0 ? 0 : vertices_;
-        data.principalShapes.resize(3 * setting_.shapes * vertices_);
-        for (std::size_t i = 0; i < data.principalShapes.size(); ++i)
-            data.principalShapes[i] = noise(i);
-    }
-
-    Setting setting_;
-    std::size_t vertices_;
-    OpenQuarn::Session session_;
-    TemporaryFolder folder_;
-    std::optional<warpRig::Rig> rig_;
-    HPlug output_, control_;
-    unsigned frame_ = 0;
-};
 
 template <class T>
 std::size_t bytesOf(const std::vector<T>& values) {
@@ -126,18 +41,13 @@ double stateBytesPerVertex(const neuralWarp::neuralWarpData& data, std::size_t v
     return static_cast<double>(bytes) / static_cast<double>(vertices);
 }
 
-double quantile(std::vector<double> values, double q) {
-    std::sort(values.begin(), values.end());
-    return values[static_cast<std::size_t>(q * static_cast<double>(values.size() - 1) + 0.5)];
-}
-
 // Phases and total of each frame, after a pause of one frame time.
 struct Samples {
     std::array<std::vector<double>, phaseCount> phases;
     std::vector<double> total, rest;
 };
 
-Samples sample(Frame& frame, double seconds) {
+Samples sample(WarpFrame& frame, double seconds) {
     constexpr std::size_t fewest = 20;
     Samples samples;
     PhaseClock clock;
@@ -175,7 +85,7 @@ void printHeader(std::FILE* csv) {
     std::fputs(",rest_us,rest_percent,state_bytes_per_vertex\n", csv);
 }
 
-void report(const Setting& setting, unsigned threads, Frame& frame, const Samples& samples, std::FILE* csv) {
+void report(const WarpSetting& setting, unsigned threads, WarpFrame& frame, const Samples& samples, std::FILE* csv) {
     const double total = quantile(samples.total, 0.5) * 1e6, p99 = quantile(samples.total, 0.99) * 1e6;
     const double rest = quantile(samples.rest, 0.5) * 1e6;
     const double bytes = stateBytesPerVertex(frame.state(), frame.vertices());
@@ -194,10 +104,10 @@ void report(const Setting& setting, unsigned threads, Frame& frame, const Sample
     std::fflush(csv);
 }
 
-std::vector<Setting> settings(bool isQuick) {
+std::vector<WarpSetting> settings(bool isQuick) {
     if (isQuick)
         return {{100, true, 20, 10}, {316, false, 20, 0}, {316, true, 50, 10}, {316, true, 0, 10}};
-    std::vector<Setting> all;
+    std::vector<WarpSetting> all;
     for (const std::size_t side : {100U, 316U, 1000U})
         for (const bool isSurface : {false, true})
             for (const unsigned smoothing : {0U, 10U})
@@ -220,8 +130,8 @@ void benchFrames(const bench::Options& options, unsigned threads) {
     useCores(threads);
     const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
     OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {}); // the shapes come after the first frame
-    for (const Setting& setting : settings(options.isQuick)) {
-        Frame frame(setting);
+    for (const WarpSetting& setting : settings(options.isQuick)) {
+        WarpFrame frame(setting);
         report(setting, threads, frame, sample(frame, options.seconds), options.csv.get());
     }
 }

@@ -2,6 +2,7 @@
 // bench_kernels: every OpenCL kernel on the first device, launched and waited for, beside the library's own code on the
 // same data and beside a kernel that only copies. See Report::legend for the columns.
 #include "harness.h"
+#include "kernelBytes.h"
 #include "kernels/OpenCl.h"
 #include "neuralWarp/deltas.h"
 #include "options.h"
@@ -99,8 +100,8 @@ struct Row {
     std::vector<kernels::Owned<cl_kernel>> launches{};
 };
 
-Phase phaseOf(const char* name, const Subject& s, std::size_t points, std::size_t words) {
-    return {name, "grid", s.n, 12 * points + 4 * words};
+Phase phaseOf(const char* name, const Subject& s, std::size_t bytes) {
+    return {name, "grid", s.n, bytes};
 }
 
 kernels::Owned<cl_kernel> gather(const Subject& s, const OnDevice& d) {
@@ -137,7 +138,7 @@ kernels::Owned<cl_kernel> apply(const Subject& s, const OnDevice& d, bool surfac
 }
 
 Row copying(Subject& s, OnDevice& d) {
-    Row row{phaseOf("copy", s, 2 * s.n, 0)};
+    Row row{phaseOf("copy", s, bench::bytesOf(2 * s.n, 0))};
     row.launches.push_back(d.copy.kernel("copy"));
     Arguments(row.launches[0].get()).add(d.result).add(d.points).add(static_cast<std::uint32_t>(s.n));
     row.phase.plain = [&s] { quill::parallelFor(s.n, [&](std::size_t i) { s.result[i] = s.points[i]; }); };
@@ -145,7 +146,7 @@ Row copying(Subject& s, OnDevice& d) {
 }
 
 Row gathering(Subject& s, OnDevice& d) {
-    Row row{phaseOf("gather", s, 2 * s.n, s.n)};
+    Row row{phaseOf("gather", s, bench::bytesOf(2 * s.n, s.n))};
     row.launches.push_back(gather(s, d));
     row.phase.plain = [&s] { quill::parallelFor(s.n, [&](std::size_t i) { s.result[i] = s.points[s.list[i]]; }); };
     return row;
@@ -156,7 +157,7 @@ void smooth(Subject& s) {
 }
 
 Row smoothing(Subject& s, OnDevice& d) {
-    Row row{phaseOf("smoothing pass", s, 2 * s.n, s.n + 2 * s.weights.size())};
+    Row row{phaseOf("smoothing pass", s, bench::smoothingBytes(s.n, s.weights.size()))};
     row.phase.perCall = passes;
     for (std::size_t pass = 0; pass < passes; ++pass)
         row.launches.push_back(smoothingPass(s, d, pass % 2 ? d.smoothed : d.other, pass % 2 ? d.other : d.smoothed));
@@ -170,7 +171,7 @@ void extract(Subject& s) {
 }
 
 Row shapes(Subject& s, OnDevice& d) {
-    Row row{phaseOf("principal 50", s, s.n, s.basis.size())};
+    Row row{phaseOf("principal 50", s, bench::shapesBytes(s.n, shapeCount))};
     row.launches.push_back(principalShapes(s, d));
     row.phase.plain = [&s] { extract(s); };
     return row;
@@ -189,8 +190,9 @@ void applyOnProcessor(Subject& s, bool surface) {
 }
 
 Row applying(Subject& s, OnDevice& d, bool surface) {
-    const std::size_t words = surface ? 33 * s.n + s.frames.framesPairs().size() : 0;
-    Row row{phaseOf(surface ? "apply surface" : "apply offset", s, surface ? 5 * s.n : 4 * s.n, words)};
+    const std::size_t bytes =
+        surface ? bench::surfaceBytes(s.n, s.frames.framesPairs().size()) : bench::offsetBytes(s.n);
+    Row row{phaseOf(surface ? "apply surface" : "apply offset", s, bytes)};
     row.launches.push_back(apply(s, d, surface));
     row.phase.plain = [&s, surface] { applyOnProcessor(s, surface); };
     return row;
@@ -198,7 +200,7 @@ Row applying(Subject& s, OnDevice& d, bool surface) {
 
 // All that one frame launches in surface mode with shapes and smoothing.
 Row wholeFrame(Subject& s, OnDevice& d) {
-    Row row{phaseOf("frame", s, 0, 0)};
+    Row row{phaseOf("frame", s, 0)};
     row.launches = smoothing(s, d).launches;
     row.launches.insert(row.launches.begin(), gather(s, d));
     row.launches.push_back(principalShapes(s, d));

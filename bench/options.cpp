@@ -7,11 +7,12 @@
 namespace bench {
 namespace {
 
-constexpr const char* usage = "usage: %s [--quick] [--seconds S] [--only PHASE] [--csv FOLDER]\n"
+constexpr const char* usage = "usage: %s [--quick] [--seconds S] [--only PHASE] [--csv FOLDER] [--device D]\n"
                               "  --quick       fewer and shorter rows\n"
                               "  --seconds S   time for each row (default 0.4)\n"
                               "  --only PHASE  phases whose name begins so\n"
-                              "  --csv FOLDER  where the rows go as NAME.csv as well (default: beside the program)\n";
+                              "  --csv FOLDER  where the rows go as NAME.csv as well (default: beside the program)\n"
+                              "  --device D    the OpenCL device of bench_gpu: a number, or part of its name\n";
 
 bool parse(int argc, char** argv, Options& options, std::filesystem::path& folder) {
     bool hasSeconds = false;
@@ -29,6 +30,8 @@ bool parse(int argc, char** argv, Options& options, std::filesystem::path& folde
             options.seconds = std::atof(argv[i]);
         else if (name == "--only")
             options.only = argv[i];
+        else if (name == "--device")
+            options.device = argv[i];
         else
             return false;
         hasSeconds = hasSeconds || name == "--seconds";

@@ -18,6 +18,7 @@ struct Options {
     std::string only;     // phases whose name begins so
     bool isQuick = false; // fewer and shorter rows, where a program has many
     bool wants(const std::string& phase) const { return phase.rfind(only, 0) == 0; }
+    std::string device; // an OpenCL device, as Gpu::chooseDevice() takes it
     std::string csvPath;
     std::unique_ptr<std::FILE, CloseFile> csv; // opened for writing
 };

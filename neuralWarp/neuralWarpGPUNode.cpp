@@ -50,6 +50,8 @@ Status neuralWarpGPUNode::evaluate(HDataBlock& block, const HEvaluationNode& eva
             return kDeformerFailure;
         if (data->observedOutputs)
             data->observedOutputs->clear();
+        if (data->phases)
+            data->phases->start();
         if (data->exportMode)
             return kDeformerPassThrough;
         takeSettings(*data);
@@ -108,6 +110,7 @@ cl_int neuralWarpGPUNode::findTarget(const HEvaluationNode& evaluationNode, cons
 }
 
 Status neuralWarpGPUNode::computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs) {
+    data.endPhase(Phase::prepare);
     if (!runInference(block, data, outputs))
         return kDeformerPassThrough;
     const bool isSameGeometry = data.componentMap.affectCount() == affectCount();
@@ -126,11 +129,13 @@ bool neuralWarpGPUNode::runInference(HDataBlock& block, neuralWarpData& data, st
     const HStatus status = gatherControlValues(block, data.session.inputCount(), controls_);
     if (reported(status, sourceUnit::gpuNode).error())
         return false;
+    data.endPhase(Phase::gather);
     {
         const HProfilingScope scope(evaluationCategory(), 0, "InferenceDeltasForGPU",
                                     "Inference Neural Warp deltas to be applied on the GPU.");
         outputs = data.session.run(controls_);
     }
+    data.endPhase(Phase::network);
     if (data.observedOutputs)
         *data.observedOutputs = outputs;
     if (outputs.empty())
@@ -146,8 +151,10 @@ Status neuralWarpGPUNode::deformPrepared(const HEvaluationNode& evaluationNode, 
     syncState_.capture(*this);
     if (!uploadSetupBuffers() || (deltasActive_ && !uploadOutputs(data, outputs)) || !loadKernels())
         return kDeformerFailure;
+    data.endPhase(Phase::points);
     if (initializeOutputPositions(event) != CL_SUCCESS || enqueueDeformation(event) != CL_SUCCESS)
         return kDeformerFailure;
+    data.endPhase(Phase::apply);
     return finishEvaluation(event, outputData);
 }
 

@@ -55,6 +55,7 @@ private:
 
     // On the device. A status is OpenCL's; each step waits for the event, and replaces it by its own.
     bool uploadSetupBuffers();
+    void forgetSetupEvents();
     bool uploadOutputs(const neuralWarpData& data, const std::vector<float>& outputs);
     bool loadKernels();
     bool areConnectionsUsable() const;

@@ -51,8 +51,10 @@ void neuralWarpGPUNode::terminate() {
 }
 
 bool neuralWarpGPUNode::uploadSetupBuffers() {
-    if (!syncState_.isDirty())
+    if (!syncState_.isDirty()) {
+        forgetSetupEvents();
         return true;
+    }
     struct Upload {
         unsigned slot; ///< of neuralWarpData::cacheVersions
         const char* name;
@@ -77,6 +79,15 @@ bool neuralWarpGPUNode::uploadSetupBuffers() {
     if (status == CL_SUCCESS)
         syncState_.uploaded = syncState_.captured;
     return status == CL_SUCCESS;
+}
+
+// What an earlier evaluation has put into the queue comes before all of this one: to wait for it as well, with each
+// launch that reads it, takes longer than a small launch.
+void neuralWarpGPUNode::forgetSetupEvents() {
+    for (HOpenCLBuffer* buffer : {&affectToDeltaMapBuffer_, &framesIndexerBuffer_, &framesPairsBuffer_,
+                                  &connectionsBuffer_, &connectionsIndexerBuffer_, &connectionWeightsBuffer_,
+                                  &restPointsBuffer_, &restFramesInverseBuffer_, &principalShapesBuffer_})
+        buffer->setBufferReadyEvent({});
 }
 
 bool neuralWarpGPUNode::uploadOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {

@@ -3,6 +3,8 @@
 
 #include "gpu/failure.h"
 
+#include <algorithm>
+
 namespace {
 
 // null when there is none, or when it could not be retained
@@ -54,7 +56,7 @@ HOpenCLEventList::HOpenCLEventList(std::initializer_list<HOpenCLEvent> events) {
 }
 
 void HOpenCLEventList::append(const HOpenCLEvent& event) {
-    if (event.isNull())
+    if (event.isNull() || std::find(raw_.begin(), raw_.end(), event.get()) != raw_.end())
         return;
     raw_.reserve(raw_.size() + 1); // so that nothing throws once the event is in the first list
     events_.push_back(event);

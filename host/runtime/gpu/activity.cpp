@@ -29,6 +29,7 @@ struct Activity {
     ByName<std::uint64_t> launches;
     ByName<std::uint64_t> uploads;
     ByName<double> seconds;
+    ByName<double> hostSeconds;
     std::vector<Timed> pending;
 };
 
@@ -115,6 +116,21 @@ void timesMeasured() {
     measureAll(activity());
 }
 
+TimedStep::TimedStep(const Device& device, std::string_view name) {
+    if (!device.isTimed)
+        return;
+    name_ = name;
+    start_ = std::chrono::steady_clock::now();
+}
+
+TimedStep::~TimedStep() {
+    if (name_.empty())
+        return;
+    const std::chrono::duration<double> spent = std::chrono::steady_clock::now() - start_;
+    const std::scoped_lock lock(activity().mutex);
+    add(activity().hostSeconds, name_, spent.count());
+}
+
 GpuCounts Gpu::counts() {
     const std::scoped_lock lock(activity().mutex);
     Activity& all = activity();
@@ -123,6 +139,7 @@ GpuCounts Gpu::counts() {
     counts.launches.insert(all.launches.begin(), all.launches.end());
     counts.uploads.insert(all.uploads.begin(), all.uploads.end());
     counts.seconds.insert(all.seconds.begin(), all.seconds.end());
+    counts.hostSeconds.insert(all.hostSeconds.begin(), all.hostSeconds.end());
     return counts;
 }
 
@@ -134,6 +151,7 @@ void Gpu::resetCounts() {
     all.launches.clear();
     all.uploads.clear();
     all.seconds.clear();
+    all.hostSeconds.clear();
 }
 
 } // namespace OpenQuarn

@@ -5,6 +5,7 @@
 #include "openquarn/gpu/opencl.h"
 #include "openquarn_app/Gpu.h"
 
+#include <chrono>
 #include <cstddef>
 #include <memory>
 #include <string_view>
@@ -22,5 +23,19 @@ void countEvaluation(bool onGpu, bool isFallback = false);
 /// timed. The times are added up by the next timesMeasured().
 void timeCommand(const Device& device, std::string_view name, cl_event event);
 void timesMeasured();
+
+/// Counts what the host does while this lives as a step (GpuCounts::hostSeconds), on a device that is timed. The name
+/// outlives it.
+class TimedStep {
+public:
+    TimedStep(const Device& device, std::string_view name);
+    ~TimedStep();
+    TimedStep(const TimedStep&) = delete;
+    TimedStep& operator=(const TimedStep&) = delete;
+
+private:
+    std::string_view name_; ///< empty: not timed
+    std::chrono::steady_clock::time_point start_;
+};
 
 } // namespace OpenQuarn

@@ -114,12 +114,13 @@ private:
         return status == CL_SUCCESS ? kept.buffer : HOpenCLBuffer();
     }
 
-    static Status evaluate(const Link& link, const HPlug& output, const HPlugArray& inputs) {
+    Status evaluate(const Link& link, const HPlug& output, const HPlugArray& inputs) const {
         GpuGeometry& gpu = link.gpu();
         auto block = Access::make<HDataBlock>(link.data);
         const HEvaluationNode evaluationNode(Access::object(link.node));
         Status status = HPxGPUDeformer::kDeformerFailure;
         const OutsideOfGraph outside;
+        const TimedStep step(*device_, "deform");
         callPlugin(*link.node, "evaluate", [&] {
             status = gpu.deformer->evaluate(block, evaluationNode, output, inputs, gpu.inputData, gpu.outputData);
             return HStatus();

@@ -19,6 +19,7 @@ namespace {
 using Buffer = HOpenCLBuffer::Impl;
 
 constexpr std::size_t bytesPerVertex = 3 * sizeof(float);
+constexpr std::size_t small = std::size_t{1} << 18U; // copied through the host's own memory; what is more is mapped
 
 Buffer& implOf(const HOpenCLBuffer& buffer) {
     return *Access::impl(buffer);
@@ -30,18 +31,23 @@ cl_int write(Buffer& buffer, cl_bool isBlocking, std::size_t bytes, const void* 
                        "clEnqueueWriteBuffer");
 }
 
+// Writes the host's copy, which is its own.
+cl_int writeCopy(Buffer& buffer, std::size_t bytes, HOpenCLEvent& written) {
+    const cl_int status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), buffer.copyRead);
+    written = buffer.copyRead; // a copy that cannot be made is noted; the queue keeps the order without it
+    return status;
+}
+
 // What is large is not worth a second copy: the caller waits.
 cl_int writeOwnCopy(Buffer& buffer, std::size_t bytes, const void* data, HOpenCLEvent& written) {
     constexpr std::size_t large = std::size_t{1} << 20U;
     if (bytes > large)
         return write(buffer, CL_TRUE, bytes, data, written);
-    cl_int status = buffer.takeCopy(bytes);
+    const cl_int status = buffer.takeCopy(bytes);
     if (status != CL_SUCCESS)
         return status;
     std::memcpy(buffer.copy.get(), data, bytes);
-    status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), buffer.copyRead);
-    written = buffer.copyRead; // a copy that cannot be made is noted; the queue keeps the order without it
-    return status;
+    return writeCopy(buffer, bytes, written);
 }
 
 cl_int writeAll(HOpenCLBuffer& buffer, std::string_view name, std::size_t bytes, const void* data, int mode) {
@@ -100,19 +106,37 @@ private:
     cl_int status_ = CL_SUCCESS;
 };
 
-cl_int writePositions(const Positions& positions, Buffer& buffer) {
-    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
-    Mapped mapped(buffer, CL_MAP_WRITE_INVALIDATE_REGION, bytes, nullptr);
-    if (mapped.status() != CL_SUCCESS)
-        return mapped.status();
+void narrow(const Positions& positions, float* to) {
     const double* from = positions.xyz();
-    float* to = mapped.floats();
     forRanges(positions.vertexCount(), [=](std::size_t begin, std::size_t end) {
         for (std::size_t i = 3 * begin; i < 3 * end; ++i)
             to[i] = static_cast<float>(from[i]);
     });
+}
+
+cl_int writeNarrowedCopy(const Positions& positions, Buffer& buffer, std::size_t bytes, HOpenCLEvent& written) {
+    const cl_int status = buffer.takeCopy(bytes);
+    if (status != CL_SUCCESS)
+        return status;
+    narrow(positions, reinterpret_cast<float*>(buffer.copy.get()));
+    return writeCopy(buffer, bytes, written);
+}
+
+cl_int writeMapped(const Positions& positions, Buffer& buffer, std::size_t bytes, HOpenCLEvent& written) {
+    Mapped mapped(buffer, CL_MAP_WRITE_INVALIDATE_REGION, bytes, nullptr);
+    if (mapped.status() != CL_SUCCESS)
+        return mapped.status();
+    narrow(positions, mapped.floats());
+    return mapped.unmap(&written);
+}
+
+// To map means to wait for the device, which takes longer than to copy what is small.
+cl_int writePositions(const Positions& positions, Buffer& buffer) {
+    const TimedStep step(*buffer.device, "upload");
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
     HOpenCLEvent written;
-    const cl_int status = mapped.unmap(&written);
+    const cl_int status = bytes <= small ? writeNarrowedCopy(positions, buffer, bytes, written)
+                                         : writeMapped(positions, buffer, bytes, written);
     if (status != CL_SUCCESS)
         return status;
     countUpload("positions", bytes);
@@ -121,21 +145,56 @@ cl_int writePositions(const Positions& positions, Buffer& buffer) {
     return CL_SUCCESS;
 }
 
-cl_int readPositions(const Buffer& buffer, Positions& positions) {
-    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
-    HOpenCLEvent read;
-    Mapped mapped(buffer, CL_MAP_READ, bytes, buffer.device->isTimed ? &read : nullptr);
-    if (mapped.status() != CL_SUCCESS)
-        return mapped.status();
-    const float* from = mapped.floats();
+// So that the time of a download is not that of the kernels before it.
+void waitWhenTimed(const Buffer& buffer) {
+    if (!buffer.device->isTimed)
+        return;
+    const TimedStep step(*buffer.device, "wait");
+    noteFailure(clFinish(buffer.device->queue), "clFinish");
+}
+
+void widen(const float* from, Positions& positions) {
     double* to = positions.xyz();
     forRanges(positions.vertexCount(), [=](std::size_t begin, std::size_t end) {
         for (std::size_t i = 3 * begin; i < 3 * end; ++i)
             to[i] = from[i];
     });
-    countDownload(bytes);
-    timeCommand(*buffer.device, "download", read.get());
+}
+
+cl_int readCopy(Buffer& buffer, std::size_t bytes, Positions& positions, HOpenCLEvent* read) {
+    cl_int status = buffer.takeCopy(bytes);
+    if (status != CL_SUCCESS)
+        return status;
+    const HOpenCLEventList waitFor = {buffer.ready};
+    status = clEnqueueReadBuffer(buffer.device->queue, buffer.memory, CL_TRUE, 0, bytes, buffer.copy.get(),
+                                 waitFor.length(), waitFor.data(), read ? read->receive() : nullptr);
+    if (status == CL_SUCCESS)
+        widen(reinterpret_cast<const float*>(buffer.copy.get()), positions);
+    return noteFailure(status, "clEnqueueReadBuffer", "download");
+}
+
+cl_int readMapped(const Buffer& buffer, std::size_t bytes, Positions& positions, HOpenCLEvent* read) {
+    Mapped mapped(buffer, CL_MAP_READ, bytes, read);
+    if (mapped.status() != CL_SUCCESS)
+        return mapped.status();
+    widen(mapped.floats(), positions);
     return mapped.unmap(nullptr);
+}
+
+// What is mapped has to be given back, which is another command for the device.
+cl_int readPositions(Buffer& buffer, Positions& positions) {
+    waitWhenTimed(buffer);
+    const TimedStep step(*buffer.device, "download");
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    HOpenCLEvent event;
+    HOpenCLEvent* read = buffer.device->isTimed ? &event : nullptr;
+    const cl_int status =
+        bytes <= small ? readCopy(buffer, bytes, positions, read) : readMapped(buffer, bytes, positions, read);
+    if (status != CL_SUCCESS)
+        return status;
+    countDownload(bytes);
+    timeCommand(*buffer.device, "download", event.get());
+    return CL_SUCCESS;
 }
 
 } // namespace

@@ -138,6 +138,25 @@ TEST_F(GpuKernels, AreCompiledAgainOnlyWhenAFileChanges) {
     EXPECT_EQ(takeFailure(), "");
 }
 
+TEST_F(GpuKernels, ThatAreLoadedFollowTheirFileSoonAndTheDeviceAtOnce) {
+    const HString file = writeAnswer("kept.cl", "", "1");
+    HOpenCLKernelInfo kernel;
+    const auto isAnother = [&] {
+        const std::uint64_t made = clshim::calls("clCreateKernel");
+        EXPECT_TRUE(kernel.loadOrUpdate(file, "answer", 1));
+        return clshim::calls("clCreateKernel") > made;
+    };
+    EXPECT_TRUE(isAnother());
+    closeDevice();
+    EXPECT_TRUE(isAnother());
+    Gpu::assumeNoDoubles(true);
+    EXPECT_TRUE(isAnother());
+    writeAnswer("kept.cl", "", "2");
+    const auto start = std::chrono::steady_clock::now();
+    while (!isAnother())
+        ASSERT_LT(std::chrono::steady_clock::now() - start, std::chrono::seconds(60));
+}
+
 TEST_F(GpuKernels, IncludeAsACompilerDoes) {
     const struct {
         const char* what;

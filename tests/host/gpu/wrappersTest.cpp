@@ -81,6 +81,7 @@ TEST_F(GpuBuffers, EventsHoldOneReferenceEach) {
 
         HOpenCLEventList list = {HOpenCLEvent(), moved};
         list.append(HOpenCLEvent());
+        list.append(moved);
         EXPECT_EQ(list.length(), 1U);
         EXPECT_EQ(*list.data(), moved.get());
         EXPECT_EQ(HOpenCLEventList().data(), nullptr);
@@ -214,8 +215,10 @@ TEST_F(GpuCounting, NamesWhatHappenedAndMeasuresWhenAsked) {
         if (isTimed) {
             EXPECT_THAT(counts.seconds, ElementsAre(Pair("count", testing::Gt(0)), Pair("download", testing::Ge(0)),
                                                     Pair("upload", testing::Gt(0))));
+            EXPECT_THAT(counts.hostSeconds, ElementsAre(Pair("download", testing::Gt(0)),
+                                                        Pair("upload", testing::Gt(0)), Pair("wait", testing::Ge(0))));
         } else {
-            EXPECT_TRUE(counts.seconds.empty());
+            EXPECT_TRUE(counts.seconds.empty() && counts.hostSeconds.empty());
         }
     }
     Gpu::resetCounts();

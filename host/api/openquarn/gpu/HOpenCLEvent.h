@@ -40,7 +40,7 @@ class OPENQUARN_API HOpenCLEventList {
 public:
     HOpenCLEventList() = default;
     HOpenCLEventList(std::initializer_list<HOpenCLEvent> events);
-    /// A null event is left out. Throws std::bad_alloc in the caller.
+    /// A null event is left out, and one that is there already. Throws std::bad_alloc in the caller.
     void append(const HOpenCLEvent& event);
 
     /// In the form that OpenCL's enqueue functions take: a length, and null for an empty list.

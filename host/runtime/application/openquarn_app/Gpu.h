@@ -35,6 +35,9 @@ struct GpuCounts {
     std::uint64_t bytesUp = 0, bytesDown = 0;
     /// Seconds on the device, by kernel, "copy", "upload" and "download"; only with Gpu::setTiming().
     std::map<std::string, double> seconds;
+    /// Seconds of the host at "upload" (positions of meshes), "deform" (what the deformer does before its kernels run),
+    /// "wait" (for them) and "download"; only with Gpu::setTiming().
+    std::map<std::string, double> hostSeconds;
 };
 
 /// Off at the start of a process. Thread: main, unless a function says otherwise.

@@ -1,0 +1,103 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "warpFrame.h"
+
+#include "neuralWarp/support/modelFolder.h"
+#include "openquarn_app/Evaluation.h"
+
+#include <algorithm>
+#include <chrono>
+#include <cmath>
+#include <stdexcept>
+
+namespace bench {
+namespace {
+
+constexpr std::size_t controlCount = 16;
+
+float noise(std::size_t i) {
+    return 0.01F * std::sin(static_cast<float>(i % 10007));
+}
+
+ModelSpec modelOf(const WarpSetting& setting, std::size_t vertices) {
+    ModelSpec spec;
+    const std::size_t outputs = setting.shapes == 0 ? 3 * vertices : setting.shapes;
+    spec.controls = controlCount;
+    spec.bias.assign(outputs, 0.125F);
+    spec.weights.resize(controlCount * outputs);
+    for (std::size_t i = 0; i < spec.weights.size(); ++i)
+        spec.weights[i] = noise(i);
+    spec.deltaMode = setting.isSurface ? 1 : 0;
+    spec.smoothingIterations = setting.smoothing;
+    spec.fullCount = spec.affectCount = static_cast<std::uint32_t>(vertices);
+    return spec;
+}
+
+HObject lifted(const HObject& mesh) {
+    HPointArray points = warpRig::pointsOf(mesh);
+    for (HPoint& point : points)
+        point.z += 0.01 * std::sin(point.x + point.y);
+    return warpRig::withPoints(mesh, points);
+}
+
+} // namespace
+
+std::string modelName(const WarpSetting& setting) {
+    return setting.shapes == 0 ? "direct" : "S=" + std::to_string(setting.shapes);
+}
+
+WarpFrame::WarpFrame(const WarpSetting& setting, Change change)
+    : setting_(setting)
+    , change_(change)
+    , vertices_(setting.side * setting.side) {
+    warpRig::registerPlugin();
+    writeModel(folder_.path() / "model.nwrp", modelOf(setting, vertices_));
+    const HObject mesh = warpRig::mesh(makeGrid(setting.side - 1, setting.side - 1));
+    if (change == Change::input)
+        inputs_ = {lifted(mesh), mesh};
+    rig_.emplace();
+    rig_->addGeometry(0, {.mesh = mesh});
+    rig_->setModelRoot(folder_.path());
+    rig_->setControls(std::vector<double>(controlCount, 0.25));
+    output_ = rig_->output(0);
+    control_ = rig_->plug("controlValues[0]");
+    OpenQuarn::evaluate(output_); // without shapes yet, when it needs some
+    addShapes();
+    run();
+}
+
+void WarpFrame::change() {
+    ++frame_;
+    if (change_ == Change::control)
+        control_.setDouble(0.001 * static_cast<double>(frame_ % 1000));
+    else
+        rig_->setInput(0, inputs_[frame_ % inputs_.size()]);
+}
+
+double WarpFrame::run() {
+    change();
+    const auto start = std::chrono::steady_clock::now();
+    const HStatus status = OpenQuarn::evaluate(output_);
+    const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    if (status.error() || !state().modelApplied)
+        throw std::runtime_error("a frame failed: " + status.errorString().asStdString());
+    return seconds;
+}
+
+// past the file: as text, a large basis takes longer to read than all frames together
+void WarpFrame::addShapes() {
+    neuralWarp::neuralWarpData& data = state();
+    data.principalShapeCount = setting_.shapes;
+    data.principalVertCount = setting_.shapes == 0 ? 0 : vertices_;
+    data.principalShapes.resize(3 * setting_.shapes * vertices_);
+    for (std::size_t i = 0; i < data.principalShapes.size(); ++i)
+        data.principalShapes[i] = noise(i);
+}
+
+double quantile(std::vector<double> values, double q) {
+    if (values.empty())
+        return 0.0;
+    std::sort(values.begin(), values.end());
+    return values[static_cast<std::size_t>(std::lround(q * static_cast<double>(values.size() - 1)))];
+}
+
+} // namespace bench

@@ -1,0 +1,58 @@
+// SPDX-License-Identifier: Apache-2.0
+// A scene with one deformed grid, whose frames are timed.
+#pragma once
+
+#include "neuralWarp/support/warpRig.h"
+#include "openquarn_app/Session.h"
+#include "support/TemporaryFolder.h"
+
+#include <cstddef>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace bench {
+
+struct WarpSetting {
+    std::size_t side; // of the grid, in vertices
+    bool isSurface;
+    std::size_t shapes; // 0: a direct model
+    unsigned smoothing;
+};
+
+std::string modelName(const WarpSetting& setting);
+
+// A deformed grid whose model has been loaded. Throws std::runtime_error when a frame fails.
+class WarpFrame {
+public:
+    // What is another in each frame, before the clock starts: a control value, which is set on the node itself, or the
+    // points that come in along the connection.
+    enum class Change { control, input };
+
+    explicit WarpFrame(const WarpSetting& setting, Change change = Change::control);
+
+    // Seconds of one frame.
+    double run();
+
+    neuralWarp::neuralWarpData& state() { return *rig_->state(0); }
+    std::size_t vertices() const { return vertices_; }
+
+private:
+    void addShapes();
+    void change();
+
+    WarpSetting setting_;
+    Change change_;
+    std::size_t vertices_;
+    OpenQuarn::Session session_;
+    TemporaryFolder folder_;
+    std::optional<warpRig::Rig> rig_;
+    std::vector<HObject> inputs_;
+    HPlug output_, control_;
+    unsigned frame_ = 0;
+};
+
+// The value at a part q of the way through the sorted values, 0 for none.
+double quantile(std::vector<double> values, double q);
+
+} // namespace bench
