@@ -27,8 +27,8 @@ public:
     /// is one. The base adds nothing. [eval]
     virtual void primingAttributes(HObjectArray& attributes) const;
 
-    /// Whether a geometry has to be evaluated on the CPU next although nothing that the host sees has changed: something
-    /// that is done there is due. Asked before each evaluation by the GPU deformer. The base: never. [eval]
+    /// Whether a geometry has to be evaluated on the CPU next although nothing that the host sees has changed:
+    /// something that is done there is due. Asked before each evaluation by the GPU deformer. The base: never. [eval]
     virtual bool isDueOnCpu(HDataBlock& block, unsigned multiIndex);
 
     /// A weight for each affected vertex, in the order of the index mapper; null when the geometry has no weights,
