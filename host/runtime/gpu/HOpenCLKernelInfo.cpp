@@ -8,9 +8,7 @@
 #include "openquarn/gpu/HOpenCLUtils.h"
 
 #include <algorithm>
-#include <chrono>
 #include <exception>
-#include <optional>
 #include <string>
 #include <utility>
 
@@ -31,18 +29,11 @@ struct HOpenCLKernelInfo::Impl {
     std::size_t localSize = 1;
     std::size_t workItems = 0;
 
-    // what it was loaded from, and when the files were looked at
-    std::string file;
-    std::optional<HStringArray> includes;
-    std::uint64_t generation = 0;
-    std::chrono::steady_clock::time_point looked;
-
-    bool isFresh(const HString& wantedFile, const HString& wantedKernel, const HStringArray* wantedIncludes) const;
-    bool create();
+    bool create(const std::string& file);
     std::size_t globalSize() const { return (workItems + localSize - 1) / localSize * localSize; }
 };
 
-bool HOpenCLKernelInfo::Impl::create() {
+bool HOpenCLKernelInfo::Impl::create(const std::string& file) {
     constexpr std::size_t usualLocalSize = 64; // a multiple of what the devices run at once
     cl_int status = CL_SUCCESS;
     kernel = clCreateKernel(program->id, name.c_str(), &status);
@@ -57,25 +48,11 @@ bool HOpenCLKernelInfo::Impl::create() {
     return noteFailure(status, "clGetKernelWorkGroupInfo", name) == CL_SUCCESS;
 }
 
-// Files are not looked at in every frame.
-bool HOpenCLKernelInfo::Impl::isFresh(const HString& wantedFile, const HString& wantedKernel,
-                                      const HStringArray* wantedIncludes) const {
-    constexpr std::chrono::milliseconds interval(100);
-    const bool areIncludesSame = wantedIncludes ? includes && *includes == *wantedIncludes : !includes;
-    return areIncludesSame && file == wantedFile.asStdString() && name == wantedKernel.asStdString() &&
-           generation == OpenQuarn::programGeneration() && std::chrono::steady_clock::now() - looked < interval;
-}
-
 HOpenCLKernelInfo::HOpenCLKernelInfo() noexcept = default;
 HOpenCLKernelInfo::~HOpenCLKernelInfo() = default;
 
 bool HOpenCLKernelInfo::loadOrUpdate(const HString& file, const HString& kernel, std::size_t workItems,
                                      const HStringArray* includeDirectories) try {
-    if (impl_ && impl_->isFresh(file, kernel, includeDirectories)) {
-        impl_->workItems = workItems;
-        return true;
-    }
-    const std::uint64_t generation = OpenQuarn::programGeneration();
     auto program = OpenQuarn::loadProgram(file.asStdString(), includeDirectories);
     if (!program) {
         reset();
@@ -85,17 +62,12 @@ bool HOpenCLKernelInfo::loadOrUpdate(const HString& file, const HString& kernel,
         impl_ = std::make_unique<Impl>();
         impl_->program = std::move(program);
         impl_->name = kernel.asStdString();
-        impl_->file = file.asStdString();
-        if (!impl_->create()) {
+        if (!impl_->create(file.asStdString())) {
             reset();
             return false;
         }
     }
     impl_->workItems = workItems;
-    impl_->file = file.asStdString();
-    impl_->includes = includeDirectories ? std::optional(*includeDirectories) : std::nullopt;
-    impl_->generation = generation;
-    impl_->looked = std::chrono::steady_clock::now();
     return true;
 } catch (const std::exception& error) {
     noteFailure(error.what());

@@ -48,7 +48,6 @@ Programs& programs() {
 }
 
 std::atomic<bool> withoutDoubles = false;
-std::atomic<std::uint64_t> generation = 0;
 
 bool isCurrent(const Entry& entry) {
     return std::all_of(entry.stamps.begin(), entry.stamps.end(),
@@ -163,12 +162,7 @@ std::shared_ptr<const Program> loadProgram(const std::string& file, const HStrin
     return entry->program;
 }
 
-std::uint64_t programGeneration() {
-    return generation.load();
-}
-
 void forgetPrograms() {
-    ++generation;
     std::map<Key, Entry> forgotten; // released without the lock
     const std::scoped_lock lock(programs().mutex);
     forgotten.swap(programs().entries);
@@ -176,7 +170,6 @@ void forgetPrograms() {
 
 void compileWithoutDoubles(bool without) {
     withoutDoubles = without;
-    ++generation;
 }
 
 } // namespace OpenQuarn

@@ -5,7 +5,6 @@
 #include "openquarn/HStringArray.h"
 #include "openquarn/gpu/opencl.h"
 
-#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -27,9 +26,6 @@ struct Program {
 /// reason noted, when it cannot be; a text that does not compile is compiled again only when it has changed.
 /// `includes` may be null.
 std::shared_ptr<const Program> loadProgram(const std::string& file, const HStringArray* includes);
-
-/// Another one when loadProgram() may give another program for a file that has not changed.
-std::uint64_t programGeneration();
 
 /// Forgets all programs; who uses one keeps it.
 void forgetPrograms();

@@ -22,8 +22,7 @@ public:
 
     /// Brings the kernel up to date with its file, and sets the work size. The program is compiled once a process for
     /// each file, list of folders and device, and again when the file or one that it includes has another time or size;
-    /// one that does not compile is tried again then too. While the kernel is loaded from the same file, it looks at
-    /// files ten times a second at most.
+    /// one that does not compile is tried again then too.
     /// `file` path of the OpenCL C source; `kernel` name of a kernel in it; `workItems` number of work items, may be 0:
     /// the kernel has to know it too, see enqueueKernel(); `includeDirectories` where its includes are looked for,
     /// after the folder of the file that includes; null: nowhere else.
