@@ -9,7 +9,6 @@
 #include "graph/values.h"
 
 namespace OpenQuarn {
-namespace {
 
 std::shared_ptr<MeshData> evaluatedMesh(const std::shared_ptr<Slot>& slot) {
     if (!slot)
@@ -24,6 +23,8 @@ std::shared_ptr<Slot> childOf(const Slot& element, const Attribute& attribute) {
             return part;
     return nullptr;
 }
+
+namespace {
 
 std::shared_ptr<Data> evaluatedExpression(const Slot& input) {
     const std::shared_ptr<Slot> slot = childOf(input, *filterAttributes().componentTagExpression);

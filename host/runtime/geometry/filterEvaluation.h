@@ -9,6 +9,12 @@
 
 namespace OpenQuarn {
 
+/// The mesh of a slot after evaluating it; null when it holds none, and for a null slot. Thread: as below.
+std::shared_ptr<MeshData> evaluatedMesh(const std::shared_ptr<Slot>& slot);
+
+/// The part of a compound, or of an element of an array of compounds, that is the attribute's; null when there is none.
+std::shared_ptr<Slot> childOf(const Slot& element, const Attribute& attribute);
+
 /// What the first state of a geometry would be built from now, on a mesh with these polygons and tags that comes in;
 /// evaluates its rest geometry. None, with a status that names node, geometry and tag, when the component tag is
 /// unknown. Thread: as below.

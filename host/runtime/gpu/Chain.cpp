@@ -24,13 +24,6 @@ std::shared_ptr<Slot> slotOfField(const NodeData& data, const Field& field, unsi
     return slot->elements.find(index);
 }
 
-std::shared_ptr<Slot> childOf(const Slot& element, const Attribute& attribute) {
-    for (const std::shared_ptr<Slot>& part : element.children)
-        if (part->field.attribute.get() == &attribute)
-            return part;
-    return nullptr;
-}
-
 /// The plug-in says so.
 bool isDueOnCpu(NodeData& data, unsigned index) {
     auto* deformer = dynamic_cast<HPxDeformerNode*>(data.node.userNode());
@@ -91,11 +84,6 @@ std::vector<Link> linksUpFrom(Link last) {
     }
     std::reverse(upwards.begin(), upwards.end());
     return upwards;
-}
-
-std::shared_ptr<MeshData> evaluatedMesh(const std::shared_ptr<Slot>& slot) {
-    pull(slot);
-    return std::dynamic_pointer_cast<MeshData>(slot->data);
 }
 
 /// Takes the affected vertices of a mesh with these polygons and tags; false, and no longer primed, when what the

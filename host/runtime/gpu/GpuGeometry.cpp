@@ -24,7 +24,6 @@ bool GpuGeometry::enterDevice(const std::shared_ptr<Device>& onto) {
         return false;
     }
     device_ = onto;
-    additional.resize(traits.additional.length());
     return true;
 }
 

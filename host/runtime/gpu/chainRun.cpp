@@ -2,6 +2,7 @@
 #include "gpu/chainRun.h"
 
 #include "geometry/filterAttributes.h"
+#include "geometry/filterEvaluation.h"
 #include "gpu/activity.h"
 #include "gpu/deformerImpl.h"
 #include "gpu/failure.h"
@@ -10,17 +11,12 @@
 #include "graph/plugImpl.h"
 #include "openquarn/HDataBlock.h"
 
+#include <exception>
+
 namespace OpenQuarn {
 namespace {
 
 using Status = HPxGPUDeformer::DeformerStatus;
-
-std::shared_ptr<MeshData> evaluatedMesh(const std::shared_ptr<Slot>& slot) {
-    if (!slot)
-        return nullptr;
-    pull(slot);
-    return std::dynamic_pointer_cast<MeshData>(slot->data);
-}
 
 class ChainRun {
 public:
@@ -97,6 +93,7 @@ private:
 
     static void supplyAdditional(const Link& link) {
         GpuGeometry& gpu = link.gpu();
+        gpu.additional.resize(gpu.traits.additional.length());
         for (unsigned i = 0; i < gpu.traits.additional.length(); ++i) {
             const std::shared_ptr<Slot> slot = slotOfGeometry(*link.data, gpu.traits.additional[i], link.index);
             if (slot)
@@ -171,7 +168,12 @@ private:
 } // namespace
 
 std::shared_ptr<MeshData> runChain(Chain& chain, const std::shared_ptr<Device>& device) {
-    return ChainRun(chain, device).run();
+    try {
+        return ChainRun(chain, device).run();
+    } catch (const std::exception& error) { // no memory: the CPU's evaluation may do with less
+        noteFailure(error.what());
+        return nullptr;
+    }
 }
 
 } // namespace OpenQuarn
