@@ -11,7 +11,6 @@
 #include "openquarn/TapiCastAnim.h"
 #include "openquarn/gpu/HOpenCLUtils.h"
 
-using OpenQuarn::Access;
 using OpenQuarn::requireEval;
 
 const HString HPxGPUDeformer::sPositionsName("positions");

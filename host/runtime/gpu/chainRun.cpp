@@ -128,7 +128,7 @@ private:
     bool takeOutput(const GpuGeometry& gpu, const HPlug& output) {
         positions_ = gpu.outputData.getBuffer(output, HPxGPUDeformer::sPositionsName);
         mesh_ = nullptr;
-        if (positions_.bufferSize() == chain_.mesh->vertexCount() * 3 * sizeof(float))
+        if (positions_.bufferSize() == std::size_t{chain_.mesh->vertexCount()} * 3 * sizeof(float))
             return true;
         noteFailure("its GPU deformer gave no positions");
         return false;

@@ -42,6 +42,7 @@ std::vector<cl_device_id> devicesOf(cl_platform_id platform, cl_int& failure) {
 template <class T>
 T deviceValue(cl_device_id id, cl_device_info what) {
     T value{};
+    // NOLINTNEXTLINE(bugprone-sizeof-expression): a platform is a pointer
     if (clGetDeviceInfo(id, what, sizeof(T), &value, nullptr) != CL_SUCCESS)
         return T{};
     return value;

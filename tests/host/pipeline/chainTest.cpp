@@ -12,7 +12,6 @@ using OpenQuarn::GpuCounts;
 using testDeformers::grid;
 using testDeformers::meshNode;
 using ::testing::Each;
-using ::testing::Eq;
 
 class ChainTest : public PipelineTest {
 protected:

@@ -33,7 +33,7 @@ protected:
     /// The next frame; what comes out has to be right wherever it was made.
     std::string nextFrame() {
         animate("d", ++frame_);
-        const std::string where = evaluatedOn("d");
+        std::string where = evaluatedOn("d");
         EXPECT_THAT(pushedBy("d", mesh), Each(frame_));
         return where;
     }
@@ -117,14 +117,14 @@ TEST_F(DeformerTest, InputPlugsAreThoseThatMakeTheOutput) {
     class Looks final : public HPxGPUDeformer {
     public:
         explicit Looks(HPlugArray& to)
-            : seen_(to) {}
+            : seen(to) {}
         using HPxGPUDeformer::evaluate;
         DeformerStatus evaluate(HDataBlock&, const HEvaluationNode&, const HPlug&, const HPlugArray& inputs,
                                 const HGPUDeformerData&, HGPUDeformerData&) override {
-            seen_ = inputs;
+            seen = inputs;
             return kDeformerPassThrough;
         }
-        HPlugArray& seen_;
+        HPlugArray& seen;
     };
     Hooks::create = [&seen] { return new Looks(seen); };
     for (const bool matches : {true, false}) {

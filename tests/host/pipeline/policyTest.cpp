@@ -10,7 +10,6 @@
 namespace {
 
 using namespace testNodes;
-using gpuDeformers::Hooks;
 using gpuDeformers::Seen;
 using OpenQuarn::Gpu;
 using testDeformers::grid;
