@@ -139,7 +139,7 @@ measure_row() {
   local row=$1 evaluator
   for evaluator in cpu gpu; do
     "$QUARN" play "$data/motion_${row%_*}.json" --model "$row" --against target --repeat 3 --evaluator "$evaluator" \
-      -o "$data/motion_${row}_$evaluator.npy" --json >"$data/results/$row/play_$evaluator.json"
+      -o "$data/motion_${row}_$evaluator.npy" --json >"$data/results/$row/play_$evaluator.json" || return
   done
   "$python" -m trainer evaluate "$data/sets/motion_${row%_*}" "$data/models/$row.nwrp" --json \
     >"$data/results/$row/evaluate.json"

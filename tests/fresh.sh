@@ -78,8 +78,10 @@ copy_clone() {
   fi
 }
 
+# PoCL asks /sys what processor there is, and ends the process where it gets no answer.
 mount_kernel_folders() {
   mount -t proc proc "$system/proc"
+  mount -t sysfs -o ro sysfs "$system/sys"
   mount --rbind /dev "$system/dev"
   mount --make-rslave "$system/dev"
   mount -t tmpfs tmpfs "$system/tmp"

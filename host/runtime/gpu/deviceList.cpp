@@ -6,12 +6,27 @@
 #include <algorithm>
 #include <charconv>
 
+#include <unistd.h>
+
 namespace OpenQuarn {
 namespace {
 
 constexpr cl_int noPlatform = -1001; // of the loader, when no platform is installed
 
+// PoCL ends the whole process where it cannot find out what processor there is, as in a bare chroot.
+bool maySeeDevices() {
+#ifdef __linux__
+    if (::access("/sys/devices/system/cpu", F_OK) != 0) {
+        noteFailure("no OpenCL device was found: they are not looked for where there is no /sys");
+        return false;
+    }
+#endif
+    return true;
+}
+
 std::vector<cl_platform_id> platforms() {
+    if (!maySeeDevices())
+        return {};
     cl_uint count = 0;
     const cl_int status = clGetPlatformIDs(0, nullptr, &count);
     if (status != CL_SUCCESS || count == 0) {
