@@ -118,12 +118,13 @@ HStatus uninitializePlugin(HObject) {
 
 } // namespace
 
-int Seen::alive = 0;
-int Seen::evaluations = 0;
-int Seen::terminations = 0;
+std::atomic<int> Seen::alive = 0;
+std::atomic<int> Seen::evaluations = 0;
+std::atomic<int> Seen::terminations = 0;
 
 void Seen::reset() {
-    evaluations = terminations = 0;
+    evaluations = 0;
+    terminations = 0;
 }
 
 std::function<HPxGPUDeformer*()> Hooks::create;

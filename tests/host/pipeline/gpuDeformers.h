@@ -5,6 +5,7 @@
 #include "openquarn/gpu/HGPUDeformerRegistrationInfo.h"
 #include "openquarn/gpu/HPxGPUStandardDeformer.h"
 
+#include <atomic>
 #include <functional>
 #include <string>
 
@@ -14,11 +15,11 @@ namespace gpuDeformers {
 /// does; its kernels come from `folder`, into which they are written.
 void registerPush(const std::string& folder);
 
-/// What the deformers have done since reset().
+/// What the deformers have done since reset(); they count side by side.
 struct Seen {
-    static int alive;       ///< objects that exist
-    static int evaluations; ///< of all variants
-    static int terminations;
+    static std::atomic<int> alive;       ///< objects that exist
+    static std::atomic<int> evaluations; ///< of all variants
+    static std::atomic<int> terminations;
     static void reset();
 };
 
