@@ -4,6 +4,7 @@
 
 #include "host/geometry/FilterTest.h"
 #include "host/pipeline/gpuDeformers.h"
+#include "support/TemporaryFolder.h"
 
 #include "openquarn_app/Gpu.h"
 
@@ -12,7 +13,7 @@
 class PipelineTest : public FilterTest {
 protected:
     PipelineTest() {
-        gpuDeformers::registerPush(::testing::TempDir());
+        registerPush();
         OpenQuarn::Gpu::setEnabled(true);
         OpenQuarn::Gpu::resetCounts();
     }
@@ -29,6 +30,7 @@ public:
     }
 
 protected:
+    void registerPush() { gpuDeformers::registerPush(kernels_.path().string()); }
     /// A deformer that pushes what the plug `from` gives by what the node "NAME_push" gives; that node's "in" is the
     /// animated value.
     static void makePusher(const std::string& name, const std::string& from) {
@@ -59,4 +61,7 @@ protected:
         animate(name, 1.5);
         EXPECT_EQ(evaluatedOn(name), "gpu");
     }
+
+private:
+    TemporaryFolder kernels_;
 };

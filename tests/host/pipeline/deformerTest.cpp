@@ -289,7 +289,7 @@ TEST_F(DeformerTest, DeformersGoWithTheirNodeAndTheirPlugin) {
     OpenQuarn::unloadPlugin("gpuDeformers");
     EXPECT_EQ(Seen::alive, 0);
     EXPECT_EQ(nextFrame(), "nowhere") << "no GPU deformer, nothing to count";
-    gpuDeformers::registerPush(::testing::TempDir());
+    registerPush();
     EXPECT_EQ(nextFrame(), "cpu");
     EXPECT_EQ(nextFrame(), "gpu");
     EXPECT_EQ(Seen::alive, 1);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Loading plug-ins from files, and unloading them: every step that can fail, and what is left behind.
 #include "host/plugins/TinyTypes.h"
+#include "support/TemporaryFolder.h"
 
 #include "openquarn/HFnData.h"
 #include "openquarn/HFnDependencyNode.h"
@@ -74,6 +75,7 @@ protected:
         EXPECT_FALSE(runCommand("tinyCommand").ok);
     }
 
+    TemporaryFolder copies_;
     std::vector<std::string> messages_;
     Session session_;
 
@@ -87,7 +89,7 @@ struct FailingLoad {
 };
 
 TEST_F(Loading, EveryStepThatFailsIsNamedAndLeavesNothing) {
-    const fs::path text = fs::path(testing::TempDir()) / "noLibrary.so";
+    const fs::path text = copies_.path() / "noLibrary.so";
     std::ofstream(text) << "not a library";
     const std::vector<FailingLoad> rows = {
         {module("isNotThere"), "no such file"},
@@ -142,12 +144,12 @@ TEST_F(Loading, TellsWhatIsLoadedAndLoadsAgainAfterUnloading) {
 }
 
 TEST_F(Loading, OnlyOneOfAName) {
-    const fs::path other = fs::path(testing::TempDir()) / "tinyGood.so";
+    const fs::path other = copies_.path() / "tinyGood.so";
     fs::copy_file(module("tinyGood"), other, fs::copy_options::overwrite_existing);
     loadPlugin(module("tinyGood"));
     EXPECT_THAT(errorOf([&] { loadPlugin(other.string()); }), HasSubstr("is loaded already, from " + folder.string()));
     // another name, but the same node type: the first one stays whole
-    const fs::path renamed = fs::path(testing::TempDir()) / "tinyCopy.so";
+    const fs::path renamed = copies_.path() / "tinyCopy.so";
     fs::copy_file(module("tinyGood"), renamed, fs::copy_options::overwrite_existing);
     EXPECT_THAT(errorOf([&] { loadPlugin(renamed.string()); }), HasSubstr("is in the way of 'tinyNode'"));
     EXPECT_TRUE(hasType("tinyNode"));
