@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/FrameSampler.h"
 
-#include "quarn/dataset/HostMessages.h"
 #include "quarn/dataset/controlNames.h"
+#include "quarn/scene/HostErrors.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
 
@@ -26,7 +26,7 @@ namespace {
 // does the work; whatever the host says against it becomes the error of the frame
 template <class Work>
 void strictly(int frame, Work work) {
-    const HostMessages messages;
+    const HostErrors errors;
     std::string error;
     try {
         work();
@@ -34,7 +34,7 @@ void strictly(int frame, Work work) {
         error = thrown.what();
     }
     // what the host says is nearer to the cause
-    if (const std::string said = messages.failures(); !said.empty())
+    if (const std::string said = errors.text(); !said.empty())
         error = said;
     if (!error.empty())
         fail("frame " + std::to_string(frame) + ": " + error);
@@ -90,7 +90,7 @@ FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const War
     host.setTime(firstFrame);
     strictly(firstFrame, [&] { evaluateInputs(); });
     {
-        const HostMessages ofTheModel; // it may not have been trained, and has no part in this
+        const HostErrors ofTheModel; // it may not have been trained, and has no part in this
         OpenQuarn::evaluate(geometry.output);
     }
     strictly(firstFrame, [&] {

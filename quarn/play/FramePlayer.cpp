@@ -7,30 +7,9 @@
 
 #include <chrono>
 #include <cmath>
-#include <iostream>
 #include <stdexcept>
 
 namespace quarn {
-
-HostErrors::HostErrors()
-    : before_(OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) {
-        std::string* const kept = message.severity == OpenQuarn::Severity::error    ? &error_
-                                  : message.severity == OpenQuarn::Severity::report ? &report_
-                                                                                    : nullptr;
-        if (kept == nullptr)
-            std::cerr << severityName(message.severity) + std::string(": ") + message.text + "\n";
-        else if (kept->empty())
-            *kept = message.text;
-    })) {}
-
-HostErrors::~HostErrors() {
-    OpenQuarn::setMessageSink(std::move(before_));
-}
-
-void HostErrors::clear() {
-    error_.clear();
-    report_.clear();
-}
 
 FramePlayer::FramePlayer(SceneSession& session, HPlug mesh)
     : session_(session)

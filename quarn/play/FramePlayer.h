@@ -3,7 +3,7 @@
 #pragma once
 
 #include "openquarn/HPlug.h"
-#include "openquarn_app/Messages.h"
+#include "quarn/scene/HostErrors.h"
 
 #include <string>
 #include <vector>
@@ -11,24 +11,6 @@
 namespace quarn {
 
 class SceneSession;
-
-/// While it lives, errors of the host and its plug-ins are kept instead of shown; warnings and the rest are shown as
-/// ever. Thread: main; messages may come from any.
-class HostErrors {
-public:
-    HostErrors();
-    ~HostErrors();
-    HostErrors(const HostErrors&) = delete;
-    HostErrors& operator=(const HostErrors&) = delete;
-
-    /// The first error since it was made or cleared, else the first failed call; empty when all went well.
-    std::string text() const { return error_.empty() ? report_ : error_; }
-    void clear();
-
-private:
-    OpenQuarn::MessageSink before_;
-    std::string error_, report_;
-};
 
 /// Shows frames of a mesh plug. Errors are std::runtime_error with "frame N: " and what the host said. Thread: main.
 class FramePlayer {

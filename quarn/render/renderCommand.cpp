@@ -5,10 +5,10 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/files/WholeFile.h"
-#include "quarn/render/ErrorWatch.h"
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
+#include "quarn/scene/HostErrors.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/plugs.h"
@@ -131,13 +131,18 @@ Shot plan(const Options& options, SceneSession& session) {
     return shot;
 }
 
+void throwIfAny(const HostErrors& errors, int frame) {
+    if (const std::string text = errors.text(); !text.empty())
+        throw std::runtime_error(text + " (at frame " + std::to_string(frame) + ")");
+}
+
 // looks at the frames before any is drawn: where the camera has to stand, and how far the colours have to reach
 void look(Shot& shot, const View& view, const Options& options, SceneSession& session) {
     Framing framing(view, shot.layout.width, shot.layout.height, shot.layout.margins());
     double largest = 0.0;
     const std::size_t count = shot.frames.count();
     const std::size_t looks = std::min(count, mostFramesLookedAt);
-    const ErrorWatch errors;
+    const HostErrors errors;
     Progress progress(options.console, "looking at the frames", looks);
     for (std::size_t number = 0; number < looks; ++number) {
         // with more frames than looks, spread evenly from the first to the last
@@ -149,7 +154,7 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
             for (const double distance : shown.distances)
                 largest = std::max(largest, distance);
         }
-        errors.throwIfAny(frame);
+        throwIfAny(errors, frame);
         progress.advance();
     }
     shot.camera = framing.camera();
@@ -167,7 +172,7 @@ void warnOfEmptyPanels(const Shot& shot, const Console& console) {
 void drawPictures(const Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
     const std::filesystem::path pattern = absolutePath(options.output);
     const std::size_t count = shot.frames.count();
-    const ErrorWatch errors;
+    const HostErrors errors;
     Progress progress(options.console, "drawing", count);
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
@@ -180,7 +185,7 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
             drawPanel(picture, shot.layout, left, shot.camera, shot.panels[panel], shown, shot.scale);
             left += shot.layout.width;
         }
-        errors.throwIfAny(frame);
+        throwIfAny(errors, frame);
         WholeFile file(pictureName(pattern, frame, count > 1));
         writePng(file.stream(), picture);
         file.finish();

@@ -108,8 +108,6 @@ public:
     /// Marks a slot whose value was not made although what depends on it is up to date: who reads it has to evaluate
     /// it, and a change that reaches it still makes everything dirty that depends on it.
     void markPassedOver();
-    /// Everything below has been evaluated.
-    void clearBelow() { state_.fetch_and(static_cast<std::uint8_t>(~belowBit), std::memory_order_acq_rel); }
 
 private:
     static constexpr std::uint8_t dirtyBit = 1;  // everything here and below

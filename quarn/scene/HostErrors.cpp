@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/scene/HostErrors.h"
+
+namespace quarn {
+
+using OpenQuarn::Severity;
+
+HostErrors::HostErrors()
+    : previous_(OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) { take(message); })) {}
+
+HostErrors::~HostErrors() {
+    OpenQuarn::setMessageSink(std::move(previous_));
+}
+
+void HostErrors::take(const OpenQuarn::Message& message) {
+    constexpr std::size_t kept = 3; // the causes; what follows from them comes later
+    switch (message.severity) {
+    case Severity::error:
+        if (errors_.size() < kept)
+            errors_.push_back(message.text);
+        break;
+    case Severity::report:
+        if (report_.empty())
+            report_ = message.text;
+        break;
+    default:
+        previous_(message);
+    }
+}
+
+std::string HostErrors::text() const {
+    if (errors_.empty())
+        return report_;
+    std::string all;
+    for (const std::string& error : errors_)
+        all += (all.empty() ? "" : "; ") + error;
+    return all;
+}
+
+void HostErrors::clear() {
+    errors_.clear();
+    report_.clear();
+}
+
+} // namespace quarn
