@@ -9,6 +9,7 @@
 
 #include "openquarn_app/Gpu.h"
 #include "openquarn_app/Messages.h"
+#include "support/PipelineOn.h"
 
 #include <algorithm>
 #include <chrono>
@@ -39,14 +40,6 @@ constexpr double largestFixedCost = 100.0; // microseconds
 const char* const smoothing = "averageVertKernel";
 const char* const shapes = "gpu_principal_shapes_kernel";
 const char* const apply = "gpu_apply_deltas_kernel";
-
-class PipelineOn {
-public:
-    PipelineOn() { Gpu::setEnabled(true); }
-    ~PipelineOn() { Gpu::setEnabled(false); }
-    PipelineOn(const PipelineOn&) = delete;
-    PipelineOn& operator=(const PipelineOn&) = delete;
-};
 
 // --- the table ---
 

@@ -2,6 +2,7 @@
 # gpu.sh CMAKE BUILD: installs the build tree and moves the installation: its quarn plays the example scene on the
 # OpenCL device with the kernels that lie there, and on the CPU when one of them is gone. Exits with 77 without a device.
 set -euo pipefail
+source tests/support/movingWave.sh
 cmake=$1 build=$2
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
@@ -19,18 +20,7 @@ reports() { grep -Pqz -- "$2" "$work/$1.json" || fail "$1: not /$2/ in: $(cat "$
 
 "$cmake" --install "$build" --prefix "$work/prefix" >/dev/null
 mv "$work/prefix" "$work/moved"
-cp -r examples/wave/models examples/wave/wave.json "$work"
-sed -i 's#"examples/wave/models"#"models"#' "$work/wave.json"
-cat >"$work/setup.txt" <<'SCRIPT'
-file -open wave.json
-createNode animCurve -name ramp
-setAttr ramp.keyTimes 1 11
-setAttr ramp.keyValues 0 1
-connectAttr time1.outTime ramp.time
-connectAttr ramp.output controls.inputList[0].input[0]
-file -saveAs moving.json
-SCRIPT
-(cd "$work" && moved/bin/quarn exec setup.txt >/dev/null)
+moving_wave "$work/moved/bin/quarn" "$work" </dev/null
 if "$work/moved/bin/quarn" info --devices | grep -q 'no OpenCL device'; then
   echo "there is no OpenCL device: the installed kernels were not run"
   exit 77

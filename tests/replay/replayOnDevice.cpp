@@ -7,6 +7,7 @@
 #include "values.h"
 
 #include "openquarn_app/Gpu.h"
+#include "support/PipelineOn.h"
 #include "support/StdoutCapture.h"
 
 #include <algorithm>
@@ -40,14 +41,6 @@ bool isTheCpus(const Json& expected, const OpenQuarn::GpuCounts& counts) {
 bool isOtherwiseOnDevice(const Json& expected) {
     return deltaMode(expected) > 1 && readBool(expected["flags"]["modelApplied"]);
 }
-
-class PipelineOn {
-public:
-    PipelineOn() { Gpu::setEnabled(true); }
-    ~PipelineOn() { Gpu::setEnabled(false); }
-    PipelineOn(const PipelineOn&) = delete;
-    PipelineOn& operator=(const PipelineOn&) = delete;
-};
 
 class DeviceReplay {
 public:

@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # play.sh QUARN: playing, baking and looking at the example scene, whose first control is made to follow the time.
 set -euo pipefail
+source tests/support/movingWave.sh
 quarn=$1
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
@@ -17,23 +18,13 @@ expect() {
 }
 fits() { if [[ $1 ]]; then grep -Pqz -- "$1" "$2"; else [[ ! -s $2 ]]; fi; }
 
-cp -r examples/wave/models examples/wave/wave.json "$work"
-sed -i 's#"examples/wave/models"#"models"#' "$work/wave.json"
-cat >"$work/setup.txt" <<'EOF'
-file -open wave.json
-createNode animCurve -name ramp
-setAttr ramp.keyTimes 1 11
-setAttr ramp.keyValues 0 1
-connectAttr time1.outTime ramp.time
-connectAttr ramp.output controls.inputList[0].input[0]
-file -saveAs moving.json
+moving_wave "$quarn" "$work" <<'EOF'
 createNode pointCache -name lost
 connectAttr strip.outMesh lost.inMesh
 connectAttr time1.outTime lost.time
 setAttr lost.cacheFile none.npy
 file -saveAs lost.json
 EOF
-(cd "$work" && "$quarn" exec setup.txt >/dev/null)
 scene=$work/moving.json
 
 # the wave of the first control at 1 is 0.4 units high, as the scene's own page says; half of it half-way
