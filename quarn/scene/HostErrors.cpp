@@ -5,8 +5,10 @@ namespace quarn {
 
 using OpenQuarn::Severity;
 
-HostErrors::HostErrors()
-    : previous_(OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) { take(message); })) {}
+HostErrors::HostErrors() {
+    // the host has this sink before it has given back the one of before, and calls it from one thread at a time
+    previous_ = OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) { take(message); });
+}
 
 HostErrors::~HostErrors() {
     OpenQuarn::setMessageSink(std::move(previous_));
@@ -24,7 +26,8 @@ void HostErrors::take(const OpenQuarn::Message& message) {
             report_ = message.text;
         break;
     default:
-        previous_(message);
+        if (previous_)
+            previous_(message);
     }
 }
 
