@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <exception>
 #include <limits>
@@ -22,7 +23,14 @@ namespace {
 
 constexpr std::uint32_t runtimeApiVersion = 16;
 
+/// Newer runtimes collect what they run, keep it in the user's home and send it away, in every process that makes a
+/// session, unless the environment says this before the first one. What the user has set stays.
+void switchTelemetryOff() {
+    ::setenv("ORT_DISABLE_TELEMETRY", "1", 0);
+}
+
 bool initialiseRuntimeApi() {
+    switchTelemetryOff();
     const OrtApiBase* base = OrtGetApiBase();
     const OrtApi* api = base == nullptr ? nullptr : base->GetApi(runtimeApiVersion);
     if (api == nullptr) {
@@ -38,7 +46,8 @@ bool runtimeApiAvailable() {
     return available;
 }
 
-// The table is fetched when the library is loaded, not in the middle of an evaluation.
+// The table is fetched when the library is loaded, on the thread that loads it and not in the middle of an evaluation:
+// the environment must not change beside threads that may read it.
 [[maybe_unused]] const bool fetchedAtLoad = runtimeApiAvailable();
 
 const char* logIdentifier() {
