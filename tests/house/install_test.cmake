@@ -25,6 +25,7 @@ must_run(${CMAKE_COMMAND} -S "${CONSUMER}" -B "${WORK}/build" -G "${GENERATOR}"
   -D CMAKE_CXX_COMPILER=${COMPILER} -D CMAKE_PREFIX_PATH=${WORK}/moved -D CMAKE_BUILD_TYPE=Release)
 must_run(${CMAKE_COMMAND} --build "${WORK}/build")
 must_run("${WORK}/build/consumer")
+must_run("${CMAKE_CURRENT_LIST_DIR}/runpaths.sh" "${WORK}/moved")
 file(WRITE "${WORK}/nothing.txt" "")
 must_run("${WORK}/moved/bin/quarn" exec --plugin "${WORK}/build/gpuPlugin.so" "${WORK}/nothing.txt")
 
