@@ -1,0 +1,164 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "storage/TemporaryFile.h"
+
+#include "storage/FileError.h"
+#include "storage/Folder.h"
+#include "storage/Target.h"
+
+#include <array>
+#include <cerrno>
+#include <charconv>
+#include <cstdint>
+#include <random>
+#include <string>
+
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/stat.h>
+#include <sys/utsname.h>
+#include <unistd.h>
+
+namespace storage {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::string_view prefix = ".whole-";
+constexpr std::string_view ending = ".part";
+// of one target at the same time on one machine, and so many names are looked at for what a killed one has left
+constexpr int mostWriters = 64;
+
+// FNV-1a of 64 bits: the same name everywhere
+std::uint64_t sumOf(std::string_view text) {
+    std::uint64_t sum = 0xcbf29ce484222325U;
+    for (const char c : text)
+        sum = (sum ^ static_cast<unsigned char>(c)) * 0x100000001b3U;
+    return sum;
+}
+
+std::string hexText(std::uint64_t number) {
+    std::array<char, 16> digits{};
+    const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), number, 16).ptr;
+    return std::string(static_cast<std::size_t>(digits.data() + digits.size() - end), '0') +
+           std::string(digits.data(), end);
+}
+
+std::string beginningFor(std::string_view target) {
+    return std::string(prefix) + hexText(sumOf(target)) + "-";
+}
+
+std::string bootText() {
+    const Descriptor file(::open("/proc/sys/kernel/random/boot_id", O_RDONLY | O_CLOEXEC));
+    std::array<char, 64> text{};
+    const ssize_t size = file.isOpen() ? ::read(file.number(), text.data(), text.size()) : -1;
+    return size > 0 ? std::string(text.data(), static_cast<std::size_t>(size)) : std::string();
+}
+
+// Empty where it cannot be told. A lock tells whether a writer lives only among those who see each other's locks: the
+// processes under one kernel.
+std::string markOfThisBoot() {
+    struct utsname host = {};
+    const std::string boot = bootText();
+    if (boot.empty() || ::uname(&host) != 0)
+        return {};
+    return hexText(sumOf(boot + host.nodename));
+}
+
+std::string uniqueMark() {
+    std::random_device random;
+    return "unlocked" + hexText((std::uint64_t{random()} << 32U) ^ random());
+}
+
+fs::path nameFor(const fs::path& target, const std::string& mark, int number) {
+    return target.parent_path() /
+           (beginningFor(target.filename().native()) + mark + "-" + std::to_string(number) + std::string(ending));
+}
+
+bool isAt(const fs::path& name, int descriptor) {
+    struct stat named = {};
+    struct stat open = {};
+    return ::lstat(name.c_str(), &named) == 0 && ::fstat(descriptor, &open) == 0 && named.st_dev == open.st_dev &&
+           named.st_ino == open.st_ino;
+}
+
+// takes away what a killed writer has left; a living one holds the lock
+void sweep(const fs::path& name) {
+    const Descriptor file(::open(name.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    struct stat status = {};
+    if (file.isOpen() && ::fstat(file.number(), &status) == 0 && S_ISREG(status.st_mode) &&
+        ::flock(file.number(), LOCK_EX | LOCK_NB) == 0 && isAt(name, file.number()))
+        ::unlink(name.c_str());
+}
+
+} // namespace
+
+TemporaryFile::TemporaryFile(const fs::path& target, const fs::path& path)
+    : target_(target)
+    , shown_(path) {
+    if (const std::string mark = markOfThisBoot(); !mark.empty()) {
+        for (int number = 0; number < mostWriters; ++number)
+            sweep(nameFor(target, mark, number));
+        for (int number = 0; number < mostWriters; ++number)
+            if (make(nameFor(target, mark, number)) && lock())
+                return;
+    }
+    // there are no locks here, or too many writers: a name that nobody takes for one left behind
+    if (!make(nameFor(target, uniqueMark(), 0)))
+        failToWrite(shown_, EEXIST);
+}
+
+// false: there are no locks here, or a sweep came between making and locking, and the file is not ours any more
+bool TemporaryFile::lock() {
+    const bool isLocked = ::flock(file_.number(), LOCK_EX | LOCK_NB) == 0;
+    if (isLocked && isAt(name_, file_.number()))
+        return true;
+    if (!isLocked && errno != EWOULDBLOCK)
+        ::unlink(name_.c_str());
+    name_.clear();
+    return false;
+}
+
+// false: there is something of that name
+bool TemporaryFile::make(const fs::path& name) {
+    file_ = Descriptor(::open(name.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666));
+    if (file_.isOpen())
+        name_ = name;
+    else if (errno != EEXIST)
+        failToWrite(shown_, errno);
+    return file_.isOpen();
+}
+
+TemporaryFile::~TemporaryFile() {
+    if (!name_.empty())
+        ::unlink(name_.c_str());
+}
+
+void TemporaryFile::takePermissions() {
+    struct stat old = {};
+    if (::stat(target_.c_str(), &old) != 0)
+        return;
+    struct stat own = {};
+    // where the group cannot be given, what the old group might do is not for the new one
+    const bool sameGroup =
+        ::fstat(file_.number(), &own) == 0 &&
+        (own.st_gid == old.st_gid || ::fchown(file_.number(), static_cast<uid_t>(-1), old.st_gid) == 0);
+    if (::fchmod(file_.number(), old.st_mode & (sameGroup ? 0777U : 0707U)) != 0)
+        failToWrite(shown_, "it cannot keep its permissions: " + textOfErrno(errno));
+}
+
+// the lock is held until the name is gone: nobody takes it for one left behind
+void TemporaryFile::publish() {
+    if (::fsync(file_.number()) != 0)
+        failToWrite(shown_, errno);
+    requireReplaceable(target_, shown_);
+    if (::rename(name_.c_str(), target_.c_str()) != 0)
+        failToWrite(shown_, errno);
+    name_.clear();
+    flushNames(target_.parent_path());
+}
+
+bool TemporaryFile::isOf(std::string_view name, std::string_view target) {
+    return name.starts_with(beginningFor(target)) && name.ends_with(ending);
+}
+
+} // namespace storage
