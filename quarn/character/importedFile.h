@@ -9,7 +9,8 @@
 
 namespace quarn {
 
-/// The files of the importer: `path` has the given bytes, which must live as long; all others are those of the disk.
+/// The files of the importer: `path` has the given bytes, which must live as long; all others are those of
+/// the disk, as far as they are files and no pipes or devices.
 class ImportedFile : public Assimp::DefaultIOSystem {
 public:
     ImportedFile(std::string path, const std::string& bytes);

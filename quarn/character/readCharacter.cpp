@@ -7,7 +7,8 @@
 #include "quarn/character/prepareGltf.h"
 #include "quarn/character/skinnedMeshes.h"
 #include "quarn/character/transfer.h"
-#include "quarn/character/trialProcess.h"
+#include "quarn/console/interrupt.h"
+#include "quarn/process/runApart.h"
 
 #include <assimp/BaseImporter.h>
 #include <assimp/Importer.hpp>
@@ -118,6 +119,17 @@ Character importFile(const std::string& path, const std::string& ending, const s
     return convert(*scene, hints, ending);
 }
 
+// the importer does not check all that it is given: it works at a safe distance, and only its result comes here
+std::string importApart(const std::function<std::string()>& action) {
+    try {
+        return runApart(action);
+    } catch (const NoAnswer& none) {
+        throw std::runtime_error(none.why() == NoAnswer::Why::crashed
+                                     ? "the file is damaged: the importer does not survive it"
+                                     : std::string("reading the file ") + none.what());
+    }
+}
+
 Character readFile(const std::string& path) {
     const std::string ending = lowerEnding(path);
     if (!isGltf(ending) && ending != ".fbx" && ending != ".dae")
@@ -126,9 +138,7 @@ Character readFile(const std::string& path) {
     SourceHints hints;
     if (isGltf(ending))
         bytes = prepareGltf(bytes, hints);
-
-    // the importer does not check all that it is given: it works at a safe distance, and only its result comes here
-    return unpackCharacter(runTrial([&] { return packCharacter(importFile(path, ending, bytes, hints)); }));
+    return unpackCharacter(importApart([&] { return packCharacter(importFile(path, ending, bytes, hints)); }));
 }
 
 } // namespace
@@ -138,6 +148,8 @@ Character readCharacter(const std::string& path) {
         return readFile(path);
     } catch (const std::bad_alloc&) {
         throw std::runtime_error(path + ": not enough memory for this file");
+    } catch (const Interrupted&) {
+        throw;
     } catch (const std::exception& error) {
         throw std::runtime_error(path + ": " + error.what());
     }

@@ -11,6 +11,8 @@
 #include <fstream>
 #include <limits>
 
+#include <sys/stat.h>
+
 namespace quarn {
 namespace {
 
@@ -35,6 +37,15 @@ TEST(DamagedCharacters, PathsThatAreNoFiles) {
     };
     refused(base + "/none.gltf", "no such file");
     refused(base + "/folder.glb", "not a file");
+    // nobody writes into these pipes, and nobody waits for that
+    for (const char* pipe : {"/pipe.glb", "/buffer.bin"})
+        ASSERT_EQ(mkfifo((base + pipe).c_str(), 0666), 0);
+    refused(base + "/pipe.glb", "not a file");
+    std::string text = Strip().write().text();
+    const std::size_t data = text.find("data:application");
+    text.replace(data, text.find('"', data) - data, "buffer.bin");
+    std::ofstream(base + "/pipe.gltf") << text;
+    EXPECT_THAT(errorOf([&] { readCharacter(base + "/pipe.gltf"); }), HasSubstr("buffer.bin"));
     refused(base + "/x.obj", "\".obj\" is not one of the endings .gltf, .glb, .fbx and .dae");
 }
 

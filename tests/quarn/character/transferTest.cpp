@@ -3,12 +3,8 @@
 #include "quarn/character/transfer.h"
 
 #include "quarn/character/characterFiles.h"
-#include "quarn/character/trialProcess.h"
 
 #include <gmock/gmock.h>
-
-#include <cstdlib>
-#include <new>
 
 namespace quarn {
 namespace {
@@ -54,22 +50,6 @@ TEST(Transfer, DamagedBytesDoNoHarm) {
             }
         }
     EXPECT_GT(refused, sound.size() / 2); // sizes and indices; the rest are numbers and letters
-}
-
-TEST(TrialProcess, GivesWhatTheActionGivesAndSurvivesIt) {
-    EXPECT_EQ(runTrial([] { return std::string(3000000, 'x'); }), std::string(3000000, 'x'));
-    EXPECT_EQ(runTrial([] { return std::string(); }), "");
-    EXPECT_THROW(runTrial([]() -> std::string { throw std::bad_alloc(); }), std::bad_alloc);
-    const auto errorOf = [](const std::function<std::string()>& action) {
-        try {
-            return "no error: " + runTrial(action);
-        } catch (const std::runtime_error& error) {
-            return std::string(error.what());
-        }
-    };
-    EXPECT_EQ(errorOf([]() -> std::string { throw std::runtime_error("a reason"); }), "a reason");
-    EXPECT_THAT(errorOf([]() -> std::string { std::abort(); }), testing::HasSubstr("does not survive"));
-    EXPECT_THAT(errorOf([]() -> std::string { std::_Exit(0); }), testing::HasSubstr("does not survive"));
 }
 
 } // namespace

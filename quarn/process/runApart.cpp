@@ -1,8 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/character/trialProcess.h"
+#include "quarn/process/runApart.h"
+
+#include "quarn/console/interrupt.h"
+#include "quarn/process/confine.h"
 
 #include <fcntl.h>
-#include <sys/resource.h>
+#include <sys/poll.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -10,47 +13,31 @@
 #include <cerrno>
 #include <csignal>
 #include <new>
-#include <stdexcept>
-#include <string>
 #include <system_error>
 
 namespace quarn {
 namespace {
 
-constexpr rlim_t mostSeconds = 120;
-
-// a crash here is an answer: it should leave neither words nor a core file
-void keepQuiet() {
-    const rlimit noCore{0, 0};
-    const rlimit time{mostSeconds, mostSeconds};
-    setrlimit(RLIMIT_CORE, &noCore);
-    setrlimit(RLIMIT_CPU, &time);
-    const int nowhere = open("/dev/null", O_WRONLY | O_CLOEXEC);
-    if (nowhere >= 0) {
-        dup2(nowhere, STDOUT_FILENO);
-        dup2(nowhere, STDERR_FILENO);
-    }
-    for (const int crash : {SIGSEGV, SIGABRT, SIGBUS, SIGFPE, SIGILL})
-        std::signal(crash, SIG_DFL);
-}
+using Clock = std::chrono::steady_clock;
+using Why = NoAnswer::Why;
 
 // the first byte of an answer
 constexpr char returned = 'r';
 constexpr char threw = 't';
-constexpr char outOfMemory = 'm';
+constexpr char hadNoMemory = 'm';
 
 std::string answerOf(const std::function<std::string()>& action) {
     try {
         return returned + action();
     } catch (const std::bad_alloc&) {
-        return {outOfMemory};
+        return {hadNoMemory};
     } catch (const std::exception& error) {
         return threw + std::string(error.what());
     }
 }
 
-[[noreturn]] void runAndEnd(const std::function<std::string()>& action, int pipe) {
-    keepQuiet();
+[[noreturn]] void runAndEnd(const std::function<std::string()>& action, const ApartLimits& limits, int pipe) {
+    confine(limits);
     int status = 1;
     try {
         const std::string answer = answerOf(action);
@@ -68,13 +55,21 @@ std::string answerOf(const std::function<std::string()>& action) {
     _exit(status);
 }
 
+[[noreturn]] void failToStart(const char* what) {
+    throw std::runtime_error(std::string("cannot ") + what +
+                             " a process that works at a distance: " + std::generic_category().message(errno));
+}
+
+[[noreturn]] void runOutOfMemory(const ApartLimits& limits) {
+    throw NoAnswer(Why::outOfMemory, "takes more than " + std::to_string(limits.memory >> 20U) + " MiB of memory");
+}
+
 // both ends of a pipe; closed with their owner
 class Pipe {
 public:
     Pipe() {
         if (pipe2(ends_.data(), O_CLOEXEC) != 0)
-            throw std::runtime_error("cannot make a pipe to the process that tries the file: " +
-                                     std::generic_category().message(errno));
+            failToStart("make a pipe to");
     }
     ~Pipe() {
         close(ends_[0]);
@@ -90,18 +85,33 @@ public:
         ends_[1] = -1;
     }
     /// All that comes until the other side is gone.
-    std::string readAll() const {
+    std::string readAll(const ApartLimits& limits) const {
+        const Clock::time_point end = Clock::now() + limits.wallClock;
         std::string bytes;
         std::array<char, 65536> piece{};
         for (;;) {
+            waitForBytes(limits, end);
             const ssize_t count = read(ends_[0], piece.data(), piece.size());
             if (count == 0 || (count < 0 && errno != EINTR))
                 return bytes;
             bytes.append(piece.data(), count > 0 ? static_cast<std::size_t>(count) : 0);
+            if (bytes.size() > limits.memory)
+                runOutOfMemory(limits);
         }
     }
 
 private:
+    void waitForBytes(const ApartLimits& limits, Clock::time_point end) const {
+        constexpr int milliseconds = 100;
+        pollfd side{ends_[0], POLLIN, 0};
+        while (poll(&side, 1, milliseconds) <= 0) {
+            throwIfInterrupted();
+            if (Clock::now() > end)
+                throw NoAnswer(Why::outOfTime,
+                               "takes more than " + std::to_string(limits.wallClock.count()) + " seconds");
+        }
+    }
+
     std::array<int, 2> ends_{-1, -1};
 };
 
@@ -123,8 +133,7 @@ public:
         int status = 0;
         while (waitpid(process_, &status, 0) < 0)
             if (errno != EINTR)
-                throw std::runtime_error("cannot wait for the process that tries the file: " +
-                                         std::generic_category().message(errno));
+                failToStart("wait for");
         process_ = 0;
         return status;
     }
@@ -133,33 +142,33 @@ private:
     pid_t process_;
 };
 
-void checkStatus(int status) {
-    if (WIFSIGNALED(status) && (WTERMSIG(status) == SIGXCPU || WTERMSIG(status) == SIGKILL))
-        throw std::runtime_error("reading the file takes more than " + std::to_string(mostSeconds) +
-                                 " seconds, or more memory than there is");
+void checkStatus(int status, const ApartLimits& limits) {
+    const int signal = WIFSIGNALED(status) ? WTERMSIG(status) : 0;
+    if (signal == SIGXCPU || signal == SIGKILL)
+        throw NoAnswer(Why::outOfTime, "takes more than " + std::to_string(limits.processorTime.count()) +
+                                           " seconds of processor time, or more memory than there is");
     if (!WIFEXITED(status) || WEXITSTATUS(status) != 0)
-        throw std::runtime_error("the file is damaged: the importer does not survive it");
+        throw NoAnswer(Why::crashed, "crashes");
 }
 
 } // namespace
 
-std::string runTrial(const std::function<std::string()>& action) {
+std::string runApart(const std::function<std::string()>& action, const ApartLimits& limits) {
     Pipe pipe;
     const pid_t process = fork();
     if (process < 0)
-        throw std::runtime_error("cannot start a process that tries the file: " +
-                                 std::generic_category().message(errno));
+        failToStart("start");
     if (process == 0)
-        runAndEnd(action, pipe.writing());
+        runAndEnd(action, limits, pipe.writing());
     Child child(process);
     pipe.closeWriting();
-    std::string answer = pipe.readAll();
-    checkStatus(child.waitForStatus());
+    std::string answer = pipe.readAll(limits);
+    checkStatus(child.waitForStatus(), limits);
     const char kind = answer.empty() ? '\0' : answer.front();
-    if (kind == outOfMemory)
-        throw std::bad_alloc();
+    if (kind == hadNoMemory)
+        runOutOfMemory(limits);
     if (kind != returned && kind != threw)
-        throw std::runtime_error("the file is damaged: the importer does not survive it");
+        throw NoAnswer(Why::crashed, "crashes");
     answer.erase(0, 1);
     if (kind == threw)
         throw std::runtime_error(answer);
