@@ -7,6 +7,7 @@
 
 #include "neuralWarp/deltas.h"
 #include "openquarn_app/Messages.h"
+#include "rig/finite.h"
 
 #include <oneapi/tbb/global_control.h>
 
@@ -176,6 +177,31 @@ void benchProduct(const bench::Options& options) {
         }
 }
 
+// What quarn adds to each frame that it delivers, beside the frame itself.
+void benchFinite(const bench::Options& options) {
+    OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {}); // the shapes come after the first frame
+    std::printf("%7s %-7s %-7s %3s %9s %9s %6s\n", "verts", "mode", "model", "smo", "frame us", "check us", "check%");
+    for (const WarpSetting& setting : {WarpSetting{316, false, 20, 0}, WarpSetting{316, true, 20, 10}}) {
+        WarpFrame frame(setting);
+        std::vector<float> points(3 * frame.vertices());
+        std::vector<double> frames, checks;
+        const auto end = std::chrono::steady_clock::now() + std::chrono::duration<double>(options.seconds);
+        while (std::chrono::steady_clock::now() < end || frames.size() < 20) {
+            frames.push_back(frame.run());
+            std::fill(points.begin(), points.end(), 0.5F); // they have just been read when they are looked at
+            const auto start = std::chrono::steady_clock::now();
+            if (rig::firstNotFinite(points))
+                throw std::runtime_error("0.5 is no finite number");
+            checks.push_back(std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
+        }
+        // the best of each: on a busy machine, what both would take on an idle one
+        const double whole = quantile(frames, 0.0) * 1e6, check = quantile(checks, 0.0) * 1e6;
+        std::printf("%7zu %-7s %-7s %3u %9.0f %9.1f %6.2f\n", frame.vertices(),
+                    setting.isSurface ? "Surface" : "Offset", modelName(setting).c_str(), setting.smoothing, whole,
+                    check, 100.0 * check / whole);
+    }
+}
+
 int run(int argc, char** argv) {
     const auto options = bench::readOptions(argc, argv);
     if (!options)
@@ -185,6 +211,10 @@ int run(int argc, char** argv) {
         printHeader(options->csv.get());
         for (const unsigned threads : {1U, 2U})
             inChild(*options, threads);
+    }
+    if (options->wants("finite")) {
+        std::printf("whether a frame has only finite coordinates, looked at after each frame (at most 2 %%)\n");
+        benchFinite(*options);
     }
     if (options->wants("product")) {
         std::printf("the product of the principal shapes; /limit: time over that of a triad of the same bytes\n");

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/info/ModelReport.h"
 
-#include "nw_model/PrincipalShapes.h"
+#include "quarn/scene/modelFiles.h"
 
 #include <algorithm>
 #include <stdexcept>
@@ -17,27 +17,6 @@ std::uint64_t sizeOf(const fs::path& file) {
     std::error_code error;
     const std::uint64_t size = fs::file_size(file, error);
     return error ? 0 : size;
-}
-
-void readMetadata(ModelReport& model) {
-    const fs::path file = model.directory / "metadata.json";
-    if (!fs::exists(file))
-        model.problems.emplace_back("metadata.json is missing: the deformer ignores the model without a word");
-    else if (!neuralWarp::readMetadataFile(model.metadata, file))
-        model.problems.emplace_back("metadata.json is no JSON object that can be read");
-    if (!model.metadata.loaded)
-        return;
-    const ModelMetadata& metadata = model.metadata;
-    if (metadata.subsetState == SubsetState::Unrecognized)
-        model.problems.emplace_back("metadata.json has no subsetState that is known: the model drives no vertex");
-    if (metadata.deltaMode > 1)
-        model.problems.push_back("metadata.json has the deltaMode " + std::to_string(metadata.deltaMode) +
-                                 ": 0 (Offset) and 1 (Surface) are known");
-    const auto& map = metadata.affectMap;
-    const auto beyond = std::find_if(map.begin(), map.end(), [&](auto vertex) { return vertex >= metadata.fullCount; });
-    if (beyond != map.end())
-        model.problems.push_back("metadata.json drives vertex " + std::to_string(*beyond) + ", and its mesh has " +
-                                 std::to_string(metadata.fullCount) + " vertices");
 }
 
 void readNetwork(ModelReport& model, neuralWarp::ModelSession& session) {
@@ -57,14 +36,10 @@ void readNetwork(ModelReport& model, neuralWarp::ModelSession& session) {
 }
 
 void readShapes(ModelReport& model) {
-    const fs::path file = model.directory / "principal_shapes.json";
-    model.hasShapes = fs::exists(file);
-    if (!model.hasShapes)
-        return;
-    std::vector<float> values;
-    if (!neuralWarp::readPrincipalShapesFile(file, values, model.shapeCount, model.shapeVertices))
-        model.problems.emplace_back("principal_shapes.json is damaged: the deformer would take the network's outputs "
-                                    "for deltas");
+    const ShapeSizes sizes = readShapeSizes(model.directory, model.problems);
+    model.hasShapes = sizes.hasFile;
+    model.shapeCount = sizes.count;
+    model.shapeVertices = sizes.vertices;
 }
 
 std::string numbers(const char* what, std::size_t has, const char* needs, std::size_t needed) {
@@ -130,7 +105,7 @@ ModelReport readModel(const fs::path& directory, neuralWarp::ModelSession& sessi
     model.directory = directory;
     for (const char* file : {"metadata.json", "model.onnx", "principal_shapes.json"})
         model.bytes += sizeOf(directory / file);
-    readMetadata(model);
+    readMetadata(directory, model.metadata, model.problems);
     readNetwork(model, session);
     readShapes(model);
     if (model.metadata.loaded && model.outputs != 0)

@@ -4,9 +4,10 @@
 #include "openquarn_app/Evaluation.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
+#include "rig/finite.h"
 
 #include <chrono>
-#include <cmath>
+#include <optional>
 #include <stdexcept>
 
 namespace quarn {
@@ -42,10 +43,9 @@ void FramePlayer::requireNoErrors() const {
 }
 
 void requireFinite(const std::vector<float>& xyz, const HPlug& mesh, int frame) {
-    for (std::size_t i = 0; i < xyz.size(); ++i)
-        if (!std::isfinite(xyz[i]))
-            throw std::runtime_error("frame " + std::to_string(frame) + ": vertex " + std::to_string(i / 3) + " of " +
-                                     mesh.name().asChar() + " has a coordinate that is no finite number");
+    if (const std::optional<std::size_t> place = rig::firstNotFinite(xyz))
+        throw std::runtime_error("frame " + std::to_string(frame) + ": vertex " + std::to_string(*place / 3) + " of " +
+                                 mesh.name().asChar() + " has a coordinate that is no finite number");
 }
 
 } // namespace quarn

@@ -10,7 +10,6 @@
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/meshes.h"
-#include "quarn/scene/modelDirectory.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
@@ -45,13 +44,6 @@ std::optional<Warp> warpFor(const Options& options) {
 void chooseModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
     if (!name.empty())
         useModel(warp, geometry, name);
-    if (!isModelActive(warp, geometry))
-        return;
-    // the one thing that the deformer says nothing about
-    const fs::path directory = modelDirectory(warp, geometry);
-    if (fs::is_directory(directory) && !fs::exists(directory / "metadata.json"))
-        throw std::runtime_error("the model " + directory.string() + " of " + warp.name +
-                                 " has no metadata.json: train or copy it again");
 }
 
 HPlug targetOf(const Warp* warp, const WarpGeometry* geometry, const std::string& against) {

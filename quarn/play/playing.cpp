@@ -6,6 +6,7 @@
 #include "quarn/play/FrameFiles.h"
 #include "quarn/play/FramePlayer.h"
 #include "quarn/play/phaseTimes.h"
+#include "quarn/scene/AppliedModels.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/plugs.h"
@@ -26,6 +27,7 @@ public:
     Playing(SceneSession& session, PlayPlan plan, const Console& console)
         : plan_(std::move(plan))
         , player_(session, plan_.mesh)
+        , models_({plan_.mesh, plan_.against})
         , progress_(console, "playing", plan_.frames.count() * static_cast<std::size_t>(plan_.repeats)) {
         if (!plan_.output.empty())
             checkFramePattern(plan_.output, plan_.frames);
@@ -51,6 +53,7 @@ public:
 private:
     void playOne(int frame, bool isTimed, bool isLookedAt) {
         const double seconds = player_.show(frame);
+        models_.requireSound();
         if (isTimed)
             result_.times.add(frame, seconds);
         if (isLookedAt)
@@ -61,6 +64,7 @@ private:
     // once is enough: each repeat shows the same
     void lookAt(int frame) {
         player_.read(points_);
+        requireFinite(points_, plan_.mesh, frame);
         const std::size_t count = points_.size() / 3;
         if (result_.vertexCount != 0 && result_.vertexCount != count)
             throw std::runtime_error("frame " + std::to_string(frame) + ": " + plan_.mesh.name().asChar() + " has " +
@@ -74,8 +78,6 @@ private:
     }
 
     void write(int frame) {
-        if (plan_.output.extension() != ".npy")
-            requireFinite(points_, plan_.mesh, frame);
         if (!files_)
             files_ = std::make_unique<FrameFiles>(plan_.output, polygonsOf(plan_.mesh), plan_.order);
         files_->add(frame, points_);
@@ -86,7 +88,6 @@ private:
         if (result_.boxDiagonal == 0.0)
             result_.boxDiagonal = boxDiagonal(plan_.rest ? *plan_.rest : target_);
         result_.targetJitter.add(target_);
-        requireFinite(points_, plan_.mesh, frame);
         addTo(result_.mesh, frame, points_);
         if (plan_.before.isNull())
             return;
@@ -112,6 +113,7 @@ private:
 
     PlayPlan plan_;
     FramePlayer player_;
+    AppliedModels models_;
     Progress progress_;
     RecordingEnd recordingEnd_;
     PlayResult result_;

@@ -8,6 +8,7 @@
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
+#include "quarn/scene/AppliedModels.h"
 #include "quarn/scene/HostErrors.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/frames.h"
@@ -136,6 +137,13 @@ void throwIfAny(const HostErrors& errors, int frame) {
         throw std::runtime_error(text + " (at frame " + std::to_string(frame) + ")");
 }
 
+AppliedModels modelsOf(const std::vector<Panel>& panels) {
+    std::vector<HPlug> meshes;
+    for (const Panel& panel : panels)
+        meshes.insert(meshes.end(), {panel.mesh, panel.reference});
+    return AppliedModels(meshes);
+}
+
 // looks at the frames before any is drawn: where the camera has to stand, and how far the colours have to reach
 void look(Shot& shot, const View& view, const Options& options, SceneSession& session) {
     Framing framing(view, shot.layout.width, shot.layout.height, shot.layout.margins());
@@ -143,6 +151,7 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
     const std::size_t count = shot.frames.count();
     const std::size_t looks = std::min(count, mostFramesLookedAt);
     const HostErrors errors;
+    AppliedModels models = modelsOf(shot.panels);
     Progress progress(options.console, "looking at the frames", looks);
     for (std::size_t number = 0; number < looks; ++number) {
         // with more frames than looks, spread evenly from the first to the last
@@ -155,6 +164,7 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
                 largest = std::max(largest, distance);
         }
         throwIfAny(errors, frame);
+        models.requireSound();
         progress.advance();
     }
     shot.camera = framing.camera();
@@ -173,6 +183,7 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
     const std::filesystem::path pattern = absolutePath(options.output);
     const std::size_t count = shot.frames.count();
     const HostErrors errors;
+    AppliedModels models = modelsOf(shot.panels);
     Progress progress(options.console, "drawing", count);
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
@@ -186,6 +197,7 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
             left += shot.layout.width;
         }
         throwIfAny(errors, frame);
+        models.requireSound();
         WholeFile file(pictureName(pattern, frame, count > 1));
         writePng(file.stream(), picture);
         file.finish();

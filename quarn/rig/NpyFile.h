@@ -75,7 +75,7 @@ public:
     NpyWriter& operator=(const NpyWriter&) = delete;
 
     /// Adds a frame: `xyz` x, y, z of every vertex, 3 * vertexCount numbers. Throws std::invalid_argument, and writes
-    /// nothing, for another number of them.
+    /// nothing, for another number of them; std::runtime_error, naming frame and vertex, for one that is not finite.
     void append(std::span<const float> xyz);
     /// Of those that have been written.
     std::size_t frameCount() const { return frames_; }

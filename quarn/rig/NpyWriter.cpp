@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/NpyFile.h"
+#include "rig/finite.h"
 
 #include <atomic>
 #include <cerrno>
@@ -78,6 +79,10 @@ void NpyWriter::append(std::span<const float> xyz) {
     if (xyz.size() % 3 != 0 || xyz.size() / 3 != vertexCount_)
         throw std::invalid_argument("point cache '" + path_ + "' has " + std::to_string(vertexCount_) +
                                     " vertices a frame, and is given " + std::to_string(xyz.size()) + " numbers");
+    if (const std::optional<std::size_t> place = firstNotFinite(xyz))
+        throw std::runtime_error("point cache '" + path_ + "': vertex " + std::to_string(*place / 3) +
+                                 " of its frame " + std::to_string(frames_) +
+                                 " has a coordinate that is no finite number");
     requireUsable();
     write(std::as_bytes(xyz));
     ++frames_;

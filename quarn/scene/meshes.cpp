@@ -2,6 +2,7 @@
 #include "quarn/scene/meshes.h"
 
 #include "openquarn/HDataBlock.h"
+#include "openquarn/HFnGeometryData.h"
 #include "openquarn/HFnMesh.h"
 #include "openquarn/HFnMeshData.h"
 #include "openquarn/HIntArray.h"
@@ -78,6 +79,12 @@ void readPoints(const HPlug& mesh, std::vector<double>& xyz) {
 
 void readPoints(const HPlug& mesh, std::vector<float>& xyz) {
     read(mesh, xyz);
+}
+
+std::size_t vertexCountOf(const HPlug& plug) {
+    HStatus status;
+    const HFnGeometryData mesh(plug.asHObject(&status), &status);
+    return status.error() ? 0 : mesh.vertexCount();
 }
 
 double boxDiagonal(std::span<const float> xyz) {

@@ -28,6 +28,9 @@ MeshPolygons polygonsOf(const HPlug& mesh);
 void readPoints(const HPlug& mesh, std::vector<double>& xyz);
 void readPoints(const HPlug& mesh, std::vector<float>& xyz);
 
+/// Evaluates a plug that should hold a mesh. 0 when it holds none, or fails. Thread: main.
+std::size_t vertexCountOf(const HPlug& mesh);
+
 /// The length of the diagonal of the box around the points; 0 without points. Thread: any.
 double boxDiagonal(std::span<const float> xyz);
 /// The same of an evaluated mesh, in the scene's unit. Throws as polygonsOf() does. Thread: main.

@@ -24,6 +24,10 @@ connectAttr strip.outMesh lost.inMesh
 connectAttr time1.outTime lost.time
 setAttr lost.cacheFile none.npy
 file -saveAs lost.json
+file -open moving.json
+setAttr ramp.keyValues 0 3e38
+setAttr wave.envelope 10
+file -saveAs huge.json
 EOF
 scene=$work/moving.json
 
@@ -54,7 +58,27 @@ expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
 expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
 expect 1 '' 'no node of type character' bake "$scene" strip.outMesh --frames 1 --order file -o "$work/lost.npy"
 expect 1 '' 'models/other\.nwrp' play "$scene" --frames 1 --model other
-[[ ! -e $work/lost.npy ]] || fail "a file of a play that failed"
+# a destroyed mesh leaves with an error: by what the scene says, by the network, and by a damaged model
+echo '{"openquarnScene": 1, "nodes": [{"name": "far", "type": "mesh", "values": {"inMesh": {"points":
+  [0, 0, 0, 1, 0, 0, 0, 1e300, 0], "counts": [3], "corners": [0, 1, 2]}}}]}' >"$work/far.json"
+for ending in npy obj; do
+  expect 1 '' 'frame 1: vertex 2 of far\.outMesh has a coordinate that is no finite number' \
+    play "$work/far.json" --plug far.outMesh --frames 1 -o "$work/lost.$ending"
+done
+expect 1 '' 'frame 1: vertex 2 of far' bake "$work/far.json" far.outMesh --frames 1 -o "$work/lost.npy"
+expect 1 '' 'frame 4: vertex 8 of wave' play "$work/huge.json" --frames 1-11
+expect 1 '' 'frame 4: vertex 8 of wave' bake "$work/huge.json" 'wave.outputGeom[0]' --frames 1-11 -o "$work/lost.npy"
+cp -r "$work/models/wave.nwrp" "$work/models/seven.nwrp"
+sed -i 's/"deltaMode": 1/"deltaMode": 7/' "$work/models/seven.nwrp/metadata.json"
+expect 1 '' 'wave cannot apply the model .*seven\.nwrp: .* deltaMode 7' play "$scene" --frames 1 --model seven
+mv "$work/models/wave.nwrp" "$work/kept"
+mv "$work/models/seven.nwrp" "$work/models/wave.nwrp"
+expect 1 '' 'deltaMode 7' bake "$scene" 'wave.outputGeom[0]' --frames 1-3 -o "$work/lost.npy"
+expect 0 '' 'wrote 3 frames' bake "$scene" strip.outMesh --frames 1-3 -o "$work/a.npy"
+expect 1 '' 'deltaMode 7' render "$scene" -o "$work/lost.png" --size 40x30
+rm -r "$work/models/wave.nwrp"
+mv "$work/kept" "$work/models/wave.nwrp"
+[[ ! -e $work/lost.png && ! -e $work/lost.obj && ! -e $work/lost.npy ]] || fail "a file of a play that failed"
 
 # the model in memory goes on while its directory is replaced under it, and Ctrl-C leaves nothing
 cp -r "$work/models/wave.nwrp" "$work/next"
@@ -83,7 +107,7 @@ expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\n
 rm -r "$work/models/wave.nwrp"
 expect 1 '' 'frame 1: .*wave\.nwrp' play "$scene" --frames 1
 mkdir "$work/models/wave.nwrp"
-expect 1 '' 'has no metadata\.json' play "$scene" --frames 1
+expect 1 '' 'wave cannot apply the model .*/wave\.nwrp: metadata\.json is missing' play "$scene" --frames 1
 echo 'no model' >"$work/models/wave.nwrp/model.onnx"
 echo '[' >"$work/models/wave.nwrp/principal_shapes.json"
 expect 1 'damaged: metadata(.|\n)*damaged: model\.onnx cannot be used(.|\n)*damaged: principal' 'is damaged' \

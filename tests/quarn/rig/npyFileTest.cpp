@@ -5,10 +5,13 @@
 #include "support/seedCorpus.h"
 
 #include "rig/NpyFile.h"
+#include "rig/finite.h"
 
 #include <gmock/gmock.h>
 
 #include <bit>
+#include <cfloat>
+#include <cmath>
 #include <csignal>
 #include <cstring>
 #include <fstream>
@@ -249,12 +252,31 @@ TEST_F(NpyFiles, FailedWritingSaysWhyAndLeavesWhatWasThere) {
         EXPECT_EQ(writer.frameCount(), 1U);
     }
     EXPECT_EQ(reason, "point cache '" + path() + "' cannot be written: File too large");
+    EXPECT_THAT(why([&] {
+                    NpyWriter(path(), 1).append(std::vector<float>{0, 0, -INFINITY});
+                }),
+                HasSubstr("vertex 0 of its frame 0 has a coordinate that is no finite number"));
     EXPECT_EQ(bytesOf(path()), "before");
     EXPECT_EQ(entries(), 1U);
     EXPECT_THAT(why([&] { NpyWriter(path("none/cache.npy"), 1); }), HasSubstr("none/cache.npy' cannot be written"));
     std::filesystem::create_directory(path("folder"));
     EXPECT_THAT(why([&] { NpyWriter(path("folder"), 1); }), HasSubstr("Is a directory"));
     EXPECT_EQ(entries(), 2U);
+}
+
+TEST(FirstNotFinite, IsFoundWhereverItIs) {
+    for (const std::size_t size : {1U, 4096U, 4097U, 10000U}) {
+        std::vector<float> values(size, -FLT_MAX);
+        EXPECT_EQ(rig::firstNotFinite(values), std::nullopt);
+        for (const std::size_t place : {std::size_t{0}, size / 2, size - 1})
+            for (const float bad : {INFINITY, -INFINITY, NAN}) {
+                values.back() = bad;
+                values[place] = bad;
+                EXPECT_EQ(rig::firstNotFinite(values), place);
+                values.back() = values[place] = 1.0F;
+            }
+    }
+    EXPECT_EQ(rig::firstNotFinite({}), std::nullopt);
 }
 
 TEST(NpySeeds, AreAcceptedOrRefusedAsTheirNamesSay) {

@@ -1,0 +1,37 @@
+// SPDX-License-Identifier: Apache-2.0
+// The models that decide what a mesh looks like. The deformer applies some that cannot be right, without a word: what
+// quarn delivers is checked here.
+#pragma once
+
+#include "openquarn/HPlug.h"
+#include "quarn/scene/Warp.h"
+
+#include <vector>
+
+namespace quarn {
+
+/// The geometries of deformers that some mesh plugs depend on. Thread: main.
+class AppliedModels {
+public:
+    /// Null plugs are passed over.
+    explicit AppliedModels(const std::vector<HPlug>& meshes);
+
+    /// To be called after a frame has been evaluated without an error. The first time that a deformer applies its model
+    /// (switched on, envelope not 0, not replaced by a target morph), looks into the model directory and at the rest
+    /// mesh; later frames cost nothing then. Throws std::runtime_error that names deformer, model and reason when the
+    /// files are damaged, or when the rest mesh has another number of vertices than the one that is deformed.
+    void requireSound();
+
+private:
+    struct Geometry {
+        Warp warp;
+        WarpGeometry geometry;
+    };
+    static bool isApplied(const Geometry& geometry);
+    static bool canChange(const Geometry& geometry);
+    static void requireSound(const Geometry& geometry);
+
+    std::vector<Geometry> unchecked_;
+};
+
+} // namespace quarn
