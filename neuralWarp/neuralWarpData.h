@@ -60,7 +60,9 @@ public:
     bool hasDueCaches() const;
     /// A load was asked for since the last evaluation on the CPU: one that it left due is not tried again by itself.
     bool hasNewLoads() const { return (loadsDue() & ~loadsLeft) != 0; }
-    void leaveLoads() { loadsLeft = loadsDue(); }
+    /// An evaluation on the CPU ends here. One that gave the model up before all loads were made goes on with them in
+    /// the next: they count as asked for anew.
+    void leaveLoads(bool isGivenUp) { loadsLeft = isGivenUp ? 0 : loadsDue(); }
     /// The model is in use and drives none of the deformed vertices.
     bool drivesNothing() const { return useAffectMap && affectMap.empty(); }
     /// The model drives deformed vertex `i`. False for an index that no vertex has.

@@ -96,7 +96,8 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
         return HStatus::kSuccess;
     }
 
-    isActive = isActive && updateModelSettings(block, *data);
+    const bool isGivenUp = isActive && !updateModelSettings(block, *data);
+    isActive = isActive && !isGivenUp;
     status = prepareRestState(*data, block, multiIndex);
     if (status.error())
         return status;
@@ -113,10 +114,10 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
             loadModel(*data, false); // a failure shows in canApplyModel()
     } else if (!isMorphed) {
         data->modelApplied = false;
-        data->leaveLoads();
+        data->leaveLoads(isGivenUp);
         return HStatus::kSuccess;
     }
-    data->leaveLoads();
+    data->leaveLoads(isGivenUp);
     isActive = isActive && data->canApplyModel() && !data->drivesNothing();
     data->modelApplied = isActive;
 

@@ -216,6 +216,54 @@ TEST_F(Parity, OfAModelThatIsExported) {
     checkFrame(scene, 0, true);
 }
 
+/// What an evaluation gives up goes on in the next one: on the CPU, until there is nothing left to go on with.
+TEST_F(Parity, OfAModelThatIsMended) {
+    using Write = std::function<void(const Scene&)>;
+    const Write good = [](const Scene& scene) { writeModel(scene.modelDirectory(), scene.model()); };
+    const Write drivesNothing = [](const Scene& scene) {
+        ModelSpec model = scene.model();
+        model.subsetState = "partial";
+        model.affectMap = {model.fullCount};
+        writeModel(scene.modelDirectory(), model);
+    };
+    const Write noMetadata = [](const Scene& scene) { writeFile(scene.modelDirectory() / "metadata.json", "{"); };
+    const Write noDirectory = [](const Scene& scene) { std::filesystem::remove_all(scene.modelDirectory()); };
+    struct Row {
+        const char* name;
+        Write spoil;
+        std::string whileSpoilt, whenMended; ///< where four frames each are made: on the CPU, or the GPU
+    };
+    const Row rows[] = {{"drives nothing", drivesNothing, "CGGG", "CCGG"},
+                        {"no metadata, and the network of before", noMetadata, "CCGG", "CGGG"},
+                        {"nothing there", noDirectory, "CCCG", "CGGG"}};
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        std::vector<HPointArray> frames[2];
+        std::string where;
+        for (const bool isOn : {false, true}) {
+            session.newScene();
+            Gpu::setEnabled(isOn);
+            const Scene scene(folder.path(), 3, {{{.mesh = makeGrid(5, 4), .deltaMode = 1, .passes = 1}}});
+            prime(scene);
+            for (const Write& write : {row.spoil, good}) {
+                write(scene);
+                script("neuralWarp warp1 -reloadModel");
+                for (std::uint32_t seed = 1; seed <= 4; ++seed) {
+                    scene.pose(seed);
+                    const Frame frame = evaluated(scene);
+                    frames[isOn].push_back(frame.points);
+                    where += !isOn ? "" : frame.counts.gpuEvaluations == 1 ? "G" : "C";
+                }
+            }
+            EXPECT_GT(largestDistance(frames[isOn].back(), scene.input()), 0.01 * diagonal(scene.input()));
+            for (std::size_t i = 0; isOn && i < where.size(); ++i)
+                expectNear(scene, 0, frames[1][i], frames[0][i]);
+            takeMessages();
+        }
+        EXPECT_EQ(where, row.whileSpoilt + row.whenMended);
+    }
+}
+
 TEST_F(Parity, OfTwoDeformersOneAfterTheOther) {
     const Wish wishes[] = {
         {{{.mesh = makeGrid(6, 5), .deltaMode = 1, .passes = 2, .shapes = 3, .isPart = true}}},
