@@ -32,7 +32,7 @@ void check(const HStatus& status) {
         throw std::runtime_error(status.errorString().asStdString());
 }
 
-/// out = in + the number of elements of ins.
+/// out = in + the number of elements of ins; the latter alone, and `in` unread, while `skip` is on.
 class BenchNode : public HPxNode {
 public:
     static HPxNode* creator() { return new BenchNode; }
@@ -41,11 +41,13 @@ public:
         in = HFnNumericAttribute().create("in", "in", HFnNumericData::kDouble);
         ins = HFnNumericAttribute().create("ins", "ins", HFnNumericData::kDouble);
         HFnAttribute(ins).setArray(true);
+        skip = HFnNumericAttribute().create("skip", "sk", HFnNumericData::kBoolean);
         out = HFnNumericAttribute().create("out", "out", HFnNumericData::kDouble);
         HFnAttribute(out).setWritable(false);
-        for (const HObject& attribute : {in, ins, out})
+        for (const HObject& attribute : {in, ins, skip, out})
             addAttribute(attribute);
         attributeAffects(in, out);
+        attributeAffects(skip, out);
         return attributeAffects(ins, out);
     }
 
@@ -54,13 +56,13 @@ public:
             return HStatus::kUnknownParameter;
         const double count = block.outputArrayValue(ins).elementCount();
         HDataHandle result = block.outputValue(out);
-        result.set(block.inputValue(in).asDouble() + count);
+        result.set(block.inputValue(skip).asBool() ? count : block.inputValue(in).asDouble() + count);
         result.setClean();
         return HStatus::kSuccess;
     }
 
 private:
-    static inline HObject in, ins, out;
+    static inline HObject in, ins, skip, out;
 };
 
 constexpr unsigned typeId = 0x7e570101;
@@ -75,14 +77,16 @@ HStatus uninitializePlugin(HObject object) {
 struct Chain {
     std::vector<HPlug> ins, outs;
 
-    explicit Chain(std::size_t length) {
-        HDGModifier modifier;
+    explicit Chain(std::size_t length, bool fromItsEnd = false) {
         for (std::size_t i = 0; i < length; ++i) {
             const HFnDependencyNode node(HFnDependencyNode().create("benchNode"));
             ins.push_back(node.findPlug("in"));
             outs.push_back(node.findPlug("out"));
-            if (i > 0)
-                check(modifier.connect(outs[i - 1], ins[i]));
+        }
+        HDGModifier modifier;
+        for (std::size_t i = 1; i < length; ++i) {
+            const std::size_t to = fromItsEnd ? length - i : i;
+            check(modifier.connect(outs[to - 1], ins[to]));
         }
         check(modifier.doIt());
         check(OpenQuarn::evaluate(outs.back()));
@@ -123,6 +127,31 @@ std::function<void()> dirtyAndEvaluateAll(const Chain& chain, std::size_t times)
             check(in.setDouble(value += 1.0));
             check(OpenQuarn::evaluate(out));
         }
+    };
+}
+
+std::function<void()> build(std::size_t length, std::size_t times, bool fromItsEnd) {
+    return [=] {
+        for (std::size_t i = 0; i < times; ++i)
+            const Chain chain(length, fromItsEnd);
+    };
+}
+
+// edits at the head of a chain that nobody reads
+std::function<void()> editUnread(const Chain& chain, std::size_t times) {
+    return [in = chain.ins.front(), times, value = 0.0]() mutable {
+        for (std::size_t i = 0; i < times; ++i)
+            check(in.setDouble(value += 1.0));
+    };
+}
+
+// frames of a chain whose last node is evaluated and does not read its input, `times` over
+std::function<void()> passUnread(const Chain& chain, std::size_t times) {
+    HPlug skip = HFnDependencyNode(chain.outs.back().node()).findPlug("skip");
+    return [skip, frames = dirtyAndEvaluateAll(chain, times)]() mutable {
+        check(skip.setBool(true));
+        frames();
+        check(skip.setBool(false));
     };
 }
 
@@ -198,6 +227,10 @@ void runAll(const bench::Options& options, bench::Report& report) {
         growth("evaluate last", "10 000 nodes", 1, evaluateLast(large), evaluateLast(small)),
         growth("dirty and evaluate all", "10 000 nodes", 10000, dirtyAndEvaluateAll(large, 1),
                dirtyAndEvaluateAll(medium, 10)),
+        growth("unread, 10 000 edits", "10 000 nodes", 10000, editUnread(large, 10000), editUnread(small, 10000)),
+        growth("unread, edit and evaluate", "10 000 nodes", 10000, passUnread(large, 1), passUnread(medium, 10)),
+        growth("build from its start", "10 000 nodes", 10000, build(10000, 1, false), build(1000, 10, false)),
+        growth("build from its end", "2 000 nodes", 2000, build(2000, 1, true), build(200, 10, true)),
         growth("array, ascending", "100 000", 100000, fillArray(100000, 1, Order::ascending),
                fillArray(1000, 100, Order::ascending)),
         growth("array, descending", "100 000", 100000, fillArray(100000, 1, Order::descending),

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Whole evaluations, from a model directory to moved points, against the formulas.
+#include "openquarn_app/Evaluation.h"
 #include "neuralWarp/reference.h"
 #include "neuralWarp/support/WarpTest.h"
 #include "neuralWarp/sweep.h"
@@ -335,6 +336,59 @@ TEST_F(FourControls, AnEnvelopeOfZeroTouchesNothing) {
     EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
     EXPECT_EQ(firstDifference(rig.result(0), warpRig::pointsOf(quad)), 4U);
     EXPECT_TRUE(rig.state(0)->modelPathDirty && rig.state(0)->indexMapDirty);
+}
+
+/// What makes evaluations leave the controls unread.
+struct UnreadControls {
+    const char* name;
+    std::function<void(ModelSpec&)> spoil; ///< the model; none: export mode does
+};
+
+TEST_F(Evaluation, ControlsThatWereNotReadCountAtTheirNextChange) {
+    ModelSpec good;
+    good.weights = {0, 0, 1, 0, 0, 1, 0, 0, 1, 0, 0, 1};
+    good.bias.assign(12, 0.0F);
+    good.deltaMode = 0;
+    good.fullCount = good.affectCount = 4;
+    const HObject quad = warpRig::mesh(makeGrid(1, 1));
+    for (const UnreadControls& row :
+         {UnreadControls{"export mode", nullptr},
+          UnreadControls{"a model of another mesh", [](ModelSpec& spec) { spec.fullCount = 5; }},
+          UnreadControls{"a model that drives nothing", [](ModelSpec& spec) { spec.subsetState = "empty"; }}}) {
+        SCOPED_TRACE(row.name);
+        session.newScene();
+        warpRig::Rig rig;
+        rig.setModelRoot(folder.path());
+        rig.addGeometry(0, {.mesh = quad});
+        rig.plug("export[0].smoothingIterations").setInt(0);
+        HPlug control = warpRig::plug(testNodes::create("testCase", "control"), "in");
+        const HPlug passedOn = warpRig::plug(testNodes::create("testCase", "passedOn"), "out");
+        warpRig::connect(warpRig::plug(control.node(), "out"), warpRig::plug(passedOn.node(), "in"));
+        warpRig::connect(passedOn, rig.plug("controlValues[0]"));
+        const auto movedBy = [&](double value) {
+            control.setDouble(value);
+            return rig.result(0)[3].z - warpRig::pointsOf(quad)[3].z;
+        };
+        const auto change = [&](const ModelSpec& model, const char* exportMode) {
+            writeModel(modelDirectory(), model);
+            script(row.spoil ? "neuralWarp -reloadModel warp1"
+                             : std::string("neuralWarp -exportActive ") + exportMode + " warp1");
+        };
+        writeModel(modelDirectory(), good);
+        EXPECT_NEAR(movedBy(0.0625), 0.0625, 1e-6);
+        ModelSpec spoilt = good;
+        if (row.spoil)
+            row.spoil(spoilt);
+        change(spoilt, "on");
+        OpenQuarn::makeDirty(rig.output(0)); // commands leave that to their user
+        for (const double value : {0.125, 0.25, 0.375})
+            EXPECT_NEAR(movedBy(value), 0.0, 1e-6);
+        takeMessages();
+        change(good, "off");
+        movedBy(0.4375); // after one that drove nothing, a model is loaded and not yet applied
+        for (const double value : {0.5, 0.625, 0.75})
+            EXPECT_NEAR(movedBy(value), value, 1e-6);
+    }
 }
 
 } // namespace

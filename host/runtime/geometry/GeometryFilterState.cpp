@@ -31,14 +31,6 @@ bool isAtOrBelow(const Slot& slot, const Attribute& attribute) {
     return false;
 }
 
-const Slot* outermostElement(const Slot& slot) {
-    const Slot* element = nullptr;
-    for (const Slot* at = &slot; at; at = at->parent)
-        if (at->isElement)
-            element = at;
-    return element;
-}
-
 bool holdsGeometry(const Slot& inputElement) {
     const std::shared_ptr<Slot>& geometry = inputElement.children.front();
     return geometry->data || geometry->source() || inputElement.source();

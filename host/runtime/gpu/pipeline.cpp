@@ -50,14 +50,6 @@ void clearAfterFailure(const Chain& chain, const std::shared_ptr<Device>& device
         link.gpu().leaveDevice();
 }
 
-/// What is between the links was not made: it is evaluated when somebody asks for it.
-void markPassedOver(const Chain& chain) {
-    for (std::size_t i = 1; i < chain.links.size(); ++i) {
-        chain.links[i - 1].output->markPassedOver();
-        chain.links[i].geometry->markPassedOver();
-    }
-}
-
 std::shared_ptr<MeshData> runOn(const std::shared_ptr<Device>& device, Chain& chain) {
     takeFailure(); // of before
     std::shared_ptr<MeshData> mesh = runChain(chain, device);
@@ -72,7 +64,6 @@ std::shared_ptr<MeshData> runOn(const std::shared_ptr<Device>& device, Chain& ch
         link.gpu().isFailing = false;
         countEvaluation(true);
     }
-    markPassedOver(chain);
     return mesh;
 }
 

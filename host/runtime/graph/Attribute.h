@@ -65,18 +65,18 @@ std::shared_ptr<Attribute> makeAttribute(HFn::Type kind, const std::string& long
 /// An attribute in a node type: attributes of base types are shared by many types, what depends on what is each type's
 /// own.
 struct Field {
-    struct Dependent {
-        const Field* field;
-        bool sameElement; ///< only the element with the index of the changed one
+    struct Dependency {
+        const Field* field; ///< the other one
+        bool sameElement;   ///< elements of equal index only
     };
 
     std::shared_ptr<const Attribute> attribute;
     const Field* parent = nullptr;
     unsigned position = 0; ///< among the children of its parent, or among the type's top-level fields
     std::vector<std::unique_ptr<Field>> children;
-    std::vector<Dependent> dependents;    ///< what becomes dirty with it, everything considered
-    std::vector<const Field*> affectedBy; ///< the other way round
-    bool computed = false; ///< something affects it: its value comes from compute() unless it is connected
+    std::vector<Dependency> dependents; ///< what becomes dirty with it, everything considered
+    std::vector<Dependency> affectedBy; ///< what it, or a field above it, was declared to depend on
+    bool computed = false;              ///< something affects it: its value comes from compute() unless it is connected
 
     bool isArray() const { return attribute->array; }
     bool isCompound() const { return attribute->isCompound(); }

@@ -91,12 +91,12 @@ void NodeClass::finish() {
     for (const auto& [attribute, field] : byAttribute_)
         addDependents(*field);
     for (const Pair& pair : pairs_)
-        addAffecting(*pair.affected, *pair.affecting);
+        addAffecting(*pair.affected, {pair.affecting, pair.sameElement});
 }
 
 // an output's children are computed with it
-void NodeClass::addAffecting(Field& affected, const Field& affecting) {
-    affected.affectedBy.push_back(&affecting);
+void NodeClass::addAffecting(Field& affected, const Field::Dependency& affecting) {
+    affected.affectedBy.push_back(affecting);
     for (const std::unique_ptr<Field>& child : affected.children)
         addAffecting(*child, affecting);
 }
@@ -115,7 +115,7 @@ void NodeClass::addDependents(Field& field) {
                             isAbove(&field, pair.affecting);
         const bool listed =
             std::any_of(field.dependents.begin(), field.dependents.end(),
-                        [&](const Field::Dependent& dependent) { return dependent.field == pair.affected; });
+                        [&](const Field::Dependency& dependent) { return dependent.field == pair.affected; });
         if (counts && !listed && pair.affected != &field)
             field.dependents.push_back({pair.affected, pair.sameElement});
     }

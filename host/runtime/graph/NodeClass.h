@@ -76,7 +76,7 @@ private:
                                      unsigned position);
     Field& fieldOf(const Attribute& attribute) const;
     void addDependents(Field& field);
-    static void addAffecting(Field& affected, const Field& affecting);
+    static void addAffecting(Field& affected, const Field::Dependency& affecting);
 
     std::vector<std::unique_ptr<Field>> fields_;
     std::unordered_map<const Attribute*, Field*> byAttribute_;

@@ -3,6 +3,7 @@
 
 #include "graph/Node.h"
 #include "graph/arrayLock.h"
+#include "graph/told.h"
 
 #include <algorithm>
 
@@ -44,12 +45,17 @@ std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
 void Slot::adopt(const std::shared_ptr<Slot>& element) {
     element->parent = this;
     element->attach(owner);
+    const bool isDue = field.computed || isDirty();
+    if (isDue)
+        element->markDirty();
     {
         const ArrayWriteLock lock(owner);
         elements.insert(element->index, element);
     }
-    if (field.computed)
-        element->markDirty();
+    if (isDue) { // what depends on it, or will, has not been told
+        element->forgetTold();
+        forgetToldUpstream(*element);
+    }
 }
 
 void Slot::attach(NodeData* newOwner) {
@@ -144,40 +150,46 @@ std::string Slot::name() const {
     return owner ? owner->node.name() + "." + path() : path();
 }
 
+void Slot::drop(std::uint8_t bits) {
+    state_.fetch_and(static_cast<std::uint8_t>(~bits), std::memory_order_acq_rel);
+}
+
 void Slot::setFailed(bool failed) {
     if (failed)
         state_.fetch_or(failedBit, std::memory_order_acq_rel);
     else
-        state_.fetch_and(static_cast<std::uint8_t>(~failedBit), std::memory_order_acq_rel);
+        drop(failedBit);
 }
 
-void Slot::markDirtyBelow() {
-    state_.fetch_or(dirtyBit | belowBit, std::memory_order_acq_rel);
-    forEachPart([](Slot& part) { part.markDirtyBelow(); });
+void Slot::markBelow(std::uint8_t bits) {
+    state_.fetch_or(bits, std::memory_order_acq_rel);
+    forEachPart([bits](Slot& part) { part.markBelow(bits); });
 }
 
-void Slot::markDirty() {
-    markDirtyBelow();
-    tellAbove();
-}
-
-void Slot::tellAbove() {
+void Slot::mark(std::uint8_t bits) {
+    markBelow(bits);
+    const std::uint8_t perhaps = bits & (belowBit | toldBelowBit);
     for (Slot* above = parent; above; above = above->parent)
-        if (above->state_.fetch_or(belowBit, std::memory_order_acq_rel) & belowBit)
+        if ((above->state_.fetch_or(perhaps, std::memory_order_acq_rel) & perhaps) == perhaps)
             break;
 }
 
+void Slot::markDirty() {
+    mark(dirtyBit | belowBit);
+}
+
+void Slot::markTold() {
+    mark(dirtyBit | belowBit | toldBit | toldBelowBit);
+}
+
 void Slot::markClean() {
+    const bool hadTold = mayHaveTold();
     markCleanBelow();
     // what is above is no longer dirty as a whole
     for (Slot* above = parent; above; above = above->parent)
-        above->state_.fetch_and(static_cast<std::uint8_t>(~dirtyBit), std::memory_order_acq_rel);
-}
-
-void Slot::markPassedOver() {
-    markClean();
-    state_.fetch_or(passedOverBit, std::memory_order_acq_rel);
-    tellAbove();
+        above->drop(dirtyBit | toldBit);
+    if (hadTold)
+        forgetToldUpstream(*this);
 }
 
 void Slot::markCleanBelow() {
@@ -185,6 +197,27 @@ void Slot::markCleanBelow() {
         return;
     forEachPart([](Slot& part) { part.markCleanBelow(); });
     state_.store(0, std::memory_order_release);
+}
+
+void Slot::forgetTold() {
+    forgetToldBelow();
+    for (Slot* above = parent; above; above = above->parent)
+        above->drop(toldBit);
+}
+
+void Slot::forgetToldBelow() {
+    if (!mayHaveTold())
+        return;
+    drop(toldBit | toldBelowBit);
+    forEachPartKept(*this, [](Slot& part) { part.forgetToldBelow(); });
+}
+
+const Slot* outermostElement(const Slot& slot) {
+    const Slot* element = nullptr;
+    for (const Slot* at = &slot; at; at = at->parent)
+        if (at->isElement)
+            element = at;
+    return element;
 }
 
 } // namespace OpenQuarn

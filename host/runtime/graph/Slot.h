@@ -28,6 +28,8 @@ public:
     struct Links {
         Slot* source = nullptr;
         std::vector<Slot*> destinations; ///< in order of connection
+        /// Slots of which a plug-in said that this one depends on them (HPxNode::setDependentsDirty).
+        std::vector<std::weak_ptr<Slot>> announcers;
     };
 
     Slot(const Field& slotField, NodeData* slotOwner, Slot* slotParent, bool element, unsigned logicalIndex);
@@ -53,14 +55,14 @@ public:
     std::vector<std::shared_ptr<Slot>> children; ///< of a compound, in the order of its attributes
     SparseArray<Slot> elements;                  ///< of an array
 
-    std::unique_ptr<Links> links; ///< null while nothing was ever connected
+    std::unique_ptr<Links> links; ///< null while nothing was ever connected, nor announced
     bool locked = false;
 
     Slot* source() const { return links ? links->source : nullptr; }
     bool hasDestinations() const { return links && !links->destinations.empty(); }
 
     /// The element with that index; made, with default values, when it is missing. Marks what it makes as dirty when it
-    /// is an output.
+    /// is an output, or the array is dirty.
     std::shared_ptr<Slot> elementAt(unsigned logicalIndex);
     /// Puts an element that was made for this array (ArrayBuild) in its place.
     void adopt(const std::shared_ptr<Slot>& element);
@@ -79,6 +81,10 @@ public:
     /// Takes over the values of a slot of the same kind, as a connection does; elements and children too. Data is
     /// shared.
     void copyFrom(const Slot& from);
+    /// Calls visit(slot) for the direct parts while other threads may add and remove elements.
+    template <class Visit>
+    void forEachPartMeanwhile(Visit&& visit) const;
+
     /// Breaks all connections here and below, without telling anybody.
     void unlink();
     /// Cuts it and everything below off from its node, and from what it is connected to.
@@ -91,39 +97,51 @@ public:
     /// "node.list[3].child"
     std::string name() const;
 
-    // --- dirtiness ---
+    // --- dirtiness: whether it has to be evaluated, and whether what depends on it knows (dirty.h) ---
     /// It and everything below has to be evaluated before it is read.
-    bool isDirty() const { return (state_.load(std::memory_order_acquire) & dirtyBit) != 0; }
+    bool isDirty() const { return has(dirtyBit); }
     /// It or something below may have to be evaluated.
-    bool mayBeDirty() const {
-        return (state_.load(std::memory_order_acquire) & (dirtyBit | belowBit | passedOverBit)) != 0;
-    }
+    bool mayBeDirty() const { return has(dirtyBit | belowBit); }
+    /// It is dirty, and everything that depends on it is dirty and has told in its turn: another change of it is no
+    /// news to anybody.
+    bool hasTold() const { return has(toldBit); }
+    /// It or something below may have told.
+    bool mayHaveTold() const { return has(toldBit | toldBelowBit); }
     /// Its last compute failed.
-    bool hasFailed() const { return (state_.load(std::memory_order_acquire) & failedBit) != 0; }
+    bool hasFailed() const { return has(failedBit); }
     void setFailed(bool failed);
     /// Marks this slot and everything below, and tells the slots above.
     void markDirty();
-    /// Marks this slot and everything below as up to date.
+    /// The same for one whose dependents are about to be marked, too.
+    void markTold();
+    /// Marks this slot and everything below as up to date. When it had told, what it may depend on has told no longer.
     void markClean();
-    /// Marks a slot whose value was not made although what depends on it is up to date: who reads it has to evaluate
-    /// it, and a change that reaches it still makes everything dirty that depends on it.
-    void markPassedOver();
+    /// Takes back that this slot and everything below has told; what is above it has not told as a whole then. What it
+    /// may depend on is left to forgetToldUpstream().
+    void forgetTold();
 
 private:
-    static constexpr std::uint8_t dirtyBit = 1;  // everything here and below
-    static constexpr std::uint8_t belowBit = 2;  // something below, perhaps
-    static constexpr std::uint8_t failedBit = 4; // the last compute failed
-    static constexpr std::uint8_t passedOverBit = 8;
+    static constexpr std::uint8_t dirtyBit = 1;      // everything here and below
+    static constexpr std::uint8_t belowBit = 2;      // something below, perhaps
+    static constexpr std::uint8_t failedBit = 4;     // the last compute failed
+    static constexpr std::uint8_t toldBit = 8;       // everything here and below
+    static constexpr std::uint8_t toldBelowBit = 16; // something below, perhaps
 
+    bool has(std::uint8_t anyOf) const { return (state_.load(std::memory_order_acquire) & anyOf) != 0; }
+    void drop(std::uint8_t bits);
+    void mark(std::uint8_t bits);
+    void markBelow(std::uint8_t bits);
+    void markCleanBelow();
+    void forgetToldBelow();
     void attach(NodeData* newOwner);
     void cutOff();
-    void markDirtyBelow();
-    void tellAbove();
-    void markCleanBelow();
     void makeChildren();
 
     std::atomic<std::uint8_t> state_{0};
     std::shared_ptr<const NodeClass> type_; // of a slot without an owner
 };
+
+/// The element of the outermost array that a slot is, or is below; null when it is in none.
+const Slot* outermostElement(const Slot& slot);
 
 } // namespace OpenQuarn

@@ -4,8 +4,10 @@
 
 #include "graph/Node.h"
 
+#include <memory>
 #include <mutex>
 #include <shared_mutex>
+#include <vector>
 
 namespace OpenQuarn {
 
@@ -43,5 +45,21 @@ public:
 private:
     std::unique_lock<std::shared_mutex> lock_;
 };
+
+/// Calls visit(slot) for the direct parts that a slot has now; a parallel evaluation may remove elements meanwhile.
+template <class Visit>
+void forEachPartKept(const Slot& slot, Visit&& visit) {
+    if (!ParallelSection::isRunning()) {
+        slot.forEachPart(visit);
+        return;
+    }
+    std::vector<std::shared_ptr<Slot>> parts;
+    {
+        const ArrayReadLock lock(slot.owner);
+        slot.forEachPart([&](Slot& part) { parts.push_back(part.shared_from_this()); });
+    }
+    for (const std::shared_ptr<Slot>& part : parts)
+        visit(*part);
+}
 
 } // namespace OpenQuarn

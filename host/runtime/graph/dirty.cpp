@@ -4,6 +4,7 @@
 #include "graph/Graph.h"
 #include "graph/Node.h"
 #include "graph/plugImpl.h"
+#include "graph/told.h"
 
 #include <unordered_set>
 
@@ -48,12 +49,13 @@ public:
 
 private:
     void visit(Slot& slot) {
-        if (force_ ? !seen_.insert(&slot).second : slot.isDirty())
+        if (force_ ? !seen_.insert(&slot).second : slot.hasTold())
             return;
-        slot.markDirty();
+        const bool isNews = force_ || !slot.isDirty();
+        slot.markTold();
         if (force_)
             edited(slot);
-        if (slot.owner)
+        if (slot.owner && isNews)
             slot.owner->node.graph().recordDirty(slot);
         pushDependents(slot);
     }
@@ -66,8 +68,10 @@ private:
         HPlugArray affected;
         callPlugin(data.node, "setDependentsDirty", [&] { return user->setDependentsDirty(makePlug(slot), affected); });
         for (const HPlug& plug : affected)
-            if (const std::shared_ptr<Slot> dependent = resolvePlug(plug))
+            if (const std::shared_ptr<Slot> dependent = resolvePlug(plug)) {
+                announce(slot, *dependent);
                 queue_.push_back(dependent.get());
+            }
     }
 
     const bool force_;
@@ -77,16 +81,13 @@ private:
 
 } // namespace
 
-std::shared_ptr<Slot> dependentSlot(const Slot& slot, const Field::Dependent& dependent) {
+std::shared_ptr<Slot> dependentSlot(const Slot& slot, const Field::Dependency& dependent) {
     if (!slot.owner)
         return nullptr;
     std::shared_ptr<Slot> affected = slot.owner->slot(*dependent.field);
     if (!affected || !dependent.sameElement || !affected->isArray())
         return affected;
-    const Slot* element = nullptr; // of the outermost array
-    for (const Slot* at = &slot; at; at = at->parent)
-        if (at->isElement)
-            element = at;
+    const Slot* element = outermostElement(slot);
     return element ? affected->elements.find(element->index) : affected;
 }
 

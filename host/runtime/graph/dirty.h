@@ -12,7 +12,8 @@ template <class Visit>
 void forEachDependent(Slot& slot, Visit&& visit);
 
 /// After `changed` got another value: makes everything dirty that depends on it, but not the slot itself. A slot that
-/// is dirty already is not walked again, unless `force` asks for it: what depends on it is dirty too. Thread: main.
+/// is dirty already stays as it is. What depends on it is walked as well, except where it has told before (told.h) and
+/// `force` does not ask for it. Thread: main.
 void propagateFrom(Slot& changed, bool force = false);
 
 /// Makes `slot`, everything below it and everything that depends on it dirty.
@@ -22,7 +23,7 @@ void makeDirty(Slot& slot, bool force = false);
 bool reaches(Slot& from, const Slot& to);
 
 /// A slot of the node's other field that depends on `slot`: the field's own, or its element of the same index.
-std::shared_ptr<Slot> dependentSlot(const Slot& slot, const Field::Dependent& dependent);
+std::shared_ptr<Slot> dependentSlot(const Slot& slot, const Field::Dependency& dependent);
 
 template <class Visit>
 void forEachDependent(Slot& slot, Visit&& visit) {
@@ -38,7 +39,7 @@ void forEachDependent(Slot& slot, Visit&& visit) {
     below(below, slot);
     for (const Slot* above = slot.parent; above; above = above->parent)
         along(*above);
-    for (const Field::Dependent& dependent : slot.field.dependents)
+    for (const Field::Dependency& dependent : slot.field.dependents)
         if (const std::shared_ptr<Slot> affected = dependentSlot(slot, dependent))
             visit(*affected);
 }

@@ -127,8 +127,8 @@ void addUpstream(const Slot& slot, std::vector<std::shared_ptr<Slot>>& upstream)
         const_cast<Slot&>(slot).forEachPart([&](Slot& part) { add(add, part); });
         return;
     }
-    for (const Field* affecting : slot.field.affectedBy)
-        if (const std::shared_ptr<Slot> input = slot.owner ? slot.owner->slot(*affecting) : nullptr)
+    for (const Field::Dependency& affecting : slot.field.affectedBy)
+        if (const std::shared_ptr<Slot> input = slot.owner ? slot.owner->slot(*affecting.field) : nullptr)
             add(add, *input);
 }
 

@@ -7,6 +7,9 @@
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn_app/Evaluation.h"
 
+#include <array>
+#include <random>
+
 namespace {
 
 using namespace testNodes;
@@ -121,6 +124,117 @@ TEST_F(Dirty, ForcedDirtReachesWhatIsDirtyAlready) {
     EXPECT_EQ(text(OpenQuarn::makeDirty(plug("a.total").node())), "");
     EXPECT_THAT(dirty.plugs(), UnorderedElementsAre("a.total", "a.rounded", "b.values[0]", "b.total", "b.rounded"));
     EXPECT_EQ(text(OpenQuarn::makeDirty(plug("a.nothing"))), "the plug is null");
+}
+
+double sumOfInputs(HPxNode& node, HDataBlock& block) {
+    const HFnDependencyNode set(node.thisHObject());
+    double sum = block.inputValue(set.attribute("in")).asDouble();
+    HArrayDataHandle ins = block.outputArrayValue(set.attribute("ins"));
+    for (bool more = ins.elementCount() > 0; more; more = !ins.next().error())
+        sum += ins.inputValue().asDouble();
+    return sum;
+}
+
+/// What is between n0.in and the last node, n, as "source destination".
+struct UnreadCase {
+    const char* shape;
+    std::vector<std::pair<const char*, const char*>> connections;
+};
+
+TEST_F(Dirty, AnUnreadInputMayChangeAgain) {
+    static bool reads;
+    for (const UnreadCase& row :
+         {UnreadCase{"an output", {{"n0.out", "n.in"}}},
+          UnreadCase{"outputs that are dirty with it", {{"n0.out", "n1.in"}, {"n1.out", "n2.in"}, {"n2.out", "n.in"}}},
+          UnreadCase{"an input that is passed on", {{"n0.out", "n1.in"}, {"n1.in", "n2.in"}, {"n2.in", "n.in"}}},
+          UnreadCase{"elements", {{"n0.out", "n1.ins[3]"}, {"n1.outs[5]", "n.ins[2]"}}},
+          UnreadCase{"whole arrays", {{"n0.out", "n1.ins[3]"}, {"n1.ins", "n2.ins"}, {"n2.ins[3]", "n.in"}}},
+          UnreadCase{"what a plug-in adds", {{"n0.out", "n1.in"}}}}) {
+        SCOPED_TRACE(row.shape);
+        session.newScene();
+        for (const char* name : {"n0", "n1", "n2", "n"})
+            create("testCase", name);
+        const bool isAdded = row.shape == std::string("what a plug-in adds");
+        Hooks::dependents = [isAdded](const HPlug& changed, HPlugArray& affected) {
+            if (isAdded && changed.name() == "n1.in")
+                affected.push_back(plug("n.out"));
+            return HStatus();
+        };
+        Hooks::compute = [isAdded](HPxNode& node, const HPlug& asked, HDataBlock& block) {
+            const bool isLast = node.name() == "n";
+            const double sum = isLast && !reads    ? -1.0
+                               : isLast && isAdded ? plug("n1.in").asDouble()
+                                                   : sumOfInputs(node, block);
+            return block.outputValue(asked).set(sum);
+        };
+        for (const auto& [source, destination] : row.connections)
+            connect(source, destination);
+        reads = false;
+        plug("n.out").asDouble();
+        double value = 0.0;
+        for (const bool reading : {false, false, true, false, false, true}) {
+            reads = reading;
+            dirty.clear();
+            computes.clear();
+            plug("n0.in").setDouble(++value);
+            EXPECT_EQ(plug("n.out").asDouble(), reads ? value : -1.0);
+            EXPECT_EQ(std::count(dirty.plugs().begin(), dirty.plugs().end(), "n.out"), 1);
+            EXPECT_EQ(std::count(computes.plugs().begin(), computes.plugs().end(), "n.out"), 1);
+        }
+    }
+}
+
+bool isClean(const HPlug& plug) {
+    return HFnDependencyNode(plug.node()).userNode()->forceCache().isClean(plug);
+}
+
+// Nodes that are computed from the inputs that they happen to read: whatever was left unread, a change makes everything
+// dirty that is clean and connected to it, and tells of nothing else.
+TEST_F(Dirty, AChangeReachesAllThatDependsOnIt) {
+    constexpr unsigned count = 9;
+    std::mt19937 random(7);
+    const auto dice = [&random](unsigned sides) { return static_cast<unsigned>(random()) % sides; };
+    Hooks::compute = [&](HPxNode& node, const HPlug& asked, HDataBlock& block) {
+        HArrayDataHandle ins = block.outputArrayValue(HFnDependencyNode(node.thisHObject()).attribute("ins"));
+        for (unsigned i = 0; i < count; ++i)
+            if (dice(2) == 0 && !ins.jumpToElement(i).error())
+                ins.inputValue();
+        return block.outputValue(asked).set(0.0);
+    };
+    for (int scene = 0; scene < 30; ++scene) {
+        session.newScene();
+        std::array<std::array<bool, count>, count> depends{}; // [node][on which]
+        std::array<HPlug, count> outs;
+        for (unsigned node = 0; node < count; ++node) {
+            const HFnDependencyNode set(create("testCase", "n" + std::to_string(node)));
+            outs[node] = set.findPlug("out");
+            depends[node][node] = true;
+            for (unsigned other = 0; other < node; ++other) {
+                if (dice(3) != 0)
+                    continue;
+                connect("n" + std::to_string(other) + ".out",
+                        "n" + std::to_string(node) + ".ins[" + std::to_string(other) + "]");
+                for (unsigned further = 0; further <= other; ++further)
+                    depends[node][further] = depends[node][further] || depends[other][further];
+            }
+        }
+        for (int step = 0; step < 100; ++step) {
+            for (unsigned reads = dice(4); reads > 0; --reads)
+                outs[dice(count)].asDouble();
+            const unsigned changed = dice(count);
+            std::vector<std::string> news;
+            for (unsigned node = 0; node < count; ++node)
+                if (depends[node][changed] && isClean(outs[node]))
+                    news.emplace_back(outs[node].name().asChar());
+            dirty.clear();
+            plug("n" + std::to_string(changed) + ".in").setDouble(step);
+            std::vector<std::string> told;
+            for (const std::string& name : dirty.plugs())
+                if (name.substr(2) == ".out")
+                    told.push_back(name);
+            ASSERT_THAT(told, ::testing::UnorderedElementsAreArray(news)) << "scene " << scene << ", step " << step;
+        }
+    }
 }
 
 TEST_F(Dirty, AFailingComputeIsReportedOnceAndKeepsTheLastValue) {
