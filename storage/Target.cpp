@@ -144,6 +144,10 @@ Target findTarget(const fs::path& path, bool inOrder) {
     return {{}, place.kind == Place::Kind::stream ? opened(place.path, path) : duplicateOf(place.number, path)};
 }
 
+bool isWrittenThrough(const fs::path& path) {
+    return placeOf(path).kind != Place::Kind::file;
+}
+
 void requireWritable(const fs::path& path, bool inOrder) {
     const Place place = placeOf(path);
     if (place.kind == Place::Kind::descriptor)

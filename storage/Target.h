@@ -21,6 +21,10 @@ struct Target {
 /// written. Thread: any.
 Target findTarget(const std::filesystem::path& path, bool inOrder);
 
+/// Whether what is written there goes through, and not into a file that is replaced. Throws FileError for links without
+/// an end.
+bool isWrittenThrough(const std::filesystem::path& path);
+
 /// Throws what findTarget() would, and opens nothing. Also when the folder may not be written, or could not be made.
 void requireWritable(const std::filesystem::path& path, bool inOrder);
 

@@ -3,7 +3,8 @@
 
 #include "quarn/dataset/DatasetWriter.h"
 #include "quarn/dataset/FolderLock.h"
-#include "quarn/files/WholeFile.h"
+#include "storage/Folder.h"
+#include "storage/WholeFile.h"
 
 #include <algorithm>
 #include <array>
@@ -19,13 +20,15 @@ namespace {
 
 namespace fs = std::filesystem;
 
+// stands in a data set that is about to be replaced, and then in FOLDER.part: what is there is nothing to go on from
+constexpr const char* supersededFile = "superseded";
 constexpr std::array ourFiles = {datasetFile::controls, datasetFile::deltas, datasetFile::frames,
                                  descriptionFile,       setupFile,           datasetFile::progress,
-                                 FolderLock::fileName};
+                                 FolderLock::fileName,  supersededFile};
 constexpr std::uint64_t roomForTexts = 1U << 20U; // the JSON files, and what the file system needs for itself
 
 bool isOneOf(const std::string& name, const char* file) {
-    return name == file || name.starts_with(std::string(file) + ".part"); // what a WholeFile was before its end
+    return name == file || storage::TemporaryFile::isOf(name, file);
 }
 
 bool isOurs(const std::string& name) {
@@ -48,17 +51,28 @@ void move(const fs::path& from, const fs::path& to) {
 
 // what belongs to the making of a data set, and not to it
 bool isTool(const std::string& name) {
-    return isOneOf(name, datasetFile::progress) || name == FolderLock::fileName || name.find(".part") != name.npos;
+    const auto isBegun = [&](const char* file) { return name != file && isOneOf(name, file); };
+    return name == datasetFile::progress || name == FolderLock::fileName || name == supersededFile ||
+           std::any_of(ourFiles.begin(), ourFiles.end(), isBegun);
 }
 
-void removeTools(const fs::path& folder, bool lockToo) {
+// all but the lock, which goes with its owner
+void removeTools(const fs::path& folder) {
     std::vector<fs::path> tools;
-    for (const fs::directory_entry& entry : fs::directory_iterator(folder)) {
-        const std::string name = entry.path().filename();
-        if (isOurs(name) && isTool(name) && (lockToo || name != FolderLock::fileName))
+    for (const fs::directory_entry& entry : fs::directory_iterator(folder))
+        if (const std::string name = entry.path().filename(); isTool(name) && name != FolderLock::fileName)
             tools.push_back(entry.path());
-    }
     std::for_each(tools.begin(), tools.end(), removeFile);
+}
+
+// what one that was killed while it published has left
+void removeLeftTools(const fs::path& folder) {
+    const bool isLeft = std::any_of(fs::directory_iterator(folder), {},
+                                    [](const fs::directory_entry& entry) { return isTool(entry.path().filename()); });
+    if (!isLeft || FolderLock::isTaken(folder))
+        return;
+    const FolderLock lock(folder);
+    removeTools(folder);
 }
 
 fs::path withoutLinks(const fs::path& path) {
@@ -92,13 +106,13 @@ bool DatasetFolder::isDone(const Setup& setup) const {
     if (!difference.empty())
         throw std::runtime_error(folder_.string() + " holds another data set (" + difference +
                                  "); choose another place with -o, or replace it with --overwrite");
-    removeTools(folder_, true);
+    removeLeftTools(folder_);
     return true;
 }
 
 DatasetFolder::Begun DatasetFolder::begun(const Setup& setup) const {
     requireOursOnly(part_);
-    if (!fs::exists(part_ / setupFile))
+    if (!fs::exists(part_ / setupFile) || fs::exists(part_ / supersededFile))
         return Begun::no;
     const std::optional<Setup> earlier = Setup::read(part_ / setupFile);
     if (!earlier)
@@ -114,14 +128,14 @@ DatasetFolder::Begun DatasetFolder::begun(const Setup& setup) const {
 
 void DatasetFolder::discard() const {
     for (const char* file : ourFiles)
-        if (file != FolderLock::fileName)
+        if (file != FolderLock::fileName && file != supersededFile)
             removeFile(part_ / file);
-    removeTools(part_, false);
+    removeTools(part_); // at last what says that the rest is nothing to go on from
 }
 
 void DatasetFolder::begin(const Setup& setup) const {
     discard();
-    writeWhole(part_ / setupFile, setup.json());
+    storage::writeWhole(part_ / setupFile, setup.json());
 }
 
 void DatasetFolder::requireSpace(std::uint64_t bytes) const {
@@ -135,23 +149,26 @@ void DatasetFolder::requireSpace(std::uint64_t bytes) const {
 }
 
 void DatasetFolder::publish(FolderLock& lock) const {
-    syncToDisk(part_);
-    const fs::path old = folder_.string() + ".old" + std::to_string(::getpid());
-    const bool isThere = fs::exists(folder_);
-    if (isThere) {
-        // it may have come, or may have got more in it, since the beginning
-        if (!replaces_ && !fs::is_empty(folder_))
-            throw std::runtime_error(folder_.string() +
-                                     " was not there at the beginning; the data set is complete in " + part_.string());
-        requireOursOnly(folder_);
-        move(folder_, old);
+    storage::syncToDisk(part_);
+    std::error_code none;
+    if (fs::is_empty(folder_, none) || none) { // rename() takes the place of an empty folder as of none
+        move(part_, folder_);
+        lock.follow(folder_);
+        storage::syncToDisk(folder_.parent_path());
+        return removeTools(folder_);
     }
-    move(part_, folder_);
+    // it may have come, or may have got more in it, since the beginning
+    if (!replaces_)
+        throw std::runtime_error(folder_.string() + " was not there at the beginning; the data set is complete in " +
+                                 part_.string());
+    requireOursOnly(folder_);
+    FolderLock old(folder_);
+    storage::writeWhole(folder_ / supersededFile, "");
+    storage::exchangeFolders(part_, folder_);
     lock.follow(folder_);
-    syncToDisk(folder_.parent_path());
-    removeTools(folder_, false);
-    if (isThere)
-        removeFile(old);
+    old.follow(part_);
+    removeTools(folder_);
+    discard();
 }
 
 void DatasetFolder::requireOursOnly(const fs::path& folder) const {

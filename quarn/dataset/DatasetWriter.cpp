@@ -3,7 +3,7 @@
 
 #include "quarn/console/json.h"
 #include "quarn/dataset/readJson.h"
-#include "quarn/files/WholeFile.h"
+#include "storage/WholeFile.h"
 
 #include <optional>
 #include <stdexcept>
@@ -107,7 +107,7 @@ void DatasetWriter::save() {
         return;
     for (RowFile* file : {&controls_, &deltas_, &frames_})
         file->sync();
-    writeWhole(progress_, textOf({rows_, {controls_.sum(), deltas_.sum(), frames_.sum()}}));
+    storage::writeWhole(progress_, textOf({rows_, {controls_.sum(), deltas_.sum(), frames_.sum()}}));
     savedRows_ = rows_;
     saved_ = std::chrono::steady_clock::now();
 }

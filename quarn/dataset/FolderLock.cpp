@@ -8,6 +8,7 @@
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 namespace quarn {
 namespace {
@@ -41,17 +42,22 @@ bool FolderLock::take() {
     std::filesystem::create_directories(folder_, error);
     if (error)
         throw std::runtime_error("the folder " + folder_.string() + " could not be made: " + error.message());
-    lock_ = std::make_unique<rig::FileDescriptor>(::open(file().c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0666));
-    if (!lock_->isOpen() && errno == ENOENT)
+    lock_ = storage::Descriptor(::open(file().c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0666));
+    if (!lock_.isOpen() && errno == ENOENT)
         return false;
-    if (!lock_->isOpen())
+    if (!lock_.isOpen())
         fail(folder_, errno);
-    if (::flock(lock_->number(), LOCK_EX | LOCK_NB) != 0) {
+    if (::flock(lock_.number(), LOCK_EX | LOCK_NB) != 0) {
         if (errno == EWOULDBLOCK)
             throw std::runtime_error("another quarn export is writing " + folder_.string() + "; wait until it is done");
         fail(folder_, errno);
     }
-    return isAt(file(), lock_->number());
+    return isAt(file(), lock_.number());
+}
+
+bool FolderLock::isTaken(const std::filesystem::path& folder) {
+    const storage::Descriptor lock(::open((folder / fileName).c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    return lock.isOpen() && ::flock(lock.number(), LOCK_EX | LOCK_NB) != 0;
 }
 
 FolderLock::~FolderLock() {

@@ -1,10 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "rig/FileDescriptor.h"
+#include "storage/Descriptor.h"
 
 #include <filesystem>
-#include <memory>
 
 namespace quarn {
 
@@ -21,6 +20,8 @@ public:
 
     /// The folder has another name now.
     void follow(const std::filesystem::path& folder) { folder_ = folder; }
+    /// Whether another process has locked the folder now.
+    static bool isTaken(const std::filesystem::path& folder);
 
     static constexpr const char* fileName = "lock";
 
@@ -29,7 +30,7 @@ private:
     std::filesystem::path file() const { return folder_ / fileName; }
 
     std::filesystem::path folder_;
-    std::unique_ptr<rig::FileDescriptor> lock_;
+    storage::Descriptor lock_;
 };
 
 } // namespace quarn

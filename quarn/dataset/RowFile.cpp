@@ -9,6 +9,7 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 namespace quarn {
 namespace {
@@ -44,8 +45,9 @@ RowFile::RowFile(std::filesystem::path path, ArrayLayout layout)
     , layout_(std::move(layout)) {}
 
 void RowFile::begin() {
-    file_ = std::make_unique<rig::FileDescriptor>(::open(path_.c_str(), O_RDWR | O_CREAT | O_TRUNC | O_CLOEXEC, 0666));
-    if (!file_->isOpen())
+    ::unlink(path_.c_str()); // what is there may be a link
+    file_ = storage::Descriptor(::open(path_.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666));
+    if (!file_.isOpen())
         fail(errno);
     sum_ = Fnv64();
     const std::string head = layout_.head();
@@ -54,10 +56,9 @@ void RowFile::begin() {
 
 // a pipe would wait for somebody who writes into it: O_NONBLOCK opens it at once, and then it is refused
 bool RowFile::resume(std::uint64_t rows, const std::string& sum) {
-    file_ = std::make_unique<rig::FileDescriptor>(::open(path_.c_str(), O_RDWR | O_NONBLOCK | O_CLOEXEC));
+    file_ = storage::Descriptor(::open(path_.c_str(), O_RDWR | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
     struct stat status = {};
-    if (rows > layout_.shape[0] || !file_->isOpen() || ::fstat(file_->number(), &status) != 0 ||
-        !S_ISREG(status.st_mode))
+    if (rows > layout_.shape[0] || !file_.isOpen() || ::fstat(file_.number(), &status) != 0 || !S_ISREG(status.st_mode))
         return false;
     const auto size = static_cast<std::uint64_t>(status.st_size);
     const std::uint64_t wanted = headSize + rows * layout_.rowBytes();
@@ -73,7 +74,7 @@ bool RowFile::hasSum(std::uint64_t bytes, const std::string& sum) {
     sum_ = Fnv64();
     for (std::uint64_t done = 0; done < bytes;) {
         const ssize_t got =
-            ::pread(file_->number(), block.data(), std::min(bytes - done, blockSize), static_cast<off_t>(done));
+            ::pread(file_.number(), block.data(), std::min(bytes - done, blockSize), static_cast<off_t>(done));
         if (got < 0 && errno == EINTR)
             continue;
         if (got <= 0)
@@ -86,24 +87,18 @@ bool RowFile::hasSum(std::uint64_t bytes, const std::string& sum) {
 
 void RowFile::append(std::span<const std::byte> row) {
     sum_.add(row);
-    while (!row.empty()) {
-        const ssize_t written = ::write(file_->number(), row.data(), row.size());
-        if (written < 0 && errno == EINTR)
-            continue;
-        if (written <= 0)
-            fail(written < 0 ? errno : ENOSPC);
-        row = row.subspan(static_cast<std::size_t>(written));
-    }
+    if (const int error = storage::writeAll(file_.number(), row))
+        fail(error);
 }
 
 void RowFile::cut(std::uint64_t rows) {
     const auto size = static_cast<off_t>(headSize + rows * layout_.rowBytes());
-    if (::ftruncate(file_->number(), size) != 0 || ::lseek(file_->number(), 0, SEEK_END) != size)
+    if (::ftruncate(file_.number(), size) != 0 || ::lseek(file_.number(), 0, SEEK_END) != size)
         fail(errno);
 }
 
 void RowFile::sync() {
-    if (::fsync(file_->number()) != 0)
+    if (::fsync(file_.number()) != 0)
         fail(errno);
 }
 

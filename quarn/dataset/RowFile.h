@@ -3,11 +3,10 @@
 #pragma once
 
 #include "quarn/dataset/Fnv64.h"
-#include "rig/FileDescriptor.h"
+#include "storage/Descriptor.h"
 
 #include <cstdint>
 #include <filesystem>
-#include <memory>
 #include <span>
 #include <string>
 #include <vector>
@@ -48,7 +47,7 @@ private:
 
     std::filesystem::path path_;
     ArrayLayout layout_;
-    std::unique_ptr<rig::FileDescriptor> file_;
+    storage::Descriptor file_;
     Fnv64 sum_;
 };
 

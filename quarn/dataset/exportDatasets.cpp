@@ -5,9 +5,9 @@
 #include "quarn/dataset/FolderLock.h"
 #include "quarn/dataset/description.h"
 #include "quarn/dataset/sceneSetup.h"
-#include "quarn/files/WholeFile.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "storage/WholeFile.h"
 
 #include <algorithm>
 #include <map>
@@ -132,8 +132,9 @@ private:
         writer.save();
         requireUnchanged();
         session_.host().setTime(frames_.first); // whatever frame it ended with
-        writeWhole(folder_.part() / descriptionFile,
-                   datasetDescription(facts_, warp_, geometry_, sampler_, folder_.part() / datasetFile::controls));
+        storage::writeWhole(
+            folder_.part() / descriptionFile,
+            datasetDescription(facts_, warp_, geometry_, sampler_, folder_.part() / datasetFile::controls));
         return before;
     }
 

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/files/npyArray.h"
 
-#include "quarn/files/WholeFile.h"
 #include "rig/npyHeader.h"
+#include "storage/WholeFile.h"
 
 #include <algorithm>
 #include <fstream>
@@ -74,7 +74,7 @@ Shape read(const std::filesystem::path& path, const char* descr, std::size_t dim
 
 template <class Number>
 void write(const std::filesystem::path& path, const char* descr, const Shape& shape, std::span<const Number> values) {
-    WholeFile file(path);
+    storage::WholeFile file(path);
     file.stream() << rig::makeNpyHead(descr, shape);
     file.stream().write(reinterpret_cast<const char*>(values.data()),
                         static_cast<std::streamsize>(values.size_bytes()));

@@ -10,6 +10,7 @@
 #include "quarn/import/vertexMap.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/plugs.h"
+#include "storage/WholeFile.h"
 
 #include <algorithm>
 #include <stdexcept>
@@ -48,9 +49,7 @@ void checkOutput(const ImportOptions& options) {
         throw std::runtime_error(options.output.string() + " is the character itself; name another file for the scene");
     if (fs::is_directory(options.output))
         throw std::runtime_error(options.output.string() + " is a folder; name a file for the scene");
-    const fs::path folder = options.output.parent_path();
-    if (!fs::is_directory(folder))
-        throw std::runtime_error("there is no folder " + folder.string() + " for the scene");
+    storage::WholeFile::requirePossible(options.output, storage::WholeFile::Writes::anywhere); // with files beside it
 }
 
 class Import {

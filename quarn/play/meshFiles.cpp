@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/play/meshFiles.h"
 
-#include "quarn/files/WholeFile.h"
+#include "storage/WholeFile.h"
 
 #include <array>
 #include <charconv>
@@ -66,7 +66,7 @@ bool isMeshFile(const std::filesystem::path& path) {
 
 void writeMeshFile(const std::filesystem::path& path, std::span<const float> xyz, const MeshPolygons& polygons) {
     const std::string ending = path.extension().string();
-    WholeFile file(path);
+    storage::WholeFile file(path);
     try {
         if (ending == ".obj")
             writeObj(file.stream(), xyz, polygons);

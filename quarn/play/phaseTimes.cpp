@@ -2,7 +2,7 @@
 #include "quarn/play/phaseTimes.h"
 
 #include "openquarn_app/Profiling.h"
-#include "quarn/files/WholeFile.h"
+#include "storage/WholeFile.h"
 
 #include <rapidjson/istreamwrapper.h>
 #include <rapidjson/reader.h>
@@ -65,8 +65,10 @@ private:
 
 std::map<std::string, std::vector<double>> writeTraceAndReadPhases(const std::filesystem::path& path) {
     OpenQuarn::Profiling::stop();
-    WholeFile file(path);
-    OpenQuarn::Profiling::writeTrace(file.temporary());
+    storage::WholeFile file(path);
+    OpenQuarn::Profiling::writeTrace(file.stream());
+    if (!file.stream().flush())
+        file.finish(); // says why
     std::ifstream trace(file.temporary());
     rapidjson::IStreamWrapper stream(trace);
     PhaseReader reader;

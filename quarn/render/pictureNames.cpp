@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/pictureNames.h"
 
+#include "storage/WholeFile.h"
+
 #include <algorithm>
 #include <cstdlib>
 #include <stdexcept>
@@ -27,6 +29,8 @@ fs::path pictureName(const fs::path& pattern, int frame, bool several) {
         const std::size_t before = name.find_last_not_of('#', last);
         const std::size_t first = before == std::string::npos ? 0 : before + 1;
         name.replace(first, last - first + 1, padded(frame, last - first + 1));
+    } else if (several && storage::isWrittenThrough(pattern)) {
+        throw std::runtime_error(pattern.string() + " takes one picture, and more than one frame is to be drawn");
     } else if (several) {
         name = pattern.stem().string() + "." + padded(frame, 4) + pattern.extension().string();
     }
@@ -37,10 +41,9 @@ void checkPictureName(const fs::path& pattern) {
     std::string ending = pattern.extension().string();
     std::transform(ending.begin(), ending.end(), ending.begin(),
                    [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
-    if (ending != ".png")
+    if (ending != ".png" && !storage::isWrittenThrough(pattern))
         throw std::runtime_error(pattern.string() + " is no name of a picture: it must end in .png");
-    if (const fs::path folder = pattern.parent_path(); !fs::is_directory(folder))
-        throw std::runtime_error("the folder " + folder.string() + " of the picture does not exist; make it first");
+    storage::WholeFile::requirePossible(pattern);
 }
 
 } // namespace quarn

@@ -4,7 +4,6 @@
 #include "quarn/console/Console.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
-#include "quarn/files/WholeFile.h"
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
@@ -15,6 +14,7 @@
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
+#include "storage/WholeFile.h"
 
 #include <CLI/CLI.hpp>
 
@@ -198,7 +198,7 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
         }
         throwIfAny(errors, frame);
         models.requireSound();
-        WholeFile file(pictureName(pattern, frame, count > 1));
+        storage::WholeFile file(pictureName(pattern, frame, count > 1));
         writePng(file.stream(), picture);
         file.finish();
         answer.pictures.push_back(pictureName(pattern, frame, count > 1));

@@ -10,6 +10,7 @@
 
 #include <fcntl.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 namespace rig {
 namespace {
@@ -42,7 +43,7 @@ std::optional<FileIdentity> identityOf(const std::string& path) {
 // a pipe would wait for somebody who writes into it: O_NONBLOCK opens it at once, and then it is refused
 NpyFile::NpyFile(const std::string& path)
     : path_(path)
-    , file_(open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
+    , file_(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
     struct stat status = {};
     if (!file_.isOpen() || fstat(file_.number(), &status) != 0)
         fail(reasonOf(errno));

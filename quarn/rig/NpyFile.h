@@ -3,8 +3,9 @@
 // is written numpy.load reads.
 #pragma once
 
-#include "rig/FileDescriptor.h"
 #include "rig/npyHeader.h"
+#include "storage/Descriptor.h"
+#include "storage/WholeFile.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -56,23 +57,18 @@ private:
     [[noreturn]] void fail(const std::string& why) const;
 
     std::string path_;
-    FileDescriptor file_;
+    storage::Descriptor file_;
     FileIdentity identity_;
     NpyHeader header_;
 };
 
-/// Writes an array of [frames, vertices, 3] '<f4', frame by frame, beside its place; finish() puts it there. Nobody
-/// ever sees a part of it at `path`, and without finish() nothing is left. A file that is there already is replaced,
-/// with its permissions; where `path` is a symbolic link, what it leads to is. Errors are std::runtime_error with a
-/// sentence that names the path and the reason; after one, only destruction is left. One thread at a time. [any]
-/// throughout.
+/// Writes an array of [frames, vertices, 3] '<f4', frame by frame, as a storage::WholeFile: finish() puts it into its
+/// place, and without it nothing is left. Errors are storage::FileError; after one, only destruction is left. One
+/// thread at a time. [any] throughout.
 class NpyWriter {
 public:
-    /// Makes the temporary file. Throws when the folder cannot be written into.
+    /// Makes the temporary file. Throws when the file could not be put into its place.
     NpyWriter(const std::string& path, std::size_t vertexCount);
-    ~NpyWriter();
-    NpyWriter(const NpyWriter&) = delete;
-    NpyWriter& operator=(const NpyWriter&) = delete;
 
     /// Adds a frame: `xyz` x, y, z of every vertex, 3 * vertexCount numbers. Throws std::invalid_argument, and writes
     /// nothing, for another number of them; std::runtime_error, naming frame and vertex, for one that is not finite.
@@ -83,18 +79,13 @@ public:
     void finish();
 
 private:
-    void requireUsable() const;
-    void write(std::span<const std::byte> bytes);
-    void takePermissionsOfTarget();
-    [[noreturn]] void fail(const std::string& what, int error);
+    void beginStep();
 
-    std::string path_;      ///< as it was given
-    std::string target_;    ///< without links
-    std::string temporary_; ///< beside the target; empty once there is none to remove
-    FileDescriptor file_;
+    std::string path_;
+    storage::WholeFile file_;
     std::size_t vertexCount_;
     std::size_t frames_ = 0;
-    bool failed_ = false;
+    bool isUsable_ = true;
 };
 
 } // namespace rig

@@ -39,7 +39,7 @@ void requireSameHeader(const rig::NpyFile& file) {
 } // namespace
 
 bool fuzzNpy(const std::uint8_t* data, std::size_t size) {
-    const rig::FileDescriptor memory(memfd_create("fuzz", MFD_CLOEXEC));
+    const storage::Descriptor memory(memfd_create("fuzz", MFD_CLOEXEC));
     require(memory.isOpen());
     require(write(memory.number(), data, size) == static_cast<ssize_t>(size));
     const auto file = opened("/proc/self/fd/" + std::to_string(memory.number()));

@@ -2,17 +2,21 @@
 #include "openquarn_app/SceneFile.h"
 
 #include "core/threads.h"
-#include "files/atomicFile.h"
 #include "files/json.h"
 #include "files/sceneText.h"
 #include "graph/baseNodes.h"
 #include "openquarn_app/Messages.h"
 #include "services/SceneFileState.h"
+#include "storage/FileError.h"
+#include "storage/WholeFile.h"
+#include "storage/readWholeFile.h"
 
 #include <stdexcept>
 
 namespace OpenQuarn {
 namespace {
+
+constexpr std::uint64_t largestScene = std::uint64_t{1} << 32; // bytes of text
 
 /// Runs `work(warnings)`, and makes of what it finds and throws the outcome, with the file's name before every text.
 template <class Work>
@@ -24,6 +28,8 @@ FileOutcome fileOperation(const std::string& fileName, Work&& work) {
         outcome.ok = true;
     } catch (const std::bad_alloc&) {
         outcome.error = fileName + ": there is not enough memory";
+    } catch (const storage::FileError& error) {
+        outcome.error = fileName + ": " + error.predicate();
     } catch (const std::exception& error) {
         outcome.error = fileName + ": " + error.what();
     }
@@ -87,7 +93,7 @@ FileOutcome openScene(const std::filesystem::path& path) {
     return fileOperation(path.string(), [&](Warnings& warnings) {
         rapidjson::Document document;
         Graph& graph = currentGraph();
-        parseScene(document, readFile(path));
+        parseScene(document, storage::readWholeFile(path, largestScene));
         setCurrentSceneFile(path.string()); // nodes look for files beside it
         readWhole(document, graph, warnings);
     });
@@ -96,7 +102,7 @@ FileOutcome openScene(const std::filesystem::path& path) {
 FileOutcome saveScene(const std::filesystem::path& path) {
     requireMain("saveScene");
     return fileOperation(path.string(), [&](Warnings& warnings) {
-        replaceFile(path, writeScene(currentGraph(), warnings));
+        storage::writeWhole(path, writeScene(currentGraph(), warnings));
         setCurrentSceneFile(path.string());
     });
 }
@@ -123,7 +129,7 @@ std::string currentFile() {
 SceneSummary readSummary(const std::filesystem::path& path) {
     SceneSummary summary;
     summary.outcome = fileOperation(path.string(), [&](Warnings&) {
-        const std::string text = readFile(path);
+        const std::string text = storage::readWholeFile(path, largestScene);
         rapidjson::Document document;
         parseScene(document, text);
         registerBaseNodes();

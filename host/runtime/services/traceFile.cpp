@@ -2,6 +2,7 @@
 // The recording as a file: the "Trace Event Format", JSON object form, complete events ("ph": "X").
 #include "openquarn_app/Profiling.h"
 #include "services/ProfilingRecords.h"
+#include "storage/WholeFile.h"
 
 #include <rapidjson/memorystream.h>
 #include <rapidjson/ostreamwrapper.h>
@@ -9,8 +10,7 @@
 #include <rapidjson/writer.h>
 
 #include <array>
-#include <fstream>
-#include <stdexcept>
+#include <ostream>
 
 namespace OpenQuarn {
 namespace {
@@ -149,13 +149,14 @@ void writeDocument(std::ostream& out) {
 
 } // namespace
 
+void Profiling::writeTrace(std::ostream& stream) {
+    writeDocument(stream);
+}
+
 void Profiling::writeTrace(const std::filesystem::path& path) {
-    std::ofstream file(path, std::ios::binary);
-    if (file)
-        writeDocument(file);
-    file.close();
-    if (!file)
-        throw std::runtime_error("the trace file '" + path.string() + "' cannot be written");
+    storage::WholeFile file(path);
+    writeDocument(file.stream());
+    file.finish();
 }
 
 } // namespace OpenQuarn

@@ -2,6 +2,11 @@
 // The program killed at any moment: the data set of the runs together is that of one run.
 #include "quarn/dataset/ExportScene.h"
 
+#include "quarn/dataset/DatasetFolder.h"
+#include "quarn/dataset/DatasetWriter.h"
+#include "quarn/dataset/FolderLock.h"
+#include "storage/WholeFile.h"
+
 #include <chrono>
 #include <csignal>
 #include <random>
@@ -69,6 +74,61 @@ TEST_F(KillTest, ResumesToTheSameBytes) {
     ASSERT_EQ(ended(start(output)), 0);
     EXPECT_EQ(contentsOf(output), expected);
     EXPECT_FALSE(fs::exists(output.string() + ".part"));
+}
+
+// as export --overwrite does it, without the frames
+void replaceDataset(const fs::path& output, const std::string& value) {
+    const quarn::DatasetFolder folder(output, true);
+    quarn::Setup setup;
+    setup.add("value", value);
+    static_cast<void>(folder.isDone(setup));
+    quarn::FolderLock lock(folder.part());
+    quarn::DatasetWriter writer(folder.part(), {1, 1, 1});
+    if (folder.begun(setup) == quarn::DatasetFolder::Begun::no || !writer.resume().empty()) {
+        folder.begin(setup);
+        writer.begin();
+    }
+    if (writer.rows() == 0) {
+        const std::vector<float> numbers(3, std::stof(value));
+        writer.append(1, std::span(numbers).first(1), numbers);
+    }
+    writer.save();
+    storage::writeWhole(folder.part() / quarn::descriptionFile, value);
+    folder.publish(lock);
+}
+
+// most of such a child's time goes into beginning and publishing
+TEST_F(KillTest, ADataSetThatIsReplacedIsThereAtAnyMoment) {
+    const fs::path parent = folder.path() / "data", output = parent / "set";
+    fs::create_directory(parent);
+    std::map<std::string, std::map<std::string, std::string>> whole;
+    for (const char* value : {"1", "2"}) {
+        replaceDataset(output, value);
+        whole[value] = contentsOf(output);
+        ASSERT_EQ(whole[value].size(), 5U);
+    }
+    std::mt19937 random(6);
+    for (int kill = 0; kill < 60; ++kill) {
+        const pid_t child = ::fork();
+        if (child == 0)
+            for (;;)
+                for (const char* value : {"1", "2"})
+                    replaceDataset(output, value);
+        for (int look = 0; look < 20; ++look) {
+            std::this_thread::sleep_for(std::chrono::microseconds(random() % 2000));
+            ASSERT_TRUE(fs::exists(output)) << "there is a moment without a data set";
+        }
+        ::kill(child, SIGKILL);
+        EXPECT_TRUE(WIFSIGNALED(ended(child)))
+            << "it ended by itself: an earlier kill has left what it cannot go on from";
+        auto found = contentsOf(output);
+        const std::string value = found["dataset.json"];
+        for (const auto& [name, bytes] : whole[value])
+            ASSERT_EQ(found[name], bytes) << name;
+    }
+    replaceDataset(output, "1");
+    EXPECT_EQ(contentsOf(output), whole["1"]);
+    EXPECT_EQ(std::distance(fs::directory_iterator(parent), {}), 1) << "nothing is left beside it";
 }
 
 } // namespace

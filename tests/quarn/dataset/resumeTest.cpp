@@ -4,6 +4,7 @@
 
 #include "quarn/dataset/DatasetWriter.h"
 #include "quarn/dataset/FolderLock.h"
+#include "storage/WholeFile.h"
 
 #include <cerrno>
 #include <cstring>
@@ -57,7 +58,8 @@ protected:
         }
         if (rows + 1 < frames)
             std::ofstream(part() / "deltas.npy", std::ios::binary | std::ios::app) << "half a row";
-        std::ofstream(part() / "progress.json.part77") << "{";
+        const fs::path left = storage::WholeFile(part() / "progress.json").temporary();
+        std::ofstream(left) << "{";
     }
 
     std::map<std::string, std::string> expected_;

@@ -19,6 +19,8 @@ refused() {
 draw -o "$work/one.png"
 [ "$(size_of "$work/one.png")" = 000000280000001e ] || fail "the picture has another size"
 draw -o "$work/single.png" --threads 1
+draw -o /dev/stdout --quiet >"$work/through.png"
+cmp "$work/one.png" "$work/through.png"
 cmp "$work/one.png" "$work/single.png"
 
 draw -o "$work/pic.###.png" --frames 1-5x2 --heat "moved=strip.outMesh:wave.originalGeometry[0]" --quiet --json >"$work/json"
@@ -28,11 +30,12 @@ cmp "$work/pic.001.png" "$work/pic.005.png" # nothing moves in this scene
 grep -q '"rangeMillimetres"' "$work/json"
 
 refused "must end in .png" -o "$work/no.jpg"
-refused "does not exist" -o "$work/no/no.png"
+refused "Not a directory" -o "$work/one.png/no.png"
+refused "takes one picture" -o /dev/stdout --frames 1-2 --plug strip.outMesh --size 40x30
 refused '"10x" is no size' -o "$work/no.png" --size 10x
 refused "cannot be made" -o "$work/no.png" --size 9000x100 --panel a=strip.outMesh --panel b=strip.outMesh
 refused "there is no plug strip.none" -o "$work/no.png" --plug strip.none
 refused "no deformer none" -o "$work/no.png" --model x --deformer none
 refused "Unable to access the ML model" -o "$work/no.png" --model none
 [ ! -e "$work/no.png" ] || fail "a refused picture was written"
-if ls "$work"/*.part* 2>/dev/null; then fail "a part of a picture is left"; fi
+if ls "$work"/.whole-* 2>/dev/null; then fail "a part of a picture is left"; fi

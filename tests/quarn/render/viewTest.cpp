@@ -95,9 +95,7 @@ TEST(PictureName, FramesInNames) {
     EXPECT_EQ(name("/a/###_#.png", 12345, false), "/a/###_12345.png");
     EXPECT_EQ(name("##.png", 3, true), "03.png");
     EXPECT_THAT([] { checkPictureName("/pic.jpg"); }, ThrowsMessage<std::runtime_error>(HasSubstr("end in .png")));
-    EXPECT_THAT([] { checkPictureName("/no/such/pic.png"); },
-                ThrowsMessage<std::runtime_error>(HasSubstr("folder /no/such ")));
-    EXPECT_NO_THROW(checkPictureName("/pic.PNG"));
+    EXPECT_NO_THROW(checkPictureName(std::filesystem::temp_directory_path() / "pic.PNG"));
 }
 
 } // namespace
