@@ -27,7 +27,8 @@ namespace fs = std::filesystem;
 struct Options {
     SceneOptions scene;
     Console console;
-    std::string deformer, geometry, plug, model, frames, against;
+    ModelOption model;
+    std::string deformer, geometry, plug, frames, against;
     std::string order = "scene", evaluator = "cpu", device;
     fs::path output, trace;
     int repeats = 1;
@@ -35,15 +36,10 @@ struct Options {
 
 // with --plug alone a scene needs no deformer
 std::optional<Warp> warpFor(const Options& options) {
-    const bool isNeeded = options.plug.empty() || !options.deformer.empty() || !options.model.empty();
+    const bool isNeeded = options.plug.empty() || !options.deformer.empty() || !options.model.name.empty();
     if (!isNeeded && nodesOfType("neuralWarp").empty())
         return {};
     return Warp::find(options.deformer);
-}
-
-void chooseModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
-    if (!name.empty())
-        useModel(warp, geometry, name);
 }
 
 HPlug targetOf(const Warp* warp, const WarpGeometry* geometry, const std::string& against) {
@@ -77,7 +73,7 @@ void addOrder(PlayPlan& plan, const std::string& order, const std::string& meshN
 PlayPlan planFor(const Options& options) {
     chooseEvaluator(options.evaluator, options.device);
     const std::optional<Warp> warp = warpFor(options);
-    const bool isDeformed = options.plug.empty() || !options.geometry.empty() || !options.model.empty();
+    const bool isDeformed = options.plug.empty() || !options.geometry.empty() || !options.model.name.empty();
     const WarpGeometry* const geometry = warp && isDeformed ? &warp->geometry(options.geometry) : nullptr;
     PlayPlan plan;
     plan.mesh = options.plug.empty() ? geometry->output : findPlug(options.plug);
@@ -86,8 +82,8 @@ PlayPlan planFor(const Options& options) {
     plan.output = options.output;
     plan.trace = options.trace;
     plan.isOnGpu = options.evaluator == "gpu";
-    if (geometry != nullptr)
-        chooseModel(*warp, *geometry, options.model);
+    plan.model = geometry != nullptr && options.model.isGiven() ? chooseModel(*warp, *geometry, options.model)
+                                                                : chooseModel(plan.mesh, options.model);
     addComparison(plan, options, warp ? &*warp : nullptr, geometry);
     addOrder(plan, options.order, geometry != nullptr ? geometry->name : nodeName(plan.mesh.node()));
     return plan;
@@ -104,7 +100,7 @@ void play(Options& options) {
         const PlayPlan plan = planFor(options);
         const double meters = metersPerUnit();
         const PlayResult result = playFrames(session, plan, options.console);
-        answer = options.console.json ? playJson(result, plan.frames, meters) : playText(result, plan.frames, meters);
+        answer = options.console.json ? playJson(result, plan, meters) : playText(result, plan, meters);
     }
     std::cout << answer;
 }
@@ -117,9 +113,12 @@ void bake(Options& options) {
                                  "\" is no point cache: its name ends in .npy. quarn play writes meshes");
     const StdoutAside aside;
     SceneSession session(options.scene);
-    const PlayResult result = playFrames(session, planFor(options), options.console);
+    const PlayPlan plan = planFor(options);
+    const PlayResult result = playFrames(session, plan, options.console);
     options.console.note("wrote " + std::to_string(result.times.count()) + " frames of " +
                          std::to_string(result.vertexCount) + " vertices to " + options.output.string());
+    if (!plan.model.note.empty())
+        options.console.note(plan.model.note);
 }
 
 void addFrameOptions(CLI::App& command, Options& options) {
@@ -155,7 +154,7 @@ void addPlayCommand(CLI::App& app) {
     command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     command->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");
     command->add_option("--plug", options->plug, "Play this mesh plug instead of what the deformer gives out");
-    command->add_option("--model", options->model, "Use this model for this run, switched on");
+    addModelOptions(*command, options->model);
     command->add_option("-o,--output", options->output, "FILE.npy, or FILE.####.obj, .ply, .gltf or .glb")
         ->type_name("FILE");
     addFrameOptions(*command, *options);
@@ -170,6 +169,7 @@ void addBakeCommand(CLI::App& app) {
     addSceneOptions(*command, options->scene);
     command->add_option("PLUG", options->plug, "The mesh, as skin.outputGeom[0]")->required();
     command->add_option("-o,--output", options->output, "The point cache to write")->type_name("FILE.npy")->required();
+    addModelOptions(*command, options->model);
     addFrameOptions(*command, *options);
     addConsoleOptions(*command, options->console, false);
     command->callback([options] { bake(*options); });

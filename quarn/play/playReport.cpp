@@ -3,6 +3,7 @@
 
 #include "quarn/console/json.h"
 #include "quarn/play/playing.h"
+#include "quarn/scene/modelJson.h"
 
 #include <locale>
 #include <sstream>
@@ -112,14 +113,16 @@ void writeComparison(JsonWriter& json, const char* key, const std::optional<Comp
 
 } // namespace
 
-std::string playText(const PlayResult& result, const FrameRange& frames, double metersPerUnit) {
+std::string playText(const PlayResult& result, const PlayPlan& plan, double metersPerUnit) {
     std::ostringstream out;
     out.imbue(std::locale::classic());
     out.precision(4);
     const FrameTimes& times = result.times;
-    out << "played frames " << frames.first << " to " << frames.last << ", " << result.vertexCount << " vertices\n"
-        << times.count() << " frames timed: " << framesPerSecond(times) << " frames a second, median "
-        << times.median() * inMilliseconds << " ms, p99 " << times.percentile(0.99) * inMilliseconds << " ms, worst "
+    out << "played frames " << plan.frames.first << " to " << plan.frames.last << ", " << result.vertexCount
+        << " vertices" << (plan.model.name.empty() ? "" : ", model " + plan.model.name) << '\n'
+        << (plan.model.note.empty() ? "" : plan.model.note + "\n") << times.count()
+        << " frames timed: " << framesPerSecond(times) << " frames a second, median " << times.median() * inMilliseconds
+        << " ms, p99 " << times.percentile(0.99) * inMilliseconds << " ms, worst "
         << times.percentile(1.0) * inMilliseconds << " ms in frame " << times.worstFrame() << '\n';
     if (result.gpu)
         printGpu(out, *result.gpu);
@@ -139,14 +142,15 @@ std::string playText(const PlayResult& result, const FrameRange& frames, double 
     return out.str();
 }
 
-std::string playJson(const PlayResult& result, const FrameRange& frames, double metersPerUnit) {
+std::string playJson(const PlayResult& result, const PlayPlan& plan, double metersPerUnit) {
     rapidjson::StringBuffer buffer;
     JsonWriter json(buffer);
     const Scale scale = scaleOf(result, metersPerUnit);
     json.StartObject();
-    whole(json, "firstFrame", frames.first);
-    whole(json, "lastFrame", frames.last);
-    whole(json, "step", frames.step);
+    whole(json, "firstFrame", plan.frames.first);
+    whole(json, "lastFrame", plan.frames.last);
+    whole(json, "step", plan.frames.step);
+    writeModel(json, plan.model);
     whole(json, "vertices", static_cast<std::int64_t>(result.vertexCount));
     whole(json, "framesTimed", static_cast<std::int64_t>(result.times.count()));
     writeTimes(json, result);

@@ -7,10 +7,10 @@
 namespace quarn {
 
 struct PlayResult;
-struct FrameRange;
+struct PlayPlan;
 
 /// Lengths in millimetres: those of the scene times `metersPerUnit`, above 0. Numbers are independent of the locale.
-std::string playText(const PlayResult& result, const FrameRange& frames, double metersPerUnit);
-std::string playJson(const PlayResult& result, const FrameRange& frames, double metersPerUnit);
+std::string playText(const PlayResult& result, const PlayPlan& plan, double metersPerUnit);
+std::string playJson(const PlayResult& result, const PlayPlan& plan, double metersPerUnit);
 
 } // namespace quarn

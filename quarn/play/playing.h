@@ -8,6 +8,7 @@
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/evaluator.h"
 #include "quarn/scene/frames.h"
+#include "quarn/scene/useModel.h"
 
 #include <filesystem>
 #include <map>
@@ -32,6 +33,7 @@ struct PlayPlan {
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none
     HPlug before;                           ///< compared as well, where there is `against`; may be null
+    ModelInUse model;                       ///< that was chosen for the mesh; only to be told
     std::optional<std::vector<float>> rest; ///< whose box lengths are compared with; none: `against` in the first frame
 };
 

@@ -2,6 +2,7 @@
 #include "quarn/commands.h"
 
 #include "quarn/console/Console.h"
+#include "quarn/console/StdoutAside.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/render/drawPanel.h"
@@ -11,6 +12,7 @@
 #include "quarn/scene/HostErrors.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/frames.h"
+#include "quarn/scene/modelJson.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
@@ -23,6 +25,7 @@
 #include <charconv>
 #include <cmath>
 #include <iostream>
+#include <set>
 #include <stdexcept>
 
 namespace quarn {
@@ -45,7 +48,7 @@ struct Options {
     std::string plug;
     std::string deformer;
     std::string geometry;
-    std::string model;
+    ModelOption model;
     std::vector<PanelText> panels;
     double range = 0.0; // millimetres; 0 for the largest distance
     std::string size = "480x480";
@@ -56,6 +59,7 @@ struct Options {
 // what all pictures have in common
 struct Shot {
     std::vector<Panel> panels;
+    std::vector<ModelInUse> models; // of each panel's mesh
     FrameRange frames;
     Layout layout;
     Camera camera;
@@ -110,6 +114,23 @@ std::vector<Panel> panelsOf(const Options& options) {
     return panels;
 }
 
+void chooseModels(Shot& shot, const Options& options) {
+    HPlug meant;
+    ModelInUse given;
+    if (options.model.isGiven()) {
+        const Warp warp = Warp::find(options.deformer);
+        const WarpGeometry& geometry = warp.geometry(options.geometry);
+        meant = geometry.output;
+        given = chooseModel(warp, geometry, options.model);
+    }
+    const auto modelOf = [&](const HPlug& mesh) { return mesh == meant ? given : chooseModel(mesh, {}); };
+    for (const Panel& panel : shot.panels) {
+        if (panel.isHeat())
+            modelOf(panel.reference);
+        shot.models.push_back(modelOf(panel.mesh));
+    }
+}
+
 FrameRange framesOf(const Options& options, SceneSession& session) {
     if (!options.frames.empty())
         return frameRange(options.frames);
@@ -125,6 +146,7 @@ Shot plan(const Options& options, SceneSession& session) {
     Shot shot;
     shot.frames = framesOf(options, session);
     shot.panels = panelsOf(options);
+    chooseModels(shot, options);
     shot.layout.hasLabels =
         std::any_of(shot.panels.begin(), shot.panels.end(), [](const Panel& panel) { return !panel.label.empty(); });
     shot.layout.hasColourBar = hasHeat(shot.panels);
@@ -214,6 +236,7 @@ void writePanels(JsonWriter& writer, const Shot& shot, const Answer& answer) {
         writer.StartObject();
         writeText(writer, "label", shot.panels[panel].label);
         writeText(writer, "plug", shot.panels[panel].mesh.name().asChar());
+        writeModel(writer, shot.models[panel]);
         if (shot.panels[panel].isHeat()) {
             writeText(writer, "reference", shot.panels[panel].reference.name().asChar());
             writer.Key("rangeMillimetres");
@@ -228,7 +251,7 @@ void writePanels(JsonWriter& writer, const Shot& shot, const Answer& answer) {
     writer.EndArray();
 }
 
-void printJson(const Shot& shot, const Answer& answer) {
+std::string jsonOf(const Shot& shot, const Answer& answer) {
     rapidjson::StringBuffer buffer;
     JsonWriter writer(buffer);
     writer.StartObject();
@@ -243,13 +266,17 @@ void printJson(const Shot& shot, const Answer& answer) {
     writer.Int(shot.layout.height);
     writePanels(writer, shot, answer);
     writer.EndObject();
-    std::cout << buffer.GetString() << '\n';
+    return std::string(buffer.GetString()) + "\n";
 }
 
 void tell(const Shot& shot, const Answer& answer, const Console& console) {
     if (shot.frames.count() > mostFramesLookedAt)
         console.note("the camera and the range of colours are those of " + std::to_string(mostFramesLookedAt) +
                      " of the " + std::to_string(shot.frames.count()) + " frames");
+    std::set<std::string> notes; // several panels may show the same mesh
+    for (const ModelInUse& model : shot.models)
+        if (!model.note.empty() && notes.insert(model.note).second)
+            console.note(model.note);
     const std::string last = answer.pictures.back().string();
     console.note(answer.pictures.size() == 1 ? "drew " + last
                                              : "drew " + std::to_string(answer.pictures.size()) + " pictures, " +
@@ -260,20 +287,20 @@ void render(const Options& options) {
     watchForInterrupt();
     const View view = viewFrom(options.view, options.up);
     checkPictureName(absolutePath(options.output));
-    SceneSession session(options.scene);
-    if (!options.model.empty()) {
-        const Warp warp = Warp::find(options.deformer);
-        useModel(warp, warp.geometry(options.geometry), options.model);
+    std::string told;
+    {
+        const StdoutAside aside;
+        SceneSession session(options.scene);
+        Shot shot = plan(options, session);
+        Answer answer;
+        answer.measures.resize(shot.panels.size());
+        look(shot, view, options, session);
+        warnOfEmptyPanels(shot, options.console);
+        drawPictures(shot, options, session, answer);
+        tell(shot, answer, options.console);
+        told = options.console.json ? jsonOf(shot, answer) : "";
     }
-    Shot shot = plan(options, session);
-    Answer answer;
-    answer.measures.resize(shot.panels.size());
-    look(shot, view, options, session);
-    warnOfEmptyPanels(shot, options.console);
-    drawPictures(shot, options, session, answer);
-    tell(shot, answer, options.console);
-    if (options.console.json)
-        printJson(shot, answer);
+    std::cout << told;
 }
 
 void addWhatIsShown(CLI::App& command, Options& options) {
@@ -303,8 +330,7 @@ void addWhatIsShown(CLI::App& command, Options& options) {
     command.add_option("--deformer", options.deformer, "The deformer, where the scene has several")->type_name("NAME");
     command.add_option("--geometry", options.geometry, "The deformer's geometry, where it has several")
         ->type_name("INDEX|NAME");
-    command.add_option("--model", options.model, "Show the deformer with this model; the scene stays as it is")
-        ->type_name("NAME");
+    addModelOptions(command, options.model);
 }
 
 } // namespace

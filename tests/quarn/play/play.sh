@@ -25,6 +25,9 @@ connectAttr time1.outTime lost.time
 setAttr lost.cacheFile none.npy
 file -saveAs lost.json
 file -open moving.json
+setAttr wave.models[0].modelActive 0
+file -saveAs off.json
+setAttr wave.models[0].modelActive 1
 setAttr ramp.keyValues 0 3e38
 setAttr wave.envelope 10
 file -saveAs huge.json
@@ -99,6 +102,26 @@ status=0
 wait "$player" || status=$?
 [[ $status == 130 ]] && grep -q interrupted "$work/err" || fail "interrupted: status $status"
 ! compgen -G "$work/long*" >/dev/null || fail "something is left of an interrupted play"
+
+# a model that is off: the only one that fits is taken, and what is shown is always said
+fits=('"model": {\s+"name": "wave",\s+"from": "only one that fits"' 'played .* model wave\nthe model of wave is off in the scene; taken is wave')
+expect 0 "${fits[0]}" '' play "$work/off.json" --frames 1-3 --json
+expect 0 "${fits[1]}" '' play "$work/off.json" --frames 1-3
+expect 0 '' 'wrote 1 frames .*\n.*taken is wave' bake "$work/off.json" 'wave.outputGeom[0]' --frames 11 -o "$work/on.npy"
+expect 0 '"model": {\s+"name": "wave"' 'taken is wave' render "$work/off.json" -o "$work/a.png" --size 40x30 --json
+expect 0 '"model": null(.|\n)*"max": 0.0' '' play "$work/off.json" --frames 11 --against strip.outMesh --no-model --json
+expect 0 '' 'wrote 1 frames[^\n]*\n$' bake "$work/off.json" 'wave.outputGeom[0]' --no-model --frames 11 -o "$work/off.npy"
+expect 0 '"from": "option"' '' play "$scene" --frames 1 --model wave --json
+expect 0 '"from": "scene"' '' play "$scene" --frames 1 --json
+expect 0 '"model": null' '' play "$scene" --frames 1 --plug strip.outMesh --json
+cmp -s "$work/on.npy" "$work/off.npy" && fail "the model that was taken does nothing"
+cp -r "$work/models/wave.nwrp" "$work/models/two.nwrp"
+expect 0 'is off, and several in models fit \(two, wave; .*\): this is the mesh as it came in\n' '' \
+  play "$work/off.json" --frames 1
+sed -i 's/"fullCount": 369/"fullCount": 4/' "$work/models/"*/metadata.json
+expect 0 'the model of wave is off: this is the mesh as it came in\n' '' play "$work/off.json" --frames 1
+sed -i 's/"fullCount": 4/"fullCount": 369/' "$work/models/"*/metadata.json
+rm -r "$work/models/two.nwrp"
 
 expect 0 'geometry 0 \(strip\): 369 vertices, 369 affected, 2 controls, model wave On' '' info "$scene"
 expect 0 'missing file of lost: .*none\.npy' '' info "$work/lost.json"
