@@ -9,6 +9,8 @@
 #include "quarn/character/transfer.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/process/runApart.h"
+#include "storage/FileError.h"
+#include "storage/readWholeFile.h"
 
 #include <assimp/BaseImporter.h>
 #include <assimp/Importer.hpp>
@@ -19,8 +21,6 @@
 #include <cctype>
 #include <cmath>
 #include <filesystem>
-#include <fstream>
-#include <iterator>
 #include <memory>
 #include <sstream>
 #include <stdexcept>
@@ -42,19 +42,15 @@ bool isGltf(const std::string& ending) {
 }
 
 std::string readBytes(const std::string& path) {
-    std::error_code error;
-    const fs::file_status status = fs::status(path, error);
-    if (!fs::exists(status))
-        throw std::runtime_error("no such file");
-    if (!fs::is_regular_file(status))
-        throw std::runtime_error("not a file");
-    std::ifstream file(path, std::ios::binary);
-    std::string bytes((std::istreambuf_iterator<char>(file)), {});
-    if (!file.is_open() || file.bad())
-        throw std::runtime_error("cannot be read");
-    if (bytes.empty())
-        throw std::runtime_error("the file is empty");
-    return bytes;
+    constexpr std::uint64_t largest = UINT32_MAX; // what the head of a binary glTF file can say
+    try {
+        std::string bytes = storage::readWholeFile(path, largest);
+        if (bytes.empty())
+            throw std::runtime_error("the file is empty");
+        return bytes;
+    } catch (const storage::FileError& error) {
+        throw std::runtime_error(error.predicate()); // the path is put before every error
+    }
 }
 
 // leaves the one importer that the ending stands for: a file is never taken for something else

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/console/StdoutAside.h"
 
+#include "storage/Target.h"
+
 #include <cstdio>
 #include <iostream>
 
@@ -21,10 +23,12 @@ StdoutAside::StdoutAside()
     flushAll();
     if (kept_ >= 0)
         ::dup2(STDERR_FILENO, STDOUT_FILENO);
+    storage::setStandardOutput(kept_); // what is written to /dev/stdout still goes there
 }
 
 StdoutAside::~StdoutAside() {
     flushAll();
+    storage::setStandardOutput(-1);
     if (kept_ < 0)
         return;
     ::dup2(kept_, STDOUT_FILENO);

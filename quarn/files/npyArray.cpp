@@ -2,10 +2,11 @@
 #include "quarn/files/npyArray.h"
 
 #include "rig/npyHeader.h"
+#include "storage/FileError.h"
 #include "storage/WholeFile.h"
+#include "storage/readWholeFile.h"
 
 #include <algorithm>
-#include <fstream>
 #include <stdexcept>
 
 namespace quarn {
@@ -15,22 +16,6 @@ using Shape = std::vector<std::uint64_t>;
 
 [[noreturn]] void fail(const std::filesystem::path& path, const std::string& why) {
     throw std::runtime_error("array '" + path.string() + "' cannot be read: " + why);
-}
-
-// all bytes of a regular file
-std::string bytesOf(const std::filesystem::path& path) {
-    std::error_code error;
-    const std::uint64_t size = std::filesystem::file_size(path, error);
-    if (error)
-        fail(path, error.message());
-    if (size > npyArrayFileLimit)
-        fail(path, "it has " + std::to_string(size) + " bytes, and at most " + std::to_string(npyArrayFileLimit) +
-                       " are read");
-    std::ifstream file(path, std::ios::binary);
-    std::string bytes(size, '\0');
-    if (!file.read(bytes.data(), static_cast<std::streamsize>(size)))
-        fail(path, "it cannot be opened, or has been cut short meanwhile");
-    return bytes;
 }
 
 struct Body {
@@ -61,12 +46,14 @@ Body bodyOf(std::string_view bytes, const std::string& descr, std::size_t dimens
 
 template <class Number>
 Shape read(const std::filesystem::path& path, const char* descr, std::size_t dimensions, std::vector<Number>& values) {
-    const std::string bytes = bytesOf(path);
     try {
+        const std::string bytes = storage::readWholeFile(path, npyArrayFileLimit);
         const Body body = bodyOf(bytes, descr, dimensions);
         values.resize(body.numbers.size() / sizeof(Number));
         std::copy(body.numbers.begin(), body.numbers.end(), reinterpret_cast<char*>(values.data()));
         return body.shape;
+    } catch (const storage::FileError& error) {
+        fail(path, "it " + error.predicate());
     } catch (const std::runtime_error& error) {
         fail(path, error.what());
     }

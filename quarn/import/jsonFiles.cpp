@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/import/jsonFiles.h"
 
+#include "storage/readWholeFile.h"
+
 #include <rapidjson/document.h>
 #include <rapidjson/error/en.h>
 
 #include <algorithm>
-#include <fstream>
-#include <iterator>
 #include <stdexcept>
 
 namespace quarn {
@@ -15,6 +15,7 @@ namespace {
 namespace fs = std::filesystem;
 
 constexpr std::array<const char*, 3> axisNames = {"rotateX", "rotateY", "rotateZ"};
+constexpr std::uint64_t largestFile = std::uint64_t{64} << 20U;
 constexpr double radiansPerDegree = 3.14159265358979323846 / 180.0;
 
 std::string textOf(const rapidjson::Value& value) {
@@ -27,10 +28,7 @@ std::size_t lineOf(const std::string& text, std::size_t offset) {
 }
 
 rapidjson::Document readObject(const fs::path& file) {
-    std::ifstream stream(file, std::ios::binary);
-    const std::string text(std::istreambuf_iterator<char>(stream), {});
-    if (!stream.is_open() || stream.bad() || fs::is_directory(file))
-        throw std::runtime_error(file.string() + ": cannot be read");
+    const std::string text = storage::readWholeFile(file, largestFile);
     rapidjson::Document document;
     document.Parse<rapidjson::kParseIterativeFlag>(text.data(), text.size());
     if (document.HasParseError())

@@ -5,6 +5,7 @@
 #include "quarn/pose/PoseControls.h"
 #include "quarn/pose/smoothSlopes.h"
 #include "quarn/scene/plugs.h"
+#include "storage/readWholeFile.h"
 
 #include <rapidjson/document.h>
 #include <rapidjson/error/en.h>
@@ -12,8 +13,6 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
-#include <fstream>
-#include <iterator>
 #include <map>
 #include <stdexcept>
 
@@ -161,11 +160,8 @@ std::vector<PlugKeys> parseKeys(const std::string& text, const std::string& name
 }
 
 std::vector<PlugKeys> readKeys(const std::filesystem::path& file) {
-    std::ifstream stream(file, std::ios::binary);
-    const std::string text(std::istreambuf_iterator<char>(stream), {});
-    if (!stream || stream.bad())
-        throw std::runtime_error(file.string() + " could not be read");
-    return parseKeys(text, file.string());
+    constexpr std::uint64_t largest = std::uint64_t{1} << 30U;
+    return parseKeys(storage::readWholeFile(file, largest), file.string());
 }
 
 } // namespace quarn

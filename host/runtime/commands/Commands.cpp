@@ -6,10 +6,8 @@
 #include "commands/WordValues.h"
 #include "commands/dispatch.h"
 #include "core/apiCall.h"
-
-#include <filesystem>
-#include <fstream>
-#include <sstream>
+#include "storage/FileError.h"
+#include "storage/readWholeFile.h"
 
 namespace OpenQuarn {
 namespace {
@@ -37,18 +35,7 @@ CommandOutcome runAll(const std::vector<ScriptCommand>& commands, std::string_vi
 // owner of the application's commands
 const char application = 'a';
 
-bool readFile(const std::string& path, std::string& text) {
-    std::ifstream file(path, std::ios::binary);
-    std::error_code isNone;
-    if (!file || std::filesystem::is_directory(path, isNone))
-        return false;
-    std::ostringstream all;
-    if (file.peek() != std::ifstream::traits_type::eof())
-        all << file.rdbuf();
-    const bool isRead = !file.bad() && !all.fail();
-    text = std::move(all).str();
-    return isRead;
-}
+constexpr std::uint64_t largestScript = std::uint64_t{256} << 20U;
 
 } // namespace
 
@@ -76,8 +63,11 @@ CommandOutcome runScript(std::string_view text, std::string_view name, const Res
 
 CommandOutcome runScriptFile(const std::string& path, const ResultSink& results) {
     std::string text;
-    if (!readFile(path, text))
-        return failed("the script " + inQuotes(path) + " cannot be read");
+    try {
+        text = storage::readWholeFile(path, largestScript);
+    } catch (const storage::FileError& error) {
+        return failed("the script " + inQuotes(path) + " " + error.predicate());
+    }
     return runScript(text, path, results);
 }
 

@@ -1,15 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "gpu/kernelSource.h"
 
+#include "storage/FileError.h"
+#include "storage/readWholeFile.h"
+
 #include <algorithm>
-#include <cerrno>
-#include <fstream>
-#include <iterator>
 #include <set>
 #include <sstream>
 #include <stdexcept>
 #include <string_view>
-#include <system_error>
 #include <utility>
 
 #include <sys/stat.h>
@@ -18,16 +17,12 @@ namespace OpenQuarn {
 namespace {
 
 std::string readFile(const std::string& path) {
-    struct stat about = {};
-    if (::stat(path.c_str(), &about) == 0 && !S_ISREG(about.st_mode))
-        throw std::runtime_error("cannot read the kernel file \"" + path + "\": it is no file");
-    errno = 0;
-    std::ifstream stream(path, std::ios::binary);
-    std::string text{std::istreambuf_iterator<char>(stream), {}};
-    if (!stream.is_open() || stream.bad())
-        throw std::runtime_error("cannot read the kernel file \"" + path +
-                                 "\": " + std::generic_category().message(errno));
-    return text;
+    constexpr std::uint64_t largest = std::uint64_t{16} << 20U;
+    try {
+        return storage::readWholeFile(path, largest);
+    } catch (const storage::FileError& error) {
+        throw std::runtime_error("cannot read the kernel file \"" + path + "\": it " + error.predicate());
+    }
 }
 
 std::string folderOf(const std::string& path) {

@@ -35,12 +35,15 @@ TEST(DamagedCharacters, PathsThatAreNoFiles) {
     const auto refused = [](const std::string& path, const std::string& reason) {
         EXPECT_EQ(errorOf([&] { readCharacter(path); }), path + ": " + reason);
     };
-    refused(base + "/none.gltf", "no such file");
-    refused(base + "/folder.glb", "not a file");
+    refused(base + "/none.gltf", "does not exist");
+    refused(base + "/folder.glb", "is no regular file");
     // nobody writes into these pipes, and nobody waits for that
     for (const char* pipe : {"/pipe.glb", "/buffer.bin"})
         ASSERT_EQ(mkfifo((base + pipe).c_str(), 0666), 0);
-    refused(base + "/pipe.glb", "not a file");
+    refused(base + "/pipe.glb", "is no regular file");
+    std::ofstream(base + "/large.fbx").close();
+    std::filesystem::resize_file(base + "/large.fbx", std::uintmax_t{20} << 30U);
+    refused(base + "/large.fbx", "has 21474836480 bytes, and at most 4294967295 are read");
     std::string text = Strip().write().text();
     const std::size_t data = text.find("data:application");
     text.replace(data, text.find('"', data) - data, "buffer.bin");

@@ -37,7 +37,7 @@ EOF
 expect 0 'mesh skin: 3 vertices in the file, joined to 3; 1 polygons(.|\n)*scene .*/bone\.json\n$' '' bone.gltf -o bone.json
 expect 0 '"poseInputs": 3(.|\n)*"notes": \[\n' '(?s)place the character.*: root' bone.gltf -o bone.json --neural-warp --json
 expect 0 'deformer warp: 6 angles' '' bone.gltf -o bone.json --neural-warp --with-roots -q
-expect 1 '' '^quarn: .*none\.glb: no such file\n$' none.glb -o bone.json
+expect 1 '' '^quarn: .*none\.glb: does not exist\n$' none.glb -o bone.json
 expect 1 '' '^quarn: --fps must be a number above 0\n$' bone.gltf -o bone.json --fps 0
 expect 1 '' '^quarn: --meters-per-unit must be' bone.gltf -o bone.json --meters-per-unit -1
 expect 106 '' '--output is required' bone.gltf

@@ -190,7 +190,7 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
         EXPECT_FALSE(fs::exists(path("scene.json")));
     };
     refused("strip.gltf has no animation \"run\"", [](ImportOptions& options) { options.animation = "run"; });
-    refused("no such file", [&](ImportOptions& options) { options.file = path("none.glb"); });
+    refused("does not exist", [&](ImportOptions& options) { options.file = path("none.glb"); });
     refused("is the character itself", [&](ImportOptions& options) { options.output = options.file; });
     refused("one after the other only", [&](ImportOptions& options) { options.output = "/dev/null"; });
     refused("is a folder", [&](ImportOptions& options) { options.output = path("."); });
@@ -214,7 +214,8 @@ TEST_F(ImportCharacter, DamagedJsonFilesAreRefusedByName) {
     EXPECT_THAT(parents(""), HasSubstr("line 1"));
     EXPECT_THAT(parents(R"({"a": 1})"), HasSubstr("\"a\": its parent is not a text"));
     EXPECT_THAT(parents(R"({"a": "b", "a": "c"})"), HasSubstr("\"a\": the joint stands twice"));
-    EXPECT_THAT(errorOf([&] { readParents(path("none.json")); }), HasSubstr("none.json: cannot be read"));
+    EXPECT_THAT(errorOf([&] { readParents(path("none.json")); }), HasSubstr("none.json does not exist"));
+    EXPECT_THAT(errorOf([] { readLimits("/dev/zero"); }), HasSubstr("/dev/zero is no regular file"));
     EXPECT_THAT(limits(R"({"a": []})"), HasSubstr("\"a\": not an object of axes"));
     EXPECT_THAT(limits(R"({"a": {"rotatex": [0, 1]}})"), HasSubstr("\"rotatex\" is not one of"));
     EXPECT_THAT(limits(R"({"a": {"rotateX": [0, 1, 2]}})"), HasSubstr("rotateX is not [least, largest]"));

@@ -165,7 +165,7 @@ TEST(NpyArrays, ComeBackAndAreChecked) {
     EXPECT_THAT(table.values, ElementsAre(1, 2, 3, 4, 5, 0.1F));
     std::ofstream(path, std::ios::app) << "x";
     EXPECT_THAT(why([&] { readFloatTable(path); }), HasSubstr("takes 24 bytes, and 25 follow"));
-    EXPECT_THAT(why([&] { readFloatTable(folder.path() / "none"); }), HasSubstr("No such file"));
+    EXPECT_THAT(why([&] { readFloatTable(folder.path() / "none"); }), HasSubstr("does not exist"));
 }
 
 } // namespace
