@@ -9,7 +9,7 @@ import sys
 from pathlib import Path
 
 import trainer
-from trainer.errors import Terminated, TrainerError
+from trainer.errors import Terminated, TrainerError, UsageError
 
 # Debian's packages by module, for whoever has to install them
 PACKAGES = {name: f"python3-{name}" for name in ("numpy", "scipy", "torch", "onnx", "tqdm", "matplotlib")}
@@ -17,11 +17,12 @@ PACKAGES = {name: f"python3-{name}" for name in ("numpy", "scipy", "torch", "onn
 
 class Parser(argparse.ArgumentParser):
     def error(self, message):
-        raise TrainerError(f"{message} (see {self.prog} --help)")
+        raise UsageError(f"{message} (see {self.prog} --help)")
 
 
 def parser():
-    main = Parser(prog="trainer", description="Trains models for the neuralWarp deformer.", allow_abbrev=False)
+    main = Parser(prog="trainer", description="Trains models for the neuralWarp deformer.", allow_abbrev=False,
+                  formatter_class=argparse.RawDescriptionHelpFormatter, epilog=settings_text())
     main.add_argument("--version", action="version", version=f"trainer {trainer.__version__}")
     commands = main.add_subparsers(dest="command", required=True, metavar="COMMAND")
     add_train(commands)
@@ -57,15 +58,17 @@ def add_train(commands):
     add_dataset(train)
     train.add_argument("-o", "--output", metavar="MODEL.nwrp",
                        help="model directory; if not given: models/NAME.nwrp with the data set's outputModelName")
-    train.add_argument("--seed", type=int, default=1)
+    train.add_argument("--seed", type=int, default=1, help="of everything that is drawn at random (default 1)")
     train.add_argument("--threads", type=int, default=1, help="of the arithmetic; the model depends on it (default 1)")
     train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model")
     add_quarn(train)
     train.add_argument("--quiet", action="store_true", help="only errors")
     train.add_argument("--json", action="store_true", help="write the report to standard output as well")
-    add_settings(train.add_argument_group("settings", "instead of those of the data set"))
+    add_settings(train.add_argument_group("settings", SETTINGS_RULE))
 
 
+SETTINGS_RULE = ("Each takes the place of the data set's, which come from the node's train attributes; what the data "
+                 "set lacks has the default.")
 # flags of the settings, in the order of the node's attributes
 SETTING_FLAGS = {
     "batchSize": "--batch-size", "epochs": "--epochs", "learningRate": "--learning-rate",
@@ -76,16 +79,25 @@ SETTING_FLAGS = {
 
 
 def add_settings(group):
-    from trainer.settings import KINDS
+    from trainer.settings import KINDS, described
 
     for name, flag in SETTING_FLAGS.items():
-        group.add_argument(flag, dest=name, type=KINDS[name], metavar=name)
+        group.add_argument(flag, dest=name, type=KINDS[name], metavar=name, help=described(name))
     kind = group.add_mutually_exclusive_group()
     kind.add_argument("--principal-shapes", dest="principalShapesEnabled", action="store_true", default=None,
-                      help="learn coefficients of principal shapes")
+                      help=described("principalShapesEnabled"))
     kind.add_argument("--direct", dest="principalShapesEnabled", action="store_false", help="learn the deltas")
     group.add_argument("--preload", dest="preloadData", action=argparse.BooleanOptionalAction,
-                       help="hold the deltas in memory")
+                       help=described("preloadData"))
+
+
+def settings_text():
+    """The settings of a training, as the help of the whole program shows them."""
+    from trainer.settings import described
+
+    flags = {**SETTING_FLAGS, "principalShapesEnabled": "--principal-shapes", "preloadData": "--preload"}
+    return "\n".join(["settings of train, for everything else see 'trainer train --help':",
+                      *(f"  {flag:22} {described(name)}" for name, flag in flags.items()), "", SETTINGS_RULE])
 
 
 # --- the commands ---
@@ -96,7 +108,7 @@ def command_train(options):
     pin_threads(options.threads)
     from trainer import evaluator, pipeline
     from trainer.dataset import load_dataset
-    from trainer.measure import as_lines
+    from trainer.measure import advice, as_lines
     from trainer.settings import KINDS, override
 
     say = speaker(options)
@@ -108,11 +120,12 @@ def command_train(options):
     report = Path(options.report) if options.report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
                                          not options.quiet))
-    for line in as_lines(result["errors"]):
+    for line in [*as_lines(result["errors"]), *advice(result["errors"], result["explained"], settings)]:
         say(line)
     say(f"wrote {model} and {report}")
     if options.json:
         print(json.dumps(result, indent=1))
+    return INTERRUPTED if result["interrupted"] else 0
 
 
 def pin_threads(count):
@@ -193,6 +206,7 @@ def command_info(options):
     print(f"sha256 {dataset.digest}")
 
 
+INTERRUPTED = 130  # 128 + SIGINT
 COMMANDS = {"train": command_train, "evaluate": command_evaluate, "zero": command_zero, "info": command_info}
 
 
@@ -204,9 +218,11 @@ def main():
     signal.signal(signal.SIGTERM, on_terminate)
     try:
         options = parser().parse_args()
-        COMMANDS[options.command](options)
+        status = COMMANDS[options.command](options) or 0
         sys.stdout.flush()
-        return 0
+        return status
+    except UsageError as error:
+        return complain(error, 2)
     except TrainerError as error:
         return complain(error)
     except ModuleNotFoundError as error:
@@ -216,8 +232,8 @@ def main():
                         f"{' '.join(PACKAGES.values())}), or choose another Python")
     except (OSError, MemoryError) as error:
         return complain(reason_of(error))
-    except KeyboardInterrupt:
-        return 130
+    except KeyboardInterrupt as error:
+        return complain(f"interrupted {error}".strip(), INTERRUPTED)
     except Terminated:
         return 143
 
@@ -225,12 +241,13 @@ def main():
 def reason_of(error):
     if isinstance(error, MemoryError):
         return "there is not enough memory"
-    return f"{error.filename}: {error.strerror}" if error.strerror and error.filename else error
+    # files are opened, written and closed under their names; what is printed has none
+    return f"{error.filename or 'standard output'}: {error.strerror}" if error.strerror else error
 
 
-def complain(error):
+def complain(error, status=1):
     print(f"trainer: {error}", file=sys.stderr)
-    return 1
+    return status
 
 
 if __name__ == "__main__":

@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 """Runs models: with quarn, as the deformer would, or with NumPy, which needs no quarn and is nobody's contract."""
 
+import io
 import json
 import os
 import shutil
@@ -14,6 +15,7 @@ import onnx
 from onnx import numpy_helper
 
 from trainer.errors import TrainerError
+from trainer.files import write_bytes
 
 BUILT = Path(__file__).resolve().parent.parent / "build" / "release" / "quarn" / "quarn"
 
@@ -35,7 +37,9 @@ def run_with_quarn(quarn, model, controls):
     """Outputs float32 [rows, K] of a model directory for controls [rows, C]."""
     with tempfile.TemporaryDirectory(prefix="neuralWarp-") as folder:
         given, answer = Path(folder) / "controls.npy", Path(folder) / "outputs.npy"
-        np.save(given, np.ascontiguousarray(controls, "<f4"))
+        rows = io.BytesIO()
+        np.save(rows, np.ascontiguousarray(controls, "<f4"))
+        write_bytes(given, rows.getvalue())
         command = [quarn, "info", str(model), "--run", str(given), "--outputs", str(answer)]
         done = subprocess.run(command, stdin=subprocess.DEVNULL, capture_output=True, text=True, errors="replace",
                               check=False)

@@ -10,6 +10,7 @@ from torch import nn
 
 import trainer
 from trainer.errors import TrainerError
+from trainer.files import write_bytes
 from trainer.settings import WITHOUT_EFFECT
 
 OPSET = 16
@@ -115,16 +116,14 @@ def write_model(folder, model, metadata_, shapes=None):
     if len(text) > METADATA_LIMIT:
         raise TrainerError(f"metadata.json would have {len(text)} bytes, more than the {METADATA_LIMIT} that the "
                            "deformer reads: the partial subset has too many vertices")
-    (folder / "metadata.json").write_text(text, encoding="utf-8")
-    (folder / "model.onnx").write_bytes(model.SerializeToString(deterministic=True))
+    write_bytes(folder / "metadata.json", text.encode())
+    write_bytes(folder / "model.onnx", model.SerializeToString(deterministic=True))
     if shapes is not None:
         write_shapes(folder / "principal_shapes.json", shapes)
 
 
 def write_shapes(path, shapes):
-    with open(path, "w", encoding="ascii") as file:
-        file.write(f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
-                   '"principalShapes": [\n')
-        # as text a float32 has the fewest digits that give it back
-        file.write(",\n".join("[" + ",".join(shape.astype(str).tolist()) + "]" for shape in shapes))
-        file.write("\n]}\n")
+    # as text a float32 has the fewest digits that give it back
+    rows = ",\n".join("[" + ",".join(shape.astype(str).tolist()) + "]" for shape in shapes)
+    write_bytes(path, (f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
+                       f'"principalShapes": [\n{rows}\n]}}\n').encode())

@@ -38,6 +38,21 @@ def whole_folder(target, own_names):
         os.close(lock)
 
 
+def write_bytes(path, content):
+    """Writes a file; an error, such as a full disk, names it."""
+    with naming(path), open(path, "wb") as file:
+        file.write(content)
+
+
+@contextmanager
+def naming(path):
+    """Puts the path into errors of writing and closing, which come from the system without one."""
+    try:
+        yield
+    except OSError as error:
+        raise OSError(error.errno, error.strerror, str(path)) from error
+
+
 def sibling(target, ending):
     return target.with_name(target.name + ending)
 
@@ -76,8 +91,11 @@ def sync(folder):
     """The bytes reach the disk before the name does."""
     for path in [*folder.iterdir(), folder]:
         handle = os.open(path, os.O_RDONLY)
-        os.fsync(handle)
-        os.close(handle)
+        try:
+            with naming(path):
+                os.fsync(handle)
+        finally:
+            os.close(handle)
 
 
 def replace(part, target, old):

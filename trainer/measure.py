@@ -8,6 +8,7 @@ import numpy as np
 # 2^-11 (0.05 %) of the exact one.
 KEPT = 1 << 24
 DROPPED_BITS = 12
+ENOUGH_EXPLAINED = 0.99  # part of the deltas' sum of squares: what shapes that hold it leave is hardly seen
 BINS = 1 << (31 - DROPPED_BITS)
 
 
@@ -70,6 +71,31 @@ def measure(dataset, rows, deltas_of, shapes=None):
             basis.add(part, deltas @ shapes.T @ shapes - deltas)  # nearest that the shapes can make
     return {"frames": len(rows), "base": base.summary(dataset),
             "basis": None if shapes is None else basis.summary(dataset), "network": network.summary(dataset)}
+
+
+def is_at_floor(errors, explained):
+    """Whether most of what is left is what the shapes cannot show, and more of them could be had.
+
+    What the shapes cannot show and what the network does wrong in their span are at right angles: at 1.4 times the
+    basis's error the two are alike."""
+    return (errors["basis"] is not None and explained < ENOUGH_EXPLAINED
+            and errors["network"]["mean"]["mm"] <= 2**0.5 * errors["basis"]["mean"]["mm"])
+
+
+def advice(errors, explained, settings):
+    """What the errors say about the settings: sentences, none where there is nothing to be done."""
+    sentences = []
+    if is_at_floor(errors, explained):
+        sentences.append(
+            f"the shapes limit this model: with an accuracy of {settings.principalShapesAccuracy:g} and at most "
+            f"{settings.principalShapesLimit} of them they hold {100 * explained:.1f} % of the deltas, and the network "
+            "leaves little more than the best that they could do; --principal-accuracy 0.99 --principal-limit 200 "
+            "would leave less")
+    worse = [name for name in ("mean", "p99") if errors["network"][name]["mm"] > errors["base"][name]["mm"]]
+    if worse:
+        sentences.append(f"the network leaves more than no correction does ({' and '.join(worse)}): it needs more frames, "
+                         "or more epochs")
+    return sentences
 
 
 def as_lines(errors):

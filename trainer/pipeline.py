@@ -1,16 +1,13 @@
 # SPDX-License-Identifier: Apache-2.0
 """From a data set to a published model: targets, training, export, verification, errors."""
 
-import sys
 import time
-from contextlib import contextmanager
 from dataclasses import dataclass
 
 import numpy as np
 import torch
-from tqdm import tqdm
 
-from trainer import evaluator, export, files, memory, report
+from trainer import evaluator, export, files, memory, progress, report
 from trainer.errors import TrainerError
 from trainer.measure import measure
 from trainer.network import build, check_size, measure_controls, parameter_count, predict
@@ -72,7 +69,7 @@ def train_into(job, part, split):
     targets = make_targets(job, split[0])
     check_size(job.settings, job.dataset.control_count, targets.count)
     network, normalisation, history = train_network(job, targets, split)
-    export_and_verify(job, part, network, normalisation, targets, split)
+    export_and_verify(job, part, network, normalisation, targets, split, history)
     return history, summarise(job, network, normalisation, targets, split, history)
 
 
@@ -130,31 +127,21 @@ def train_network(job, targets, split):
     job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
             f"{len(split[0])} frames, validating on {len(split[1])}")
     network = build(settings, dataset.control_count, targets.count, normalisation.still)
-    with progress_bar(settings.epochs, job.progress and sys.stderr.isatty()) as on_epoch:
+    with progress.counted(settings.epochs, job.say, job.progress) as on_epoch, \
+            progress.noted_interrupt() as is_interrupted:
         history = fit(network, normalisation.normalised(dataset.controls), targets.of, split, settings, job.seed,
-                      on_epoch)
+                      on_epoch, is_interrupted)
     job.say(f"{len(history.train)} epochs, the best is {history.best_epoch} with a loss of {history.best_loss:.3e}")
     return network, normalisation, history
 
 
-@contextmanager
-def progress_bar(epochs, shown):
-    """Gives what fit() calls after each epoch."""
-    if not shown:
-        yield lambda history: None
-        return
-    with tqdm(total=epochs, unit="epoch", leave=False) as bar:
-        def on_epoch(history):
-            bar.set_postfix(loss=f"{history.train[-1]:.2e}", best=f"{history.best_loss:.2e}", refresh=False)
-            bar.update()
-
-        yield on_epoch
-
-
-def export_and_verify(job, part, network, normalisation, targets, split):
+def export_and_verify(job, part, network, normalisation, targets, split, history):
     """Writes the model's files, runs them as others will, and refuses them where the outputs differ."""
     model = export.onnx_model(network, normalisation, "deltas" if targets.shapes is None else "weights")
-    export.write_model(part, model, export.metadata(job.dataset, job.settings, job.seed), targets.shapes)
+    metadata = export.metadata(job.dataset, job.settings, job.seed)
+    if history.interrupted:
+        metadata["interruptedAfterEpochs"] = len(history.train)
+    export.write_model(part, model, metadata, targets.shapes)
     rows = report_rows(split)[:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
     wanted = predict(network, normalisation, controls)
@@ -195,4 +182,5 @@ def summarise(job, network, normalisation, targets, split, history):
         "principalShapes": None if targets.shapes is None else len(targets.shapes), "explained": targets.explained,
         "parameters": sum(p.numel() for p in network.parameters()),
         "epochs": len(history.train), "bestEpoch": history.best_epoch, "bestLoss": history.best_loss,
+        "interrupted": history.interrupted,
     }

@@ -1,14 +1,17 @@
 # SPDX-License-Identifier: Apache-2.0
 """The report folder: report.json and loss.png."""
 
+import io
 import json
 import os
+
+from trainer.files import write_bytes
 
 NAMES = ("report.json", "loss.png")
 
 
 def write_report(folder, report, history):
-    (folder / "report.json").write_text(json.dumps(report, indent=1, allow_nan=False) + "\n", encoding="utf-8")
+    write_bytes(folder / "report.json", (json.dumps(report, indent=1, allow_nan=False) + "\n").encode())
     draw_losses(folder / "loss.png", history)
 
 
@@ -31,4 +34,6 @@ def draw_losses(path, history):
     axes.xaxis.set_major_locator(MaxNLocator(integer=True))
     axes.grid(True, which="both", alpha=0.3)
     axes.legend()
-    figure.savefig(path, dpi=100)
+    picture = io.BytesIO()
+    figure.savefig(picture, dpi=100)
+    write_bytes(path, picture.getvalue())

@@ -30,6 +30,22 @@ class Settings:
     patience: int = 50  # epochs without a better validation loss until training stops; not an attribute of the node
 
 
+MEANINGS = {
+    "outputModelName": "name of the model, where -o gives none",
+    "batchSize": "rows of a step",
+    "epochs": "passes over the rows; the learning rate falls to 0 over them",
+    "learningRate": "of Adam, at the start",
+    "validationRatio": "part of the rows that are held out, and that errors are told of",
+    "hiddenLayerCount": "hidden layers",
+    "neuronsPerLayer": "neurons of each hidden layer",
+    "activationFunction": "one of " + ", ".join(ACTIVATIONS),
+    "dropoutRatio": "part of the neurons left out in each step",
+    "principalShapesEnabled": "learn coefficients of principal shapes, not the deltas themselves",
+    "principalShapesLimit": "most principal shapes",
+    "principalShapesAccuracy": "part of the deltas' sum of squares that the shapes hold; 0.99 and more looks right",
+    "preloadData": "hold the deltas in memory; the model is the same without",
+    "patience": "stop after so many epochs without a better validation loss",
+}
 LIMITS = {
     "batchSize": (1, 100000), "epochs": (1, 100000), "learningRate": (0, 1), "validationRatio": (0, 0.99),
     "hiddenLayerCount": (1, 100), "neuronsPerLayer": (1, 100000), "dropoutRatio": (0, 1),
@@ -37,6 +53,15 @@ LIMITS = {
 }
 KINDS = {field.name: field.type for field in fields(Settings)}
 WORDS = {bool: "true or false", int: "a whole number", float: "a number", str: "a text"}
+
+
+def described(name):
+    """Meaning, limits and default of a setting, for a help text."""
+    facts = [f"{LIMITS[name][0]} to {LIMITS[name][1]}"] if name in LIMITS else []
+    default = getattr(Settings(), name)
+    if default != "":
+        facts.append(f"default {str(default).lower() if isinstance(default, bool) else default}")
+    return MEANINGS[name] + (f" ({', '.join(facts)})" if facts else "")
 
 
 def read_settings(train, where):

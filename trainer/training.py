@@ -17,6 +17,7 @@ class History:
     validation: list = field(default_factory=list)  # empty without validation rows
     best_epoch: int = 0                             # from 1
     best_loss: float = math.inf
+    interrupted: bool = False                       # by the user, who gets what was best until then
 
 
 def make_deterministic(seed, threads):
@@ -34,13 +35,15 @@ def split_rows(count, ratio, seed):
     return np.sort(order[held:]), np.sort(order[:held])
 
 
-def fit(network, inputs, targets_of, split, settings, seed, on_epoch):
+def fit(network, inputs, targets_of, split, settings, seed, on_epoch, is_interrupted):
     """Trains `network` and leaves it with its best weights.
 
-    inputs      float32 [F, C], normalised controls of all rows
-    targets_of  gives float32 [n, K], normalised outputs, for an array of sorted rows
-    split       rows to train on, rows to validate on (may be none: then the training loss decides)
-    on_epoch    called with the History after each epoch; what it raises ends the training
+    inputs          float32 [F, C], normalised controls of all rows
+    targets_of      gives float32 [n, K], normalised outputs, for an array of sorted rows
+    split           rows to train on, rows to validate on (may be none: then the training loss decides)
+    on_epoch        called with the History after each epoch; what it raises ends the training
+    is_interrupted  asked before each step: a yes ends the training with what was best until then, and with
+                    KeyboardInterrupt where no epoch was finished
     """
     rows, held = split
     order = np.random.default_rng((seed, 1))
@@ -49,7 +52,11 @@ def fit(network, inputs, targets_of, split, settings, seed, on_epoch):
     history, best = History(), None
     for epoch in range(1, settings.epochs + 1):
         batches = cut(order.permutation(rows), settings.batchSize)
-        history.train.append(train_epoch(network, inputs, targets_of, batches, optimizer, settings, (epoch - 1), steps))
+        loss = train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch - 1, steps, is_interrupted)
+        if loss is None:
+            history.interrupted = True
+            break
+        history.train.append(loss)
         if len(held):
             history.validation.append(mean_loss(network, inputs, targets_of, cut(held, settings.batchSize)))
         loss = (history.validation or history.train)[-1]
@@ -62,6 +69,8 @@ def fit(network, inputs, targets_of, split, settings, seed, on_epoch):
         on_epoch(history)
         if epoch - history.best_epoch >= settings.patience:
             break
+    if best is None:
+        raise KeyboardInterrupt("before an epoch was finished: there is no network yet")
     network.load_state_dict(best)
     return history
 
@@ -71,10 +80,13 @@ def cut(rows, size):
     return [np.sort(rows[first:first + size]) for first in range(0, len(rows), size)]
 
 
-def train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch, steps):
+def train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch, steps, is_interrupted):
+    """The mean loss; None where the epoch was not finished."""
     network.train()
     total = 0.0
     for index, batch in enumerate(batches):
+        if is_interrupted():
+            return None
         # half a cosine from the full rate to 0 over all steps
         step = epoch * len(batches) + index
         optimizer.param_groups[0]["lr"] = settings.learningRate * 0.5 * (1 + math.cos(math.pi * step / steps))

@@ -5,6 +5,7 @@ import hashlib
 import json
 import os
 import random
+import resource
 import signal
 import stat
 import subprocess
@@ -15,6 +16,7 @@ import unittest
 from pathlib import Path
 
 import synthetic
+from trainer.settings import KINDS, described
 
 ROOT = Path(__file__).resolve().parents[2]
 TRAIN = ("train", "data", "-o", "m/arm", "--quarn", "none")
@@ -43,10 +45,14 @@ class CommandTest(unittest.TestCase):
         kept = {key: value for key, value in os.environ.items() if key != "QUARN"}
         return {**kept, "PYTHONPATH": f"{ROOT}", **more}
 
-    def start(self, *arguments, **environment):
+    def start(self, *arguments, largest_file=resource.RLIM_INFINITY, **environment):
+        def prepare():
+            resource.setrlimit(resource.RLIMIT_FSIZE, (largest_file, resource.RLIM_INFINITY))
+            signal.signal(signal.SIGINT, signal.default_int_handler)  # a shell ignores it in what it puts in the background
+
         return subprocess.Popen([sys.executable, "-m", "trainer", *map(str, arguments)], cwd=self.place, text=True,
                                 stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
-                                env=self.environment(**environment))
+                                env=self.environment(**environment), preexec_fn=prepare)
 
     def run_trainer(self, *arguments, status=0, **environment):
         process = self.start(*arguments, **environment)
@@ -54,8 +60,8 @@ class CommandTest(unittest.TestCase):
         self.assertEqual(process.returncode, status, out + err)
         return out, err
 
-    def refused(self, *arguments, **environment):
-        out, err = self.run_trainer(*arguments, status=1, **environment)
+    def refused(self, *arguments, status=1, **environment):
+        out, err = self.run_trainer(*arguments, status=status, **environment)
         self.assertRegex(err, r"\Atrainer: [^\n]+\n\Z")
         return err
 
@@ -94,13 +100,36 @@ class CommandTest(unittest.TestCase):
         self.assertEqual(self.digest(), wanted)
         self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
 
-    def test_interrupted_leaves_nothing(self):
-        for number, status in ((signal.SIGINT, 130), (signal.SIGTERM, 143)):
-            process = self.start(*TRAIN, "--epochs", "100000", "--patience", "100000")
-            while "validating on" not in process.stdout.readline():
+    def test_interrupted(self):
+        """SIGTERM leaves nothing, Ctrl-C the best network so far; and nothing where there is none yet."""
+        for number, after, status, said, left in (
+                (signal.SIGTERM, "validating on", 143, "", []),
+                (signal.SIGINT, "validating on", 130, "trainer: interrupted", []),
+                (signal.SIGINT, "epoch 2000 of", 130, "ends with the best network so far", ["arm.nwrp", "arm.report"])):
+            # epochs of one step, or of many slow ones
+            more = ("--batch-size", "100000") if left else ("--batch-size", "1", "--neurons", "3000")
+            process = self.start(*TRAIN, "--epochs", "40000", "--patience", "40000", *more)
+            while after not in process.stdout.readline():
                 self.assertIsNone(process.poll())
             process.send_signal(number)
-            self.assertEqual((process.communicate()[1], process.returncode), ("", status))
+            out, err = process.communicate()
+            self.assertEqual(process.returncode, status, out + err)
+            self.assertIn(said, err)
+            self.assertEqual(sorted(os.listdir(self.place / "m")), left, err)
+            if left:
+                report, metadata = (json.loads((self.place / "m" / name).read_text())
+                                    for name in ("arm.report/report.json", "arm.nwrp/metadata.json"))
+                self.assertTrue(report["interrupted"] and 2000 <= report["epochs"] < 40000)
+                self.assertEqual(metadata["interruptedAfterEpochs"], report["epochs"])
+
+    def test_a_full_disk_is_told_with_the_file(self):
+        synthetic.make(self.place / "two", frames=60, affect=[1, 2])
+        shapes = ("--principal-shapes", "--neurons", "2")
+        for name, size, data, more in (
+                ("metadata.json", 500, "data", ()), ("model.onnx", 5000, "data", ()), ("loss.png", 15000, "data", shapes),
+                ("principal_shapes.json", 1500, "data", shapes), ("report.json", 1250, "two", ("--neurons", "1"))):
+            error = self.refused("train", data, *TRAIN[2:], "--quiet", "--epochs", "1", *more, largest_file=size)
+            self.assertRegex(error, rf"arm\.\w+\.part/{name}: File too large")
             self.assertEqual(os.listdir(self.place / "m"), [])
 
     def test_streams_and_errors(self):
@@ -111,15 +140,21 @@ class CommandTest(unittest.TestCase):
         self.assertIn("60 frames, 3 controls, 48 deltas (Surface", self.run_trainer("info", "data")[0])
         self.assertEqual(json.loads(self.run_trainer("info", "data", "--json")[0])["frameCount"], 60)
         for arguments, wanted in (
-                ((), "required"), (("dance",), "dance"), (("train", "nowhere", "-o", "m"), "nowhere is not a training"),
+                (("train", "nowhere", "-o", "m"), "nowhere is not a training"),
                 ((*TRAIN, "--learning-rate", "0"), "learning rate is 0"),
-                ((*TRAIN, "--epochs", "many"), "invalid int value: 'many'"),
                 ((*TRAIN, "--activation", "swish"), "--activation is 'swish'"),
                 ((*TRAIN, "--neurons", "100000"), "40.06 GB"), ((*TRAIN, "--threads", "0"), "--threads is 0"),
                 ((*TRAIN, "--quarn", "nowhere"), "--quarn names nowhere"),
                 (("evaluate", "data", "data", "--quarn", "none"), "data is not a model directory"),
                 (("train", "data", "-o", "data/dataset.json/m"), "dataset.json")):
             self.assertIn(wanted, self.refused(*arguments))
+        for arguments, wanted in (((), "required"), (("dance",), "dance"),
+                                  ((*TRAIN, "--epochs", "many"), "invalid int value: 'many'")):
+            self.assertIn(wanted, self.refused(*arguments, status=2))
+        for command in ((), ("train",)):
+            said = " ".join(self.run_trainer(*command, "--help")[0].split())
+            for name in KINDS:
+                self.assertTrue(name == "outputModelName" or described(name) in said, (command, name))
 
     def test_zero_model_and_evaluation(self):
         self.run_trainer("zero", "data", "-o", "m/zero")

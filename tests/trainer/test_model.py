@@ -15,7 +15,7 @@ from trainer import export, memory, pipeline, shapes
 from trainer.dataset import load_dataset
 from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory, NumpyModel
-from trainer.measure import Distances
+from trainer.measure import Distances, advice
 from trainer.network import check_size
 from trainer.settings import ACTIVATIONS, Settings
 
@@ -150,6 +150,18 @@ class ShapesTest(unittest.TestCase):
             read = json.loads((Path(place) / "shapes.json").read_text())
         self.assertEqual((read["principalShapeCount"], read["principalVertCount"]), (3, 100))
         np.testing.assert_array_equal(np.array(read["principalShapes"], np.float32), values)
+
+
+class AdviceTest(unittest.TestCase):
+    def test_says_what_the_errors_mean(self):
+        stage = lambda mean, p99: {"mean": {"mm": mean}, "p99": {"mm": p99}}
+        for basis, network, explained, wanted in (
+                (stage(1, 3), stage(1.3, 3), 0.87, "an accuracy of 0.8 and at most 20 .* 87.0 %"),
+                (stage(1, 3), stage(1.5, 3), 0.87, None), (stage(1, 3), stage(1.3, 3), 0.995, None),
+                (None, stage(1, 3), None, None), (None, stage(5, 13), None, r"more than no correction does \(mean and p99\)"),
+                (None, stage(1, 13), None, r"\(p99\)")):
+            said = " ".join(advice({"base": stage(4, 12), "basis": basis, "network": network}, explained, Settings()))
+            self.assertRegex(said, wanted or r"\A\Z")
 
 
 class SizesTest(unittest.TestCase):

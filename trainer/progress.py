@@ -1,0 +1,50 @@
+# SPDX-License-Identifier: Apache-2.0
+"""What a user sees of a training while it runs, and how it is ended: epochs counted, and Ctrl-C."""
+
+import signal
+import sys
+from contextlib import contextmanager
+
+from tqdm import tqdm
+
+LINES = 20  # where there is no terminal to draw a bar on
+
+
+@contextmanager
+def counted(epochs, say, shown):
+    """Gives what fit() calls after each epoch: it moves a bar on a terminal; where there is none it says some lines."""
+    if shown and sys.stderr.isatty():
+        with tqdm(total=epochs, unit="epoch", leave=False) as bar:
+            yield lambda history: move(bar, history)
+    else:
+        yield lambda history: say_line(len(history.train), epochs, history, say)
+
+
+def move(bar, history):
+    bar.set_postfix(loss=f"{history.train[-1]:.2e}", best=f"{history.best_loss:.2e}", refresh=False)
+    bar.update()
+
+
+def say_line(done, epochs, history, say):
+    if done * LINES // epochs > (done - 1) * LINES // epochs:
+        say(f"epoch {done} of {epochs}: loss {history.train[-1]:.2e}, best {history.best_loss:.2e}")
+
+
+@contextmanager
+def noted_interrupt():
+    """Gives what tells whether the user has pressed Ctrl-C in the meantime. A second one ends the program at once."""
+    asked = []
+
+    def on_interrupt(number, frame):
+        asked.append(number)
+        signal.signal(signal.SIGINT, signal.default_int_handler)
+        print("trainer: interrupted: the training ends with the best network so far (Ctrl-C again: without)",
+              file=sys.stderr, flush=True)
+
+    before = signal.getsignal(signal.SIGINT)
+    if before is not signal.SIG_IGN:  # as in a job that a script has put into the background
+        signal.signal(signal.SIGINT, on_interrupt)
+    try:
+        yield lambda: bool(asked)
+    finally:
+        signal.signal(signal.SIGINT, before)
