@@ -97,7 +97,7 @@ phase() {
 
 command_check() {
   local scope=${1:-}
-  [[ -z $scope || $scope == --all ]] || fail "check takes --all or nothing, not '$scope'"
+  [[ -z $scope || $scope == --all ]] || usage_error "check takes --all or nothing, not '$scope'"
   need_packages git clang-format-14 clang-tidy-14
   need_for_preset tsan
   phase format check_format

@@ -8,6 +8,12 @@ fail() {
   exit 1
 }
 
+# A command line that cannot be understood: one line on standard error, status 2.
+usage_error() {
+  printf '%s: %s\n' "${0##*/}" "$*" >&2
+  exit 2
+}
+
 have() { command -v "$1" >/dev/null 2>&1; }
 
 job_count() { printf '%s' "${NW_JOBS:-$(nproc)}"; }
@@ -49,6 +55,14 @@ declare -A probe_of=(
   [git]=git
 )
 
+# The same by what they are for; scripts that source this file install them.
+# shellcheck disable=SC2034
+build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-dev libgtest-dev libgmock-dev libeigen3-dev
+  libassimp-dev zlib1g-dev libembree-dev libstb-dev ocl-icd-opencl-dev pocl-opencl-icd)
+python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
+  python3-pil libopenblas0-pthread)
+clang_packages=(clang-14 libclang-rt-14-dev llvm-14)
+
 is_debian_12() { (. /etc/os-release 2>/dev/null && [[ ${ID:-} == debian && ${VERSION_ID:-} == 12 ]]); }
 
 is_installed() {
@@ -70,12 +84,19 @@ as_root() {
   if ((EUID == 0)); then "$@"; else sudo "$@"; fi
 }
 
-# Installs those of the named packages that are missing; touches nothing when none is.
-need_packages() {
-  local package missing=()
+# Sets `missing` to those of the named packages that are not there.
+find_missing() {
+  local package
+  missing=()
   for package in "$@"; do
     is_installed "$package" || missing+=("$package")
   done
+}
+
+# Installs those of the named packages that are missing; touches nothing when none is.
+need_packages() {
+  local missing
+  find_missing "$@"
   ((${#missing[@]})) || return 0
   is_debian_12 || fail "not Debian 12, so install by hand what is missing: ${missing[*]}"
   ((EUID == 0)) || have sudo || fail "neither root nor sudo; as root, run: apt-get install ${missing[*]}"

@@ -1,28 +1,111 @@
 # shellcheck shell=bash
 # ./run demo: from a rigged hand to a neural deformation and its report. Sourced by ./run.
 #
-# Every step is a command that docs/tutorial.md explains; what it prints goes to a file in the log folder. The four
-# rows of the report are two delta modes by two kinds of model; the pictures show surface deltas with principal shapes.
+# Every step is a command that docs/tutorial.md explains; what it prints goes to a file in the log folder. The rows of the
+# report are two delta modes, with --all by two kinds of model; each network of a demo without it is in a picture.
 
 demo_usage() {
   cat <<'TEXT'
-usage: ./run demo [--output FOLDER] [--samples N] [--epochs N]
+usage: ./run demo [--all] [--output FOLDER] [--samples N] [--epochs N]
 
+  --all             also two networks that learn the deltas themselves, without principal shapes; no picture shows them
   --output FOLDER   where the results go (default: demo-out); results of an earlier demo there are replaced
-  --samples N       training poses (default 3000)
+  --samples N       training poses, 10 or more (default 3000)
   --epochs N        passes over them (default 250)
 TEXT
 }
 
-demo_rows=(surface_principal surface_direct offset_principal offset_direct)
+# demo_number FLAG LEAST VALUE: the value, if it is a whole number that can be meant
+demo_number() {
+  [[ $3 =~ ^[1-9][0-9]{0,6}$ && $3 -ge $2 ]] || usage_error "$1 takes a whole number from $2 to 9999999, not '$3'"
+  printf '%s' "$3"
+}
 
-# step LABEL COMMAND...: one line and the time it took; on a failure the end of what the command said
+demo_options() {
+  demo_out=demo-out demo_samples=3000 demo_epochs=250 demo_kinds=(principal)
+  while (($#)); do
+    case $1 in
+      -h | --help)
+        demo_usage
+        exit 0
+        ;;
+      --all) demo_kinds=(principal direct) && shift && continue ;;
+      --output | --samples | --epochs) (($# > 1)) || usage_error "$1 needs a value; ./run demo --help says more" ;;
+      *) usage_error "demo does not know '$1'; ./run demo --help says what it knows" ;;
+    esac
+    case $1 in
+      --output) demo_out=$2 ;;
+      --samples) demo_samples=$(demo_number "$1" 10 "$2") ;;
+      --epochs) demo_epochs=$(demo_number "$1" 1 "$2") ;;
+    esac
+    shift 2
+  done
+  demo_place
+}
+
+# The folder of the results is the caller's, and there before minutes are spent.
+demo_place() {
+  [[ $demo_out && $demo_out != -* ]] || usage_error "--output needs a folder, not '$demo_out'"
+  if [[ $demo_out != demo-out && $demo_out != /* && ${caller:-$PWD} != "$PWD" ]]; then demo_out=$caller/$demo_out; fi
+  { mkdir -p "$demo_out" && [[ -w $demo_out ]]; } 2>/dev/null || usage_error "--output $demo_out: no folder that can be written"
+}
+
+# --- what is coming ---
+
+# Seconds of one core, measured: a target shape 0.04, a pose in an epoch of a network of shapes 0.0001, of a direct one
+# 0.0005; the rest of a demo 50. Targets are shared between the cores, and trainings go two side by side.
+demo_seconds() {
+  local cores kind seconds
+  cores=$(job_count)
+  seconds=$((50 + (demo_samples + 120) * 40 / (1000 * cores)))
+  for kind in "${demo_kinds[@]}"; do
+    local cost=1
+    if [[ $kind == direct ]]; then cost=5; fi
+    seconds=$((seconds + demo_samples * demo_epochs * cost / 10000 * (cores > 1 ? 1 : 2)))
+  done
+  printf '%s' "$seconds"
+}
+
+# One line for each thing that is loaded; nothing where all of it is there.
+demo_loads() {
+  local missing
+  find_missing "${build_packages[@]}" "${python_packages[@]}"
+  if ((${#missing[@]})); then printf 'Debian packages (%s missing, on a bare system 210 MB)\n' "${#missing[@]}"; fi
+  scripts/fetch_onnxruntime.sh --what
+  scripts/fetch_hand.sh --what
+}
+
+demo_announce() {
+  local seconds loads build=''
+  seconds=$(demo_seconds)
+  loads=$(demo_loads | paste -s -d ';' | sed 's/;/, /g')
+  [[ -x build/release/quarn/quarn ]] || build=", and a few more to build it first (5 on two cores)"
+  say "the demo: a hand is rigged, posed $demo_samples times, learned and played; its results go to $demo_out"
+  say "it takes about $(((seconds + 59) / 60)) min on $(job_count) free cores$build"
+  say "to be loaded: ${loads:-nothing, all of it is there}"
+}
+
+# --- its steps ---
+
+# step LABEL COMMAND...: one line and the time it took; on a failure the end of what the command said. On a terminal the
+# line counts meanwhile.
 step() {
-  local label=$1 start=$SECONDS log
+  local label=$1 start=$SECONDS log counting='' status=0
   shift
   log=$logs/$(printf '%s' "$label" | tr -cs 'a-z0-9' '-').log
   printf '   %-52s' "$label"
-  if ! "$@" >"$log" 2>&1; then
+  : >"$log"
+  if [[ -t 1 ]]; then
+    count_aloud "$label" "$log" &
+    counting=$!
+  fi
+  "$@" >"$log" 2>&1 || status=$?
+  if [[ $counting ]]; then
+    kill "$counting"
+    wait "$counting" 2>/dev/null || true
+    printf '\r   %-52s\033[K' "$label"
+  fi
+  if ((status)); then
     printf 'failed\n'
     tail -n 15 "$log" >&2
     fail "$label: the command failed (log: $log)"
@@ -30,20 +113,28 @@ step() {
   printf '%4d s\n' "$((SECONDS - start))"
 }
 
-demo_options() {
-  demo_out=demo-out demo_samples=3000 demo_epochs=250
-  while (($#)); do
-    case $1 in
-      --output) demo_out=${2:?--output needs a folder} ;;
-      --samples) demo_samples=${2:?--samples needs a number} ;;
-      --epochs) demo_epochs=${2:?--epochs needs a number} ;;
-      *)
-        demo_usage >&2
-        exit 2
-        ;;
-    esac
-    shift 2
+# count_aloud LABEL LOG: seconds, and the last "N of M" of the log, once a second until it is ended
+count_aloud() {
+  local from=$SECONDS
+  while sleep 1; do
+    printf '\r   %-52s%4d s  %s\033[K' "$1" "$((SECONDS - from))" \
+      "$(tail -c 500 "$2" | grep -oE '[0-9]+ of [0-9]+' | tail -n 1)"
   done
+}
+
+# Ctrl-C: the step at hand has had it too, but for what it had put beside itself. It comes in the middle of a step, whose
+# output goes to its log.
+watch_for_interrupt() {
+  exec {demo_errors}>&2
+  trap 'demo_interrupted' INT
+}
+
+demo_interrupted() {
+  local beside
+  mapfile -t beside < <(jobs -p)
+  kill "${beside[@]}" 2>/dev/null || true
+  printf '\nrun: the demo was interrupted; what it had made is in %s\n' "$demo_out" >&"$demo_errors"
+  exit 130
 }
 
 # everything that a demo needs; sets `python` and QUARN
@@ -147,32 +238,37 @@ measure_row() {
 
 demo_models() {
   local kind row
-  for kind in principal direct; do
+  for kind in "${demo_kinds[@]}"; do
     step "training: both modes, $kind" train_both_modes "$kind"
-  done
-  for row in "${demo_rows[@]}"; do
-    step "the motion with the model ${row/_/, }" measure_row "$row"
+    for row in "surface_$kind" "offset_$kind"; do
+      step "the motion with the model ${row/_/, }" measure_row "$row"
+    done
   done
 }
 
 demo_pictures() {
   local panels=(--panel "skin=$skin_plug" --panel "target=$target_plug" --panel "neural=warp.outputGeom[0]"
-    --heat "error=warp.outputGeom[0]:$target_plug" --model surface_principal --range 2 --view 90,20)
+    --heat "error=warp.outputGeom[0]:$target_plug" --range 2 --view 90,20)
   step "pictures" \
-    "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --size 480x480 --frames 20-100x20 \
+    "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --model surface_principal --size 480x480 --frames 20-100x20 \
     -o "$demo_out/pictures/motion.####.png"
+  step "a picture of the network of offsets" \
+    "$QUARN" render "$data/motion_offset.json" "${panels[@]}" --model offset_principal --size 480x480 --frames 60 \
+    -o "$demo_out/pictures/offset.####.png"
   step "the moving picture" \
-    "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --size 300x300 --frames 1-120x2 \
+    "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --model surface_principal --size 300x300 --frames 1-120x2 \
     -o "$data/preview/frame.####.png"
 }
 
 command_demo() {
-  local data logs python demo_out demo_samples demo_epochs
+  local data logs python demo_out demo_samples demo_epochs demo_kinds
   local surface_smoothing=5 activation_rate=0.8 skin_plug target_plug start=$SECONDS judge=()
   demo_options "$@"
+  demo_announce
   demo_install
   demo_folders
-  say "the demo; its results go to $demo_out"
+  watch_for_interrupt
+  say "what each step prints goes to $logs"
   demo_import
   skin_plug=l_handMeshNode_skin.outputGeom[0] target_plug=l_handMeshNode_target.outMesh
   demo_poses

@@ -25,6 +25,10 @@ unpack() {
 }
 
 [[ -e $target/stamp && $(<"$target/stamp") == "$integrity" ]] && exit 0
+if [[ ${1:-} == --what ]]; then # what would be loaded, and how much
+  say_what_to_load "the hand" 94 "$package" "$version"
+  exit 0
+fi
 
 cache=$(cache_folder)
 scratch=$(mktemp -d "$cache/fetch.XXXXXX")

@@ -46,6 +46,10 @@ is_given && exit 0
 [[ -e $target/stamp && $(<"$target/stamp") == "$integrity" ]] && exit 0
 [[ $(uname -m) == x86_64 ]] ||
   fail "the pinned ONNX Runtime is for x86-64 processors: set ONNXRUNTIME_ROOT to one for this machine"
+if [[ ${1:-} == --what ]]; then # what would be loaded, and how much
+  say_what_to_load "ONNX Runtime" 150 "$package" "$version"
+  exit 0
+fi
 
 cache=$(cache_folder)
 scratch=$(mktemp -d "$cache/fetch.XXXXXX")

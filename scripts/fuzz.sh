@@ -39,7 +39,7 @@ report_target() {
 
 command_fuzz() {
   local seconds=${1:-60} program failed=0
-  [[ $seconds =~ ^[1-9][0-9]*$ ]] || fail "fuzz takes a number of seconds, not '$seconds'"
+  [[ $seconds =~ ^[1-9][0-9]*$ ]] || usage_error "fuzz takes a number of seconds, not '$seconds'"
   build fuzz
   rm -rf "$fuzz_work"
 

@@ -8,11 +8,22 @@ is_intact() {
   [[ $actual == "$expected" ]]
 }
 
+# file_of PACKAGE VERSION: the archive's name, as npm gives it
+file_of() {
+  local file=${1#@}-$2.tgz
+  printf '%s' "${file//\//-}"
+}
+
+# say_what_to_load NAME MB PACKAGE VERSION: for whoever asks before; nothing where the cache folder has the archive
+say_what_to_load() {
+  [[ -e $(cache_folder)/$(file_of "$3" "$4") ]] || printf '%s (%s MB)\n' "$1" "$2"
+}
+
 # npm_package PACKAGE VERSION INTEGRITY SCRATCH WAY-OUT: leaves the verified archive in the cache folder and sets
 # `archive` to its path. SCRATCH is a folder beside it. WAY-OUT ends the sentence about what to do when it fails.
 npm_package() {
-  local package=$1 version=$2 integrity=$3 scratch=$4 way_out=$5 file=${1#@}-$2.tgz
-  file=${file//\//-} # as npm names it
+  local package=$1 version=$2 integrity=$3 scratch=$4 way_out=$5 file
+  file=$(file_of "$package" "$version")
   archive=$(dirname "$scratch")/$file
   if [[ -e $archive ]] && ! is_intact "$archive" "$integrity"; then
     say "the cached $archive is damaged: fetching it again"

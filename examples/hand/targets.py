@@ -21,6 +21,7 @@ from relaxation import Relaxation  # noqa: E402
 from skinned_mesh import BadInput, read_skinned_mesh  # noqa: E402
 
 CHUNK = 8  # frames that a process takes at once
+LINES = 20  # of progress, where there is no terminal
 
 
 def main():
@@ -140,8 +141,11 @@ def write_frames(file, mesh, skin_path, frame_count, arguments):
 
 
 def show_progress(done, count, quiet):
+    """On a terminal one line that changes, elsewhere about twenty."""
     if not quiet and sys.stderr.isatty():
         print(f"\rrelaxing: {done} of {count}", end="\n" if done == count else "", file=sys.stderr, flush=True)
+    elif not quiet and (done * LINES // count > (done - CHUNK) * LINES // count or done == count):
+        print(f"relaxing: {done} of {count}", flush=True)
 
 
 def current_umask():

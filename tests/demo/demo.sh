@@ -20,8 +20,8 @@ python=$(scripts/find_python.sh) || {
   echo "no Python with PyTorch here: the demo is not tried"
   exit 77
 }
-command_demo --output "$work/demo" --samples 40 --epochs 3
-for file in report.html preview.webp table.txt pictures/motion.0060.png; do
+command_demo --all --output "$work/demo" --samples 40 --epochs 3
+for file in report.html preview.webp table.txt pictures/motion.0060.png pictures/offset.0060.png; do
   [[ -s $work/demo/$file ]] || fail "the demo made no $file"
 done
 "$python" tests/demo/recompute.py "$work/demo"
