@@ -121,7 +121,8 @@ def train_network(job, targets, split):
     normalisation = measure_controls(dataset.controls[split[0]], targets.unit)
     if normalisation.still.any():
         names = [dataset.description["controlNames"][i] for i in np.flatnonzero(normalisation.still)]
-        job.say(f"{len(names)} controls never move and get no influence: {', '.join(names[:5])}"
+        job.say(f"{len(names)} of {dataset.control_count} controls never move in these frames and get no influence, as of a "
+                f"joint that turns about one axis only: {', '.join(names[:5])}"
                 + (", ..." if len(names) > 5 else ""))
     weights = 4 * parameter_count(settings, dataset.control_count, targets.count)
     job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
