@@ -113,12 +113,14 @@ step() {
   printf '%4d s\n' "$((SECONDS - start))"
 }
 
-# count_aloud LABEL LOG: seconds, and the last "N of M" of the log, once a second until it is ended
+# count_aloud LABEL LOG: seconds, and the last "N of M" of the log, once a second until it is ended. A step that makes
+# files has them counted: its caller sets made_in to their folder and made_of to their number.
 count_aloud() {
-  local from=$SECONDS
+  local from=$SECONDS count
   while sleep 1; do
-    printf '\r   %-52s%4d s  %s\033[K' "$1" "$((SECONDS - from))" \
-      "$(tail -c 500 "$2" | grep -oE '[0-9]+ of [0-9]+' | tail -n 1)"
+    count=$(tail -c 500 "$2" | grep -oE '[0-9]+ of [0-9]+' | tail -n 1)
+    if [[ ${made_of:-} ]]; then count="$(find "$made_in" -name '*.png' | wc -l) of $made_of"; fi
+    printf '\r   %-52s%4d s  %s\033[K' "$1" "$((SECONDS - from))" "$count"
   done
 }
 
@@ -255,7 +257,7 @@ demo_pictures() {
   step "a picture of the network of offsets" \
     "$QUARN" render "$data/motion_offset.json" "${panels[@]}" --model offset_principal --size 480x480 --frames 60 \
     -o "$demo_out/pictures/offset.####.png"
-  step "the moving picture" \
+  made_in=$data/preview made_of=60 step "the moving picture" \
     "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --model surface_principal --size 300x300 --frames 1-120x2 \
     -o "$data/preview/frame.####.png"
 }
