@@ -101,7 +101,7 @@ step() {
   fi
   "$@" >"$log" 2>&1 || status=$?
   if [[ $counting ]]; then
-    kill "$counting"
+    kill "$counting" 2>/dev/null || true
     wait "$counting" 2>/dev/null || true
     printf '\r   %-52s\033[K' "$label"
   fi
@@ -118,7 +118,7 @@ step() {
 count_aloud() {
   local from=$SECONDS count
   while sleep 1; do
-    count=$(tail -c 500 "$2" | grep -oE '[0-9]+ of [0-9]+' | tail -n 1)
+    count=$(tail -c 500 "$2" | grep -oE '[0-9]+ of [0-9]+' | tail -n 1) || count= # the log has none yet
     if [[ ${made_of:-} ]]; then count="$(find "$made_in" -name '*.png' | wc -l) of $made_of"; fi
     printf '\r   %-52s%4d s  %s\033[K' "$1" "$((SECONDS - from))" "$count"
   done
