@@ -3,12 +3,18 @@
 
 #include "host/files/fileNodes.h"
 
+#include "openquarn/HFnAttribute.h"
+#include "openquarn/HFnDependencyNode.h"
+#include "openquarn/HSelectionList.h"
+#include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Session.h"
 
+#include <algorithm>
 #include <cstdlib>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -36,12 +42,39 @@ private:
     OpenQuarn::MessageSink previous_;
 };
 
+void evaluateOutput(const HPlug& output) {
+    constexpr std::size_t most = 8; // elements of one array
+    std::vector<unsigned> indices;
+    if (output.getExistingArrayAttributeIndices(indices).error())
+        OpenQuarn::evaluate(output);
+    for (std::size_t i = 0; i < std::min(indices.size(), most); ++i)
+        OpenQuarn::evaluate(output.elementByLogicalIndex(indices[i]));
+}
+
+void evaluateOutputs() {
+    HSelectionList nodes;
+    nodes.add("*");
+    for (unsigned i = 0; i < nodes.length(); ++i) {
+        HObject node;
+        require(!nodes.getDependNode(i, node).error());
+        const HFnDependencyNode list(node);
+        for (unsigned at = 0; at < list.attributeCount(); ++at)
+            if (const HFnAttribute attribute(list.attribute(at)); attribute.isReadable() && !attribute.isWritable())
+                evaluateOutput(HPlug(node, list.attribute(at)));
+    }
+}
+
 } // namespace
 
 bool fuzzScene(const std::uint8_t* data, std::size_t size) {
+    return fuzzSceneWith(data, size, [] {});
+}
+
+bool fuzzSceneWith(const std::uint8_t* data, std::size_t size, void (*registerTypes)()) {
     const Silence silence;
     const OpenQuarn::Session session;
     fileNodes::registerTypes();
+    registerTypes();
     fileNodes::create("present");
     const std::string before = written();
     const std::string text(reinterpret_cast<const char*>(data), size);
@@ -52,5 +85,7 @@ bool fuzzScene(const std::uint8_t* data, std::size_t size) {
     const std::string once = written();
     require(OpenQuarn::sceneFromText(once, "fuzz").ok);
     require(written() == once);
+    evaluateOutputs();
+    written();
     return true;
 }
