@@ -15,8 +15,9 @@
 namespace neuralWarp {
 namespace {
 
-/// How a model root is looked for: the environment's variables are filled in, a relative path is taken from the
-/// workspace first and then as it is, and a folder that is missing keeps its name.
+/// How a model root is looked for: the environment's variables are filled in, a relative path is taken from the folder
+/// of the scene (of the workspace, while there is none) first and then as it is, and a folder that is missing keeps its
+/// name.
 constexpr int modelRootResolveMethod = 54;
 
 /// Empty when the host cannot say.

@@ -1,16 +1,33 @@
 // SPDX-License-Identifier: Apache-2.0
 // quarn: the host without a screen.
 #include "quarn/commands.h"
+#include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 
 #include <CLI/CLI.hpp>
 
 #include <exception>
 #include <iostream>
+#include <string>
 
 namespace {
 
-constexpr int endedBySignal = 130; // what shells expect of a program that Ctrl-C has ended
+constexpr int wrongUsage = 2;      // what shells expect of a program that was not called as it can be
+constexpr int endedBySignal = 130; // and of one that Ctrl-C has ended
+
+// the library would say that a command is missing
+void requireCommand(const CLI::App& app, int argc, char** argv) {
+    const std::string first = argc > 1 ? argv[1] : "";
+    if (first.empty() || first.front() == '-')
+        return;
+    std::string names;
+    for (const CLI::App* command : app.get_subcommands({})) {
+        if (command->get_name() == first)
+            return;
+        names += (names.empty() ? "" : ", ") + command->get_name();
+    }
+    throw quarn::UsageError("there is no command \"" + first + "\"; there are " + names);
+}
 
 int run(int argc, char** argv) {
     CLI::App app("quarn: the host without a screen");
@@ -27,10 +44,11 @@ int run(int argc, char** argv) {
     quarn::addTargetCommand(app);
     quarn::addRenderCommand(app);
 
+    requireCommand(app, argc, argv);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
-        return app.exit(error); // help and version are no failures
+        return app.exit(error) == 0 ? 0 : wrongUsage; // help and version are no failures
     }
     if (!std::cout.flush())
         throw std::runtime_error("standard output could not be written");
@@ -45,6 +63,9 @@ int main(int argc, char** argv) {
     } catch (const quarn::Interrupted& interrupted) {
         std::cerr << "quarn: " << interrupted.what() << '\n';
         return endedBySignal;
+    } catch (const quarn::UsageError& error) {
+        std::cerr << "quarn: " << error.what() << "\nRun with --help for more information.\n";
+        return wrongUsage;
     } catch (const std::exception& error) {
         std::cerr << "quarn: " << error.what() << '\n';
         return 1;

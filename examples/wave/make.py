@@ -87,7 +87,7 @@ def scene(points, quads):
         {"name": "controls", "type": "controlCollector",
          "values": {"inputList[0].input": {"0": [0.0, 0.0]}}},
         {"name": "wave", "type": "neuralWarp",
-         "values": {"modelRoot": "examples/wave/models", "models[0]": {"modelName": "wave", "modelActive": 1}}},
+         "values": {"modelRoot": "models", "models[0]": {"modelName": "wave", "modelActive": 1}}},
     ]
     connections = [["strip.outMesh", "wave.input[0].inputGeometry"], ["strip.outMesh", "wave.originalGeometry[0]"],
                    ["controls.output", "wave.controlValues"]]

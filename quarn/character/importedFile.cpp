@@ -3,24 +3,55 @@
 
 #include <assimp/MemoryIOWrapper.h>
 
+#include <charconv>
 #include <filesystem>
 #include <system_error>
 #include <utility>
 
 namespace quarn {
+namespace {
+
+bool isFile(const std::string& path) {
+    std::error_code error;
+    return std::filesystem::is_regular_file(path, error);
+}
+
+// "%20" and the like as the bytes that they stand for; what is none of these, and the byte 0, stays as it is written
+std::string percentDecoded(const std::string& uri) {
+    std::string decoded;
+    for (std::size_t at = 0; at < uri.size(); ++at) {
+        const char* digits = uri.data() + at + 1;
+        unsigned byte = 0;
+        const bool isCode = uri[at] == '%' && at + 2 < uri.size() &&
+                            std::from_chars(digits, digits + 2, byte, 16).ptr == digits + 2 && byte != 0;
+        decoded += isCode ? static_cast<char>(byte) : uri[at];
+        at += isCode ? 2U : 0U;
+    }
+    return decoded;
+}
+
+} // namespace
 
 ImportedFile::ImportedFile(std::string path, const std::string& bytes)
     : path_(std::move(path))
     , bytes_(bytes) {}
 
+// the importer takes a URI for a path: behind its own folder, which is one, characters may be written by their codes
+std::string ImportedFile::onDisk(const std::string& file) const {
+    const std::string folder = path_.substr(0, path_.size() - std::filesystem::path(path_).filename().string().size());
+    if (!file.starts_with(folder) || file.find('%', folder.size()) == std::string::npos)
+        return file;
+    std::string decoded = folder + percentDecoded(file.substr(folder.size()));
+    return isFile(decoded) ? decoded : file;
+}
+
 bool ImportedFile::Exists(const char* file) const {
-    std::error_code error;
-    return file == path_ || std::filesystem::is_regular_file(file, error);
+    return file == path_ || isFile(onDisk(file));
 }
 
 Assimp::IOStream* ImportedFile::Open(const char* file, const char* mode) {
     if (file != path_)
-        return Exists(file) ? DefaultIOSystem::Open(file, mode) : nullptr; // a pipe would be waited for
+        return Exists(file) ? DefaultIOSystem::Open(onDisk(file).c_str(), mode) : nullptr; // a pipe would be waited for
     // the stream does not own the bytes and does not write
     const auto* bytes = reinterpret_cast<const std::uint8_t*>(bytes_.data());
     return new Assimp::MemoryIOStream(bytes, bytes_.size(), false);

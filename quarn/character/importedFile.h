@@ -19,6 +19,7 @@ public:
     Assimp::IOStream* Open(const char* file, const char* mode) override; // NOLINT(readability-identifier-naming)
 
 private:
+    std::string onDisk(const std::string& file) const;
     std::string path_;
     const std::string& bytes_;
 };

@@ -2,7 +2,7 @@
 // A NumPy array that grows on the disk, row by row, and can be taken up again after the program has died.
 #pragma once
 
-#include "quarn/dataset/Fnv64.h"
+#include "quarn/files/Fnv64.h"
 #include "storage/Descriptor.h"
 
 #include <cstdint>

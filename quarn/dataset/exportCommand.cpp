@@ -26,6 +26,7 @@ void printJson(const std::vector<ExportAnswer>& answers) {
         writeText(writer, "folder", answer.folder.string());
         writeCount(writer, "rows", answer.rows);
         writeCount(writer, "rowsBefore", answer.rowsBefore);
+        writeCount(writer, "rowsRepeated", answer.rowsRepeated);
         writeCount(writer, "controls", answer.controls);
         writeCount(writer, "vertices", answer.vertices);
         writeCount(writer, "bytes", answer.bytes);

@@ -40,7 +40,13 @@ fs::path folderByScene(const Warp& warp, const WarpGeometry& geometry) {
     const std::string name = textOf(warp.plug("export", geometry, "trainingDataName"));
     if (root.empty())
         throw std::runtime_error(warp.name + ".trainingDataRoot is empty; set it, or say with -o where to export to");
-    return fs::current_path() / root / (name.empty() ? geometry.name : name);
+    const fs::path folder = fs::path(root) / (name.empty() ? geometry.name : name);
+    // a scene may come from anywhere, and is not to choose a place above its own that looks like one below
+    if (std::find(folder.begin(), folder.end(), "..") != folder.end() || fs::path(name).is_absolute())
+        throw std::runtime_error("the scene would have " + geometry.name + " exported to " + folder.string() + " (" +
+                                 warp.name + ".trainingDataRoot and export[" + std::to_string(geometry.index) +
+                                 "].trainingDataName); say with -o where to export to");
+    return fs::current_path() / folder;
 }
 
 // one folder each: two geometries that are to go into the same are refused
@@ -63,6 +69,22 @@ std::vector<fs::path> foldersOf(const Warp& warp, const std::vector<WarpGeometry
     }
     return folders;
 }
+
+/// Rows that are equal to the one before.
+struct Repeats {
+    std::size_t count = 0;
+    int firstFrame = 0;
+
+    void look(int frame, const std::vector<float>& controls, const std::vector<float>& deltas) {
+        if (controls == controls_ && deltas == deltas_ && count++ == 0)
+            firstFrame = frame;
+        controls_ = controls;
+        deltas_ = deltas;
+    }
+
+private:
+    std::vector<float> controls_, deltas_; ///< of the row before
+};
 
 /// The export of one geometry.
 class GeometryExport {
@@ -91,6 +113,7 @@ public:
             return alreadyDone();
         const std::size_t before = write();
         folder_.publish(lock);
+        warnOfRepeats();
         return answer(before);
     }
 
@@ -104,13 +127,8 @@ private:
 
     ExportAnswer answer(std::size_t before) const {
         const DatasetShape& shape = facts_.shape;
-        return {geometry_.name,
-                folder_.path(),
-                shape.rows,
-                before,
-                shape.controls,
-                shape.deltas,
-                bytesOfDataset(folder_.path())};
+        return {geometry_.name, folder_.path(), shape.rows,   before,
+                repeats_.count, shape.controls, shape.deltas, bytesOfDataset(folder_.path())};
     }
 
     // answers how many rows there were
@@ -159,9 +177,19 @@ private:
         while (writer.rows() < facts_.shape.rows) {
             const int frame = frames_.frame(writer.rows());
             sampler_.sample(frame);
+            repeats_.look(frame, sampler_.controls(), sampler_.deltas());
             writer.append(frame, sampler_.controls(), sampler_.deltas());
             progress.advance();
         }
+    }
+
+    void warnOfRepeats() const {
+        if (repeats_.count > 0)
+            options_.console.warn(std::to_string(repeats_.count) + " of " + std::to_string(facts_.shape.rows) +
+                                  " rows of " + geometry_.name + " are equal to the row before, the first in frame " +
+                                  std::to_string(repeats_.firstFrame) + ": nothing moves there, and training on them " +
+                                  "teaches nothing. --frames, or exportStartFrame and exportEndFrame of " + warp_.name +
+                                  ", leave them out");
     }
 
     void keepRows(DatasetWriter& writer) const {
@@ -192,6 +220,7 @@ private:
     FrameSampler sampler_;
     Setup setup_;
     DatasetFacts facts_;
+    Repeats repeats_;
 };
 
 } // namespace
@@ -203,6 +232,10 @@ std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
     const std::vector<fs::path> folders = foldersOf(warp, geometries, options);
     std::vector<ExportAnswer> answers;
     answers.reserve(geometries.size());
+    if (options.output.empty())
+        for (std::size_t i = 0; i < geometries.size(); ++i)
+            options.console.note("exporting " + geometries[i].name + " to " + folders[i].string() +
+                                 ", as the scene says");
     for (std::size_t i = 0; i < geometries.size(); ++i)
         answers.push_back(GeometryExport(session, warp, geometries[i], folders[i], options).run());
     return answers;

@@ -29,7 +29,8 @@ struct ExportAnswer {
     std::string geometry;
     std::filesystem::path folder;
     std::size_t rows = 0;
-    std::size_t rowsBefore = 0; ///< of these, rows that an earlier run had made; all of them when it was complete
+    std::size_t rowsBefore = 0;   ///< of these, rows that an earlier run had made; all of them when it was complete
+    std::size_t rowsRepeated = 0; ///< of those that this run has made, as many as are equal to the row before
     std::size_t controls = 0;
     std::size_t vertices = 0;
     std::uintmax_t bytes = 0;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/sceneSetup.h"
 
-#include "quarn/dataset/Fnv64.h"
+#include "quarn/files/Fnv64.h"
 #include "quarn/scene/plugs.h"
 
 #include "openquarn_app/SceneFile.h"
@@ -45,7 +45,7 @@ std::string stateOfFile(const std::string& path) {
 void addFiles(Setup& setup) {
     for (const OpenQuarn::ExternalContent& file : OpenQuarn::externalContent()) {
         const std::string path = file.resolved.empty() ? file.unresolved : file.resolved;
-        if (!path.empty() && nodeType(findNode(file.node)) != "neuralWarp")
+        if (!path.empty() && file.role != OpenQuarn::filePatternRole && nodeType(findNode(file.node)) != "neuralWarp")
             setup.add("file " + file.unresolved + " of " + file.node + "." + file.key, stateOfFile(path));
     }
 }

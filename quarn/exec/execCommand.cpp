@@ -19,26 +19,32 @@ void print(const OpenQuarn::CommandValue& value) {
     std::cout << OpenQuarn::printedValue(value) << std::endl;
 }
 
-OpenQuarn::CommandOutcome runFile(const std::string& file) {
+OpenQuarn::CommandOutcome runFile(const std::string& file, OpenQuarn::OnShownError onShownError) {
     if (file != "-")
-        return OpenQuarn::runScriptFile(file, print);
+        return OpenQuarn::runScriptFile(file, print, onShownError);
     const std::string text(std::istreambuf_iterator<char>(std::cin), {});
     if (std::cin.bad())
         throw std::runtime_error("standard input could not be read");
-    return OpenQuarn::runScript(text, "standard input", print);
+    return OpenQuarn::runScript(text, "standard input", print, onShownError);
 }
 
 struct Options {
     std::vector<std::string> plugins;
     std::string file;
+    bool stops = false;
 };
 
 void execute(const Options& options) {
+    const SceneFolder folder;
     const OpenQuarn::Session session;
     loadPlugins(options.plugins, false);
-    const OpenQuarn::CommandOutcome outcome = runFile(options.file);
+    const OpenQuarn::CommandOutcome outcome =
+        runFile(options.file, options.stops ? OpenQuarn::OnShownError::stop : OpenQuarn::OnShownError::goOn);
+    const std::string& shown = outcome.shownError;
     if (!outcome)
-        throw std::runtime_error(outcome.error);
+        throw std::runtime_error((shown.empty() ? "" : "an error was shown in " + shown + "\n") + outcome.error);
+    if (!shown.empty())
+        throw std::runtime_error("an error was shown in " + shown);
 }
 
 } // namespace
@@ -50,6 +56,8 @@ void addExecCommand(CLI::App& app) {
         ->type_name("PATH")
         ->allow_extra_args(false);
     exec->add_option("FILE", options->file, "The script; - for standard input")->required();
+    exec->add_flag("--stop", options->stops,
+                   "End at the first command that shows an error, too, not only at one that fails");
     exec->callback([options] { execute(*options); });
 }
 

@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <limits>
 #include <stdexcept>
 
 namespace quarn {
@@ -102,6 +103,12 @@ std::size_t addRotation(const Track<HQuaternion>& track, const JointRest& rest, 
 }
 
 } // namespace
+
+int lastFrameOf(double seconds, double framesPerSecond) {
+    constexpr double hair = 1e-6; // a length that comes from single precision must not miss its last frame
+    const double last = std::floor(frameOf(seconds, framesPerSecond) + hair);
+    return static_cast<int>(std::clamp(last, 1.0, static_cast<double>(std::numeric_limits<int>::max())));
+}
 
 HQuaternion rotateOf(const HQuaternion& rotation, const JointRest& rest) {
     return rotation * rest.orient.conjugate();

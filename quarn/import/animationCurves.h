@@ -11,6 +11,9 @@ constexpr double frameOf(double seconds, double framesPerSecond) {
     return 1.0 + seconds * framesPerSecond;
 }
 
+/// The last frame that still shows something of an animation of that length.
+int lastFrameOf(double seconds, double framesPerSecond);
+
 /// A rotation of the file is R * JO in the scene: this R.
 HQuaternion rotateOf(const HQuaternion& rotation, const JointRest& rest);
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/import/importCharacter.h"
 
+#include "openquarn_app/SceneFile.h"
 #include "quarn/character/readCharacter.h"
 #include "quarn/character/rootsWarning.h"
 #include "quarn/import/animationCurves.h"
@@ -10,6 +11,7 @@
 #include "quarn/import/vertexMap.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/vertexMap.h"
 #include "storage/WholeFile.h"
 
 #include <algorithm>
@@ -70,7 +72,7 @@ public:
         if (animation != nullptr && !options_.noAnimation)
             report_.curves = addAnimation(*animation, rests, options_.framesPerSecond, scene);
         if (options_.neuralWarp)
-            connectWarp(nodes, options_.warp, posed.joints, scene);
+            connectWarp(nodes, settings(animation), posed.joints, scene);
         tellWhatThereIs(scene, posed, options_.noAnimation ? nullptr : animation);
         writeFiles(session, scene);
         return std::move(report_);
@@ -86,6 +88,24 @@ private:
             character_.metersPerUnit = *options_.metersPerUnit;
         if (!options_.limits.empty())
             limits_ = readLimits(options_.limits);
+        if (options_.neuralWarp)
+            requireSkin();
+    }
+
+    // a file of plain meshes, say: what it has, and what is missing
+    void requireSkin() const {
+        std::string meshes;
+        for (const CharacterMesh& mesh : character_.meshes) {
+            if (!mesh.bindings.empty() || mesh.parentJoint >= 0)
+                return;
+            meshes +=
+                (meshes.empty() ? "" : ", ") + mesh.name + " of " + std::to_string(mesh.points.size()) + " vertices";
+        }
+        throw std::runtime_error(options_.file.string() + " has meshes (" + meshes + "), " +
+                                 std::to_string(character_.joints.size()) + " joints, " +
+                                 std::to_string(character_.animations.size()) +
+                                 " animations, and no skin: --neural-warp needs a mesh that joints move. Bind it to a "
+                                 "skeleton in the program that it comes from, or import it without --neural-warp");
     }
 
     // what was said of the roots of the file is no longer so
@@ -95,6 +115,14 @@ private:
         reparent(character_, readParents(options_.parents), options_.framesPerSecond);
         if (std::string warning = rootsWarning(character_); !warning.empty())
             warnings.push_back(std::move(warning));
+    }
+
+    // the frames of the animation are those that there is something to export of
+    WarpSettings settings(const Animation* animation) const {
+        WarpSettings settings = options_.warp;
+        if (animation != nullptr && !options_.noAnimation)
+            settings.lastFrame = lastFrameOf(animation->seconds, options_.framesPerSecond);
+        return settings;
     }
 
     PosedJoints choose(const std::vector<JointRest>& rests, const Animation* animation) {
@@ -134,14 +162,22 @@ private:
 
     void writeFiles(SceneSession& session, const CharacterScene& scene) {
         const fs::path folder = options_.output.parent_path();
+        session.moveTo(folder);
         const auto set = [&](const char* attribute, const std::string& text) {
             setText(plugOf(scene.character, attribute), text);
         };
-        set("sourceFile", pathForScene(options_.file, folder));
-        set("vertexMapFile", mapFile(options_.output, "{mesh}", character_.meshes.size()).filename().string());
+        set("sourceFile", OpenQuarn::pathForScene(options_.file, folder));
+        set("vertexMapFile",
+            OpenQuarn::pathForScene(mapFile(options_.output, "{mesh}", character_.meshes.size()), folder));
         setNumber(plugOf(scene.character, "framesPerSecond"), options_.framesPerSecond);
-        for (std::size_t i = 0; i < report_.meshes.size(); ++i)
-            writeVertexMap(folder / report_.meshes[i].vertexMap, character_.meshes[i].joinedOf);
+        // maps before the scene, which knows them by their digests: a scene never goes with the maps of another
+        std::string digests;
+        for (std::size_t i = 0; i < report_.meshes.size(); ++i) {
+            const std::vector<std::uint32_t>& map = character_.meshes[i].joinedOf;
+            writeVertexMap(folder / report_.meshes[i].vertexMap, map);
+            digests += (i > 0 ? " " : "") + vertexMapDigest(std::vector<std::int32_t>(map.begin(), map.end()));
+        }
+        set("vertexMapDigests", digests);
         session.save(options_.output);
     }
 

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/commands.h"
+#include "quarn/console/UsageError.h"
 #include "quarn/import/importCharacter.h"
 
 #include <CLI/CLI.hpp>
 
 #include <iostream>
 #include <limits>
-#include <stdexcept>
 
 namespace quarn {
 namespace {
@@ -57,7 +57,7 @@ void addWarpFlags(CLI::App& command, Options& options) {
 
 void requireAbove0(const char* flag, double value) {
     if (!(value > 0.0 && value <= std::numeric_limits<double>::max()))
-        throw std::runtime_error(std::string(flag) + " must be a number above 0");
+        throw UsageError(std::string(flag) + " must be a number above 0");
 }
 
 void execute(const Options& options) {

@@ -20,14 +20,14 @@ double extent(const std::vector<HPoint>& points) {
 
 // whether two matrices bring points that are `size` away to the same place, up to rounding
 bool sameWithin(const HMatrix& a, const HMatrix& b, double size) {
-    double length = size;
+    double length = 0.0; // of what is added up for a point: sizes before and after may be in different units
     double largest = 0.0;
-    for (unsigned column = 0; column < 3; ++column) {
-        for (unsigned row = 0; row < 3; ++row)
-            largest = std::max(largest, std::abs(a(row, column) - b(row, column)) * size);
-        largest = std::max(largest, std::abs(a(3, column) - b(3, column)));
-        length = std::max({length, std::abs(a(3, column)), std::abs(b(3, column))});
-    }
+    for (unsigned column = 0; column < 3; ++column)
+        for (unsigned row = 0; row < 4; ++row) {
+            const double factor = row < 3 ? size : 1.0;
+            largest = std::max(largest, std::abs(a(row, column) - b(row, column)) * factor);
+            length = std::max({length, std::abs(a(row, column)) * factor, std::abs(b(row, column)) * factor});
+        }
     return largest <= rounding * length;
 }
 

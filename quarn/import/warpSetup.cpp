@@ -2,9 +2,9 @@
 #include "quarn/import/warpSetup.h"
 
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/training.h"
 
 #include <array>
-#include <stdexcept>
 
 namespace quarn {
 namespace {
@@ -37,6 +37,7 @@ void addGeometry(const WarpNodes& nodes, const WarpSettings& settings, const Sce
     setNumber(plug("export", ".deltaMode"), settings.deltaMode == "offset" ? 0.0 : 1.0);
     if (settings.smoothing)
         setNumber(plug("export", ".smoothingIterations"), *settings.smoothing);
+    setGoodTraining(plug("train", ""));
 }
 
 void addPoses(const HObject& poses, const PosedJoint& posed, const HObject& joint, const std::string& list) {
@@ -71,8 +72,6 @@ void connectWarp(const WarpNodes& nodes, const WarpSettings& settings, const std
     for (const SceneMesh& mesh : scene.meshes)
         if (!mesh.skin.isNull())
             addGeometry(nodes, settings, mesh, geometries++);
-    if (geometries == 0)
-        throw std::runtime_error("no mesh follows a joint, so that there is nothing to set --neural-warp up for");
     setText(plugOf(nodes.warp, "modelRoot"), settings.modelRoot);
     setText(plugOf(nodes.warp, "trainingDataRoot"), "data");
     for (std::size_t i = 0; i < joints.size(); ++i) {
@@ -85,6 +84,8 @@ void connectWarp(const WarpNodes& nodes, const WarpSettings& settings, const std
     }
     connect(plugOf(nodes.controls, "output"), plugOf(nodes.warp, "controlValues"));
     connect(plugOf(nodes.poses, "message"), plugOf(nodes.warp, "poseGenerator"));
+    if (settings.lastFrame)
+        setNumber(plugOf(nodes.warp, "exportEndFrame"), *settings.lastFrame);
     if (settings.samples)
         setNumber(plugOf(nodes.poses, "samples"), *settings.samples);
     if (settings.activationRate)

@@ -18,6 +18,7 @@ struct WarpSettings {
     std::optional<int> smoothing;
     std::optional<int> samples;
     std::optional<double> activationRate;
+    std::optional<int> lastFrame; ///< to be exported; the first is 1
 };
 
 struct WarpNodes {
@@ -32,7 +33,7 @@ struct WarpNodes {
 WarpNodes makeWarpNodes(const WarpSettings& settings);
 
 /// Connects them: every mesh that a skin moves becomes a geometry of the deformer, by rising index. Throws
-/// std::runtime_error, naming the node, and when no mesh has a skin. Thread: main.
+/// std::runtime_error, naming the node. Thread: main.
 void connectWarp(const WarpNodes& nodes, const WarpSettings& settings, const std::vector<PosedJoint>& joints,
                  const CharacterScene& scene);
 

@@ -11,6 +11,7 @@
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 
+#include <algorithm>
 #include <numeric>
 #include <stdexcept>
 
@@ -41,6 +42,8 @@ DeformedGeometry describe(const Warp& warp, const WarpGeometry& geometry) {
     report.modelName = textOf(warp.plug("models", geometry, "modelName"));
     report.modelDirectory = modelDirectory(warp, geometry).string();
     report.isModelActive = isModelActive(warp, geometry);
+    std::error_code error;
+    report.isModelThere = std::filesystem::is_directory(report.modelDirectory, error);
     return report;
 }
 
@@ -54,12 +57,22 @@ DeformerReport describe(const Warp& warp) {
     return report;
 }
 
-std::vector<std::string> missingFiles() {
+// nothing is missed of a deformer whose models are all off: before anything was trained there is no folder for them
+bool isMissed(const OpenQuarn::ExternalContent& file, const std::vector<DeformerReport>& deformers) {
+    if (file.role == OpenQuarn::filePatternRole)
+        return false;
+    return std::none_of(deformers.begin(), deformers.end(), [&](const DeformerReport& deformer) {
+        return deformer.name == file.node && std::none_of(deformer.geometries.begin(), deformer.geometries.end(),
+                                                          [](const auto& geometry) { return geometry.isModelActive; });
+    });
+}
+
+std::vector<std::string> missingFiles(const std::vector<DeformerReport>& deformers) {
     std::vector<std::string> missing;
     for (const OpenQuarn::ExternalContent& file : OpenQuarn::externalContent()) {
         const std::string& path = file.resolved.empty() ? file.unresolved : file.resolved;
         std::error_code error;
-        if (!path.empty() && !std::filesystem::exists(path, error))
+        if (!path.empty() && isMissed(file, deformers) && !std::filesystem::exists(path, error))
             missing.push_back(file.node + ": " + path);
     }
     return missing;
@@ -72,7 +85,8 @@ std::string geometryLine(const DeformedGeometry& geometry) {
                        " affected, " + std::to_string(facts.controls) + " controls, ";
     if (geometry.modelName.empty())
         return line + "no model\n";
-    return line + "model " + geometry.modelName + (geometry.isModelActive ? " On\n" : " Off\n");
+    return line + "model " + geometry.modelName + (geometry.isModelActive ? " On" : " Off") +
+           (geometry.isModelThere ? "\n" : ", not there: training makes " + geometry.modelDirectory + "\n");
 }
 
 void writeCount(JsonWriter& json, const char* key, std::int64_t count) {
@@ -90,6 +104,7 @@ void writeGeometry(JsonWriter& json, const DeformedGeometry& geometry) {
     writeText(json, "modelName", geometry.modelName);
     writeText(json, "modelDirectory", geometry.modelDirectory);
     writeBool(json, "modelActive", geometry.isModelActive);
+    writeBool(json, "modelThere", geometry.isModelThere);
     json.EndObject();
 }
 
@@ -121,7 +136,7 @@ SceneReport describeScene() {
     report.metersPerUnit = metersPerUnit();
     for (const HObject& node : nodesOfType("neuralWarp"))
         report.deformers.push_back(describe(Warp::find(nodeName(node))));
-    report.missingFiles = missingFiles();
+    report.missingFiles = missingFiles(report.deformers);
     return report;
 }
 

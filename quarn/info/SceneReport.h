@@ -19,6 +19,7 @@ struct DeformedGeometry {
     std::string modelName;
     std::string modelDirectory; ///< empty while the model has no name
     bool isModelActive = false;
+    bool isModelThere = false; ///< its directory exists
 };
 
 struct DeformerReport {

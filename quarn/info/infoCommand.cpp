@@ -5,6 +5,7 @@
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/SceneFile.h"
 #include "quarn/console/StdoutAside.h"
+#include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/files/npyArray.h"
@@ -155,7 +156,8 @@ void showDevices(bool asJson) {
 }
 
 void showScene(const Options& options) {
-    const SceneSummary summary = OpenQuarn::readSummary(options.path);
+    requireNoCharacter(options.path);
+    const SceneSummary summary = OpenQuarn::readSummary(absolutePath(options.path));
     if (!summary.outcome)
         throw std::runtime_error(summary.outcome.error);
     const OpenedScene opened = openedScene(options.path);
@@ -216,11 +218,11 @@ void showInfo(const Options& options) {
     if (options.devices)
         return showDevices(options.json);
     if (options.path.empty())
-        throw std::runtime_error("quarn info needs the path of a scene file or a model directory, or --devices");
+        throw UsageError("quarn info needs the path of a scene file or a model directory, or --devices");
     if (fs::is_directory(options.path))
         return showModel(options);
     if (!options.scene.empty() || !options.controls.empty())
-        throw std::runtime_error(options.path.string() + " is no model directory, and --scene and --run are for one");
+        throw UsageError(options.path.string() + " is no model directory, and --scene and --run are for one");
     showScene(options);
 }
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/play/FrameFiles.h"
 
+#include "quarn/console/UsageError.h"
 #include "quarn/play/meshFiles.h"
 #include "rig/NpyFile.h"
 
@@ -32,14 +33,12 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
     if (isCache(pattern))
         return;
     if (!isMeshFile(pattern))
-        throw std::runtime_error(
-            "\"" + pattern.string() +
-            "\" is no file that is written here: its name ends in .npy, .obj, .ply, .gltf or .glb");
+        throw UsageError("\"" + pattern.string() +
+                         "\" is no file that is written here: its name ends in .npy, .obj, .ply, .gltf or .glb");
     if (frames.count() > 1 && pattern.filename().string().find('#') == std::string::npos)
-        throw std::runtime_error("\"" + pattern.string() + "\" would be written for each of " +
-                                 std::to_string(frames.count()) +
-                                 " frames: put #### where the number of the frame goes, as in \"" +
-                                 pattern.stem().string() + ".####" + pattern.extension().string() + "\"");
+        throw UsageError("\"" + pattern.string() + "\" would be written for each of " + std::to_string(frames.count()) +
+                         " frames: put #### where the number of the frame goes, as in \"" + pattern.stem().string() +
+                         ".####" + pattern.extension().string() + "\"");
 }
 
 FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, VertexOrder order)

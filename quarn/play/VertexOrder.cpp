@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/play/VertexOrder.h"
 
-#include "quarn/files/npyArray.h"
 #include "quarn/scene/vertexMap.h"
 
 #include <stdexcept>
@@ -21,7 +20,7 @@ VertexOrder::VertexOrder(std::vector<std::int32_t> sceneVertexOf, std::size_t sc
 
 VertexOrder VertexOrder::ofFile(const std::string& meshName, std::size_t sceneVertices) {
     const std::string path = vertexMapFile(meshName).string();
-    std::vector<std::int32_t> map = readIntegers(path);
+    std::vector<std::int32_t> map = readVertexMap(meshName);
     try {
         return {std::move(map), sceneVertices};
     } catch (const std::runtime_error& error) {

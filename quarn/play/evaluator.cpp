@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/play/evaluator.h"
 
+#include "quarn/console/UsageError.h"
+
 #include "openquarn_app/Gpu.h"
 #include "openquarn_app/Plugins.h"
 
@@ -21,7 +23,7 @@ bool hasGpuDeformer(const std::string& plugin) {
 void chooseEvaluator(const std::string& evaluator, const std::string& device) {
     const bool isGpu = evaluator == "gpu";
     if (!isGpu && !device.empty())
-        throw std::runtime_error("--device " + device + " goes with --evaluator gpu");
+        throw UsageError("--device " + device + " goes with --evaluator gpu");
     if (isGpu) {
         const std::vector<std::string> plugins = OpenQuarn::loadedPlugins();
         if (std::none_of(plugins.begin(), plugins.end(), hasGpuDeformer))

@@ -3,6 +3,7 @@
 
 #include "quarn/console/Console.h"
 #include "quarn/console/StdoutAside.h"
+#include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/play/evaluator.h"
 #include "quarn/play/playReport.h"
@@ -109,8 +110,8 @@ void bake(Options& options) {
     watchForInterrupt();
     options.output = absolutePath(options.output);
     if (options.output.extension() != ".npy")
-        throw std::runtime_error("\"" + options.output.string() +
-                                 "\" is no point cache: its name ends in .npy. quarn play writes meshes");
+        throw UsageError("\"" + options.output.string() +
+                         "\" is no point cache: its name ends in .npy. quarn play writes meshes");
     const StdoutAside aside;
     SceneSession session(options.scene);
     const PlayPlan plan = planFor(options);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/commands.h"
 
+#include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/pose/keyPoses.h"
@@ -103,11 +104,11 @@ void sample(SceneSession& session, Options& options) {
     options.sampling.fromLimits = options.from != "animation";
     options.sampling.fromAnimation = options.from != "limits";
     if (!options.sampling.fromAnimation && !options.sampling.frames.empty())
-        throw std::runtime_error("--frames chooses frames of the animation: add --from animation or --from both");
+        throw UsageError("--frames chooses frames of the animation: add --from animation or --from both");
     if (!options.sampling.fromLimits && (options.sampling.samples || options.sampling.activationRate))
-        throw std::runtime_error("--samples and --activation-rate are for poses from limits: use --from both");
+        throw UsageError("--samples and --activation-rate are for poses from limits: use --from both");
     if (!std::isfinite(options.sampling.tolerance) || options.sampling.tolerance < 0.0)
-        throw std::runtime_error("--tolerance is a finite number from 0 on");
+        throw UsageError("--tolerance is a finite number from 0 on");
     const SampleReport report = samplePoses(Warp::find(options.deformer), options.sampling, options.console);
     session.save(options.output);
     print(report, options);

@@ -1,15 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/commands.h"
 
+#include "openquarn_app/SceneFile.h"
+#include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/console/numberText.h"
-#include "quarn/files/npyArray.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/pose/targetCache.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/training.h"
 #include "quarn/scene/vertexMap.h"
 #include "rig/NpyFile.h"
 
@@ -17,6 +19,7 @@
 
 #include <cmath>
 #include <iostream>
+#include <limits>
 #include <stdexcept>
 
 namespace quarn {
@@ -55,7 +58,7 @@ fs::path pathOfConverted(const Options& options, const WarpGeometry& geometry) {
 
 Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpGeometry& geometry,
                    std::size_t vertices) {
-    const std::vector<std::int32_t> map = readIntegers(vertexMapFile(geometry.name));
+    const std::vector<std::int32_t> map = readVertexMap(geometry.name);
     requireFit(map, file.vertexCount(), vertices);
     Cache cache{pathOfConverted(options, geometry), file.frameCount(), true};
     const double apart = writeInSceneOrder(options.cache, cache.path, map, vertices, options.console);
@@ -78,6 +81,20 @@ Cache fittingCache(const Options& options, const WarpGeometry& geometry) {
                                  " vertices, and " + geometry.name + " has " + std::to_string(vertices) +
                                  "; --order file takes a cache with the vertices of the character's file");
     return {options.cache, file.frameCount(), false};
+}
+
+// while nobody has said which frames to export: those that the cache has
+void exportFramesOf(const Warp& warp, double startFrame, std::size_t frames) {
+    const HPlug first = warp.plug("exportStartFrame");
+    const HPlug last = warp.plug("exportEndFrame");
+    constexpr int unsetFirst = 1, unsetLast = 1000; // the node's defaults
+    const double lastOfCache = startFrame + static_cast<double>(frames) - 1.0;
+    const auto isFrame = [](double frame) { return std::abs(frame) <= std::numeric_limits<int>::max(); };
+    if (wholeNumberOf(first) != unsetFirst || wholeNumberOf(last) != unsetLast || first.isDestination() ||
+        last.isDestination() || !isFrame(startFrame) || !isFrame(lastOfCache))
+        return;
+    setNumber(first, std::ceil(startFrame));
+    setNumber(last, std::max(std::ceil(startFrame), std::floor(lastOfCache)));
 }
 
 void warnOfShortCache(const Options& options, const Warp& warp, double startFrame, std::size_t frames) {
@@ -113,15 +130,16 @@ void target(Options& options) {
     options.cache = absolutePath(options.cache);
     options.output = absolutePath(options.output.empty() ? options.scene.scene : options.output);
     if (options.startFrame && !std::isfinite(*options.startFrame))
-        throw std::runtime_error("--start-frame is a finite number");
+        throw UsageError("--start-frame is a finite number");
     SceneSession session(options.scene);
     const Warp warp = Warp::find(options.deformer);
     const WarpGeometry& geometry = warp.geometry(options.geometry);
     const Cache cache = fittingCache(options, geometry);
-    if (const fs::path folder = options.output.parent_path(); fs::is_directory(folder))
-        session.moveTo(folder); // before the cache is named: its path counts from there
-    const std::string named = pathForScene(cache.path, options.output.parent_path());
+    session.moveTo(options.output.parent_path()); // before the cache is named: its path counts from there
+    const std::string named = OpenQuarn::pathForScene(cache.path, options.output.parent_path());
     const TargetReport report = connectTarget(warp, geometry, named, options.startFrame);
+    setGoodTraining(warp.plug("train[" + std::to_string(geometry.index) + "]"));
+    exportFramesOf(warp, report.startFrame, cache.frames);
     session.save(options.output);
     warnOfShortCache(options, warp, report.startFrame, cache.frames);
     if (options.console.json)

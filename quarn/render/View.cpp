@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/View.h"
 
+#include "quarn/console/UsageError.h"
+
 #include <array>
 #include <charconv>
 #include <cmath>
@@ -49,8 +51,8 @@ Angles anglesOf(const std::string& direction) {
         if (azimuth && elevation && std::abs(*elevation) <= 90.0)
             return {*azimuth, *elevation};
     }
-    throw std::runtime_error("\"" + direction + "\" is no view: write front, back, left, right, top, bottom, or " +
-                             "AZIMUTH,ELEVATION in degrees, as in 30,15, with an elevation from -90 to 90");
+    throw UsageError("\"" + direction + "\" is no view: write front, back, left, right, top, bottom, or " +
+                     "AZIMUTH,ELEVATION in degrees, as in 30,15, with an elevation from -90 to 90");
 }
 
 // the view of the front
@@ -61,7 +63,7 @@ View frontView(const std::string& up) {
         return {{1.0, 0.0, 0.0}, {0.0, 0.0, 1.0}, {0.0, -1.0, 0.0}};
     if (up == "x")
         return {{0.0, -1.0, 0.0}, {1.0, 0.0, 0.0}, {0.0, 0.0, 1.0}};
-    throw std::runtime_error("\"" + up + "\" is no axis that can point up: write x, y or z");
+    throw UsageError("\"" + up + "\" is no axis that can point up: write x, y or z");
 }
 
 } // namespace

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/pictureNames.h"
 
+#include "quarn/console/UsageError.h"
 #include "storage/WholeFile.h"
 
 #include <algorithm>
@@ -42,7 +43,7 @@ void checkPictureName(const fs::path& pattern) {
     std::transform(ending.begin(), ending.end(), ending.begin(),
                    [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
     if (ending != ".png" && !storage::isWrittenThrough(pattern))
-        throw std::runtime_error(pattern.string() + " is no name of a picture: it must end in .png");
+        throw UsageError(pattern.string() + " is no name of a picture: it must end in .png");
     storage::WholeFile::requirePossible(pattern);
 }
 

@@ -3,6 +3,7 @@
 
 #include "quarn/console/Console.h"
 #include "quarn/console/StdoutAside.h"
+#include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/render/drawPanel.h"
@@ -93,14 +94,13 @@ void setSize(Layout& layout, const std::string& text, std::size_t panels) {
     const bool hasHeight = width.ec == std::errc() && width.ptr != end && *width.ptr == 'x';
     const auto height = std::from_chars(hasHeight ? width.ptr + 1 : end, end, layout.height);
     if (!hasHeight || height.ec != std::errc() || height.ptr != end)
-        throw std::runtime_error("\"" + text + "\" is no size of a panel: write WIDTHxHEIGHT, as in 480x480");
+        throw UsageError("\"" + text + "\" is no size of a panel: write WIDTHxHEIGHT, as in 480x480");
     const auto [smaller, larger] = std::minmax(layout.width, layout.height);
     if (smaller < smallestSide || larger > largestSide ||
         static_cast<std::size_t>(layout.width) * panels > static_cast<std::size_t>(largestSide))
-        throw std::runtime_error("a picture of " + std::to_string(panels) + " panel(s) of " + text +
-                                 " pixels cannot be made: a panel's sides are at least " +
-                                 std::to_string(smallestSide) + ", the picture's at most " +
-                                 std::to_string(largestSide));
+        throw UsageError("a picture of " + std::to_string(panels) + " panel(s) of " + text +
+                         " pixels cannot be made: a panel's sides are at least " + std::to_string(smallestSide) +
+                         ", the picture's at most " + std::to_string(largestSide));
 }
 
 std::vector<Panel> panelsOf(const Options& options) {

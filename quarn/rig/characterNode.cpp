@@ -3,6 +3,8 @@
 
 #include "rig/AttributeMaker.h"
 
+#include "openquarn/HExternalContentInfoTable.h"
+
 #include <filesystem>
 #include <string>
 #include <string_view>
@@ -17,6 +19,7 @@ HObject characterNode::metersPerUnit;
 HObject characterNode::framesPerSecond;
 HObject characterNode::sourceFile;
 HObject characterNode::vertexMapFile;
+HObject characterNode::vertexMapDigests;
 
 characterNode::characterNode() = default;
 characterNode::~characterNode() = default;
@@ -33,7 +36,8 @@ HStatus characterNode::initialize() {
     vertexMapFile = make.data("vertexMapFile", "vmf", HFnData::kString);
     for (const HObject& file : {sourceFile, vertexMapFile})
         HFnTypedAttribute(file).setUsedAsFilename(true);
-    make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile});
+    vertexMapDigests = make.data("vertexMapDigests", "vmd", HFnData::kString);
+    make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile, vertexMapDigests});
     return make.status();
 }
 
@@ -78,7 +82,10 @@ HStringArray characterNode::getFilesToArchive(bool shortName, bool unresolvedNam
 
 void characterNode::getExternalContent(HExternalContentInfoTable& table) const {
     addExternalContentForFileAttr(table, sourceFile);
-    if (!isPattern(HPlug(thisHObject(), vertexMapFile).asString().asStdString())) // which is no file
+    const HString map = HPlug(thisHObject(), vertexMapFile).asString();
+    if (isPattern(map.asStdString()))
+        table.addUnresolvedEntry("vertexMapFile", map, name(), "file pattern");
+    else
         addExternalContentForFileAttr(table, vertexMapFile);
     HPxNode::getExternalContent(table);
 }

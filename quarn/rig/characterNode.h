@@ -31,6 +31,7 @@ public:
     static HObject framesPerSecond;
     static HObject sourceFile;
     static HObject vertexMapFile;
+    static HObject vertexMapDigests;
 };
 
 } // namespace rig

@@ -171,7 +171,6 @@ HStatus pointCacheNode::moveToCache(HDataBlock& block, HObject& mesh) {
 void pointCacheNode::openFile(const HString& rawPath) {
     HFileObject resolver;
     resolver.setRawFullName(rawPath);
-    resolver.setResolveMethod(HFileObject::kDefault | HFileObject::kSceneFolder);
     const std::string path = resolver.resolvedFullName().asStdString();
     if (file_ && file_->path() == path && identityOf(path) == file_->identity())
         return;

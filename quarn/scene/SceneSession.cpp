@@ -3,6 +3,7 @@
 
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/SceneFile.h"
+#include "openquarn_app/Workspace.h"
 #include "rig/registration.h"
 
 #include <CLI/CLI.hpp>
@@ -35,6 +36,11 @@ std::vector<fs::path> placesOfDeformer() {
     return places;
 }
 
+void must(const OpenQuarn::FileOutcome& outcome) {
+    if (!outcome)
+        throw std::runtime_error(outcome.error);
+}
+
 std::optional<fs::path> findDeformer() {
     for (const fs::path& place : placesOfDeformer())
         if (fs::exists(place))
@@ -52,12 +58,6 @@ struct SceneSession::Threads {
 
 fs::path absolutePath(const fs::path& path) {
     return path.empty() ? path : (startFolder() / path).lexically_normal();
-}
-
-std::string pathForScene(const fs::path& file, const fs::path& folder) {
-    const fs::path relative = file.lexically_relative(folder);
-    const bool outside = relative.empty() || *relative.begin() == "..";
-    return (outside ? file : relative).generic_string();
 }
 
 fs::path deformerPlugin() {
@@ -88,9 +88,27 @@ void addSceneOptions(CLI::App& command, SceneOptions& options) {
         ->capture_default_str();
 }
 
+SceneFolder::SceneFolder()
+    : before_(fs::current_path()) {
+    OpenQuarn::Workspace::setCallersFolder(startFolder());
+    OpenQuarn::setSceneFolderSink([](const fs::path& folder) {
+        std::error_code gone; // the caller's folder may have been removed: then there is nowhere to go back to
+        if (folder.empty())
+            fs::current_path(startFolder(), gone);
+        else
+            fs::current_path(folder);
+    });
+}
+
+SceneFolder::~SceneFolder() {
+    OpenQuarn::setSceneFolderSink({});
+    OpenQuarn::Workspace::setCallersFolder({});
+    std::error_code gone;
+    fs::current_path(before_, gone);
+}
+
 SceneSession::SceneSession(const std::vector<std::string>& plugins, int threads)
-    : threads_(threads > 0 ? std::make_unique<Threads>(threads) : nullptr)
-    , folderBefore_(fs::current_path()) {
+    : threads_(threads > 0 ? std::make_unique<Threads>(threads) : nullptr) {
     loadPlugins(plugins, true);
 }
 
@@ -99,41 +117,26 @@ SceneSession::SceneSession(const SceneOptions& options)
     open(options.scene);
 }
 
-SceneSession::~SceneSession() {
-    std::error_code gone; // the folder of before may have been removed: then there is nowhere to go back to
-    fs::current_path(folderBefore_, gone);
+SceneSession::~SceneSession() = default;
+
+void requireNoCharacter(const fs::path& scene) {
+    for (const char* ending : {".glb", ".gltf", ".fbx", ".dae"})
+        if (scene.extension() == ending)
+            throw std::runtime_error(scene.string() + " is a character, not a scene: quarn import " + scene.string() +
+                                     " -o " + scene.stem().string() + ".json makes a scene of it");
 }
 
 void SceneSession::open(const fs::path& scene) {
-    const fs::path path = absolutePath(scene);
-    const OpenQuarn::FileOutcome outcome = OpenQuarn::openScene(path);
-    if (!outcome)
-        throw std::runtime_error(outcome.error);
-    sceneFolder_ = path.parent_path();
-    fs::current_path(sceneFolder_);
+    requireNoCharacter(scene);
+    must(OpenQuarn::openScene(absolutePath(scene)));
 }
 
 void SceneSession::moveTo(const fs::path& folder) {
-    if (sceneFolder_.empty() || folder == sceneFolder_)
-        return;
-    std::vector<OpenQuarn::Relocation> moved;
-    for (const OpenQuarn::ExternalContent& content : OpenQuarn::externalContent()) {
-        const fs::path file = (sceneFolder_ / content.unresolved).lexically_normal();
-        if (!content.unresolved.empty() && fs::path(content.unresolved).is_relative() && fs::exists(file))
-            moved.push_back({content.node, content.key, pathForScene(file, folder)});
-    }
-    if (const OpenQuarn::FileOutcome outcome = OpenQuarn::relocate(moved); !outcome)
-        throw std::runtime_error(outcome.error);
-    fs::current_path(folder);
-    sceneFolder_ = folder;
+    must(OpenQuarn::moveScene(absolutePath(folder)));
 }
 
 void SceneSession::save(const fs::path& scene) {
-    if (const fs::path folder = absolutePath(scene).parent_path(); fs::is_directory(folder))
-        moveTo(folder); // where there is no folder, saving says so
-    const OpenQuarn::FileOutcome outcome = OpenQuarn::saveScene(absolutePath(scene));
-    if (!outcome)
-        throw std::runtime_error(outcome.error);
+    must(OpenQuarn::saveScene(absolutePath(scene)));
 }
 
 } // namespace quarn

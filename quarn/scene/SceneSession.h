@@ -34,6 +34,20 @@ std::filesystem::path deformerPlugin();
 /// Thread: main.
 void loadPlugins(const std::vector<std::string>& further, bool deformerRequired);
 
+/// While it lives, this process is where the scene is: its current directory is the folder of the scene's file, and the
+/// caller's folder while there is none. What is relative in a scene counts from there, so that a folder can be moved;
+/// the deformer, for one, opens its modelRoot as the system does. One at a time. Thread: main.
+class SceneFolder {
+public:
+    SceneFolder();
+    ~SceneFolder();
+    SceneFolder(const SceneFolder&) = delete;
+    SceneFolder& operator=(const SceneFolder&) = delete;
+
+private:
+    std::filesystem::path before_;
+};
+
 /// An open host with the rig nodes, the deformer and further plug-ins; one at a time in a process. Errors are
 /// std::runtime_error with the sentence for the user. Thread: main.
 class SceneSession {
@@ -46,29 +60,27 @@ public:
     SceneSession(const SceneSession&) = delete;
     SceneSession& operator=(const SceneSession&) = delete;
 
-    /// Opens a scene, and goes to its folder: what is relative in a scene counts from there, so that a folder can be
-    /// moved. Paths of the command line must have been made absolute before (`absolutePath`).
+    /// `scene` counts from the caller's folder.
     void open(const std::filesystem::path& scene);
     /// Moves the scene to the folder of that path first.
     void save(const std::filesystem::path& scene);
-    /// For a scene that has been opened and is to be saved in another folder: goes there, and has the nodes name the
-    /// files that lie in or below the former folder so that they find them. `folder` absolute; the same one is fine.
+    /// For a scene that is to be saved in another folder, and gets names of files before: from now on they count from
+    /// there, and those that it has are named anew (OpenQuarn::moveScene). `folder` counts from the caller's folder;
+    /// one that does not exist is left to save().
     void moveTo(const std::filesystem::path& folder);
     OpenQuarn::Session& host() { return session_; }
 
 private:
     struct Threads;
+    SceneFolder folder_;
     OpenQuarn::Session session_;
     std::unique_ptr<Threads> threads_;
-    std::filesystem::path folderBefore_;
-    std::filesystem::path sceneFolder_; ///< empty until a scene is opened
 };
 
-/// As it is seen from the folder in which the program was started, whatever SceneSession::open() did since.
-std::filesystem::path absolutePath(const std::filesystem::path& path);
+/// Throws std::runtime_error, which says what to do, when the path ends as that of a character's file does.
+void requireNoCharacter(const std::filesystem::path& scene);
 
-/// How a scene in `folder` (absolute) names a file: relative when the file lies in that folder or below it, so that the
-/// folder can be moved; absolute otherwise.
-std::string pathForScene(const std::filesystem::path& file, const std::filesystem::path& folder);
+/// As it is seen from the folder in which the program was started, the caller's, whatever scene was opened since.
+std::filesystem::path absolutePath(const std::filesystem::path& path);
 
 } // namespace quarn

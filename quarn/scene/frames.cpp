@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/frames.h"
 
+#include "quarn/console/UsageError.h"
+
 #include <charconv>
 #include <optional>
 #include <stdexcept>
@@ -36,10 +38,10 @@ FrameRange frameRange(const std::string& text) {
     const std::optional<int> last = rest.empty() ? first : takeNumberAfter('-', rest);
     const std::optional<int> step = rest.empty() ? 1 : takeNumberAfter('x', rest);
     if (!first || !last || !step || !rest.empty())
-        throw std::runtime_error("\"" + text + "\" is no range of frames: write 5, 1-100 or 1-100x5");
+        throw UsageError("\"" + text + "\" is no range of frames: write 5, 1-100 or 1-100x5");
     if (*last < *first || *step < 1)
-        throw std::runtime_error(
-            "\"" + text + "\" is no range of frames: the last is not before the first, and steps are at least 1");
+        throw UsageError("\"" + text +
+                         "\" is no range of frames: the last is not before the first, and steps are at least 1");
     return {*first, *last, *step};
 }
 

@@ -64,13 +64,15 @@ ModelInUse takeTheOnlyOne(const Warp& warp, const WarpGeometry& geometry) {
 } // namespace
 
 void addModelOptions(CLI::App& command, ModelOption& option) {
-    CLI::Option* name = command.add_option("--model", option.name, "Use this model for this run, switched on");
+    CLI::Option* name = command.add_option(
+        "--model", option.name, "Use the model NAME.nwrp of the deformer's modelRoot for this run, switched on");
     name->type_name("NAME");
     command.add_flag("--no-model", option.hasNone, "Show the mesh as it comes into the deformer")->excludes(name);
 }
 
 void useModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name) {
     setText(warp.plug("models", geometry, "modelName"), name);
+    requireModelDirectory(warp, geometry);
     setNumber(warp.plug("models", geometry, "modelActive"), 1.0);
 }
 

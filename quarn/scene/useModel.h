@@ -29,8 +29,8 @@ struct ModelInUse {
     std::string note; ///< a sentence for the user, where the mesh is another one than the scene or its user may think
 };
 
-/// Has the deformer apply the model `name` of its modelRoot to a geometry. Throws std::runtime_error when the plugs
-/// cannot be set, as when something is connected into them. Thread: main.
+/// Has the deformer apply the model `name` of its modelRoot to a geometry. Throws std::runtime_error when there is
+/// no such model, and when the plugs cannot be set, as when something is connected into them. Thread: main.
 void useModel(const Warp& warp, const WarpGeometry& geometry, const std::string& name);
 
 /// Does what the option says to a geometry. Where it says nothing and the scene's model is Off: takes the only model

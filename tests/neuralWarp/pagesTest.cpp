@@ -4,6 +4,8 @@
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn_app/Commands.h"
+#include "openquarn_app/SceneFile.h"
+#include "openquarn_app/Workspace.h"
 
 #include <fstream>
 #include <sstream>
@@ -46,16 +48,23 @@ double valueOf(const std::string& plug) {
     return printed == "true" ? 1.0 : numberIn(printed);
 }
 
-/// Runs examples in a copy of the repository's examples.
+/// Runs examples in a copy of the repository's examples, from the folder of whatever scene is open, as quarn does.
 class Pages : public WarpTest {
 protected:
     Pages() {
         fs::copy(sources / "examples", folder.path() / "examples", fs::copy_options::recursive);
+        OpenQuarn::Workspace::setCallersFolder(folder.path());
+        OpenQuarn::setSceneFolderSink(
+            [this](const fs::path& scene) { fs::current_path(scene.empty() ? folder.path() : scene); });
         fs::current_path(folder.path());
     }
 
 public:
-    ~Pages() override { fs::current_path(before_); }
+    ~Pages() override {
+        OpenQuarn::setSceneFolderSink({});
+        OpenQuarn::Workspace::setCallersFolder({});
+        fs::current_path(before_);
+    }
 
 protected:
     /// One line of an example. Behind it may stand "# gives RESULT", "# gives N numbers", "# shows MESSAGE", or, for a

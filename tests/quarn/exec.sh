@@ -43,11 +43,34 @@ expect 0 '\n  weights \(wts\): array of float = 1, inherited; affects outputGeom
 expect 0 '^\[(.|\n)*"name": "inMesh",(.|\n)*"attribute": "outMesh",(.|\n)*\]\n$' '' listAttr --json mesh
 expect 1 '' "quarn: there is no node type 'minimalRemap'" listAttr minimalRemap
 
-# neither of these is a call: not 0, and the answer is on standard error
+# errors that are shown: the script goes on, or ends with --stop; try expects one
+printf 'print a\ncreateNode minimalRemap -name r; disconnectAttr r.nope r.nope\n' >"$work/in"
+expect 1 'r\n' 'info: a\nquarn: standard input, line 2: disconnectAttr' exec --plugin "$plugin" -
+printf 'file -open examples/wave/wave.json; setAttr wave.models[0].modelName wade\n%s\n%s\n' \
+  'meshInfo wave.outputGeom[0]' 'print on' >"$work/in"
+shown='quarn: an error was shown in standard input, line 2: meshInfo: \[NEURAL WARP\] .*models/wade\.nwrp\n$'
+expect 1 '369 vertices' "info: on\n$shown" exec -
+expect 1 '369 vertices' "wade\.nwrp\n$shown" exec --stop -
+sed -i 's/^mesh/try mesh/' "$work/in"
+expect 0 'models/wade\.nwrp\n$' 'info: on\n$' exec -
+echo 'try print a' >"$work/in"
+expect 1 '' "line 1: try: no error came of 'print'" exec -
+
+# a scene that cannot be read is said once
+for command in info play 'render -o x.png'; do
+  # shellcheck disable=SC2086 # words
+  expect 1 '' '^quarn: .*nothing\.json: does not exist\n$' $command nothing.json
+done
+expect 1 '' 'quarn import arm\.glb -o arm\.json makes a scene of it' info arm.glb
+expect 2 '' 'there is no command "dance"; there are import, ' dance
+
+# neither of these is a call: 2, and the answer is on standard error
 for arguments in "" "exec" "dance" "exec --plugin" "listAttr"; do
   # shellcheck disable=SC2086 # words
-  if "$quarn" $arguments >"$work/out" 2>"$work/err" || [[ -s $work/out || ! -s $work/err ]]; then
-    printf 'quarn %s: no failure, or not on standard error alone\n' "$arguments"
+  status=0
+  "$quarn" $arguments >"$work/out" 2>"$work/err" || status=$?
+  if [[ $status != 2 || -s $work/out || ! -s $work/err ]]; then
+    printf 'quarn %s: status %s, or not on standard error alone\n' "$arguments" "$status"
     bad=1
   fi
 done

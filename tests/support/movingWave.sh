@@ -4,7 +4,6 @@
 moving_wave() {
   local quarn=$1 folder=$2
   cp -r examples/wave/models examples/wave/wave.json "$folder"
-  sed -i 's#"examples/wave/models"#"models"#' "$folder/wave.json"
   {
     cat <<'SCRIPT'
 file -open wave.json

@@ -12,11 +12,11 @@ public:
     enum ResolveMethod : int {
         kNormalize = 1,    ///< Takes "." , ".." and doubled separators out of the result, by text alone.
         kExpand = 2,       ///< Replaces a leading "~" and variables first; see expandedFullName().
-        kWorkspace = 4,    ///< Looks for a relative path below the root directory of the workspace,
-        kSceneFolder = 8,  ///< then in the folder of the current scene file, when there is one,
+        kSceneFolder = 4,  ///< Looks for a relative path in the folder of the current scene file; while the scene has
+                           ///< no file, below the root directory of the workspace,
         kAsWritten = 16,   ///< then as it stands: relative to the process's current directory.
-        kKeepMissing = 32, ///< When nothing exists, gives the path below the workspace root; otherwise gives "".
-        kDefault = kExpand | kWorkspace | kAsWritten | kKeepMissing, ///< 54
+        kKeepMissing = 32, ///< When nothing exists, gives the path as kSceneFolder takes it; otherwise gives "".
+        kDefault = kExpand | kSceneFolder | kAsWritten | kKeepMissing, ///< 54
     };
 
     /// The path as it is written; copied. Need not exist, may be empty. [any]

@@ -86,7 +86,6 @@ FileOutcome relocate(const std::vector<Relocation>& table) {
     const Graph* graph = Graph::current();
     if (!graph) {
         outcome.error = "there is no scene: no session has been started";
-        showMessage(Severity::error, outcome.error);
         return outcome;
     }
     outcome.ok = true;

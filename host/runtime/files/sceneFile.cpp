@@ -2,10 +2,12 @@
 #include "openquarn_app/SceneFile.h"
 
 #include "core/threads.h"
+#include "files/Rebasing.h"
 #include "files/json.h"
 #include "files/sceneText.h"
 #include "graph/baseNodes.h"
 #include "openquarn_app/Messages.h"
+#include "openquarn_app/Workspace.h"
 #include "services/SceneFileState.h"
 #include "storage/FileError.h"
 #include "storage/WholeFile.h"
@@ -37,8 +39,6 @@ FileOutcome fileOperation(const std::string& fileName, Work&& work) {
         outcome.warnings.push_back(fileName + ": " + text);
         showMessage(Severity::warning, outcome.warnings.back());
     }
-    if (!outcome.ok)
-        showMessage(Severity::error, outcome.error);
     return outcome;
 }
 
@@ -93,7 +93,7 @@ FileOutcome openScene(const std::filesystem::path& path) {
     return fileOperation(path.string(), [&](Warnings& warnings) {
         rapidjson::Document document;
         Graph& graph = currentGraph();
-        parseScene(document, storage::readWholeFile(path, largestScene));
+        parseScene(document, storage::readWholeFile(Workspace::callersPath(path), largestScene));
         setCurrentSceneFile(path.string()); // nodes look for files beside it
         readWhole(document, graph, warnings);
     });
@@ -102,9 +102,21 @@ FileOutcome openScene(const std::filesystem::path& path) {
 FileOutcome saveScene(const std::filesystem::path& path) {
     requireMain("saveScene");
     return fileOperation(path.string(), [&](Warnings& warnings) {
-        storage::writeWhole(path, writeScene(currentGraph(), warnings));
+        const std::filesystem::path file = Workspace::callersPath(path);
+        Rebasing rebasing(folderOfScene(file.string()), warnings);
+        try {
+            storage::writeWhole(file, writeScene(currentGraph(), warnings));
+        } catch (...) {
+            rebasing.undo();
+            throw;
+        }
         setCurrentSceneFile(path.string());
     });
+}
+
+FileOutcome moveScene(const std::filesystem::path& folder) {
+    requireMain("moveScene");
+    return fileOperation(folder.string(), [&](Warnings& warnings) { Rebasing(folder, warnings); });
 }
 
 FileOutcome sceneFromText(const std::string& text, const std::string& fileName) {
@@ -129,7 +141,7 @@ std::string currentFile() {
 SceneSummary readSummary(const std::filesystem::path& path) {
     SceneSummary summary;
     summary.outcome = fileOperation(path.string(), [&](Warnings&) {
-        const std::string text = storage::readWholeFile(path, largestScene);
+        const std::string text = storage::readWholeFile(Workspace::callersPath(path), largestScene);
         rapidjson::Document document;
         parseScene(document, text);
         registerBaseNodes();

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn_app/Messages.h"
 
+#include "messages/ShownErrors.h"
+
 #include <cstdio>
 #include <mutex>
 
@@ -52,6 +54,8 @@ void showMessage(Severity severity, std::string_view text) noexcept {
         return;
     showing = true;
     try {
+        if (severity == Severity::error || severity == Severity::report)
+            ShownErrors::note(std::string(text));
         SinkHolder& held = holder();
         const std::scoped_lock lock(held.mutex);
         held.sink({severity, std::string(text)});

@@ -5,6 +5,7 @@
 #include "core/apiCall.h"
 #include "graph/Graph.h"
 #include "openquarn_app/Messages.h"
+#include "openquarn_app/Workspace.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -17,7 +18,7 @@ namespace fs = std::filesystem;
 
 fs::path existingFile(const std::string& path) {
     std::error_code error;
-    fs::path whole = fs::canonical(path, error);
+    fs::path whole = fs::canonical(Workspace::callersPath(path), error);
     if (error)
         throw std::runtime_error("there is no such file: " + error.message());
     if (!fs::is_regular_file(whole, error))

@@ -11,8 +11,10 @@
 
 namespace {
 
-std::string sceneFolder() {
-    return std::filesystem::path(OpenQuarn::currentSceneFile()).parent_path().string();
+/// Where texts of the scene count from.
+std::string baseFolder() {
+    std::string scene = OpenQuarn::currentSceneFolder();
+    return scene.empty() ? OpenQuarn::Workspace::callersPath(OpenQuarn::Workspace::rootDirectory()).string() : scene;
 }
 
 /// The places to look for a path in, in their order.
@@ -20,10 +22,8 @@ std::vector<std::string> placesOf(const std::string& path, int method) {
     if (OpenQuarn::isAbsolutePath(path))
         return {path};
     std::vector<std::string> places;
-    if (method & HFileObject::kWorkspace)
-        places.push_back(OpenQuarn::joinPath(OpenQuarn::Workspace::rootDirectory(), path));
-    if ((method & HFileObject::kSceneFolder) && !OpenQuarn::currentSceneFile().empty())
-        places.push_back(OpenQuarn::joinPath(sceneFolder(), path));
+    if (method & HFileObject::kSceneFolder)
+        places.push_back(OpenQuarn::joinPath(baseFolder(), path));
     if (method & HFileObject::kAsWritten)
         places.push_back(path);
     return places;
@@ -32,7 +32,7 @@ std::vector<std::string> placesOf(const std::string& path, int method) {
 std::string missingPath(const std::string& path, int method) {
     if (!(method & HFileObject::kKeepMissing))
         return {};
-    return OpenQuarn::isAbsolutePath(path) ? path : OpenQuarn::joinPath(OpenQuarn::Workspace::rootDirectory(), path);
+    return OpenQuarn::isAbsolutePath(path) ? path : OpenQuarn::joinPath(baseFolder(), path);
 }
 
 std::string resolve(const std::string& path, int method) {

@@ -2,6 +2,8 @@
 #include "services/SceneFileState.h"
 
 #include "openquarn/HFileIO.h"
+#include "openquarn_app/SceneFile.h"
+#include "openquarn_app/Workspace.h"
 
 #include <atomic>
 #include <mutex>
@@ -13,6 +15,8 @@ namespace {
 struct SceneFile {
     std::mutex mutex;
     std::string path;
+    std::string folder;
+    SceneFolderSink folderSink;
 };
 
 SceneFile& sceneFile() {
@@ -29,9 +33,38 @@ std::string currentSceneFile() {
     return sceneFile().path;
 }
 
-void setCurrentSceneFile(std::string path) {
+std::string folderOfScene(const std::string& file) {
+    return std::filesystem::absolute(Workspace::callersPath(file)).lexically_normal().parent_path().string();
+}
+
+std::string currentSceneFolder() {
     const std::scoped_lock lock(sceneFile().mutex);
-    sceneFile().path = std::move(path);
+    return sceneFile().folder;
+}
+
+void setCurrentSceneFile(std::string path) {
+    const std::string folder = path.empty() ? std::string() : folderOfScene(path);
+    {
+        const std::scoped_lock lock(sceneFile().mutex);
+        sceneFile().path = std::move(path);
+    }
+    setCurrentSceneFolder(folder);
+}
+
+void setCurrentSceneFolder(const std::string& folder) {
+    SceneFolderSink sink;
+    {
+        const std::scoped_lock lock(sceneFile().mutex);
+        sceneFile().folder = folder;
+        sink = sceneFile().folderSink;
+    }
+    if (sink)
+        sink(folder);
+}
+
+SceneFolderSink setSceneFolderSink(SceneFolderSink sink) {
+    const std::scoped_lock lock(sceneFile().mutex);
+    return std::exchange(sceneFile().folderSink, std::move(sink));
 }
 
 int readingFileVersion() noexcept {

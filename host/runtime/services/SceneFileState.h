@@ -6,9 +6,17 @@
 
 namespace OpenQuarn {
 
-/// Path of the scene file; "" for none. Thread: any.
+/// Path of the scene file, as it was given; "" for none. Thread: any.
 std::string currentSceneFile();
+/// Absolute; empty for a scene without a file. Thread: any.
+std::string currentSceneFolder();
+/// The folder that a scene in that file has. Throws when it counts from a current directory that is gone. Thread: any.
+std::string folderOfScene(const std::string& file);
+/// `path` counts from the caller's folder; "" for none. Tells the application of the folder (setSceneFolderSink).
+/// Thread: main.
 void setCurrentSceneFile(std::string path);
+/// The scene goes to another folder before its file does; empty for none. Tells the application. Thread: main.
+void setCurrentSceneFolder(const std::string& folder);
 
 /// Version of the scene file that is being read; -1 when none is. Thread: any.
 int readingFileVersion() noexcept;

@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn_app/Workspace.h"
 
-#include <filesystem>
 #include <mutex>
 #include <optional>
 #include <system_error>
@@ -10,19 +9,25 @@
 namespace OpenQuarn {
 namespace {
 
-struct Root {
+namespace fs = std::filesystem;
+
+struct Folders {
     std::mutex mutex;
-    std::optional<std::string> directory;
+    std::optional<std::string> root;
+    fs::path callers; // empty until it is set
 };
 
-Root& root() {
-    static Root theRoot;
-    return theRoot;
+Folders& folders() {
+    static Folders theFolders;
+    return theFolders;
 }
 
-std::string currentDirectory() {
-    std::error_code error;
-    std::string directory = std::filesystem::current_path(error).string();
+fs::path setCallers() {
+    const std::scoped_lock lock(folders().mutex);
+    return folders().callers;
+}
+
+std::string withFinalSeparator(std::string directory) {
     if (!directory.empty() && directory.back() != '/')
         directory += '/';
     return directory;
@@ -30,19 +35,39 @@ std::string currentDirectory() {
 
 } // namespace
 
+fs::path Workspace::callersFolder() {
+    const fs::path set = setCallers();
+    std::error_code none;
+    return set.empty() ? fs::current_path(none) : set;
+}
+
+void Workspace::setCallersFolder(fs::path folder) {
+    const std::scoped_lock lock(folders().mutex);
+    folders().callers = std::move(folder);
+}
+
+fs::path Workspace::callersPath(const fs::path& path) {
+    const fs::path set = setCallers();
+    return set.empty() || path.empty() || path.is_absolute() ? path : set / path;
+}
+
 std::string Workspace::rootDirectory() {
-    const std::scoped_lock lock(root().mutex);
-    return root().directory ? *root().directory : currentDirectory();
+    {
+        const std::scoped_lock lock(folders().mutex);
+        if (folders().root)
+            return *folders().root;
+    }
+    return withFinalSeparator(callersFolder().string());
 }
 
 void Workspace::setRootDirectory(std::string newRoot) {
-    const std::scoped_lock lock(root().mutex);
-    root().directory = std::move(newRoot);
+    const std::scoped_lock lock(folders().mutex);
+    folders().root = std::move(newRoot);
 }
 
 void Workspace::resetRootDirectory() noexcept {
-    const std::scoped_lock lock(root().mutex);
-    root().directory.reset();
+    const std::scoped_lock lock(folders().mutex);
+    folders().root.reset();
 }
 
 } // namespace OpenQuarn

@@ -9,10 +9,6 @@
 namespace OpenQuarn {
 namespace {
 
-bool isNameCharacter(char c) {
-    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_';
-}
-
 /// A variable as it stands at the start of a text.
 struct Reference {
     std::string name;
@@ -66,6 +62,10 @@ std::string joinPath(std::string_view head, std::string_view tail) {
     if (!joined.empty() && joined.back() != '/')
         joined += '/';
     return joined.append(tail);
+}
+
+bool isNameCharacter(char c) {
+    return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || (c >= '0' && c <= '9') || c == '_';
 }
 
 bool isAbsolutePath(std::string_view path) {

@@ -13,6 +13,9 @@ std::string expandPath(std::string_view path);
 /// Head and tail with one separator between them; the tail alone when the head is empty.
 std::string joinPath(std::string_view head, std::string_view tail);
 
+/// May be in the name of a variable.
+bool isNameCharacter(char c);
+
 bool isAbsolutePath(std::string_view path);
 
 /// True when an entry of any kind exists there; false for an empty path, and when the disk cannot answer.

@@ -3,6 +3,7 @@
 #include "openquarn/HGlobal.h"
 #include "openquarn/HPxCommand.h"
 #include "openquarn_app/Commands.h"
+#include "openquarn_app/Messages.h"
 #include "support/TemporaryFolder.h"
 
 #include <gmock/gmock.h>
@@ -119,6 +120,58 @@ TEST(Script, ErrorsNameFileLineAndCommandAndStopIt) {
         EXPECT_EQ(runs, wrong.runsBefore) << wrong.text;
     }
     EXPECT_EQ(runCommand("nope").error, "there is no command 'nope'");
+}
+
+TEST(Script, AnErrorThatIsShownIsTold) {
+    OpenQuarn::MessageSink before = OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {});
+    int runs = 0;
+    const TestCommand show("show", [&](const HPxCommand&, const HArgList& args) {
+        ++runs;
+        const std::string kind = args.asString(0).asStdString();
+        for (const OpenQuarn::Severity severity : {OpenQuarn::Severity::info, OpenQuarn::Severity::warning,
+                                                   OpenQuarn::Severity::error, OpenQuarn::Severity::report})
+            if (kind == severityName(severity))
+                OpenQuarn::showMessage(severity, args.asString(1).asStdString());
+        return kind == "fail" ? HStatus(HStatus::kFailure, "it failed") : HStatus();
+    });
+    const TestCommand inner("inner", [](const HPxCommand&, const HArgList& args) {
+        return HGlobal::executeCommand(args.asString(0), false);
+    });
+    const struct {
+        const char* text;
+        const char* error;
+        const char* shown;
+        int runs, runsWithStop;
+    } rows[] = {
+        {"show info a; show warning b", "", "", 2, 2},
+        {"show info a\nshow error b\nshow error c", "", "s, line 2: show: b", 3, 2},
+        {"show report a; show", "", "s, line 1: show: a", 2, 1},
+        {"inner 'show error a'; show", "", "s, line 1: inner: a", 2, 1},
+        {"show error a\nshow fail\nshow", "s, line 2: show: it failed", "s, line 1: show: a", 2, 1},
+        {"try show error a; try show fail; show", "", "", 3, 3},
+        {"try show report a -flag 'b c'", "", "", 1, 1},
+        {"inner 'try show error a; show error b'", "", "s, line 1: inner: b", 2, 2},
+        {"try inner 'show error a'; show", "", "", 2, 2},
+        {"try inner 'try show error a'; show", "s, line 1: try: no error came of 'inner'", "", 1, 1},
+        {"show\ntry show warning a; show", "s, line 2: try: no error came of 'show'", "", 2, 2},
+        {"try", "s, line 1: try: the command to be tried is missing", "", 0, 0},
+        {"try nope", "", "", 0, 0},
+    };
+    for (const auto& row : rows)
+        for (const bool stops : {false, true}) {
+            SCOPED_TRACE(row.text);
+            runs = 0;
+            const CommandOutcome outcome =
+                runScript(row.text, "s", {}, stops ? OpenQuarn::OnShownError::stop : OpenQuarn::OnShownError::goOn);
+            EXPECT_EQ(runs, stops ? row.runsWithStop : row.runs);
+            EXPECT_EQ(outcome.shownError, row.shown);
+            if (runs == row.runs) {
+                EXPECT_EQ(outcome.error, row.error);
+            }
+        }
+    EXPECT_EQ(runCommand("try show error 'as expected'").result, CommandValue(std::string("as expected")));
+    EXPECT_EQ(runCommand("try show fail").result, CommandValue(std::string("show: it failed")));
+    OpenQuarn::setMessageSink(std::move(before));
 }
 
 TEST(Script, FilesAreReadAndNamed) {

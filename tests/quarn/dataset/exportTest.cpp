@@ -61,6 +61,17 @@ protected:
     }
 };
 
+// the curve ends in frame 4, the target in frame 3
+TEST_F(ExportTest, RowsInWhichNothingMovesAreCounted) {
+    writeTarget(3);
+    save(3);
+    EXPECT_EQ(quarn::exportDatasets(options()).at(0).rowsRepeated, 0U);
+    quarn::ExportOptions flags = options();
+    flags.frames = "1-7";
+    flags.overwrite = true;
+    EXPECT_EQ(quarn::exportDatasets(flags).at(0).rowsRepeated, 3U);
+}
+
 // of a strip that turns as a whole, Surface mode turns rest plus delta, and Offset mode adds the delta to the input
 TEST_F(ExportTest, DeltasLeadToTheTargetInBothModes) {
     constexpr std::size_t frames = 7;
@@ -183,6 +194,10 @@ TEST_F(ExportTest, ErrorsNameTheFrameAndTheThing) {
                 AllOf(StartsWith("frame 1: "), HasSubstr("the target none.outMesh holds no mesh")));
     EXPECT_THAT(errorAfter("setAttr warp.exportStartFrame 9"), HasSubstr("is 9, after exportEndFrame 3"));
     EXPECT_THAT(errorAfter("setAttr warp.trainingDataRoot ''"), HasSubstr("warp.trainingDataRoot is empty"));
+    for (const char* place : {"trainingDataRoot ../data", "trainingDataRoot data/../..",
+                              "export[0].trainingDataName ../x", "export[0].trainingDataName /x"})
+        EXPECT_THAT(errorAfter(std::string("setAttr warp.") + place),
+                    AllOf(HasSubstr("the scene would have strip exported to"), HasSubstr("say with -o")));
     EXPECT_THAT(errorAfter("setAttr warp.export[0].deltaMode 7"), HasSubstr("warp.export[0].deltaMode is 7"));
     EXPECT_THAT(errorAfter("setAttr arm.restMatrix 0 0 0 0 0 0 0 0 0 0 0 0 0 0 0 0"),
                 AllOf(StartsWith("frame 1: "), HasSubstr("restMatrix is singular")));

@@ -66,6 +66,27 @@ TEST(CharacterScene, MeshesWithoutSkinFollowTheirJoint) {
     EXPECT_NEAR(points[14], wanted.z, 1e-9);
 }
 
+// of a mesh in metres that its joints bring to centimetres: what single precision leaves is no other pose
+TEST(CharacterScene, ABindingThatMissesByRoundingIsNoOtherPose) {
+    for (const auto& [error, notes] : {std::pair(2e-5, 0U), std::pair(0.5, 1U)}) {
+        Character character = randomCharacter(3, {8, false, true, false});
+        character.meshes.resize(1);
+        CharacterMesh& mesh = character.meshes.front();
+        HMatrix bigger;
+        for (unsigned axis = 0; axis < 3; ++axis)
+            bigger(axis, axis) = 100.0;
+        for (HPoint& point : mesh.points)
+            point = HPoint(point.x / 100.0, point.y / 100.0, point.z / 100.0);
+        for (Binding& binding : mesh.bindings)
+            binding.inverseBind = bigger * binding.inverseBind;
+        bigger(0, 0) += error;
+        bigger(0, 0) /= 100.0;
+        bigger(1, 1) = bigger(2, 2) = 1.0;
+        mesh.bindings.back().inverseBind = bigger * mesh.bindings.back().inverseBind;
+        EXPECT_EQ(TestScene(character, nullptr).scene().notes.size(), notes) << error;
+    }
+}
+
 // a mirrored space must not turn faces inside out
 TEST(CharacterScene, PolygonsGoRoundTheSameWayInAMirroredSpace) {
     Character character = randomCharacter(2, {});

@@ -38,10 +38,16 @@ expect 0 'mesh skin: 3 vertices in the file, joined to 3; 1 polygons(.|\n)*scene
 expect 0 '"poseInputs": 3(.|\n)*"notes": \[\n' '(?s)place the character.*: root' bone.gltf -o bone.json --neural-warp --json
 expect 0 'deformer warp: 6 angles' '' bone.gltf -o bone.json --neural-warp --with-roots -q
 expect 1 '' '^quarn: .*none\.glb: does not exist\n$' none.glb -o bone.json
-expect 1 '' '^quarn: --fps must be a number above 0\n$' bone.gltf -o bone.json --fps 0
-expect 1 '' '^quarn: --meters-per-unit must be' bone.gltf -o bone.json --meters-per-unit -1
-expect 106 '' '--output is required' bone.gltf
-expect 107 '' '--limits requires --neural-warp' bone.gltf -o bone.json --limits limits.json
-expect 105 '' '--controls' bone.gltf -o bone.json --neural-warp --controls axis
+expect 2 '' '^quarn: --fps must be a number above 0\n' bone.gltf -o bone.json --fps 0
+expect 2 '' '^quarn: --meters-per-unit must be' bone.gltf -o bone.json --meters-per-unit -1
+expect 2 '' '--output is required' bone.gltf
+expect 2 '' '--limits requires --neural-warp' bone.gltf -o bone.json --limits limits.json
+expect 2 '' '--controls' bone.gltf -o bone.json --neural-warp --controls axis
+# a buffer of its own, under a name that a URI writes otherwise
+base64 -d <<<"$buffer" >'my buffer #1.bin'
+sed 's|"data:[^"]*"|"my%20buffer%20%231.bin"|' bone.gltf >uri.gltf
+expect 0 'mesh skin: 3 vertices' '' uri.gltf -o bone.json
+rm 'my buffer #1.bin' uri.gltf
+expect 1 '' 'a\$b\.vertices\.npy cannot be named in a scene' bone.gltf -o 'a$b.json'
 [[ $(ls) == $'bone.gltf\nbone.json\nbone.vertices.npy\nerr\nout' ]] || { ls; bad=1; }
 exit $bad

@@ -7,6 +7,7 @@
 #include "quarn/import/ImportTest.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/scene/Warp.h"
+#include "quarn/scene/vertexMap.h"
 #include "support/TemporaryFolder.h"
 
 #include <fstream>
@@ -95,6 +96,18 @@ TEST_F(ImportCharacter, AFolderWithTheSceneCanBeMoved) {
     EXPECT_EQ(textOf(findPlug("character.sourceFile")), "arm.gltf");
     EXPECT_EQ(numberOf(findPlug("character.framesPerSecond")), 10.0);
     EXPECT_THAT(mapOf(textOf(findPlug("character.vertexMapFile"))), ElementsAre(0, 1, 2, 3, 1, 4, 5, 2));
+    EXPECT_EQ(readVertexMap("arm").size(), 8U) << "the digest is that of the map";
+    EXPECT_EQ(numberOf(findPlug("warp.exportEndFrame")), 11.0) << "a second";
+    EXPECT_EQ(numberOf(findPlug("warp.train[0].principalShapesLimit")), 200.0);
+    EXPECT_EQ(numberOf(findPlug("warp.train[0].principalShapesAccuracy")), static_cast<double>(0.99F));
+
+    // all of it in another folder, the pattern that stands for the maps of several meshes as well
+    setText(findPlug("character.vertexMapFile"), "arm.{mesh}.npy");
+    fs::create_directory(path("third"));
+    session.save(path("third/arm.json"));
+    EXPECT_EQ(textOf(findPlug("character.sourceFile")), path("after/arm.gltf"));
+    EXPECT_EQ(textOf(findPlug("character.vertexMapFile")), path("after/arm.{mesh}.npy"));
+    EXPECT_EQ(textOf(findPlug("warp.modelRoot")), "models") << "there is none";
 }
 
 TEST_F(ImportCharacter, SetsADeformerUp) {
@@ -194,16 +207,17 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
     refused("is the character itself", [&](ImportOptions& options) { options.output = options.file; });
     refused("one after the other only", [&](ImportOptions& options) { options.output = "/dev/null"; });
     refused("is a folder", [&](ImportOptions& options) { options.output = path("."); });
-    refused("no joint is left", [&](ImportOptions& options) {
-        options.file = write("table.gltf", [] {
-            GltfWriter file = Strip().write();
-            file.nodes = {R"({"name":"table","mesh":0})"};
-            file.roots = "0";
-            file.skins.clear();
-            return file.text();
-        }());
-        options.neuralWarp = true;
-    });
+    refused("table.gltf has meshes (table of 6 vertices), 0 joints, 0 animations, and no skin",
+            [&](ImportOptions& options) {
+                options.file = write("table.gltf", [] {
+                    GltfWriter file = Strip().write();
+                    file.nodes = {R"({"name":"table","mesh":0})"};
+                    file.roots = "0";
+                    file.skins.clear();
+                    return file.text();
+                }());
+                options.neuralWarp = true;
+            });
 }
 
 TEST_F(ImportCharacter, DamagedJsonFilesAreRefusedByName) {

@@ -53,10 +53,10 @@ OCL_ICD_VENDORS=$work/none expect 0 'GPU: 0 deformations on no device, 11 on the
   play "$scene" --frames 1-11 --evaluator gpu -o "$work/fallback.npy"
 cmp "$work/fallback.npy" "$work/cpu.npy" || fail "the CPU's frames come out otherwise when the GPU was asked for"
 expect 1 '' 'no OpenCL device "no such thing": ' play "$scene" --evaluator gpu --device 'no such thing'
-expect 1 '' '--device 0 goes with --evaluator gpu' play "$scene" --device 0
+expect 2 '' '--device 0 goes with --evaluator gpu' play "$scene" --device 0
 OCL_ICD_VENDORS=$work/none expect 0 'no OpenCL device' '' info --devices
-expect 1 '' 'put #### where' play "$scene" --frames 1-3 -o "$work/a.obj"
-expect 1 '' '\.npy, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
+expect 2 '' 'put #### where' play "$scene" --frames 1-3 -o "$work/a.obj"
+expect 2 '' '\.npy, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
 expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
 expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
 expect 1 '' 'no node of type character' bake "$scene" strip.outMesh --frames 1 --order file -o "$work/lost.npy"
@@ -135,5 +135,5 @@ echo 'no model' >"$work/models/wave.nwrp/model.onnx"
 echo '[' >"$work/models/wave.nwrp/principal_shapes.json"
 expect 1 'damaged: metadata(.|\n)*damaged: model\.onnx cannot be used(.|\n)*damaged: principal' 'is damaged' \
   info "$work/models/wave.nwrp"
-expect 1 '' 'is no model directory' info "$scene" --scene "$scene"
+expect 2 '' 'is no model directory' info "$scene" --scene "$scene"
 exit $bad

@@ -5,6 +5,7 @@
 #include "quarn/files/npyArray.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/scene/meshes.h"
+#include "quarn/scene/vertexMap.h"
 #include "rig/NpyFile.h"
 
 #include <algorithm>
@@ -97,6 +98,7 @@ TEST_F(TargetTest, CachesThatDoNotFitAreRefusedAndTheSceneStays) {
         {{"--cache", cache("more.npy", 2, vertices + 1, 0.0F)}, {"more.npy", "19", "18", "--order file"}},
         {{"--cache", cache("none.npy", 0, vertices, 0.0F)}, {"none.npy", "no frames"}},
         {{"--cache", path("missing.npy")}, {"missing.npy"}},
+        {{"--cache", cache("ca$HOME.npy", 2, vertices, 0.0F)}, {"ca$HOME.npy", "variable of the environment"}},
         {{"--cache", write("text.npy", "points")}, {"text.npy", "NumPy"}},
         {{"--cache", cache("fits.npy", 2, vertices, 0.0F), "--geometry", "arm"}, {"arm", "0 (strip)"}},
         {{"--cache", path("fits.npy"), "--deformer", "w"}, {"w", "warp"}},
@@ -154,11 +156,46 @@ TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
 TEST_F(TargetTest, TheCommandFindsTheMapOfTheCharacter) {
     ::setenv("NEURALWARP_PLUGIN", NW_PLUGIN, 1);
     map("map.npy", reversedMap());
-    stripScene::write(scene(), "createNode character; setAttr character1.vertexMapFile map.npy");
+    stripScene::write(scene(), "createNode character; setAttr character1.vertexMapFile map.npy;"
+                               "setAttr character1.vertexMapDigests 'another " +
+                                   quarn::vertexMapDigest(reversedMap()) + "'");
     const std::string file = cache("file.npy", 2, vertices + 1, 3.0F);
     EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", file, "--order", "file", "--json"}),
                 AllOf(HasSubstr("scene.strip_target.npy"), HasSubstr("\"converted\": true")));
     EXPECT_EQ(first(*open("scene.json"), 2, "strip_target.outMesh"), 4.0);
+
+    // of another import, say
+    std::vector<std::int32_t> other = reversedMap();
+    std::swap(other[0], other[1]);
+    map("map.npy", other);
+    EXPECT_THAT(stripScene::failureOf({"target", scene(), "--cache", file, "--order", "file"}),
+                AllOf(HasSubstr("map.npy"), HasSubstr("another vertex map")));
+}
+
+// frames to export and settings of training, while they are the node's defaults
+TEST_F(TargetTest, WhatNobodyHasSetFollowsFromTheCache) {
+    const struct {
+        const char* change;
+        std::vector<std::string> flags;
+        double first, last, limit;
+    } rows[] = {
+        {"", {}, 1, 4, 200},
+        {"setAttr warp.train[0].principalShapesLimit 30", {"--start-frame", "-2.5"}, -2, 0, 30},
+        {"setAttr warp.exportStartFrame 2; setAttr warp.exportEndFrame 1000", {}, 2, 1000, 200},
+        {"setAttr warp.exportEndFrame 999", {"--start-frame", "7"}, 1, 999, 200},
+    };
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.change);
+        stripScene::write(scene(), std::string("setAttr warp.exportStartFrame 1; setAttr warp.exportEndFrame 1000;") +
+                                       row.change);
+        std::vector<std::string> arguments{"target", scene(), "--cache", cache("one.npy", 4, vertices, 1.0F)};
+        arguments.insert(arguments.end(), row.flags.begin(), row.flags.end());
+        stripScene::quarn(arguments);
+        const auto session = open("scene.json");
+        EXPECT_EQ(quarn::numberOf(quarn::findPlug("warp.exportStartFrame")), row.first);
+        EXPECT_EQ(quarn::numberOf(quarn::findPlug("warp.exportEndFrame")), row.last);
+        EXPECT_EQ(quarn::numberOf(quarn::findPlug("warp.train[0].principalShapesLimit")), row.limit);
+    }
 }
 
 // each row: a map, and what is wrong

@@ -36,6 +36,6 @@ refused '"10x" is no size' -o "$work/no.png" --size 10x
 refused "cannot be made" -o "$work/no.png" --size 9000x100 --panel a=strip.outMesh --panel b=strip.outMesh
 refused "there is no plug strip.none" -o "$work/no.png" --plug strip.none
 refused "no deformer none" -o "$work/no.png" --model x --deformer none
-refused "Unable to access the ML model" -o "$work/no.png" --model none
+refused "none.nwrp, which is wave.modelRoot" -o "$work/no.png" --model none
 [ ! -e "$work/no.png" ] || fail "a refused picture was written"
 if ls "$work"/.whole-* 2>/dev/null; then fail "a part of a picture is left"; fi

@@ -37,21 +37,32 @@ struct CommandOutcome {
     std::string error;
     /// Of the last command that ran; none after a failure.
     CommandValue result;
+    /// The first error or report (Messages.h) that a command showed which did not fail, as "COMMAND: TEXT", with the
+    /// same before it; empty without one. The mesh of a deformer that cannot be evaluated is a mesh all the same.
+    std::string shownError;
     explicit operator bool() const { return ok; }
 };
 
 /// Called with each command's result as soon as it has one that is not none.
 using ResultSink = std::function<void(const CommandValue&)>;
 
+/// What becomes of a script when a command shows an error and does not fail.
+enum class OnShownError {
+    goOn, ///< It is in `shownError` afterwards.
+    stop, ///< It is in `shownError`, and nothing runs after it.
+};
+
 /// Runs a text of one command, or several that end at the first that fails. Nothing is thrown. Thread: main.
 OPENQUARN_API CommandOutcome runCommand(std::string_view text) noexcept;
 
 /// Runs a script up to the first command that fails; one that is not well-formed is refused before any of it runs.
 /// `name` what errors call it. Nothing is thrown, unless `results` throws. Thread: main.
-OPENQUARN_API CommandOutcome runScript(std::string_view text, std::string_view name, const ResultSink& results = {});
+OPENQUARN_API CommandOutcome runScript(std::string_view text, std::string_view name, const ResultSink& results = {},
+                                       OnShownError onShownError = OnShownError::goOn);
 
 /// Reads the file and runs it; errors call it by its path. Thread: main.
-OPENQUARN_API CommandOutcome runScriptFile(const std::string& path, const ResultSink& results = {});
+OPENQUARN_API CommandOutcome runScriptFile(const std::string& path, const ResultSink& results = {},
+                                           OnShownError onShownError = OnShownError::goOn);
 
 /// Adds a command of the application's own; plug-ins register theirs with HFnPlugin.
 /// `name` a letter, then letters, digits and underscores; `create` gives a new object for the host to delete, or null;

@@ -6,14 +6,18 @@
 
 #include <cstdint>
 #include <filesystem>
+#include <functional>
 #include <map>
 #include <string>
 #include <vector>
 
 namespace OpenQuarn {
 
+// Paths that are not absolute count as Workspace.h says.
+
 /// What became of an operation on files. Warnings say what could not be done although the rest was; the error, why
-/// nothing was. All of them begin with the file's name and have gone to the message sink as well.
+/// nothing was. All of them begin with the file's name. Warnings have gone to the message sink as well; the error is
+/// the caller's to show.
 struct FileOutcome {
     bool ok = false;
     std::string error; ///< empty when ok
@@ -29,8 +33,27 @@ struct FileOutcome {
 OPENQUARN_API FileOutcome openScene(const std::filesystem::path& path);
 
 /// Writes the scene, which makes `path` the current file. The file is replaced as a whole or, on an error, not at all;
-/// a new one gets the permissions of the one it replaces. Thread: main.
+/// a new one gets the permissions of the one it replaces. In another folder than before, what the nodes name by a
+/// relative path and is there (externalContent()) is named anew; on an error every text is what it was. Thread: main.
 OPENQUARN_API FileOutcome saveScene(const std::filesystem::path& path);
+
+/// Does the same renaming before the scene is saved, for an application that has more files to name: from now on the
+/// scene's texts count from `folder`, which must be absolute and exist. The current file stays. Thread: main.
+OPENQUARN_API FileOutcome moveScene(const std::filesystem::path& folder);
+
+/// How a scene in `folder` names `file`, both absolute: relative when the file lies in that folder or below it, so that
+/// the folder can be moved; absolute otherwise. By text alone. Throws std::runtime_error when no scene can name it:
+/// what looks like a variable of the environment ($NAME, ${NAME}) would be replaced. Thread: any.
+OPENQUARN_API std::string pathForScene(const std::filesystem::path& file, const std::filesystem::path& folder);
+
+/// Called with the folder that texts of the scene count from, absolute, whenever that may have become another one;
+/// empty for a scene without a file. An application whose nodes open files by relative paths of the system makes it the
+/// current directory, as a library must not. Called on the main thread; may throw while a scene is opened or saved,
+/// which then fails.
+using SceneFolderSink = std::function<void(const std::filesystem::path& folder)>;
+
+/// From now on `sink` is called, or none when it is empty. Returns the one of before. Thread: main.
+OPENQUARN_API SceneFolderSink setSceneFolderSink(SceneFolderSink sink);
 
 /// The scene as saveScene() writes it, and a scene read from such a text; the current file stays as it is. `fileName`
 /// names the text in messages. Thread: main.
@@ -70,6 +93,9 @@ struct ExternalContent {
     std::string role;
     bool isResolved = false;
 };
+
+/// Role of a path that stands for several files: something in its last component, in "{}", is another text in each.
+inline constexpr const char* filePatternRole = "file pattern";
 
 /// All of it, in order of nodes. Thread: main.
 OPENQUARN_API std::vector<ExternalContent> externalContent();

@@ -14,6 +14,7 @@ void addBuiltins(CommandRegistry& registry) {
     addSceneCommands(registry);
     addSetAttr(registry);
     addTextCommands(registry);
+    addTryCommand(registry);
 }
 
 } // namespace OpenQuarn

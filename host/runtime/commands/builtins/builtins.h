@@ -18,5 +18,6 @@ void addPluginCommands(CommandRegistry& registry);
 void addSceneCommands(CommandRegistry& registry);
 void addSetAttr(CommandRegistry& registry);
 void addTextCommands(CommandRegistry& registry);
+void addTryCommand(CommandRegistry& registry);
 
 } // namespace OpenQuarn

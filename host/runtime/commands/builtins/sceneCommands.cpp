@@ -29,10 +29,11 @@ class WorkspaceCommand : public Builtin {
 
     // paths are made by appending to the root, which ends in "/" therefore
     static void open(const std::string& path) {
+        const std::filesystem::path folder = Workspace::callersPath(path);
         std::error_code error;
-        if (!std::filesystem::is_directory(path, error))
+        if (!std::filesystem::is_directory(folder, error))
             throw std::invalid_argument("there is no folder " + inQuotes(path));
-        Workspace::setRootDirectory((std::filesystem::absolute(path) / "").lexically_normal().string());
+        Workspace::setRootDirectory((std::filesystem::absolute(folder) / "").lexically_normal().string());
     }
 };
 
