@@ -47,6 +47,8 @@ void evaluateOutput(const HPlug& output) {
     std::vector<unsigned> indices;
     if (output.getExistingArrayAttributeIndices(indices).error())
         OpenQuarn::evaluate(output);
+    else if (indices.empty())
+        indices.push_back(0); // of an output array, elements need not be there before somebody asks
     for (std::size_t i = 0; i < std::min(indices.size(), most); ++i)
         OpenQuarn::evaluate(output.elementByLogicalIndex(indices[i]));
 }
