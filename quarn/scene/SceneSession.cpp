@@ -92,11 +92,9 @@ SceneFolder::SceneFolder()
     : before_(fs::current_path()) {
     OpenQuarn::Workspace::setCallersFolder(startFolder());
     OpenQuarn::setSceneFolderSink([](const fs::path& folder) {
-        std::error_code gone; // the caller's folder may have been removed: then there is nowhere to go back to
-        if (folder.empty())
-            fs::current_path(startFolder(), gone);
-        else
-            fs::current_path(folder);
+        // the caller's folder may have been removed, and a scene's be made only when it is saved, which tells again
+        std::error_code notThere;
+        fs::current_path(folder.empty() ? startFolder() : folder, notThere);
     });
 }
 

@@ -66,7 +66,7 @@ public:
     void save(const std::filesystem::path& scene);
     /// For a scene that is to be saved in another folder, and gets names of files before: from now on they count from
     /// there, and those that it has are named anew (OpenQuarn::moveScene). `folder` counts from the caller's folder;
-    /// one that does not exist is left to save().
+    /// one that does not exist is made by save().
     void moveTo(const std::filesystem::path& folder);
     OpenQuarn::Session& host() { return session_; }
 

@@ -12,7 +12,6 @@ if grep -v '^info: ' "$work/err"; then exit 1; fi
 # from any folder: texts of a scene count from its own folder, what is on the command line or in a script from the
 # caller's, also after a scene was opened; a scene saved elsewhere still finds its model
 here=$PWD
-mkdir -p "$work/third"
 for folder in one two; do cp -r examples/wave "$work/$folder"; done
 mv "$work/two/models/wave.nwrp" "$work/two/models/fold.nwrp"
 sed -i 's/"modelName": "wave"/"modelName": "fold"/' "$work/two/wave.json"

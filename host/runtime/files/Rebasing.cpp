@@ -56,8 +56,8 @@ std::string pathForScene(const fs::path& file, const fs::path& folder) {
 
 Rebasing::Rebasing(const fs::path& folder, Warnings& warnings)
     : folderBefore_(currentSceneFolder()) {
-    if (folder == folderBefore_ || !pathExists(folder.string()))
-        return; // where there is no folder, whoever writes there says so
+    if (folder == folderBefore_)
+        return;
     const fs::path from = folderBefore_.empty() ? Workspace::callersFolder() : folderBefore_;
     std::vector<Relocation> wanted;
     for (const ExternalContent& content : externalContent()) {

@@ -2,6 +2,7 @@
 #include "openquarn_app/Resources.h"
 
 #include "openquarn/HGlobal.h"
+#include "openquarn_app/Workspace.h"
 
 #include <dlfcn.h>
 #include <mutex>
@@ -20,7 +21,7 @@ fs::path libraryFolder() {
     if (dladdr(&here, &info) == 0 || !info.dli_fname)
         return {};
     std::error_code error;
-    const fs::path absolute = fs::absolute(info.dli_fname, error);
+    const fs::path absolute = fs::absolute(Workspace::callersPath(info.dli_fname), error);
     return error ? fs::path() : absolute.parent_path();
 }
 
@@ -54,7 +55,8 @@ std::string Resources::path() {
 }
 
 void Resources::setPath(const fs::path& path) {
-    std::string text = withoutFinalSeparator(path.empty() ? firstPath() : fs::absolute(path).lexically_normal());
+    std::string text = withoutFinalSeparator(
+        path.empty() ? firstPath() : fs::absolute(Workspace::callersPath(path)).lexically_normal());
     const std::scoped_lock lock(held().mutex);
     held().path = std::move(text);
 }

@@ -5,7 +5,7 @@
 #include "quarn/scene/plugs.h"
 
 #include "openquarn_app/Commands.h"
-#include "rig/NpyFile.h"
+#include "support/rawCache.h"
 
 #include <cmath>
 #include <cstdlib>
@@ -79,10 +79,7 @@ std::vector<float> ExportScene::targetAt(std::size_t frame) {
 }
 
 void ExportScene::writeCache(const std::vector<std::vector<float>>& frames) const {
-    rig::NpyWriter writer(folder.path() / "strip.npy", frames.front().size() / 3);
-    for (const std::vector<float>& frame : frames)
-        writer.append(frame);
-    writer.finish();
+    writeRawCache(folder.path() / "strip.npy", frames);
 }
 
 void ExportScene::build(std::size_t frames, const std::string& more) {

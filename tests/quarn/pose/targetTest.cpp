@@ -7,6 +7,7 @@
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/vertexMap.h"
 #include "rig/NpyFile.h"
+#include "support/rawCache.h"
 
 #include <algorithm>
 #include <cmath>
@@ -146,9 +147,7 @@ TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
     }
 
     points[3 * vertices] = std::nanf("");
-    rig::NpyWriter again(path("file.npy"), vertices + 1);
-    again.append(points);
-    again.finish();
+    writeRawCache(path("file.npy"), {points});
     EXPECT_TRUE(
         std::isinf(quarn::writeInSceneOrder(path("file.npy"), path("scene.npy"), map, vertices, {true, false})));
 }

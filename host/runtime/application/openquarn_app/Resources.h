@@ -17,7 +17,7 @@ public:
     /// Absolute, without a separator at its end. Until it is set: "resources" in the folder of the host library, where
     /// that exists (a build folder), else "share/OpenQuarn" beside the folder of the library (an installed tree).
     static std::string path();
-    /// A relative path is taken from the current directory. An empty one brings back the folder of the start.
+    /// A relative path counts from the caller's folder (Workspace.h). An empty one brings back the folder of the start.
     static void setPath(const std::filesystem::path& path);
 };
 

@@ -38,7 +38,7 @@ OPENQUARN_API FileOutcome openScene(const std::filesystem::path& path);
 OPENQUARN_API FileOutcome saveScene(const std::filesystem::path& path);
 
 /// Does the same renaming before the scene is saved, for an application that has more files to name: from now on the
-/// scene's texts count from `folder`, which must be absolute and exist. The current file stays. Thread: main.
+/// scene's texts count from `folder`, which is absolute. The current file stays. Thread: main.
 OPENQUARN_API FileOutcome moveScene(const std::filesystem::path& folder);
 
 /// How a scene in `folder` names `file`, both absolute: relative when the file lies in that folder or below it, so that
@@ -48,8 +48,8 @@ OPENQUARN_API std::string pathForScene(const std::filesystem::path& file, const 
 
 /// Called with the folder that texts of the scene count from, absolute, whenever that may have become another one;
 /// empty for a scene without a file. An application whose nodes open files by relative paths of the system makes it the
-/// current directory, as a library must not. Called on the main thread; may throw while a scene is opened or saved,
-/// which then fails.
+/// current directory, as a library must not. A folder that does not exist yet is told of again when saving has made it.
+/// Called on the main thread; must not throw.
 using SceneFolderSink = std::function<void(const std::filesystem::path& folder)>;
 
 /// From now on `sink` is called, or none when it is empty. Returns the one of before. Thread: main.
