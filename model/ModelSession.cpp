@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelSession.h"
 
+#include "OnnxScan.h"
+
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
@@ -74,8 +76,9 @@ std::int32_t elementCount(const std::vector<std::int64_t>& shape) {
     return static_cast<std::int32_t>(count);
 }
 
-/// Declared shape of a tensor that callers can feed or read. Throws with the reason when they cannot.
-std::vector<std::int64_t> usableShape(const Ort::TypeInfo& type, const std::string& what) {
+/// Declared shape of a tensor of at most `limit` values that callers can feed or read. Throws with the reason when they
+/// cannot.
+std::vector<std::int64_t> usableShape(const Ort::TypeInfo& type, const std::string& what, std::int32_t limit) {
     if (type.GetONNXType() != ONNX_TYPE_TENSOR) {
         throw std::runtime_error(what + " is not a tensor");
     }
@@ -88,8 +91,13 @@ std::vector<std::int64_t> usableShape(const Ort::TypeInfo& type, const std::stri
         // The runtime reports a scalar and a shape that the model does not declare in the same way.
         throw std::runtime_error(what + " is a scalar or has no declared shape");
     }
-    if (elementCount(shape) == 0) {
+    const std::int32_t count = elementCount(shape);
+    if (count == 0) {
         throw std::runtime_error(what + " has an unknown, zero or too large dimension");
+    }
+    if (count > limit) {
+        throw std::runtime_error(what + " has " + std::to_string(count) + " values, and at most " +
+                                 std::to_string(limit) + " are taken");
     }
     return shape;
 }
@@ -100,7 +108,7 @@ TensorInfo readInput(const Ort::Session& session, OrtAllocator* allocator) {
     }
     TensorInfo input;
     input.name = session.GetInputNameAllocated(0, allocator);
-    input.shape = usableShape(session.GetInputTypeInfo(0), "the input");
+    input.shape = usableShape(session.GetInputTypeInfo(0), "the input", modelInputLimit);
     if (input.shape.size() != 1) {
         throw std::runtime_error("the input has more than one dimension");
     }
@@ -117,7 +125,7 @@ TensorInfo readOutput(const Ort::Session& session, OrtAllocator* allocator, cons
         // The runtime then reports success and leaves the caller's output array unwritten.
         throw std::runtime_error("the first output is the input itself");
     }
-    output.shape = usableShape(session.GetOutputTypeInfo(0), "the first output");
+    output.shape = usableShape(session.GetOutputTypeInfo(0), "the first output", modelOutputLimit);
     return output;
 }
 
@@ -198,6 +206,7 @@ void ModelSession::Runtime::build(const std::filesystem::path& path) {
     if (!allocator) {
         throw std::runtime_error("ONNX Runtime is older than version 1.16");
     }
+    scanOnnxFile(path);
     env.renew();
     Ort::SessionOptions options;
     options.SetGraphOptimizationLevel(ORT_ENABLE_ALL);

@@ -27,13 +27,19 @@ enum class ModelType : std::int32_t {
     OnnxType = 3,         ///< ".onnx".
 };
 
+/// Most control values that a model may take, and most values that it may give: those of a mesh of 44 million vertices.
+/// A file of a hundred bytes can declare any number, and the arrays are sized by it.
+inline constexpr std::int32_t modelInputLimit = std::int32_t{1} << 20;
+inline constexpr std::int32_t modelOutputLimit = std::int32_t{1} << 27;
+
 /// Loads one trained network and runs it on a vector of control values, on the CPU.
 ///
 /// A model can be run when it has exactly one input, float32 of shape [N] with N > 0, and at least one output, the
-/// first of which is float32 with a fully known shape of one or more dimensions, all positive; both element counts
-/// must fit a signed 32-bit integer. Further outputs are not computed. Any other model is refused at load, and so is
-/// one whose first output is its input itself, which computes nothing. A scalar output is refused because the runtime
-/// reports an output without a declared shape in the same way.
+/// first of which is float32 with a fully known shape of one or more dimensions, all positive; the element counts must
+/// be within the two limits above. Further outputs are not computed. Any other model is refused at load, and so is one
+/// whose first output is its input itself, which computes nothing. A scalar output is refused because the runtime
+/// reports an output without a declared shape in the same way. Refused as well, before the runtime sees them: a network
+/// whose data lie in other files, and one with a Loop that may make more than ten thousand rounds or any number.
 ///
 /// Thread: one thread at a time for one object; different objects are independent.
 class ModelSession {

@@ -146,9 +146,21 @@ TEST(ModelSessionLoad, UnusableModelsAreRefused) {
         {"bad_no_input", "the model does not have exactly one input"},
         {"bad_no_output", "the model has no output"},
         {"bad_operator", "NoSuchOperator"},
-        {"bad_truncated", "Protobuf parsing failed"},
-        {"bad_text", "Protobuf parsing failed"},
-        {"bad_empty", "does not have a graph"}};
+        {"bad_truncated", "it ends in the middle of a part"},
+        {"bad_text", "the file is damaged, or no ONNX file"},
+        {"bad_protobuf", "Protobuf parsing failed"},
+        {"bad_empty", "does not have a graph"},
+        {"bad_input_huge", "the input has 1000000000 values, and at most 1048576 are taken"},
+        {"bad_output_huge", "the first output has 2000000000 values, and at most 134217728 are taken"},
+        {"bad_loop_endless", "a Loop whose number of rounds is not a constant"},
+        {"bad_loop_computed", "a Loop whose number of rounds is not a constant"},
+        {"bad_loop_long", "its loops make more than 10000 rounds"},
+        {"bad_loop_nested", "its loops make more than 10000 rounds"},
+        {"bad_loop_in_function", "a Loop whose number of rounds is not a constant"},
+        {"bad_external", "data of the network lie in another file"},
+        {"bad_external_constant", "data of the network lie in another file"},
+        {"bad_external_in_branch", "data of the network lie in another file"},
+        {"bad_nested_deep", "its parts are nested too deep"}};
     std::size_t files = 0;
     for (const auto& entry : fs::directory_iterator(NW_TEST_MODELS)) {
         files += entry.path().filename().string().rfind("bad_", 0) == 0 ? 1u : 0u;

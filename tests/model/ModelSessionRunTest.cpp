@@ -55,6 +55,7 @@ TEST(ModelSessionRun, GivesTheFirstOutputInRowMajorOrder) {
         {"constant", {4, 5, 6}, {1, 2, 3}},
         {"initializer", {4, 5, 6}, {1, 2, 3}},
         {"data_dependent", {4, 5, 6}, {4, 5, 6}},
+        {"loop", {4, 5, 6}, {12, 15, 18}},
     };
     ModelSession session; // one for all: each load replaces the model before
     for (const Case& c : cases) {

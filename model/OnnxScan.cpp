@@ -1,0 +1,272 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "OnnxScan.h"
+
+#include <algorithm>
+#include <fstream>
+#include <limits>
+#include <map>
+#include <stdexcept>
+#include <string>
+#include <vector>
+
+namespace neuralWarp {
+namespace {
+
+constexpr std::uint64_t unbounded = std::numeric_limits<std::uint64_t>::max();
+constexpr int deepest = 100;               // as deep as the runtime reads
+constexpr std::uint64_t longestName = 512; // of what is kept to compare: the longest that matters is "Constant"
+
+/// The kinds of message of onnx.proto that are looked into; field numbers are those of that file.
+enum class Kind { none, model, graph, node, attribute, tensor, sparseTensor, function, training, valueInfo };
+
+Kind kindOfField(Kind message, std::uint64_t field) {
+    switch (message) {
+    case Kind::model:
+        return field == 7 ? Kind::graph : field == 20 ? Kind::training : field == 25 ? Kind::function : Kind::none;
+    case Kind::training:
+        return field == 1 || field == 2 ? Kind::graph : Kind::none;
+    case Kind::function:
+        return field == 7 ? Kind::node : field == 11 ? Kind::attribute : Kind::none;
+    case Kind::graph:
+        return field == 1    ? Kind::node
+               : field == 5  ? Kind::tensor
+               : field == 11 ? Kind::valueInfo
+               : field == 15 ? Kind::sparseTensor
+                             : Kind::none;
+    case Kind::node:
+        return field == 5 ? Kind::attribute : Kind::none;
+    case Kind::attribute:
+        return field == 5 || field == 10    ? Kind::tensor
+               : field == 6 || field == 11  ? Kind::graph
+               : field == 22 || field == 23 ? Kind::sparseTensor
+                                            : Kind::none;
+    case Kind::sparseTensor:
+        return field == 1 || field == 2 ? Kind::tensor : Kind::none;
+    default:
+        return Kind::none;
+    }
+}
+
+/// The wire format of protocol buffers.
+class Wire {
+public:
+    Wire(std::streambuf& source, std::uint64_t size)
+        : source_(source)
+        , size_(size) {}
+
+    std::uint64_t position() const { return position_; }
+    std::uint64_t size() const { return size_; }
+
+    std::uint64_t varint() {
+        std::uint64_t value = 0;
+        for (unsigned shift = 0; shift < 70; shift += 7) {
+            const std::uint64_t byte = next();
+            if (shift < 64)
+                value |= (byte & 127U) << shift;
+            if (byte < 128)
+                return value;
+        }
+        throw std::runtime_error("the file is damaged: a number in it has no end");
+    }
+    /// The low bytes first.
+    std::uint64_t fixed(std::uint64_t bytes) {
+        std::uint64_t value = 0;
+        for (std::uint64_t i = 0; i < bytes; ++i)
+            value |= std::uint64_t{next()} << (8 * i);
+        return value;
+    }
+    std::string text(std::uint64_t length) {
+        std::string bytes(static_cast<std::size_t>(std::min(length, longestName)), '\0');
+        for (char& byte : bytes)
+            byte = static_cast<char>(next());
+        skip(length - bytes.size());
+        return bytes;
+    }
+    void skip(std::uint64_t length) {
+        if (length > size_ - position_)
+            throwTruncated();
+        constexpr std::uint64_t readRather = 4096; // moving throws the buffer away
+        if (length >= readRather)
+            source_.pubseekoff(static_cast<std::streamoff>(length), std::ios::cur, std::ios::in);
+        for (std::uint64_t i = 0; length < readRather && i < length; ++i)
+            source_.sbumpc();
+        position_ += length;
+    }
+    [[noreturn]] static void throwTruncated() {
+        throw std::runtime_error("the file is damaged: it ends in the middle of a part");
+    }
+
+private:
+    std::uint8_t next() {
+        const auto byte = position_ < size_ ? source_.sbumpc() : Traits::eof();
+        if (Traits::eq_int_type(byte, Traits::eof()))
+            throwTruncated();
+        ++position_;
+        return static_cast<std::uint8_t>(Traits::to_char_type(byte));
+    }
+    using Traits = std::streambuf::traits_type;
+
+    std::streambuf& source_;
+    std::uint64_t position_ = 0;
+    std::uint64_t size_;
+};
+
+/// What is remembered of the message that is being read, for those in which it matters.
+struct Seen {
+    std::string name;                 ///< of a tensor or a value; the operator of a node
+    std::vector<std::string> inputs;  ///< of a node
+    std::vector<std::string> outputs; ///< of a node
+    std::uint64_t bound = 0;          ///< largest integer in a tensor, or in the attributes of a node
+    bool hasInteger = false;
+    void take(std::uint64_t value) {
+        bound = std::max(bound, value);
+        hasInteger = true;
+    }
+};
+
+class Scan {
+public:
+    explicit Scan(Wire& wire)
+        : wire_(wire) {}
+
+    void run() {
+        Seen ignored;
+        message(Kind::model, wire_.size(), 0, ignored);
+        checkLoops();
+    }
+
+private:
+    void message(Kind kind, std::uint64_t end, int depth, Seen& seen) {
+        if (depth > deepest)
+            throw std::runtime_error("its parts are nested too deep");
+        while (wire_.position() < end)
+            field(kind, end, depth, seen);
+        if (wire_.position() != end)
+            Wire::throwTruncated();
+    }
+
+    void field(Kind kind, std::uint64_t end, int depth, Seen& seen) {
+        const std::uint64_t key = wire_.varint();
+        const std::uint64_t number = key >> 3U;
+        switch (key & 7U) {
+        case 0:
+            return integer(kind, number, wire_.varint(), seen);
+        case 1:
+            return wire_.skip(8);
+        case 5:
+            return wire_.skip(4);
+        case 2:
+            break;
+        default:
+            throw std::runtime_error("the file is damaged, or no ONNX file");
+        }
+        const std::uint64_t length = wire_.varint();
+        if (length > end - std::min(end, wire_.position()))
+            Wire::throwTruncated();
+        if (const Kind inner = kindOfField(kind, number); inner != Kind::none)
+            return part(kind, inner, wire_.position() + length, depth, seen);
+        bytes(kind, number, length, seen);
+    }
+
+    void integer(Kind kind, std::uint64_t number, std::uint64_t value, Seen& seen) {
+        if (kind == Kind::tensor && number == 14 && value != 0)
+            throw std::runtime_error("data of the network lie in another file, which is not read");
+        if ((kind == Kind::tensor && number == 7) || (kind == Kind::attribute && number == 3))
+            seen.take(value);
+    }
+
+    void bytes(Kind kind, std::uint64_t number, std::uint64_t length, Seen& seen) {
+        if (kind == Kind::node && number == 1)
+            seen.inputs.push_back(wire_.text(length));
+        else if (kind == Kind::node && number == 2)
+            seen.outputs.push_back(wire_.text(length));
+        else if ((kind == Kind::node && number == 4) || (kind == Kind::tensor && number == 8) ||
+                 (kind == Kind::valueInfo && number == 1))
+            name(kind, length, seen);
+        else if (kind == Kind::function && number == 4)
+            define(wire_.text(length), unbounded);
+        else if (kind == Kind::tensor && (number == 7 || number == 9))
+            integers(number, length, seen);
+        else
+            wire_.skip(length);
+    }
+
+    void name(Kind kind, std::uint64_t length, Seen& seen) {
+        const std::string text = wire_.text(length);
+        // of a repeated operator the last counts for the runtime: a loop among them is one here
+        if (kind != Kind::node || seen.name != "Loop")
+            seen.name = text;
+    }
+
+    // a tensor of more than one value is no number of rounds
+    void integers(std::uint64_t number, std::uint64_t length, Seen& seen) {
+        if (length > 10)
+            seen.take(unbounded);
+        if (length > 10 || (number == 9 && length != 8))
+            return wire_.skip(length);
+        const std::uint64_t end = wire_.position() + length;
+        while (wire_.position() < end)
+            seen.take(number == 9 ? wire_.fixed(8) : wire_.varint());
+    }
+
+    void part(Kind kind, Kind inner, std::uint64_t end, int depth, Seen& seen) {
+        Seen within;
+        message(inner, end, depth + 1, within);
+        if (inner == Kind::node)
+            return node(within);
+        if (kind == Kind::graph && inner == Kind::tensor)
+            return define(within.name, within.hasInteger ? within.bound : unbounded);
+        if (kind == Kind::graph && inner == Kind::valueInfo && depth > 1) // those of the whole network are its controls
+            return define(within.name, unbounded);
+        if (within.hasInteger && (inner == Kind::attribute || inner == Kind::tensor))
+            seen.take(within.bound);
+    }
+
+    void node(const Seen& node) {
+        const bool isConstant = node.name == "Constant" && node.hasInteger;
+        for (const std::string& output : node.outputs)
+            define(output, isConstant ? node.bound : unbounded);
+        if (node.name == "Loop")
+            loops_.push_back(node.inputs.empty() ? std::string() : node.inputs.front());
+    }
+
+    // names count wherever they stand: one that means two things is taken for the larger
+    void define(const std::string& name, std::uint64_t bound) {
+        const auto [at, isNew] = bounds_.emplace(name, bound);
+        if (!isNew)
+            at->second = std::max(at->second, bound);
+    }
+
+    void checkLoops() const {
+        std::uint64_t rounds = 1;
+        for (const std::string& name : loops_) {
+            const auto found = bounds_.find(name);
+            if (name.empty() || found == bounds_.end() || found->second == unbounded)
+                throw std::runtime_error("it has a Loop whose number of rounds is not a constant: it need not end");
+            const std::uint64_t bound = std::max<std::uint64_t>(found->second, 1);
+            if (bound > loopRoundLimit / rounds)
+                throw std::runtime_error("its loops make more than " + std::to_string(loopRoundLimit) + " rounds");
+            rounds *= bound;
+        }
+    }
+
+    Wire& wire_;
+    std::map<std::string, std::uint64_t> bounds_; ///< largest integer that a name can stand for
+    std::vector<std::string> loops_;              ///< the names of their numbers of rounds
+};
+
+} // namespace
+
+void scanOnnx(std::streambuf& source, std::uint64_t size) {
+    Wire wire(source, size);
+    Scan(wire).run();
+}
+
+void scanOnnxFile(const std::filesystem::path& path) {
+    std::filebuf file;
+    if (!file.open(path, std::ios::in | std::ios::binary))
+        throw std::runtime_error("the file cannot be opened");
+    scanOnnx(file, std::filesystem::file_size(path));
+}
+
+} // namespace neuralWarp
