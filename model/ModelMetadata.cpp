@@ -36,9 +36,9 @@ std::vector<std::uint32_t> readAffectMap(const json::Value& root) {
 
 } // namespace
 
-bool readMetadata(ModelMetadata& record, std::streambuf& source) {
+bool readMetadata(ModelMetadata& record, std::streambuf& source, const std::filesystem::path& path) {
     json::Document root;
-    if (!json::parse(root, source) || !root.IsObject()) {
+    if (!json::parseObject(root, source, path)) {
         return false;
     }
     ModelMetadata read; // the record must not be left half filled when memory runs out
@@ -59,10 +59,9 @@ bool readMetadata(ModelMetadata& record, std::streambuf& source) {
 bool readMetadataFile(ModelMetadata& record, const std::filesystem::path& path) noexcept {
     try {
         std::filebuf file;
-        return json::open(file, path, metadataFileLimit) && readMetadata(record, file);
+        return json::open(file, path, metadataFileLimit) && readMetadata(record, file, path);
     } catch (...) {
-        json::printCurrentException();
-        return false;
+        return json::refuseByException(path);
     }
 }
 

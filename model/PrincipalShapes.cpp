@@ -5,6 +5,7 @@
 #include <cmath>
 #include <cstdio>
 #include <limits>
+#include <string>
 
 #include "json.h"
 #include "readers.h"
@@ -19,8 +20,17 @@ bool fitsFloat(const json::Value& value) {
     return value.IsNumber() && std::fabs(value.GetDouble()) < floatRoundingLimit;
 }
 
-bool isShape(const json::Value& value, std::uint64_t coordinates) {
-    return value.IsArray() && value.Size() >= coordinates && std::all_of(value.Begin(), value.End(), fitsFloat);
+/// Why a value of the list is no shape; empty when it is one.
+std::string whyNoShape(const json::Value& value, std::uint64_t coordinates) {
+    if (!value.IsArray()) {
+        return "is no array";
+    }
+    if (value.Size() < coordinates) {
+        return "has " + std::to_string(value.Size()) + " numbers, and " + std::to_string(coordinates) + " are needed";
+    }
+    const json::Value* bad = std::find_if_not(value.Begin(), value.End(), fitsFloat);
+    return bad == value.End() ? ""
+                              : "has no number that a float can hold at place " + std::to_string(bad - value.Begin());
 }
 
 /// Transposes the list of shapes into vertex-major order. Every shape holds at least 3 * vertCount numbers, so the size
@@ -36,7 +46,7 @@ void appendVertexMajor(std::vector<float>& values, const json::Value& list, std:
     }
 }
 
-bool readShapes(PrincipalShapes& shapes, const json::Value& root) {
+bool readShapes(PrincipalShapes& shapes, const json::Value& root, const std::filesystem::path& path) {
     const json::Value* list = json::find(root, "principalShapes");
     const std::uint64_t found = list != nullptr && list->IsArray() ? list->Size() : 0;
     if (found != shapes.shapeCount) {
@@ -44,8 +54,11 @@ bool readShapes(PrincipalShapes& shapes, const json::Value& root) {
         return false;
     }
     const std::uint64_t coordinates = 3 * shapes.vertCount;
-    if (!std::all_of(list->Begin(), list->End(), [=](const json::Value& v) { return isShape(v, coordinates); })) {
-        return false;
+    for (rapidjson::SizeType shape = 0; shape < list->Size(); ++shape) {
+        const std::string reason = whyNoShape((*list)[shape], coordinates);
+        if (!reason.empty()) {
+            return json::refuse(path, "shape " + std::to_string(shape) + " " + reason);
+        }
     }
     appendVertexMajor(shapes.values, *list, shapes.vertCount);
     return true;
@@ -53,9 +66,9 @@ bool readShapes(PrincipalShapes& shapes, const json::Value& root) {
 
 } // namespace
 
-bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source) {
+bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source, const std::filesystem::path& path) {
     json::Document root;
-    if (!json::parse(root, source) || !root.IsObject()) {
+    if (!json::parseObject(root, source, path)) {
         return false;
     }
     shapes.shapeCount = json::readUint(root, "principalShapeCount", 0);
@@ -66,7 +79,7 @@ bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source) {
     if (shapes.shapeCount == 0 || shapes.vertCount == 0) {
         return true;
     }
-    if (!readShapes(shapes, root)) {
+    if (!readShapes(shapes, root, path)) {
         shapes.shapeCount = 0;
         return false;
     }
@@ -81,14 +94,13 @@ bool readPrincipalShapesFile(const std::filesystem::path& path, std::vector<floa
     try {
         std::filebuf file;
         PrincipalShapes shapes;
-        const bool ok = json::open(file, path, principalShapesFileLimit) && readPrincipalShapes(shapes, file);
+        const bool ok = json::open(file, path, principalShapesFileLimit) && readPrincipalShapes(shapes, file, path);
         values.swap(shapes.values);
         shapeCount = shapes.shapeCount;
         vertCount = shapes.vertCount;
         return ok;
     } catch (...) {
-        json::printCurrentException();
-        return false;
+        return json::refuseByException(path);
     }
 }
 

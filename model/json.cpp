@@ -24,6 +24,8 @@ public:
     }
     std::size_t Tell() const { return count_; }
 
+    static bool isEnd(std::streambuf& source) { return Traits::eq_int_type(source.sgetc(), Traits::eof()); }
+
     // Part of RapidJSON's stream concept; only parsing in place would call them.
     Ch* PutBegin() { return nullptr; }
     void Put(Ch) {}
@@ -52,32 +54,41 @@ bool open(std::filebuf& file, const std::filesystem::path& path, std::uint64_t l
     }
     const std::uintmax_t size = std::filesystem::file_size(path, error);
     if (!error && size > limit) {
-        std::printf("Error: file is larger than %llu bytes\n", static_cast<unsigned long long>(limit));
-        return false;
+        return refuse(path, "the file is larger than " + std::to_string(limit) + " bytes");
     }
     return true;
 }
 
-bool parse(Document& document, std::streambuf& source) {
+bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path) {
     StreambufInput input(source);
     // Iterative: recursion would let a file of brackets overflow the stack of the evaluation thread.
     document.ParseStream<rapidjson::kParseDefaultFlags | rapidjson::kParseIterativeFlag>(input);
-    if (document.HasParseError()) {
+    // the parser takes a zero byte for the end
+    if (document.HasParseError() || !StreambufInput::isEnd(source)) {
         std::fputs("Parse error\n", stdout);
         return false;
     }
-    return true;
+    return document.IsObject() || refuse(path, "it holds no JSON object");
 }
 
-void printCurrentException() noexcept {
+bool refuse(const std::filesystem::path& path, const char* reason) noexcept {
+    std::printf("Error: %s: %s\n", path.c_str(), reason);
+    return false;
+}
+
+bool refuse(const std::filesystem::path& path, const std::string& reason) noexcept {
+    return refuse(path, reason.c_str());
+}
+
+bool refuseByException(const std::filesystem::path& path) noexcept {
     try {
         throw;
     } catch (const std::bad_alloc&) {
-        std::fputs("Error: out of memory\n", stdout);
+        return refuse(path, "out of memory");
     } catch (const std::exception& error) {
-        std::printf("Error: %s\n", error.what());
+        return refuse(path, error.what());
     } catch (...) {
-        std::fputs("Error: unknown\n", stdout);
+        return refuse(path, "unknown error");
     }
 }
 

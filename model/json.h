@@ -42,16 +42,21 @@ using Pool = rapidjson::MemoryPoolAllocator<ThrowingAllocator>;
 using Document = rapidjson::GenericDocument<rapidjson::UTF8<>, Pool, ThrowingAllocator>;
 using Value = Document::ValueType;
 
-/// Opens a regular file of at most `limit` bytes. On failure prints the reason as one line on standard output and
-/// returns false.
+/// Opens a regular file of at most `limit` bytes. On failure prints "Failed to open metadata file stream\n", or what
+/// refuse() does for a file that is too large, and returns false.
 bool open(std::filebuf& file, const std::filesystem::path& path, std::uint64_t limit);
 
-/// Parses the rest of `source` as one JSON document, nested to any depth. On failure prints "Parse error\n" on standard
-/// output and returns false. Throws std::bad_alloc.
-bool parse(Document& document, std::streambuf& source);
+/// Parses the rest of `source` as one JSON document, nested to any depth: an object, and nothing but white space after
+/// it, not even behind a zero byte. On failure prints "Parse error\n", or what refuse() does for another root, and
+/// returns false. `path` is what the source is called. Throws std::bad_alloc.
+bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path);
 
-/// Prints "Error: REASON\n" for the exception in flight. Call it from a catch block only.
-void printCurrentException() noexcept;
+/// Prints "Error: PATH: REASON\n" on standard output, and returns false.
+bool refuse(const std::filesystem::path& path, const char* reason) noexcept;
+bool refuse(const std::filesystem::path& path, const std::string& reason) noexcept;
+
+/// refuse() with the reason of the exception in flight. Call it from a catch block only.
+bool refuseByException(const std::filesystem::path& path) noexcept;
 
 /// First member named `key`, or null. `object` must be an object.
 const Value* find(const Value& object, const char* key);

@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-// The readers of the model directory, from any source of bytes. The file readers open their file and call these.
+// The readers of the model directory, from any source of bytes. The file readers open their file and call these, with
+// its path for their messages.
 #pragma once
 
 #include <cstdint>
+#include <filesystem>
 #include <streambuf>
 #include <vector>
 
@@ -11,7 +13,7 @@
 namespace neuralWarp {
 
 /// readMetadataFile() on the rest of `source`. May throw; `record` is unchanged then.
-bool readMetadata(ModelMetadata& record, std::streambuf& source);
+bool readMetadata(ModelMetadata& record, std::streambuf& source, const std::filesystem::path& path);
 
 /// Outputs of readPrincipalShapesFile().
 struct PrincipalShapes {
@@ -21,6 +23,6 @@ struct PrincipalShapes {
 };
 
 /// readPrincipalShapesFile() on the rest of `source`. `shapes` must be fresh. May throw; `shapes` is of no use then.
-bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source);
+bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source, const std::filesystem::path& path);
 
 } // namespace neuralWarp

@@ -75,7 +75,10 @@ void neuralWarpData::copy(const HPxData& source) {
     useAffectMap = other.useAffectMap;
     affectedVertices = other.affectedVertices;
     mappedSlotCount = other.mappedSlotCount;
+    directoryState = other.directoryState;
     session.load(other.session.modelPath(), true);
+    if (isReplaced())
+        setModelPathDirty(true); // the network may be of another model than the rest
 }
 
 void neuralWarpData::markAllDirty() {

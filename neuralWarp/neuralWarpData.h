@@ -4,6 +4,7 @@
 
 #include "neuralWarp/DeltaSettings.h"
 #include "neuralWarp/PhaseClock.h"
+#include "nw_model/DirectoryState.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
 #include "openquarn/HPxData.h"
@@ -17,6 +18,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
+#include <optional>
 #include <vector>
 
 namespace neuralWarp {
@@ -108,6 +110,10 @@ public:
     std::filesystem::path modelDirectory; ///< empty: no model directory is resolved
     ModelSession session;
     ModelMetadata metadata;
+    /// The model directory when the metadata were read, if they could be: what is loaded later is of the same model
+    /// only while the directory is the same.
+    std::optional<DirectoryState> directoryState;
+    bool isReplaced() const { return directoryState && !directoryState->isStillThatOf(modelDirectory); }
     DeltaSettings activeSettings; ///< in force
     DeltaSettings modelSettings;  ///< what the metadata asks for
     DeltaSettings exportSettings; ///< what the export attributes ask for

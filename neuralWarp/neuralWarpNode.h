@@ -122,10 +122,14 @@ private:
     void raiseReloadFlags();
 
     // Loading a model, in this order. Each does its work only when its flag says so (or `force`), clears the flag
-    // before, and is not tried again by itself.
+    // before, and is not tried again by itself. The directory is to be the same from the metadata to the last file:
+    // when it is not, loadModel() fails in silence with all flags raised.
     HStatus resolveModelDirectory(HDataBlock& block, neuralWarpData& data);
     HStatus loadMetadata(neuralWarpData& data, bool force);
     HStatus loadModel(neuralWarpData& data, bool force);
+    /// loadModel(), from the directory on while that is replaced or written into, a few times; then it says so. Fails
+    /// only when the rest caches do.
+    HStatus loadWholeModel(HDataBlock& block, neuralWarpData& data);
     HStatus validateModel(neuralWarpData& data);
     HStatus findModelDirectory(HDataBlock& block, neuralWarpData& data);
     HStatus loadNetwork(neuralWarpData& data);

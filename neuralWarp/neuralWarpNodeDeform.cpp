@@ -111,7 +111,9 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
         isActive = false; // nothing of the model would be left to see
     } else if (isActive) {
         if (data->modelLoadPending)
-            loadModel(*data, false); // a failure shows in canApplyModel()
+            status = loadWholeModel(block, *data);
+        if (status.error())
+            return status;
     } else if (!isMorphed) {
         data->modelApplied = false;
         data->leaveLoads(isGivenUp);

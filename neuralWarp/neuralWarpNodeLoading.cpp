@@ -64,6 +64,14 @@ void clearPrincipalShapes(neuralWarpData& data) {
     data.bump(neuralWarpData::principalShapesCache);
 }
 
+/// The directory is not the one any more of which the metadata are: nothing is applied, and everything is due again.
+HStatus dueAgain(neuralWarpData& data) {
+    data.modelValid = false;
+    clearPrincipalShapes(data);
+    data.setModelPathDirty(true);
+    return HStatus::kFailure;
+}
+
 /// None when the directory has no such file, or a bad one.
 HStatus loadPrincipalShapes(neuralWarpData& data) {
     const fs::path file = data.modelDirectory / "principal_shapes.json";
@@ -87,6 +95,7 @@ HStatus neuralWarpNode::resolveModelDirectory(HDataBlock& block, neuralWarpData&
     data.modelLoadPending = true;
     data.modelDirectory.clear();
     data.modelRootPath.clear();
+    data.directoryState.reset();
     return findModelDirectory(block, data);
 }
 
@@ -125,6 +134,7 @@ HStatus neuralWarpNode::loadMetadata(neuralWarpData& data, bool force) {
     if (!data.metadataDirty && !force)
         return HStatus::kSuccess;
     data.metadataDirty = false;
+    data.directoryState.reset();
     if (data.modelDirectory.empty())
         return HStatus::kFailure;
     const fs::path file = data.modelDirectory / "metadata.json";
@@ -133,10 +143,12 @@ HStatus neuralWarpNode::loadMetadata(neuralWarpData& data, bool force) {
         return reported(entry.status, sourceUnit::node);
     if (!entry.exists())
         return HStatus::kFailure;
+    const DirectoryState state = DirectoryState::atRest(data.modelDirectory);
     if (!readMetadataFile(data.metadata, file)) {
         raiseMessage<Text::kErrorMLMetaLoadFailed>(displayErrorGated, name(), file);
         return HStatus::kFailure;
     }
+    data.directoryState = state;
     data.modelSettings.smoothingIterations = data.metadata.smoothingIterations;
     data.modelSettings.deltaMode = data.metadata.deltaMode;
     return HStatus::kSuccess;
@@ -150,10 +162,16 @@ HStatus neuralWarpNode::loadModel(neuralWarpData& data, bool force) {
     clearPrincipalShapes(data);
     if (data.modelDirectory.empty())
         return HStatus::kFailure;
+    if (data.isReplaced())
+        return dueAgain(data);
     if (const HStatus status = validateModel(data); status.error())
         return reported(status, sourceUnit::node);
     HStatus network = loadNetwork(data);
+    if (data.modelLoadPending)
+        return network;
     const HStatus shapes = loadPrincipalShapes(data);
+    if (data.isReplaced())
+        return dueAgain(data);
     if (shapes.error()) {
         data.modelValid = false; // without knowing its shapes, the network's outputs would be taken for deltas
         return reported(shapes, sourceUnit::node);
@@ -163,11 +181,37 @@ HStatus neuralWarpNode::loadModel(neuralWarpData& data, bool force) {
 
 HStatus neuralWarpNode::loadNetwork(neuralWarpData& data) {
     const fs::path file = data.modelDirectory / "model.onnx";
-    showLoadResult(data.session.load(file, true), file);
+    const LoadResult result = data.session.load(file, true);
+    if (data.isReplaced())
+        return dueAgain(data); // whatever came of it
+    showLoadResult(result, file);
     if (data.session.isLoaded())
         return HStatus::kSuccess;
     raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
-    return HStatus::kFailure;
+    const std::string& reason = data.session.errorText();
+    if (reason.empty())
+        return HStatus::kFailure;
+    return reported({HStatus::kFailure, "'" + file.string() + "' cannot be used: " + reason}, sourceUnit::node);
+}
+
+HStatus neuralWarpNode::loadWholeModel(HDataBlock& block, neuralWarpData& data) {
+    constexpr int attempts = 4; // who writes for longer than they take is not done yet
+    for (int i = 0; i < attempts; ++i) {
+        loadModel(data, false); // a failure shows in canApplyModel()
+        if (!data.modelLoadPending)
+            return HStatus::kSuccess;
+        if (i + 1 == attempts)
+            break;
+        if (!updateModelSettings(block, data))
+            return HStatus::kSuccess;
+        if (const HStatus status = prepareRestState(data, block, data.multiIndex); status.error())
+            return status;
+    }
+    raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
+    reported({HStatus::kFailure, "'" + data.modelDirectory.string() +
+                                     "' was written again and again while it was read: the next evaluation reads it"},
+             sourceUnit::node);
+    return HStatus::kSuccess;
 }
 
 HStatus neuralWarpNode::validateModel(neuralWarpData& data) {

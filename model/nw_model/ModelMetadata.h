@@ -43,10 +43,11 @@ inline constexpr std::uint64_t metadataFileLimit = std::uint64_t{64} << 20;
 ///
 /// Returns true on success. On failure false, after one line on standard output:
 ///   "Failed to open metadata file stream\n"          no such file, not a regular file, or not readable
-///   "Error: file is larger than 67108864 bytes\n"    more than metadataFileLimit; nothing is read
-///   "Parse error\n"                                  not one JSON document
-///   "Error: REASON\n"                                no memory, or another failure of the system
-/// A root value that is not an object is refused without a line. Never throws.
+///   "Parse error\n"                                  not one JSON document, or more than that
+///   "Error: PATH: REASON\n"                          larger than metadataFileLimit, of which nothing is read; a root
+///                                                    value that is not an object; no memory, or another failure of
+///                                                    the system
+/// Never throws.
 ///
 /// Thread: any; no shared state.
 bool readMetadataFile(ModelMetadata& record, const std::filesystem::path& path) noexcept;

@@ -21,12 +21,12 @@ inline constexpr std::uint64_t principalShapesFileLimit = std::uint64_t{1} << 30
 /// `vertCount`  set to 0 first, then to the number of vertices V of each shape.
 ///
 /// Returns true on success, also when S or V is 0 (nothing to load, `values` empty). On failure `values` is empty and S
-/// is 0, and one line may have gone to standard output:
-///   "Failed to open metadata file stream\n", "Parse error\n", "Error: file is larger than 1073741824 bytes\n" or
-///   "Error: REASON\n"    as for readMetadataFile; V is 0
+/// is 0, and one line has gone to standard output:
+///   "Failed to open metadata file stream\n", "Parse error\n" or "Error: PATH: REASON\n"    as for readMetadataFile;
+///                                                                                         V is 0
 ///   "Error: principalShapeCount does not match the number of principal shapes\n"    V stays as read
-/// Refused without a line: a root value that is not an object (V is 0); a shape that is not an array, is shorter than
-/// 3 * V, or holds anything but numbers that a float can hold, even behind its first 3 * V elements (V stays as read).
+///   "Error: PATH: shape I REASON\n"    it is not an array, is shorter than 3 * V, or holds anything but numbers that a
+///                                      float can hold, even behind its first 3 * V elements; V stays as read
 /// A number beyond the range of float is refused rather than taken as infinity, because one such value would make
 /// every position of its vertex infinite or NaN. Never throws.
 ///

@@ -68,7 +68,7 @@ bool fuzzMetadata(const std::uint8_t* data, std::size_t size) {
     MemoryBuffer source(data, size);
     ModelMetadata record;
     record.fullCount = 123456789;
-    const bool accepted = readMetadata(record, source);
+    const bool accepted = readMetadata(record, source, "metadata");
     require(record.loaded == accepted);
     require(accepted || record.fullCount == 123456789);
     require(record.affectMap.size() <= size); // an index takes a byte at least
@@ -78,7 +78,7 @@ bool fuzzMetadata(const std::uint8_t* data, std::size_t size) {
 bool fuzzPrincipalShapes(const std::uint8_t* data, std::size_t size) {
     MemoryBuffer source(data, size);
     PrincipalShapes shapes;
-    const bool accepted = readPrincipalShapes(shapes, source);
+    const bool accepted = readPrincipalShapes(shapes, source, "shapes");
     require(accepted || (shapes.shapeCount == 0 && shapes.values.empty()));
     require(!accepted || shapes.values.size() == 3 * shapes.shapeCount * shapes.vertCount);
     require(shapes.values.capacity() <= size);

@@ -56,7 +56,7 @@ TEST(NoMemory, MetadataRecordIsUnchanged) {
         const NoLargeArrays limit;
         EXPECT_FALSE(readMetadataFile(record, path));
     }
-    EXPECT_EQ(out.take(), "Error: out of memory\n");
+    EXPECT_EQ(out.take(), "Error: " + path.string() + ": out of memory\n");
     EXPECT_FALSE(record.loaded);
     EXPECT_EQ(record.fullCount, 0u);
     EXPECT_TRUE(readMetadataFile(record, path));
@@ -75,7 +75,7 @@ TEST(NoMemory, PrincipalShapesAreEmpty) {
         const NoLargeArrays limit;
         EXPECT_FALSE(readPrincipalShapesFile(path, values, shapeCount, vertCount));
     }
-    EXPECT_EQ(out.take(), "Error: out of memory\n");
+    EXPECT_EQ(out.take(), "Error: " + path.string() + ": out of memory\n");
     EXPECT_THAT(values, IsEmpty());
     EXPECT_EQ(shapeCount + vertCount, 0u);
     EXPECT_TRUE(readPrincipalShapesFile(path, values, shapeCount, vertCount));

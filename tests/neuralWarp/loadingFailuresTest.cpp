@@ -5,6 +5,7 @@
 
 #include "openquarn_app/Animation.h"
 #include "openquarn_app/Commands.h"
+#include "openquarn_app/Messages.h"
 #include "openquarn_app/Usage.h"
 
 #include <functional>
@@ -246,16 +247,81 @@ TEST_F(LoadingFailures, OfTheNetworkAndItsShapes) {
     const char* file = "model.onnx";
     const char* shapes = "principal_shapes.json";
     const std::string printed = "[NEURAL WARP] ERROR, Failed to load the ONNX model ROOT/model.nwrp/model.onnx\n";
+    const auto refused = [](const std::string& why) {
+        return networkFails({modelInit, report("'ROOT/model.nwrp/model.onnx' cannot be used: " + why)});
+    };
     expectRows({
         {"missing", gone(file), networkFails({badPath("ROOT/model.nwrp/model.onnx"), modelInit})},
-        {"damaged", text(file, "no network"), networkFails({modelInit}), printed},
-        {"a directory", folderAt(file), networkFails({modelInit}), printed},
-        {"loop of links", loopAt(file), networkFails({modelInit}), printed},
+        {"damaged", text(file, "no network"), refused("the file is damaged, or no ONNX file"), printed},
+        {"a directory", folderAt(file), refused("not a regular file"), printed},
+        {"loop of links", loopAt(file), refused("Too many levels of symbolic links"), printed},
         {"bad shapes", text(shapes, "[1"), loads({}), "Parse error\n"},
+        {"no object of shapes", text(shapes, "[1]"), loads({}),
+         "Error: ROOT/model.nwrp/principal_shapes.json: it holds no JSON object\n"},
+        {"shapes that are too short",
+         text(shapes, R"({"principalShapeCount":1,"vertCount":1,"principalShapes":[[1]]})"), loads({}),
+         "Error: ROOT/model.nwrp/principal_shapes.json: shape 0 has 1 numbers, and 3 are needed\n"},
         {"shapes of another count", text(shapes, R"({"principalShapeCount":2,"vertCount":1,"principalShapes":[[1]]})"),
          loads({}), "Error: principalShapeCount does not match the number of principal shapes\n"},
         {"loop instead of shapes", loopAt(shapes), networkFails({unanswered("model.nwrp/principal_shapes.json")}, "")},
     });
+}
+
+/// The directory becomes that of another model in the middle of a load, at a message of it: what comes out is the other
+/// model, and nothing of both.
+TEST_F(LoadingFailures, ADirectoryThatIsReplacedWhileItIsRead) {
+    const auto warns = [](ModelSpec& spec) { spec.affectCount = 7; };
+    const auto isOther = [](ModelSpec& spec) {
+        spec.smoothingIterations = 2;
+        std::reverse(spec.bias.begin(), spec.bias.end());
+        spec.shapes = {spec.bias, spec.bias};
+    };
+    writeChanged(isOther);
+    makeRig();
+    ASSERT_EQ(deform(), "");
+    const Coordinates other = result(*rig);
+    fs::rename(modelDirectory(), folder.path() / "other");
+
+    const auto exchanged = [&] {
+        fs::rename(modelDirectory(), folder.path() / "before");
+        fs::rename(folder.path() / "other", modelDirectory());
+    };
+    const auto writtenInto = [&] { writeChanged(isOther); };
+    const auto writtenAgain = [&] { writeChanged(warns); };
+    struct Case {
+        const char* name;
+        std::function<void()> change;
+        unsigned warnings;
+        bool isGivenUp;
+    };
+    for (const Case& c : {Case{"written into", writtenInto, 1, false},
+                          {"again and again", writtenAgain, 4, true},
+                          {"exchanged", exchanged, 1, false}}) {
+        SCOPED_TRACE(c.name);
+        writeChanged(warns);
+        makeRig();
+        OpenQuarn::MessageSink before;
+        before = OpenQuarn::setMessageSink([&](const OpenQuarn::Message& message) {
+            before(message);
+            if (message.severity == OpenQuarn::Severity::warning)
+                c.change();
+        });
+        EXPECT_EQ(deform(), "");
+        OpenQuarn::setMessageSink(std::move(before));
+        Texts messages(c.warnings, affectCountMismatch(7));
+        if (c.isGivenUp)
+            messages.insert(messages.end(), {modelInit, report("'ROOT/model.nwrp' was written again and again while it "
+                                                               "was read: the next evaluation reads it")});
+        EXPECT_EQ(shown(), messages);
+        EXPECT_EQ(result(*rig), c.isGivenUp ? rounded() : other);
+        if (!c.isGivenUp)
+            continue;
+        EXPECT_EQ(stateText::raised(*rig->state(0)), "load metadata path");
+        writeChanged(isOther);
+        EXPECT_EQ(deform(), "");
+        EXPECT_EQ(result(*rig), other);
+        EXPECT_THAT(shown(), IsEmpty());
+    }
 }
 
 TEST_F(LoadingFailures, TheExtensionOfANameIsReplaced) {

@@ -328,6 +328,14 @@ TEST(Copy, TakesTheModelAndKeepsWhatWasMeasured) {
     EXPECT_TRUE(copied.modelRootPath.empty());
     EXPECT_THAT(copied.cacheVersions, testing::Each(never));
 
+    // a directory that was written into since: the network need not be the one of the rest
+    source.directoryState = neuralWarp::DirectoryState::atRest(source.modelDirectory);
+    copied.copy(source);
+    EXPECT_FALSE(copied.modelPathDirty);
+    writeFile(source.modelDirectory / "principal_shapes.json", "{}");
+    copied.copy(source);
+    EXPECT_TRUE(copied.modelPathDirty && copied.metadataDirty && copied.modelLoadPending);
+
     // a model that has gone is not carried on
     std::filesystem::remove_all(source.modelDirectory);
     copied.copy(source);
