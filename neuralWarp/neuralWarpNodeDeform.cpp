@@ -96,7 +96,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
         return HStatus::kSuccess;
     }
 
-    const bool isGivenUp = isActive && !updateModelSettings(block, *data);
+    bool isGivenUp = isActive && !updateModelSettings(block, *data);
     isActive = isActive && !isGivenUp;
     status = prepareRestState(*data, block, multiIndex);
     if (status.error())
@@ -114,6 +114,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
             status = loadWholeModel(block, *data);
         if (status.error())
             return status;
+        isGivenUp = data->modelLoadPending;
     } else if (!isMorphed) {
         data->modelApplied = false;
         data->leaveLoads(isGivenUp);
