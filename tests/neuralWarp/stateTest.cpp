@@ -329,6 +329,8 @@ TEST(Copy, TakesTheModelAndKeepsWhatWasMeasured) {
     EXPECT_THAT(copied.cacheVersions, testing::Each(never));
 
     // a directory that was written into since: the network need not be the one of the rest
+    source.setModelPathDirty(false);
+    source.metadataDirty = source.modelLoadPending = false;
     source.directoryState = neuralWarp::DirectoryState::atRest(source.modelDirectory);
     copied.copy(source);
     EXPECT_FALSE(copied.modelPathDirty);

@@ -63,11 +63,13 @@ Json toJson(const quill::mat4d& matrix, JsonAllocator& allocator) {
     return rows;
 }
 
-std::vector<std::string> linesOf(const std::string& text) {
+std::vector<std::string> linesOf(const std::string& printed) {
     std::vector<std::string> lines;
-    for (std::size_t begin = 0; begin < text.size();) {
-        const std::size_t end = std::min(text.find('\n', begin), text.size() - 1) + 1;
-        lines.push_back(text.substr(begin, end - begin));
+    for (std::size_t begin = 0; begin < printed.size();) {
+        const std::size_t end = std::min(printed.find('\n', begin), printed.size() - 1) + 1;
+        lines.push_back(printed.substr(begin, end - begin));
+        if (lines.back().rfind("Error: /", 0) == 0)
+            lines.pop_back();
         begin = end;
     }
     return lines;

@@ -69,8 +69,9 @@ Json toJson(const std::vector<T>& values, JsonAllocator& allocator) {
     return list;
 }
 
-// The lines of a text, with their line ends.
-std::vector<std::string> linesOf(const std::string& text);
+// The lines of what was printed, with their line ends. Without those in which the readers of model files say why they
+// refuse a file that cases say nothing about: "Error: PATH: REASON".
+std::vector<std::string> linesOf(const std::string& printed);
 
 // Builds the object of actual values.
 class Output {
