@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // quarn: the host without a screen.
+#include "openquarn_app/Messages.h"
 #include "quarn/commands.h"
 #include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
+#include "quarn/console/printable.h"
 
 #include <CLI/CLI.hpp>
 
@@ -27,6 +29,11 @@ void requireCommand(const CLI::App& app, int argc, char** argv) {
         names += (names.empty() ? "" : ", ") + command->get_name();
     }
     throw quarn::UsageError("there is no command \"" + first + "\"; there are " + names);
+}
+
+// as the host does it, but for control characters in names that come from files
+void print(const OpenQuarn::Message& message) {
+    std::cerr << std::string(OpenQuarn::severityName(message.severity)) + ": " + quarn::printable(message.text) + "\n";
 }
 
 int run(int argc, char** argv) {
@@ -59,6 +66,7 @@ int run(int argc, char** argv) {
 
 int main(int argc, char** argv) {
     try {
+        OpenQuarn::setMessageSink(print);
         return run(argc, argv);
     } catch (const quarn::Interrupted& interrupted) {
         std::cerr << "quarn: " << interrupted.what() << '\n';
@@ -67,7 +75,7 @@ int main(int argc, char** argv) {
         std::cerr << "quarn: " << error.what() << "\nRun with --help for more information.\n";
         return wrongUsage;
     } catch (const std::exception& error) {
-        std::cerr << "quarn: " << error.what() << '\n';
+        std::cerr << "quarn: " << quarn::printable(error.what()) << '\n';
         return 1;
     }
 }

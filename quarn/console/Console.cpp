@@ -2,6 +2,7 @@
 #include "quarn/console/Console.h"
 
 #include "quarn/console/interrupt.h"
+#include "quarn/console/printable.h"
 
 #include <cmath>
 #include <iostream>
@@ -29,11 +30,11 @@ std::string timeText(double seconds) {
 
 void Console::note(const std::string& sentence) const {
     if (!quiet)
-        std::cerr << sentence + "\n";
+        std::cerr << printable(sentence) + "\n";
 }
 
 void Console::warn(const std::string& sentence) const {
-    std::cerr << "warning: " + sentence + "\n";
+    std::cerr << "warning: " + printable(sentence) + "\n";
 }
 
 Progress::Progress(const Console& console, std::string what, std::size_t total)

@@ -3,6 +3,7 @@
 
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Session.h"
+#include "quarn/console/printable.h"
 #include "quarn/scene/SceneSession.h"
 
 #include <CLI/CLI.hpp>
@@ -16,7 +17,7 @@ namespace {
 
 // what commands print goes to standard output, what the host has to say to standard error
 void print(const OpenQuarn::CommandValue& value) {
-    std::cout << OpenQuarn::printedValue(value) << std::endl;
+    std::cout << printable(OpenQuarn::printedValue(value)) << std::endl;
 }
 
 OpenQuarn::CommandOutcome runFile(const std::string& file, OpenQuarn::OnShownError onShownError) {

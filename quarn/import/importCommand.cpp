@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/commands.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/printable.h"
 #include "quarn/import/importCharacter.h"
 
 #include <CLI/CLI.hpp>
@@ -68,7 +69,7 @@ void execute(const Options& options) {
         options.console.warn(warning);
     for (const std::string& note : report.notes)
         options.console.note(note);
-    std::cout << (options.console.json ? reportJson(report) : reportText(report));
+    std::cout << printable(options.console.json ? reportJson(report) : reportText(report));
 }
 
 } // namespace

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/info/ModelReport.h"
 
+#include "nw_model/DirectoryState.h"
 #include "quarn/scene/modelFiles.h"
 
 #include <algorithm>
@@ -103,11 +104,14 @@ ModelReport readModel(const fs::path& directory, neuralWarp::ModelSession& sessi
         throw std::runtime_error(directory.string() + " is no model directory");
     ModelReport model;
     model.directory = directory;
+    const auto state = neuralWarp::DirectoryState::atRest(directory);
     for (const char* file : {"metadata.json", "model.onnx", "principal_shapes.json"})
         model.bytes += sizeOf(directory / file);
     readMetadata(directory, model.metadata, model.problems);
     readNetwork(model, session);
     readShapes(model);
+    if (!state.isStillThatOf(directory))
+        throw std::runtime_error(directory.string() + " was replaced or written into while it was read");
     if (model.metadata.loaded && model.outputs != 0)
         checkReach(model.problems, model, trainedVertices(model.metadata));
     return model;

@@ -4,6 +4,7 @@
 
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
+#include "quarn/files/npyArray.h"
 
 #include <cstdint>
 #include <filesystem>
@@ -30,8 +31,20 @@ std::size_t trainedVertices(const neuralWarp::ModelMetadata& metadata);
 
 /// Reads and runs the model once, with controls of 0. What is damaged is a problem in the report. The session is left
 /// loaded when the network is sound. Libraries print on standard output meanwhile. Throws std::runtime_error only when
-/// there is no such directory. Thread: main.
+/// there is no such directory, or another one before it was read. Thread: main.
 ModelReport readModel(const std::filesystem::path& directory, neuralWarp::ModelSession& session);
+
+/// A report, what libraries had to say meanwhile, and what the network gave for rows of controls.
+struct ModelAnswer {
+    ModelReport model;
+    std::string printed;
+    std::vector<float> outputs; ///< model.outputs numbers for each row
+};
+
+/// readModel() in a process of its own, with limits of time and memory, and there the network with `rows` of controls,
+/// of `columns` each. Throws std::runtime_error that names the directory when that process does not come back, or the
+/// rows do not suit the network; Interrupted. Thread: main.
+ModelAnswer readModelApart(const std::filesystem::path& directory, const FloatTable& controls);
 
 /// The deformed geometry that a model is held against.
 struct GeometryFacts {

@@ -5,6 +5,7 @@
 #include "openquarn/HFnGeometryData.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/SceneFile.h"
+#include "quarn/info/LineList.h"
 #include "quarn/info/attributeTexts.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/modelDirectory.h"
@@ -84,9 +85,9 @@ std::string geometryLine(const DeformedGeometry& geometry) {
                        "): " + std::to_string(facts.vertices) + " vertices, " + std::to_string(facts.affected.size()) +
                        " affected, " + std::to_string(facts.controls) + " controls, ";
     if (geometry.modelName.empty())
-        return line + "no model\n";
+        return line + "no model";
     return line + "model " + geometry.modelName + (geometry.isModelActive ? " On" : " Off") +
-           (geometry.isModelThere ? "\n" : ", not there: training makes " + geometry.modelDirectory + "\n");
+           (geometry.isModelThere ? "" : ", not there: training makes " + geometry.modelDirectory);
 }
 
 void writeCount(JsonWriter& json, const char* key, std::int64_t count) {
@@ -170,15 +171,17 @@ std::string sceneText(const SceneReport& scene) {
     std::string text;
     if (!scene.character.empty())
         text += "character " + scene.character + ", " + numberText(scene.metersPerUnit, false) + " metres a unit\n";
+    LineList deformers("deformers and geometries");
     for (const DeformerReport& deformer : scene.deformers) {
-        text += "deformer " + deformer.name + ", frames " + std::to_string(deformer.firstFrame) + " to " +
-                std::to_string(deformer.lastFrame) + "\n";
+        deformers.add("deformer " + deformer.name + ", frames " + std::to_string(deformer.firstFrame) + " to " +
+                      std::to_string(deformer.lastFrame));
         for (const DeformedGeometry& geometry : deformer.geometries)
-            text += geometryLine(geometry);
+            deformers.add(geometryLine(geometry));
     }
+    LineList missing("missing files");
     for (const std::string& file : scene.missingFiles)
-        text += "missing file of " + file + "\n";
-    return text;
+        missing.add("missing file of " + file);
+    return text + deformers.text() + missing.text();
 }
 
 } // namespace quarn

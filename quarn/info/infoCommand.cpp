@@ -8,7 +8,8 @@
 #include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
-#include "quarn/files/npyArray.h"
+#include "quarn/console/printable.h"
+#include "quarn/info/LineList.h"
 #include "quarn/info/ModelReport.h"
 #include "quarn/info/SceneReport.h"
 #include "quarn/scene/SceneSession.h"
@@ -19,7 +20,7 @@
 #include <filesystem>
 #include <iostream>
 #include <optional>
-#include <span>
+#include <sstream>
 #include <stdexcept>
 
 namespace quarn {
@@ -101,23 +102,29 @@ void printJson(const SceneSummary& summary, const OpenedScene& opened) {
     else
         writeText(writer, "notDescribed", opened.whyNot);
     writer.EndObject();
-    std::cout << buffer.GetString() << '\n';
+    std::cout << printable(buffer.GetString()) << '\n';
 }
 
-void printText(const SceneSummary& summary, const OpenedScene& opened) {
-    std::cout << "format version " << summary.version << ", written by " << summary.writtenBy << ", " << summary.bytes
-              << " bytes\ntime " << summary.time << '\n'
-              << summary.nodes << " nodes, " << summary.connections << " connections\n";
+std::string summaryText(const SceneSummary& summary, const OpenedScene& opened) {
+    std::ostringstream text;
+    text << "format version " << summary.version << ", written by " << summary.writtenBy << ", " << summary.bytes
+         << " bytes\ntime " << summary.time << '\n'
+         << summary.nodes << " nodes, " << summary.connections << " connections\n";
+    LineList types("types of nodes");
     for (const auto& [type, count] : summary.nodesByType)
-        std::cout << "  " << count << ' ' << (type.empty() ? "without a type" : type) << '\n';
+        types.add("  " + std::to_string(count) + " " + (type.empty() ? "without a type" : type));
+    LineList plugins("plug-ins");
     for (const std::string& plugin : summary.plugins)
-        std::cout << "needs plug-in " << plugin << '\n';
+        plugins.add("needs plug-in " + plugin);
+    LineList missing("unknown types");
     for (const std::string& type : opened.missingTypes)
-        std::cout << "node type " << (type.empty() ? "without a name" : type) << " is in no loaded plug-in\n";
+        missing.add("node type " + (type.empty() ? "without a name" : type) + " is in no loaded plug-in");
+    text << types.text() << plugins.text() << missing.text();
     if (opened.report)
-        std::cout << sceneText(*opened.report);
+        text << sceneText(*opened.report);
     else
-        std::cout << "no more can be told: " << opened.whyNot << '\n';
+        text << "no more can be told: " << opened.whyNot << '\n';
+    return text.str();
 }
 
 struct Options {
@@ -164,7 +171,7 @@ void showScene(const Options& options) {
     if (options.json)
         printJson(summary, opened);
     else
-        printText(summary, opened);
+        std::cout << printable(summaryText(summary, opened));
 }
 
 GeometryFacts factsOfScene(const Options& options) {
@@ -174,38 +181,21 @@ GeometryFacts factsOfScene(const Options& options) {
     return factsOf(warp, warp.geometry(options.geometry));
 }
 
-// each row through the network as it is, for those who want to know whether it does what they trained
-void runNetwork(neuralWarp::ModelSession& session, const ModelReport& model, const Options& options) {
-    const FloatTable controls = readFloatTable(absolutePath(options.controls));
-    if (model.outputs == 0)
-        throw std::runtime_error(model.directory.string() + " has no network that can be run");
-    if (controls.columns != model.inputs)
-        throw std::runtime_error(options.controls.string() + " has " + std::to_string(controls.columns) +
-                                 " numbers in a row, and the network takes " + std::to_string(model.inputs));
-    FloatTable outputs{controls.rows, model.outputs, {}};
-    for (std::size_t row = 0; row < controls.rows; ++row) {
-        throwIfInterrupted();
-        const auto given = session.run(std::span(controls.values).subspan(row * controls.columns, controls.columns));
-        if (given.size() != model.outputs)
-            throw std::runtime_error("row " + std::to_string(row) + ": " + session.errorText());
-        outputs.values.insert(outputs.values.end(), given.begin(), given.end());
-    }
-    writeFloatTable(absolutePath(options.outputs), outputs);
-}
-
 void showModel(const Options& options) {
-    ModelReport model;
+    // in this order: the process apart is a copy of this one while it has one thread
+    const FloatTable controls =
+        options.controls.empty() ? FloatTable() : readFloatTable(absolutePath(options.controls));
+    const ModelAnswer answer = readModelApart(absolutePath(options.path), controls);
+    const ModelReport& model = answer.model;
+    std::cerr << printable(answer.printed);
     std::optional<Fit> fit;
-    {
+    if (!options.scene.empty()) {
         const StdoutAside aside;
-        neuralWarp::ModelSession session;
-        model = readModel(absolutePath(options.path), session);
-        if (!options.scene.empty())
-            fit = fitOf(model, factsOfScene(options));
-        if (!options.controls.empty())
-            runNetwork(session, model, options);
+        fit = fitOf(model, factsOfScene(options));
     }
-    std::cout << (options.json ? modelJson(model, fit) : modelText(model, fit));
+    if (!options.controls.empty())
+        writeFloatTable(absolutePath(options.outputs), {controls.rows, model.outputs, answer.outputs});
+    std::cout << printable(options.json ? modelJson(model, fit) : modelText(model, fit));
     std::cout.flush();
     if (!model.problems.empty())
         throw std::runtime_error(options.path.string() + " is damaged: " + model.problems.front());

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/console/json.h"
+#include "quarn/info/LineList.h"
 #include "quarn/info/ModelReport.h"
 
 #include <array>
@@ -49,18 +50,20 @@ void writeMetadata(JsonWriter& json, const neuralWarp::ModelMetadata& metadata) 
 }
 
 std::string lines(const char* kind, const std::vector<std::string>& texts) {
-    std::string all;
+    LineList all("of the kind");
     for (const std::string& text : texts)
-        all += std::string(kind) + ": " + text + "\n";
-    return all;
+        all.add(std::string(kind) + ": " + text);
+    return all.text();
 }
 
 std::string metadataLines(const neuralWarp::ModelMetadata& metadata) {
-    return "trained on " + std::to_string(trainedVertices(metadata)) + " of " + std::to_string(metadata.fullCount) +
-           " vertices (" + subsetText(metadata.subsetState) + ")" +
-           (metadata.geometry.empty() ? "" : " of " + metadata.geometry) + "\ndeltas " +
-           deltaModeText(metadata.deltaMode) + ", smoothing iterations " +
-           std::to_string(metadata.smoothingIterations) + "\n";
+    LineList lines("lines");
+    lines.add("trained on " + std::to_string(trainedVertices(metadata)) + " of " + std::to_string(metadata.fullCount) +
+              " vertices (" + subsetText(metadata.subsetState) + ")" +
+              (metadata.geometry.empty() ? "" : " of " + metadata.geometry));
+    lines.add("deltas " + deltaModeText(metadata.deltaMode) + ", smoothing iterations " +
+              std::to_string(metadata.smoothingIterations));
+    return lines.text();
 }
 
 } // namespace

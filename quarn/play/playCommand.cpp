@@ -5,6 +5,7 @@
 #include "quarn/console/StdoutAside.h"
 #include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
+#include "quarn/console/printable.h"
 #include "quarn/play/evaluator.h"
 #include "quarn/play/playReport.h"
 #include "quarn/play/playing.h"
@@ -103,7 +104,7 @@ void play(Options& options) {
         const PlayResult result = playFrames(session, plan, options.console);
         answer = options.console.json ? playJson(result, plan, meters) : playText(result, plan, meters);
     }
-    std::cout << answer;
+    std::cout << printable(answer);
 }
 
 void bake(Options& options) {

@@ -5,6 +5,15 @@ namespace quarn {
 
 using OpenQuarn::Severity;
 
+namespace {
+
+// a failed call that has a sentence, and not only a code
+bool saysWhy(const std::string& report) {
+    return !report.empty() && !report.ends_with(": failure") && !report.ends_with(": invalid parameter");
+}
+
+} // namespace
+
 HostErrors::HostErrors() {
     // the host has this sink before it has given back the one of before, and calls it from one thread at a time
     previous_ = OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) { take(message); });
@@ -22,7 +31,7 @@ void HostErrors::take(const OpenQuarn::Message& message) {
             errors_.push_back(message.text);
         break;
     case Severity::report:
-        if (report_.empty())
+        if (report_.empty() || (!saysWhy(report_) && saysWhy(message.text)))
             report_ = message.text;
         break;
     default:
@@ -37,7 +46,7 @@ std::string HostErrors::text() const {
     std::string all;
     for (const std::string& error : errors_)
         all += (all.empty() ? "" : "; ") + error;
-    return all;
+    return saysWhy(report_) ? all + "; " + report_ : all;
 }
 
 void HostErrors::clear() {

@@ -2,12 +2,15 @@
 // What is said of models that fit, and of those that do not.
 #include "quarn/info/ModelReport.h"
 #include "neuralWarp/support/modelFolder.h"
+#include "quarn/console/printable.h"
 #include "support/TemporaryFolder.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <limits>
 #include <numeric>
+#include <utility>
 
 namespace {
 
@@ -67,6 +70,60 @@ TEST_F(ModelReports, SayWhatDoesNotFitAGeometry) {
     const ModelReport part = read(partial);
     EXPECT_THAT(fitOf(part, {"body", 4, {1, 2}, 2}).warnings, ElementsAre(HasSubstr("1, and the deformer affects 2")));
     EXPECT_THAT(fitOf(part, {"body", 4, {2, 3}, 2}).errors, ElementsAre(HasSubstr("none of the vertices")));
+}
+
+TEST_F(ModelReports, ComeFromAnotherProcessAsTheyAre) {
+    ModelSpec spec = fourVertices();
+    spec.subsetState = "partial";
+    spec.affectMap = {3, 0, 9};
+    spec.componentTagExpression = "part";
+    spec.smoothingIterations = 5;
+    spec.shapes = {std::vector<float>(6)};
+    spec.weights = std::vector<float>(24, 2.0F);
+    const ModelReport here = read(spec);
+    const FloatTable controls{3, 2, {0, 0, 1, 0, 0.5F, 1}};
+    const ModelAnswer apart = readModelApart(here.directory, controls);
+    const auto textOf = [](const ModelReport& model) { return modelJson(model, fitOf(model, {"body", 4, {0, 3}, 1})); };
+    EXPECT_EQ(textOf(apart.model), textOf(here));
+    EXPECT_EQ(apart.model.metadata.affectMap, here.metadata.affectMap);
+    EXPECT_EQ(apart.printed, "");
+    std::vector<float> expected(12, 0.5F);
+    expected.insert(expected.end(), 12, 2.5F);
+    expected.insert(expected.end(), 12, 3.5F);
+    EXPECT_EQ(apart.outputs, expected);
+
+    writeFile(here.directory / "principal_shapes.json", "[");
+    EXPECT_EQ(readModelApart(here.directory, {}).printed, "Parse error\n");
+    const auto refusal = [&](const FloatTable& table) -> std::string {
+        try {
+            readModelApart(here.directory, table);
+        } catch (const std::runtime_error& error) {
+            return error.what();
+        }
+        return "none";
+    };
+    EXPECT_THAT(refusal({1, 3, {0, 0, 0}}), HasSubstr("has 3 numbers, and the network takes 2"));
+    EXPECT_THAT(refusal({2, 2, {0, 0, 0, std::numeric_limits<float>::infinity()}}),
+                HasSubstr("row 1: a control value"));
+}
+
+TEST(Printable, LeavesTextAndEscapesTheRest) {
+    const std::pair<std::string, std::string> rows[] = {
+        {"plain \t\n\xc3\xa9 \xe6\x89\x8b \xf0\x9f\x96\x90 \xc2\xa0 \\u001b", ""},
+        {"\x1b[2J", "\\u001b[2J"},
+        {std::string("a\0b\r\x7f", 5), "a\\u0000b\\u000d\\u007f"},
+        {"\xc2\x9b"
+         "31m",
+         "\\u009b31m"}, // the same as ESC [ in one character, and in one byte:
+        {"\x9b"
+         "31m",
+         "\\u009b31m"},
+        {"\xe6\x89", "\\u00e6\\u0089"}, // the end is missing
+        {"\xff\xfe\xc0\x80", "\\u00ff\\u00fe\\u00c0\\u0080"},
+        {"\xe6\x1b\x89", "\\u00e6\\u001b\\u0089"},
+    };
+    for (const auto& [text, expected] : rows)
+        EXPECT_EQ(printable(text), expected.empty() ? text : expected);
 }
 
 } // namespace

@@ -127,6 +127,28 @@ expect 0 'geometry 0 \(strip\): 369 vertices, 369 affected, 2 controls, model wa
 expect 0 'missing file of lost: .*none\.npy' '' info "$work/lost.json"
 expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\nfits\n' '' \
   info "$work/models/wave.nwrp" --scene "$scene"
+
+# why a network and a file of shapes were refused; nothing in a file reaches the terminal as a control character
+cp "$work/models/wave.nwrp/model.onnx" "$work/models/wave.nwrp/principal_shapes.json" "$work"
+echo 'no model' >"$work/models/wave.nwrp/model.onnx"
+expect 1 '' 'No ML model initialized for index 0; .*wave\.nwrp/model\.onnx. cannot be used: the file is damaged' \
+  play "$scene" --frames 1
+mv "$work/model.onnx" "$work/models/wave.nwrp"
+echo '[]' >"$work/models/wave.nwrp/principal_shapes.json"
+why='Error: .*/wave\.nwrp/principal_shapes\.json: it holds no JSON object\n'
+expect 1 '' "$why.*/wave\.nwrp: principal_shapes\.json is damaged" play "$scene" --frames 1
+expect 1 'damaged: principal_shapes' "$why" info "$work/models/wave.nwrp"
+mv "$work/principal_shapes.json" "$work/models/wave.nwrp"
+sed -i 's/"geometry": *"[^"]*"/"geometry": "\\u001b[31m\\u009bred"/' "$work/models/wave.nwrp/metadata.json"
+expect 0 'of \\u001b\[31m\\u009bred\n' '' info "$work/models/wave.nwrp"
+expect 1 '' '^quarn: [^\e]*/\\u001b\[31mnone' info $'\e[31mnone.json'
+for i in {1..25}; do
+  printf 'createNode pointCache -name lost%d\nsetAttr lost%d.cacheFile none.npy\n' "$i" "$i"
+done >"$work/many.txt"
+echo 'file -saveAs many.json' >>"$work/many.txt"
+(cd "$work" && "$quarn" exec many.txt >/dev/null)
+expect 0 'missing file of lost20: (.*)\n\.\.\. and 5 more missing files\n' '' info "$work/many.json"
+
 rm -r "$work/models/wave.nwrp"
 expect 1 '' 'frame 1: .*wave\.nwrp' play "$scene" --frames 1
 mkdir "$work/models/wave.nwrp"
