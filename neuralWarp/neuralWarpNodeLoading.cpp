@@ -195,7 +195,7 @@ HStatus neuralWarpNode::loadNetwork(neuralWarpData& data) {
 }
 
 HStatus neuralWarpNode::loadWholeModel(HDataBlock& block, neuralWarpData& data) {
-    constexpr int attempts = 4; // who writes for longer than they take is not done yet
+    constexpr int attempts = 8; // who writes for longer than they take is not done yet
     for (int i = 0; i < attempts; ++i) {
         loadModel(data, false); // a failure shows in canApplyModel()
         if (!data.modelLoadPending)

@@ -52,7 +52,7 @@ public:
 
 private:
     void playOne(int frame, bool isTimed, bool isLookedAt) {
-        const double seconds = player_.show(frame);
+        const double seconds = models_.blame([&] { return player_.show(frame); });
         models_.requireSound();
         if (isTimed)
             result_.times.add(frame, seconds);

@@ -179,13 +179,15 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
         // with more frames than looks, spread evenly from the first to the last
         const int frame = shot.frames.frame(looks == count ? number : number * (count - 1) / (looks - 1));
         session.host().setTime(frame);
-        for (const Panel& panel : shot.panels) {
-            const PanelFrame shown = evaluatePanel(panel, frame);
-            framing.include(shown.points);
-            for (const double distance : shown.distances)
-                largest = std::max(largest, distance);
-        }
-        throwIfAny(errors, frame);
+        models.blame([&] {
+            for (const Panel& panel : shot.panels) {
+                const PanelFrame shown = evaluatePanel(panel, frame);
+                framing.include(shown.points);
+                for (const double distance : shown.distances)
+                    largest = std::max(largest, distance);
+            }
+            throwIfAny(errors, frame);
+        });
         models.requireSound();
         progress.advance();
     }

@@ -6,6 +6,8 @@
 #include "openquarn/HPlug.h"
 #include "quarn/scene/Warp.h"
 
+#include <stdexcept>
+#include <utility>
 #include <vector>
 
 namespace quarn {
@@ -21,6 +23,18 @@ public:
     /// mesh; later frames cost nothing then. Throws std::runtime_error that names deformer, model and reason when the
     /// files are damaged, or when the rest mesh has another number of vertices than the one that is deformed.
     void requireSound();
+
+    /// Does `work`, which evaluates a frame. When it throws std::runtime_error, and requireSound() has something to
+    /// say, that is what comes out: the failure follows from damaged files, which it does not name.
+    template <class Work>
+    auto blame(Work&& work) {
+        try {
+            return std::forward<Work>(work)();
+        } catch (const std::runtime_error&) {
+            requireSound();
+            throw;
+        }
+    }
 
 private:
     struct Geometry {

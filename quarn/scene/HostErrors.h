@@ -19,8 +19,8 @@ public:
     HostErrors(const HostErrors&) = delete;
     HostErrors& operator=(const HostErrors&) = delete;
 
-    /// The first few errors since it was made or cleared, in one line, and the first failed call that has a reason; without
-    /// an error the first failed call, which says less to a user. Empty when all went well.
+    /// The first few errors since it was made or cleared, in one line, and the first failed call that has a reason;
+    /// without an error the first failed call, which says less to a user. Empty when all went well.
     std::string text() const;
     void clear();
 

@@ -295,7 +295,7 @@ TEST_F(LoadingFailures, ADirectoryThatIsReplacedWhileItIsRead) {
         bool isGivenUp;
     };
     for (const Case& c : {Case{"written into", writtenInto, 1, false},
-                          {"again and again", writtenAgain, 4, true},
+                          {"again and again", writtenAgain, 8, true},
                           {"exchanged", exchanged, 1, false}}) {
         SCOPED_TRACE(c.name);
         writeChanged(warns);
