@@ -48,6 +48,8 @@ void writeMetadata(JsonWriter& json, const neuralWarp::ModelMetadata& metadata) 
     json.EndObject();
 }
 
+constexpr std::uint32_t manySmoothingPasses = 1000;
+
 std::string lines(const char* kind, const std::vector<std::string>& texts) {
     std::string all;
     for (const std::string& text : texts)
@@ -60,7 +62,10 @@ std::string metadataLines(const neuralWarp::ModelMetadata& metadata) {
            " vertices (" + subsetText(metadata.subsetState) + ")" +
            (metadata.geometry.empty() ? "" : " of " + metadata.geometry) + "\ndeltas " +
            deltaModeText(metadata.deltaMode) + ", smoothing iterations " +
-           std::to_string(metadata.smoothingIterations) + "\n";
+           std::to_string(metadata.smoothingIterations) + "\n" +
+           (metadata.smoothingIterations < manySmoothingPasses
+                ? ""
+                : "warning: so many smoothing passes make every frame slow: 10 are usual\n");
 }
 
 } // namespace
