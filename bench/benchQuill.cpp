@@ -12,8 +12,10 @@
 #include "quill/VertexFrames.h"
 #include "quill/bulk.h"
 
+#include <cmath>
 #include <cstdlib>
 #include <exception>
+#include <numbers>
 #include <string>
 #include <sys/wait.h>
 #include <thread>
@@ -141,6 +143,24 @@ Phase buildingFrames(Subject& s) {
     return phase;
 }
 
+// One polygon of that many corners, every triple of which its full search would weigh.
+void runCircle(std::size_t corners, std::size_t threads, const bench::Options& options, bench::Report& report) {
+    ZooMesh circle{"circle", {{}}, {}};
+    for (std::uint32_t c = 0; c < corners; ++c) {
+        const double angle = 2.0 * std::numbers::pi * c / static_cast<double>(corners);
+        circle.points.emplace_back(static_cast<float>(std::cos(angle)), static_cast<float>(std::sin(angle)), 0.0F);
+        circle.polygons[0].push_back(c);
+    }
+    quill::MeshTopology topology = circle.topology();
+    quill::IndexMapper map;
+    map.setIdentity(corners);
+    quill::VertexFrames frames;
+    Phase phase{"build frames, n-gon", circle.name, corners, 0};
+    phase.ours = [&] { frames.build(topology, map, &circle.points); };
+    if (phase.name.starts_with(options.only))
+        report.add(bench::measure(phase, threads, options.seconds));
+}
+
 void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::size_t threads,
              const bench::Options& options, bench::Report& report) {
     Subject s(name, mesh);
@@ -167,6 +187,8 @@ void runAll(std::size_t threads, const bench::Options& options, bench::Report& r
         runMesh("shuffled", shuffled(grid, 1), false, threads, options, report);
         runMesh("icosphere", makeIcosphere(size.subdivisions), false, threads, options, report);
     }
+    for (const std::size_t corners : {std::size_t{512}, std::size_t{4096}})
+        runCircle(corners, threads, options, report);
 }
 
 // In a process of its own, since the cores must be fixed before the first thread starts.

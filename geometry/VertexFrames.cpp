@@ -5,6 +5,7 @@
 #include "edgeNeighbours.h"
 #include "frameBlock.h"
 #include "quill/parallelFor.h"
+#include "widestPairs.h"
 
 #include <algorithm>
 #include <array>
@@ -13,17 +14,17 @@
 namespace quill {
 namespace {
 
-// Calls visit(corners) with the affected corners of each polygon that has more than two, in winding order.
+// Calls visit(corners, polygon) with the affected corners of each polygon that has more than two, in winding order.
 template <typename Visit>
 void forEachAffectedPolygon(const MeshTopology& topology, const IndexMapper& map, const Visit& visit) {
     std::vector<std::uint32_t> affected;
-    forEachPolygon(topology, [&](std::span<const std::uint32_t> corners) {
+    forEachPolygon(topology, [&](std::span<const std::uint32_t> corners, std::size_t polygon) {
         affected.clear();
         for (const std::uint32_t corner : corners)
             if (const std::uint32_t index = map.toAffected(corner); index != missingIndex)
                 affected.push_back(index);
         if (affected.size() > 2)
-            visit(std::span<const std::uint32_t>(affected));
+            visit(std::span<const std::uint32_t>(affected), polygon);
     });
 }
 
@@ -129,7 +130,7 @@ void storeFrames(FrameBlock& block, const FrameTables& tables, const std::size_t
 } // namespace
 
 void VertexFrames::build(const MeshTopology& topology, const IndexMapper& map,
-                         const std::vector<val3<float>>* positions) {
+                         const std::vector<val3<float>>* positions, const WorkWatch& watch) {
     const NeighbourLists edges = edgeNeighbours(topology, map);
     const std::size_t n = map.affectCount();
     if (positions && positions->size() < n)
@@ -137,19 +138,23 @@ void VertexFrames::build(const MeshTopology& topology, const IndexMapper& map,
 
     // counted at v + 2, filled from v + 1, as in edgeNeighbours
     std::vector<std::uint32_t> cursor(n + 2, 0);
-    forEachAffectedPolygon(topology, map, [&](std::span<const std::uint32_t> corners) {
+    forEachAffectedPolygon(topology, map, [&](std::span<const std::uint32_t> corners, std::size_t) {
         for (const std::uint32_t v : corners)
             cursor[v + 2] += 2;
     });
     for (std::size_t v = 2; v < cursor.size(); ++v)
         cursor[v] += cursor[v - 1];
     std::vector<std::uint32_t> pairs(cursor.back());
-    forEachAffectedPolygon(topology, map, [&](std::span<const std::uint32_t> corners) {
+    std::vector<CornerPair> ofPolygon;
+    forEachAffectedPolygon(topology, map, [&](std::span<const std::uint32_t> corners, std::size_t polygon) {
+        if (positions)
+            widestPairs(corners, *positions, ofPolygon, polygon, watch);
+        else
+            adjacentPairs(corners, ofPolygon);
         for (std::size_t c = 0; c < corners.size(); ++c) {
-            const CornerPair pair = positions ? widestPair(corners, c, *positions) : adjacentPair(corners, c);
             std::uint32_t& at = cursor[corners[c] + 1];
-            pairs[at++] = pair.a;
-            pairs[at++] = pair.b;
+            pairs[at++] = ofPolygon[c].a;
+            pairs[at++] = ofPolygon[c].b;
         }
     });
     cursor.pop_back();

@@ -8,6 +8,12 @@ CornerPair adjacentPair(std::span<const std::uint32_t> corners, std::size_t c) {
     return {corners[(c + 1) % m], corners[(c + m - 1) % m]};
 }
 
+void adjacentPairs(std::span<const std::uint32_t> corners, std::vector<CornerPair>& pairs) {
+    pairs.resize(corners.size());
+    for (std::size_t c = 0; c < corners.size(); ++c)
+        pairs[c] = adjacentPair(corners, c);
+}
+
 CornerPair widestPair(std::span<const std::uint32_t> corners, std::size_t c,
                       const std::vector<val3<float>>& positions) {
     const std::size_t m = corners.size();

@@ -5,10 +5,13 @@
 #include "neuralWarp/neuralWarpUtils.h"
 #include "openquarn/HFnMesh.h"
 #include "openquarn/HItGeometry.h"
+#include "openquarn/HLongWork.h"
 #include "openquarn/HNodeClass.h"
 #include "quill/parallelFor.h"
 
+#include <algorithm>
 #include <stdexcept>
+#include <string>
 
 namespace neuralWarp {
 namespace {
@@ -26,9 +29,14 @@ HObject filterAttribute(const char* name) {
 void smoothPoints(const neuralWarpData& data, Points& points) {
     if (!data.activeSettings.isSmoothed())
         return;
+    constexpr std::int64_t passesPerLook = 64; // a quarter of a second for a million vertices
     Points scratch;
-    data.vertexConnections.mushArray(points, scratch, static_cast<std::size_t>(data.activeSettings.smoothingIterations),
-                                     1.0F, nullptr, &data.connectionWeights, false);
+    for (std::int64_t left = data.activeSettings.smoothingIterations; left > 0; left -= passesPerLook) {
+        if (HLongWork::isInterrupted())
+            throw quill::Cancelled();
+        data.vertexConnections.mushArray(points, scratch, static_cast<std::size_t>(std::min(left, passesPerLook)), 1.0F,
+                                         nullptr, &data.connectionWeights, false);
+    }
 }
 
 } // namespace
@@ -94,6 +102,16 @@ HStatus readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology) {
     topology.polygonOffsets.push_back(static_cast<std::uint32_t>(topology.polygonVertices.size()));
     topology.valid = true;
     return HStatus::kSuccess;
+}
+
+void buildFrames(quill::VertexFrames& frames, const quill::MeshTopology& topology, const quill::IndexMapper& map,
+                 const Points& restPoints, const HString& nodeName) {
+    const auto announce = [&](std::size_t polygon, std::size_t corners, double seconds) {
+        HLongWork::announce("'" + nodeName.asStdString() + "' chooses frames for polygon " + std::to_string(polygon) +
+                                " of the rest geometry, which has " + std::to_string(corners) + " corners",
+                            seconds);
+    };
+    frames.build(topology, map, &restPoints, {HLongWork::isInterrupted, announce});
 }
 
 quill::IndexMapper readIndexMap(const HIndexMapper& mapper) {

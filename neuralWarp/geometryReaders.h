@@ -23,12 +23,18 @@ HDataHandle inputGeometryHandle(HDataBlock& block, std::uint32_t multiIndex, HSt
 bool readGeometryPoints(const HDataHandle& geometry, Points& points, const quill::IndexMapper& map);
 
 /// The same for a handle that must hold a mesh, smoothed by the settings in force if `smooth` says so. The failing
-/// status of the mesh is reported and returned. A mesh that is too small leaves `points` as it is, with success. [eval]
+/// status of the mesh is reported and returned. A mesh that is too small leaves `points` as it is, with success. Throws
+/// quill::Cancelled when the user has asked for the end of a long smoothing. [eval]
 HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, Points& points, bool smooth);
 
 /// The polygons of a mesh; those that the host does not give are left out. Fails, and `topology` is not valid, when the
 /// host does not say how many there are. [any]
 HStatus readMeshTopology(const HFnMesh& mesh, quill::MeshTopology& topology);
+
+/// The corner pairs of the affected vertices, chosen by their rest points. The user is told beforehand of a polygon
+/// that takes long; throws quill::Cancelled when they ask for the end meanwhile. [eval]
+void buildFrames(quill::VertexFrames& frames, const quill::MeshTopology& topology, const quill::IndexMapper& map,
+                 const Points& restPoints, const HString& nodeName);
 
 /// The host's map of the affected vertices, in the same order. [any]
 quill::IndexMapper readIndexMap(const HIndexMapper& mapper);

@@ -71,7 +71,8 @@ HStatus chooseIndices(const HArgDatabase& arguments, const Indices& existing, In
     for (unsigned use = 0; use < uses; ++use) {
         HArgList words;
         HStatus status = arguments.getFlagArgumentList(multiIndexFlag, use, words);
-        const int number = status.error() ? -1 : words.asInt(0, &status);
+        // the syntax lets unsigned integers through; read as an int, the upper half of them would not be one
+        const double number = status.error() ? 0.0 : words.asDouble(0, &status);
         if (status.error())
             continue;
         const auto index = static_cast<unsigned>(number);

@@ -152,8 +152,14 @@ bool neuralWarpGPUNode::areDeltasUsable() const {
 cl_int neuralWarpGPUNode::enqueueDeformation(HOpenCLEvent& event) {
     if (affectCount() == 0)
         return CL_SUCCESS;
-    if (!areConnectionsUsable() || !areFramesUsable() || !areDeltasUsable())
-        return HOpenCLInfo::checkCLErrorStatus(CL_INVALID_BUFFER_SIZE);
+    const char* misfit = !areConnectionsUsable() ? "the smoothing's tables on the device are not of this geometry"
+                         : !areFramesUsable()    ? "the frames' tables on the device are not of this geometry"
+                         : !areDeltasUsable()    ? "the model's tables on the device are not of this geometry"
+                                                 : nullptr;
+    if (misfit) {
+        HOpenCLInfo::explainFailure(misfit);
+        return CL_INVALID_BUFFER_SIZE;
+    }
     const HOpenCLBuffer* current = &affectPositionsA_;
     cl_int status = enqueueGather(event);
     if (status == CL_SUCCESS && smoothingIterations_ > 0)

@@ -153,13 +153,14 @@ private:
     HStatus readTrainingPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
                                TargetDeltaType type, TrainingPoints& points);
     static HStatus pointDifferences(HDoubleArray& out, const Points& target, const Points& base);
-    static HStatus findRestSurface(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                                   RestSurface& surface);
+    HStatus findRestSurface(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
+                            RestSurface& surface) const;
     HStatus surfaceDeltas(HDoubleArray& out, const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
                           TargetDeltaType type, const TrainingPoints& points);
 
     // Evaluation.
     HStatus evaluate(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex);
+    void announceSmoothing(HDataBlock& block, const neuralWarpData& data) const;
     bool updateModelSettings(HDataBlock& block, neuralWarpData& data);
     HStatus applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, Points& result);
     std::vector<float> runNetwork(neuralWarpData& data, const std::vector<float>& controls) const;

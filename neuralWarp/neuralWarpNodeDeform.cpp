@@ -7,8 +7,11 @@
 #include "neuralWarp/blend.h"
 #include "neuralWarp/checkOutputs.h"
 #include "neuralWarp/deltas.h"
+#include "neuralWarp/geometryReaders.h"
 #include "neuralWarp/neuralWarpNode.h"
 #include "neuralWarp/neuralWarpUtils.h"
+#include "openquarn/HItGeometry.h"
+#include "openquarn/HLongWork.h"
 #include "openquarn/HProfilingScope.h"
 #include "quill/parallelFor.h"
 
@@ -86,7 +89,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
         return HStatus::kSuccess;
     neuralWarpData* data = fetchNodeData(block, multiIndex);
     if (!data)
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "there is no state for geometry " + std::to_string(multiIndex)};
     if (data->observedOutputs)
         data->observedOutputs->clear();
     if (data->phases)
@@ -137,6 +140,21 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     return writeBlended(block, iterator, multiIndex, blend);
 }
 
+/// A model that smooths for long is in force from now on: the user is told before the first frame.
+void neuralWarpNode::announceSmoothing(HDataBlock& block, const neuralWarpData& data) const {
+    constexpr std::int64_t manyPasses = 1000;
+    const std::int64_t passes = data.modelSettings.smoothingIterations;
+    if (passes < manyPasses)
+        return;
+    HStatus status;
+    const HDataHandle geometry = inputGeometryHandle(block, data.multiIndex, status);
+    const double count = status.error() ? 0.0 : HItGeometry(geometry).count();
+    constexpr double perPass = 3e-6, perVertex = 7e-9; // seconds of one core, its loop without vector instructions
+    HLongWork::announce("'" + name().asStdString() + "' smooths geometry " + std::to_string(data.multiIndex) + " in " +
+                            std::to_string(passes) + " passes, as its model says, in each frame",
+                        static_cast<double>(passes) * (perPass + count * perVertex));
+}
+
 bool neuralWarpNode::updateModelSettings(HDataBlock& block, neuralWarpData& data) {
     if (data.modelPathDirty && resolveModelDirectory(block, data).error())
         return false;
@@ -146,6 +164,8 @@ bool neuralWarpNode::updateModelSettings(HDataBlock& block, neuralWarpData& data
         if (!isRead || data.drivesNothing())
             return false;
     }
+    if (data.modelSettings.smoothingIterations != data.activeSettings.smoothingIterations)
+        announceSmoothing(block, data);
     data.applySettings(data.modelSettings);
     data.releaseUnusedCaches();
     return true;
@@ -154,7 +174,7 @@ bool neuralWarpNode::updateModelSettings(HDataBlock& block, neuralWarpData& data
 HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data,
                                          Points& result) {
     if (!data.canApplyModel())
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "there is no model to apply"};
     std::vector<float> controls;
     if (const HStatus status = gatherControlValues(block, data.session.inputCount(), controls); status.error())
         return reported(status, sourceUnit::node);

@@ -13,6 +13,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <string>
 #include <utility>
 
 namespace neuralWarp {
@@ -23,7 +24,7 @@ constexpr double smallestMorphEnvelope = 1e-6;
 
 HStatus invalidRest() {
     raiseMessage<Text::kErrorMLOriginalGeomInvalid>(displayErrorGated);
-    return HStatus::kFailure;
+    return {HStatus::kFailure, "the rest geometry is no mesh with a vertex for each that is deformed"};
 }
 
 void rebuildConnections(neuralWarpData& data, const quill::MeshTopology& topology) {
@@ -34,8 +35,8 @@ void rebuildConnections(neuralWarpData& data, const quill::MeshTopology& topolog
     data.bump(neuralWarpData::connectionsCache);
 }
 
-void rebuildFramesTopology(neuralWarpData& data, const quill::MeshTopology& topology) {
-    data.vertexFrames.build(topology, data.componentMap, &data.restPoints);
+void rebuildFramesTopology(neuralWarpData& data, const quill::MeshTopology& topology, const HString& nodeName) {
+    buildFrames(data.vertexFrames, topology, data.componentMap, data.restPoints, nodeName);
     data.framesTopologyDirty = false;
     data.restFramesDirty = true;
     data.bump(neuralWarpData::framesCache);
@@ -90,7 +91,7 @@ HStatus neuralWarpNode::rebuildRestCaches(neuralWarpData& data, HDataBlock& bloc
     if (data.connectionsDirty)
         rebuildConnections(data, topology);
     if (data.activeSettings.isSurface() && data.framesTopologyDirty)
-        rebuildFramesTopology(data, topology);
+        rebuildFramesTopology(data, topology, name());
     return data.restFramesDirty && data.activeSettings.isSurface() ? rebuildRestFrames(data, block, multiIndex)
                                                                    : HStatus();
 }
@@ -117,7 +118,7 @@ HStatus neuralWarpNode::readInputPoints(const neuralWarpData& data, HDataBlock& 
         return reported(status, sourceUnit::node);
     if (geometry.type() != HFnData::kMesh) {
         raiseMessage<Text::kErrorMLInputGeomInvalid>(displayErrorGated);
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "the input geometry is no mesh"};
     }
     return readMeshPoints(geometry, data, points, true);
 }
@@ -137,7 +138,7 @@ HStatus neuralWarpNode::readTargetPoints(const neuralWarpData& data, std::uint32
     const HPlug source = status.error() ? HPlug() : element.source(&status);
     if (status.error() || source.isNull()) {
         raiseMessage<Text::kErrorMLNoTarget>(displayErrorGated);
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "nothing is connected into targetGeometry[" + std::to_string(multiIndex) + "]"};
     }
     const PlugData target(source);
     const HFnGeometryData targetData(target.handle.data(), &status);
@@ -170,7 +171,7 @@ bool neuralWarpNode::readTargetMorph(HDataBlock& block, std::uint32_t multiIndex
 HStatus neuralWarpNode::readMorphPoints(HDataBlock& block, std::uint32_t multiIndex, Points& points) {
     const neuralWarpData* data = fetchNodeData(block, multiIndex);
     if (!data)
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "there is no state to morph geometry " + std::to_string(multiIndex) + " by"};
     HStatus status;
     HArrayDataHandle targets = block.inputArrayValue(targetMorphGeometry, &status);
     if (status.error())
@@ -185,13 +186,13 @@ HStatus neuralWarpNode::readMorphPoints(HDataBlock& block, std::uint32_t multiIn
         return reported(status, sourceUnit::node);
     if (target.type() != HFnData::kMesh) {
         raiseMessage<Text::kErrorMLTargetInvalid>(displayErrorGated);
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "the target of the morph is no mesh"};
     }
     readGeometryPoints(target, points, data->componentMap);
     if (points.size() == data->componentMap.affectCount())
         return HStatus::kSuccess;
     raiseMessage<Text::kErrorMLTargetMismatch>(displayErrorGated, points.size(), indexMapper(multiIndex).fullCount());
-    return HStatus::kFailure;
+    return {HStatus::kFailure, "the target of the morph has fewer vertices than the geometry"};
 }
 
 void neuralWarpNode::calculateVertexFrames(const neuralWarpData& data, std::vector<quill::mat4d>& frames,

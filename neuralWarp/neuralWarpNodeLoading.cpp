@@ -35,12 +35,12 @@ struct Entry {
 
 HStatus badPath(const HString& path) {
     raiseMessage<Text::kErrorMlNodeBadModelPath>(displayErrorGated, path);
-    return HStatus::kFailure;
+    return {HStatus::kFailure, "there is no such model directory"};
 }
 
 HStatus noPath() {
     raiseMessage<Text::kErrorMlNoModelPath>(displayErrorGated);
-    return HStatus::kFailure;
+    return {HStatus::kFailure, "modelRoot or modelName is empty"};
 }
 
 /// `name` is one below `models`.
@@ -222,7 +222,7 @@ HStatus neuralWarpNode::validateModel(neuralWarpData& data) {
     if (data.metadata.fullCount != fullCount) {
         raiseMessage<Text::kErrorMLMetaFullCountMismatch>(displayErrorGated, name(), data.multiIndex, fullCount,
                                                           data.metadata.fullCount);
-        result = HStatus::kFailure;
+        result = {HStatus::kFailure, "the model was trained on another number of vertices"};
     }
     if (data.metadata.affectCount != affectCount)
         raiseMessage<Text::kWarnMLMetaAffectCountMismatch>(HGlobal::displayWarning, name(), data.multiIndex,

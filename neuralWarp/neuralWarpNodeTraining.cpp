@@ -101,7 +101,7 @@ HStatus neuralWarpNode::pointDifferences(HDoubleArray& out, const Points& target
 }
 
 HStatus neuralWarpNode::findRestSurface(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                                        RestSurface& surface) {
+                                        RestSurface& surface) const {
     const std::size_t count = data.componentMap.affectCount();
     if (data.activeSettings.isSurface() && !data.framesTopologyDirty && data.restPoints.size() == count) {
         surface.frames = &data.vertexFrames;
@@ -120,7 +120,7 @@ HStatus neuralWarpNode::findRestSurface(const neuralWarpData& data, HDataBlock& 
     quill::MeshTopology topology;
     if (status = readMeshTopology(mesh, topology); status.error())
         return reported(status, sourceUnit::node);
-    surface.ownFrames.build(topology, data.componentMap, &surface.ownRestPoints);
+    buildFrames(surface.ownFrames, topology, data.componentMap, surface.ownRestPoints, name());
     surface.frames = &surface.ownFrames;
     surface.restPoints = &surface.ownRestPoints;
     return HStatus::kSuccess;

@@ -36,7 +36,7 @@ HStatus gatherControlValues(HDataBlock& block, std::int32_t inputCount, std::vec
         return reported(status, sourceUnit::utils);
     if (std::cmp_less(values.elementCount(), inputCount)) {
         raiseMessage<Text::kMlNodeControlCountMismatch>(displayErrorGated, inputCount, values.elementCount());
-        return HStatus::kFailure;
+        return {HStatus::kFailure, "the model has more inputs than there are control values"};
     }
     controls.resize(static_cast<std::size_t>(inputCount));
     for (std::size_t i = 0; i < controls.size(); ++i) {

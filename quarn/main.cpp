@@ -68,14 +68,13 @@ int main(int argc, char** argv) {
     try {
         OpenQuarn::setMessageSink(print);
         return run(argc, argv);
-    } catch (const quarn::Interrupted& interrupted) {
-        std::cerr << "quarn: " << interrupted.what() << '\n';
-        return endedBySignal;
     } catch (const quarn::UsageError& error) {
-        std::cerr << "quarn: " << error.what() << "\nRun with --help for more information.\n";
+        std::cerr << "quarn: " << quarn::printable(error.what()) << "\nRun with --help for more information.\n";
         return wrongUsage;
     } catch (const std::exception& error) {
-        std::cerr << "quarn: " << quarn::printable(error.what()) << '\n';
-        return 1;
+        // an evaluation that was given up on request fails with a sentence of its own
+        const bool isEnded = quarn::isInterrupted();
+        std::cerr << "quarn: " << (isEnded ? quarn::Interrupted().what() : quarn::printable(error.what())) << '\n';
+        return isEnded ? endedBySignal : 1;
     }
 }

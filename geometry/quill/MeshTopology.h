@@ -5,6 +5,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <span>
+#include <type_traits>
 #include <vector>
 
 namespace quill {
@@ -22,7 +23,8 @@ struct MeshTopology {
     bool valid = false;
 };
 
-/// Calls visit(corners) for each polygon in order, corners being a span of full vertex indices, never empty.
+/// Calls visit(corners) or visit(corners, p) for each polygon p in order, corners being a span of full vertex indices,
+/// never empty.
 /// Ill-formed records are safe and cost no more than their size: polygons beyond the stored offsets, polygons whose
 /// offsets do not ascend, that reach back into a polygon before them or that begin past the stored corners are skipped;
 /// a polygon that ends past the stored corners is cut there. The vertex indices themselves are not checked.
@@ -36,7 +38,11 @@ void forEachPolygon(const MeshTopology& topology, const Visit& visit) {
         const std::size_t end = std::min<std::size_t>(offsets[p + 1], topology.polygonVertices.size());
         if (begin < walked || begin >= end)
             continue;
-        visit(std::span<const std::uint32_t>(topology.polygonVertices.data() + begin, end - begin));
+        const std::span<const std::uint32_t> corners(topology.polygonVertices.data() + begin, end - begin);
+        if constexpr (std::is_invocable_v<Visit, std::span<const std::uint32_t>, std::size_t>)
+            visit(corners, p);
+        else
+            visit(corners);
         walked = end;
     }
 }

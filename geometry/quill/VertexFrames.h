@@ -3,6 +3,7 @@
 
 #include "quill/IndexMapper.h"
 #include "quill/MeshTopology.h"
+#include "quill/WorkWatch.h"
 #include "quill/mat4d.h"
 #include "quill/val3.h"
 
@@ -36,9 +37,13 @@ public:
     ///   polygon
     ///              that span the largest area with it, the next and previous corner counting double. Shorter arrays
     ///              count as null.
-    /// Runs on the calling thread, in O(corners) for polygons of bounded size and O(m^3) in a polygon of m corners.
-    /// Throws std::length_error above 2^31 - 1 corners or vertices, std::bad_alloc; the tables are then as before.
-    void build(const MeshTopology& topology, const IndexMapper& map, const std::vector<val3<float>>* positions);
+    ///   watch      may end the work, and hears of polygons that take long
+    /// In O(corners) for polygons of bounded size. A polygon of m corners takes about m^2 log m steps when its corners
+    /// are spread out, and m^3 / 2 when they are all on a line; several threads share those of a large one, to the same
+    /// result. Throws std::length_error above 2^31 - 1 corners or vertices, std::bad_alloc, and Cancelled; the tables
+    /// are then as before.
+    void build(const MeshTopology& topology, const IndexMapper& map, const std::vector<val3<float>>* positions,
+               const WorkWatch& watch = {});
 
     /// The corner pairs of all vertices, one after another, two entries per pair.
     const std::vector<std::uint32_t>& framesPairs() const { return framesPairs_; }

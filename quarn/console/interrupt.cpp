@@ -1,15 +1,20 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/console/interrupt.h"
 
+#include <atomic>
 #include <csignal>
 
 namespace quarn {
 namespace {
 
 volatile std::sig_atomic_t interrupted = 0;
+std::atomic<void (*)()> tellOfIt{nullptr};
+static_assert(std::atomic<void (*)()>::is_always_lock_free);
 
 void remember(int signal) {
     interrupted = 1;
+    if (void (*tell)() = tellOfIt)
+        tell();
     std::signal(signal, SIG_DFL);
 }
 
@@ -20,8 +25,18 @@ void watchForInterrupt() {
     std::signal(SIGTERM, remember);
 }
 
+void whenInterrupted(void (*tell)()) {
+    tellOfIt = tell;
+    if (isInterrupted())
+        tell();
+}
+
+bool isInterrupted() noexcept {
+    return interrupted != 0;
+}
+
 void throwIfInterrupted() {
-    if (interrupted != 0)
+    if (isInterrupted())
         throw Interrupted();
 }
 

@@ -16,6 +16,12 @@ struct Interrupted : std::runtime_error {
 /// Thread: main.
 void watchForInterrupt();
 
+/// Calls `tell` when SIGINT or SIGTERM comes, from the handler of the signal; at once when one has come already. So
+/// long work that knows nothing of this file hears of it as well. Thread: main.
+void whenInterrupted(void (*tell)());
+
+/// SIGINT or SIGTERM has come. Thread: any.
+bool isInterrupted() noexcept;
 /// Throws Interrupted once SIGINT or SIGTERM has come. Thread: any.
 void throwIfInterrupted();
 

@@ -49,6 +49,8 @@ void writeMetadata(JsonWriter& json, const neuralWarp::ModelMetadata& metadata) 
     json.EndObject();
 }
 
+constexpr std::uint32_t manySmoothingPasses = 1000;
+
 std::string lines(const char* kind, const std::vector<std::string>& texts) {
     LineList all("of the kind");
     for (const std::string& text : texts)
@@ -63,6 +65,8 @@ std::string metadataLines(const neuralWarp::ModelMetadata& metadata) {
               (metadata.geometry.empty() ? "" : " of " + metadata.geometry));
     lines.add("deltas " + deltaModeText(metadata.deltaMode) + ", smoothing iterations " +
               std::to_string(metadata.smoothingIterations));
+    if (metadata.smoothingIterations >= manySmoothingPasses)
+        lines.add("warning: so many smoothing passes make every frame slow: 10 are usual");
     return lines.text();
 }
 

@@ -1,9 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/SceneSession.h"
 
+#include "openquarn_app/Interrupt.h"
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Workspace.h"
+#include "quarn/console/interrupt.h"
 #include "rig/registration.h"
 
 #include <CLI/CLI.hpp>
@@ -107,6 +109,7 @@ SceneFolder::~SceneFolder() {
 
 SceneSession::SceneSession(const std::vector<std::string>& plugins, int threads)
     : threads_(threads > 0 ? std::make_unique<Threads>(threads) : nullptr) {
+    whenInterrupted([] { OpenQuarn::setInterrupted(true); });
     loadPlugins(plugins, true);
 }
 

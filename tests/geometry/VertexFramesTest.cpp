@@ -9,8 +9,10 @@
 #include <gmock/gmock.h>
 
 #include <algorithm>
+#include <atomic>
 #include <cmath>
 #include <cstring>
+#include <limits>
 
 namespace {
 
@@ -71,6 +73,92 @@ TEST(VertexFrames, BuildAgreesWithTheDirectReadingOnEveryMeshAndMap) {
             ASSERT_EQ(frames.framesIndexer(), indexer);
         }
     });
+}
+
+// Points by the number of the corner, in turns about the circle and a number by chance.
+using Shape = quill::val3<float> (*)(float turn, float chance, std::uint32_t c);
+
+quill::val3<float> onCircle(float turn, float = 0.0F, std::uint32_t = 0) {
+    return {std::cos(6.2831853F * turn), std::sin(6.2831853F * turn), 0.0F};
+}
+
+ZooMesh largePolygon(Shape shape, std::uint32_t corners) {
+    ZooMesh mesh{"large", {{}}, {}};
+    std::uint32_t state = corners;
+    for (std::uint32_t c = 0; c < corners; ++c) {
+        state = state * 1664525U + 1013904223U;
+        const float chance = static_cast<float>(state >> 8U) / 8388608.0F - 1.0F;
+        mesh.points.push_back(shape(static_cast<float>(c) / static_cast<float>(corners), chance, c));
+        mesh.polygons[0].push_back(c);
+    }
+    return mesh;
+}
+
+constexpr float infinity = std::numeric_limits<float>::infinity();
+const std::pair<const char*, Shape> shapes[] = {
+    {"circle", onCircle},
+    {"circle far away", [](float t, float, std::uint32_t) { return onCircle(t) + quill::val3<float>(1000, 500, 0); }},
+    {"small circle", [](float t, float, std::uint32_t) { return onCircle(t) * 1e-19F; }},
+    {"circle too small for squares", [](float t, float, std::uint32_t) { return onCircle(t) * 1e-23F; }},
+    {"large circle", [](float t, float, std::uint32_t) { return onCircle(t) * 3e9F; }},
+    {"circle too large for squares", [](float t, float, std::uint32_t) { return onCircle(t) * 1.5e19F; }},
+    {"circle at the end of numbers", [](float t, float, std::uint32_t) { return onCircle(t) * 3e38F; }},
+    {"star", [](float t, float, std::uint32_t c) { return onCircle(t) * (c % 2 == 0 ? 1.0F : 0.4F); }},
+    {"helix", [](float t, float, std::uint32_t) { return onCircle(7 * t) + quill::val3<float>(0, 0, t); }},
+    {"by chance", [](float t, float r, std::uint32_t) { return onCircle(3 * r) * t + quill::val3<float>(0, 0, r); }},
+    {"on a grid",
+     [](float, float r, std::uint32_t c) { return quill::val3<float>(std::round(3 * r), float(c % 4), 0); }},
+    {"on a line", [](float, float r, std::uint32_t) { return quill::val3<float>(r, 0.3F * r, 0.7F * r); }},
+    {"on an axis", [](float, float r, std::uint32_t) { return quill::val3<float>(0, r, 0); }},
+    {"one point", [](float, float, std::uint32_t) { return quill::val3<float>(1, 2, 3); }},
+    {"with a NaN", [](float t, float, std::uint32_t c) { return onCircle(t) * (c == 17 ? std::nanf("") : 1.0F); }},
+    {"with an infinity", [](float t, float, std::uint32_t c) { return onCircle(t) * (c % 9 == 5 ? infinity : 1.0F); }},
+    {"some very far", [](float t, float r, std::uint32_t c) { return onCircle(t) * (c % 5 == 2 ? 2e18F * r : 1.0F); }},
+};
+
+TEST(VertexFrames, LargePolygonsAgreeWithTheFullSearch) {
+    for (const auto& [name, shape] : shapes)
+        for (const std::uint32_t corners : {21U, 32U, 33U, 100U, 147U}) {
+            SCOPED_TRACE(std::string(name) + ", " + std::to_string(corners));
+            ZooMesh mesh = largePolygon(shape, corners);
+            mesh.polygons[0].push_back(3); // a vertex may be a corner twice
+            const Built built(mesh);
+            const auto pairs = reference::cornerPairs(mesh.polygons, built.map, &built.points);
+            for (std::uint32_t v = 0; v < corners; ++v) {
+                const auto begin = built.frames.framesPairs().begin();
+                const auto& indexer = built.frames.framesIndexer();
+                ASSERT_EQ(std::vector<std::uint32_t>(begin + indexer[v], begin + indexer[v + 1]), pairs[v]) << v;
+            }
+        }
+}
+
+TEST(VertexFrames, WhoWaitsForALargePolygonIsToldAndMayEndIt) {
+    ZooMesh mesh = makeGrid(1, 1);
+    VertexFrames frames;
+    quill::IndexMapper map;
+    map.setIdentity(3004);
+    frames.build(mesh.topology(), map, nullptr);
+    const auto before = frames.framesPairs();
+    const ZooMesh line =
+        largePolygon(std::find_if(std::begin(shapes), std::end(shapes),
+                                  [](const auto& named) { return named.first == std::string("on a line"); })
+                         ->second,
+                     3000);
+    mesh.polygons.push_back(line.polygons[0]);
+    for (std::uint32_t& corner : mesh.polygons[1])
+        corner += 4;
+    mesh.points.insert(mesh.points.end(), line.points.begin(), line.points.end());
+    std::vector<std::size_t> told;
+    std::atomic<bool> isTold{false};
+    quill::WorkWatch watch;
+    watch.onSlowPolygon = [&](std::size_t polygon, std::size_t corners, double seconds) {
+        told.insert(told.end(), {polygon, corners});
+        isTold = seconds > 0.0;
+    };
+    watch.isCancelled = [&] { return isTold.load(); };
+    EXPECT_THROW(frames.build(mesh.topology(), map, &mesh.points, watch), quill::Cancelled);
+    EXPECT_THAT(told, ElementsAre(1, 3000));
+    EXPECT_EQ(frames.framesPairs(), before);
 }
 
 TEST(VertexFrames, AConcaveCornerStillHasAnEdgeNeighbourAsTangentReference) {

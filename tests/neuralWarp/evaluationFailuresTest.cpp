@@ -3,7 +3,9 @@
 // it came, to the last bit, or as it should be.
 #include "neuralWarp/support/FailureTest.h"
 
+#include "host/support/testNodes.h"
 #include "openquarn/HDGModifier.h"
+#include "openquarn_app/Interrupt.h"
 
 #include <functional>
 #include <limits>
@@ -77,7 +79,7 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
         "error: [NEURAL WARP] Size of target geometry (0) does not match deforming geometry (9)";
     const std::string controlMismatch = "error: [NEURAL WARP] Size of the ML model inputs (1) does not match the "
                                         "connected control attributes count(0).";
-    const std::string failure = report("failure");
+    const std::string fewControls = report("the model has more inputs than there are control values");
     const std::string noArray = "HDataBlock::inputArrayValue";
     const std::string noArrayReport = report(onDemand(noArray));
     struct Row {
@@ -93,9 +95,11 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
         {"rest too small", rest(unevenMesh(2, 1)), {restInvalid}},
         {"no rest", removed("originalGeometry[0]"), {noElement("originalGeometry")}},
         {"morph without an element", morphOn, {targetInvalid, noElement("targetMorphGeometry")}},
-        {"morph without a mesh", noMorphMesh, {targetInvalid, failure}},
-        {"morph too small", smallMorph, {targetMismatch, failure}},
-        {"no controls", controls({}), {controlMismatch, failure, failure}},
+        {"morph without a mesh", noMorphMesh, {targetInvalid, report("the target of the morph is no mesh")}},
+        {"morph too small",
+         smallMorph,
+         {targetMismatch, report("the target of the morph has fewer vertices than the geometry")}},
+        {"no controls", controls({}), {controlMismatch, fewControls, fewControls}},
         {"control values",
          fault("HDataBlock::inputArrayValue"),
          {report(onDemand(noArray), "neuralWarp/neuralWarpUtils"), noArrayReport, noArrayReport}},
@@ -121,6 +125,22 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
         EXPECT_EQ(said(), row.messages);
         EXPECT_EQ(result(*rig), came());
     }
+}
+
+TEST_F(EvaluationFailures, LongWorkEndsWhenTheUserAsksForIt) {
+    writeChanged([](ModelSpec& spec) { spec.smoothingIterations = 4000000000U; });
+    makeRig();
+    OpenQuarn::setInterrupted(true);
+    EXPECT_EQ(rig->deform(0), HStatus::kFailure);
+    EXPECT_THAT(said().front(), "warning: 'warp1' smooths geometry 0 in 4000000000 passes, as its model says, in each "
+                                "frame: up to 12252 s");
+    EXPECT_EQ(result(*rig), came());
+    EXPECT_THAT(stateText::raised(*rig->state(0)), testing::HasSubstr("restFrames"));
+    OpenQuarn::setInterrupted(false);
+    writeModel(modelDirectory(), modelSpec());
+    nodeOf(*rig).requestReload(0);
+    EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(stateText::raised(*rig->state(0)), "applied valid");
 }
 
 // --- evaluations that go on without the model, or with a part of it ---
@@ -195,6 +215,14 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
             t.rig->plug("targetMorphEnvelope").setDouble(value);
         };
     };
+    const auto connectedMorph = [&](double value) { // which no limit holds
+        return [=](T& t) {
+            morph(1.0)(t);
+            testNodes::create("testCase", "key");
+            testNodes::plug("key.in").setDouble(value);
+            testNodes::connect("key.out", "warp1.targetMorphEnvelope");
+        };
+    };
     const auto both = [](auto one, auto other) {
         return [=](T& t) {
             one(t);
@@ -232,6 +260,8 @@ TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
          "applied valid"},
         {"and half the envelope", both(morph(0.25), envelope(0.5F)),
          blended(came(), morphed(moved, targetShape, 0.25F), 0.5F), "applied valid"},
+        {"a morph the other way", connectedMorph(-0.5), blended(came(), morphed(moved, targetShape, -0.5F), 1.0F),
+         "applied valid"},
         {"all of the morph leaves the model unloaded", morph(1.0),
          blended(came(), morphed(came(), targetShape, 1.0F), 1.0F), "load"},
         {"morph without the model", both(off, morph(0.25)), blended(came(), morphed(came(), targetShape, 0.25F), 1.0F),

@@ -16,7 +16,7 @@ namespace fs = std::filesystem;
 using stateText::never;
 using testing::IsEmpty;
 
-const std::string unnamedFailure = "failure";
+const std::string otherVertices = "the model was trained on another number of vertices";
 const std::string noPath = "error: [NEURAL WARP] No model path specified";
 const std::string modelInit = "error: [NEURAL WARP] No ML model initialized for index 0";
 const std::string modelInvalid = "error: [NEURAL WARP] The training of the ml model for index 0 does not match the "
@@ -63,7 +63,7 @@ public:
     }
     static std::vector<Step> metadataFails(const Texts& messages) {
         return {{messages, Points::asTheyCame, "load", {0, 0, 0, never, never}},
-                {{fullCountMismatch(0), affectCountMismatch(0), modelInvalid, report(unnamedFailure)},
+                {{fullCountMismatch(0), affectCountMismatch(0), modelInvalid, report(otherVertices)},
                  Points::rounded,
                  "",
                  {0, 1, 0, never, 0}}};
@@ -235,9 +235,9 @@ TEST_F(LoadingFailures, OfTheMetadata) {
         {"unreadable", folderAt(file), metadataFails({bad}), "Failed to open metadata file stream\n"},
         {"loop of links", loopAt(file), metadataFails({unanswered("model.nwrp/metadata.json")})},
         {"another vertex count", written(otherFullCount),
-         validationFails({fullCountMismatch(10), modelInvalid, report(unnamedFailure)})},
+         validationFails({fullCountMismatch(10), modelInvalid, report(otherVertices)})},
         {"both counts", written(otherCounts),
-         validationFails({fullCountMismatch(0), affectCountMismatch(0), modelInvalid, report(unnamedFailure)})},
+         validationFails({fullCountMismatch(0), affectCountMismatch(0), modelInvalid, report(otherVertices)})},
         {"another affected count", written(otherAffectCount), loads({affectCountMismatch(7)})},
         {"another order of vertices", written(otherOrder), loads({setup}, "applied valid affectMap")},
     });
@@ -366,8 +366,8 @@ TEST_F(LoadingFailures, ErrorsAreForWhoIsLooking) {
         spec.affectCount = 8;
     });
     makeRig();
-    const Texts all{fullCountMismatch(10), affectCountMismatch(8), modelInvalid, report(unnamedFailure)};
-    const Texts ungated{affectCountMismatch(8), report(unnamedFailure)};
+    const Texts all{fullCountMismatch(10), affectCountMismatch(8), modelInvalid, report(otherVertices)};
+    const Texts ungated{affectCountMismatch(8), report(otherVertices)};
     const auto expect = [&](bool isPlaying, bool isScrubbing, const Texts& messages) {
         OpenQuarn::Animation::setPlaying(isPlaying);
         OpenQuarn::Animation::setScrubbing(isScrubbing);
@@ -429,10 +429,10 @@ TEST_F(LoadingFailures, OfADescription) {
     setModelName("model.x");
     expect(0, found, {}, due);
     setModelName("other");
-    expect(0, "", {badPath("ROOT/other.nwrp"), report(unnamedFailure)}, due);
+    expect(0, "", {badPath("ROOT/other.nwrp"), report("there is no such model directory")}, due);
     expect(0, "{'rootPath' : 'ROOT' ,'modelPath' : ''}", {}, due); // not looked for again
     setRoot("");
-    expect(0, "", {noPath, report(unnamedFailure)}, due);
+    expect(0, "", {noPath, report("modelRoot or modelName is empty")}, due);
     setRoot(folder.path().string());
     expect(1, "", {noElement, noElement}, "topology indexMap connections restFrames load metadata");
     expect(2, "", {}, "");

@@ -11,7 +11,8 @@ struct DeviceTally {
     std::size_t compared = 0;      // positions that came from the device
     std::size_t passedThrough = 0; // of these, without a kernel
     std::size_t onCpu = 0;         // positions that came from the CPU, as they should
-    std::size_t leftOut = 0;       // the step fails, or its target morph takes nearly all of the model away
+    std::size_t leftOut = 0;       // the step fails, its target morph takes nearly all of the model away, or the next
+                                   // frame is to load what this one gave up
 };
 
 // Chooses the device to replay on, "" for the first; false when there is none at all. Throws std::invalid_argument,

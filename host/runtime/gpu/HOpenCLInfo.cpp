@@ -18,6 +18,10 @@ cl_command_queue HOpenCLInfo::getQuarnDefaultOpenCLCommandQueue() noexcept {
     }
 }
 
+void HOpenCLInfo::explainFailure(const char* reason) noexcept {
+    OpenQuarn::noteFailure(std::string_view(reason ? reason : ""));
+}
+
 cl_int HOpenCLInfo::checkCLErrorStatus(cl_int status, const char* file, int line) noexcept {
     if (status == CL_SUCCESS)
         return status;

@@ -30,7 +30,9 @@ struct HOpenCLKernelInfo::Impl {
     std::size_t workItems = 0;
 
     bool create(const std::string& file);
-    std::size_t globalSize() const { return (workItems + localSize - 1) / localSize * localSize; }
+    cl_int enqueue(const HOpenCLEventList& waitFor, HOpenCLEvent* done) const;
+    cl_int enqueueRange(std::size_t begin, std::size_t count, std::size_t local, const HOpenCLEventList& waitFor,
+                        HOpenCLEvent* done) const;
 };
 
 bool HOpenCLKernelInfo::Impl::create(const std::string& file) {
@@ -46,6 +48,33 @@ bool HOpenCLKernelInfo::Impl::create(const std::string& file) {
                                       nullptr);
     localSize = std::clamp<std::size_t>(largest, 1, usualLocalSize);
     return noteFailure(status, "clGetKernelWorkGroupInfo", name) == CL_SUCCESS;
+}
+
+// A global size is a multiple of the local one: whole groups first, then what is left, one by one. The queue is in
+// order, so that the last event covers both.
+cl_int HOpenCLKernelInfo::Impl::enqueue(const HOpenCLEventList& waitFor, HOpenCLEvent* done) const {
+    const std::size_t left = workItems % localSize;
+    const std::size_t grouped = workItems - left;
+    cl_int status = CL_SUCCESS;
+    if (grouped > 0)
+        status = enqueueRange(0, grouped, localSize, waitFor, left > 0 ? nullptr : done);
+    if (left > 0 && status == CL_SUCCESS)
+        status = enqueueRange(grouped, left, 1, grouped > 0 ? HOpenCLEventList() : waitFor, done);
+    return status;
+}
+
+cl_int HOpenCLKernelInfo::Impl::enqueueRange(std::size_t begin, std::size_t count, std::size_t local,
+                                             const HOpenCLEventList& waitFor, HOpenCLEvent* done) const {
+    const OpenQuarn::Device& device = *program->device;
+    HOpenCLEvent ran;
+    const bool isAsked = done || device.isTimed;
+    const cl_int status = clEnqueueNDRangeKernel(device.queue, kernel, 1, &begin, &count, &local, waitFor.length(),
+                                                 waitFor.data(), isAsked ? ran.receive() : nullptr);
+    if (noteFailure(status, "clEnqueueNDRangeKernel", name) == CL_SUCCESS)
+        OpenQuarn::timeCommand(device, name, ran.get());
+    if (done)
+        *done = std::move(ran);
+    return status;
 }
 
 HOpenCLKernelInfo::HOpenCLKernelInfo() noexcept = default;
@@ -96,25 +125,18 @@ void HOpenCLKernelInfo::setKernelArgBuffer(cl_uint index, const HOpenCLBuffer& b
 cl_int HOpenCLKernelInfo::enqueueKernel(const HOpenCLEventList& waitFor, HOpenCLEvent* done) {
     if (!impl_)
         return noteFailure(CL_INVALID_KERNEL, "clEnqueueNDRangeKernel", "no kernel is loaded");
-    const OpenQuarn::Device& device = *impl_->program->device;
-    HOpenCLEvent ran;
     if (impl_->workItems == 0) {
         if (!done)
             return CL_SUCCESS;
+        const OpenQuarn::Device& device = *impl_->program->device;
+        HOpenCLEvent ran;
         const cl_int status =
             clEnqueueMarkerWithWaitList(device.queue, waitFor.length(), waitFor.data(), ran.receive());
         *done = std::move(ran);
         return noteFailure(status, "clEnqueueMarkerWithWaitList", impl_->name);
     }
-    const std::size_t global = impl_->globalSize();
-    const bool isAsked = done || device.isTimed;
-    const cl_int status = clEnqueueNDRangeKernel(device.queue, impl_->kernel, 1, nullptr, &global, &impl_->localSize,
-                                                 waitFor.length(), waitFor.data(), isAsked ? ran.receive() : nullptr);
-    if (noteFailure(status, "clEnqueueNDRangeKernel", impl_->name) == CL_SUCCESS) {
+    const cl_int status = impl_->enqueue(waitFor, done);
+    if (status == CL_SUCCESS)
         OpenQuarn::countLaunch(impl_->name);
-        OpenQuarn::timeCommand(device, impl_->name, ran.get());
-    }
-    if (done)
-        *done = std::move(ran);
     return status;
 }

@@ -226,6 +226,26 @@ TEST_F(GpuCounting, NamesWhatHappenedAndMeasuresWhenAsked) {
     EXPECT_EQ(Gpu::counts().bytesUp, 0U);
 }
 
+TEST_F(GpuCounting, AKernelRunsForEachWorkItemAndForNoOther) {
+    const HString file = write("tally.cl", "__kernel void tally(__global int* to) { ++to[get_global_id(0)]; }\n");
+    for (const std::size_t items : {1U, 63U, 64U, 65U, 130U}) {
+        HOpenCLBuffer tallies;
+        ASSERT_EQ(upload(std::vector<int>(200), tallies), CL_SUCCESS);
+        HOpenCLKernelInfo kernel;
+        ASSERT_TRUE(kernel.loadOrUpdate(file, "tally", items));
+        cl_int status = CL_SUCCESS;
+        kernel.setKernelArgBuffer(0, tallies, status);
+        HOpenCLEvent done;
+        ASSERT_EQ(kernel.enqueueKernel({tallies.bufferReadyEvent()}, &done), CL_SUCCESS);
+        EXPECT_FALSE(done.isNull());
+        std::vector<int> expected(200);
+        std::fill_n(expected.begin(), items, 1);
+        EXPECT_EQ(contents<int>(tallies, 200), expected) << items;
+        EXPECT_THAT(Gpu::counts().launches, ElementsAre(Pair("tally", 1)));
+        Gpu::resetCounts();
+    }
+}
+
 TEST_F(GpuBuffers, AreFoundByPlugAndName) {
     const Session session;
     HSelectionList list;

@@ -4,6 +4,7 @@
 #include "openquarn/HExternalContentInfoTable.h"
 #include "openquarn/HExternalContentLocationTable.h"
 #include "openquarn/HGlobal.h"
+#include "openquarn/HLongWork.h"
 #include "openquarn/Instrumenter.h"
 #include "openquarn_app/Animation.h"
 #include "openquarn_app/Messages.h"
@@ -34,8 +35,11 @@ TEST(Displays, EachHasItsSeverity) {
     HGlobal::displayError("e^1s");
     HGlobal::displayWarning("");
     HGlobal::displayInfo(HString(std::string("a\0b", 3)));
+    HLongWork::announce("a knot", 124.2);
+    HLongWork::announce("a loop", std::nan(""));
     OpenQuarn::setMessageSink({});
-    EXPECT_THAT(shown, testing::ElementsAre("error: e^1s", "warning: ", std::string("info: a\0b", 9)));
+    EXPECT_THAT(shown, testing::ElementsAre("error: e^1s", "warning: ", std::string("info: a\0b", 9),
+                                            "warning: a knot: up to 125 s", "warning: a loop: up to 1 s"));
 }
 
 TEST(AnimationState, IsWhatTheApplicationSets) {

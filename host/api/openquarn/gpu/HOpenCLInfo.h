@@ -19,6 +19,10 @@ public:
     static cl_int checkCLErrorStatus(cl_int status, const char* file = __builtin_FILE(),
                                      int line = __builtin_LINE()) noexcept;
 
+    /// For a failure that no OpenCL call had: keeps the reason for the host's next message, unless there is one
+    /// already.
+    static void explainFailure(const char* reason) noexcept;
+
     /// "CL_OUT_OF_RESOURCES"; "unknown status" for one that OpenCL does not name.
     static const char* statusName(cl_int status) noexcept;
 };

@@ -23,8 +23,8 @@ public:
     /// Brings the kernel up to date with its file, and sets the work size. The program is compiled once a process for
     /// each file, list of folders and device, and again when the file or one that it includes has another time or size;
     /// one that does not compile is tried again then too.
-    /// `file` path of the OpenCL C source; `kernel` name of a kernel in it; `workItems` number of work items, may be 0:
-    /// the kernel has to know it too, see enqueueKernel(); `includeDirectories` where its includes are looked for,
+    /// `file` path of the OpenCL C source; `kernel` name of a kernel in it; `workItems` number of work items, may be 0;
+    /// `includeDirectories` where its includes are looked for,
     /// after the folder of the file that includes; null: nowhere else.
     /// False when the file cannot be read or compiled, has no such kernel, or there is no device: the reason is kept
     /// for the host's message. There is no kernel then.
@@ -39,9 +39,10 @@ public:
     /// nothing unless `status` is CL_SUCCESS; a failure is put into it.
     void setKernelArgBuffer(cl_uint index, const HOpenCLBuffer& buffer, cl_int& status, bool isValid = true);
 
-    /// Enqueues the kernel on the host's default queue. The host chooses the local size, at most 64, and rounds the
-    /// number of work items up to a multiple of it: items from workItems() on have to do nothing. With 0 work items
-    /// nothing runs, and `done` comes with `waitFor`. `done` receives an event; null: nobody asks.
+    /// Enqueues the kernel on the host's default queue, for exactly workItems() work items. The host chooses the local
+    /// size, at most 64; what is left over by whole groups runs as a second range of single items, so that a kernel
+    /// goes by get_global_id(0), and not by the sizes that OpenCL gives it. With 0 work items nothing runs, and `done`
+    /// comes with `waitFor`. `done` receives an event that comes after both; null: nobody asks.
     cl_int enqueueKernel(const HOpenCLEventList& waitFor, HOpenCLEvent* done);
 
     /// Lets go of the kernel; the compiled program stays.
