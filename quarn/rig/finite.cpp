@@ -10,7 +10,7 @@ namespace rig {
 namespace {
 
 // Infinity and NaN are what has all bits of the exponent. Without a way out of the loop the compiler takes several
-// values at once; a loop that looks for the first one takes them singly, five times as long.
+// values at once; a loop that looks for the first one takes them singly, four times as long.
 bool areFinite(const float* values, std::size_t count) {
     constexpr std::uint32_t exponent = 0x7F800000;
     std::uint32_t found = 0;
