@@ -137,6 +137,10 @@ TEST(Script, AnErrorThatIsShownIsTold) {
     const TestCommand inner("inner", [](const HPxCommand&, const HArgList& args) {
         return HGlobal::executeCommand(args.asString(0), false);
     });
+    const TestCommand nested("nested", [](const HPxCommand&, const HArgList& args) {
+        EXPECT_FALSE(runScript(args.asString(0).asStdString(), "n").shownError.empty());
+        return HStatus();
+    });
     const struct {
         const char* text;
         const char* error;
@@ -147,6 +151,7 @@ TEST(Script, AnErrorThatIsShownIsTold) {
         {"show info a\nshow error b\nshow error c", "", "s, line 2: show: b", 3, 2},
         {"show report a; show", "", "s, line 1: show: a", 2, 1},
         {"inner 'show error a'; show", "", "s, line 1: inner: a", 2, 1},
+        {"nested 'show error a'; show", "", "s, line 1: nested: a", 2, 1},
         {"show error a\nshow fail\nshow", "s, line 2: show: it failed", "s, line 1: show: a", 2, 1},
         {"try show error a; try show fail; show", "", "", 3, 3},
         {"try show report a -flag 'b c'", "", "", 1, 1},
