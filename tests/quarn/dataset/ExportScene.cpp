@@ -6,6 +6,7 @@
 
 #include "openquarn_app/Commands.h"
 #include "rig/NpyFile.h"
+#include "storage/WholeFile.h"
 
 #include <cmath>
 #include <cstdlib>
@@ -79,10 +80,12 @@ std::vector<float> ExportScene::targetAt(std::size_t frame) {
 }
 
 void ExportScene::writeCache(const std::vector<std::vector<float>>& frames) const {
-    rig::NpyWriter writer(folder.path() / "strip.npy", frames.front().size() / 3);
+    // by hand: a writer of point caches refuses what is no finite number
+    storage::WholeFile file(folder.path() / "strip.npy");
+    file.stream() << rig::makeNpyHead(frames.size(), frames.front().size() / 3);
     for (const std::vector<float>& frame : frames)
-        writer.append(frame);
-    writer.finish();
+        file.write(std::as_bytes(std::span(frame)));
+    file.finish();
 }
 
 void ExportScene::build(std::size_t frames, const std::string& more) {
