@@ -27,21 +27,21 @@ int swapInOneStep(const fs::path& one, const fs::path& other) {
     return ::renameat2(AT_FDCWD, one.c_str(), AT_FDCWD, other.c_str(), RENAME_EXCHANGE) == 0 ? 0 : errno;
 }
 
-void move(const fs::path& from, const fs::path& to) {
+void giveName(const fs::path& from, const fs::path& to) {
     if (::rename(from.c_str(), to.c_str()) != 0)
         throw FileError(from, "could not be renamed to " + to.string() + ": " + textOfErrno(errno));
 }
 
 void swapInSteps(const fs::path& next, const fs::path& folder) {
     const fs::path aside = folder.string() + ".old" + std::to_string(::getpid());
-    move(folder, aside);
+    giveName(folder, aside);
     try {
-        move(next, folder);
+        giveName(next, folder);
     } catch (const FileError&) {
-        move(aside, folder);
+        giveName(aside, folder);
         throw;
     }
-    move(aside, next);
+    giveName(aside, next);
 }
 
 } // namespace
@@ -80,6 +80,11 @@ void flushNames(const fs::path& folder) {
     const Descriptor opened(::open(orHere(folder).c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
     if (opened.isOpen())
         static_cast<void>(::fsync(opened.number()));
+}
+
+void moveFolder(const fs::path& from, const fs::path& to) {
+    giveName(from, to);
+    flushNames(to.parent_path());
 }
 
 void exchangeFolders(const fs::path& next, const fs::path& folder) {

@@ -19,6 +19,9 @@ void syncToDisk(const std::filesystem::path& path);
 /// cannot has the names all the same.
 void flushNames(const std::filesystem::path& folder);
 
+/// Gives a folder another name, which no folder has that is not empty. Throws FileError. Thread: any.
+void moveFolder(const std::filesystem::path& from, const std::filesystem::path& to);
+
 /// Puts `next` in the place of `folder`, and what was there in the place of `next`, in one step: `folder` is there at
 /// any moment. Both are of one file system. Where that cannot do it (NFS, for one), in two steps, with an instant
 /// between them in which `folder` is not there. Throws FileError; both are then as they were. Thread: any.

@@ -42,13 +42,6 @@ void removeFile(const fs::path& file) {
         throw std::runtime_error(file.string() + " could not be removed: " + error.message());
 }
 
-void move(const fs::path& from, const fs::path& to) {
-    std::error_code error;
-    fs::rename(from, to, error);
-    if (error)
-        throw std::runtime_error(from.string() + " could not be renamed to " + to.string() + ": " + error.message());
-}
-
 // what belongs to the making of a data set, and not to it
 bool isTool(const std::string& name) {
     const auto isBegun = [&](const char* file) { return name != file && isOneOf(name, file); };
@@ -151,10 +144,9 @@ void DatasetFolder::requireSpace(std::uint64_t bytes) const {
 void DatasetFolder::publish(FolderLock& lock) const {
     storage::syncToDisk(part_);
     std::error_code none;
-    if (fs::is_empty(folder_, none) || none) { // rename() takes the place of an empty folder as of none
-        move(part_, folder_);
+    if (fs::is_empty(folder_, none) || none) { // one that is empty is no data set
+        storage::moveFolder(part_, folder_);
         lock.follow(folder_);
-        storage::syncToDisk(folder_.parent_path());
         return removeTools(folder_);
     }
     // it may have come, or may have got more in it, since the beginning

@@ -4,6 +4,7 @@
 #include "quarn/console/UsageError.h"
 #include "quarn/play/meshFiles.h"
 #include "rig/NpyFile.h"
+#include "storage/WholeFile.h"
 
 #include <cstdlib>
 #include <stdexcept>
@@ -30,8 +31,9 @@ std::filesystem::path frameFile(const std::filesystem::path& pattern, int frame)
 }
 
 void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& frames) {
+    using storage::WholeFile;
     if (isCache(pattern))
-        return;
+        return WholeFile::requirePossible(pattern, WholeFile::Writes::anywhere);
     if (!isMeshFile(pattern))
         throw UsageError("\"" + pattern.string() +
                          "\" is no file that is written here: its name ends in .npy, .obj, .ply, .gltf or .glb");
@@ -39,6 +41,7 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
         throw UsageError("\"" + pattern.string() + "\" would be written for each of " + std::to_string(frames.count()) +
                          " frames: put #### where the number of the frame goes, as in \"" + pattern.stem().string() +
                          ".####" + pattern.extension().string() + "\"");
+    WholeFile::requirePossible(frameFile(pattern, frames.first));
 }
 
 FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, VertexOrder order)

@@ -10,6 +10,7 @@
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/plugs.h"
+#include "storage/WholeFile.h"
 
 #include <memory>
 #include <stdexcept>
@@ -31,6 +32,8 @@ public:
         , progress_(console, "playing", plan_.frames.count() * static_cast<std::size_t>(plan_.repeats)) {
         if (!plan_.output.empty())
             checkFramePattern(plan_.output, plan_.frames);
+        if (!plan_.trace.empty())
+            storage::WholeFile::requirePossible(plan_.trace);
     }
 
     PlayResult play() {

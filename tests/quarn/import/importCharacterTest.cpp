@@ -13,6 +13,8 @@
 #include <fstream>
 #include <iterator>
 
+#include <sys/stat.h>
+
 namespace quarn {
 namespace {
 
@@ -205,7 +207,10 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
     refused("strip.gltf has no animation \"run\"", [](ImportOptions& options) { options.animation = "run"; });
     refused("does not exist", [&](ImportOptions& options) { options.file = path("none.glb"); });
     refused("is the character itself", [&](ImportOptions& options) { options.output = options.file; });
-    refused("one after the other only", [&](ImportOptions& options) { options.output = "/dev/null"; });
+    refused("one after the other only", [&](ImportOptions& options) {
+        ASSERT_EQ(mkfifo(path("pipe.json").c_str(), 0600), 0);
+        options.output = path("pipe.json");
+    });
     refused("is a folder", [&](ImportOptions& options) { options.output = path("."); });
     refused("table.gltf has meshes (table of 6 vertices), 0 joints, 0 animations, and no skin",
             [&](ImportOptions& options) {
