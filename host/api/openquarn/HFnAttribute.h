@@ -69,10 +69,11 @@ public:
     /// Fails as setObject() does.
     explicit HFnNumericAttribute(const HObject& object, HStatus* status = nullptr);
     HFn::Type type() const override { return HFn::kNumericAttribute; }
-    /// Makes a new attribute and attaches the set to it; null on failure (an unusable name). `defaultValue` in the
-    /// attribute's own unit. [main]
+    /// Makes a new attribute and attaches the set to it; null on failure (an unusable name, a default that is NaN).
+    /// `defaultValue` in the attribute's own unit. [main]
     HObject create(const HString& longName, const HString& shortName, HFnNumericData::Type kind,
                    double defaultValue = 0.0, HStatus* status = nullptr);
+    /// These fail for NaN, and for a limit that would put a min above its max; what was set before stays.
     HStatus setDefault(double value);
     HStatus setMin(double value);
     HStatus setMax(double value);
@@ -120,7 +121,7 @@ public:
     /// Makes a new attribute and attaches the set to it; null on failure. [main]
     HObject create(const HString& longName, const HString& shortName, short defaultValue = 0,
                    HStatus* status = nullptr);
-    /// Fails when the number has a label already. [main]
+    /// Fails when the number has a label already, or the label a number. [main]
     HStatus addField(const HString& label, short value);
     HStatus setDefault(short value);
 

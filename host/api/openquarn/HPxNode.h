@@ -28,7 +28,8 @@ public:
     HPxNode& operator=(const HPxNode&) = delete;
     virtual ~HPxNode();
 
-    /// Called once after the node has its name and its values, before anybody else sees it. [main]
+    /// Called once after the node has its name and its values, before anybody else sees it. When it throws, the node is
+    /// not created: it is taken away, and whoever asked for it gets the failure. [main]
     virtual void postConstructor();
     /// Brings `plug`, an output of this node, up to date: read inputs, write outputs, set them clean. Answer
     /// kUnknownParameter for a plug that this type does not produce; the host then takes its value as it is. Called
@@ -63,7 +64,14 @@ public:
     /// Adds an attribute with its children. Fails when one of the names is taken.
     static HStatus addAttribute(const HObject& attribute);
     /// Declares that `affected` depends on `affecting`: when the latter changes, all of the former becomes dirty, with
-    /// its elements and children. With `affectsTree`, a change of anything below `affecting` counts as its change.
+    /// its elements and children. Fails when one is, or is a part of, the other.
+    ///
+    /// A change of an attribute is a change of its own plug or of one above it. With `affectsTree`, a change of
+    /// anything below `affecting` counts as well. So for a compound `pair` with the children `a` and `b`:
+    ///   attributeAffects(pair, out)        connecting `pair` makes `out` dirty; setting `pair.a` does not
+    ///   attributeAffects(a, out)           setting or connecting `pair.a`, or connecting `pair`, does; `pair.b` does
+    ///   not attributeAffects(pair, out, true)  everything does
+    /// The first is seldom meant alone: a warning says so when no child of `pair` affects `out` itself.
     static HStatus attributeAffects(const HObject& affecting, const HObject& affected);
     static HStatus attributeAffects(const HObject& affecting, const HObject& affected, bool affectsTree);
 

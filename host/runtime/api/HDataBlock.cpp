@@ -244,7 +244,7 @@ HDataHandle HDataHandle::child(const HObject& attribute) const {
     OpenQuarn::requireEval("HDataHandle::child");
     const auto wanted = impl_ ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
     if (wanted)
-        for (const SlotPointer& part : impl_->children)
+        for (const SlotPointer& part : impl_->children())
             if (part->field.attribute == wanted)
                 return HDataHandle(part);
     return {};
@@ -365,7 +365,7 @@ HStatus beyondLast(const SlotPointer& array) {
 
 SlotPointer firstFrom(const Slot& array, unsigned index) {
     const OpenQuarn::ArrayReadLock lock(array.owner);
-    const auto* entry = array.elements.atOrAfter(index);
+    const auto* entry = array.elements().atOrAfter(index);
     return entry ? entry->item : nullptr;
 }
 
@@ -394,7 +394,7 @@ unsigned HArrayDataHandle::elementCount() const {
     if (!impl_)
         return 0;
     const OpenQuarn::ArrayReadLock lock(impl_->owner);
-    return static_cast<unsigned>(impl_->elements.size());
+    return static_cast<unsigned>(impl_->elements().size());
 }
 
 unsigned HArrayDataHandle::elementIndex(HStatus* status) const {
@@ -422,7 +422,7 @@ HStatus jump(const SlotPointer& array, SlotPointer& current, unsigned logicalInd
     if (!array)
         return {HStatus::kInvalidParameter, "the array handle is not valid"};
     const OpenQuarn::ArrayReadLock lock(array->owner);
-    SlotPointer element = array->elements.find(logicalIndex);
+    SlotPointer element = array->elements().find(logicalIndex);
     if (!element)
         return {HStatus::kFailure, "'" + array->name() + "' has no element " + std::to_string(logicalIndex)};
     current = std::move(element);
@@ -445,7 +445,7 @@ HStatus HArrayDataHandle::jumpToPosition(unsigned position) {
         if (!impl_)
             return {HStatus::kInvalidParameter, "the array handle is not valid"};
         const OpenQuarn::ArrayReadLock lock(impl_->owner);
-        const auto* entry = impl_->elements.at(position);
+        const auto* entry = impl_->elements().at(position);
         if (!entry)
             return {HStatus::kFailure,
                     "'" + impl_->name() + "' has no element at position " + std::to_string(position)};

@@ -2,9 +2,12 @@
 #include "openquarn/HFnAttribute.h"
 
 #include "core/apiCall.h"
+#include "core/text.h"
 #include "graph/Attribute.h"
 
 #include <algorithm>
+#include <cmath>
+#include <utility>
 
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
@@ -40,6 +43,14 @@ HStatus setFlag(const HObject& object, FaultPoint point, bool Attribute::*flag, 
         attribute.*flag = on;
         return HStatus::kSuccess;
     });
+}
+
+HStatus refused(const Attribute& attribute, const std::string& why) {
+    return {HStatus::kInvalidParameter, "attribute '" + attribute.name + "': " + why};
+}
+
+std::string notANumber(const char* what) {
+    return std::string(what) + " is not a number (NaN)";
 }
 
 bool flagOf(const HObject& object, bool Attribute::*flag) {
@@ -157,9 +168,9 @@ HObject createAttribute(FaultPoint point, HStatus* status, HObject& attachTo, HF
         attachTo = HObject();
         const std::shared_ptr<Attribute> made =
             OpenQuarn::makeAttribute(kind, longName.asStdString(), shortName.asStdString());
-        const std::string refused = fill(*made);
-        if (!refused.empty()) {
-            outcome = {HStatus::kInvalidParameter, "attribute '" + made->name + "': " + refused};
+        const std::string why = fill(*made);
+        if (!why.empty()) {
+            outcome = refused(*made, why);
             return HObject();
         }
         attachTo = Access::object(made);
@@ -191,6 +202,8 @@ HObject HFnNumericAttribute::create(const HString& longName, const HString& shor
                            shortName, [&](Attribute& attribute) -> std::string {
                                if (kind < HFnNumericData::kBoolean || kind > HFnNumericData::kDouble)
                                    return "there is no kind of number " + std::to_string(kind);
+                               if (std::isnan(defaultValue))
+                                   return notANumber("its default");
                                attribute.number = kind;
                                attribute.keyable = true;
                                attribute.defaultNumber = attribute.stored(defaultValue);
@@ -210,6 +223,8 @@ double HFnNumericAttribute::defaultValue() const {
 
 HStatus HFnNumericAttribute::setDefault(double value) {
     return changeAttribute(object_, FaultPoint::HFnNumericAttribute_setDefault, [&](Attribute& attribute) -> HStatus {
+        if (std::isnan(value))
+            return refused(attribute, notANumber("its default"));
         attribute.defaultNumber = attribute.stored(value);
         return HStatus::kSuccess;
     });
@@ -219,10 +234,26 @@ namespace {
 
 using Limit = std::optional<double> Attribute::*;
 
+/// Of a pair of limits, the lower and the upper one.
+std::string outOfOrder(const char* lower, std::optional<double> low, const char* upper, std::optional<double> high) {
+    if (!low || !high || *low <= *high)
+        return {};
+    return std::string("its ") + lower + " " + OpenQuarn::printedNumber(*low) + " is above its " + upper + " " +
+           OpenQuarn::printedNumber(*high);
+}
+
 HStatus setLimit(const HObject& object, FaultPoint point, Limit limit, double value) {
     return changeAttribute(object, point, [&](Attribute& attribute) -> HStatus {
-        attribute.*limit = value;
-        return HStatus::kSuccess;
+        if (std::isnan(value))
+            return refused(attribute, notANumber("its limit"));
+        const std::optional<double> before = std::exchange(attribute.*limit, value);
+        std::string why = outOfOrder("min", attribute.min, "max", attribute.max);
+        if (why.empty())
+            why = outOfOrder("softMin", attribute.softMin, "softMax", attribute.softMax);
+        if (why.empty())
+            return HStatus::kSuccess;
+        attribute.*limit = before;
+        return refused(attribute, why);
     });
 }
 
@@ -340,10 +371,14 @@ HObject HFnEnumAttribute::create(const HString& longName, const HString& shortNa
 
 HStatus HFnEnumAttribute::addField(const HString& label, short value) {
     return changeAttribute(object_, FaultPoint::HFnEnumAttribute_addField, [&](Attribute& attribute) -> HStatus {
-        for (const auto& [other, number] : attribute.fields)
+        for (const auto& [other, number] : attribute.fields) {
             if (number == value)
                 return {HStatus::kFailure, "attribute '" + attribute.name + "' labels " + std::to_string(value) +
                                                " as '" + other + "' already"};
+            if (label == other.c_str())
+                return {HStatus::kFailure, "attribute '" + attribute.name + "' has the label '" + other + "' for " +
+                                               std::to_string(number) + " already"};
+        }
         attribute.fields.emplace_back(label.asStdString(), value);
         return HStatus::kSuccess;
     });

@@ -210,7 +210,7 @@ unsigned HPlug::numElements(HStatus* status) const {
             return 0U;
         }
         const std::shared_ptr<Slot> slot = resolvePlug(*this);
-        return slot ? static_cast<unsigned>(slot->elements.size()) : 0U;
+        return slot ? static_cast<unsigned>(slot->elements().size()) : 0U;
     });
 }
 
@@ -222,8 +222,8 @@ HStatus HPlug::getExistingArrayAttributeIndices(std::vector<unsigned>& indices) 
         const std::shared_ptr<Slot> slot = resolvePlug(*this);
         if (!slot)
             return HStatus::kSuccess;
-        indices.reserve(slot->elements.size());
-        slot->elements.forEach([&](unsigned index, const std::shared_ptr<Slot>&) { indices.push_back(index); });
+        indices.reserve(slot->elements().size());
+        slot->elements().forEach([&](unsigned index, const std::shared_ptr<Slot>&) { indices.push_back(index); });
         return HStatus::kSuccess;
     });
 }
@@ -250,7 +250,7 @@ HPlug HPlug::elementByLogicalIndex(unsigned index, HStatus* status) const {
 HPlug HPlug::elementByPhysicalIndex(unsigned position, HStatus* status) const {
     return apiValue(FaultPoint::HPlug_elementByPhysicalIndex, status, HPlug(), [&](HStatus& outcome) {
         const std::shared_ptr<Slot> slot = isArray() ? resolvePlug(*this) : nullptr;
-        const auto* entry = slot ? slot->elements.at(position) : nullptr;
+        const auto* entry = slot ? slot->elements().at(position) : nullptr;
         if (entry)
             return elementOf(*impl_, entry->index);
         outcome = failed(*this, "has no element at position " + std::to_string(position));
@@ -370,9 +370,9 @@ std::shared_ptr<Slot> partBelow(const std::shared_ptr<Slot>& source, const Slot&
     if (!parent)
         return nullptr;
     if (part.isElement)
-        return parent->elements.find(part.index);
+        return parent->elements().find(part.index);
     const std::size_t position = part.field.position;
-    return position < parent->children.size() ? parent->children[position] : nullptr;
+    return position < parent->children().size() ? parent->children()[position] : nullptr;
 }
 
 } // namespace

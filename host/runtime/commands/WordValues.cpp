@@ -72,17 +72,6 @@ HStatus readWord(const std::string& word, HString& value) {
     return {};
 }
 
-std::string printedNumber(double value) {
-    constexpr double longestWhole =
-        1e15; // whole numbers up to there are shown with all their digits: 100000, not 1e+05
-    std::array<char, 32> digits{};
-    char* const end = digits.data() + digits.size();
-    const bool isWhole = std::fabs(value) < longestWhole && value == std::trunc(value);
-    const auto result = isWhole ? std::to_chars(digits.data(), end, value, std::chars_format::fixed)
-                                : std::to_chars(digits.data(), end, value);
-    return {digits.data(), result.ptr};
-}
-
 std::string inQuotes(std::string_view text) {
     std::string quoted(1, '\'');
     quoted += text.substr(0, longestQuote);

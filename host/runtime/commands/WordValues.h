@@ -2,6 +2,7 @@
 // Words read as values. Each fails with kFailure and a sentence that quotes the word; the value is left alone then.
 #pragma once
 
+#include "core/text.h"
 #include "openquarn/HStatus.h"
 #include "openquarn/HString.h"
 
@@ -15,9 +16,6 @@ HStatus readWord(const std::string& word, int& value);
 HStatus readWord(const std::string& word, unsigned& value);
 HStatus readWord(const std::string& word, double& value);
 HStatus readWord(const std::string& word, HString& value);
-
-/// The number in the fewest digits that read back the same.
-std::string printedNumber(double value);
 
 /// 'text', cut where it is long.
 std::string inQuotes(std::string_view text);

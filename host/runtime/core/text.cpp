@@ -3,6 +3,8 @@
 
 #include <algorithm>
 #include <array>
+#include <charconv>
+#include <cmath>
 #include <cstdio>
 
 namespace OpenQuarn {
@@ -21,6 +23,17 @@ std::string hexText(HTypeId id) {
     std::array<char, 16> text{};
     std::snprintf(text.data(), text.size(), "0x%08x", id.id());
     return text.data();
+}
+
+std::string printedNumber(double value) {
+    constexpr double longestWhole =
+        1e15; // whole numbers up to there are shown with all their digits: 100000, not 1e+05
+    std::array<char, 32> digits{};
+    char* const end = digits.data() + digits.size();
+    const bool isWhole = std::fabs(value) < longestWhole && value == std::trunc(value);
+    const auto result = isWhole ? std::to_chars(digits.data(), end, value, std::chars_format::fixed)
+                                : std::to_chars(digits.data(), end, value);
+    return {digits.data(), result.ptr};
 }
 
 bool isIdentifier(const std::string& text) {

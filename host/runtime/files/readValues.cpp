@@ -2,12 +2,14 @@
 #include "files/dataFormats.h"
 #include "files/valueFiles.h"
 
+#include "core/text.h"
 #include "graph/plugImpl.h"
 #include "graph/plugName.h"
 
 #include <algorithm>
 #include <charconv>
 #include <cmath>
+#include <span>
 #include <stdexcept>
 #include <unordered_set>
 
@@ -20,32 +22,51 @@ using rapidjson::Value;
 struct Decoded {
     double number = 0.0;
     std::shared_ptr<Data> data;
+    bool isBeyondLimits = false; ///< the file's is; this one is the limit
 };
 
-std::string decodeNumber(const Attribute& attribute, const Value& value, Decoded& decoded) {
+/// Why a value is not taken: what it is not, or why nobody may set it.
+struct Misfit {
+    std::string why;
+    bool isRefused = false;
+    explicit operator bool() const { return !why.empty(); }
+};
+
+Misfit decodeNumber(const Attribute& attribute, const Value& value, Decoded& decoded) {
     const bool isBool = attribute.number == HFnNumericData::kBoolean && value.IsBool();
     const std::optional<double> number = isBool ? std::optional(value.GetBool() ? 1.0 : 0.0) : numberOf(value);
     if (!number)
-        return std::string("is no ") + attribute.typeName();
-    decoded.number = attribute.stored(*number);
-    const bool isReal = attribute.number == HFnNumericData::kFloat || attribute.number == HFnNumericData::kDouble;
-    // a float takes the nearest to any number in its range, everything else has to be exact
-    const bool fits = isReal ? std::isfinite(*number) == std::isfinite(decoded.number) : decoded.number == *number;
-    return fits ? "" : std::string("does not fit the range of a ") + attribute.typeName();
+        return {std::string("is no ") + attribute.typeName()};
+    decoded.number = attribute.stored(attribute.limited(*number));
+    decoded.isBeyondLimits = attribute.limited(*number) != *number;
+    return {attribute.refusal(*number), true};
 }
 
-// Why the value does not fit; empty when it does.
-std::string decode(const Attribute& attribute, const Value& value, Decoded& decoded) {
+std::span<const double> numbersIn(const Data& data) {
+    if (data.dataType() == HFnData::kMatrix)
+        return static_cast<const MatrixData&>(data).value;
+    if (data.dataType() == HFnData::kDoubleArray)
+        return static_cast<const DoubleArrayData&>(data).values;
+    return {};
+}
+
+Misfit decodeData(const Attribute& attribute, const Value& value, Decoded& decoded) {
+    Misfit misfit;
+    decoded.data = readData(attribute, value, misfit.why);
+    if (misfit || !decoded.data)
+        return misfit;
+    for (const double number : numbersIn(*decoded.data))
+        if (!std::isfinite(number))
+            return {printedNumber(number) + " is not a finite number", true};
+    return {};
+}
+
+Misfit decode(const Attribute& attribute, const Value& value, Decoded& decoded) {
     if (attribute.isNumber())
         return decodeNumber(attribute, value, decoded);
-    if (attribute.holdsData() && value.IsNull())
-        return {};
-    std::string why;
     if (attribute.holdsData())
-        decoded.data = readData(attribute, value, why);
-    else if (!value.IsNull())
-        why = "is not null, as the element of a message is";
-    return why;
+        return value.IsNull() ? Misfit() : decodeData(attribute, value, decoded);
+    return {value.IsNull() ? "" : "is not null, as the element of a message is"};
 }
 
 // Why a file has no values for the field; empty when it may have.
@@ -95,8 +116,19 @@ private:
         warnings_.add(why + "; its value is kept as it is");
     }
 
-    void keepMisfit(const std::string& path, const Value& value, const std::string& why) {
-        keep(path, value, "the value of '" + nameOf(path) + "' " + why);
+    void keepMisfit(const std::string& path, const Value& value, const Misfit& misfit) {
+        if (!misfit.isRefused) {
+            keep(path, value, "the value of '" + nameOf(path) + "' " + misfit.why);
+            return;
+        }
+        kept_.emplace_back(path, jsonOf(value));
+        warnings_.addError("'" + nameOf(path) + "' cannot be set: " + misfit.why + "; its value is kept as it is");
+    }
+
+    void tellLimit(const std::string& path, const Decoded& decoded) {
+        if (decoded.isBeyondLimits)
+            warnings_.add("the value of '" + nameOf(path) + "' is beyond its limit, " + printedNumber(decoded.number) +
+                          ", which is taken");
     }
 
     // A part of an object that is not understood: kept as an object of its own under the same path.
@@ -115,10 +147,11 @@ private:
     void readLeaf(const std::string& path, const HPlug& plug, const Value& value) {
         const Attribute& attribute = *plugImpl(plug)->field->attribute;
         Decoded decoded;
-        if (const std::string why = decode(attribute, value, decoded); !why.empty()) {
-            keepMisfit(path, value, why);
+        if (const Misfit misfit = decode(attribute, value, decoded)) {
+            keepMisfit(path, value, misfit);
             return;
         }
+        tellLimit(path, decoded);
         assign(*resolvePlugIn(*node_->data(), plug, true), std::move(decoded));
         keepUnknownKeys(path, attribute, value);
     }
@@ -139,7 +172,7 @@ private:
 
     void readChildren(const std::string& path, const HPlug& plug, const Value& value) {
         if (!value.IsObject()) {
-            keepMisfit(path, value, "is no object");
+            keepMisfit(path, value, {"is no object"});
             return;
         }
         resolvePlugIn(*node_->data(), plug, true);
@@ -149,7 +182,7 @@ private:
 
     void readRuns(const std::string& path, const HPlug& plug, const Value& value) {
         if (!value.IsObject()) {
-            keepMisfit(path, value, "is no object of runs");
+            keepMisfit(path, value, {"is no object of runs"});
             return;
         }
         const std::shared_ptr<Slot> array = resolvePlugIn(*node_->data(), plug, true);
@@ -169,15 +202,18 @@ private:
     void readRun(const std::string& path, Slot& array, unsigned index, const Value& run) {
         const Attribute& attribute = *array.field.attribute;
         for (const Value& item : run.GetArray()) {
-            Decoded decoded{attribute.defaultNumber, nullptr};
+            Decoded decoded;
+            decoded.number = attribute.defaultNumber;
             const bool hasNoValue = item.IsNull() && !attribute.holdsData();
-            const std::string why = hasNoValue ? "" : decode(attribute, item, decoded);
-            if (why.empty()) {
+            const Misfit misfit = hasNoValue ? Misfit() : decode(attribute, item, decoded);
+            if (!misfit) {
+                if (decoded.isBeyondLimits)
+                    tellLimit(elementPath(path, index), decoded);
                 assign(*array.elementAt(index), std::move(decoded));
                 if (item.IsObject())
                     keepUnknownKeys(elementPath(path, index), attribute, item);
             } else {
-                keepMisfit(elementPath(path, index), item, why);
+                keepMisfit(elementPath(path, index), item, misfit);
             }
             ++index; // wraps after the last index, when the run is at its end too
         }

@@ -35,9 +35,9 @@ FileOutcome fileOperation(const std::string& fileName, Work&& work) {
     } catch (const std::exception& error) {
         outcome.error = fileName + ": " + error.what();
     }
-    for (const std::string& text : warnings.take()) {
+    for (const auto& [text, severity] : warnings.take()) {
         outcome.warnings.push_back(fileName + ": " + text);
-        showMessage(Severity::warning, outcome.warnings.back());
+        showMessage(severity, outcome.warnings.back());
     }
     return outcome;
 }

@@ -20,7 +20,7 @@ namespace OpenQuarn {
 void writeValues(JsonWriter& writer, const Node& node, const std::vector<KeptMember>& kept, Warnings& warnings);
 
 /// Sets the values of a node that has just been created and is not connected yet; nobody is told. What names no plug,
-/// or does not fit, goes to `kept` with a warning.
+/// or does not fit, goes to `kept` with a warning; a number that setAttr would refuse, with an error.
 void readValues(const rapidjson::Value& values, const std::shared_ptr<Node>& node, std::vector<KeptMember>& kept,
                 Warnings& warnings);
 

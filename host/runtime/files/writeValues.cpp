@@ -69,7 +69,7 @@ private:
     }
 
     void writeChildren(const Slot& compound) {
-        for (const std::shared_ptr<Slot>& child : compound.children)
+        for (const std::shared_ptr<Slot>& child : compound.children())
             writePart(*child);
     }
 
@@ -78,7 +78,7 @@ private:
             writeRuns(array);
             return;
         }
-        array.elements.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
+        array.elements().forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
             if (element->source())
                 return; // comes back with its connection
             const std::size_t length = path_.size();
@@ -95,12 +95,12 @@ private:
     }
 
     void writeRuns(const Slot& array) {
-        if (array.elements.empty())
+        if (array.elements().empty())
             return;
         beginMember(path_);
         writer_.StartObject();
         std::uint64_t next = UINT64_MAX; // the index that goes on with the run
-        array.elements.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
+        array.elements().forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
             if (index != next) {
                 if (next != UINT64_MAX)
                     writer_.EndArray();

@@ -32,7 +32,7 @@ bool isAtOrBelow(const Slot& slot, const Attribute& attribute) {
 }
 
 bool holdsGeometry(const Slot& inputElement) {
-    const std::shared_ptr<Slot>& geometry = inputElement.children.front();
+    const std::shared_ptr<Slot>& geometry = inputElement.children().front();
     return geometry->data || geometry->source() || inputElement.source();
 }
 
@@ -76,9 +76,9 @@ const float* GeometryState::weights(const Slot* list, const std::shared_ptr<cons
     if (weightsMap_ != affected) {
         weights_.clear();
         const ArrayReadLock lock(list ? list->owner : nullptr);
-        if (list && !list->elements.empty()) {
+        if (list && !list->elements().empty()) {
             std::vector<float> all(affected->fullCount, 1.0F);
-            list->elements.forEach([&](unsigned vertex, const std::shared_ptr<Slot>& weight) {
+            list->elements().forEach([&](unsigned vertex, const std::shared_ptr<Slot>& weight) {
                 if (vertex < all.size())
                     all[vertex] = static_cast<float>(weight->number);
             });
@@ -144,13 +144,13 @@ void GeometryFilterState::weightsChanged(const Slot& slot) {
 void GeometryFilterState::makeOutputs(const Slot& slot) {
     const std::shared_ptr<Slot> outputs = data_.slot(*data_.node.type().find(*filterAttributes().outputGeom));
     const auto makeOutput = [&](unsigned index, const Slot& inputElement) {
-        if (holdsGeometry(inputElement) && !outputs->elements.find(index))
+        if (holdsGeometry(inputElement) && !outputs->elements().find(index))
             outputs->elementAt(index)->markClean(); // it becomes dirty with what follows, and so what depends on it
     };
     if (const Slot* element = outermostElement(slot))
         makeOutput(element->index, *element);
     else
-        slot.elements.forEach([&](unsigned index, const std::shared_ptr<Slot>& part) { makeOutput(index, *part); });
+        slot.elements().forEach([&](unsigned index, const std::shared_ptr<Slot>& part) { makeOutput(index, *part); });
 }
 
 std::shared_ptr<GeometryState> GeometryFilterState::geometry(unsigned index) {
@@ -183,7 +183,7 @@ std::shared_ptr<Slot> elementOf(const NodeData& data, const Attribute& array, un
     if (!slot)
         return nullptr;
     const ArrayReadLock lock(slot->owner);
-    return slot->elements.find(index);
+    return slot->elements().find(index);
 }
 
 } // namespace OpenQuarn

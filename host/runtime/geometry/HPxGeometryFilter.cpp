@@ -25,8 +25,8 @@ HStatus evaluateAll(const OpenQuarn::NodeData& data) {
     std::vector<std::shared_ptr<Slot>> elements;
     {
         const OpenQuarn::ArrayReadLock lock(outputs->owner);
-        elements.reserve(outputs->elements.size());
-        outputs->elements.forEach([&](unsigned, const std::shared_ptr<Slot>& slot) { elements.push_back(slot); });
+        elements.reserve(outputs->elements().size());
+        outputs->elements().forEach([&](unsigned, const std::shared_ptr<Slot>& slot) { elements.push_back(slot); });
     }
     HStatus first;
     for (const std::shared_ptr<Slot>& element : elements) {
@@ -95,7 +95,7 @@ const float* HPxDeformerNode::envelopeWeights(HDataBlock& block, unsigned multiI
         if (!affected)
             return none;
         const auto element = elementOf(*data, *OpenQuarn::filterAttributes().weightList, multiIndex);
-        const std::shared_ptr<Slot> list = element ? element->children.front() : nullptr;
+        const std::shared_ptr<Slot> list = element ? element->children().front() : nullptr;
         if (list)
             pull(list);
         return OpenQuarn::filterStateOf(*data).geometry(multiIndex)->weights(list.get(), affected);

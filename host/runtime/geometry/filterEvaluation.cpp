@@ -18,7 +18,7 @@ std::shared_ptr<MeshData> evaluatedMesh(const std::shared_ptr<Slot>& slot) {
 }
 
 std::shared_ptr<Slot> childOf(const Slot& element, const Attribute& attribute) {
-    for (const std::shared_ptr<Slot>& part : element.children)
+    for (const std::shared_ptr<Slot>& part : element.children())
         if (part->field.attribute.get() == &attribute)
             return part;
     return nullptr;

@@ -21,7 +21,7 @@ std::shared_ptr<Slot> slotOfField(const NodeData& data, const Field& field, unsi
     if (!slot || !slot->isArray())
         return slot;
     const ArrayReadLock lock(slot->owner);
-    return slot->elements.find(index);
+    return slot->elements().find(index);
 }
 
 /// The plug-in says so.

@@ -70,7 +70,7 @@ private:
 
     static const float* weightsOf(const Link& link) {
         const std::shared_ptr<Slot> element = elementOf(*link.data, *filterAttributes().weightList, link.index);
-        const std::shared_ptr<Slot> list = element ? element->children.front() : nullptr;
+        const std::shared_ptr<Slot> list = element ? element->children().front() : nullptr;
         if (list)
             pull(list);
         return link.state->weights(list.get(), link.affected);
@@ -83,8 +83,8 @@ private:
             return plugs;
         const std::shared_ptr<Slot> all = link.input->parent->shared_from_this();
         const ArrayReadLock lock(all->owner);
-        all->elements.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
-            for (const std::shared_ptr<Slot>& part : element->children)
+        all->elements().forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
+            for (const std::shared_ptr<Slot>& part : element->children())
                 if (index != link.index && part->field.attribute == link.geometry->field.attribute)
                     plugs.push_back(makePlug(*part));
         });

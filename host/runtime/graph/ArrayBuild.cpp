@@ -8,7 +8,7 @@ namespace {
 
 std::shared_ptr<Slot> existing(const Slot& array, unsigned index) {
     const ArrayReadLock lock(array.owner);
-    return array.elements.find(index);
+    return array.elements().find(index);
 }
 
 } // namespace
@@ -36,14 +36,14 @@ bool ArrayBuild::remove(unsigned index) {
 
 std::size_t ArrayBuild::size() const {
     const ArrayReadLock lock(array->owner);
-    return array->elements.size() + added.size() - removed.size();
+    return array->elements().size() + added.size() - removed.size();
 }
 
 void commit(ArrayBuild& build) {
     build.removed.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
         {
             const ArrayWriteLock lock(build.array->owner);
-            build.array->elements.remove(index);
+            build.array->ownElements().remove(index);
         }
         element->detach();
     });

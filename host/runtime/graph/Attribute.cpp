@@ -60,6 +60,24 @@ double Attribute::stored(double value) const {
     }
 }
 
+std::string Attribute::refusal(double value) const {
+    if (!std::isfinite(value))
+        return printedNumber(value) + " is not a finite number";
+    if (std::isfinite(stored(value)) && (number == HFnNumericData::kFloat || stored(value) == value))
+        return {};
+    const std::string text = printedNumber(value);
+    switch (number) {
+    case HFnNumericData::kBoolean:
+        return text + " is not a boolean (0 or 1)";
+    case HFnNumericData::kShort:
+        return text + " is not an integer from -32768 to 32767";
+    case HFnNumericData::kInt:
+        return text + " is not an integer from -2147483648 to 2147483647";
+    default:
+        return text + " is too large for single precision";
+    }
+}
+
 double Attribute::limited(double value) const {
     if (min && value < *min)
         return *min;

@@ -32,6 +32,9 @@ public:
     bool takesValueOf(const Attribute& source) const;
     /// The value as this attribute stores it: rounded and brought into the range of its type.
     double stored(double value) const;
+    /// Why a number cannot be set by a command, and cannot stand in a scene file: "2.5 is not an integer from …"; empty
+    /// when it can. The hard limits are no reason: see limited().
+    std::string refusal(double value) const;
     /// Brought between the hard limits.
     double limited(double value) const;
     /// True when the data may be held: null, or of the attribute's kind.

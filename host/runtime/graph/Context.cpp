@@ -17,10 +17,10 @@ void dropPluginData(Slot& slot) {
 void markConnectedOrComputed(Slot& slot, const Slot& normal) {
     if (slot.field.computed || normal.source())
         slot.markDirty();
-    for (std::size_t i = 0; i < slot.children.size(); ++i)
-        markConnectedOrComputed(*slot.children[i], *normal.children[i]);
-    slot.elements.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
-        const std::shared_ptr<Slot> counterpart = normal.elements.find(index);
+    for (std::size_t i = 0; i < slot.children().size(); ++i)
+        markConnectedOrComputed(*slot.children()[i], *normal.children()[i]);
+    slot.elements().forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
+        const std::shared_ptr<Slot> counterpart = normal.elements().find(index);
         if (counterpart)
             markConnectedOrComputed(*element, *counterpart);
     });
@@ -88,7 +88,7 @@ std::shared_ptr<Slot> slotIn(const NodeData& data, const Slot& slot, bool create
         return nullptr;
     if (!slot.isElement)
         return parent->child(slot.field);
-    return create ? parent->elementAt(slot.index) : parent->elements.find(slot.index);
+    return create ? parent->elementAt(slot.index) : parent->elements().find(slot.index);
 }
 
 std::shared_ptr<Slot> sourceInContext(const Slot& slot) {

@@ -86,11 +86,12 @@ std::shared_ptr<Node> Graph::createNode(const std::shared_ptr<const NodeClass>& 
     insert(node);
     try {
         node->createUserNode();
+        node->runPostConstructor();
     } catch (...) {
-        deleteNode(*node);
+        if (node->isAlive())
+            deleteNode(*node);
         throw;
     }
-    node->runPostConstructor();
     if (!node->isAlive())
         throw std::runtime_error("node '" + node->name() + "' was deleted while it was created");
     return node;
@@ -290,9 +291,9 @@ void Graph::disconnectAll(Slot& slot) {
     for (const std::shared_ptr<Slot>& destination : destinations)
         if (destination->source() == &slot)
             disconnect(*destination);
-    std::vector<std::shared_ptr<Slot>> parts(slot.children);
-    parts.reserve(parts.size() + slot.elements.size());
-    slot.elements.forEach([&](unsigned, const std::shared_ptr<Slot>& part) { parts.push_back(part); });
+    std::vector<std::shared_ptr<Slot>> parts(slot.children());
+    parts.reserve(parts.size() + slot.elements().size());
+    slot.elements().forEach([&](unsigned, const std::shared_ptr<Slot>& part) { parts.push_back(part); });
     for (const std::shared_ptr<Slot>& part : parts)
         disconnectAll(*part);
 }
@@ -408,14 +409,14 @@ void Graph::setLocked(Slot& slot, bool locked) {
 }
 
 void Graph::removeElement(Slot& array, unsigned index) {
-    const std::shared_ptr<Slot> element = array.elements.find(index);
+    const std::shared_ptr<Slot> element = array.elements().find(index);
     if (!element)
         throw std::invalid_argument("'" + array.name() + "' has no element " + std::to_string(index));
     const std::shared_ptr<Slot> kept = array.shared_from_this();
     disconnectAll(*element);
-    if (array.elements.find(index) != element)
+    if (array.elements().find(index) != element)
         return; // it went with its connection
-    array.elements.remove(index);
+    array.ownElements().remove(index);
     propagateFrom(array);
     notify(*element, HNodeMessage::kAttributeArrayRemoved);
     element->detach();

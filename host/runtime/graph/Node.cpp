@@ -84,10 +84,12 @@ void Node::createUserNode() {
 }
 
 void Node::runPostConstructor() {
-    callPlugin(*this, "postConstructor", [&]() -> HStatus {
+    const HStatus status = callPlugin(*this, "postConstructor", [&]() -> HStatus {
         user_->postConstructor();
         return HStatus::kSuccess;
     });
+    if (status.error())
+        throw std::runtime_error("node '" + name() + "' was not created: " + status.errorString().asStdString());
 }
 
 void Node::bury() {

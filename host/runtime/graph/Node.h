@@ -83,7 +83,8 @@ public:
     const std::shared_ptr<HPxNode>& userNodePointer() const { return user_; }
     const std::shared_ptr<NodeData>& data() const { return data_; }
 
-    /// Runs the creator and postConstructor(); throws std::runtime_error when the creator gives none.
+    /// Run the creator and postConstructor(); throw std::runtime_error when the creator gives no node, or when either
+    /// throws.
     void createUserNode();
     void runPostConstructor();
     /// Takes the plug-in's object and all values away: handles see the node as gone.

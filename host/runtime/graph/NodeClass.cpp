@@ -8,6 +8,16 @@
 #include <stdexcept>
 
 namespace OpenQuarn {
+namespace {
+
+bool isAbove(const Field& above, const Field& below) {
+    for (const Field* at = below.parent; at; at = at->parent)
+        if (at == &above)
+            return true;
+    return false;
+}
+
+} // namespace
 
 void NodeClass::add(const std::shared_ptr<Attribute>& attribute) {
     if (!attribute->parent.expired())
@@ -52,6 +62,9 @@ Field& NodeClass::fieldOf(const Attribute& attribute) const {
 void NodeClass::affects(const Attribute& affecting, const Attribute& affected, bool affectsTree, bool sameElement) {
     Field& from = fieldOf(affecting);
     Field& to = fieldOf(affected);
+    if (&from == &to || isAbove(from, to) || isAbove(to, from))
+        throw std::invalid_argument("attribute '" + affecting.name + "' of node type '" + name + "' cannot affect " +
+                                    (&from == &to ? "itself" : "'" + affected.name + "', with which it overlaps"));
     declarations_.push_back({&from, &to, affectsTree, sameElement, false});
     for (Pair& pair : pairs_)
         if (pair.affecting == &from && pair.affected == &to) {
@@ -74,6 +87,20 @@ void NodeClass::inherit(const NodeClass& base) {
 
 bool NodeClass::isInherited(const Field& field) const {
     return field.parent ? isInherited(*field.parent) : field.position < inheritedFields_;
+}
+
+std::vector<std::string> NodeClass::doubtfulDeclarations() const {
+    std::vector<std::string> doubts;
+    for (const Pair& pair : pairs_) {
+        const bool hasOwn = std::any_of(pairs_.begin(), pairs_.end(), [&](const Pair& other) {
+            return other.affected == pair.affected && isAbove(*pair.affecting, *other.affecting);
+        });
+        if (pair.affecting->isCompound() && !pair.tree && !hasOwn)
+            doubts.push_back("node type '" + name + "': a change of a child of '" + pair.affecting->attribute->name +
+                             "' does not count for '" + pair.affected->attribute->name +
+                             "': neither the children affect it nor the whole tree");
+    }
+    return doubts;
 }
 
 void NodeClass::finish() {
@@ -104,15 +131,9 @@ void NodeClass::addAffecting(Field& affected, const Field::Dependency& affecting
 // What depends on a field: what it affects itself, what a field above it affects with its whole tree, and, since a
 // change of a whole compound is a change of everything in it, what the fields below it affect.
 void NodeClass::addDependents(Field& field) {
-    const auto isAbove = [](const Field* above, const Field* below) {
-        for (below = below->parent; below; below = below->parent)
-            if (below == above)
-                return true;
-        return false;
-    };
     for (const Pair& pair : pairs_) {
-        const bool counts = pair.affecting == &field || (pair.tree && isAbove(pair.affecting, &field)) ||
-                            isAbove(&field, pair.affecting);
+        const bool counts = pair.affecting == &field || (pair.tree && isAbove(*pair.affecting, field)) ||
+                            isAbove(field, *pair.affecting);
         const bool listed =
             std::any_of(field.dependents.begin(), field.dependents.end(),
                         [&](const Field::Dependency& dependent) { return dependent.field == pair.affected; });

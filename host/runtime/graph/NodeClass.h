@@ -37,12 +37,14 @@ public:
 
     /// Adds an attribute that has no parent, with its children. Throws std::invalid_argument when a name is taken.
     void add(const std::shared_ptr<Attribute>& attribute);
-    /// Throws std::invalid_argument when one of them does not belong to the type.
+    /// Throws std::invalid_argument when one of them does not belong to the type, or is a part of the other.
     void affects(const Attribute& affecting, const Attribute& affected, bool affectsTree, bool sameElement = false);
     /// Adds what another type has, as the base of this one.
     void inherit(const NodeClass& base);
     /// Works out what depends on what; nothing is added afterwards.
     void finish();
+    /// A sentence for each compound that was declared to affect something, while nothing below it does.
+    std::vector<std::string> doubtfulDeclarations() const;
 
     const std::vector<std::unique_ptr<Field>>& fields() const { return fields_; }
     /// By long or short name, at any depth; null when there is none.

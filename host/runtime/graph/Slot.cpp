@@ -9,32 +9,48 @@
 
 namespace OpenQuarn {
 
+// a scene may hold millions: with its counts it just fits a block of 112 bytes of the allocator
+static_assert(sizeof(void*) != 8 || sizeof(Slot) <= 88);
+
 Slot::Slot(const Field& slotField, NodeData* slotOwner, Slot* slotParent, bool element, unsigned logicalIndex)
     : field(slotField)
     , owner(slotOwner)
     , parent(slotParent)
-    , isElement(element)
-    , index(logicalIndex) {
+    , index(logicalIndex)
+    , isElement(element) {
     number = field.attribute->defaultNumber;
     data = field.attribute->defaultData;
+    if (!isLeaf())
+        parts_ = std::make_unique<Parts>();
     if (isCompound())
         makeChildren();
 }
 
 Slot::~Slot() {
-    forEachPart([](Slot& part) { part.detach(); });
+    if (!parts_)
+        return;
+    const std::shared_ptr<const NodeClass> type = keptType();
+    forEachPart([&](Slot& part) {
+        part.unlink();
+        part.cutOff(type);
+    });
+}
+
+const Slot::Parts& Slot::noParts() {
+    static const Parts none;
+    return none;
 }
 
 void Slot::makeChildren() {
-    children.reserve(field.children.size());
+    parts_->children.reserve(field.children.size());
     for (const std::unique_ptr<Field>& childField : field.children)
-        children.push_back(std::make_shared<Slot>(*childField, owner, this, false, 0U));
+        parts_->children.push_back(std::make_shared<Slot>(*childField, owner, this, false, 0U));
 }
 
 std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
     {
         const ArrayReadLock lock(owner);
-        if (std::shared_ptr<Slot> existing = elements.find(logicalIndex))
+        if (std::shared_ptr<Slot> existing = elements().find(logicalIndex))
             return existing;
     }
     auto element = std::make_shared<Slot>(field, owner, this, true, logicalIndex);
@@ -44,13 +60,14 @@ std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
 
 void Slot::adopt(const std::shared_ptr<Slot>& element) {
     element->parent = this;
+    element->links.reset(); // it kept its type
     element->attach(owner);
     const bool isDue = field.computed || isDirty();
     if (isDue)
         element->markDirty();
     {
         const ArrayWriteLock lock(owner);
-        elements.insert(element->index, element);
+        ownElements().insert(element->index, element);
     }
     if (isDue) { // what depends on it, or will, has not been told
         element->forgetTold();
@@ -64,34 +81,35 @@ void Slot::attach(NodeData* newOwner) {
 }
 
 std::shared_ptr<Slot> Slot::child(const Field& childField) const {
-    return isCompound() && childField.parent == &field ? children[childField.position] : nullptr;
+    return isCompound() && childField.parent == &field ? children()[childField.position] : nullptr;
 }
 
 void Slot::reset() {
     number = field.attribute->defaultNumber;
     data = field.attribute->defaultData;
-    for (const std::shared_ptr<Slot>& part : children)
+    for (const std::shared_ptr<Slot>& part : children())
         part->reset();
-    elements.forEach([](unsigned, const std::shared_ptr<Slot>& element) { element->detach(); });
-    elements.clear();
+    elements().forEach([](unsigned, const std::shared_ptr<Slot>& element) { element->detach(); });
+    if (isArray())
+        ownElements().clear();
 }
 
 void Slot::copyFrom(const Slot& from) {
     number = field.attribute->isNumber() ? field.attribute->stored(from.number) : from.number;
     data = from.data;
-    for (std::size_t i = 0; i < children.size() && i < from.children.size(); ++i)
-        children[i]->copyFrom(*from.children[i]);
+    for (std::size_t i = 0; i < children().size() && i < from.children().size(); ++i)
+        children()[i]->copyFrom(*from.children()[i]);
     if (!isArray())
         return;
     std::vector<unsigned> surplus;
-    elements.forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>&) {
-        if (!from.elements.find(elementIndex))
+    elements().forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>&) {
+        if (!from.elements().find(elementIndex))
             surplus.push_back(elementIndex);
     });
     for (const unsigned elementIndex : surplus)
-        if (const std::shared_ptr<Slot> element = elements.remove(elementIndex))
+        if (const std::shared_ptr<Slot> element = ownElements().remove(elementIndex))
             element->detach();
-    from.elements.forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>& element) {
+    from.elements().forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>& element) {
         elementAt(elementIndex)->copyFrom(*element);
     });
 }
@@ -115,28 +133,43 @@ void Slot::unlink() {
     forEachPart([](Slot& part) { part.unlink(); });
 }
 
+Slot::Rare& Slot::rare() {
+    if (!links)
+        links = std::make_unique<Links>();
+    if (!links->rare)
+        links->rare = std::make_unique<Rare>();
+    return *links->rare;
+}
+
 void Slot::keepTypeOf(const Slot& like) {
-    type_ = like.owner ? like.owner->node.typePointer() : like.type_;
-    forEachPart([this](Slot& part) { part.keepTypeOf(*this); });
+    rare().type = like.keptType();
+}
+
+std::shared_ptr<const NodeClass> Slot::keptType() const {
+    for (const Slot* at = this; at; at = at->parent) {
+        if (at->owner)
+            return at->owner->node.typePointer();
+        if (at->links && at->links->rare && at->links->rare->type)
+            return at->links->rare->type;
+    }
+    return nullptr;
 }
 
 void Slot::detach() {
+    const std::shared_ptr<const NodeClass> type = keptType();
     unlink();
-    cutOff();
+    cutOff(type);
 }
 
-void Slot::cutOff() {
-    if (owner)
-        type_ = owner->node.typePointer();
+// a slot that nobody else holds has its type from the one above, for as long as there is one
+void Slot::cutOff(const std::shared_ptr<const NodeClass>& type) {
     owner = nullptr;
     parent = nullptr;
-    for (const std::shared_ptr<Slot>& part : children) {
-        part->cutOff();
-        part->parent = this;
-    }
-    elements.forEach([this](unsigned, const std::shared_ptr<Slot>& element) {
-        element->cutOff();
-        element->parent = this;
+    if (type && weak_from_this().use_count() > 1)
+        rare().type = type;
+    forEachPart([&](Slot& part) {
+        part.cutOff(type);
+        part.parent = this;
     });
 }
 

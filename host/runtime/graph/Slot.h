@@ -24,12 +24,17 @@ class NodeData;
 /// that computes it (evaluation.h). Everything else belongs to the main thread, outside of evaluations.
 class Slot : public std::enable_shared_from_this<Slot> {
 public:
+    /// What few slots have.
+    struct Rare {
+        /// Slots of which a plug-in said that this one depends on them (HPxNode::setDependentsDirty).
+        std::vector<std::weak_ptr<Slot>> announcers;
+        std::shared_ptr<const NodeClass> type; ///< of a slot without an owner
+    };
     /// Connections that begin or end here.
     struct Links {
         Slot* source = nullptr;
         std::vector<Slot*> destinations; ///< in order of connection
-        /// Slots of which a plug-in said that this one depends on them (HPxNode::setDependentsDirty).
-        std::vector<std::weak_ptr<Slot>> announcers;
+        std::unique_ptr<Rare> rare;      ///< null for none
     };
 
     Slot(const Field& slotField, NodeData* slotOwner, Slot* slotParent, bool element, unsigned logicalIndex);
@@ -40,23 +45,30 @@ public:
     const Field& field;
     NodeData* owner;
     Slot* parent;
-    const bool isElement;
-    const unsigned index; ///< of an element
 
     // the value
     double number = 0.0;
     std::shared_ptr<Data> data;
+
+    std::unique_ptr<Links> links; ///< null while nothing was ever connected, nor anything rare
+
+    const unsigned index; ///< of an element
+    const bool isElement;
+    bool locked = false;
 
     /// True for the slot that holds the elements of an array attribute.
     bool isArray() const { return field.isArray() && !isElement; }
     bool isCompound() const { return field.isCompound() && !isArray(); }
     bool isLeaf() const { return !isArray() && !isCompound(); }
 
-    std::vector<std::shared_ptr<Slot>> children; ///< of a compound, in the order of its attributes
-    SparseArray<Slot> elements;                  ///< of an array
-
-    std::unique_ptr<Links> links; ///< null while nothing was ever connected, nor announced
-    bool locked = false;
+    /// Of a compound, in the order of its attributes; none for other slots.
+    const std::vector<std::shared_ptr<Slot>>& children() const {
+        return parts_ ? parts_->children : noParts().children;
+    }
+    /// Of an array; none for other slots.
+    const SparseArray<Slot>& elements() const { return parts_ ? parts_->elements : noParts().elements; }
+    /// Of an array only: to change them.
+    SparseArray<Slot>& ownElements() { return parts_->elements; }
 
     Slot* source() const { return links ? links->source : nullptr; }
     bool hasDestinations() const { return links && !links->destinations.empty(); }
@@ -71,9 +83,11 @@ public:
     /// Calls visit(slot) for the direct parts: children or elements.
     template <class Visit>
     void forEachPart(Visit&& visit) const {
-        for (const std::shared_ptr<Slot>& part : children)
+        if (!parts_)
+            return;
+        for (const std::shared_ptr<Slot>& part : parts_->children)
             visit(*part);
-        elements.forEach([&](unsigned, const std::shared_ptr<Slot>& part) { visit(*part); });
+        parts_->elements.forEach([&](unsigned, const std::shared_ptr<Slot>& part) { visit(*part); });
     }
 
     /// Gives it, and everything below, default values; removes elements.
@@ -89,8 +103,10 @@ public:
     void unlink();
     /// Cuts it and everything below off from its node, and from what it is connected to.
     void detach();
-    /// Keeps the type of `like` for as long as this slot lives: a handle may outlive node and plug-in.
+    /// Keeps the type of `like` until it is adopted, or for as long as it lives: a handle may outlive node and plug-in.
     void keepTypeOf(const Slot& like);
+    /// Made where there is none.
+    Rare& rare();
 
     /// "list[3].child"
     std::string path() const;
@@ -134,11 +150,18 @@ private:
     void markCleanBelow();
     void forgetToldBelow();
     void attach(NodeData* newOwner);
-    void cutOff();
+    void cutOff(const std::shared_ptr<const NodeClass>& type);
+    std::shared_ptr<const NodeClass> keptType() const;
     void makeChildren();
 
+    struct Parts {
+        std::vector<std::shared_ptr<Slot>> children;
+        SparseArray<Slot> elements;
+    };
+    static const Parts& noParts();
+
     std::atomic<std::uint8_t> state_{0};
-    std::shared_ptr<const NodeClass> type_; // of a slot without an owner
+    std::unique_ptr<Parts> parts_; // null for a leaf: most slots are one number of many
 };
 
 /// The element of the outermost array that a slot is, or is below; null when it is in none.

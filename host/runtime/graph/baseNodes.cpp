@@ -3,6 +3,7 @@
 
 #include "core/apiCall.h"
 #include "core/text.h"
+#include "openquarn_app/Messages.h"
 
 #include <array>
 #include <stdexcept>
@@ -117,6 +118,8 @@ std::shared_ptr<NodeClass> buildNodeClass(const std::string& name, HTypeId id, H
                                      "' failed: " + status.errorString().asStdString());
     }
     built->finish();
+    for (const std::string& doubt : built->doubtfulDeclarations())
+        showMessage(Severity::warning, doubt);
     return built;
 }
 

@@ -88,7 +88,7 @@ std::shared_ptr<Slot> dependentSlot(const Slot& slot, const Field::Dependency& d
     if (!affected || !dependent.sameElement || !affected->isArray())
         return affected;
     const Slot* element = outermostElement(slot);
-    return element ? affected->elements.find(element->index) : affected;
+    return element ? affected->elements().find(element->index) : affected;
 }
 
 void propagateFrom(Slot& changed, bool force) {

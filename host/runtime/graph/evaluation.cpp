@@ -104,7 +104,7 @@ std::shared_ptr<Slot> connectedAbove(const Slot& slot) {
 
 void pullParts(Slot& slot) {
     std::vector<std::shared_ptr<Slot>> parts; // evaluating one may add or remove others
-    parts.reserve(slot.children.size() + slot.elements.size());
+    parts.reserve(slot.children().size() + slot.elements().size());
     slot.forEachPart([&](Slot& part) {
         if (part.mayBeDirty())
             parts.push_back(part.shared_from_this());

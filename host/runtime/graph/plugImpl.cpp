@@ -28,7 +28,7 @@ std::shared_ptr<Slot> descend(const NodeData& data, const HPlug::Impl& plug, con
     if (create)
         return slot->elementAt(*index);
     const ArrayReadLock lock(slot->owner);
-    return slot->elements.find(*index);
+    return slot->elements().find(*index);
 }
 
 std::shared_ptr<Slot> nearestIn(const NodeData& data, const HPlug::Impl& plug, const Field& field, bool& exists) {
@@ -38,7 +38,7 @@ std::shared_ptr<Slot> nearestIn(const NodeData& data, const HPlug::Impl& plug, c
     if (field.parent)
         slot = slot->child(field);
     const std::optional<unsigned> index = field.isArray() ? plug.indices[arrayDepth(field) - 1] : std::nullopt;
-    const std::shared_ptr<Slot> element = index ? slot->elements.find(*index) : nullptr;
+    const std::shared_ptr<Slot> element = index ? slot->elements().find(*index) : nullptr;
     exists = !field.isArray() || element || (&field == plug.field && !index);
     return element ? element : slot;
 }
@@ -119,7 +119,7 @@ TentativeSlot::TentativeSlot(const HPlug& plug)
 TentativeSlot::~TentativeSlot() {
     if (!made_ || !made_->parent)
         return;
-    const std::shared_ptr<Slot> element = made_->parent->elements.remove(made_->index);
+    const std::shared_ptr<Slot> element = made_->parent->ownElements().remove(made_->index);
     if (element)
         element->detach();
 }

@@ -35,7 +35,9 @@ private:
             return;
         if (Slot* source = slot.links->source)
             forget(*source);
-        for (const std::weak_ptr<Slot>& announcer : slot.links->announcers)
+        if (!slot.links->rare)
+            return;
+        for (const std::weak_ptr<Slot>& announcer : slot.links->rare->announcers)
             if (const std::shared_ptr<Slot> known = announcer.lock())
                 forget(*known);
     }
@@ -67,7 +69,7 @@ private:
     static std::shared_ptr<Slot> sameElement(const Slot& array, const Slot& slot) {
         const Slot* element = outermostElement(slot);
         const ArrayReadLock lock(array.owner);
-        return element ? array.elements.find(element->index) : nullptr;
+        return element ? array.elements().find(element->index) : nullptr;
     }
 
     void forget(Slot& slot) {
@@ -90,9 +92,7 @@ void forgetToldUpstream(Slot& slot) {
 }
 
 void announce(Slot& announcer, Slot& dependent) {
-    if (!dependent.links)
-        dependent.links = std::make_unique<Slot::Links>();
-    std::vector<std::weak_ptr<Slot>>& known = dependent.links->announcers;
+    std::vector<std::weak_ptr<Slot>>& known = dependent.rare().announcers;
     known.erase(std::remove_if(known.begin(), known.end(),
                                [&](const std::weak_ptr<Slot>& other) {
                                    const std::shared_ptr<Slot> slot = other.lock();

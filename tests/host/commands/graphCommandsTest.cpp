@@ -66,7 +66,7 @@ TEST_F(GraphCommands, OnNodes) {
         {"deleteNode leg testSum1 leg", ""},
         {"ls -type testSum", "arm"},
         {"listAttr armList", "message\nlists\nlists.items\nlists.weight\nnote\nshallow\nshallow."
-                             "leaf\nflat\nshallowOut"},
+                             "leaf\nshallow.own\nflat\nshallowOut"},
     });
     expectErrors({
         {"createNode nope", "createNode: there is no node type 'nope'"},

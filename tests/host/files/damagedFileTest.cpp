@@ -4,8 +4,11 @@
 #include "host/files/sceneParts.h"
 
 #include "openquarn/HFnDependencyNode.h"
+#include "openquarn_app/Commands.h"
 #include "openquarn_app/Plugins.h"
 
+#include <cmath>
+#include <cstdlib>
 #include <limits>
 
 namespace {
@@ -93,9 +96,13 @@ TEST_F(DamagedFile, WhatIsNotUnderstoodIsReportedAndKept) {
         std::vector<const char*> kept;
     } rows[] = {
         {{R"("real":"abc","whole":1.5,"small":70000,"single":1e300,"yes":2,"choice":null)"},
-         {"the value of 'one.real' is no double", "'one.whole' does not fit the range of a int", "'one.small'",
-          "'one.single'", "'one.yes'", "'one.choice' is no enum"},
+         {"the value of 'one.real' is no double", "'one.whole' cannot be set: 1.5 is not an integer", "'one.small'",
+          "'one.single' cannot be set: 1e+300 is too large", "'one.yes'", "'one.choice' is no enum"},
          {R"("real":"abc","whole":1.5,"small":70000,"single":1e+300,"yes":2,"choice":null)"}},
+        {{R"("real":"nan","matrix":[1,0,0,0,0,1,0,0,0,0,1,0,0,0,"inf",1],"list":[1,"-inf"],"weights":{"1":[2,"nan"]})"},
+         {"'one.real' cannot be set: nan is not a finite number; its value is kept", "'one.matrix' cannot be set: inf",
+          "'one.list' cannot be set: -inf is not", "'one.weights[2]' cannot be set: nan is not"},
+         {R"("real":"nan","matrix":[1,0,0,0,0,1,0,0,0,0,1,0,0,0,"inf",1],"list":[1,"-inf"])", R"("weights[2]":"nan")"}},
         {{R"("word":5,"matrix":[1],"list":[1,"x"],"data":{"typeId":5,"text":"x"},"datas":{"0":[{"typeId":2119630866,"text":"bad"}]})"},
          {"'one.word' is no text", "'one.matrix' is no list of 16 numbers", "'one.list' is no list of numbers",
           "is of data type 0x00000005, not 0x7e570012", "could not be read by its data type: the text is bad"},
@@ -143,6 +150,45 @@ TEST_F(DamagedFile, WhatIsNotUnderstoodIsReportedAndKept) {
             EXPECT_THAT(again, HasSubstr(part));
         EXPECT_THAT(read(again), ::testing::Not(IsEmpty()));
         EXPECT_EQ(saved(), again);
+    }
+}
+
+// What a command refuses, the reader refuses; what a command brings to a limit, the reader brings there.
+TEST_F(DamagedFile, ValuesAreTakenByTheRuleOfSetAttr) {
+    for (const auto& [attribute, number] : std::vector<std::pair<const char*, const char*>>{{"real", "1e308"},
+                                                                                            {"real", "nan"},
+                                                                                            {"real", "inf"},
+                                                                                            {"single", "3.4028236e38"},
+                                                                                            {"single", "1e39"},
+                                                                                            {"single", "nan"},
+                                                                                            {"small", "-32768"},
+                                                                                            {"small", "32768"},
+                                                                                            {"whole", "2147483647"},
+                                                                                            {"whole", "2147483648"},
+                                                                                            {"whole", "0.5"},
+                                                                                            {"yes", "1"},
+                                                                                            {"yes", "2"},
+                                                                                            {"choice", "32767"},
+                                                                                            {"choice", "-32769"},
+                                                                                            {"narrow", "10"},
+                                                                                            {"narrow", "10.5"},
+                                                                                            {"narrow", "-1e300"},
+                                                                                            {"narrow", "nan"}}) {
+        SCOPED_TRACE(std::string(attribute) + " " + number);
+        const std::string name = std::string("one.") + attribute;
+        session.newScene();
+        create("one");
+        const bool isSet = OpenQuarn::runCommand("setAttr " + name + " " + number).ok;
+        const double value = plug(name).asDouble();
+        takeMessages();
+        const bool isNumber = std::isfinite(std::strtod(number, nullptr));
+        const std::string text = isNumber ? number : "\"" + std::string(number) + "\"";
+        const std::vector<std::string> found = read(sceneText({"\"" + std::string(attribute) + "\":" + text}));
+        EXPECT_EQ(plug(name).asDouble(), value);
+        EXPECT_EQ(!found.empty() && found[0].find("'" + name + "' cannot be set: ") != std::string::npos, !isSet);
+        if (isSet && std::strtod(number, nullptr) != value && std::string(attribute) != "single") {
+            EXPECT_THAT(found, ElementsAre(HasSubstr("'" + name + "' is beyond its limit, ")));
+        }
     }
 }
 

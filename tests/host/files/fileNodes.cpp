@@ -82,6 +82,13 @@ HObject unstored(const HObject& attribute) {
     return attribute;
 }
 
+HObject limited(const HObject& attribute, double min, double max) {
+    HFnNumericAttribute set(attribute);
+    set.setMin(min);
+    set.setMax(max);
+    return attribute;
+}
+
 class FileNode : public HPxNode {
 public:
     static HPxNode* creator() { return new FileNode; }
@@ -98,7 +105,8 @@ public:
                                   number("small", HFnNumericData::kShort),
                                   number("whole", HFnNumericData::kInt, 3),
                                   choice.object(),
-                                  real("unusual", std::numeric_limits<double>::quiet_NaN()),
+                                  real("unusual", std::numeric_limits<double>::infinity()),
+                                  limited(real("narrow"), -10.0, 10.0),
                                   typed("word", HFnData::kString, HFnStringData().create("")),
                                   path,
                                   matrix("matrix"),

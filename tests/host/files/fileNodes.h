@@ -11,7 +11,8 @@
 namespace fileNodes {
 
 /// Registers "fileNode", of the plug-in "fileNodes", with the session that is open:
-///   yes bool, small short, whole int (3), single float (0.1), real double (0.5), choice enum, unusual double (NaN)
+///   yes bool, small short, whole int (3), single float (0.1), real double (0.5), choice enum, unusual double (infinite)
+///   narrow double, limits -10 and 10
 ///   word string (""), path string (null, used as file name), matrix matrix, list doubleArray, data fileData, mesh mesh
 ///   weights double array, singles float array, words string array, matrices, messages, datas arrays
 ///   groups compound array (title string; items double array; spot compound (x, y double))

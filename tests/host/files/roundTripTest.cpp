@@ -110,7 +110,8 @@ unsigned below(Random& random, unsigned limit) {
     return static_cast<unsigned>(random() % limit);
 }
 
-double anyDouble(Random& random) {
+// Numbers of meshes may be anything; where a plug is set, they are finite.
+double anyCoordinate(Random& random) {
     constexpr double special[] = {0.0,
                                   -0.0,
                                   1.0,
@@ -136,9 +137,14 @@ double anyDouble(Random& random) {
     }
 }
 
+double anyDouble(Random& random) {
+    const double value = anyCoordinate(random);
+    return std::isfinite(value) ? value : 0.25;
+}
+
 float anyFloat(Random& random) {
     const auto value = std::bit_cast<float>(static_cast<std::uint32_t>(random()));
-    return below(random, 2) == 0 ? value : static_cast<float>(below(random, 1000)) / 10.0F;
+    return below(random, 2) == 0 && std::isfinite(value) ? value : static_cast<float>(below(random, 1000)) / 10.0F;
 }
 
 HString anyText(Random& random) {
@@ -159,7 +165,7 @@ HMatrix anyMatrix(Random& random) {
 HObject anyMesh(Random& random) {
     HPointArray points;
     for (unsigned i = 0; i < 6; ++i)
-        points.append(HPoint(anyDouble(random), anyDouble(random), anyDouble(random)));
+        points.append(HPoint(anyCoordinate(random), anyCoordinate(random), anyCoordinate(random)));
     HFnMeshData mesh;
     if (below(random, 3) == 0)
         mesh.create(points, {}, {});

@@ -72,7 +72,7 @@ TEST_F(Dirty, TheTreeFlagDecidesWhetherWhatIsBelowCounts) {
     for (const TreeCase& row :
          {TreeCase{"n.lists[2].items[1]", true, false}, TreeCase{"n.lists[2].items[5]", true, false},
           TreeCase{"n.lists[4].weight", true, false}, TreeCase{"n.note", false, false},
-          TreeCase{"n.shallow.leaf", false, false}}) {
+          TreeCase{"n.shallow.leaf", false, false}, TreeCase{"n.shallow.own", false, true}}) {
         SCOPED_TRACE(row.set);
         plug("n.flat[0]").asDouble();
         plug("n.shallowOut").asDouble();

@@ -8,6 +8,10 @@
 #include "openquarn/HGlobal.h"
 #include "openquarn_app/Plugins.h"
 
+#include <cmath>
+#include <functional>
+#include <stdexcept>
+
 namespace {
 
 using NodeClassTest = SceneTest;
@@ -98,6 +102,86 @@ TEST_F(NodeClassTest, CompoundsCannotHoldThemselves) {
     ASSERT_FALSE(outer.addChild(inner.object()).error());
     EXPECT_EQ(testNodes::text(inner.addChild(outer.object())), "attribute 'outer' has its place already");
     EXPECT_EQ(inner.numChildren(), 0U);
+}
+
+TEST_F(NodeClassTest, DefinitionsThatMakeNoSenseAreRefusedByName) {
+    const double nan = std::nan("");
+    const struct {
+        const char* error;
+        std::function<HStatus(HFnNumericAttribute&, HFnEnumAttribute&)> define;
+    } rows[] = {
+        {"attribute 'x': its default is not a number (NaN)", [&](auto& x, auto&) { return x.setDefault(nan); }},
+        {"attribute 'x': its limit is not a number (NaN)", [&](auto& x, auto&) { return x.setSoftMax(nan); }},
+        {"attribute 'x': its min 2.5 is above its max 2", [](auto& x, auto&) { return x.setMin(2.5); }},
+        {"attribute 'x': its min 1 is above its max 0", [](auto& x, auto&) { return x.setMax(0.0); }},
+        {"attribute 'x': its softMin 7 is above its softMax 5", [](auto& x, auto&) { return x.setSoftMin(7.0); }},
+        {"attribute 'mode' labels 1 as 'Fast' already", [](auto&, auto& mode) { return mode.addField("Slow", 1); }},
+        {"attribute 'mode' has the label 'Fast' for 1 already",
+         [](auto&, auto& mode) { return mode.addField("Fast", 2); }},
+    };
+    HFnNumericAttribute x;
+    x.create("x", "x", HFnNumericData::kDouble, 1.5);
+    x.setMin(1.0);
+    x.setMax(2.0);
+    x.setSoftMax(5.0);
+    HFnEnumAttribute mode;
+    mode.create("mode", "m");
+    mode.addField("Fast", 1);
+    for (const auto& row : rows)
+        EXPECT_EQ(testNodes::text(row.define(x, mode)), row.error);
+    EXPECT_EQ(std::vector({x.defaultValue(), x.getMin(), x.getMax(), x.getSoftMax()}),
+              std::vector({1.5, 1.0, 2.0, 5.0}));
+    EXPECT_FALSE(x.hasSoftMin());
+    EXPECT_EQ(mode.fieldName(2), "");
+    HStatus status;
+    EXPECT_TRUE(HFnNumericAttribute().create("bad", "b", HFnNumericData::kFloat, nan, &status).isNull());
+    EXPECT_THAT(testNodes::text(status), ::testing::HasSubstr("attribute 'bad': its default"));
+}
+
+// a compound with a child, and what is declared: (affecting, affected), "tree" or a refusal
+HStatus declareDoubtfully() {
+    HFnCompoundAttribute pair;
+    const HObject a = made("a", "a");
+    pair.create("pair", "p");
+    pair.addChild(a);
+    const HObject out = made("out", "o"), other = made("other", "ot"), third = made("third", "t");
+    for (const HObject& attribute : {pair.object(), out, other, third})
+        EXPECT_EQ(testNodes::text(HPxNode::addAttribute(attribute)), "");
+    EXPECT_THAT(testNodes::text(HPxNode::attributeAffects(out, out)),
+                ::testing::HasSubstr("attribute 'out' of node type 'doubtful' cannot affect itself"));
+    EXPECT_THAT(testNodes::text(HPxNode::attributeAffects(a, pair.object())),
+                ::testing::HasSubstr("attribute 'a' of node type 'doubtful' cannot affect 'pair', with which it"));
+    EXPECT_TRUE(HPxNode::attributeAffects(pair.object(), a).error());
+    HPxNode::attributeAffects(pair.object(), out);
+    HPxNode::attributeAffects(pair.object(), other);
+    HPxNode::attributeAffects(a, other);
+    return HPxNode::attributeAffects(pair.object(), third, true);
+}
+
+class Thrower : public HPxNode {
+public:
+    static HPxNode* creator() { return new Thrower; }
+    void postConstructor() override { throw std::runtime_error("no luck"); }
+};
+
+TEST_F(NodeClassTest, DoubtfulTypesAreWarnedOfAndNodesThatThrowAreNotLeftBehind) {
+    OpenQuarn::addPlugin(
+        "doubtful",
+        [](HObject plugin) {
+            return HFnPlugin(plugin).registerNode("doubtful", 0x7113, Thrower::creator, declareDoubtfully);
+        },
+        [](HObject plugin) { return HFnPlugin(plugin).deregisterNode(0x7113); });
+    EXPECT_THAT(takeMessages(),
+                ::testing::ElementsAre("warning: node type 'doubtful': a change of a child of 'pair' does "
+                                       "not count for 'out': neither the children affect it nor the "
+                                       "whole tree"));
+    const std::size_t before = session.nodeCount();
+    HStatus status;
+    EXPECT_TRUE(HFnDependencyNode().create("doubtful", "gone", &status).isNull());
+    EXPECT_THAT(testNodes::text(status), ::testing::HasSubstr("node 'gone' was not created: postConstructor: no luck"));
+    EXPECT_EQ(takeMessages(), std::vector<std::string>{"error: gone: postConstructor: no luck"});
+    EXPECT_EQ(session.nodeCount(), before);
+    EXPECT_TRUE(testNodes::plug("gone.out").isNull());
 }
 
 } // namespace

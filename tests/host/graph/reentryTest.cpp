@@ -116,6 +116,9 @@ TEST_F(Reentry, HandlesOutliveNodesContextsAndPlugins) {
         builder = block.outputArrayValue(plug("lists.flat").attribute()).builder();
         added = builder.addElement(3);
     }
+    plug("lists.lists[2].weight").setDouble(5.0);
+    HDataHandle list = plug("lists.lists[2]").asHDataHandle();
+    const HObject weight = plug("lists.lists[2].weight").attribute();
     {
         OpenQuarn::EvaluationContext context(10.0);
         const HPlug out = plug("first.out");
@@ -126,7 +129,11 @@ TEST_F(Reentry, HandlesOutliveNodesContextsAndPlugins) {
         EXPECT_EQ(elsewhere.asDouble(), 4.0);
     }
     session.newScene();
+    HDataHandle part = list.child(weight);
+    list = HDataHandle(); // what it held of the type passes to the part
     OpenQuarn::unloadPlugin(OpenQuarn::loadedPlugins().back());
+    EXPECT_EQ(part.asDouble(), 5.0);
+    EXPECT_EQ(testNodes::text(part.set("text")), "'weight' is a double and cannot hold that kind of data");
     EXPECT_EQ(value.asDouble(), 4.0);
     EXPECT_EQ(testNodes::text(value.set("text")), "'in' is a double and cannot hold that kind of data");
     EXPECT_EQ(testNodes::text(added.set("text")), "'flat[3]' is a double and cannot hold that kind of data");

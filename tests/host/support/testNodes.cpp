@@ -116,11 +116,14 @@ public:
         onDisconnect(lists, HFnAttribute::kDelete);
         const HObject shallow = compound.create("shallow", "shallow");
         compound.addChild(makeDouble("leaf"));
+        const HObject own = makeDouble("own");
+        compound.addChild(own);
         const HObject shallowOut = makeOutput(makeDouble("shallowOut"));
         flat = makeOutput(makeArray(makeDouble("flat"), true));
         add({lists, makeDouble("note"), shallow, flat, shallowOut});
         affects(lists, flat, true);
         affects(shallow, shallowOut);
+        affects(own, shallowOut);
         return HStatus::kSuccess;
     }
 

@@ -23,7 +23,8 @@ void registerTypes();
 /// "testLists": flat = all lists[i].items[j] in order, through an array data builder.
 ///   lists  compound array (items: double array; weight: double)     flat  double array output
 ///   note   double, affects nothing;   lists affects flat with its tree
-///   shallow  compound (leaf: double), affects shallowOut without its tree;  shallowOut  double output
+///   shallow  compound (leaf, own: double); itself and own affect shallowOut, without its tree;  shallowOut  double
+///   output
 ///
 /// "testCase": runs Hooks::compute for its output.
 ///   in  double     ins  double array      out  double output     outs  double array output (in, ins affect both)

@@ -16,8 +16,8 @@ namespace OpenQuarn {
 // Paths that are not absolute count as Workspace.h says.
 
 /// What became of an operation on files. Warnings say what could not be done although the rest was; the error, why
-/// nothing was. All of them begin with the file's name. Warnings have gone to the message sink as well; the error is
-/// the caller's to show.
+/// nothing was. All of them begin with the file's name. Warnings have gone to the message sink as well, one about a
+/// number that setAttr would refuse as an error; the error is the caller's to show.
 struct FileOutcome {
     bool ok = false;
     std::string error; ///< empty when ok
@@ -28,7 +28,9 @@ struct FileOutcome {
 /// Replaces the scene by the one in the file, which becomes the current file. A file that cannot be read or is no scene
 /// file is an error, with line and column where it is malformed, and the present scene stays as it is. Everything else
 /// that cannot be understood - node types that are not registered, unknown keys, values that do not fit, connections
-/// with an unknown end - is a warning, is kept, and is written again by saveScene(). Linear in the size of the file.
+/// with an unknown end - is a warning, is kept, and is written again by saveScene(). So is a number that setAttr would
+/// refuse: not finite, not whole, out of range; one beyond a hard limit becomes the limit, with a warning. Linear in the
+/// size of the file.
 /// Thread: main.
 OPENQUARN_API FileOutcome openScene(const std::filesystem::path& path);
 

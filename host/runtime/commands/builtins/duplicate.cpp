@@ -28,9 +28,9 @@ std::shared_ptr<Data> copyOf(const Node& node, const std::shared_ptr<Data>& data
 void copyValue(const Node& node, const Slot& from, Slot& to) {
     to.number = from.number;
     to.data = copyOf(node, from.data);
-    for (std::size_t i = 0; i < from.children.size(); ++i)
-        copyValue(node, *from.children[i], *to.children[i]);
-    from.elements.forEach(
+    for (std::size_t i = 0; i < from.children().size(); ++i)
+        copyValue(node, *from.children()[i], *to.children()[i]);
+    from.elements().forEach(
         [&](unsigned index, const std::shared_ptr<Slot>& element) { copyValue(node, *element, *to.elementAt(index)); });
 }
 

@@ -66,8 +66,8 @@ CommandValue leafValue(const Slot& slot) {
 template <class Item, class Read>
 std::vector<Item> elementsOf(const Slot& array, Read&& read) {
     std::vector<Item> items;
-    items.reserve(array.elements.size());
-    array.elements.forEach([&](unsigned, const std::shared_ptr<Slot>& element) { items.push_back(read(*element)); });
+    items.reserve(array.elements().size());
+    array.elements().forEach([&](unsigned, const std::shared_ptr<Slot>& element) { items.push_back(read(*element)); });
     return items;
 }
 
@@ -95,7 +95,7 @@ CommandValue indicesOf(const Slot& slot) {
     if (!slot.isArray())
         throw std::invalid_argument("'" + slot.name() + "' is not an array");
     std::vector<double> indices; // up to 2^32 - 1
-    slot.elements.forEach([&](unsigned index, const std::shared_ptr<Slot>&) { indices.push_back(index); });
+    slot.elements().forEach([&](unsigned index, const std::shared_ptr<Slot>&) { indices.push_back(index); });
     return indices;
 }
 

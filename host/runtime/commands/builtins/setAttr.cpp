@@ -53,8 +53,7 @@ double enumValue(const HPlug& plug, const Attribute& attribute, const std::strin
     refuse(plug, "cannot be set: " + inQuotes(word) + " is neither a number nor one of its labels (" + labels + ")");
 }
 
-// a word as the number that the attribute holds
-double numberOf(const HPlug& plug, const Attribute& attribute, const std::string& word) {
+double numberIn(const HPlug& plug, const Attribute& attribute, const std::string& word) {
     if (attribute.kind() == HFn::kEnumAttribute)
         return enumValue(plug, attribute, word);
     switch (attribute.number) {
@@ -66,6 +65,14 @@ double numberOf(const HPlug& plug, const Attribute& attribute, const std::string
     default:
         return valueOf<double>(plug, word);
     }
+}
+
+// a word as the number that the attribute holds
+double numberOf(const HPlug& plug, const Attribute& attribute, const std::string& word) {
+    const double number = numberIn(plug, attribute, word);
+    if (const std::string why = attribute.refusal(number); !why.empty())
+        refuse(plug, "cannot be set: " + why);
+    return number;
 }
 
 const std::string& single(const HPlug& plug, const std::vector<std::string>& words) {
