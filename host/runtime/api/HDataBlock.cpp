@@ -67,6 +67,11 @@ SlotPointer evaluated(SlotPointer slot) {
     return slot;
 }
 
+void setSlotClean(Slot& slot) {
+    const OpenQuarn::ParallelGraphLock lock; // another geometry of the node may be adding elements
+    slot.markClean();
+}
+
 bool isOneValue(const SlotPointer& slot, HStatus& status) {
     if (!slot || !slot->isArray())
         return slot != nullptr;
@@ -135,7 +140,7 @@ HStatus HDataBlock::setClean(const HPlug& plug) {
     return apiCall(FaultPoint::HDataBlock_setClean, [&]() -> HStatus {
         HStatus status;
         if (const SlotPointer slot = slotOf(impl_, plug, false, status))
-            slot->markClean();
+            setSlotClean(*slot);
         return status;
     });
 }
@@ -144,7 +149,7 @@ HStatus HDataBlock::setClean(const HObject& attribute) {
     return apiCall(FaultPoint::HDataBlock_setClean, [&]() -> HStatus {
         HStatus status;
         if (const SlotPointer slot = slotOf(impl_, attribute, status))
-            slot->markClean();
+            setSlotClean(*slot);
         return status;
     });
 }
@@ -350,7 +355,7 @@ HStatus HDataHandle::copy(const HDataHandle& source) {
 void HDataHandle::setClean() {
     OpenQuarn::requireEval("HDataHandle::setClean");
     if (impl_)
-        impl_->markClean();
+        setSlotClean(*impl_);
 }
 
 // --- HArrayDataHandle ---
@@ -501,7 +506,7 @@ HStatus HArrayDataHandle::setAllClean() {
     return apiCall(FaultPoint::HArrayDataHandle_setAllClean, [&]() -> HStatus {
         if (!impl_)
             return {HStatus::kInvalidParameter, "the array handle is not valid"};
-        impl_->markClean();
+        setSlotClean(*impl_);
         return HStatus::kSuccess;
     });
 }
@@ -510,7 +515,7 @@ HStatus HArrayDataHandle::setClean() {
     return apiCall(FaultPoint::HArrayDataHandle_setClean, [&]() -> HStatus {
         if (!current_)
             return beyondLast(impl_);
-        current_->markClean();
+        setSlotClean(*current_);
         return HStatus::kSuccess;
     });
 }

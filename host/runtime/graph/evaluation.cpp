@@ -69,11 +69,13 @@ HStatus compute(const std::shared_ptr<Slot>& slot) {
         showMessage(Severity::error, text);
         return {HStatus::kFailure, text};
     }
+    if (!slot->owner) // removed while this thread waited for the graph: there is nothing left to compute
+        return HStatus::kSuccess;
     const ComputeClaim claim(*slot);
+    if (!slot->owner) // or while it waited for who computes the node
+        return HStatus::kSuccess;
     if (!slot->mayBeDirty()) // another thread was faster
         return statusOf(*slot);
-    if (!slot->owner)
-        return {HStatus::kFailure, "the element has been removed"};
     const std::shared_ptr<Node> node = std::static_pointer_cast<Node>(slot->owner->node.shared_from_this());
     HStatus status = runCompute(*node, *slot->owner, *slot);
     if (status == HStatus::kUnknownParameter)
@@ -90,7 +92,8 @@ void takeFromSource(Slot& slot, const std::shared_ptr<Slot>& source) {
     pullLocked(source);
     if (!slot.mayBeDirty()) // another thread was faster, and readers may be at it already
         return;
-    slot.copyFrom(*source);
+    if (source->owner) // an element that has been removed gives no value: the last one stays
+        slot.copyFrom(*source);
     slot.markClean();
 }
 
