@@ -144,7 +144,7 @@ void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HSt
     countEvaluation(false, isFallback);
     GeometryState& state = *filterStateOf(data).geometry(index);
     if (!state.gpu)
-        state.gpu = std::make_unique<GpuGeometry>(*info);
+        state.gpu = std::make_unique<GpuGeometry>(*info, data.node);
     GpuGeometry& gpu = *state.gpu;
     gpu.isPrimed = false;
     if (status.error())
