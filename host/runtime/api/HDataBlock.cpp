@@ -16,8 +16,10 @@ using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
 using OpenQuarn::FaultPoint;
+using OpenQuarn::isRefused;
 using OpenQuarn::NodeData;
 using OpenQuarn::Slot;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -155,7 +157,8 @@ HStatus HDataBlock::setClean(const HObject& attribute) {
 }
 
 bool HDataBlock::isClean(const HPlug& plug) const {
-    OpenQuarn::requireEval("HDataBlock::isClean");
+    if (isRefused(ThreadTag::eval, "HDataBlock::isClean"))
+        return false;
     HStatus status;
     const SlotPointer slot = slotOf(impl_, plug, false, status);
     return slot && !slot->mayBeDirty();
@@ -176,8 +179,7 @@ bool HDataHandle::isValid() const {
 }
 
 HFnData::Type HDataHandle::type() const {
-    OpenQuarn::requireEval("HDataHandle::type");
-    if (!impl_)
+    if (!impl_ || isRefused(ThreadTag::eval, "HDataHandle::type"))
         return HFnData::kInvalid;
     if (impl_->data)
         return impl_->data->dataType();
@@ -194,9 +196,8 @@ HObject HDataHandle::attribute() const {
 
 namespace {
 
-const Slot* toRead(const SlotPointer& slot, [[maybe_unused]] const char* function) {
-    OpenQuarn::requireEval(function);
-    return slot.get();
+const Slot* toRead(const SlotPointer& slot, const char* function) {
+    return isRefused(ThreadTag::eval, function) ? nullptr : slot.get();
 }
 
 } // namespace
@@ -246,8 +247,8 @@ HPxData* HDataHandle::asPluginData() const {
 }
 
 HDataHandle HDataHandle::child(const HObject& attribute) const {
-    OpenQuarn::requireEval("HDataHandle::child");
-    const auto wanted = impl_ ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
+    const bool isReadable = impl_ && !isRefused(ThreadTag::eval, "HDataHandle::child");
+    const auto wanted = isReadable ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
     if (wanted)
         for (const SlotPointer& part : impl_->children)
             if (part->field.attribute == wanted)
@@ -353,8 +354,7 @@ HStatus HDataHandle::copy(const HDataHandle& source) {
 }
 
 void HDataHandle::setClean() {
-    OpenQuarn::requireEval("HDataHandle::setClean");
-    if (impl_)
+    if (impl_ && !isRefused(ThreadTag::eval, "HDataHandle::setClean"))
         setSlotClean(*impl_);
 }
 
@@ -395,8 +395,7 @@ bool HArrayDataHandle::isValid() const {
 }
 
 unsigned HArrayDataHandle::elementCount() const {
-    OpenQuarn::requireEval("HArrayDataHandle::elementCount");
-    if (!impl_)
+    if (!impl_ || isRefused(ThreadTag::eval, "HArrayDataHandle::elementCount"))
         return 0;
     const OpenQuarn::ArrayReadLock lock(impl_->owner);
     return static_cast<unsigned>(impl_->elements.size());
@@ -546,6 +545,7 @@ HStatus HArrayDataBuilder::removeElement(unsigned logicalIndex) {
 }
 
 unsigned HArrayDataBuilder::elementCount() const {
-    OpenQuarn::requireEval("HArrayDataBuilder::elementCount");
-    return impl_ ? static_cast<unsigned>(impl_->size()) : 0U;
+    return impl_ && !isRefused(ThreadTag::eval, "HArrayDataBuilder::elementCount")
+               ? static_cast<unsigned>(impl_->size())
+               : 0U;
 }

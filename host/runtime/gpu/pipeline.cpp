@@ -167,7 +167,8 @@ void takeFromDevice(const std::string& nodeType) {
 }
 
 void Gpu::setEnabled(bool enabled) {
-    requireMain("Gpu::setEnabled");
+    if (isRefused(ThreadTag::main, "Gpu::setEnabled"))
+        return;
     if (!enabled)
         takeFromDevice("");
     isOn = enabled;

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "graph/evaluation.h"
 
+#include "core/threads.h"
 #include "graph/Context.h"
 #include "graph/EvaluationLock.h"
 #include "graph/Graph.h"
@@ -199,13 +200,10 @@ ComputeClaim::~ComputeClaim() {
     EvaluationLock::instance().disclaim(part_);
 }
 
-bool isEvaluating() {
-    return depth > 0;
-}
-
 HStatus pull(const std::shared_ptr<Slot>& slot) {
     if (!slot->mayBeDirty())
         return statusOf(*slot);
+    const WorkScope evaluating(ThreadWork::evaluation);
     const std::scoped_lock lock(EvaluationLock::instance());
     return pullLocked(slot);
 }
