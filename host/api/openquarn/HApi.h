@@ -12,7 +12,7 @@
 // Numbers. Positions are doubles in object space unless a call says otherwise; angles are radians; matrices are 4 x 4,
 // row-major, for row vectors (p' = p * M, translation in row 3).
 //
-// Threads. The documentation of each call ends in one of three tags, which debug builds assert:
+// Threads. A call answers kFailure, and a debug build ends, on a thread that the tag of its documentation excludes:
 //   [main]  the thread that the application runs the host on, outside of an evaluation;
 //   [eval]  that thread, or a thread on which the host is evaluating a node at the moment;
 //   [any]   every thread; two threads may call it at the same time on different objects.

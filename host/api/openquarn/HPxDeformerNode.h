@@ -7,6 +7,10 @@
 
 /// The attributes below belong to the node class "deformer" and to every type registered as HPxNode::kDeformerNode, in
 /// addition to those of the geometry filter.
+///
+/// Only the thread on which the host calls deform() evaluates. A worker of a parallel loop inside of it is a foreign
+/// thread: every [eval] call on it is refused, and waits for nothing. A deformer reads what its loop needs before the
+/// loop, and writes positions and outputs after it; the loop works on the plug-in's own memory.
 class OPENQUARN_API HPxDeformerNode : public HPxGeometryFilter {
 public:
     /// Array by geometry, a compound of `weights`.

@@ -31,10 +31,10 @@ public:
     /// Called once after the node has its name and its values, before anybody else sees it. When it throws, the node is
     /// not created: it is taken away, and whoever asked for it gets the failure. [main]
     virtual void postConstructor();
-    /// Brings `plug`, an output of this node, up to date: read inputs, write outputs, set them clean. Answer
-    /// kUnknownParameter for a plug that this type does not produce; the host then takes its value as it is. Called
-    /// only for a dirty plug, on one thread at a time for one node (geometry filters: one thread for one geometry).
-    /// [eval]
+    /// Brings `plug`, an output, up to date: read inputs, write outputs, set them clean. Answer kUnknownParameter for a
+    /// plug that this type does not produce; the host then takes its value as it is. Called only for a dirty plug. Of
+    /// plain nodes one is computed at a time, in a parallel evaluation too; geometry filters run side by side inside of
+    /// deform(), one thread for one geometry. [eval]
     virtual HStatus compute(const HPlug& plug, HDataBlock& block);
     /// Adds to `affected` what becomes dirty with `dirty` beyond the declared dependencies. May not change the graph.
     /// [main]

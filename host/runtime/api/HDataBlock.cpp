@@ -16,8 +16,10 @@ using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
 using OpenQuarn::FaultPoint;
+using OpenQuarn::isRefused;
 using OpenQuarn::NodeData;
 using OpenQuarn::Slot;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -65,6 +67,11 @@ SlotPointer evaluated(SlotPointer slot) {
     if (slot)
         pull(slot);
     return slot;
+}
+
+void setSlotClean(Slot& slot) {
+    const OpenQuarn::ParallelGraphLock lock; // another geometry of the node may be adding elements
+    slot.markClean();
 }
 
 bool isOneValue(const SlotPointer& slot, HStatus& status) {
@@ -135,7 +142,7 @@ HStatus HDataBlock::setClean(const HPlug& plug) {
     return apiCall(FaultPoint::HDataBlock_setClean, [&]() -> HStatus {
         HStatus status;
         if (const SlotPointer slot = slotOf(impl_, plug, false, status))
-            slot->markClean();
+            setSlotClean(*slot);
         return status;
     });
 }
@@ -144,13 +151,14 @@ HStatus HDataBlock::setClean(const HObject& attribute) {
     return apiCall(FaultPoint::HDataBlock_setClean, [&]() -> HStatus {
         HStatus status;
         if (const SlotPointer slot = slotOf(impl_, attribute, status))
-            slot->markClean();
+            setSlotClean(*slot);
         return status;
     });
 }
 
 bool HDataBlock::isClean(const HPlug& plug) const {
-    OpenQuarn::requireEval("HDataBlock::isClean");
+    if (isRefused(ThreadTag::eval, "HDataBlock::isClean"))
+        return false;
     HStatus status;
     const SlotPointer slot = slotOf(impl_, plug, false, status);
     return slot && !slot->mayBeDirty();
@@ -171,8 +179,7 @@ bool HDataHandle::isValid() const {
 }
 
 HFnData::Type HDataHandle::type() const {
-    OpenQuarn::requireEval("HDataHandle::type");
-    if (!impl_)
+    if (!impl_ || isRefused(ThreadTag::eval, "HDataHandle::type"))
         return HFnData::kInvalid;
     if (impl_->data)
         return impl_->data->dataType();
@@ -189,9 +196,8 @@ HObject HDataHandle::attribute() const {
 
 namespace {
 
-const Slot* toRead(const SlotPointer& slot, [[maybe_unused]] const char* function) {
-    OpenQuarn::requireEval(function);
-    return slot.get();
+const Slot* toRead(const SlotPointer& slot, const char* function) {
+    return isRefused(ThreadTag::eval, function) ? nullptr : slot.get();
 }
 
 } // namespace
@@ -241,8 +247,8 @@ HPxData* HDataHandle::asPluginData() const {
 }
 
 HDataHandle HDataHandle::child(const HObject& attribute) const {
-    OpenQuarn::requireEval("HDataHandle::child");
-    const auto wanted = impl_ ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
+    const bool isReadable = impl_ && !isRefused(ThreadTag::eval, "HDataHandle::child");
+    const auto wanted = isReadable ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
     if (wanted)
         for (const SlotPointer& part : impl_->children())
             if (part->field.attribute == wanted)
@@ -348,9 +354,8 @@ HStatus HDataHandle::copy(const HDataHandle& source) {
 }
 
 void HDataHandle::setClean() {
-    OpenQuarn::requireEval("HDataHandle::setClean");
-    if (impl_)
-        impl_->markClean();
+    if (impl_ && !isRefused(ThreadTag::eval, "HDataHandle::setClean"))
+        setSlotClean(*impl_);
 }
 
 // --- HArrayDataHandle ---
@@ -390,8 +395,7 @@ bool HArrayDataHandle::isValid() const {
 }
 
 unsigned HArrayDataHandle::elementCount() const {
-    OpenQuarn::requireEval("HArrayDataHandle::elementCount");
-    if (!impl_)
+    if (!impl_ || isRefused(ThreadTag::eval, "HArrayDataHandle::elementCount"))
         return 0;
     const OpenQuarn::ArrayReadLock lock(impl_->owner);
     return static_cast<unsigned>(impl_->elements().size());
@@ -501,7 +505,7 @@ HStatus HArrayDataHandle::setAllClean() {
     return apiCall(FaultPoint::HArrayDataHandle_setAllClean, [&]() -> HStatus {
         if (!impl_)
             return {HStatus::kInvalidParameter, "the array handle is not valid"};
-        impl_->markClean();
+        setSlotClean(*impl_);
         return HStatus::kSuccess;
     });
 }
@@ -510,7 +514,7 @@ HStatus HArrayDataHandle::setClean() {
     return apiCall(FaultPoint::HArrayDataHandle_setClean, [&]() -> HStatus {
         if (!current_)
             return beyondLast(impl_);
-        current_->markClean();
+        setSlotClean(*current_);
         return HStatus::kSuccess;
     });
 }
@@ -541,6 +545,7 @@ HStatus HArrayDataBuilder::removeElement(unsigned logicalIndex) {
 }
 
 unsigned HArrayDataBuilder::elementCount() const {
-    OpenQuarn::requireEval("HArrayDataBuilder::elementCount");
-    return impl_ ? static_cast<unsigned>(impl_->size()) : 0U;
+    return impl_ && !isRefused(ThreadTag::eval, "HArrayDataBuilder::elementCount")
+               ? static_cast<unsigned>(impl_->size())
+               : 0U;
 }

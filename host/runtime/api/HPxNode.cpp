@@ -16,6 +16,8 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::FaultPoint;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 const HObject HPxNode::message = Access::object(OpenQuarn::messageAttribute());
 
@@ -57,8 +59,7 @@ HTypeId HPxNode::typeId() const {
 }
 
 HDataBlock HPxNode::forceCache() {
-    OpenQuarn::requireEval("HPxNode::forceCache");
-    const auto node = impl_.lock();
+    const auto node = isRefused(ThreadTag::eval, "HPxNode::forceCache") ? nullptr : impl_.lock();
     return node ? Access::make<HDataBlock>(dataInCurrentContext(*node)) : HDataBlock();
 }
 

@@ -4,7 +4,6 @@
 #include "commands/ParsedArgs.h"
 #include "core/Object.h"
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/plugName.h"
 #include "openquarn/HSelectionList.h"
 
@@ -18,7 +17,6 @@ HArgDatabase::HArgDatabase(const HSyntax& syntax, const HArgList& args, HStatus*
 
 HStatus HArgDatabase::getCommandArgument(unsigned index, HSelectionList& result) const {
     return OpenQuarn::apiCall(FaultPoint::HArgDatabase_getCommandArgument, [&]() -> HStatus {
-        OpenQuarn::requireMain("HArgDatabase::getCommandArgument");
         const auto& parsed = Access::impl(static_cast<const HArgParser&>(*this));
         if (!parsed || index >= parsed->args.length())
             return {HStatus::kFailure, "there is no argument " + std::to_string(index)};

@@ -11,6 +11,8 @@
 
 using OpenQuarn::CommandValue;
 using OpenQuarn::FaultPoint;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -104,8 +106,7 @@ HCommandResult& HCommandResult::operator=(const HCommandResult& other) {
 }
 
 HCommandResult::Type HCommandResult::resultType() const noexcept {
-    OpenQuarn::requireMain("HCommandResult::resultType");
-    return OpenQuarn::kindOf(impl_->value);
+    return isRefused(ThreadTag::main, "HCommandResult::resultType") ? kInvalid : OpenQuarn::kindOf(impl_->value);
 }
 
 HStatus HCommandResult::getResult(int& result) const {

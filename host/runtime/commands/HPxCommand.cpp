@@ -6,6 +6,9 @@
 #include "openquarn/HString.h"
 #include "openquarn_app/Messages.h"
 
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
+
 HPxCommand::HPxCommand() noexcept = default;
 HPxCommand::~HPxCommand() = default;
 
@@ -26,8 +29,7 @@ bool HPxCommand::hasSyntax() const {
 }
 
 HSyntax HPxCommand::syntax() const {
-    OpenQuarn::requireMain("HPxCommand::syntax");
-    return hasSyntax() ? *impl_->syntax : HSyntax();
+    return !isRefused(ThreadTag::main, "HPxCommand::syntax") && hasSyntax() ? *impl_->syntax : HSyntax();
 }
 
 void HPxCommand::displayError(const HString& text) noexcept {

@@ -73,9 +73,10 @@ HStatus run(const std::vector<ScriptWord>& words, CommandValue& result) {
 } // namespace
 
 HStatus dispatch(const std::vector<ScriptWord>& words, CommandValue& result) noexcept {
-    requireMain("running a command");
     try {
         result = std::monostate();
+        if (HStatus refused = threadStatus(ThreadTag::main, "running a command"); refused.error())
+            return refused;
         return run(words, result);
     } catch (...) {
         return statusOfException("running a command");

@@ -10,7 +10,9 @@
 
 using OpenQuarn::CommandValue;
 using OpenQuarn::FaultPoint;
+using OpenQuarn::isRefused;
 using OpenQuarn::RunningResult;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -89,7 +91,8 @@ bool appendOne(std::vector<Item>* to, Item item) {
 } // namespace
 
 void HPxCommand::clearResult() noexcept {
-    OpenQuarn::requireMain("HPxCommand::clearResult");
+    if (isRefused(ThreadTag::main, "HPxCommand::clearResult"))
+        return;
     if (CommandValue* result = RunningResult::current())
         *result = std::monostate();
 }
@@ -147,7 +150,8 @@ HStatus HPxCommand::appendToResult(const HStringArray& values) {
 }
 
 HCommandResult::Type HPxCommand::currentResultType() noexcept {
-    OpenQuarn::requireMain("HPxCommand::currentResultType");
+    if (isRefused(ThreadTag::main, "HPxCommand::currentResultType"))
+        return HCommandResult::kInvalid;
     const CommandValue* result = RunningResult::current();
     return result ? OpenQuarn::kindOf(*result) : HCommandResult::kInvalid;
 }

@@ -23,7 +23,8 @@ HStatus statusOfException(const char* operation) noexcept;
 /// For an operation that returns a status: `return apiCall(FaultPoint::HPlug_setString, [&] { … });`
 template <class Body>
 HStatus apiCall(FaultPoint point, Body&& body) noexcept {
-    requireThreadOf(point);
+    if (!mayCall(threadTagOf(point)))
+        return misuse(threadTagOf(point), faultPointName(point));
     if (faultFires(point))
         return faultStatus(point);
     try {
@@ -37,10 +38,11 @@ HStatus apiCall(FaultPoint point, Body&& body) noexcept {
 /// that starts as success, and its value is returned as it is; `fallback` is returned when it does not run or throws.
 template <class Value, class Body>
 Value apiValue(FaultPoint point, HStatus* status, Value fallback, Body&& body) noexcept {
-    requireThreadOf(point);
     HStatus outcome;
     Value value = fallback;
-    if (faultFires(point)) {
+    if (!mayCall(threadTagOf(point))) {
+        outcome = misuse(threadTagOf(point), faultPointName(point));
+    } else if (faultFires(point)) {
         outcome = faultStatus(point);
     } else {
         try {

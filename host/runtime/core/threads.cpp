@@ -1,48 +1,78 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "core/threads.h"
 
-#include "graph/evaluation.h"
+#include "openquarn/HString.h"
+#include "openquarn_app/Messages.h"
 
-#include <atomic>
 #include <cstdio>
 #include <cstdlib>
-#include <thread>
+#include <mutex>
+#include <set>
+#include <stdexcept>
+#include <string>
 
 namespace OpenQuarn {
+
+constinit thread_local ThreadWork detail::work = ThreadWork::none;
+std::atomic<const ThreadWork*> detail::mainWork{&detail::work};
+
 namespace {
 
-std::atomic<std::thread::id> mainThread{std::this_thread::get_id()};
+const char* brokenRule(ThreadTag tag) noexcept {
+    if (tag == ThreadTag::eval)
+        return "on a thread that evaluates nothing";
+    return isMainThread() ? "during an evaluation" : "on another thread than the main one";
+}
+
+std::string sentence(ThreadTag tag, const char* function) {
+    return std::string(function) + " was called " + brokenRule(tag);
+}
+
+void endDebugBuild([[maybe_unused]] ThreadTag tag, [[maybe_unused]] const char* function) noexcept {
+#ifndef NDEBUG
+    std::fprintf(stderr, "OpenQuarn: %s was called %s\n", function, brokenRule(tag));
+    std::abort();
+#endif
+}
+
+std::mutex saidMutex;
+std::set<std::string> said; // functions that an error has named
+
+bool isNewToTheUser(const char* function) {
+    const std::scoped_lock lock(saidMutex);
+    return said.insert(function).second;
+}
 
 } // namespace
 
 void setMainThread() {
-    mainThread = std::this_thread::get_id();
-}
-bool isMainThread() {
-    return mainThread == std::this_thread::get_id();
-}
-
-#ifndef NDEBUG
-namespace {
-
-[[noreturn]] void misuse(const char* function, const char* rule) {
-    std::fprintf(stderr, "OpenQuarn: %s was called %s\n", function, rule);
-    std::abort();
+    detail::mainWork = &detail::work;
+    const std::scoped_lock lock(saidMutex);
+    said.clear();
 }
 
-} // namespace
-
-void requireMain(const char* function) {
-    if (!isMainThread())
-        misuse(function, "on another thread than the main one");
-    if (isEvaluating())
-        misuse(function, "during an evaluation");
+HStatus misuse(ThreadTag tag, const char* function) noexcept {
+    endDebugBuild(tag, function);
+    try {
+        return {HStatus::kFailure, sentence(tag, function)};
+    } catch (...) {
+        return HStatus::kFailure;
+    }
 }
 
-void requireEval(const char* function) {
-    if (!isMainThread() && !isEvaluating())
-        misuse(function, "on a thread that evaluates nothing");
+void requireThread(ThreadTag tag, const char* function) {
+    if (const HStatus refused = threadStatus(tag, function); refused.error())
+        throw std::runtime_error(refused.errorString().asStdString());
 }
-#endif
+
+void showMisuse(ThreadTag tag, const char* function) noexcept {
+    endDebugBuild(tag, function);
+    try {
+        if (isNewToTheUser(function))
+            showMessage(Severity::error, sentence(tag, function));
+    } catch (...) {
+        showMessage(Severity::error, "a function of the host was called on a thread that may not call it");
+    }
+}
 
 } // namespace OpenQuarn

@@ -1,22 +1,87 @@
 // SPDX-License-Identifier: Apache-2.0
-// The thread tags of the API, asserted in debug builds.
+// The thread tags of the API: which calls a thread may make at the moment.
 #pragma once
+
+#include "openquarn/HStatus.h"
+
+#include <atomic>
+#include <utility>
 
 namespace OpenQuarn {
 
+enum class ThreadTag : unsigned char {
+    any,
+    main, ///< the main thread, outside of an evaluation
+    eval, ///< the main thread, or a thread inside an evaluation
+};
+
+/// What a thread does for the host.
+enum class ThreadWork : unsigned char {
+    none,
+    evaluation,
+    waiting, ///< for a parallel evaluation: what runs on it meanwhile is a piece of some plug-in's own loop
+};
+
+namespace detail {
+// the library is loaded with the program, or by it: a byte of the room that the loader keeps for this is not missed
+extern constinit thread_local ThreadWork work __attribute__((tls_model("initial-exec")));
+// that of the main thread; each thread's lies at another address
+extern std::atomic<const ThreadWork*> mainWork;
+} // namespace detail
+
 /// Makes the calling thread the main one.
 void setMainThread();
-bool isMainThread();
 
-/// A violated tag ends a debug build with a sentence that names the function; release builds check nothing.
-#ifdef NDEBUG
-inline void requireMain(const char*) {}
-inline void requireEval(const char*) {}
-#else
-/// [main]: the main thread, outside of an evaluation.
-void requireMain(const char* function);
-/// [eval]: the main thread, or a thread inside an evaluation.
-void requireEval(const char* function);
-#endif
+inline bool isMainThread() noexcept {
+    return detail::mainWork.load(std::memory_order_relaxed) == &detail::work;
+}
+
+/// Whether the calling thread may make a call with that tag.
+inline bool mayCall(ThreadTag tag) noexcept {
+    if (tag == ThreadTag::any)
+        return true;
+    if (detail::work == ThreadWork::none)
+        return isMainThread();
+    return tag == ThreadTag::eval && detail::work == ThreadWork::evaluation;
+}
+
+/// What the calling thread does, for as long as this lives.
+class WorkScope {
+public:
+    explicit WorkScope(ThreadWork work) noexcept
+        : previous_(std::exchange(detail::work, work)) {}
+    ~WorkScope() { detail::work = previous_; }
+    WorkScope(const WorkScope&) = delete;
+    WorkScope& operator=(const WorkScope&) = delete;
+
+private:
+    ThreadWork previous_;
+};
+
+// A call that its thread may not make is not carried out: its answer is a sentence that names function and rule. A
+// debug build ends with it instead.
+
+/// Of a call that the thread may not make: kFailure with the sentence.
+HStatus misuse(ThreadTag tag, const char* function) noexcept;
+
+/// Success when the thread may make the call.
+inline HStatus threadStatus(ThreadTag tag, const char* function) noexcept {
+    return mayCall(tag) ? HStatus() : misuse(tag, function);
+}
+
+/// For a function that throws: std::runtime_error with the sentence when the thread may not make the call.
+void requireThread(ThreadTag tag, const char* function);
+
+/// Shows the sentence as an error, once for each function and session.
+void showMisuse(ThreadTag tag, const char* function) noexcept;
+
+/// For a function that has no way to say so: true when the thread may not make the call, which the user is told. It
+/// then gives what it gives for a null object.
+inline bool isRefused(ThreadTag tag, const char* function) noexcept {
+    if (mayCall(tag))
+        return false;
+    showMisuse(tag, function);
+    return true;
+}
 
 } // namespace OpenQuarn

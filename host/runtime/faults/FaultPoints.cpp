@@ -2,7 +2,6 @@
 #include "faults/FaultPoints.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "openquarn_app/Faults.h"
 
 #include <array>
@@ -19,14 +18,6 @@ constexpr std::array<const char*, pointCount> pointNames = {
 #include "faults/all.def"
 #undef FAULT_POINT
 };
-
-#ifndef NDEBUG
-constexpr std::array<std::string_view, pointCount> threadTags = {
-#define FAULT_POINT(type, operation, ...) #__VA_ARGS__,
-#include "faults/all.def"
-#undef FAULT_POINT
-};
-#endif
 
 struct Plan {
     long long callsBefore = 0; // calls that still pass
@@ -65,16 +56,6 @@ bool detail::countFault(FaultPoint point) noexcept {
 const char* faultPointName(FaultPoint point) {
     return pointNames[static_cast<std::size_t>(point)];
 }
-
-#ifndef NDEBUG
-void requireThreadOf(FaultPoint point) {
-    const std::string_view tag = threadTags[static_cast<std::size_t>(point)];
-    if (tag == "main")
-        requireMain(faultPointName(point));
-    else if (tag == "eval")
-        requireEval(faultPointName(point));
-}
-#endif
 
 HStatus faultStatus(FaultPoint point) noexcept {
     try {

@@ -4,7 +4,11 @@
 // these, unless it is [any], the tag that says on which thread the operation may be called: main or eval.
 #pragma once
 
+#include "core/threads.h"
+
 #include <atomic>
+#include <cstddef>
+#include <string_view>
 
 namespace OpenQuarn {
 
@@ -18,17 +22,27 @@ enum class FaultPoint : unsigned {
 /// "Class::operation".
 const char* faultPointName(FaultPoint point);
 
-/// Ends a debug build, with a sentence that names the operation, when it is called on a thread that its tag excludes.
-#ifdef NDEBUG
-inline void requireThreadOf(FaultPoint) {}
-#else
-void requireThreadOf(FaultPoint point);
-#endif
-
 namespace detail {
+constexpr ThreadTag threadTagNamed(std::string_view name) {
+    if (name.empty())
+        return ThreadTag::any;
+    return name == "main" ? ThreadTag::main : ThreadTag::eval;
+}
+
+inline constexpr ThreadTag threadTags[] = {
+#define FAULT_POINT(type, operation, ...) threadTagNamed(#__VA_ARGS__),
+#include "faults/all.def"
+#undef FAULT_POINT
+};
+
 extern std::atomic<bool> faultsArmed;
 bool countFault(FaultPoint point) noexcept;
 } // namespace detail
+
+/// On which threads the operation may be called.
+constexpr ThreadTag threadTagOf(FaultPoint point) {
+    return detail::threadTags[static_cast<std::size_t>(point)];
+}
 
 /// Called by each operation, once a call, before it does anything: true when this call has to fail. One relaxed load
 /// while no fault is armed. Thread: any.

@@ -42,6 +42,15 @@ FileOutcome fileOperation(const std::string& fileName, Work&& work) {
     return outcome;
 }
 
+/// The same for a function of the main thread.
+template <class Work>
+FileOutcome sceneOperation(const char* function, const std::string& fileName, Work&& work) {
+    return fileOperation(fileName, [&](Warnings& warnings) {
+        requireThread(ThreadTag::main, function);
+        work(warnings);
+    });
+}
+
 // What was read only in part must not be saved in the place of the whole.
 void readWhole(const rapidjson::Document& document, Graph& graph, Warnings& warnings) {
     try {
@@ -89,8 +98,7 @@ void summarize(const rapidjson::Document& document, SceneSummary& summary) {
 } // namespace
 
 FileOutcome openScene(const std::filesystem::path& path) {
-    requireMain("openScene");
-    return fileOperation(path.string(), [&](Warnings& warnings) {
+    return sceneOperation("openScene", path.string(), [&](Warnings& warnings) {
         rapidjson::Document document;
         Graph& graph = currentGraph();
         parseScene(document, storage::readWholeFile(Workspace::callersPath(path), largestScene));
@@ -100,8 +108,7 @@ FileOutcome openScene(const std::filesystem::path& path) {
 }
 
 FileOutcome saveScene(const std::filesystem::path& path) {
-    requireMain("saveScene");
-    return fileOperation(path.string(), [&](Warnings& warnings) {
+    return sceneOperation("saveScene", path.string(), [&](Warnings& warnings) {
         const std::filesystem::path file = Workspace::callersPath(path);
         Rebasing rebasing(folderOfScene(file.string()), warnings);
         try {
@@ -115,13 +122,11 @@ FileOutcome saveScene(const std::filesystem::path& path) {
 }
 
 FileOutcome moveScene(const std::filesystem::path& folder) {
-    requireMain("moveScene");
-    return fileOperation(folder.string(), [&](Warnings& warnings) { Rebasing(folder, warnings); });
+    return sceneOperation("moveScene", folder.string(), [&](Warnings& warnings) { Rebasing(folder, warnings); });
 }
 
 FileOutcome sceneFromText(const std::string& text, const std::string& fileName) {
-    requireMain("sceneFromText");
-    return fileOperation(fileName, [&](Warnings& warnings) {
+    return sceneOperation("sceneFromText", fileName, [&](Warnings& warnings) {
         rapidjson::Document document;
         Graph& graph = currentGraph();
         parseScene(document, text);
@@ -130,8 +135,8 @@ FileOutcome sceneFromText(const std::string& text, const std::string& fileName) 
 }
 
 FileOutcome sceneToText(std::string& text) {
-    requireMain("sceneToText");
-    return fileOperation("the scene", [&](Warnings& warnings) { text = writeScene(currentGraph(), warnings); });
+    return sceneOperation("sceneToText", "the scene",
+                          [&](Warnings& warnings) { text = writeScene(currentGraph(), warnings); });
 }
 
 std::string currentFile() {

@@ -121,9 +121,10 @@ void GeometryFilterState::edited(Slot& slot) {
 }
 
 void GeometryFilterState::takeFromDevice() {
+    std::vector<std::unique_ptr<GpuGeometry>> left; // without the lock: a plug-in's code may ask for a geometry
     const std::scoped_lock lock(mutex_);
     for (const auto& [index, geometry] : geometries_)
-        geometry->gpu.reset();
+        left.push_back(std::move(geometry->gpu));
 }
 
 void GeometryFilterState::connectionsChanged() {
@@ -162,8 +163,13 @@ std::shared_ptr<GeometryState> GeometryFilterState::geometry(unsigned index) {
 }
 
 void GeometryFilterState::forget(unsigned index) {
+    std::shared_ptr<GeometryState> left; // see takeFromDevice()
     const std::scoped_lock lock(mutex_);
-    geometries_.erase(index);
+    const auto geometry = geometries_.find(index);
+    if (geometry == geometries_.end())
+        return;
+    left = std::move(geometry->second);
+    geometries_.erase(geometry);
 }
 
 std::unique_ptr<FilterState> makeGeometryFilterState(NodeData& data) {

@@ -72,6 +72,7 @@ public:
     void changed(Slot& slot) override;
     void edited(Slot& slot) override;
     void connectionsChanged() override;
+    void nodeIsGoing() override { takeFromDevice(); }
 
     /// Made when there is none yet. Thread: any.
     std::shared_ptr<GeometryState> geometry(unsigned index);

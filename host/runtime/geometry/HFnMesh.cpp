@@ -15,6 +15,8 @@ using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
 using OpenQuarn::FaultPoint;
 using OpenQuarn::MeshData;
+using OpenQuarn::threadStatus;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -124,7 +126,9 @@ namespace {
 
 /// The mesh that a mesh node gives, evaluated.
 HObject meshOf(OpenQuarn::Node& node, HStatus& status) {
-    OpenQuarn::requireEval("HFnMesh::HFnMesh");
+    status = threadStatus(ThreadTag::eval, "HFnMesh::HFnMesh");
+    if (status.error())
+        return {};
     const OpenQuarn::Field* field = node.type().find("outMesh");
     const auto slot = field ? dataInCurrentContext(node)->slot(*field) : nullptr;
     if (slot)

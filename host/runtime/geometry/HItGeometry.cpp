@@ -10,6 +10,8 @@ using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
 using OpenQuarn::FaultPoint;
 using OpenQuarn::GeometryPoints;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -67,8 +69,7 @@ HItGeometry::~HItGeometry() {
 }
 
 unsigned HItGeometry::index() const {
-    OpenQuarn::requireEval("HItGeometry::index");
-    return isDone() ? current_ : impl_->fullIndex(current_);
+    return isDone() || isRefused(ThreadTag::eval, "HItGeometry::index") ? current_ : impl_->fullIndex(current_);
 }
 
 HPoint HItGeometry::position(HSpace::Space space, HStatus* status) const {

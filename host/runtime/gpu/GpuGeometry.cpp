@@ -3,6 +3,7 @@
 
 #include "gpu/failure.h"
 #include "gpu/transfer.h"
+#include "graph/Node.h"
 
 namespace OpenQuarn {
 
@@ -28,9 +29,14 @@ bool GpuGeometry::enterDevice(const std::shared_ptr<Device>& onto) {
 }
 
 void GpuGeometry::leaveDevice() noexcept {
+    if (deformer)
+        callPlugin(node_, "terminate", [&]() -> HStatus {
+            deformer->terminate();
+            return HStatus::kSuccess;
+        });
+    deformer.reset();
     inputData.clear();
     outputData.clear();
-    deformer.reset();
     input = {};
     passedThrough = {};
     additional.clear();

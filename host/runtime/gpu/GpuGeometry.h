@@ -16,6 +16,8 @@
 
 namespace OpenQuarn {
 
+class Node;
+
 /// Positions of a mesh on the device.
 struct DevicePositions {
     /// Uploads them unless they are there already. A failing status leaves nothing.
@@ -36,15 +38,17 @@ struct DeformerTraits {
 /// Thread: as GeometryState; the destructor where no evaluation is going on.
 class GpuGeometry {
 public:
-    explicit GpuGeometry(HGPUDeformerRegistrationInfo& registration)
-        : info(registration) {}
+    /// `node` whose geometry it is; outlives this.
+    GpuGeometry(HGPUDeformerRegistrationInfo& registration, const Node& node)
+        : info(registration)
+        , node_(node) {}
     ~GpuGeometry() { leaveDevice(); }
     GpuGeometry(const GpuGeometry&) = delete;
     GpuGeometry& operator=(const GpuGeometry&) = delete;
 
     /// Makes the deformer, unless it is there and its buffers are on that device. False when the plug-in makes none.
     bool enterDevice(const std::shared_ptr<Device>& onto);
-    /// Lets go of the deformer and everything on the device.
+    /// Has the deformer terminate(), and lets go of it and of everything on the device.
     void leaveDevice() noexcept;
 
     HGPUDeformerRegistrationInfo& info;
@@ -64,6 +68,7 @@ public:
     HGPUDeformerData inputData, outputData;
 
 private:
+    const Node& node_;
     std::shared_ptr<Device> device_;
 };
 

@@ -5,17 +5,19 @@
 
 #include <utility>
 
-using OpenQuarn::requireEval;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 HGPUDeformerData::HGPUDeformerData() = default;
 HGPUDeformerData::~HGPUDeformerData() = default;
 
 HOpenCLBuffer HGPUDeformerData::getBuffer(const HPlug& plug, const HString& name, cl_int* status) const {
-    requireEval("HGPUDeformerData::getBuffer");
     cl_int outcome = CL_SUCCESS;
     HOpenCLBuffer buffer;
+    if (isRefused(ThreadTag::eval, "HGPUDeformerData::getBuffer"))
+        outcome = CL_INVALID_OPERATION;
     for (const Entry& entry : entries_)
-        if (entry.plug == plug && entry.name == name)
+        if (outcome == CL_SUCCESS && entry.plug == plug && entry.name == name)
             buffer = entry.supplier ? entry.supplier(outcome) : entry.buffer;
     if (status)
         *status = outcome;
@@ -31,18 +33,21 @@ HGPUDeformerData::Entry& HGPUDeformerData::entryOf(const HPlug& plug, const HStr
 }
 
 void HGPUDeformerData::setBuffer(const HPlug& plug, const HString& name, const HOpenCLBuffer& buffer) {
-    requireEval("HGPUDeformerData::setBuffer");
+    if (isRefused(ThreadTag::eval, "HGPUDeformerData::setBuffer"))
+        return;
     Entry& entry = entryOf(plug, name);
     entry.buffer = buffer;
     entry.supplier = nullptr;
 }
 
 void HGPUDeformerData::setSupplier(const HPlug& plug, const HString& name, Supplier supplier) {
-    requireEval("HGPUDeformerData::setSupplier");
+    if (isRefused(ThreadTag::eval, "HGPUDeformerData::setSupplier"))
+        return;
     entryOf(plug, name).supplier = std::move(supplier);
 }
 
 void HGPUDeformerData::clear() noexcept {
-    requireEval("HGPUDeformerData::clear");
+    if (isRefused(ThreadTag::eval, "HGPUDeformerData::clear"))
+        return;
     entries_.clear();
 }

@@ -11,7 +11,8 @@
 #include "openquarn/TapiCastAnim.h"
 #include "openquarn/gpu/HOpenCLUtils.h"
 
-using OpenQuarn::requireEval;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 const HString HPxGPUDeformer::sPositionsName("positions");
 
@@ -55,13 +56,11 @@ bool HPxGPUDeformer::passThroughWithZeroEnvelope() const {
 }
 
 HObject HPxGPUDeformer::dependencyNode() const {
-    requireEval("HPxGPUDeformer::dependencyNode");
-    return impl_->node;
+    return isRefused(ThreadTag::eval, "HPxGPUDeformer::dependencyNode") ? HObject() : impl_->node;
 }
 
 unsigned HPxGPUDeformer::multiIndex() const {
-    requireEval("HPxGPUDeformer::multiIndex");
-    return impl_->multiIndex;
+    return isRefused(ThreadTag::eval, "HPxGPUDeformer::multiIndex") ? 0U : impl_->multiIndex;
 }
 
 namespace {
@@ -105,8 +104,9 @@ HObject publishedBuffer(const HObject& dependencyNode, const HString& name, unsi
 
 void HPxGPUDeformer::uploadFixedSetupData(const HString& name, HOpenCLBuffer& buffer, cl_int& status,
                                           unsigned& elementCount) {
-    requireEval("HPxGPUDeformer::uploadFixedSetupData");
     elementCount = 0;
+    if (isRefused(ThreadTag::eval, "HPxGPUDeformer::uploadFixedSetupData"))
+        status = CL_INVALID_OPERATION;
     if (status != CL_SUCCESS)
         return;
     const HObject published = OpenQuarn::publishedBuffer(impl_->node, name, impl_->multiIndex);

@@ -14,7 +14,12 @@
 
 #include <vector>
 
-using OpenQuarn::requireEval;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
+
+namespace {
+const HOpenCLBuffer noBuffer;
+} // namespace
 
 struct HPxGPUStandardDeformer::Standard {
     HPlug outputPlug;
@@ -31,7 +36,8 @@ HPxGPUStandardDeformer::HPxGPUStandardDeformer()
 HPxGPUStandardDeformer::~HPxGPUStandardDeformer() = default;
 
 void HPxGPUStandardDeformer::terminate() {
-    requireEval("HPxGPUStandardDeformer::terminate");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::terminate"))
+        return;
     *standard_ = Standard();
     HPxGPUDeformer::terminate();
 }
@@ -48,7 +54,8 @@ float envelopeOf(HDataBlock& block, bool isGeometryFilter, HStatus& status) {
 HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::prepareEvaluation(
     HDataBlock& block, const HEvaluationNode& /*evaluationNode*/, const HPlug& outputPlug, const HPlugArray& inputPlugs,
     const HGPUDeformerData& inputData, HGPUDeformerData& outputData, HOpenCLEvent& event) {
-    requireEval("HPxGPUStandardDeformer::prepareEvaluation");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::prepareEvaluation"))
+        return kDeformerFailure;
     Standard& now = *standard_;
     now.status = CL_SUCCESS;
     now.outputPlug = outputPlug;
@@ -72,7 +79,8 @@ HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::prepareEvaluation(
 }
 
 void HPxGPUStandardDeformer::prepareAffectMapBuffer() {
-    requireEval("HPxGPUStandardDeformer::prepareAffectMapBuffer");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::prepareAffectMapBuffer"))
+        return;
     Standard& now = *standard_;
     if (isIdentityMap() || now.uploadedMap == impl_->affected || now.status != CL_SUCCESS)
         return;
@@ -84,7 +92,8 @@ void HPxGPUStandardDeformer::prepareAffectMapBuffer() {
 }
 
 void HPxGPUStandardDeformer::prepareWeightsBuffer(const HEvaluationNode& /*evaluationNode*/) {
-    requireEval("HPxGPUStandardDeformer::prepareWeightsBuffer");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::prepareWeightsBuffer"))
+        return;
     Standard& now = *standard_;
     if (!hasEnvelopeWeights() || now.uploadedWeights == impl_->weightsVersion || now.status != CL_SUCCESS)
         return;
@@ -94,7 +103,8 @@ void HPxGPUStandardDeformer::prepareWeightsBuffer(const HEvaluationNode& /*evalu
 }
 
 cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
-    requireEval("HPxGPUStandardDeformer::initializeOutputPositions");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::initializeOutputPositions"))
+        return CL_INVALID_OPERATION;
     Standard& now = *standard_;
     if (now.status != CL_SUCCESS || isIdentityMap())
         return now.status;
@@ -115,57 +125,55 @@ cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
 
 HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::finishEvaluation(const HOpenCLEvent& event,
                                                                         HGPUDeformerData& outputData) {
-    requireEval("HPxGPUStandardDeformer::finishEvaluation");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::finishEvaluation"))
+        return kDeformerFailure;
     standard_->output.setBufferReadyEvent(event);
     outputData.setBuffer(standard_->outputPlug, sPositionsName, standard_->output);
     return kDeformerSuccess;
 }
 
 const HOpenCLBuffer& HPxGPUStandardDeformer::inputPositions() const {
-    requireEval("HPxGPUStandardDeformer::inputPositions");
+    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::inputPositions"))
+        return noBuffer;
     return standard_->input;
 }
 
 HOpenCLBuffer& HPxGPUStandardDeformer::outputPositions() {
-    requireEval("HPxGPUStandardDeformer::outputPositions");
+    isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::outputPositions"); // said; a reference has to be given
     return standard_->output;
 }
 
 unsigned HPxGPUStandardDeformer::vertexCount() const {
-    requireEval("HPxGPUStandardDeformer::vertexCount");
-    return standard_->vertexCount;
+    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::vertexCount") ? 0 : standard_->vertexCount;
 }
 
 unsigned HPxGPUStandardDeformer::affectCount() const {
-    requireEval("HPxGPUStandardDeformer::affectCount");
-    return impl_->affected ? impl_->affected->affectCount() : 0;
+    return impl_->affected && !isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::affectCount")
+               ? impl_->affected->affectCount()
+               : 0;
 }
 
-namespace {
-const HOpenCLBuffer noBuffer;
-} // namespace
-
 const HOpenCLBuffer& HPxGPUStandardDeformer::affectMapBuffer() const {
-    requireEval("HPxGPUStandardDeformer::affectMapBuffer");
-    return isIdentityMap() ? noBuffer : standard_->affectMap;
+    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::affectMapBuffer") || isIdentityMap()
+               ? noBuffer
+               : standard_->affectMap;
 }
 
 bool HPxGPUStandardDeformer::isIdentityMap() const {
-    requireEval("HPxGPUStandardDeformer::isIdentityMap");
-    return !impl_->affected || impl_->affected->isIdentity();
+    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::isIdentityMap") || !impl_->affected ||
+           impl_->affected->isIdentity();
 }
 
 const HOpenCLBuffer& HPxGPUStandardDeformer::weightsBuffer() const {
-    requireEval("HPxGPUStandardDeformer::weightsBuffer");
-    return hasEnvelopeWeights() ? standard_->weights : noBuffer;
+    return !isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::weightsBuffer") && hasEnvelopeWeights()
+               ? standard_->weights
+               : noBuffer;
 }
 
 bool HPxGPUStandardDeformer::hasEnvelopeWeights() const {
-    requireEval("HPxGPUStandardDeformer::hasEnvelopeWeights");
-    return impl_->weights != nullptr;
+    return !isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::hasEnvelopeWeights") && impl_->weights != nullptr;
 }
 
 float HPxGPUStandardDeformer::envelope() const {
-    requireEval("HPxGPUStandardDeformer::envelope");
-    return standard_->envelope;
+    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::envelope") ? 0.0F : standard_->envelope;
 }

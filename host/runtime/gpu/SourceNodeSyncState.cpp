@@ -6,12 +6,14 @@
 #include "openquarn/TapiCastAnim.h"
 #include "openquarn/gpu/HPxGPUDeformer.h"
 
-using OpenQuarn::requireEval;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 namespace deformer_utils {
 
 void SourceNodeSyncState::capture(const HPxGPUDeformer& deformer) {
-    requireEval("SourceNodeSyncState::capture");
+    if (isRefused(ThreadTag::eval, "SourceNodeSyncState::capture"))
+        return;
     const HObject published = OpenQuarn::publishedBuffer(deformer.dependencyNode(), "Sync", deformer.multiIndex());
     const TuInt32Array* versions = TapiCastAnim::uInt32Array(published);
     captured.clear();
@@ -20,8 +22,8 @@ void SourceNodeSyncState::capture(const HPxGPUDeformer& deformer) {
 }
 
 bool SourceNodeSyncState::isDirty() const {
-    requireEval("SourceNodeSyncState::isDirty");
-    if (captured.length() == 0 || captured.length() != uploaded.length())
+    if (isRefused(ThreadTag::eval, "SourceNodeSyncState::isDirty") || captured.length() == 0 ||
+        captured.length() != uploaded.length())
         return true;
     for (unsigned slot = 0; slot < captured.length(); ++slot)
         if (isDirty(slot))
@@ -30,8 +32,8 @@ bool SourceNodeSyncState::isDirty() const {
 }
 
 bool SourceNodeSyncState::isDirty(unsigned slot) const {
-    requireEval("SourceNodeSyncState::isDirty");
-    return slot >= captured.length() || slot >= uploaded.length() || captured[slot] != uploaded[slot];
+    return isRefused(ThreadTag::eval, "SourceNodeSyncState::isDirty") || slot >= captured.length() ||
+           slot >= uploaded.length() || captured[slot] != uploaded[slot];
 }
 
 } // namespace deformer_utils

@@ -144,7 +144,7 @@ void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HSt
     countEvaluation(false, isFallback);
     GeometryState& state = *filterStateOf(data).geometry(index);
     if (!state.gpu)
-        state.gpu = std::make_unique<GpuGeometry>(*info);
+        state.gpu = std::make_unique<GpuGeometry>(*info, data.node);
     GpuGeometry& gpu = *state.gpu;
     gpu.isPrimed = false;
     if (status.error())
@@ -167,7 +167,8 @@ void takeFromDevice(const std::string& nodeType) {
 }
 
 void Gpu::setEnabled(bool enabled) {
-    requireMain("Gpu::setEnabled");
+    if (isRefused(ThreadTag::main, "Gpu::setEnabled"))
+        return;
     if (!enabled)
         takeFromDevice("");
     isOn = enabled;

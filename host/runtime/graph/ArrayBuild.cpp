@@ -40,13 +40,8 @@ std::size_t ArrayBuild::size() const {
 }
 
 void commit(ArrayBuild& build) {
-    build.removed.forEach([&](unsigned index, const std::shared_ptr<Slot>& element) {
-        {
-            const ArrayWriteLock lock(build.array->owner);
-            build.array->ownElements().remove(index);
-        }
-        element->detach();
-    });
+    const ParallelGraphLock lock;
+    build.removed.forEach([&](unsigned index, const std::shared_ptr<Slot>&) { build.array->removeElement(index); });
     build.added.forEach([&](unsigned, const std::shared_ptr<Slot>& element) { build.array->adopt(element); });
     build.added.clear();
     build.removed.clear();

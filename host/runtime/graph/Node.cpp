@@ -93,6 +93,8 @@ void Node::runPostConstructor() {
 }
 
 void Node::bury() {
+    if (data_->filterState)
+        data_->filterState->nodeIsGoing();
     user_.reset(); // its destructor still sees the node
     alive_.store(false, std::memory_order_release);
     callbacks.clear();

@@ -33,6 +33,8 @@ public:
     virtual void edited(Slot& slot) = 0;
     /// Everything that is connected may have another value. Thread: main.
     virtual void connectionsChanged() = 0;
+    /// The node will be buried: what needs it for its own end has to end now. Thread: main.
+    virtual void nodeIsGoing() = 0;
 
 protected:
     FilterState() = default;

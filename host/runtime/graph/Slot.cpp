@@ -48,11 +48,15 @@ void Slot::makeChildren() {
 }
 
 std::shared_ptr<Slot> Slot::elementAt(unsigned logicalIndex) {
-    {
+    const auto existing = [&] {
         const ArrayReadLock lock(owner);
-        if (std::shared_ptr<Slot> existing = elements().find(logicalIndex))
-            return existing;
-    }
+        return elements().find(logicalIndex);
+    };
+    if (std::shared_ptr<Slot> element = existing())
+        return element;
+    const ParallelGraphLock lock;
+    if (std::shared_ptr<Slot> element = existing()) // another thread was faster
+        return element;
     auto element = std::make_shared<Slot>(field, owner, this, true, logicalIndex);
     adopt(element);
     return element;
@@ -73,6 +77,16 @@ void Slot::adopt(const std::shared_ptr<Slot>& element) {
         element->forgetTold();
         forgetToldUpstream(*element);
     }
+}
+
+void Slot::removeElement(unsigned logicalIndex) {
+    std::shared_ptr<Slot> element;
+    {
+        const ArrayWriteLock lock(owner);
+        element = ownElements().remove(logicalIndex);
+    }
+    if (element)
+        element->detach();
 }
 
 void Slot::attach(NodeData* newOwner) {
@@ -101,14 +115,14 @@ void Slot::copyFrom(const Slot& from) {
         children()[i]->copyFrom(*from.children()[i]);
     if (!isArray())
         return;
+    const ParallelGraphLock lock;
     std::vector<unsigned> surplus;
     elements().forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>&) {
         if (!from.elements().find(elementIndex))
             surplus.push_back(elementIndex);
     });
     for (const unsigned elementIndex : surplus)
-        if (const std::shared_ptr<Slot> element = ownElements().remove(elementIndex))
-            element->detach();
+        removeElement(elementIndex);
     from.elements().forEach([&](unsigned elementIndex, const std::shared_ptr<Slot>& element) {
         elementAt(elementIndex)->copyFrom(*element);
     });

@@ -76,8 +76,11 @@ public:
     /// The element with that index; made, with default values, when it is missing. Marks what it makes as dirty when it
     /// is an output, or the array is dirty.
     std::shared_ptr<Slot> elementAt(unsigned logicalIndex);
-    /// Puts an element that was made for this array (ArrayBuild) in its place.
+    /// Puts an element that was made for this array (ArrayBuild) in its place. Within a ParallelGraphLock
+    /// (arrayLock.h).
     void adopt(const std::shared_ptr<Slot>& element);
+    /// Takes an element away and cuts it off; nothing happens when there is none. Within a ParallelGraphLock.
+    void removeElement(unsigned logicalIndex);
     std::shared_ptr<Slot> child(const Field& childField) const;
 
     /// Calls visit(slot) for the direct parts: children or elements.
@@ -95,10 +98,6 @@ public:
     /// Takes over the values of a slot of the same kind, as a connection does; elements and children too. Data is
     /// shared.
     void copyFrom(const Slot& from);
-    /// Calls visit(slot) for the direct parts while other threads may add and remove elements.
-    template <class Visit>
-    void forEachPartMeanwhile(Visit&& visit) const;
-
     /// Breaks all connections here and below, without telling anybody.
     void unlink();
     /// Cuts it and everything below off from its node, and from what it is connected to.

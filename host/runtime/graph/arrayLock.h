@@ -2,8 +2,10 @@
 // Guards the elements of array attributes while several geometries of one node are evaluated at the same time.
 #pragma once
 
+#include "graph/EvaluationLock.h"
 #include "graph/Node.h"
 
+#include <atomic>
 #include <memory>
 #include <mutex>
 #include <shared_mutex>
@@ -61,5 +63,18 @@ void forEachPartKept(const Slot& slot, Visit&& visit) {
     for (const std::shared_ptr<Slot>& part : parts)
         visit(*part);
 }
+
+/// For who adds or removes elements, or walks over them, outside of compute(): the lock of the graph, so that who holds
+/// it finds the same elements until it gives it up. Taken before the locks above, never inside of them.
+class ParallelGraphLock {
+public:
+    ParallelGraphLock() {
+        if (ParallelSection::isRunning())
+            lock_ = std::unique_lock(EvaluationLock::instance());
+    }
+
+private:
+    std::unique_lock<EvaluationLock> lock_;
+};
 
 } // namespace OpenQuarn

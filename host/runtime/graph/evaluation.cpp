@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "graph/evaluation.h"
 
+#include "core/threads.h"
 #include "graph/Context.h"
 #include "graph/EvaluationLock.h"
 #include "graph/Graph.h"
@@ -69,11 +70,13 @@ HStatus compute(const std::shared_ptr<Slot>& slot) {
         showMessage(Severity::error, text);
         return {HStatus::kFailure, text};
     }
+    if (!slot->owner) // removed while this thread waited for the graph: there is nothing left to compute
+        return HStatus::kSuccess;
     const ComputeClaim claim(*slot);
+    if (!slot->owner) // or while it waited for who computes the node
+        return HStatus::kSuccess;
     if (!slot->mayBeDirty()) // another thread was faster
         return statusOf(*slot);
-    if (!slot->owner)
-        return {HStatus::kFailure, "the element has been removed"};
     const std::shared_ptr<Node> node = std::static_pointer_cast<Node>(slot->owner->node.shared_from_this());
     HStatus status = runCompute(*node, *slot->owner, *slot);
     if (status == HStatus::kUnknownParameter)
@@ -90,7 +93,8 @@ void takeFromSource(Slot& slot, const std::shared_ptr<Slot>& source) {
     pullLocked(source);
     if (!slot.mayBeDirty()) // another thread was faster, and readers may be at it already
         return;
-    slot.copyFrom(*source);
+    if (source->owner) // an element that has been removed gives no value: the last one stays
+        slot.copyFrom(*source);
     slot.markClean();
 }
 
@@ -196,13 +200,10 @@ ComputeClaim::~ComputeClaim() {
     EvaluationLock::instance().disclaim(part_);
 }
 
-bool isEvaluating() {
-    return depth > 0;
-}
-
 HStatus pull(const std::shared_ptr<Slot>& slot) {
     if (!slot->mayBeDirty())
         return statusOf(*slot);
+    const WorkScope evaluating(ThreadWork::evaluation);
     const std::scoped_lock lock(EvaluationLock::instance());
     return pullLocked(slot);
 }

@@ -17,9 +17,6 @@ namespace OpenQuarn {
 /// geometries of a filter each on one: whoever needs a value that another thread is computing waits for it.
 HStatus pull(const std::shared_ptr<Slot>& slot);
 
-/// True on a thread that is inside pull().
-bool isEvaluating();
-
 /// Takes the part of the node that a slot belongs to, for as long as it is computed; the last one taken goes first.
 /// Thread: one that holds the lock of the graph.
 class ComputeClaim {

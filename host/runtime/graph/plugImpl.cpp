@@ -117,11 +117,8 @@ TentativeSlot::TentativeSlot(const HPlug& plug)
 }
 
 TentativeSlot::~TentativeSlot() {
-    if (!made_ || !made_->parent)
-        return;
-    const std::shared_ptr<Slot> element = made_->parent->ownElements().remove(made_->index);
-    if (element)
-        element->detach();
+    if (made_ && made_->parent)
+        made_->parent->removeElement(made_->index);
 }
 
 } // namespace OpenQuarn

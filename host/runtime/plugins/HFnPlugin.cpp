@@ -13,8 +13,10 @@
 
 using OpenQuarn::apiCall;
 using OpenQuarn::FaultPoint;
+using OpenQuarn::isRefused;
 using OpenQuarn::Plugin;
 using OpenQuarn::Registration;
+using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -31,6 +33,11 @@ HStatus pluginCall(const HFnBase& set, FaultPoint point, Body&& body) {
             return {HStatus::kInvalidParameter, "the function set is attached to no plug-in"};
         return body(*plugin);
     });
+}
+
+/// Null too when the function may not be called on this thread.
+std::shared_ptr<Plugin> readablePlugin(const HFnBase& set, const char* function) {
+    return isRefused(ThreadTag::main, function) ? nullptr : pluginOf(set);
 }
 
 HStatus unusable(const HString& name, const HTypeId& id, const char* what) {
@@ -58,28 +65,23 @@ HFnPlugin::HFnPlugin(const HObject& plugin, const char* vendor, const char* vers
 HFnPlugin::~HFnPlugin() = default;
 
 HString HFnPlugin::name() const {
-    OpenQuarn::requireMain("HFnPlugin::name");
-    const std::shared_ptr<Plugin> plugin = pluginOf(*this);
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::name");
     return plugin ? HString(plugin->name) : HString();
 }
 HString HFnPlugin::vendor() const {
-    OpenQuarn::requireMain("HFnPlugin::vendor");
-    const std::shared_ptr<Plugin> plugin = pluginOf(*this);
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::vendor");
     return plugin ? HString(plugin->vendor()) : HString();
 }
 HString HFnPlugin::version() const {
-    OpenQuarn::requireMain("HFnPlugin::version");
-    const std::shared_ptr<Plugin> plugin = pluginOf(*this);
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::version");
     return plugin ? HString(plugin->version()) : HString();
 }
 HString HFnPlugin::apiVersion() const {
-    OpenQuarn::requireMain("HFnPlugin::apiVersion");
-    const std::shared_ptr<Plugin> plugin = pluginOf(*this);
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::apiVersion");
     return plugin ? HString(plugin->apiVersion) : HString();
 }
 HString HFnPlugin::loadPath() const {
-    OpenQuarn::requireMain("HFnPlugin::loadPath");
-    const std::shared_ptr<Plugin> plugin = pluginOf(*this);
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::loadPath");
     return plugin ? HString(std::filesystem::path(plugin->path).parent_path().string()) : HString();
 }
 

@@ -37,6 +37,8 @@ HStatus HGPUDeformerRegistry::registerGPUDeformerCreator(const HString& nodeType
 HStatus HGPUDeformerRegistry::deregisterGPUDeformerCreator(const HString& nodeType, const HString& registrantId) {
     return apiCall(FaultPoint::HGPUDeformerRegistry_deregisterGPUDeformerCreator, [&]() -> HStatus {
         std::string registrant;
+        if (activePlugin().hasTakenBack(Registration::Kind::gpuDeformer, nodeType.asStdString()))
+            return HStatus::kSuccess;
         OpenQuarn::findGPUDeformer(nodeType.asStdString(), &registrant);
         if (registrantId != HString(registrant))
             return {HStatus::kFailure, "'" + registrantId.asStdString() + "' has registered no GPU deformer of '" +

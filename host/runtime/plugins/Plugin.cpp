@@ -9,6 +9,7 @@
 #include "plugins/GPUDeformers.h"
 
 #include <algorithm>
+#include <iterator>
 #include <stdexcept>
 
 namespace OpenQuarn {
@@ -54,6 +55,13 @@ std::string describe(const Registration& registration) {
     return std::string(kinds[static_cast<int>(registration.kind)]) + " '" + registration.name + "'";
 }
 
+std::string describe(const std::vector<Registration>& registrations) {
+    std::string text;
+    for (const Registration& registration : registrations)
+        text += (text.empty() ? "" : ", ") + describe(registration);
+    return text;
+}
+
 std::string usersOf(const Registration& registration) {
     if (registration.kind == Registration::Kind::node)
         return nodeUsers(registration);
@@ -73,8 +81,20 @@ void Plugin::introduce(const std::string& vendor, const std::string& version) {
     introduced_ = true;
 }
 
+bool Plugin::hasTakenBack(Registration::Kind kind, const std::string& registered) const {
+    return std::any_of(takenBack_.begin(), takenBack_.end(),
+                       [&](const Registration& gone) { return gone.kind == kind && gone.name == registered; });
+}
+
+void Plugin::unloadFailed(const std::vector<Registration>& before) {
+    std::copy_if(before.begin(), before.end(), std::back_inserter(takenBack_), [&](const Registration& registration) {
+        return std::find(registrations_.begin(), registrations_.end(), registration) == registrations_.end();
+    });
+}
+
 template <class Call>
 void Plugin::tracked(Registration registration, Call&& call) {
+    takenBack_.erase(std::remove(takenBack_.begin(), takenBack_.end(), registration), takenBack_.end());
     registrations_.push_back(std::move(registration));
     try {
         std::forward<Call>(call)();
@@ -114,9 +134,10 @@ HStatus Plugin::registerCommand(const std::string& command, HPxCommand* (*creato
 }
 
 void Plugin::deregister(Registration::Kind kind, HTypeId id) {
-    const auto place = std::find_if(registrations_.begin(), registrations_.end(), [&](const Registration& present) {
-        return present.kind == kind && present.id == id;
-    });
+    const auto isMeant = [&](const Registration& one) { return one.kind == kind && one.id == id; };
+    const auto place = std::find_if(registrations_.begin(), registrations_.end(), isMeant);
+    if (place == registrations_.end() && std::any_of(takenBack_.begin(), takenBack_.end(), isMeant))
+        return;
     if (place == registrations_.end())
         throw std::invalid_argument("plug-in '" + name + "' has registered no " +
                                     (kind == Registration::Kind::node ? "node" : "data") + " type " + hexText(id));
@@ -127,8 +148,11 @@ void Plugin::deregister(Registration::Kind kind, const std::string& registered) 
     const auto place = std::find_if(registrations_.begin(), registrations_.end(), [&](const Registration& present) {
         return present.kind == kind && present.name == registered;
     });
+    if (place == registrations_.end() && hasTakenBack(kind, registered))
+        return;
     if (place == registrations_.end())
-        throw std::invalid_argument("plug-in '" + name + "' has registered no " + describe({kind, registered, {}}));
+        throw std::invalid_argument("plug-in '" + name + "' has registered no " +
+                                    describe(Registration{kind, registered, {}}));
     remove(place);
 }
 

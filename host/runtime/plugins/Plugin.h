@@ -24,10 +24,16 @@ struct Registration {
     Kind kind;
     std::string name;
     HTypeId id; ///< of nodes and data
+
+    bool operator==(const Registration& other) const {
+        return kind == other.kind && name == other.name && id == other.id;
+    }
 };
 
 /// "node type 'x'"
 std::string describe(const Registration& registration);
+/// The same of several: "node type 'x', command 'y'".
+std::string describe(const std::vector<Registration>& registrations);
 /// Who uses it, as "2 nodes of type 'x', such as 'x1'"; empty when nobody does.
 std::string usersOf(const Registration& registration);
 
@@ -55,9 +61,16 @@ public:
     void registerGPUDeformer(const std::string& nodeType, const std::string& registrant,
                              HGPUDeformerRegistrationInfo* info);
 
-    /// Takes away one registration; throws when it is not this plug-in's, and when it is in use.
+    /// Takes away one registration; throws when it is not this plug-in's, and when it is in use. Nothing happens when
+    /// it was taken away in an unload that failed later on.
     void deregister(Registration::Kind kind, HTypeId id);
     void deregister(Registration::Kind kind, const std::string& registered);
+
+    /// To be told when uninitializePlugin has failed, with the registrations of before.
+    void unloadFailed(const std::vector<Registration>& before);
+    /// What it has taken back in unloads that failed later on; empty unless it is half unloaded.
+    const std::vector<Registration>& takenBack() const { return takenBack_; }
+    bool hasTakenBack(Registration::Kind kind, const std::string& registered) const;
 
     /// In order of registration.
     const std::vector<Registration>& registrations() const { return registrations_; }
@@ -80,6 +93,7 @@ private:
     bool introduced_ = false;
     bool alive_ = true;
     std::vector<Registration> registrations_;
+    std::vector<Registration> takenBack_;
 };
 
 } // namespace OpenQuarn

@@ -30,13 +30,6 @@ PluginEntryPoint entryPoint(const Library& library, const char* name) {
     return reinterpret_cast<PluginEntryPoint>(library.symbol(name));
 }
 
-std::string listed(const std::vector<Registration>& registrations) {
-    std::string text;
-    for (const Registration& registration : registrations)
-        text += (text.empty() ? "" : ", ") + describe(registration);
-    return text;
-}
-
 std::size_t removeCallbacksInto(const Library& library) {
     Graph* const graph = Graph::current();
     std::vector<HCallbackId> found;
@@ -81,7 +74,11 @@ std::vector<std::shared_ptr<Plugin>> PluginTable::all() const {
 }
 
 void PluginTable::refuseTaken(const std::string& name, const std::string& path) const {
-    if (const std::shared_ptr<Plugin> present = find(name))
+    const std::shared_ptr<Plugin> present = find(name);
+    if (present && !present->takenBack().empty())
+        throw std::runtime_error("a plug-in named '" + name + "' is half unloaded, without " +
+                                 describe(present->takenBack()) + ": unload it again first");
+    if (present)
         throw std::runtime_error("a plug-in named '" + name + "' is loaded already, " +
                                  (present->path.empty() ? "as part of the application" : "from " + present->path) +
                                  (path.empty() ? "" : "; unload it first"));
@@ -94,7 +91,7 @@ std::string PluginTable::load(const std::string& path) {
         const fs::path whole = existingFile(path);
         std::string name = whole.stem().string();
         const std::shared_ptr<Plugin> present = find(name);
-        if (present && present->path == whole.string())
+        if (present && present->path == whole.string() && present->takenBack().empty())
             return name;
         refuseTaken(name, whole.string());
         Loaded loaded;
@@ -175,6 +172,20 @@ void PluginTable::refuseInUse(const Plugin& plugin) {
         throw std::runtime_error("one of its commands is running");
 }
 
+// What it has taken back before a failing step stays so: a second time counts as done.
+void PluginTable::haveItUninitialize(const Loaded& loaded) {
+    const std::shared_ptr<Plugin> plugin = loaded.plugin; // the entry may move when it loads another
+    const std::vector<Registration> before = plugin->registrations();
+    const HStatus status = call(loaded, loaded.uninitialize, "uninitializePlugin");
+    if (!status.error())
+        return;
+    plugin->unloadFailed(before);
+    const std::string gone = describe(plugin->takenBack());
+    throw std::runtime_error("uninitializePlugin failed, and it stays loaded" +
+                             (gone.empty() ? gone : " without " + gone + ", until it is unloaded again") + ": " +
+                             status.errorString().asStdString());
+}
+
 void PluginTable::unload(const std::string& name) {
     const auto place = placeOf(name);
     if (place == loaded_.end())
@@ -183,10 +194,7 @@ void PluginTable::unload(const std::string& name) {
         if (active_)
             throw std::runtime_error("plug-in '" + active_->name + "' is being loaded or unloaded");
         refuseInUse(*place->plugin);
-        const HStatus status = call(*place, place->uninitialize, "uninitializePlugin");
-        if (status.error())
-            throw std::runtime_error("uninitializePlugin failed, and it stays loaded: " +
-                                     status.errorString().asStdString());
+        haveItUninitialize(*place);
     } catch (const std::exception& error) {
         throw std::runtime_error("plug-in '" + name + "' cannot be unloaded: " + error.what());
     }
@@ -196,7 +204,7 @@ void PluginTable::unload(const std::string& name) {
     const std::vector<Registration> left = loaded.plugin->removeAll();
     if (!left.empty())
         showMessage(Severity::warning,
-                    "plug-in '" + name + "' left registered, and the host took away: " + listed(left));
+                    "plug-in '" + name + "' left registered, and the host took away: " + describe(left));
     retire(loaded);
 }
 

@@ -44,6 +44,7 @@ private:
     void refuseTaken(const std::string& name, const std::string& path) const;
     void start(Loaded loaded);
     void retire(Loaded& loaded) const;
+    void haveItUninitialize(const Loaded& loaded);
     HStatus call(const Loaded& loaded, PluginEntryPoint entry, const char* name);
     static void refuseInUse(const Plugin& plugin);
 

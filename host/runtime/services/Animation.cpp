@@ -43,6 +43,8 @@ void Animation::setRange(double startFrame, double endFrame) {
 } // namespace OpenQuarn
 
 using OpenQuarn::animationState;
+using OpenQuarn::isRefused;
+using OpenQuarn::ThreadTag;
 
 bool HAnimControl::isPlaying() noexcept {
     return animationState().isPlaying;
@@ -53,8 +55,7 @@ bool HAnimControl::isScrubbing() noexcept {
 }
 
 HTime HAnimControl::currentTime() noexcept {
-    OpenQuarn::requireEval("HAnimControl::currentTime");
-    return HTime(HDGContext().time());
+    return isRefused(ThreadTag::eval, "HAnimControl::currentTime") ? HTime() : HTime(HDGContext().time());
 }
 
 HTime HAnimControl::animationStartTime() noexcept {

@@ -34,17 +34,19 @@ HStatus pullPlug(const HPlug& plug) noexcept {
 } // namespace
 
 HStatus evaluate(const HPlug& plug) {
-    requireMain("evaluate");
-    return pullPlug(plug);
+    const HStatus refused = threadStatus(ThreadTag::main, "evaluate");
+    return refused.error() ? refused : pullPlug(plug);
 }
 
 HStatus evaluate(const HPlugArray& plugs, bool parallel) {
-    requireMain("evaluate");
+    if (HStatus refused = threadStatus(ThreadTag::main, "evaluate"); refused.error())
+        return refused;
     std::vector<HStatus> statuses(plugs.size());
     if (parallel) {
         for (const HPlug& plug : plugs)
             slotToEvaluate(plug);
         const ParallelSection section;
+        const WorkScope waiting(ThreadWork::waiting);
         tbb::parallel_for(std::size_t{0}, plugs.size(), [&](std::size_t i) { statuses[i] = pullPlug(plugs[i]); });
     } else {
         for (std::size_t i = 0; i < plugs.size(); ++i)
@@ -57,7 +59,8 @@ HStatus evaluate(const HPlugArray& plugs, bool parallel) {
 }
 
 HStatus makeDirty(const HPlug& plug) {
-    requireMain("makeDirty");
+    if (HStatus refused = threadStatus(ThreadTag::main, "makeDirty"); refused.error())
+        return refused;
     const std::shared_ptr<Slot> slot = resolvePlug(plug);
     if (!slot)
         return plug.isNull() ? nullPlug()
@@ -67,7 +70,8 @@ HStatus makeDirty(const HPlug& plug) {
 }
 
 HStatus makeDirty(const HObject& node) {
-    requireMain("makeDirty");
+    if (HStatus refused = threadStatus(ThreadTag::main, "makeDirty"); refused.error())
+        return refused;
     const auto found = Access::as<Node>(node);
     if (!found)
         return {HStatus::kInvalidParameter, "the object is no node"};
@@ -111,10 +115,13 @@ void EvaluationContext::setTime(double frame) {
 }
 
 HDataHandle EvaluationContext::evaluateAt(const HPlug& plug, HStatus* status) {
-    requireMain("EvaluationContext::evaluateAt");
     const ContextScope scope(&impl_->context);
-    HStatus outcome = pullPlug(plug);
-    std::shared_ptr<Slot> slot = resolvePlug(plug);
+    HStatus outcome = threadStatus(ThreadTag::main, "EvaluationContext::evaluateAt");
+    std::shared_ptr<Slot> slot;
+    if (!outcome.error()) {
+        outcome = pullPlug(plug);
+        slot = resolvePlug(plug);
+    }
     if (status)
         *status = outcome;
     return slot ? Access::make<HDataHandle>(std::move(slot)) : HDataHandle();

@@ -5,7 +5,7 @@
 #   - a function that can fail and has no fault point, and a fault point whose function has gone;
 #   - a function without a thread tag, and a fault point whose tag is not its function's;
 #   - a function that is [main] or [eval], cannot fail, and does not check it by a call that names it, as in
-#     requireMain("HPxCommand::syntax").
+#     isRefused(ThreadTag::main, "HPxCommand::syntax").
 # What counts as a function, and which are exempt: see operations.awk.
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
@@ -18,10 +18,11 @@ find host/api/openquarn -name '*.h' -print0 | sort -z | xargs -0 awk -f "$here/o
 {
   sed 's/^/function\t/' "$scratch"
   sed -nE 's|^FAULT_POINT\((\w+), (\w+)(, (\w+))?\)$|point\t\1\t\2\t\4|p' host/runtime/faults/*.def
-  # toRead() of HDataBlock.cpp checks for its callers
+  # toRead() of HDataBlock.cpp and readablePlugin() of HFnPlugin.cpp check for their callers
   find host/runtime -name '*.cpp' -exec sed -nE \
-    -e 's|.*requireMain\("(\w+)::(\w+)"\).*|checked\t\1\t\2\tmain|p' \
-    -e 's|.*(requireEval\(\|toRead\(.*)"(\w+)::(\w+)"\).*|checked\t\2\t\3\teval|p' {} +
+    -e 's|.*ThreadTag::(\w+), "(\w+)::(\w+)"\).*|checked\t\2\t\3\t\1|p' \
+    -e 's|.*toRead\(.*"(\w+)::(\w+)"\).*|checked\t\1\t\2\teval|p' \
+    -e 's|.*readablePlugin\(.*"(\w+)::(\w+)"\).*|checked\t\1\t\2\tmain|p' {} +
 } | awk -F '\t' '
   function bad(text) {
       if (!(text in said))

@@ -53,7 +53,7 @@ FAULT_POINT(HThing, other, eval)
 FAULT_POINT(HPxThing, help, main)
 FAULT_POINT(HBare, open)
 TABLE
-  echo 'unsigned HThing::width() const { requireMain("HThing::width"); }' >"$tree/host/runtime/HThing.cpp"
+  echo 'unsigned HThing::width() const { isRefused(ThreadTag::main, "HThing::width"); }' >"$tree/host/runtime/HThing.cpp"
 }
 
 # plant TEXT_OF_THE_VERDICT FILE SED_SCRIPT; no text: nothing is wrong

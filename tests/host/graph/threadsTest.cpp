@@ -71,6 +71,55 @@ TEST_F(Threads, TwoNodesThatNeedEachOthersOtherOutputsDoNotWaitForEver) {
     }
 }
 
+// as many elements as "in" says, each with its index and the value of "ins[0]"; the others go
+HStatus fillOuts(HPxNode& node, const HPlug&, HDataBlock& block) {
+    const HFnDependencyNode set(node.thisHObject());
+    const int count = static_cast<int>(block.inputValue(set.attribute("in")).asDouble());
+    const double value = block.inputArrayValue(set.attribute("ins")).inputValue().asDouble();
+    HArrayDataHandle outs = block.outputArrayValue(set.attribute("outs"));
+    HArrayDataBuilder builder = outs.builder();
+    for (int i = 0; i < count; ++i)
+        builder.addElement(static_cast<unsigned>(i)).set(value + i);
+    for (unsigned surplus = 64; surplus > static_cast<unsigned>(count); --surplus)
+        builder.removeElement(surplus - 1); // where there is one
+    outs.set(builder);
+    return outs.setAllClean();
+}
+
+TEST_F(Threads, ElementsMayGoWhileOthersWaitForThem) {
+    constexpr unsigned many = 64;
+    constexpr unsigned few = 3;
+    create("testCase", "node");
+    const auto passOn = Hooks::compute;
+    Hooks::compute = [&](HPxNode& node, const HPlug& asked, HDataBlock& block) {
+        return node.name() == "node" ? fillOuts(node, asked, block) : passOn(node, asked, block);
+    };
+    HPlugArray elements;
+    HPlugArray readers;
+    for (unsigned i = 0; i < many; ++i) {
+        elements.push_back(plug("node.outs").elementByLogicalIndex(i));
+        readers.push_back(HFnDependencyNode(create("testCase")).findPlug("out"));
+    }
+    HPlugArray all = elements;
+    all.insert(all.end(), readers.begin(), readers.end());
+    for (int round = 1; round <= 100; ++round) {
+        HDGModifier modifier;
+        for (unsigned i = round == 1 ? 0 : few; i < many; ++i)
+            modifier.connect(elements[i], HFnDependencyNode(readers[i].node()).findPlug("in"));
+        EXPECT_EQ(text(modifier.doIt()), "");
+        plug("node.ins[0]").setDouble(1000.0 * round);
+        plug("node.in").setDouble(many);
+        EXPECT_EQ(text(OpenQuarn::evaluate(elements, true)), "");
+        plug("node.in").setDouble(few);
+        EXPECT_EQ(text(OpenQuarn::evaluate(all, true)), "") << "as on one thread: what has gone is no failure";
+        EXPECT_EQ(plug("node.outs").numElements(), few);
+        for (unsigned i = 0; i < many; ++i) {
+            const double value = HFnDependencyNode(readers[i].node()).findPlug("in").asDouble();
+            ASSERT_EQ(value, i < few ? 1000.0 * round + i : 0.0) << "an element that has gone gives no value: " << i;
+        }
+    }
+}
+
 TEST_F(Threads, TheFirstFailureInOrderIsTheAnswer) {
     HPlugArray plugs;
     for (int i = 0; i < 8; ++i)

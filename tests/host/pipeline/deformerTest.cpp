@@ -2,6 +2,7 @@
 // What the host asks of a GPU deformer and its registration info, and what it does when they fail.
 #include "host/pipeline/PipelineTest.h"
 
+#include "openquarn/HDGModifier.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/gpu/HOpenCLInfo.h"
 #include "openquarn_app/Plugins.h"
@@ -18,6 +19,7 @@ using OpenQuarn::Gpu;
 using testDeformers::grid;
 using testDeformers::meshNode;
 using ::testing::AllOf;
+using ::testing::Contains;
 using ::testing::Each;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
@@ -281,6 +283,70 @@ TEST_F(DeformerTest, TerminateMayBeFollowedByAnotherEvaluation) {
     EXPECT_EQ(nextFrame(), "gpu");
     EXPECT_EQ(Gpu::counts().uploads.at("weights"), 1U) << "everything anew";
     EXPECT_EQ(Seen::terminations, 1);
+}
+
+TEST_F(DeformerTest, TheHostTerminatesADeformerWhereverItLetsItGo) {
+    struct Row {
+        const char* name;
+        std::function<void()> letGo, comeBack;
+    };
+    const auto anew = [&] { session.newScene(), SetUp(); };
+    const std::vector<Row> rows = {
+        {"the pipeline is switched off", [] { Gpu::setEnabled(false); },
+         [&] {
+             Gpu::setEnabled(true);
+             EXPECT_EQ(nextFrame(), "cpu");
+         }},
+        {"a frame fails",
+         [&] {
+             Hooks::deform = [](auto&&...) { return HPxGPUDeformer::kDeformerFailure; };
+             EXPECT_EQ(nextFrame(), "cpu");
+         },
+         [] { Hooks::deform = nullptr; }},
+        {"another device",
+         [&] {
+             Gpu::setTiming(true);
+             EXPECT_EQ(nextFrame(), "gpu");
+         },
+         [] { Gpu::setTiming(false); }},
+        {"the plug-in takes it back", [] { OpenQuarn::unloadPlugin("gpuDeformers"); },
+         [&] {
+             registerPush();
+             EXPECT_EQ(nextFrame(), "cpu");
+         }},
+        {"no mesh comes in any more",
+         [] {
+             create("mesh", "empty");
+             disconnect("m.outMesh", input("d", 0)), connect("empty.outMesh", input("d", 0));
+             EXPECT_EQ(evaluate(output("d", 0)), "");
+         },
+         anew},
+        {"the node is deleted",
+         [] {
+             HDGModifier modifier;
+             modifier.deleteNode(plug("d.envelope").node());
+             EXPECT_EQ(text(modifier.doIt()), "");
+         },
+         anew},
+        {"a new scene", [&] { session.newScene(); }, anew},
+    };
+    for (const bool isThrowing : {false, true})
+        for (const Row& row : rows) {
+            SCOPED_TRACE(row.name);
+            EXPECT_EQ(nextFrame(), "gpu");
+            Seen::reset();
+            std::vector<std::string> nodes;
+            Hooks::terminate = [&](const HPxGPUDeformer& deformer) {
+                nodes.push_back(HFnDependencyNode(deformer.dependencyNode()).name().asStdString());
+                if (isThrowing)
+                    throw std::runtime_error("no end");
+            };
+            row.letGo();
+            Hooks::terminate = nullptr;
+            EXPECT_THAT(nodes, ElementsAre("d"));
+            EXPECT_THAT(takeMessages(), Contains("error: d: terminate: no end").Times(isThrowing ? 1 : 0));
+            row.comeBack();
+        }
 }
 
 TEST_F(DeformerTest, DeformersGoWithTheirNodeAndTheirPlugin) {

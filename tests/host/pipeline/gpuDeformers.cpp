@@ -55,6 +55,8 @@ public:
         ++Seen::terminations;
         kernel_.reset();
         HPxGPUStandardDeformer::terminate();
+        if (Hooks::terminate)
+            Hooks::terminate(*this);
     }
 
 private:
@@ -129,6 +131,7 @@ void Seen::reset() {
 
 std::function<HPxGPUDeformer*()> Hooks::create;
 std::function<Status(HPxGPUStandardDeformer&, const HGPUDeformerData&, HDataBlock&)> Hooks::deform;
+std::function<void(const HPxGPUDeformer&)> Hooks::terminate;
 std::function<bool(HStringArray*)> Hooks::validateGraph, Hooks::validateValues;
 std::function<HObject(const HObject&)> Hooks::outputMesh, Hooks::passThroughMesh;
 std::function<void(const HObject&, HObjectArray&)> Hooks::additional;
@@ -138,6 +141,7 @@ bool Hooks::isGeometryFilter = true;
 void Hooks::reset() {
     create = nullptr;
     deform = nullptr;
+    terminate = nullptr;
     validateGraph = validateValues = nullptr;
     outputMesh = passThroughMesh = nullptr;
     additional = nullptr;

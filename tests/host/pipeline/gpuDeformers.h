@@ -30,6 +30,7 @@ struct Hooks {
     static std::function<HPxGPUDeformer*()> create;
     /// Instead of the kernels, in between of what comes before and after.
     static std::function<Status(HPxGPUStandardDeformer&, const HGPUDeformerData&, HDataBlock&)> deform;
+    static std::function<void(const HPxGPUDeformer&)> terminate; ///< beside what it does
     static std::function<bool(HStringArray*)> validateGraph, validateValues;
     static std::function<HObject(const HObject&)> outputMesh, passThroughMesh;
     static std::function<void(const HObject&, HObjectArray&)> additional;

@@ -8,6 +8,7 @@
 #include "openquarn/HSelectionList.h"
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Evaluation.h"
+#include "openquarn_app/Faults.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
@@ -200,6 +201,39 @@ TEST(Unloading, AFailingUninitializeLeavesItLoadedUntilTheSessionEnds) {
     EXPECT_THAT(messages, ElementsAre(HasSubstr("not now"), HasSubstr("not like this")));
     EXPECT_FALSE(isMapped("tinyStays"));
     EXPECT_FALSE(isMapped("tinyThrowsAtEnd"));
+}
+
+TEST_F(Loading, AnUnloadThatFailsHalfWayIsDoneByTheNextOne) {
+    struct Row {
+        const char* failing;
+        const char* without; ///< empty: it is whole
+    };
+    const std::vector<Row> rows = {
+        {"HFnPlugin::deregisterNode", ""},
+        {"HFnPlugin::deregisterData", "node type 'tinyNode'"},
+        {"HFnPlugin::deregisterCommand", "node type 'tinyNode', data type 'tinyNodeData'"},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.failing);
+        const std::string without = row.without;
+        loadPlugin(module("tinyGood"));
+        Faults::fail(row.failing, 1, 2);
+        for (int attempt = 0; attempt < 2; ++attempt) {
+            EXPECT_THAT(errorOf([] { unloadPlugin("tinyGood"); }),
+                        HasSubstr("uninitializePlugin failed, and it stays loaded" +
+                                  (without.empty() ? ": " : " without " + without + ", until")));
+            EXPECT_EQ(hasType("tinyNode"), without.empty());
+            session_.newScene();
+            const std::string loading = errorOf([] { loadPlugin(module("tinyGood")); });
+            EXPECT_EQ(loading.empty(), without.empty()) << loading;
+            EXPECT_THAT(loading, HasSubstr(without.empty() ? "" : "'tinyGood' is half unloaded, without " + without));
+        }
+        Faults::clear();
+        unloadPlugin("tinyGood");
+        expectNothingLeft();
+        EXPECT_FALSE(isMapped("tinyGood"));
+        EXPECT_THAT(messages_, IsEmpty()) << "it has taken back all of it";
+    }
 }
 
 TEST_F(Loading, WhatItLeavesRegisteredIsTakenAwayWithAWarning) {

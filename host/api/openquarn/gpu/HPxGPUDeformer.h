@@ -12,8 +12,9 @@
 #include <memory>
 
 /// Made by HGPUDeformerRegistrationInfo::createGPUDeformer(), one for each geometry of a node that is moved to the
-/// device, and deleted by the host when the geometry leaves it. The host calls one of the three evaluate() functions,
-/// the first: a deformer overrides the one that suits it.
+/// device. When the geometry leaves it (the pipeline is switched off, a frame fails, the device is lost or another one
+/// chosen, the node is deleted, the plug-in takes its GPU deformers back), the host calls terminate() and deletes it.
+/// The host calls one of the three evaluate() functions, the first: a deformer overrides the one that suits it.
 class OPENQUARN_API HPxGPUDeformer {
 public:
     enum DeformerStatus : int {
@@ -48,8 +49,10 @@ public:
     virtual DeformerStatus evaluate(HDataBlock& block, const HEvaluationNode& evaluationNode, const HPlug& outputPlug,
                                     unsigned vertexCount, const HOpenCLBuffer& input, HOpenCLBuffer& output);
 
-    /// Lets go of everything on the device. May be followed by another evaluate(). The base lets go of what is its own.
-    /// [eval]
+    /// Lets go of everything on the device. The host calls it before it deletes the deformer, whose node is then still
+    /// there; others, such as the deformer's own destructor, may call it too, any number of times, and another
+    /// evaluate() may follow, which makes everything anew. What it throws becomes a message. The base lets go of what
+    /// is its own. [eval]
     virtual void terminate();
     /// Whether the host may pass the geometry through without an evaluate() when the envelope is 0. The base: true.
     /// [eval]

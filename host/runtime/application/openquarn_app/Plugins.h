@@ -31,7 +31,7 @@ struct PluginInfo {
 /// which is returned. A plug-in that is loaded from this file already is left as it is: a success.
 /// Throws std::runtime_error, which says what failed in which file, and leaves nothing of the plug-in behind: no such
 /// file, not a library, a symbol missing, built for another version of the H-API, another plug-in of that name,
-/// no session, initializePlugin failed or threw. Thread: main.
+/// no session, initializePlugin failed or threw, the plug-in is half unloaded. Thread: main.
 OPENQUARN_API std::string loadPlugin(const std::string& path);
 
 /// The same for a plug-in that is part of the application. Both functions are called as those of a library are.
@@ -40,7 +40,9 @@ OPENQUARN_API void addPlugin(const std::string& name, PluginEntryPoint initializ
 
 /// Has the plug-in deregister what it offers, and closes its library. What it leaves registered is taken away, with a
 /// warning that names it. Throws std::runtime_error, and leaves the plug-in loaded: no plug-in of that name, nodes or
-/// data of its types exist, one of its functions is running, uninitializePlugin failed or threw. Thread: main.
+/// data of its types exist, one of its functions is running, uninitializePlugin failed or threw. What
+/// uninitializePlugin took back before it failed is gone; the error names it, unloading can be tried again, where
+/// taking it back again counts as done, and loading is refused until then. Thread: main.
 OPENQUARN_API void unloadPlugin(const std::string& name);
 
 /// Names of all that are loaded, in order of loading. Thread: main.
