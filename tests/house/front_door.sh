@@ -48,6 +48,7 @@ run_row 2 "not also 'dev'" nothing build release dev
 run_row 2 "not 'most'" nothing check most
 run_row 2 "not 'long'" nothing fuzz long
 run_row 2 "not 'now'" nothing deps now
+NW_JOBS=many run_row 2 "NW_JOBS is 'many'" nothing build
 run_row 2 "does not know '--sample'" nothing demo --sample 40
 run_row 2 "--epochs needs a value" nothing demo --epochs
 for number in 0 9 1e3 -5 ten 99999999 ''; do
