@@ -224,8 +224,15 @@ def html_worst(report):
     return "<ul>" + "".join(items) + "</ul>"
 
 
+def caption(path):
+    """Of a still, motion.0020.png or offset.0060.png: whose network it shows, and the frame."""
+    name, frame = path.stem.split(".")
+    return f"{'offsets' if name == 'offset' else 'surface deltas'}, principal shapes, frame {int(frame)}"
+
+
 def html_page(folder, report, preview):
-    stills = "".join(f"<p>{embedded(path, path.stem)}</p>" for path in sorted((folder / "pictures").glob("*.png")))
+    stills = "".join(f"<p>{embedded(path, path.stem)}<br><small>{caption(path)}</small></p>"
+                     for path in sorted((folder / "pictures").glob("*.png")))
     losses = "".join(f"<h3>{mode}, {kind}</h3>" + embedded(folder / "data" / "results" / f"{mode}_{kind}" / "loss.png",
                                                           f"loss curves, {mode}, {kind}")
                      for mode, kind in ((row["mode"], row["kind"]) for row in report["rows"]))
