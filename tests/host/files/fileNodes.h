@@ -11,14 +11,12 @@
 namespace fileNodes {
 
 /// Registers "fileNode", of the plug-in "fileNodes", with the session that is open:
-///   yes bool, small short, whole int (3), single float (0.1), real double (0.5), choice enum, unusual double (infinite)
-///   narrow double, limits -10 and 10
-///   word string (""), path string (null, used as file name), matrix matrix, list doubleArray, data fileData, mesh mesh
-///   weights double array, singles float array, words string array, matrices, messages, datas arrays
-///   groups compound array (title string; items double array; spot compound (x, y double))
-///   whole array inputs `weights` can be connected from `copied`, an output double array
-///   state double array and note string, not storable
-///   out double output: real + single + the weights
+///   yes bool, small short, whole int (3), single float (0.1), real double (0.5), choice enum, unusual double
+///   (infinite) narrow double, limits -10 and 10 word string (""), path string (null, used as file name), matrix
+///   matrix, list doubleArray, data fileData, mesh mesh weights double array, singles float array, words string array,
+///   matrices, messages, datas arrays groups compound array (title string; items double array; spot compound (x, y
+///   double)) whole array inputs `weights` can be connected from `copied`, an output double array state double array
+///   and note string, not storable out double output: real + single + the weights
 /// A node that is made while no file is read gets "made" as its word. Its external content is `path`.
 void registerTypes();
 

@@ -25,7 +25,8 @@ public:
     /// one complete event a scope, with its category, colour, thread (numbered from 1) and, in "args", its description
     /// and colour index. Times are microseconds since start(). A recording that is on goes on. Of each thread the first
     /// million scopes are kept; "otherData" counts the ones dropped.
-    /// The file is there as a whole or not at all. Throws std::runtime_error, naming the path, when it cannot be written.
+    /// The file is there as a whole or not at all. Throws std::runtime_error, naming the path, when it cannot be
+    /// written.
     static void writeTrace(const std::filesystem::path& path);
     /// The same into a stream; what goes wrong is in its state.
     static void writeTrace(std::ostream& stream);

@@ -29,9 +29,8 @@ struct FileOutcome {
 /// file is an error, with line and column where it is malformed, and the present scene stays as it is. Everything else
 /// that cannot be understood - node types that are not registered, unknown keys, values that do not fit, connections
 /// with an unknown end - is a warning, is kept, and is written again by saveScene(). So is a number that setAttr would
-/// refuse: not finite, not whole, out of range; one beyond a hard limit becomes the limit, with a warning. Linear in the
-/// size of the file.
-/// Thread: main.
+/// refuse: not finite, not whole, out of range; one beyond a hard limit becomes the limit, with a warning. Linear in
+/// the size of the file. Thread: main.
 OPENQUARN_API FileOutcome openScene(const std::filesystem::path& path);
 
 /// Writes the scene, which makes `path` the current file. The file is replaced as a whole or, on an error, not at all;
