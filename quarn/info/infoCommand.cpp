@@ -185,6 +185,8 @@ void showModel(const Options& options) {
     // in this order: the process apart is a copy of this one while it has one thread
     const FloatTable controls =
         options.controls.empty() ? FloatTable() : readFloatTable(absolutePath(options.controls));
+    if (!options.controls.empty() && controls.columns == 0)
+        throw std::runtime_error(options.controls.string() + " has no numbers in its rows");
     const ModelAnswer answer = readModelApart(absolutePath(options.path), controls);
     const ModelReport& model = answer.model;
     std::cerr << printable(answer.printed);
