@@ -31,6 +31,12 @@ setAttr wave.models[0].modelActive 1
 setAttr ramp.keyValues 0 3e38
 setAttr wave.envelope 10
 file -saveAs huge.json
+setAttr ramp.keyValues 0 1
+setAttr wave.weightList[0].weights[8] 3e38
+file -saveAs heavy.json
+setAttr wave.models[0].modelActive 0
+setAttr wave.modelRoot nowhere
+file -saveAs untrained.json
 EOF
 scene=$work/moving.json
 
@@ -61,6 +67,11 @@ expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
 expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
 expect 1 '' 'no node of type character' bake "$scene" strip.outMesh --frames 1 --order file -o "$work/lost.npy"
 expect 1 '' 'models/other\.nwrp' play "$scene" --frames 1 --model other
+# what is slow on purpose is said before it is waited for
+cp -r "$work/models/wave.nwrp" "$work/slow.nwrp"
+sed -i 's/"smoothingIterations": [0-9]*/"smoothingIterations": 1000/' "$work/slow.nwrp/metadata.json"
+expect 0 'warning: so many smoothing passes' '' info "$work/slow.nwrp"
+
 # a destroyed mesh leaves with an error: by what the scene says, by the network, and by a damaged model
 echo '{"openquarnScene": 1, "nodes": [{"name": "far", "type": "mesh", "values": {"inMesh": {"points":
   [0, 0, 0, 1, 0, 0, 0, 1e300, 0], "counts": [3], "corners": [0, 1, 2]}}}]}' >"$work/far.json"
@@ -70,6 +81,7 @@ for ending in npy obj; do
 done
 expect 1 '' 'frame 1: vertex 2 of far' bake "$work/far.json" far.outMesh --frames 1 -o "$work/lost.npy"
 expect 1 '' 'frame 4: vertex 8 of wave' play "$work/huge.json" --frames 1-11
+expect 1 '' 'frame 2: vertex 8 of wave' play "$work/heavy.json" --frames 2
 expect 1 '' 'frame 4: vertex 8 of wave' bake "$work/huge.json" 'wave.outputGeom[0]' --frames 1-11 -o "$work/lost.npy"
 cp -r "$work/models/wave.nwrp" "$work/models/seven.nwrp"
 sed -i 's/"deltaMode": 1/"deltaMode": 7/' "$work/models/seven.nwrp/metadata.json"
@@ -124,6 +136,7 @@ sed -i 's/"fullCount": 4/"fullCount": 369/' "$work/models/"*/metadata.json
 rm -r "$work/models/two.nwrp"
 
 expect 0 'geometry 0 \(strip\): 369 vertices, 369 affected, 2 controls, model wave On' '' info "$scene"
+expect 0 'Off, not there: training makes nowhere/wave\.nwrp\n$' '' info "$work/untrained.json"
 expect 0 'missing file of lost: .*none\.npy' '' info "$work/lost.json"
 expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\nfits\n' '' \
   info "$work/models/wave.nwrp" --scene "$scene"
