@@ -3,7 +3,7 @@
 
 #include "storage/Descriptor.h"
 
-#include <cstring>
+#include <algorithm>
 #include <locale>
 #include <span>
 
@@ -43,7 +43,7 @@ std::streamsize DescriptorBuffer::xsputn(const char* text, std::streamsize size)
         return 0;
     if (size > epptr() - pptr()) // more than the room holds
         return put(text, static_cast<std::size_t>(size)) ? size : 0;
-    std::memcpy(pptr(), text, static_cast<std::size_t>(size));
+    std::copy_n(text, size, pptr()); // of nothing, also from nowhere
     pbump(static_cast<int>(size));
     return size;
 }
