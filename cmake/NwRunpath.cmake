@@ -1,3 +1,23 @@
+# nw_own_tbb(<variable>): the folder of a oneTBB of our own, for the thread sanitizer, of which CMake takes no notice when
+# it takes over where other packages' libraries lie: it is below the source tree. Empty elsewhere.
+function(nw_own_tbb result)
+  set(folder "")
+  cmake_path(IS_PREFIX PROJECT_SOURCE_DIR "${TBB_DIR}" is_ours)
+  if(is_ours)
+    cmake_path(GET TBB_DIR PARENT_PATH folder) # lib/cmake/TBB
+    cmake_path(GET folder PARENT_PATH folder)
+  endif()
+  set(${result} "${folder}" PARENT_SCOPE)
+endfunction()
+
+# nw_link_runpath(<target>): for one that finds nothing in the build tree: the same RUNPATH there and where it is
+# installed, the folders of other packages' libraries.
+function(nw_link_runpath target)
+  nw_own_tbb(tbb)
+  set_target_properties(${target} PROPERTIES
+    BUILD_WITH_INSTALL_RPATH ON INSTALL_RPATH "${tbb}" INSTALL_RPATH_USE_LINK_PATH ON)
+endfunction()
+
 # nw_runpath(<target> <destination> <installed>...): where a target that is installed in <destination> looks for its
 # libraries: in the build tree where they were built or found, in the installed tree in <installed>, and in both also
 # where libraries of other packages lie. Call it behind install(TARGETS).
@@ -14,11 +34,8 @@ function(nw_runpath target destination)
     cmake_path(GET OnnxRuntime_LIBRARY PARENT_PATH runtime)
     set(built "${runtime}:${built}")
   endif()
-  # a oneTBB of our own, for the thread sanitizer; CMake takes no folder of the source tree by itself
-  cmake_path(IS_PREFIX PROJECT_SOURCE_DIR "${TBB_DIR}" tbb_is_ours)
-  if(tbb_is_ours)
-    cmake_path(GET TBB_DIR PARENT_PATH tbb) # lib/cmake/TBB
-    cmake_path(GET tbb PARENT_PATH tbb)
+  nw_own_tbb(tbb)
+  if(tbb)
     set(built "${tbb}:${built}")
   endif()
 

@@ -4,6 +4,7 @@ include(CMakePackageConfigHelpers)
 set(_openquarn_package_dir "${CMAKE_INSTALL_LIBDIR}/cmake/OpenQuarn")
 
 install(TARGETS OpenQuarn EXPORT OpenQuarnTargets DESTINATION "${CMAKE_INSTALL_LIBDIR}")
+nw_link_runpath(OpenQuarn)
 install(DIRECTORY host/api/openquarn host/runtime/application/openquarn_app
   DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}" FILES_MATCHING PATTERN "*.h")
 

@@ -4,6 +4,7 @@
 #include "storage/Descriptor.h"
 #include "storage/FileError.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdio>
 #include <string>
@@ -52,22 +53,22 @@ std::vector<fs::path> makeFolders(const fs::path& folder, const fs::path& path) 
     for (fs::path at = folder; !at.empty() && ::stat(at.c_str(), &status) != 0 && errno == ENOENT;
          at = at.parent_path())
         missing.push_back(at);
+    std::reverse(missing.begin(), missing.end());
     std::vector<fs::path> made;
-    for (auto at = missing.rbegin(); at != missing.rend(); ++at) {
-        if (::mkdir(at->c_str(), 0777) == 0)
-            made.push_back(*at);
+    for (const fs::path& next : missing) {
+        if (::mkdir(next.c_str(), 0777) == 0)
+            made.push_back(next);
         else if (errno != EEXIST) { // another process may be as far
             const int error = errno;
             removeFolders(made);
-            failToWrite(path, "its folder " + at->string() + " could not be made: " + textOfErrno(error));
+            failToWrite(path, "its folder " + next.string() + " could not be made: " + textOfErrno(error));
         }
     }
     return made;
 }
 
 void removeFolders(const std::vector<fs::path>& made) {
-    for (auto at = made.rbegin(); at != made.rend(); ++at)
-        ::rmdir(at->c_str());
+    std::for_each(made.rbegin(), made.rend(), [](const fs::path& folder) { ::rmdir(folder.c_str()); });
 }
 
 void syncToDisk(const fs::path& path) {
