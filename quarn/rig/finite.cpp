@@ -9,14 +9,15 @@
 namespace rig {
 namespace {
 
-// Infinity and NaN are what has all bits of the exponent. Without a way out of the loop the compiler takes several
-// values at once; a loop that looks for the first one takes them singly, four times as long.
+// Infinity and NaN are what has all bits of the exponent: one more in its lowest place, and it carries into the sign.
+// Without a way out of the loop the compiler takes several values at once; a loop that looks for the first one takes them
+// singly, five times as long.
 bool areFinite(const float* values, std::size_t count) {
-    constexpr std::uint32_t exponent = 0x7F800000;
-    std::uint32_t found = 0;
+    constexpr std::uint32_t exponent = 0x7F800000, lowest = 0x00800000, sign = 0x80000000;
+    std::uint32_t carries = 0;
     for (std::size_t i = 0; i < count; ++i)
-        found |= static_cast<std::uint32_t>((std::bit_cast<std::uint32_t>(values[i]) & exponent) == exponent);
-    return found == 0;
+        carries |= (std::bit_cast<std::uint32_t>(values[i]) & exponent) + lowest;
+    return (carries & sign) == 0;
 }
 
 } // namespace
