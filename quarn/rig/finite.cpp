@@ -10,8 +10,8 @@ namespace rig {
 namespace {
 
 // Infinity and NaN are what has all bits of the exponent: one more in its lowest place, and it carries into the sign.
-// Without a way out of the loop the compiler takes several values at once; a loop that looks for the first one takes them
-// singly, five times as long.
+// Without a way out of the loop the compiler takes several values at once; a loop that looks for the first one takes
+// them singly, five times as long.
 bool areFinite(const float* values, std::size_t count) {
     constexpr std::uint32_t exponent = 0x7F800000, lowest = 0x00800000, sign = 0x80000000;
     std::uint32_t carries = 0;
