@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/transfer.h"
 
+#include "quarn/process/answerBytes.h"
+
 #include <algorithm>
 #include <cmath>
-#include <cstring>
 #include <stdexcept>
 #include <type_traits>
 
@@ -14,99 +15,10 @@ namespace {
     throw std::runtime_error("what the importer made of the file is damaged");
 }
 
-// what has no pointer in it goes as it is in memory
-template <class T>
-constexpr bool isPlain = std::is_trivially_copyable_v<T>;
+} // namespace
 
-class Packer {
-public:
-    template <class T>
-    void operator()(const T& value) {
-        static_assert(isPlain<T>);
-        bytes_.append(reinterpret_cast<const char*>(&value), sizeof value);
-    }
-    void operator()(const std::string& text) {
-        operator()(text.size());
-        bytes_ += text;
-    }
-    template <class T>
-    void operator()(const std::vector<T>& values) {
-        operator()(values.size());
-        if constexpr (isPlain<T>)
-            bytes_.append(reinterpret_cast<const char*>(values.data()), values.size() * sizeof(T));
-        else
-            for (const T& value : values)
-                transfer(*this, value);
-    }
-    std::string take() { return std::move(bytes_); }
+// One list of members for both ways; `Item` is const on the way out. Found by the archive beside their classes.
 
-private:
-    std::string bytes_;
-};
-
-class Unpacker {
-public:
-    explicit Unpacker(std::string_view bytes)
-        : bytes_(bytes) {}
-
-    template <class T>
-    void operator()(T& value) {
-        static_assert(isPlain<T>);
-        copy(&value, sizeof value);
-    }
-    void operator()(std::string& text) {
-        text.resize(count(1));
-        copy(text.data(), text.size());
-    }
-    template <class T>
-    void operator()(std::vector<T>& values) {
-        if constexpr (isPlain<T>) {
-            values.resize(count(sizeof(T)));
-            copy(values.data(), values.size() * sizeof(T));
-        } else {
-            // one by one, as far as there are bytes: each takes at least those of a size
-            const std::size_t size = count(sizeof(std::size_t));
-            values.clear();
-            for (std::size_t i = 0; i < size; ++i)
-                transfer(*this, values.emplace_back());
-        }
-    }
-    bool atEnd() const { return bytes_.empty(); }
-
-private:
-    // of elements that take at least `least` bytes each: never more than there can be
-    std::size_t count(std::size_t least) {
-        std::size_t number = 0;
-        copy(&number, sizeof number);
-        if (number > bytes_.size() / least)
-            refuse();
-        return number;
-    }
-    void copy(void* to, std::size_t size) {
-        if (size > bytes_.size())
-            refuse();
-        if (size > 0)
-            std::memcpy(to, bytes_.data(), size);
-        bytes_.remove_prefix(size);
-    }
-
-    std::string_view bytes_;
-};
-
-// one list of members for both ways; `Item` is const on the way out
-template <class Archive, class T>
-void transfer(Archive& archive, std::vector<T>& values) {
-    archive(values);
-}
-template <class Archive, class T>
-void transfer(Archive& archive, const std::vector<T>& values) {
-    archive(values);
-}
-template <class Archive, class Text>
-requires std::is_same_v<std::remove_const_t<Text>, std::string>
-void transfer(Archive& archive, Text& text) {
-    archive(text);
-}
 template <class Archive, class Item>
 requires std::is_same_v<std::remove_const_t<Item>, Joint>
 void transfer(Archive& archive, Item& joint) {
@@ -155,6 +67,8 @@ void transfer(Archive& archive, Item& character) {
     archive(character.metersPerUnit);
     archive(character.warnings);
 }
+
+namespace {
 
 // --- what Character.h promises of indices ----------------------------------------------------------------------------
 
@@ -215,7 +129,11 @@ std::string packCharacter(const Character& character) {
 Character unpackCharacter(std::string_view bytes) {
     Unpacker unpacker(bytes);
     Character character;
-    transfer(unpacker, character);
+    try {
+        transfer(unpacker, character);
+    } catch (const DamagedAnswer&) {
+        refuse();
+    }
     require(unpacker.atEnd());
     checkIndices(character);
     return character;

@@ -2,103 +2,18 @@
 // A model is read in another process: the runtime was not written for hostile files.
 #include "quarn/console/interrupt.h"
 #include "quarn/info/ModelReport.h"
+#include "quarn/process/answerBytes.h"
 #include "quarn/process/runApart.h"
 
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
-#include <cstring>
 #include <span>
 #include <stdexcept>
-#include <string_view>
-#include <type_traits>
 #include <utility>
 
 namespace quarn {
 namespace {
-
-// Numbers, texts and lists as bytes, between two copies of one program.
-class Packer {
-public:
-    template <class T>
-    void operator()(const T& value) {
-        static_assert(std::is_arithmetic_v<T> || std::is_enum_v<T>);
-        append(&value, sizeof value);
-    }
-    void operator()(const std::string& text) { list(text); }
-    template <class T>
-    void operator()(const std::vector<T>& values) {
-        list(values);
-    }
-    void operator()(const std::vector<std::string>& texts) {
-        operator()(texts.size());
-        for (const std::string& text : texts)
-            operator()(text);
-    }
-    std::string take() { return std::move(bytes_); }
-
-private:
-    template <class List>
-    void list(const List& values) {
-        operator()(values.size());
-        append(values.data(), values.size() * sizeof values[0]);
-    }
-    void append(const void* bytes, std::size_t size) { bytes_.append(static_cast<const char*>(bytes), size); }
-
-    std::string bytes_;
-};
-
-// The other way; trusts nothing, and takes no memory for what is not there.
-class Unpacker {
-public:
-    explicit Unpacker(std::string_view bytes)
-        : bytes_(bytes) {}
-
-    template <class T>
-    void operator()(T& value) {
-        static_assert(std::is_arithmetic_v<T> || std::is_enum_v<T>);
-        copy(&value, sizeof value);
-    }
-    void operator()(bool& value) {
-        char byte = 0;
-        copy(&byte, 1);
-        value = byte != 0;
-    }
-    void operator()(std::string& text) { list(text); }
-    template <class T>
-    void operator()(std::vector<T>& values) {
-        list(values);
-    }
-    void operator()(std::vector<std::string>& texts) {
-        texts.resize(count(sizeof(std::size_t)));
-        for (std::string& text : texts)
-            operator()(text);
-    }
-
-private:
-    template <class List>
-    void list(List& values) {
-        values.resize(count(sizeof values[0]));
-        copy(values.data(), values.size() * sizeof values[0]);
-    }
-    std::size_t count(std::size_t sizeOfEach) {
-        std::size_t number = 0;
-        copy(&number, sizeof number);
-        if (number > bytes_.size() / sizeOfEach)
-            refuse();
-        return number;
-    }
-    void copy(void* to, std::size_t size) {
-        if (size > bytes_.size())
-            refuse();
-        if (size > 0)
-            std::memcpy(to, bytes_.data(), size);
-        bytes_.remove_prefix(size);
-    }
-    [[noreturn]] static void refuse() { throw NoAnswer(NoAnswer::Why::crashed, "crashes"); }
-
-    std::string_view bytes_;
-};
 
 // one list of members for both ways; `Answer` is const on the way out
 template <class Archive, class Answer>
@@ -175,6 +90,8 @@ ModelAnswer readModelApart(const std::filesystem::path& directory, const FloatTa
         Unpacker unpacker(bytes);
         transfer(unpacker, answer);
         check(answer, controls.columns == 0 ? 0 : controls.rows);
+    } catch (const DamagedAnswer&) {
+        throw std::runtime_error(directory.string() + " is damaged: reading it crashes");
     } catch (const NoAnswer& none) {
         throw std::runtime_error(directory.string() + " is damaged: reading it " + none.what());
     } catch (const std::runtime_error&) {
