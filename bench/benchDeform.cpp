@@ -5,7 +5,7 @@
 #include "options.h"
 #include "warpFrame.h"
 
-#include "neuralWarp/deltas.h"
+#include "deformer/deltas.h"
 #include "openquarn_app/Messages.h"
 #include "rig/finite.h"
 

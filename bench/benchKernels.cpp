@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // bench_kernels: every OpenCL kernel on the first device, launched and waited for, beside the library's own code on the
 // same data and beside a kernel that only copies. See Report::legend for the columns.
+#include "deformer/deltas.h"
 #include "harness.h"
 #include "kernelBytes.h"
-#include "kernels/OpenCl.h"
-#include "neuralWarp/deltas.h"
 #include "options.h"
+#include "plugin/kernels/OpenCl.h"
 #include "support/meshZoo.h"
 
 #include "quill/VertexConnections.h"

@@ -2,7 +2,7 @@
 // What the OpenCL device in use gives at the moment, on the host's own queue.
 #pragma once
 
-#include "kernels/OpenCl.h"
+#include "plugin/kernels/OpenCl.h"
 
 #include <cstddef>
 #include <map>

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "warpFrame.h"
 
-#include "neuralWarp/support/modelFolder.h"
 #include "openquarn_app/Evaluation.h"
+#include "plugin/deformer/support/modelFolder.h"
 
 #include <algorithm>
 #include <chrono>

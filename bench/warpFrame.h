@@ -2,8 +2,8 @@
 // A scene with one deformed grid, whose frames are timed.
 #pragma once
 
-#include "neuralWarp/support/warpRig.h"
 #include "openquarn_app/Session.h"
+#include "plugin/deformer/support/warpRig.h"
 #include "support/TemporaryFolder.h"
 
 #include <cstddef>

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rigSceneTarget.h"
 
+#include "entry/registration.h"
 #include "openquarn_app/Plugins.h"
-#include "plugin/registration.h"
 #include "rig/registration.h"
 #include "sceneTarget.h"
 

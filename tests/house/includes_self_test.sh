@@ -10,8 +10,8 @@ failed=0
 try() {
   local verdict=$1 file=$2 line=$3 output status=0
   rm -rf "${tree:?}"/*
-  mkdir -p "$tree"/{geometry/quill,model/nw_model,neuralWarp} "$tree/$(dirname "$file")"
-  touch "$tree/geometry/local.h" "$tree/geometry/quill/val3.h" "$tree/model/nw_model/session.h"
+  mkdir -p "$tree"/{libraries/geometry/quill,libraries/model/nw_model,plugin/deformer} "$tree/$(dirname "$file")"
+  touch "$tree/libraries/geometry/local.h" "$tree/libraries/geometry/quill/val3.h" "$tree/libraries/model/nw_model/session.h"
   printf '// first line\n%s\n' "$line" >"$tree/$file"
   output=$("$here/includes.sh" "$tree" 2>&1) || status=$?
   case $verdict in
@@ -23,30 +23,30 @@ try() {
   failed=1
 }
 
-try allowed geometry/bulk.cpp '#include <vector>'
-try allowed geometry/bulk.cpp '#include "quill/val3.h"'
-try allowed geometry/bulk.cpp '#include "local.h"'
-try allowed geometry/bulk.cpp '#include <oneapi/tbb/parallel_for.h>'
-try allowed geometry/kernel.cpp '#include <immintrin.h>'
-try allowed neuralWarp/node.cpp '#include "nw_model/session.h"'
+try allowed libraries/geometry/bulk.cpp '#include <vector>'
+try allowed libraries/geometry/bulk.cpp '#include "quill/val3.h"'
+try allowed libraries/geometry/bulk.cpp '#include "local.h"'
+try allowed libraries/geometry/bulk.cpp '#include <oneapi/tbb/parallel_for.h>'
+try allowed libraries/geometry/kernel.cpp '#include <immintrin.h>'
+try allowed plugin/deformer/node.cpp '#include "nw_model/session.h"'
 try allowed host/api/openquarn/gpu/HGpu.h '#include <CL/cl.h>'
-try allowed tests/geometry/a.cpp '#include "nw_model/session.h"'
-try allowed geometry/bulk.cpp '// #include <onnxruntime_cxx_api.h>'
+try allowed tests/libraries/geometry/a.cpp '#include "nw_model/session.h"'
+try allowed libraries/geometry/bulk.cpp '// #include <onnxruntime_cxx_api.h>'
 
-try refused geometry/bulk.cpp '#include "nw_model/session.h"'
-try refused geometry/bulk.cpp '  #  include <nw_model/session.h>'
-try refused geometry/bulk.cpp '#include <onnxruntime_cxx_api.h>'
-try refused geometry/bulk.cpp '#include "../model/nw_model/session.h"'
-try refused geometry/bulk.cpp '#include "quill/../../model/nw_model/session.h"'
-try refused geometry/bulk.cpp '#include "missing.h"'
-try refused geometry/bulk.cpp '#include <unistd.h>'
-try refused geometry/bulk.cpp '#include SOME_MACRO'
-try refused geometry/quill/up.h '#include "neuralWarp/node.h"'
-try refused model/ModelSession.cpp '#include "quill/val3.h"'
-try refused model/ModelSession.cpp '#include <emmintrin.h>'
-try refused model/ModelSession.cpp '#include <tbb/parallel_for.h>'
+try refused libraries/geometry/bulk.cpp '#include "nw_model/session.h"'
+try refused libraries/geometry/bulk.cpp '  #  include <nw_model/session.h>'
+try refused libraries/geometry/bulk.cpp '#include <onnxruntime_cxx_api.h>'
+try refused libraries/geometry/bulk.cpp '#include "../model/nw_model/session.h"'
+try refused libraries/geometry/bulk.cpp '#include "quill/../../model/nw_model/session.h"'
+try refused libraries/geometry/bulk.cpp '#include "missing.h"'
+try refused libraries/geometry/bulk.cpp '#include <unistd.h>'
+try refused libraries/geometry/bulk.cpp '#include SOME_MACRO'
+try refused libraries/geometry/quill/up.h '#include "deformer/node.h"'
+try refused libraries/model/ModelSession.cpp '#include "quill/val3.h"'
+try refused libraries/model/ModelSession.cpp '#include <emmintrin.h>'
+try refused libraries/model/ModelSession.cpp '#include <tbb/parallel_for.h>'
 try refused host/api/openquarn/HObject.h '#include <CL/cl.h>'
 try refused host/api/openquarn/HObject.h '#include "gpu/HGpu.h"'
-try refused neuralWarp/node.cpp '#include "runtime/scene.h"'
+try refused plugin/deformer/node.cpp '#include "runtime/scene.h"'
 try no_layer somewhere/else.cpp '#include <vector>'
 exit $failed

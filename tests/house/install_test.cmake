@@ -14,7 +14,7 @@ if(NOT EXISTS "${WORK}/prefix/share/doc/neuralWarp/LICENSE")
 endif()
 file(GLOB installed RELATIVE "${WORK}/prefix/share/OpenQuarn/GPUBuiltInDeformer/kernels"
   "${WORK}/prefix/share/OpenQuarn/GPUBuiltInDeformer/kernels/*")
-file(GLOB kernels RELATIVE "${CMAKE_CURRENT_LIST_DIR}/../../kernels" "${CMAKE_CURRENT_LIST_DIR}/../../kernels/*.cl*")
+file(GLOB kernels RELATIVE "${CMAKE_CURRENT_LIST_DIR}/../../plugin/kernels" "${CMAKE_CURRENT_LIST_DIR}/../../plugin/kernels/*.cl*")
 if(NOT installed STREQUAL kernels)
   message(FATAL_ERROR "kernels installed: ${installed}\nsources of kernels: ${kernels}")
 endif()

@@ -1,9 +1,9 @@
 #!/usr/bin/env bash
-# writers.sh ROOT: files are written by storage/ alone, which knows what must not be replaced. Lists every line of a
+# writers.sh ROOT: files are written by libraries/storage alone, which knows what must not be replaced. Lists every line of a
 # product folder that makes, opens for writing or renames a file by other means. Exit status 1 when there is one.
 set -euo pipefail
 cd "$1"
-folders=(geometry model host messages neuralWarp controls plugin quarn)
+folders=(libraries/geometry libraries/model host plugin quarn)
 # arrays that grow row by row, and a lock, in a folder that nobody reads before it is published; what goes nowhere
 allowed='^quarn/dataset/(RowFile|FolderLock)\.cpp:|"/dev/null"'
 means='std::ofstream|std::fstream|\bfopen|\bO_(CREAT|TRUNC|WRONLY|RDWR)\b|\bmkstemp|\bcreat\(|\brename\(|\brenameat|(fs|filesystem)::(rename|copy)'
@@ -15,7 +15,7 @@ lines=$(grep -rnE --include='*.cpp' --include='*.h' "$means" "${folders[@]}") ||
 found=$(grep -vE "$allowed" <<<"$lines") || [[ -z $found ]]
 [[ -z $found ]] || printf '%s\n' "$found"
 # and the pattern finds what is meant: storage itself, and what is allowed
-for file in storage/TemporaryFile.cpp storage/Folder.cpp quarn/dataset/RowFile.cpp; do
+for file in libraries/storage/TemporaryFile.cpp libraries/storage/Folder.cpp quarn/dataset/RowFile.cpp; do
   grep -qE "$means" "$file" || { printf '%s has nothing to find\n' "$file"; exit 1; }
 done
 [[ -z $found ]]

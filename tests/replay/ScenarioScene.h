@@ -3,9 +3,9 @@
 
 #include "Case.h"
 
-#include "neuralWarp/support/warpRig.h"
 #include "openquarn/HCommandResult.h"
 #include "openquarn_app/Session.h"
+#include "plugin/deformer/support/warpRig.h"
 
 #include <string>
 #include <vector>

@@ -4,13 +4,13 @@
 #include "kinds.h"
 #include "values.h"
 
-#include "controls/controlNodesPlugin.h"
 #include "openquarn/HDGModifier.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HMatrix.h"
 #include "openquarn/HTransformationMatrix.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Session.h"
+#include "plugin/controls/controlNodesPlugin.h"
 
 #include <stdexcept>
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // What is said of models that fit, and of those that do not.
 #include "quarn/info/ModelReport.h"
-#include "neuralWarp/support/modelFolder.h"
+#include "plugin/deformer/support/modelFolder.h"
 #include "quarn/console/printable.h"
 #include "support/TemporaryFolder.h"
 

@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // Which models are looked at before a mesh is delivered, and what is refused.
 #include "quarn/scene/AppliedModels.h"
-#include "neuralWarp/support/modelFolder.h"
-#include "neuralWarp/support/warpRig.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Session.h"
+#include "plugin/deformer/support/modelFolder.h"
+#include "plugin/deformer/support/warpRig.h"
 #include "support/TemporaryFolder.h"
 
 #include <gmock/gmock.h>

@@ -1,0 +1,166 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "deformer/neuralWarpData.h"
+
+#include <algorithm>
+
+namespace neuralWarp {
+namespace {
+
+/// The vertices that a model drives, by its slots.
+quill::IndexMapper slotsOf(const ModelMetadata& metadata) {
+    quill::IndexMapper map;
+    if (metadata.subsetState == SubsetState::Complete)
+        map.setIdentity(metadata.fullCount);
+    else if (metadata.subsetState == SubsetState::Partial)
+        map.set(metadata.affectMap, metadata.fullCount);
+    else
+        map.set({}, metadata.fullCount);
+    return map;
+}
+
+bool sameVertices(const quill::IndexMapper& a, const quill::IndexMapper& b) {
+    if (a.affectCount() != b.affectCount())
+        return false;
+    if (a.isIdentity() && b.isIdentity())
+        return true;
+    for (std::size_t k = 0; k < a.affectCount(); ++k)
+        if (a.toFull(k) != b.toFull(k))
+            return false;
+    return true;
+}
+
+} // namespace
+
+const HTypeId neuralWarpData::id{0x58000972};
+const HString neuralWarpData::typeName("neuralWarpData");
+
+HPxData* neuralWarpData::create() {
+    return new neuralWarpData;
+}
+
+HTypeId neuralWarpData::typeId() const {
+    return id;
+}
+
+HString neuralWarpData::name() const {
+    return typeName;
+}
+
+void neuralWarpData::copy(const HPxData& source) {
+    if (source.typeId() != id || &source == this)
+        return;
+    const auto& other = static_cast<const neuralWarpData&>(source);
+    multiIndex = other.multiIndex;
+    framesTopologyDirty = other.framesTopologyDirty;
+    vertexFrames = other.vertexFrames;
+    indexMapDirty = other.indexMapDirty;
+    componentMap = other.componentMap;
+    connectionsDirty = other.connectionsDirty;
+    vertexConnections = other.vertexConnections;
+    connectionWeights = other.connectionWeights;
+    principalShapes = other.principalShapes;
+    principalShapeCount = other.principalShapeCount;
+    principalVertCount = other.principalVertCount;
+    modelDirectory = other.modelDirectory;
+    modelPathDirty = other.modelPathDirty;
+    modelLoadPending = other.modelLoadPending;
+    metadataDirty = other.metadataDirty;
+    modelValid = other.modelValid;
+    metadata = other.metadata;
+    activeSettings = other.activeSettings;
+    modelSettings = other.modelSettings;
+    exportSettings = other.exportSettings;
+    exportMode = other.exportMode;
+    affectMap = other.affectMap;
+    useAffectMap = other.useAffectMap;
+    affectedVertices = other.affectedVertices;
+    mappedSlotCount = other.mappedSlotCount;
+    directoryState = other.directoryState;
+    session.load(other.session.modelPath(), true);
+    if (isReplaced())
+        setModelPathDirty(true); // the network may be of another model than the rest
+}
+
+void neuralWarpData::markAllDirty() {
+    framesTopologyDirty = true;
+    indexMapDirty = true;
+    connectionsDirty = true;
+    restFramesDirty = true;
+    setModelPathDirty(true);
+}
+
+void neuralWarpData::setModelPathDirty(bool isDirty) {
+    modelPathDirty = isDirty;
+    if (isDirty) {
+        modelLoadPending = true;
+        metadataDirty = true;
+    }
+}
+
+void neuralWarpData::applySettings(const DeltaSettings& requested) {
+    if (requested.deltaMode != activeSettings.deltaMode) {
+        framesTopologyDirty = true;
+        restFramesDirty = true;
+    }
+    if (requested.isSmoothed() != activeSettings.isSmoothed()) {
+        connectionsDirty = true;
+        restFramesDirty = true;
+    }
+    if (requested.smoothingIterations != activeSettings.smoothingIterations)
+        restFramesDirty = true;
+    activeSettings = requested;
+}
+
+void neuralWarpData::setExportMode(bool on) {
+    exportMode = on;
+    applySettings(on ? exportSettings : modelSettings);
+}
+
+void neuralWarpData::releaseUnusedCaches() {
+    if (!activeSettings.isSmoothed() && !vertexConnections.connectionsIndexer().empty()) {
+        vertexConnections = {};
+        connectionWeights = {};
+        bump(connectionsCache);
+    }
+    if (!activeSettings.isSurface() && !vertexFrames.framesPairs().empty()) {
+        vertexFrames = {};
+        restFramesInverse = {};
+        bump(framesCache);
+        bump(restFramesCache);
+    }
+}
+
+bool neuralWarpData::hasDueCaches() const {
+    return indexMapDirty || ((framesTopologyDirty || restFramesDirty) && activeSettings.isSurface()) ||
+           (connectionsDirty && activeSettings.isSmoothed());
+}
+
+bool neuralWarpData::canApplyModel() const {
+    return session.lastResult() == LoadResult::Loaded && session.isLoaded() && modelValid;
+}
+
+void neuralWarpData::buildAffectMap() {
+    affectMap.clear();
+    affectedVertices.clear();
+    mappedSlotCount = 0;
+    bump(affectMapCache);
+    if (!modelValid)
+        return;
+    const quill::IndexMapper slots = slotsOf(metadata);
+    useAffectMap = !sameVertices(slots, componentMap);
+    if (!useAffectMap)
+        return;
+    affectMap.resize(componentMap.affectCount());
+    for (std::size_t k = 0; k < affectMap.size(); ++k) {
+        const std::uint32_t slot = slots.toAffected(componentMap.toFull(k));
+        affectMap[k] = slot;
+        if (slot != quill::missingIndex) {
+            affectedVertices.push_back(static_cast<std::uint32_t>(k));
+            mappedSlotCount = std::max<std::size_t>(mappedSlotCount, std::size_t{slot} + 1);
+        }
+    }
+    if (affectedVertices.empty())
+        affectMap.clear();
+}
+
+} // namespace neuralWarp

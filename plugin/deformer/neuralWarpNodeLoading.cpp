@@ -1,0 +1,258 @@
+// SPDX-License-Identifier: Apache-2.0
+// From the attributes of the node to a loaded model.
+#include "deformer/neuralWarpNode.h"
+#include "deformer/neuralWarpUtils.h"
+#include "messages/displayErrorGated.h"
+#include "messages/guard.h"
+#include "messages/messageText.h"
+#include "messages/sourceUnits.h"
+#include "nw_model/PrincipalShapes.h"
+#include "openquarn/HGlobal.h"
+#include "openquarn/Instrumenter.h"
+
+#include <system_error>
+
+namespace neuralWarp {
+namespace {
+
+namespace fs = std::filesystem;
+
+/// What is at a path. A disk that cannot answer is a failure that names the path and the reason, and not a missing
+/// entry: the user would look for a file that is there.
+struct Entry {
+    explicit Entry(const fs::path& path) {
+        std::error_code error;
+        type = fs::status(path, error).type();
+        if (type == fs::file_type::none)
+            status = {HStatus::kFailure, "'" + path.string() + "' cannot be looked up: " + error.message()};
+    }
+    bool exists() const { return type != fs::file_type::not_found && type != fs::file_type::none; }
+    bool isDirectory() const { return type == fs::file_type::directory; }
+
+    fs::file_type type = fs::file_type::none;
+    HStatus status; ///< a failure when the question could not be answered
+};
+
+HStatus badPath(const HString& path) {
+    raiseMessage<Text::kErrorMlNodeBadModelPath>(displayErrorGated, path);
+    return {HStatus::kFailure, "there is no such model directory"};
+}
+
+HStatus noPath() {
+    raiseMessage<Text::kErrorMlNoModelPath>(displayErrorGated);
+    return {HStatus::kFailure, "modelRoot or modelName is empty"};
+}
+
+/// `name` is one below `models`.
+HString modelNameIn(const HDataHandle& element) {
+    return element.child(neuralWarpNode::modelName).asString();
+}
+
+void showLoadResult(LoadResult result, const fs::path& file) {
+    if (result == LoadResult::Loaded)
+        Instrumenter::with("QUARN.NEURAL_WARP_LOADED_MODEL").instrument();
+    else if (result == LoadResult::NotFound)
+        raiseMessage<Text::kErrorMlNodeBadModelPath>(displayErrorGated, file);
+    else if (result == LoadResult::NotRecognized)
+        raiseMessage<Text::kErrorMlModelNotRecognized>(displayErrorGated);
+}
+
+void clearPrincipalShapes(neuralWarpData& data) {
+    data.principalShapes.clear();
+    data.principalShapeCount = 0;
+    data.principalVertCount = 0;
+    data.bump(neuralWarpData::principalShapesCache);
+}
+
+/// The directory is not the one any more of which the metadata are: nothing is applied, and everything is due again.
+HStatus dueAgain(neuralWarpData& data) {
+    data.modelValid = false;
+    clearPrincipalShapes(data);
+    data.setModelPathDirty(true);
+    return HStatus::kFailure;
+}
+
+/// None when the directory has no such file, or a bad one.
+HStatus loadPrincipalShapes(neuralWarpData& data) {
+    const fs::path file = data.modelDirectory / "principal_shapes.json";
+    const Entry entry(file);
+    std::uint64_t shapes = 0;
+    std::uint64_t vertices = 0;
+    if (entry.exists() && readPrincipalShapesFile(file, data.principalShapes, shapes, vertices)) {
+        data.principalShapeCount = shapes;
+        data.principalVertCount = vertices;
+    }
+    return entry.status;
+}
+
+} // namespace
+
+HStatus neuralWarpNode::resolveModelDirectory(HDataBlock& block, neuralWarpData& data) {
+    if (!data.modelPathDirty)
+        return HStatus::kSuccess;
+    data.modelPathDirty = false;
+    data.metadataDirty = true;
+    data.modelLoadPending = true;
+    data.modelDirectory.clear();
+    data.modelRootPath.clear();
+    data.directoryState.reset();
+    return findModelDirectory(block, data);
+}
+
+HStatus neuralWarpNode::findModelDirectory(HDataBlock& block, neuralWarpData& data) {
+    HStatus status;
+    const HString rootText = block.inputValue(modelRoot, &status).asString();
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    if (rootText.isEmpty())
+        return noPath();
+    const fs::path root(rootText.asStdString());
+    const Entry rootEntry(root);
+    if (rootEntry.status.error())
+        return reported(rootEntry.status, sourceUnit::node);
+    if (!rootEntry.exists())
+        return badPath(rootText);
+    data.modelRootPath = root;
+
+    const HDataHandle element = existingElement(block, models, data.multiIndex, status);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    const HString nameText = modelNameIn(element);
+    if (nameText.isEmpty())
+        return noPath();
+    const fs::path directory = (root / nameText.asStdString()).replace_extension(".nwrp");
+    const Entry entry(directory);
+    if (entry.status.error())
+        return reported(entry.status, sourceUnit::node);
+    if (!entry.isDirectory())
+        return badPath(directory.string());
+    data.modelDirectory = directory;
+    return HStatus::kSuccess;
+}
+
+HStatus neuralWarpNode::loadMetadata(neuralWarpData& data, bool force) {
+    if (!data.metadataDirty && !force)
+        return HStatus::kSuccess;
+    data.metadataDirty = false;
+    data.directoryState.reset();
+    if (data.modelDirectory.empty())
+        return HStatus::kFailure;
+    const fs::path file = data.modelDirectory / "metadata.json";
+    const Entry entry(file);
+    if (entry.status.error())
+        return reported(entry.status, sourceUnit::node);
+    if (!entry.exists())
+        return HStatus::kFailure;
+    const DirectoryState state = DirectoryState::atRest(data.modelDirectory);
+    if (!readMetadataFile(data.metadata, file)) {
+        raiseMessage<Text::kErrorMLMetaLoadFailed>(displayErrorGated, name(), file);
+        return HStatus::kFailure;
+    }
+    data.directoryState = state;
+    data.modelSettings.smoothingIterations = data.metadata.smoothingIterations;
+    data.modelSettings.deltaMode = data.metadata.deltaMode;
+    return HStatus::kSuccess;
+}
+
+HStatus neuralWarpNode::loadModel(neuralWarpData& data, bool force) {
+    if (!data.modelLoadPending && !force)
+        return HStatus::kSuccess;
+    data.modelValid = false;
+    data.modelLoadPending = false;
+    clearPrincipalShapes(data);
+    if (data.modelDirectory.empty())
+        return HStatus::kFailure;
+    if (data.isReplaced())
+        return dueAgain(data);
+    if (const HStatus status = validateModel(data); status.error())
+        return reported(status, sourceUnit::node);
+    HStatus network = loadNetwork(data);
+    if (data.modelLoadPending)
+        return network;
+    const HStatus shapes = loadPrincipalShapes(data);
+    if (data.isReplaced())
+        return dueAgain(data);
+    if (shapes.error()) {
+        data.modelValid = false; // without knowing its shapes, the network's outputs would be taken for deltas
+        return reported(shapes, sourceUnit::node);
+    }
+    return network;
+}
+
+HStatus neuralWarpNode::loadNetwork(neuralWarpData& data) {
+    const fs::path file = data.modelDirectory / "model.onnx";
+    const LoadResult result = data.session.load(file, true);
+    if (data.isReplaced())
+        return dueAgain(data); // whatever came of it
+    showLoadResult(result, file);
+    if (data.session.isLoaded())
+        return HStatus::kSuccess;
+    raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
+    const std::string& reason = data.session.errorText();
+    if (reason.empty())
+        return HStatus::kFailure;
+    return reported({HStatus::kFailure, "'" + file.string() + "' cannot be used: " + reason}, sourceUnit::node);
+}
+
+HStatus neuralWarpNode::loadWholeModel(HDataBlock& block, neuralWarpData& data) {
+    constexpr int attempts = 8; // who writes for longer than they take is not done yet
+    for (int i = 0; i < attempts; ++i) {
+        loadModel(data, false); // a failure shows in canApplyModel()
+        if (!data.modelLoadPending)
+            return HStatus::kSuccess;
+        if (i + 1 == attempts)
+            break;
+        if (!updateModelSettings(block, data))
+            return HStatus::kSuccess;
+        if (const HStatus status = prepareRestState(data, block, data.multiIndex); status.error())
+            return status;
+    }
+    raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
+    reported({HStatus::kFailure, "'" + data.modelDirectory.string() +
+                                     "' was written again and again while it was read: the next evaluation reads it"},
+             sourceUnit::node);
+    return HStatus::kSuccess;
+}
+
+HStatus neuralWarpNode::validateModel(neuralWarpData& data) {
+    data.modelValid = false;
+    HStatus result;
+    const std::size_t fullCount = data.componentMap.fullCount();
+    const std::size_t affectCount = data.componentMap.affectCount();
+    if (data.metadata.fullCount != fullCount) {
+        raiseMessage<Text::kErrorMLMetaFullCountMismatch>(displayErrorGated, name(), data.multiIndex, fullCount,
+                                                          data.metadata.fullCount);
+        result = {HStatus::kFailure, "the model was trained on another number of vertices"};
+    }
+    if (data.metadata.affectCount != affectCount)
+        raiseMessage<Text::kWarnMLMetaAffectCountMismatch>(HGlobal::displayWarning, name(), data.multiIndex,
+                                                           affectCount, data.metadata.affectCount);
+    data.modelValid = !result.error();
+    if (result.error()) {
+        raiseMessage<Text::kErrorMLModelInvalid>(displayErrorGated, data.multiIndex);
+        return result;
+    }
+    data.buildAffectMap();
+    if (data.useAffectMap)
+        raiseMessage<Text::kWarnMLMetaSetup>(HGlobal::displayWarning, name(), data.multiIndex,
+                                             data.affectedVertices.size(), affectCount,
+                                             HString(data.metadata.componentTagExpression));
+    return result;
+}
+
+HStatus neuralWarpNode::describeModel(std::uint32_t multiIndex, HString& text) {
+    return guarded(*this, "describing a model", [&]() -> HStatus {
+        text.clear();
+        HDataBlock block = forceCache();
+        neuralWarpData* data = fetchNodeData(block, multiIndex);
+        if (!data)
+            return HStatus::kFailure;
+        if (const HStatus status = resolveModelDirectory(block, *data); status.error())
+            return reported(status, sourceUnit::node);
+        text = "{'rootPath' : '" + data->modelRootPath.string() + "' ,'modelPath' : '" + data->modelDirectory.string() +
+               "'}";
+        return HStatus::kSuccess;
+    });
+}
+
+} // namespace neuralWarp

@@ -1,0 +1,441 @@
+// SPDX-License-Identifier: Apache-2.0
+// The command: what each combination of flags answers, shows and changes.
+#include "openquarn/HCommandResult.h"
+#include "openquarn/HGlobal.h"
+#include "openquarn_app/Commands.h"
+#include "openquarn_app/Evaluation.h"
+#include "plugin/deformer/support/WarpTest.h"
+#include "plugin/deformer/support/stateText.h"
+
+#include <functional>
+#include <sstream>
+
+namespace {
+
+using ::testing::Contains;
+using ::testing::ElementsAre;
+using ::testing::HasSubstr;
+using ::testing::IsEmpty;
+using Numbers = std::vector<double>;
+using Texts = std::vector<std::string>;
+
+std::string noData(unsigned index) {
+    return "error: [NEURAL WARP] Could not get neural warp data for index " + std::to_string(index);
+}
+std::string noDeltas(unsigned index) {
+    return "error: [NEURAL WARP] Failed to calculate deltas for index " + std::to_string(index) +
+           ". Check your node setup.";
+}
+std::string notANode(const std::string& name) {
+    return "error: [NEURAL WARP] " + name + " is not a valid neural warp node";
+}
+std::string badCode(const std::string& code) {
+    return "error: [NEURAL WARP] Invalid delta type \"" + code + "\" specified";
+}
+const std::string noTarget = "error: [NEURAL WARP] No target geometry has been specified";
+
+Texts withoutReports(Texts messages) {
+    std::erase_if(messages, [](const std::string& text) { return text.starts_with("report: "); });
+    return messages;
+}
+
+HPointArray moved(const HObject& mesh, const HVector& by) {
+    HPointArray points = warpRig::pointsOf(mesh);
+    for (HPoint& point : points)
+        point = point + by;
+    return points;
+}
+
+/// What a plug-in that runs the command gets from the host.
+struct Answer {
+    HStatus::Code status;
+    HCommandResult::Type type;
+    std::string text;
+    Numbers numbers;
+};
+
+Answer run(const std::string& command) {
+    HCommandResult result;
+    const HStatus status = HGlobal::executeCommand(command, result, false, false);
+    HString text;
+    HDoubleArray numbers;
+    if (result.resultType() == HCommandResult::kString)
+        result.getResult(text);
+    else if (result.resultType() == HCommandResult::kDoubleArray)
+        result.getResult(numbers);
+    return {status.statusCode(), result.resultType(), text.asStdString(), Numbers(numbers.begin(), numbers.end())};
+}
+
+Numbers joined(Numbers a, const Numbers& b) {
+    a.insert(a.end(), b.begin(), b.end());
+    return a;
+}
+
+constexpr auto success = HStatus::kSuccess;
+constexpr auto failure = HStatus::kFailure;
+constexpr auto invalid = HStatus::kInvalidParameter;
+
+struct Row {
+    std::string arguments;
+    HStatus::Code status;
+    std::string text; ///< result; no text and no numbers: none
+    Numbers numbers;
+    Texts messages;
+    std::string flags = "---- none ----"; ///< afterwards
+    std::string fault = {};               ///< host call that fails once
+};
+
+/// "warp1" deforms triangles 0 and 4, each with a target of its own; 2 exists as well and was never evaluated.
+class Command : public WarpTest {
+protected:
+    Command() {
+        ModelSpec spec;
+        spec.bias = {0, 0, 1, 0, 0, 1, 0, 0, 1};
+        spec.deltaMode = 0;
+        spec.fullCount = spec.affectCount = 3;
+        writeModel(modelDirectory(), spec);
+        rig.setModelRoot(folder.path());
+        rig.setControls({0});
+        for (const unsigned index : {0U, 2U, 4U}) {
+            rig.addGeometry(index, {.mesh = triangle});
+            rig.setTarget(index, warpRig::withPoints(triangle, moved(triangle, targetOffset(index))));
+            warpRig::connect(rig.output(index),
+                             warpRig::plug(warpRig::meshNode("shape" + std::to_string(index), triangle), "inMesh"));
+        }
+        for (const unsigned index : {0U, 4U})
+            EXPECT_EQ(rig.deform(index), HStatus::kSuccess);
+    }
+
+    static HVector targetOffset(unsigned index) { return HVector(1, index, 0.5); }
+    static Numbers offsets(unsigned index) {
+        const auto y = static_cast<double>(index);
+        return {1, y, 0.5, 1, y, 0.5, 1, y, 0.5};
+    }
+    std::string described(unsigned index) const {
+        return std::to_string(index) + " : {'rootPath' : '" + folder.path().string() + "' ,'modelPath' : '" +
+               modelDirectory().string() + "'}";
+    }
+    /// The flags of a geometry that the command can change, one letter each: what is due, and the export mode.
+    std::string flags(unsigned index) const {
+        const neuralWarp::neuralWarpData* state = rig.state(index);
+        if (!state)
+            return "none";
+        std::string text;
+        text += state->modelPathDirty ? 'p' : '-';
+        text += state->metadataDirty ? 'm' : '-';
+        text += state->modelLoadPending ? 'l' : '-';
+        text += state->exportMode ? 'x' : '-';
+        return text;
+    }
+    std::string flags() const { return flags(0) + ' ' + flags(2) + ' ' + flags(4); }
+    void settle() {
+        run("neuralWarp -exportActive off warp1");
+        for (const unsigned index : {0U, 4U})
+            rig.deform(index);
+        takeMessages();
+        EXPECT_EQ(flags(), "---- none ----");
+    }
+    void check(const std::vector<Row>& rows) {
+        for (const Row& row : rows) {
+            SCOPED_TRACE(row.fault + " neuralWarp " + row.arguments);
+            if (!row.fault.empty())
+                OpenQuarn::Faults::fail(row.fault);
+            const Answer answer = run("neuralWarp " + row.arguments);
+            EXPECT_TRUE(row.fault.empty() || OpenQuarn::Faults::fired(row.fault));
+            OpenQuarn::Faults::clear();
+            EXPECT_EQ(answer.status, row.status);
+            EXPECT_EQ(answer.text, row.text);
+            EXPECT_EQ(answer.numbers, row.numbers);
+            EXPECT_EQ(answer.type == HCommandResult::kInvalid, row.text.empty() && row.numbers.empty());
+            EXPECT_EQ(takeMessages(), row.messages);
+            EXPECT_EQ(flags(), row.flags);
+            settle();
+        }
+    }
+    void disconnectTarget(unsigned index) const {
+        const HPlug target = rig.plug("targetGeometry[" + std::to_string(index) + "]");
+        warpRig::disconnect(target.source(), target);
+    }
+
+    const HObject triangle =
+        warpRig::mesh({.name = "triangle", .polygons = {{0, 1, 2}}, .points = {{0, 0, 0}, {2, 0, 0}, {0, 1, 0}}});
+    warpRig::Rig rig;
+};
+
+TEST_F(Command, AnswersByItsFlags) {
+    rig.plug("export[0].smoothingIterations").setInt(0);
+    rig.plug("export[4].smoothingIterations").setInt(0);
+    check({
+        {"warp1", success, "", {}, {}},
+        {"-dumpInfo warp1", success, "{" + described(0) + ", " + described(4) + "}", {}, {}},
+        {"warp1 -dui -multiIndex 4", success, "{" + described(4) + "}", {}, {}},
+        {"-dui -mi 4 -mi 0 -mi 4 warp1",
+         success,
+         "{" + described(4) + ", " + described(0) + ", " + described(4) + "}",
+         {},
+         {}},
+        {"-dui -mi 2 warp1", success, "{}", {}, {}}, // nothing is known of it yet: left out in silence
+        {"-dui -mi 2147483647 warp1", failure, "", {}, {noData(2147483647)}},
+        {"-dui -mi 2147483648 warp1", failure, "", {}, {noData(2147483648)}},
+        {"-rm -mi 4 -mi 4294967295 warp1", failure, "", {}, {noData(4294967295)}},
+        {"-mi 0 -mi 7 -mi 9 -dumpInfo -rm -exp on -vd POS warp1", failure, "", {}, {noData(7)}},
+        {"-mi 7 warp1", failure, "", {}, {noData(7)}},
+
+        {"-reloadModel warp1", success, "", {}, {noData(2)}, "pml- none pml-"},
+        {"-rm -mi 4 warp1", success, "", {}, {}, "---- none pml-"},
+        {"-rm -mi 2 -mi 0 warp1", success, "", {}, {noData(2)}, "pml- none ----"},
+        {"-rm -mi 0 -mi 2 warp1", failure, "", {}, {noData(2)}, "pml- none ----"},
+        {"-rm -mi 2 -mi 0 -mi 2 warp1", failure, "", {}, {noData(2), noData(2)}, "pml- none ----"},
+        {"-rm -vertexDeltas pos -mi 0 warp1", success, "", {}, {}, "pml- none ----"},
+        {"-rm -vertexDeltas POS -mi 0 warp1", success, "", {}, {}, "pml- none ----"}, // not even looked at
+        {"-rm -dumpInfo -mi 0 warp1", success, "{" + described(0) + "}", {}, {}, "pml- none ----"},
+
+        {"-exportActive on -mi 0 warp1", success, "", {}, {}, "---x none ----"},
+        {"-exp yes -mi 2 -mi 4 warp1", success, "", {}, {}, "---- none ---x"},
+        {"-exp 1 -mi 4 -mi 2 warp1", invalid, "", {}, {}, "---- none ---x"},
+        {"-exp false warp1", success, "", {}, {}},
+        {"-exp on -mi 0 -rm -dumpInfo warp1", success, "{" + described(0) + "}", {}, {}, "pmlx none ----"},
+
+        {"-vertexDeltas dbp -mi 0 warp1", success, "", offsets(0), {}},
+        {"-vd dbp -mi 4 -mi 0 warp1", success, "", joined(offsets(4), offsets(0)), {}},
+        {"-vd dbp -mi 4 -mi 4 warp1", success, "", joined(offsets(4), offsets(4)), {}},
+        {"-vd dbp warp1", success, "", joined(offsets(0), offsets(4)), {noData(2)}},
+        {"-vd dbp -mi 2 -mi 4 warp1", success, "", offsets(4), {noData(2)}},
+        {"-vd dbp -mi 4 -mi 2 warp1", invalid, "", {}, {noData(2)}},
+        {"-vd dbp -dumpInfo -mi 4 warp1", success, "", offsets(4), {}}, // the array takes the place of the text
+        {"-vd dbp -exp on -mi 4 warp1", success, "", offsets(4), {}, "---- none ---x"},
+        {"-vd DBS warp1", failure, "", {}, {badCode("DBS")}},
+        {"-vd dbss warp1", failure, "", {}, {badCode("dbss")}},
+        {"-vd \"\" warp1", failure, "", {}, {badCode("")}},
+        {"-vd 'a \"b' -exp on -mi 0 warp1", failure, "", {}, {badCode("a \"b")}, "---x none ----"},
+    });
+}
+
+TEST_F(Command, IsRefusedByItsSyntax) {
+    const std::vector<std::pair<std::string, std::string>> rows = {
+        {"", "argument 1"},
+        {"warp1 warp2", "warp2"},
+        {"-dumpInfo", "argument 1"},
+        {"-nothing warp1", "-nothing"},
+        {"-query warp1", "-query"},
+        {"-edit -rm warp1", "-edit"},
+        {"-mi warp1", "multiIndex"},
+        {"-mi -1 warp1", "-1"},
+        {"-mi 0.5 warp1", "0.5"},
+        {"-mi 4294967296 warp1", "4294967296"},
+        {"-exp maybe warp1", "maybe"},
+        {"-exp on -exp off warp1", "exportActive"},
+        {"warp1 -vd", "vertexDeltas"},
+        {"-rm -rm warp1", "reloadModel"},
+    };
+    for (const auto& [arguments, wanted] : rows) {
+        const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand("neuralWarp " + arguments);
+        EXPECT_FALSE(outcome.ok) << arguments;
+        EXPECT_THAT(outcome.error, HasSubstr("neuralWarp: ")) << arguments;
+        EXPECT_THAT(outcome.error, HasSubstr(wanted)) << arguments;
+        EXPECT_TRUE(std::holds_alternative<std::monostate>(outcome.result)) << arguments;
+        EXPECT_EQ(flags(), "---- none ----") << arguments;
+    }
+}
+
+TEST_F(Command, NamesWhatIsNoDeformer) {
+    testNodes::create("testSum", "sum1"); // has an object of a plug-in behind it, of another type
+    check({
+        {"-dumpInfo -rm nothing", failure, "", {}, {notANode("nothing")}},
+        {"-dumpInfo -mi 7 time1", failure, "", {}, {notANode("time1")}},
+        {"-vd POS sum1", failure, "", {}, {notANode("sum1")}},
+        {"shape0", failure, "", {}, {notANode("shape0")}},
+        {"'two words'", failure, "", {}, {notANode("two words")}},
+        {"''", failure, "", {}, {notANode("")}},
+    });
+}
+
+TEST_F(Command, DoesNothingForANodeWithoutGeometry) {
+    const warpRig::Rig bare("bare");
+    check({
+        {"bare", success, "", {}, {}},
+        {"-dumpInfo bare", success, "{}", {}, {}},
+        {"-rm -exp on bare", success, "", {}, {}},
+        {"-vd pos bare", success, "", {}, {}},
+        {"-vd nil bare", failure, "", {}, {badCode("nil")}},
+        {"-mi 0 bare", failure, "", {}, {noData(0)}},
+    });
+}
+
+TEST_F(Command, ActsOnHostCallsThatFail) {
+    const std::string untouched = "---- none ----";
+    check({
+        {"-rm warp1", failure, "", {}, {}, untouched, "HArgDatabase::HArgDatabase"},
+        {"-rm warp1", failure, "", {}, {notANode("warp1")}, untouched, "HArgDatabase::getCommandArgument"},
+        {"-rm -mi 0 warp1", success, "", {}, {}, "pml- none ----", "HSelectionList::add"},
+        {"-rm warp1", failure, "", {}, {notANode("warp1")}, untouched, "HSelectionList::getDependNode"},
+        {"-dumpInfo -rm warp1", success, "{}", {}, {}, untouched, "HFnDependencyNode::findPlug"},
+        {"-rm -mi 0 -mi 4 warp1", success, "", {}, {}, "---- none pml-", "HArgParser::getFlagArgumentList"},
+        {"-exp on -mi 0 warp1", failure, "", {}, {}, untouched, "HArgParser::getFlagArgument"},
+        {"-exp on -rm -mi 0 warp1", success, "", {}, {}, "pml- none ----", "HArgParser::getFlagArgument"},
+        {"-vd dbp -mi 0 warp1", failure, "", {}, {}, untouched, "HArgParser::getFlagArgument"},
+    });
+}
+
+TEST_F(Command, EachCodeSelectsItsDeltas) {
+    // the input lies beside the rest geometry, not turned, so that frames carry the target back by the same way
+    const HVector away(0, 0, 3);
+    rig.setInput(0, warpRig::withPoints(triangle, moved(triangle, away)));
+    ASSERT_EQ(rig.deform(0), HStatus::kSuccess);
+    const auto deltas = [](const std::string& code) { return run("neuralWarp -mi 0 -vd " + code + " warp1").numbers; };
+    const HPointArray rest = warpRig::pointsOf(triangle);
+    const HVector offset = targetOffset(0);
+    const Numbers dbs = deltas("dbs"), pos = deltas("pos"), dos = deltas("dos"), dbp = deltas("dbp"),
+                  dop = deltas("dop");
+    for (const Numbers* numbers : {&dbs, &pos, &dos, &dbp, &dop})
+        ASSERT_EQ(numbers->size(), 9U);
+    for (unsigned vertex = 0; vertex < 3; ++vertex)
+        for (unsigned axis = 0; axis < 3; ++axis) {
+            const unsigned i = 3 * vertex + axis;
+            EXPECT_NEAR(dbp[i], offset[axis] - away[axis], 1e-6);
+            EXPECT_NEAR(dop[i], offset[axis], 1e-6);
+            EXPECT_NEAR(dos[i], offset[axis] - away[axis], 1e-5);
+            EXPECT_NEAR(pos[i], rest[vertex][axis] + offset[axis] - away[axis], 1e-5);
+        }
+    // a frame has the vertex as its origin and three unit axes at right angles, so that lengths stay
+    for (unsigned i = 0; i < 9; i += 3)
+        EXPECT_NEAR(HVector(dbs[i], dbs[i + 1], dbs[i + 2]).length(), (offset - away).length(), 1e-5);
+    EXPECT_NE(dbs, dbp);
+}
+
+TEST_F(Command, DeltasThatCannotBeMeasuredNameTheirGeometry) {
+    disconnectTarget(0);
+    const Answer first = run("neuralWarp -vd dbp -mi 0 -mi 4 warp1");
+    EXPECT_EQ(first.status, HStatus::kSuccess);
+    EXPECT_EQ(first.numbers, offsets(4)); // of the second alone
+    EXPECT_THAT(withoutReports(takeMessages()), ElementsAre(noTarget, noDeltas(0)));
+
+    const Answer last = run("neuralWarp -vd dbp -mi 4 -mi 0 warp1");
+    EXPECT_EQ(last.status, HStatus::kFailure);
+    EXPECT_EQ(last.type, HCommandResult::kInvalid);
+    EXPECT_THAT(withoutReports(takeMessages()), ElementsAre(noTarget, noDeltas(0)));
+
+    // a target of fewer vertices has no deltas, which is no failure
+    rig.setTarget(0, warpRig::mesh({.name = "one", .polygons = {}, .points = {{0, 0, 0}}}));
+    const Answer none = run("neuralWarp -vd dbp -mi 0 warp1");
+    EXPECT_EQ(none.status, HStatus::kSuccess);
+    EXPECT_EQ(none.type, HCommandResult::kDoubleArray);
+    EXPECT_THAT(none.numbers, IsEmpty());
+    EXPECT_EQ(run("neuralWarp -vd dbp -mi 0 -mi 4 warp1").numbers, offsets(4));
+}
+
+/// As a host that is in the middle of an edit may leave things: the state is of more vertices than the meshes have.
+TEST_F(Command, DeltasAreNotReadBeyondWhatThereIs) {
+    using State = neuralWarp::neuralWarpData;
+    const auto fourVertices = [](State& state) { state.componentMap.setIdentity(4); };
+    const auto smallRest = [this](State& state) {
+        rig.setRest(0, warpRig::mesh({.name = "edge", .polygons = {}, .points = {{0, 0, 0}, {2, 0, 0}}}));
+        stateText::raise(state, "applied valid");
+    };
+    const struct {
+        const char* code;
+        std::function<void(State&)> spoil;
+        const char* text;
+    } rows[] = {{"dbp", fourVertices, "the input geometry has 0 points for 4 points of the target"},
+                {"dbs", fourVertices, "the input geometry has 0 points for 4 points of the target"},
+                {"dop", fourVertices, "the rest geometry has 0 points for 4 points of the target"},
+                {"pos", fourVertices, "the rest geometry has 0 points for 4 points of the target"},
+                {"dbs", smallRest, "the rest geometry has 0 points for 3 points of the target"}};
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.code);
+        rig.setRest(0, triangle);
+        rig.setTarget(0, warpRig::mesh(makeGrid(1, 1)));
+        ASSERT_EQ(rig.deform(0), HStatus::kSuccess);
+        row.spoil(*rig.state(0));
+        EXPECT_EQ(run(std::string("neuralWarp -mi 0 -vd ") + row.code + " warp1").status, failure);
+        EXPECT_THAT(takeMessages(), Contains(HasSubstr(row.text)));
+        rig.state(0)->markAllDirty();
+    }
+}
+
+TEST_F(Command, DescriptionsThatFailAreLeftOut) {
+    rig.setModelRoot("");
+    const Answer answer = run("neuralWarp -dumpInfo -rm -mi 0 -mi 2 warp1");
+    EXPECT_EQ(answer.status, HStatus::kFailure);
+    const Texts messages = takeMessages();
+    EXPECT_THAT(withoutReports(messages), ElementsAre("error: [NEURAL WARP] No model path specified", noData(2)));
+    EXPECT_THAT(messages, Contains(HasSubstr("neuralWarp/neuralWarpNode")));
+
+    // due once more by the reload; a failure is not tried again, and leaves no paths
+    EXPECT_EQ(run("neuralWarp -dumpInfo -mi 0 warp1").text, "{}");
+    EXPECT_THAT(withoutReports(takeMessages()), ElementsAre("error: [NEURAL WARP] No model path specified"));
+    EXPECT_EQ(run("neuralWarp -dumpInfo -mi 0 warp1").text, "{0 : {'rootPath' : '' ,'modelPath' : ''}}");
+    rig.setModelRoot(folder.path());
+    EXPECT_EQ(run("neuralWarp -dumpInfo -mi 0 warp1").text, "{" + described(0) + "}");
+}
+
+TEST_F(Command, ExportModeLeavesTheGeometryAndTakesTheExportSettings) {
+    const HPointArray deformed = rig.result(0);
+    const HPointArray input = warpRig::pointsOf(triangle);
+    rig.plug("export[0].smoothingIterations").setInt(2);
+    rig.plug("export[0].deltaMode").setShort(1);
+    const auto settings = [this] {
+        const neuralWarp::DeltaSettings& active = rig.state(0)->activeSettings;
+        return std::pair(active.smoothingIterations, active.deltaMode);
+    };
+    EXPECT_EQ(settings(), std::pair(std::int64_t{0}, 0U));
+
+    const Numbers exact = run("neuralWarp -vd dbp -mi 0 warp1").numbers;
+    const Numbers smoothed = run("neuralWarp -exp on -vd dbp -mi 0 warp1").numbers; // the switch comes first
+    EXPECT_EQ(exact, offsets(0));
+    ASSERT_EQ(smoothed.size(), exact.size());
+    EXPECT_NE(smoothed, exact);
+    EXPECT_EQ(settings(), std::pair(std::int64_t{2}, 1U));
+    EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
+    EXPECT_EQ(rig.result(0), input);
+    EXPECT_FALSE(rig.state(0)->modelApplied);
+
+    // an edit is taken over when the mode is switched on, and not before
+    rig.plug("export[0].smoothingIterations").setInt(5);
+    rig.plug("export[0].deltaMode").setShort(0);
+    EXPECT_EQ(settings(), std::pair(std::int64_t{2}, 1U));
+    run("neuralWarp -exp on -mi 0 warp1");
+    EXPECT_EQ(settings(), std::pair(std::int64_t{5}, 0U));
+
+    run("neuralWarp -exp off -mi 0 warp1");
+    EXPECT_EQ(settings(), std::pair(std::int64_t{0}, 0U));
+    EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
+    EXPECT_EQ(rig.result(0), deformed);
+}
+
+TEST_F(Command, ExportModeNeedsTheElementOfTheExportAttributes) {
+    EXPECT_EQ(run("neuralWarp -exp off -mi 4 warp1").status, HStatus::kSuccess);
+    EXPECT_NE(run("neuralWarp -exp on -mi 4 warp1").status, HStatus::kSuccess);
+    EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("neuralWarp/neuralWarpNode")));
+    EXPECT_EQ(flags(4), "----");
+}
+
+TEST_F(Command, ReloadTakesInTheFilesOfOneGeometry) {
+    const HPointArray before = rig.result(0);
+    ModelSpec spec;
+    spec.bias = {0, 0, 2, 0, 0, 2, 0, 0, 2};
+    spec.deltaMode = 0;
+    spec.fullCount = spec.affectCount = 3;
+    writeModel(modelDirectory(), spec);
+    EXPECT_EQ(OpenQuarn::runCommand("neuralWarp -rm -mi 0 warp1; dgdirty warp1").error, "");
+    for (const unsigned index : {0U, 4U})
+        EXPECT_EQ(rig.deform(index), HStatus::kSuccess);
+    EXPECT_DOUBLE_EQ(rig.result(0)[1].z, before[1].z + 1.0);
+    EXPECT_DOUBLE_EQ(rig.result(4)[1].z, before[1].z);
+    EXPECT_EQ(flags(), "---- none ----");
+}
+
+TEST_F(Command, ScriptsGetTheSameAnswers) {
+    std::ostringstream printed;
+    const OpenQuarn::CommandOutcome outcome = OpenQuarn::runScript(
+        "neuralWarp -dui \\\n  -mi 0 warp1; neuralWarp -rm -mi 0 warp1\n"
+        "neuralWarp -vd dbp -mi 4 -mi 0 \"warp1\" # two arrays\n"
+        "neuralWarp -vd Dbp warp1\nneuralWarp -exp on -mi 0 warp1",
+        "deltas.txt", [&](const auto& result) { printed << OpenQuarn::printedValue(result) << '\n'; });
+    EXPECT_EQ(printed.str(), "{" + described(0) + "}\n1 4 0.5 1 4 0.5 1 4 0.5 1 0 0.5 1 0 0.5 1 0 0.5\n");
+    EXPECT_THAT(outcome.error, HasSubstr("deltas.txt, line 4: neuralWarp: "));
+    EXPECT_THAT(takeMessages(), ElementsAre("error: [NEURAL WARP] Invalid delta type \"Dbp\" specified"));
+    EXPECT_EQ(flags(0), "pml-"); // the script ended before its last line
+}
+
+} // namespace

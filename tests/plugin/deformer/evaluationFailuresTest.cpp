@@ -1,0 +1,442 @@
+// SPDX-License-Identifier: Apache-2.0
+// Everything that can go wrong in an evaluation: what is said, what it answers, and that the geometry is then either as
+// it came, to the last bit, or as it should be.
+#include "plugin/deformer/support/FailureTest.h"
+
+#include "host/support/testNodes.h"
+#include "openquarn/HDGModifier.h"
+#include "openquarn_app/Interrupt.h"
+
+#include <functional>
+#include <limits>
+
+namespace {
+
+using OpenQuarn::Faults;
+using testing::IsEmpty;
+
+class EvaluationFailures : public FailureTest {
+public:
+    void remove(const char* element) const {
+        HDGModifier modifier;
+        modifier.removeMultiInstance(rig->plug(element), true);
+        EXPECT_EQ(modifier.doIt(), HStatus::kSuccess);
+    }
+
+    /// Messages of the deformer: the host adds one of its own to each failing evaluation.
+    Texts said() {
+        Texts texts = shown();
+        texts.erase(std::remove_if(texts.begin(), texts.end(),
+                                   [](const std::string& text) {
+                                       return text.rfind("report: 'warp1.outputGeom[0]' could not be computed", 0) == 0;
+                                   }),
+                    texts.end());
+        return texts;
+    }
+};
+
+std::string onDemand(const std::string& operation) {
+    return operation + ": failed on demand";
+}
+
+TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
+    using T = EvaluationFailures;
+    const std::string restInvalid = "error: [NEURAL WARP] Original geometry is not a valid mesh";
+    const std::string targetInvalid = "error: [NEURAL WARP] Target geometry is not a valid mesh";
+    const std::string noDeltas = "error: [NEURAL WARP] No delta computed from the ML model";
+    const Texts notFinite{noDeltas, report("the model gave no values: a control value is not finite")};
+    const auto fault = [](const char* operation) { return [=](T&) { Faults::fail(operation); }; };
+    const auto controls = [](const std::vector<double>& values) { return [=](T& t) { t.rig->setControls(values); }; };
+    const auto removed = [](const char* element) { return [=](T& t) { t.remove(element); }; };
+    const auto rest = [](HObject mesh) { return [=](T& t) { t.rig->setRest(0, mesh); }; };
+    const auto morphOn = [](T& t) { t.rig->plug("targetMorphEnabled").setBool(true); };
+    const auto smallMorph = [&](T& t) {
+        morphOn(t);
+        t.rig->setMorphTarget(0, unevenMesh(2, 1));
+    };
+    const auto noMorphMesh = [&](T& t) {
+        smallMorph(t);
+        warpRig::setMesh(t.rig->plug("targetMorphGeometry[0]").source().node(), {});
+    };
+    const auto model = [](std::size_t outputs, std::size_t shapes = 0, std::size_t shapeSize = 27) {
+        return [=](T& t) {
+            t.writeChanged([&](ModelSpec& spec) {
+                spec.bias.resize(outputs);
+                spec.shapes.assign(shapes, std::vector<float>(shapeSize, 1.0F));
+            });
+            nodeOf(*t.rig).requestReload(0);
+        };
+    };
+    const auto tooFew = [](const std::string& has) {
+        return Texts{"error: [NEURAL WARP] Size of predicted deltas (" + has +
+                         ") does not match affected vertex count (9)",
+                     report("the model gives " + has + " deltas where 9 are needed")};
+    };
+    const auto noElement = [](const char* array) {
+        return report(std::string("'warp1.") + array + "' has no element 0");
+    };
+    const std::string targetMismatch =
+        "error: [NEURAL WARP] Size of target geometry (0) does not match deforming geometry (9)";
+    const std::string controlMismatch = "error: [NEURAL WARP] Size of the ML model inputs (1) does not match the "
+                                        "connected control attributes count(0).";
+    const std::string fewControls = report("the model has more inputs than there are control values");
+    const std::string noArray = "HDataBlock::inputArrayValue";
+    const std::string noArrayReport = report(onDemand(noArray));
+    struct Row {
+        const char* name;
+        std::function<void(T&)> spoil; ///< after a first evaluation that went well
+        Texts messages;
+    };
+    const Row rows[] = {
+        {"no element of models", removed("models[0]"), {}},
+        {"envelope", fault("HDataBlock::inputValue"), {report(onDemand("HDataBlock::inputValue"))}},
+        {"no state", fault("HArrayDataHandle::outputValue"), {}},
+        {"rest without a mesh", rest({}), {restInvalid}},
+        {"rest too small", rest(unevenMesh(2, 1)), {restInvalid}},
+        {"no rest", removed("originalGeometry[0]"), {noElement("originalGeometry")}},
+        {"morph without an element", morphOn, {targetInvalid, noElement("targetMorphGeometry")}},
+        {"morph without a mesh", noMorphMesh, {targetInvalid, report("the target of the morph is no mesh")}},
+        {"morph too small",
+         smallMorph,
+         {targetMismatch, report("the target of the morph has fewer vertices than the geometry")}},
+        {"no controls", controls({}), {controlMismatch, fewControls, fewControls}},
+        {"control values",
+         fault("HDataBlock::inputArrayValue"),
+         {report(onDemand(noArray), "neuralWarp/neuralWarpUtils"), noArrayReport, noArrayReport}},
+        {"no number", controls({std::numeric_limits<double>::quiet_NaN()}), notFinite},
+        {"infinite as a float", controls({1e300}), notFinite},
+        {"too few outputs", model(26), tooFew("8")},
+        {"no whole delta", model(2), tooFew("0")},
+        {"too few coefficients",
+         model(1, 2),
+         {noDeltas, report("the model gives 1 coefficients for 2 principal shapes")}},
+        {"too small a basis", model(1, 1, 24), tooFew("8")},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        writeModel(modelDirectory(), modelSpec());
+        makeRig();
+        ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+        row.spoil(*this);
+        const HPlug output = rig->output(0);
+        OpenQuarn::makeDirty(output);
+        EXPECT_NE(OpenQuarn::evaluate(output), HStatus::kSuccess);
+        Faults::clear();
+        EXPECT_EQ(said(), row.messages);
+        EXPECT_EQ(result(*rig), came());
+    }
+}
+
+TEST_F(EvaluationFailures, LongWorkEndsWhenTheUserAsksForIt) {
+    writeChanged([](ModelSpec& spec) { spec.smoothingIterations = 4000000000U; });
+    makeRig();
+    OpenQuarn::setInterrupted(true);
+    EXPECT_EQ(rig->deform(0), HStatus::kFailure);
+    EXPECT_THAT(said().front(), "warning: 'warp1' smooths geometry 0 in 4000000000 passes, as its model says, in each "
+                                "frame: up to 12252 s");
+    EXPECT_EQ(result(*rig), came());
+    EXPECT_THAT(stateText::raised(*rig->state(0)), testing::HasSubstr("restFrames"));
+    OpenQuarn::setInterrupted(false);
+    writeModel(modelDirectory(), modelSpec());
+    nodeOf(*rig).requestReload(0);
+    EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(stateText::raised(*rig->state(0)), "applied valid");
+}
+
+// --- evaluations that go on without the model, or with a part of it ---
+
+/// p + f * (c - p), with c in single precision.
+EvaluationFailures::Coordinates blended(const EvaluationFailures::Coordinates& from,
+                                        const EvaluationFailures::Coordinates& to, float f) {
+    EvaluationFailures::Coordinates points = from;
+    for (std::size_t i = 0; i < points.size(); ++i)
+        for (std::size_t axis = 0; axis < 3; ++axis) {
+            const auto c = static_cast<float>(to[i][axis]);
+            points[i][axis] += (static_cast<double>(c) - points[i][axis]) * static_cast<double>(f);
+        }
+    return points;
+}
+
+/// c + (t - c) * w, in single precision.
+EvaluationFailures::Coordinates morphed(EvaluationFailures::Coordinates from,
+                                        const EvaluationFailures::Coordinates& target, float w) {
+    for (std::size_t i = 0; i < from.size(); ++i)
+        for (std::size_t axis = 0; axis < 3; ++axis) {
+            const auto c = static_cast<float>(from[i][axis]);
+            const auto t = static_cast<float>(target[i][axis]);
+            from[i][axis] = static_cast<double>(c + (t - c) * w);
+        }
+    return from;
+}
+
+TEST_F(EvaluationFailures, AModelThatDrivesNothingGivesWayOneEvaluationLater) {
+    writeModel(modelDirectory(), modelSpec());
+    makeRig();
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    const Coordinates moved = result(*rig);
+    writeChanged([](ModelSpec& spec) {
+        spec.subsetState = "partial";
+        spec.affectMap = {42};
+    });
+    makeRig();
+    const auto expect = [&](const Coordinates& points, const char* flags) {
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig), points);
+        EXPECT_EQ(stateText::raised(*rig->state(0)), flags);
+    };
+    expect(rounded(), "valid affectMap");
+    EXPECT_EQ(said(), Texts{"warning: [NEURAL WARP \"warp1\", multiIndex 0] Setup for multiIndex 0 not the same as for "
+                            "trained model. Using deltas on 0 of 9 affected verts. Trained model subset is \"*\""});
+    expect(rounded(), "valid affectMap");
+    writeModel(modelDirectory(), modelSpec());
+    nodeOf(*rig).requestReload(0);
+    expect(came(), "load valid affectMap");
+    expect(moved, "applied valid");
+}
+
+TEST_F(EvaluationFailures, MorphAndEnvelopeDecideWhatIsLeftOfTheModel) {
+    writeModel(modelDirectory(), modelSpec());
+    makeRig();
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    const Coordinates moved = result(*rig);
+    HPointArray targetPoints = warpRig::pointsOf(unevenMesh());
+    for (HPoint& p : targetPoints)
+        p = {p.y * 3, p.z + p.x, 0.1 - p.x};
+    const HObject target = warpRig::withPoints(unevenMesh(), targetPoints);
+    const Coordinates targetShape = coordinates(targetPoints);
+    const Coordinates origin(9);
+
+    using T = EvaluationFailures;
+    const auto envelope = [](float value) { return [=](T& t) { t.rig->plug("envelope").setFloat(value); }; };
+    const auto morph = [&](double value) {
+        return [=](T& t) {
+            t.rig->setMorphTarget(0, target);
+            t.rig->plug("targetMorphEnabled").setBool(true);
+            t.rig->plug("targetMorphEnvelope").setDouble(value);
+        };
+    };
+    const auto connectedMorph = [&](double value) { // which no limit holds
+        return [=](T& t) {
+            morph(1.0)(t);
+            testNodes::create("testCase", "key");
+            testNodes::plug("key.in").setDouble(value);
+            testNodes::connect("key.out", "warp1.targetMorphEnvelope");
+        };
+    };
+    const auto both = [](auto one, auto other) {
+        return [=](T& t) {
+            one(t);
+            other(t);
+        };
+    };
+    const auto off = [](T& t) { t.rig->plug("models[0].modelActive").setShort(0); };
+    const auto otherMode = [](T& t) { t.writeChanged([](ModelSpec& spec) { spec.deltaMode = 2; }); };
+    const auto badRoot = [](T& t) { t.rig->setModelRoot(t.folder.path() / "missing"); };
+    const auto smallMorph = [](T& t) {
+        t.rig->setMorphTarget(0, unevenMesh(1, 1));
+        t.rig->plug("targetMorphEnabled").setBool(true);
+        t.rig->plug("targetMorphEnvelope").setDouble(0.9e-6);
+    };
+    const Texts badPath{"error: [NEURAL WARP] Unable to access the ML model file at ROOT/missing"};
+    const std::string untouched = "topology indexMap connections restFrames load metadata path";
+    struct Row {
+        const char* name;
+        std::function<void(T&)> set; ///< before the first evaluation
+        Coordinates points;
+        std::string flags;
+        Texts messages = {};
+    };
+    const Row rows[] = {
+        {"envelope 0 touches no file", both(badRoot, envelope(0.0F)), came(), untouched},
+        {"envelope -0", both(badRoot, envelope(-0.0F)), came(), untouched},
+        {"half", envelope(0.5F), blended(came(), moved, 0.5F), "applied valid"},
+        {"no number as envelope", both(off, envelope(std::numeric_limits<float>::quiet_NaN())), came(),
+         "load metadata path"},
+        {"a delta mode that is none", otherMode, blended(came(), origin, 1.0F),
+         "topology connections restFrames applied valid"},
+        {"morph below what counts", morph(0.5e-6), moved, "applied valid"},
+        {"and its target is not looked at", smallMorph, moved, "applied valid"},
+        {"a quarter of the morph", morph(0.25), blended(came(), morphed(moved, targetShape, 0.25F), 1.0F),
+         "applied valid"},
+        {"and half the envelope", both(morph(0.25), envelope(0.5F)),
+         blended(came(), morphed(moved, targetShape, 0.25F), 0.5F), "applied valid"},
+        {"a morph the other way", connectedMorph(-0.5), blended(came(), morphed(moved, targetShape, -0.5F), 1.0F),
+         "applied valid"},
+        {"all of the morph leaves the model unloaded", morph(1.0),
+         blended(came(), morphed(came(), targetShape, 1.0F), 1.0F), "load"},
+        {"morph without the model", both(off, morph(0.25)), blended(came(), morphed(came(), targetShape, 0.25F), 1.0F),
+         "load metadata path"},
+        {"morph when there is no model", both(badRoot, morph(0.25)),
+         blended(came(), morphed(came(), targetShape, 0.25F), 1.0F), "load metadata", badPath},
+        {"model off", off, came(), "load metadata path"},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        writeModel(modelDirectory(), modelSpec());
+        makeRig();
+        row.set(*this);
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig), row.points);
+        EXPECT_EQ(stateText::raised(*rig->state(0)), row.flags);
+        EXPECT_EQ(said(), row.messages);
+    }
+    // and while training data is exported, the geometry stays as it is
+    makeRig();
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    rig->plug("export[0].deltaMode").setShort(0);
+    ASSERT_EQ(nodeOf(*rig).setExportActive(0, true), HStatus::kSuccess);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(result(*rig), came());
+    EXPECT_EQ(stateText::raised(*rig->state(0)), "topology restFrames export valid");
+    ASSERT_EQ(nodeOf(*rig).setExportActive(0, false), HStatus::kSuccess);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    EXPECT_EQ(result(*rig), moved);
+}
+
+// --- every call of the host that an evaluation makes ---
+
+class EveryHostCall : public EvaluationFailures {
+public:
+    /// Everything that an evaluation can do: frames, smoothing, shapes, an affect map, weights and a morph.
+    void makeFullRig(bool isMorphed, bool isOn = true) {
+        session.newScene();
+        rig.emplace();
+        rig->addGeometry(0, {.mesh = unevenMesh(),
+                             .affected = std::vector<unsigned>{7, 1, 4, 0, 3},
+                             .weights = {0.25F, 0.5F, 0.75F, 1.0F, 0.9F, 0.8F, 0.7F, 0.6F, 0.5F},
+                             .modelOn = isOn});
+        rig->setModelRoot(folder.path());
+        rig->setControls({0.5, -1.0, 2.0});
+        HPointArray points = warpRig::pointsOf(unevenMesh());
+        for (HPoint& p : points)
+            p = {p.y, p.z, p.x};
+        rig->setMorphTarget(0, warpRig::withPoints(unevenMesh(), points));
+        rig->plug("targetMorphEnabled").setBool(isMorphed);
+        rig->plug("targetMorphEnvelope").setDouble(0.5);
+        for (const char* into : {"input[0].inputGeometry", "originalGeometry[0]", "targetMorphGeometry[0]"})
+            OpenQuarn::evaluate(rig->plug(into).source()); // calls of other nodes are not looked at
+    }
+    void writeFullModel() const {
+        writeChanged([](ModelSpec& spec) {
+            spec.controls = 2;
+            spec.affectCount = 5;
+            spec.smoothingIterations = 2;
+            spec.subsetState = "partial";
+            spec.affectMap = {0, 1, 2, 3, 4};
+            spec.shapes = {spec.bias, spec.bias};
+            spec.shapes[1][4] = 9.0F;
+            spec.bias = {0.25F, 0.5F};
+        });
+    }
+    Coordinates evaluated() {
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        takeMessages();
+        return result(*rig);
+    }
+    /// One evaluation in which one call fails. False when there is no such call.
+    bool expectCall(const std::string& operation, int call, bool isFirst);
+
+    Coordinates right, withoutModel;
+};
+
+bool EveryHostCall::expectCall(const std::string& operation, int call, bool isFirst) {
+    const HPlug output = rig->output(0);
+    if (!isFirst) {
+        EXPECT_EQ(evaluated(), right);
+        nodeOf(*rig).requestReload(0);
+    }
+    OpenQuarn::makeDirty(output);
+    Faults::fail(operation, call);
+    const HStatus status = OpenQuarn::evaluate(output);
+    const bool isReached = Faults::fired(operation);
+    Faults::clear();
+    const Texts messages = takeMessages();
+    if (!isReached)
+        return false;
+
+    const Coordinates points = result(*rig);
+    neuralWarp::neuralWarpData* state = rig->state(0);
+    const bool isApplied = state && state->modelApplied;
+    // a polygon that the host does not give is left out
+    const bool dropsPolygon = operation == "HFnMesh::getPolygonVertices" || operation == "HArray::assign";
+    if (status.error() || !isApplied) {
+        EXPECT_THAT(messages, testing::Not(IsEmpty()));
+        EXPECT_TRUE(points == came() || (!status.error() && points == withoutModel));
+    } else if (!dropsPolygon) {
+        EXPECT_EQ(points, right);
+    }
+    if (state && dropsPolygon)
+        state->markAllDirty();
+    else if (!status.error() && !isApplied) // it is the loader that failed, and it is not tried again
+        nodeOf(*rig).requestReload(0);
+    EXPECT_EQ(evaluated(), right);
+    return true;
+}
+
+// Attributes are looked up once in a process: it takes one of its own to see this fail.
+TEST_F(EveryHostCall, AnAttributeThatWasNotFoundIsLookedUpAgain) {
+    writeFullModel();
+    makeFullRig(false);
+    const HPlug output = rig->output(0);
+    for (int attempt = 0; attempt < 3; ++attempt) {
+        OpenQuarn::makeDirty(output);
+        Faults::fail("HNodeClass::attribute");
+        const HStatus status = OpenQuarn::evaluate(output);
+        EXPECT_EQ(status.error(), Faults::fired("HNodeClass::attribute"));
+        Faults::clear();
+        if (status.error()) {
+            EXPECT_EQ(result(*rig), came());
+        }
+        takeMessages();
+        rig->state(0)->markAllDirty();
+        EXPECT_NE(evaluated(), came());
+    }
+}
+
+TEST_F(EveryHostCall, MayFailWithoutHarm) {
+    writeFullModel();
+    std::vector<std::string> reached;
+    for (const bool isMorphed : {false, true}) {
+        makeFullRig(isMorphed, false);
+        withoutModel = evaluated();
+        makeFullRig(isMorphed);
+        right = evaluated();
+        ASSERT_TRUE(rig->state(0)->modelApplied);
+        ASSERT_NE(right, withoutModel);
+        for (const std::string& operation : Faults::operations())
+            for (const bool isFirst : {true, false})
+                for (int call = 1; call < 500; ++call) {
+                    SCOPED_TRACE(operation + ", call " + std::to_string(call) + (isFirst ? "" : " of a reload"));
+                    makeFullRig(isMorphed);
+                    if (!expectCall(operation, call, isFirst))
+                        break;
+                    if (call == 1)
+                        reached.push_back(operation);
+                }
+    }
+    EXPECT_THAT(reached, testing::IsSupersetOf({"HDataBlock::inputValue",
+                                                "HDataBlock::inputArrayValue",
+                                                "HDataBlock::outputArrayValue",
+                                                "HArrayDataHandle::jumpToElement",
+                                                "HArrayDataHandle::jumpToArrayElement",
+                                                "HArrayDataHandle::inputValue",
+                                                "HArrayDataHandle::outputValue",
+                                                "HArrayDataHandle::next",
+                                                "HArrayDataHandle::builder",
+                                                "HArrayDataBuilder::addElement",
+                                                "HArrayDataHandle::set",
+                                                "HFnPluginData::create",
+                                                "HDataHandle::set",
+                                                "HFnMesh::numPolygons",
+                                                "HFnMesh::numVertices",
+                                                "HFnMesh::getPolygonVertices",
+                                                "HItGeometry::HItGeometry",
+                                                "HItGeometry::rawPositions",
+                                                "HItGeometry::allPositions",
+                                                "HItGeometry::setAllPositions",
+                                                "HPxGeometryFilter::indexMapper",
+                                                "HPxDeformerNode::envelopeWeights",
+                                                "HFnBase::setObject"}));
+}
+
+} // namespace
