@@ -53,7 +53,40 @@ FAULT_POINT(HThing, other, eval)
 FAULT_POINT(HPxThing, help, main)
 FAULT_POINT(HBare, open)
 TABLE
-  echo 'unsigned HThing::width() const { isRefused(ThreadTag::main, "HThing::width"); }' >"$tree/host/runtime/HThing.cpp"
+  cat >"$tree/host/runtime/HThing.cpp" <<'SOURCE'
+namespace {
+
+HStatus changed(int first) {
+    return apiCall(FaultPoint::HThing_change, [&] { return HStatus(first); });
+}
+
+} // namespace
+
+unsigned HThing::width() const { isRefused(ThreadTag::main, "HThing::width"); }
+
+HStatus HThing::change(int first, int second) {
+    return changed(first + second);
+}
+HStatus HThing::change() {
+    return change(1, 2);
+}
+
+int HThing::value(HStatus* status) const {
+    return apiValue(FaultPoint::HThing_value, status, 0, [&](HStatus&) { return 1; });
+}
+
+int HThing::other(HStatus& status) const {
+    return apiValue(FaultPoint::HThing_other, &status, 0, [&](HStatus&) { return 2; });
+}
+
+HStatus HPxThing::help() const {
+    return OpenQuarn::apiCall(OpenQuarn::FaultPoint::HPxThing_help, [] { return HStatus(); });
+}
+
+HStatus HBare::open() noexcept {
+    return apiCall(FaultPoint::HBare_open, [] { return HStatus(); });
+}
+SOURCE
 }
 
 # plant TEXT_OF_THE_VERDICT FILE SED_SCRIPT; no text: nothing is wrong
@@ -86,5 +119,12 @@ plant 'HThing::change is [main], and its fault point says [any]' $table 's/, mai
 plant 'HThing::value is [main], and its fault point says [eval]' $header 's/eval/main/'
 plant 'HThing::width is [main] and does not check it' runtime/HThing.cpp 's/width"/length"/'
 plant 'HThing::width is [eval] and does not check it' $header 's/width() const; .*/width() const; \/\/\/< [eval]/'
+source=runtime/HThing.cpp
+plant 'HThing::value fails under the name of HThing::other' $source 's/HThing_value/HThing_other/'
+plant 'HThing::change fails under the name of HThing::value' $source 's/HThing_change/HThing_value/'
+plant 'HThing::change does not go through its fault point' $source 's/return change(1, 2)/return {}/'
+plant 'HBare::open has a fault point that nothing goes through' $source 's/apiCall(FaultPoint::HBare_open, .*/HStatus();/'
+plant 'HThing::value loses the status' $source 's/HThing_value, status/HThing_value, nullptr/'
+plant 'HPxThing::help loses the status' $source 's/return OpenQuarn::apiCall/OpenQuarn::apiCall/'
 plant 'HBare::open has no thread tag' api/openquarn/gpu/HBare.h 's/\[any\]//'
 exit $failed

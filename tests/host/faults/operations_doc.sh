@@ -1,8 +1,8 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
 # operations_doc.sh ROOT: writes ROOT/docs/host-operations.md, the list of all operations of the host that can fail, from
-# the headers, the tables of fault points and the rows of their tests. With --check first, only says whether the file is
-# what would be written; exit status 1 when it is not. Fails, too, for an operation that no row exercises.
+# the headers and the tables of fault points. With --check first, only says whether the file is what would be written;
+# exit status 1 when it is not.
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
 check=
@@ -16,8 +16,7 @@ scratch=$(mktemp -d)
 trap 'rm -rf "$scratch"' EXIT
 
 find host/api/openquarn -name '*.h' -print0 | sort -z | xargs -0 awk -f "$here/operations.awk" >"$scratch/functions"
-grep -oE '"H?\w+::~?\w+"' tests/host/faults/*Rows.cpp | sed -E 's|^(.*):"(.*)"$|\2\t\1|' >"$scratch/rows"
-for table in host/runtime/faults/*.def; do
+for table in $(find host/runtime -name '*.def'); do
   sed -nE "s|^FAULT_POINT\((\w+), (\w+).*|$(basename "$table" .def)\t\1::\2|p" "$table"
 done | sort >"$scratch/points"
 
@@ -29,45 +28,29 @@ awk -F '\t' '
           tag[name] = $4
       }
   }
-  FILENAME ~ /rows$/ { row[$1] = $2 }
   FILENAME ~ /points$/ {
       if ($1 != family) {
           family = $1
-          printf "\n## %s\n\n| operation | header | thread | its failure is tested in |\n|---|---|---|---|\n",
+          printf "\n## %s\n\n| operation | header | thread |\n|---|---|---|\n",
               toupper(substr(family, 1, 1)) substr(family, 2)
       }
-      if (!($2 in row)) {
-          print $2 " has no row that makes it fail" >"/dev/stderr"
-          failures = 1
-      }
-      printf "| `%s` | `%s` | %s | [%s](../%s) |\n", $2, header[$2], tag[$2], file(row[$2]), row[$2]
+      printf "| `%s` | `%s` | %s |\n", $2, header[$2], tag[$2]
       ++operations
   }
-  function file(path) {
-      sub(/.*\//, "", path)
-      return path
-  }
-  END {
-      printf "\n%d operations.\n", operations
-      exit failures
-  }
-' "$scratch/functions" "$scratch/rows" "$scratch/points" >"$scratch/list" || {
-  printf '%s\n' "$page could not be written"
-  exit 1
-}
+  END { printf "\n%d operations.\n", operations }
+' "$scratch/functions" "$scratch/points" >"$scratch/list"
 
 {
   cat <<'PAGE'
 # Operations of the host
 
 All operations of the H-API that can fail: those that return an `HStatus` or write one. Each can be made to fail on
-demand, by name and by count of calls (`openquarn_app/Faults.h`); a test does so for every one of them and looks at the
-status that comes back, before, during and after (`tests/host/faults/faultTest.cpp`). Overloads share a line. The
+demand, by name and by count of calls (`openquarn_app/Faults.h`); a test reads in the sources that each, with all its
+overloads, goes through its own fault point (`tests/host/faults/header_scan.sh`). Overloads share a line. The
 constructors of function sets that take an object fail as `HFnBase::setObject` does.
 
-The last column names the file with the row of the test that calls the operation. Threads: `main` is the thread that the
-application runs the host on, outside of an evaluation; `eval` that one, or a thread that is evaluating a node; `any`
-every thread.
+Threads: `main` is the thread that the application runs the host on, outside of an evaluation; `eval` that one, or a
+thread that is evaluating a node; `any` every thread.
 
 This page is generated: `tests/host/faults/operations_doc.sh .` writes it anew, and a test fails when it is out of date.
 PAGE
