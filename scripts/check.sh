@@ -1,19 +1,5 @@
 # ./run check [--all]: sourced by ./run, whose functions it uses. Every phase runs, whatever the others said.
 
-# git that also reads a clone which belongs to another user, as a checkout in a container often does
-git_here() { git -c safe.directory="$PWD" "$@" 2>/dev/null; }
-
-# The project's C++ files: what git tracks or could; everything outside the build tree where there is no git.
-cpp_files() {
-  if have git && git_here rev-parse --git-dir >/dev/null; then
-    git_here ls-files --cached --others --exclude-standard -- '*.cpp' '*.h' | while read -r file; do
-      if [[ -e $file ]]; then printf '%s\n' "$file"; fi
-    done
-  else
-    find . -path ./build -prune -o -name .git -prune -o \( -name '*.cpp' -o -name '*.h' \) -printf '%P\n'
-  fi | sort
-}
-
 # The commit that the changes are counted from: where this branch left the main one, else the last commit but one.
 change_base() {
   local head branch
@@ -61,6 +47,14 @@ check_format() {
   ((${#files[@]} == 0)) || clang-format-14 --dry-run --Werror "${files[@]}"
 }
 
+# setup.cfg says what is asked of the Python code
+check_python() {
+  local python
+  python=$(scripts/find_python.sh 2>/dev/null)
+  say "python: types, style"
+  mypy --python-executable "$python" --cache-dir build/mypy && flake8 trainer examples tests
+}
+
 check_tidy() {
   local units
   configure asan
@@ -98,9 +92,10 @@ phase() {
 command_check() {
   local scope=${1:-}
   [[ -z $scope || $scope == --all ]] || usage_error "check takes --all or nothing, not '$scope'"
-  need_packages git clang-format-14 clang-tidy-14
+  need_packages "${check_packages[@]}" "${python_packages[@]}"
   need_for_preset tsan
   phase format check_format
+  phase python check_python
   phase static-analysis check_tidy "${scope:-changed}"
   phase asan build_and_test asan
   phase tsan build_and_test tsan

@@ -51,7 +51,14 @@ declare -A probe_of=(
   [python3-matplotlib]=/usr/lib/python3/dist-packages/matplotlib/__init__.py
   [python3-pil]=/usr/lib/python3/dist-packages/PIL/__init__.py
   [libopenblas0-pthread]=/usr/lib/*/openblas-pthread/libblas.so.3 # ten times as fast as the reference one
+  [python3-setuptools]=/usr/lib/python3/dist-packages/setuptools/__init__.py
+  [python3-wheel]=/usr/lib/python3/dist-packages/wheel/__init__.py
+  [python3-venv]=/usr/lib/python3*/ensurepip/__init__.py
+  [mypy]=mypy
+  [flake8]=flake8
+  [gcovr]=gcovr
   [dpkg-dev]=dpkg-source
+  [file]=file # by which CPack sees what is a program
   [git]=git
 )
 
@@ -61,6 +68,10 @@ build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-d
   libassimp-dev zlib1g-dev libembree-dev libstb-dev ocl-icd-opencl-dev pocl-opencl-icd)
 python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
   python3-pil libopenblas0-pthread)
+# what a wheel of the trainer is made with, and installed in a place of its own
+wheel_packages=(python3-setuptools python3-wheel python3-venv)
+package_packages=(dpkg-dev file)
+check_packages=(git clang-format-14 clang-tidy-14 mypy flake8)
 clang_packages=(clang-14 libclang-rt-14-dev llvm-14)
 
 is_debian_12() { (. /etc/os-release 2>/dev/null && [[ ${ID:-} == debian && ${VERSION_ID:-} == 12 ]]); }
@@ -116,6 +127,20 @@ apt_get() {
 }
 
 apt_error() { grep -m 1 '^E:' build/apt.log || tail -n 1 build/apt.log; }
+
+# git that also reads a clone which belongs to another user, as a checkout in a container often does
+git_here() { git -c safe.directory="$PWD" "$@" 2>/dev/null; }
+
+# The project's C++ files: what git tracks or could; everything outside the build tree where there is no git.
+cpp_files() {
+  if have git && git_here rev-parse --git-dir >/dev/null; then
+    git_here ls-files --cached --others --exclude-standard -- '*.cpp' '*.h' | while read -r file; do
+      if [[ -e $file ]]; then printf '%s\n' "$file"; fi
+    done
+  else
+    find . -path ./build -prune -o -name .git -prune -o \( -name '*.cpp' -o -name '*.h' \) -printf '%P\n'
+  fi | sort
+}
 
 # A folder of the user's, kept between clones, for what is slow to get. Nothing in it is trusted without a check.
 cache_folder() {

@@ -7,23 +7,28 @@ import os
 import signal
 import sys
 from pathlib import Path
+from types import FrameType
+from typing import TYPE_CHECKING, Callable, NoReturn, Optional, Union
 
-import trainer
-from trainer.errors import Terminated, TrainerError, UsageError
+from . import __version__
+from .errors import Terminated, TrainerError, UsageError
+
+if TYPE_CHECKING:  # what needs NumPy is imported by the commands, behind what sets its threads
+    from .settings import Settings
 
 # Debian's packages by module, for whoever has to install them
 PACKAGES = {name: f"python3-{name}" for name in ("numpy", "scipy", "torch", "onnx", "tqdm", "matplotlib")}
 
 
 class Parser(argparse.ArgumentParser):
-    def error(self, message):
+    def error(self, message: str) -> NoReturn:
         raise UsageError(f"{message} (see {self.prog} --help)")
 
 
-def parser():
+def parser() -> Parser:
     main = Parser(prog="trainer", description="Trains models for the neuralWarp deformer.", allow_abbrev=False,
                   formatter_class=argparse.RawDescriptionHelpFormatter, epilog=settings_text())
-    main.add_argument("--version", action="version", version=f"trainer {trainer.__version__}")
+    main.add_argument("--version", action="version", version=f"trainer {__version__}")
     commands = main.add_subparsers(dest="command", required=True, metavar="COMMAND")
     add_train(commands)
 
@@ -44,16 +49,16 @@ def parser():
     return main
 
 
-def add_dataset(command):
+def add_dataset(command: argparse.ArgumentParser) -> None:
     command.add_argument("dataset", metavar="DATASET", help="folder that 'quarn export' wrote")
 
 
-def add_quarn(command):
+def add_quarn(command: argparse.ArgumentParser) -> None:
     command.add_argument("--quarn", metavar="PATH", help="the quarn to run the model with, or 'none'; if not given: "
                          "$QUARN, build/release/quarn/quarn, the PATH")
 
 
-def add_train(commands):
+def add_train(commands: "argparse._SubParsersAction[Parser]") -> None:
     train = commands.add_parser("train", help="train a model", allow_abbrev=False)
     add_dataset(train)
     train.add_argument("-o", "--output", metavar="MODEL.nwrp",
@@ -78,8 +83,8 @@ SETTING_FLAGS = {
 }
 
 
-def add_settings(group):
-    from trainer.settings import KINDS, described
+def add_settings(group: argparse._ArgumentGroup) -> None:
+    from .settings import KINDS, described
 
     for name, flag in SETTING_FLAGS.items():
         group.add_argument(flag, dest=name, type=KINDS[name], metavar=name, help=described(name))
@@ -91,9 +96,9 @@ def add_settings(group):
                        help=described("preloadData"))
 
 
-def settings_text():
+def settings_text() -> str:
     """The settings of a training, as the help of the whole program shows them."""
-    from trainer.settings import described
+    from .settings import described
 
     flags = {**SETTING_FLAGS, "principalShapesEnabled": "--principal-shapes", "preloadData": "--preload"}
     return "\n".join(["settings of train, for everything else see 'trainer train --help':",
@@ -102,14 +107,14 @@ def settings_text():
 
 # --- the commands ---
 
-def command_train(options):
+def command_train(options: argparse.Namespace) -> int:
     if not 0 <= options.seed < 2**32:
         raise TrainerError(f"--seed is {options.seed}, not a whole number from 0 to {2**32 - 1}")
     pin_threads(options.threads)
-    from trainer import evaluator, pipeline
-    from trainer.dataset import load_dataset
-    from trainer.measure import advice, as_lines
-    from trainer.settings import KINDS, override
+    from . import evaluator, pipeline
+    from .dataset import load_dataset
+    from .measure import advice, as_lines
+    from .settings import KINDS, override
 
     say = speaker(options)
     quarn = evaluator.find_quarn(options.quarn)
@@ -128,7 +133,7 @@ def command_train(options):
     return INTERRUPTED if result["interrupted"] else 0
 
 
-def pin_threads(count):
+def pin_threads(count: int) -> None:
     """Before NumPy is loaded: its libraries take their threads from the environment, and sums depend on them."""
     if not 1 <= count <= 256:
         raise TrainerError(f"--threads is {count}, not a whole number from 1 to 256")
@@ -136,8 +141,8 @@ def pin_threads(count):
         os.environ[name] = str(count)
 
 
-def output_path(options, settings):
-    from trainer.files import model_path
+def output_path(options: argparse.Namespace, settings: "Settings") -> Path:
+    from .files import model_path
 
     if options.output:
         return model_path(options.output)
@@ -146,19 +151,19 @@ def output_path(options, settings):
     return model_path(str(Path("models") / Path(settings.outputModelName).name))
 
 
-def speaker(options):
+def speaker(options: argparse.Namespace) -> Callable[[str], None]:
     """Where lines for the user go: nowhere when quiet, to standard error when standard output is JSON."""
     if options.quiet:
         return lambda line: None
     return lambda line: print(line, file=sys.stderr if getattr(options, "json", False) else sys.stdout, flush=True)
 
 
-def command_evaluate(options):
+def command_evaluate(options: argparse.Namespace) -> int:
     import numpy as np
 
-    from trainer import evaluator
-    from trainer.dataset import load_dataset
-    from trainer.measure import as_lines, measure
+    from . import evaluator
+    from .dataset import load_dataset
+    from .measure import as_lines, measure
 
     quarn = evaluator.find_quarn(options.quarn)
     dataset = load_dataset(options.dataset)
@@ -172,11 +177,12 @@ def command_evaluate(options):
         print(json.dumps(errors, indent=1))
     else:
         print("\n".join([*as_lines(errors), f"the network ran with {errors['ranWith']}"]))
+    return 0
 
 
-def command_zero(options):
-    from trainer import export, files, pipeline
-    from trainer.dataset import load_dataset
+def command_zero(options: argparse.Namespace) -> int:
+    from . import export, files, pipeline
+    from .dataset import load_dataset
 
     dataset = load_dataset(options.dataset)
     if dataset.delta_count == 0:
@@ -186,16 +192,17 @@ def command_zero(options):
         export.write_model(part, export.zero_model(dataset.control_count, 3 * dataset.delta_count),
                            export.metadata(dataset, None, None))
     speaker(options)(f"wrote {target}")
+    return 0
 
 
-def command_info(options):
-    from trainer.dataset import load_dataset
+def command_info(options: argparse.Namespace) -> int:
+    from .dataset import load_dataset
 
     dataset = load_dataset(options.dataset)
     description = dataset.description
     if options.json:
         print(json.dumps({**description, "affectMap": None, "digest": dataset.digest}, indent=1))
-        return
+        return 0
     print(f"{options.dataset}: {dataset.frame_count} frames, {dataset.control_count} controls, "
           f"{dataset.delta_count} deltas ({'Surface' if description['deltaMode'] else 'Offset'}, "
           f"{description['smoothingIterations']} smoothing passes)")
@@ -204,21 +211,23 @@ def command_info(options):
     for name, value in vars(dataset.settings).items():
         print(f"  {name} {value}")
     print(f"sha256 {dataset.digest}")
+    return 0
 
 
 INTERRUPTED = 130  # 128 + SIGINT
-COMMANDS = {"train": command_train, "evaluate": command_evaluate, "zero": command_zero, "info": command_info}
+COMMANDS: dict[str, Callable[[argparse.Namespace], int]] = {
+    "train": command_train, "evaluate": command_evaluate, "zero": command_zero, "info": command_info}
 
 
-def on_terminate(number, frame):
+def on_terminate(number: int, frame: Optional[FrameType]) -> None:
     raise Terminated
 
 
-def main():
+def main() -> int:
     signal.signal(signal.SIGTERM, on_terminate)
     try:
         options = parser().parse_args()
-        status = COMMANDS[options.command](options) or 0
+        status = COMMANDS[options.command](options)
         sys.stdout.flush()
         return status
     except UsageError as error:
@@ -238,22 +247,27 @@ def main():
         return 143
 
 
-def reason_of(error):
+def reason_of(error: Union[OSError, MemoryError]) -> str:
     if isinstance(error, MemoryError):
         return "there is not enough memory"
     # files are opened, written and closed under their names; what is printed has none
-    return f"{error.filename or 'standard output'}: {error.strerror}" if error.strerror else error
+    return f"{error.filename or 'standard output'}: {error.strerror}" if error.strerror else str(error)
 
 
-def complain(error, status=1):
+def complain(error: object, status: int = 1) -> int:
     print(f"trainer: {error}", file=sys.stderr)
     return status
 
 
-if __name__ == "__main__":
+def run() -> NoReturn:
+    """The program: also the entry point neuralwarp-train."""
     status = main()
     try:
         sys.stdout.flush()
     except BrokenPipeError:
         os.dup2(os.open(os.devnull, os.O_WRONLY), sys.stdout.fileno())
     sys.exit(status)
+
+
+if __name__ == "__main__":
+    run()

@@ -5,11 +5,12 @@ import hashlib
 import json
 from dataclasses import dataclass
 from pathlib import Path
+from typing import Any, Iterator, Union
 
 import numpy as np
 
-from trainer.errors import TrainerError
-from trainer.settings import Settings, read_settings
+from .errors import TrainerError
+from .settings import Settings, read_settings
 
 FORMAT, VERSION = "neuralWarp training data", 1
 BLOCK_BYTES = 64 << 20  # what is read of a file at once
@@ -22,7 +23,7 @@ class Dataset:
     """A data set whose description and arrays agree. Lengths are in scene units."""
 
     folder: Path
-    description: dict      # dataset.json
+    description: dict[str, Any]  # dataset.json
     settings: Settings     # its "train"
     controls: np.ndarray   # float32 [F, C]
     deltas: np.ndarray     # float32 [F, 3 * D], mapped from the file
@@ -30,22 +31,22 @@ class Dataset:
     digest: str            # SHA-256 of the four files
 
     @property
-    def frame_count(self):
+    def frame_count(self) -> int:
         return self.controls.shape[0]
 
     @property
-    def control_count(self):
+    def control_count(self) -> int:
         return self.controls.shape[1]
 
     @property
-    def delta_count(self):
+    def delta_count(self) -> int:
         return self.deltas.shape[1] // 3
 
-    def vertex(self, slot):
+    def vertex(self, slot: int) -> int:
         """Index in the whole mesh of the vertex that a slot of the deltas belongs to."""
         return self.description["affectMap"][slot] if self.description["subsetState"] == "partial" else slot
 
-    def blocks(self, rows):
+    def blocks(self, rows: np.ndarray) -> Iterator[tuple[np.ndarray, np.ndarray]]:
         """The deltas of `rows` in blocks of bounded size: pairs of row indices and float32 [rows, 3 * D]."""
         step = max(1, BLOCK_BYTES // (4 * max(1, self.deltas.shape[1])))
         for first in range(0, len(rows), step):
@@ -53,8 +54,8 @@ class Dataset:
             yield part, np.asarray(self.deltas[part])
 
 
-def load_dataset(folder):
-    folder = Path(folder)
+def load_dataset(place: Union[str, Path]) -> Dataset:
+    folder = Path(place)
     path = folder / "dataset.json"
     if not path.is_file():
         raise TrainerError(f"{folder} is not a training data set: it has no dataset.json"
@@ -76,13 +77,13 @@ def load_dataset(folder):
 
 # --- dataset.json ---
 
-def read_bounded(path):
+def read_bounded(path: Path) -> bytes:
     if path.stat().st_size > DESCRIPTION_LIMIT:
         raise TrainerError(f"{path} has {path.stat().st_size} bytes, more than the {DESCRIPTION_LIMIT} it may have")
     return path.read_bytes()
 
 
-def parse(text, path):
+def parse(text: bytes, path: Path) -> dict[str, Any]:
     try:
         description = json.loads(text)
     except (ValueError, RecursionError) as error:
@@ -92,17 +93,17 @@ def parse(text, path):
     return description
 
 
-def check_description(description, path):
-    def require(fits, key, wanted):
+def check_description(description: dict[str, Any], path: Path) -> None:
+    def require(fits: bool, key: str, wanted: str) -> None:
         if not fits:
             value = repr(description.get(key, "missing"))
             shown = value if len(value) < 60 else value[:57] + "..."
             raise TrainerError(f"{path}: {key} is {shown}, not {wanted}")
 
-    def is_count(value, low, high):
+    def is_count(value: object, low: int, high: int) -> bool:
         return isinstance(value, int) and not isinstance(value, bool) and low <= value <= high
 
-    def is_number(value):
+    def is_number(value: object) -> bool:
         return isinstance(value, (int, float)) and not isinstance(value, bool) and 0 <= value < float("inf")
 
     get = description.get
@@ -131,7 +132,7 @@ def check_description(description, path):
     require(isinstance(get("files"), dict), "files", "an object that names the three arrays")
 
 
-def check_affect_map(indices, delta_count, full_count, path):
+def check_affect_map(indices: object, delta_count: Any, full_count: Any, path: Path) -> None:
     if not isinstance(indices, list) or len(indices) != delta_count:
         found = f"has {len(indices)} entries" if isinstance(indices, list) else "is not a list"
         raise TrainerError(f"{path}: affectMap {found}, and a partial subset has the {delta_count} of deltaCount")
@@ -144,14 +145,14 @@ def check_affect_map(indices, delta_count, full_count, path):
 
 # --- the arrays ---
 
-def array_path(description, folder, name, path):
+def array_path(description: dict[str, Any], folder: Path, name: str, path: Path) -> Path:
     value = description["files"].get(name)
     if not isinstance(value, str) or not value or Path(value).name != value:
         raise TrainerError(f"{path}: files.{name} is {value!r}, not the name of a file beside it")
     return folder / value
 
 
-def open_array(path, kind, shape):
+def open_array(path: Path, kind: str, shape: tuple[int, ...]) -> np.memmap:
     """The array of a .npy file, mapped. Only that kind and shape in C order, and not a byte more or less."""
     if not path.is_file():
         raise TrainerError(f"{path} is missing")
@@ -169,13 +170,13 @@ def open_array(path, kind, shape):
     return array
 
 
-def check_and_digest(array, path, frames, digest):
+def check_and_digest(array: np.ndarray, path: Path, frames: np.ndarray, digest: "hashlib._Hash") -> None:
     """Adds the array's bytes to the digest, a block at a time, and looks for numbers that are none."""
     row_bytes = max(1, array.nbytes // len(array))
     step = max(1, BLOCK_BYTES // row_bytes)
     for first in range(0, len(array), step):
         block = np.ascontiguousarray(array[first:first + step])
-        digest.update(block)
+        digest.update(block.data)
         if not np.isfinite(block).all():
             row, *where = np.argwhere(~np.isfinite(block))[0]
             names = ("vertex", "axis") if len(where) == 2 else ("control",)

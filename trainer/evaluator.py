@@ -8,19 +8,22 @@ import shutil
 import subprocess
 import tempfile
 from contextlib import contextmanager
+from functools import partial
 from pathlib import Path
+from typing import Callable, Iterator, Optional, Union
 
 import numpy as np
 import onnx
 from onnx import numpy_helper
 
-from trainer.errors import TrainerError
-from trainer.files import write_bytes
+from .dataset import Dataset
+from .errors import TrainerError
+from .files import write_bytes
 
 BUILT = Path(__file__).resolve().parent.parent / "build" / "release" / "quarn" / "quarn"
 
 
-def find_quarn(wanted):
+def find_quarn(wanted: Optional[str]) -> Optional[str]:
     """Path of the executable: `wanted` ("none" for none), $QUARN, the release build, the PATH; or None."""
     for name, called in ((wanted, "--quarn"), (os.environ.get("QUARN"), "$QUARN")):
         if name == "none":
@@ -33,7 +36,7 @@ def find_quarn(wanted):
     return str(BUILT) if os.access(BUILT, os.X_OK) else shutil.which("quarn")
 
 
-def run_with_quarn(quarn, model, controls):
+def run_with_quarn(quarn: str, model: Path, controls: np.ndarray) -> np.ndarray:
     """Outputs float32 [rows, K] of a model directory for controls [rows, C]."""
     with tempfile.TemporaryDirectory(prefix="neuralWarp-") as folder:
         given, answer = Path(folder) / "controls.npy", Path(folder) / "outputs.npy"
@@ -50,7 +53,7 @@ def run_with_quarn(quarn, model, controls):
 
 
 @contextmanager
-def model_link(folder, name):
+def model_link(folder: Path, name: str) -> Iterator[Path]:
     """A model directory that is still called something else, under its own name."""
     with tempfile.TemporaryDirectory(prefix="neuralWarp-") as place:
         link = Path(place) / name
@@ -58,7 +61,7 @@ def model_link(folder, name):
         yield link
 
 
-def read_answer(path, rows, model):
+def read_answer(path: Path, rows: int, model: Path) -> np.ndarray:
     try:
         outputs = np.load(path, allow_pickle=False)
     except (OSError, ValueError) as error:
@@ -71,12 +74,12 @@ def read_answer(path, rows, model):
 class NumpyModel:
     """A chain of the nodes that this trainer writes."""
 
-    STEPS = {
+    STEPS: dict[str, Callable[..., np.ndarray]] = {
         "Sub": np.subtract, "Mul": np.multiply, "Add": np.add, "MatMul": np.matmul, "Tanh": np.tanh,
         "Relu": lambda x: np.maximum(x, 0), "Sigmoid": lambda x: 0.5 + 0.5 * np.tanh(0.5 * x),
     }
 
-    def __init__(self, path):
+    def __init__(self, path: Path) -> None:
         try:
             self.graph = onnx.load(str(path)).graph
         except Exception as error:  # protobuf has no common base of its errors
@@ -86,7 +89,7 @@ class NumpyModel:
         if len(self.graph.input) != 1:
             raise TrainerError(f"{path} has {len(self.graph.input)} inputs, not 1")
 
-    def run(self, controls):
+    def run(self, controls: np.ndarray) -> np.ndarray:
         values = {self.graph.input[0].name: controls.astype(np.float32)}
         for node in self.graph.node:
             try:
@@ -97,7 +100,7 @@ class NumpyModel:
                                    f"{error}") from error
         return values[self.graph.output[0].name]
 
-    def step(self, node):
+    def step(self, node: onnx.NodeProto) -> Callable[..., np.ndarray]:
         if node.op_type == "LeakyRelu":
             slope = np.float32(node.attribute[0].f if node.attribute else 0.01)
             return lambda x: np.where(x < 0, slope * x, x)
@@ -107,12 +110,12 @@ class NumpyModel:
 class ModelDirectory:
     """A model directory as the deformer sees it: deltas for controls."""
 
-    def __init__(self, folder, quarn):
-        self.folder, self.quarn = Path(folder), quarn
+    def __init__(self, folder: Union[str, Path], quarn: Optional[str]) -> None:
+        self.folder = Path(folder)
         try:
             self.metadata = json.loads((self.folder / "metadata.json").read_bytes())
             shapes = self.folder / "principal_shapes.json"
-            self.shapes = None
+            self.shapes: Optional[np.ndarray] = None
             if shapes.exists():
                 self.shapes = np.array(json.loads(shapes.read_bytes())["principalShapes"], np.float32)
         except FileNotFoundError as error:
@@ -121,9 +124,13 @@ class ModelDirectory:
             raise TrainerError(f"{folder} is not a model directory: {error}") from error
         if not isinstance(self.metadata, dict) or (self.shapes is not None and self.shapes.ndim != 2):
             raise TrainerError(f"{folder} is not a model directory: a file in it is of another form")
-        self.numpy = None if quarn else NumpyModel(self.folder / "model.onnx")
+        self.run: Callable[[np.ndarray], np.ndarray]  # outputs for controls
+        if quarn:
+            self.run = partial(run_with_quarn, quarn, self.folder)
+        else:
+            self.run = NumpyModel(self.folder / "model.onnx").run
 
-    def check_fits(self, dataset):
+    def check_fits(self, dataset: Dataset) -> None:
         for key in ("fullCount", "affectCount", "subsetState", "deltaMode", "smoothingIterations"):
             if self.metadata.get(key) != dataset.description[key]:
                 raise TrainerError(f"{self.folder} has {key} {self.metadata.get(key)!r} and {dataset.folder} has "
@@ -132,7 +139,7 @@ class ModelDirectory:
                 dataset.description["subsetState"] == "partial"):
             raise TrainerError(f"{self.folder} moves other vertices than {dataset.folder} has deltas of")
 
-    def deltas(self, controls):
+    def deltas(self, controls: np.ndarray) -> np.ndarray:
         """float32 [rows, 3 * D], in scene units."""
-        outputs = run_with_quarn(self.quarn, self.folder, controls) if self.quarn else self.numpy.run(controls)
+        outputs = self.run(controls)
         return outputs if self.shapes is None else outputs @ self.shapes

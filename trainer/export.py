@@ -2,16 +2,20 @@
 """Writes the files of a model directory. They carry no time and no path: the same training gives the same bytes."""
 
 import json
+from pathlib import Path
+from typing import Any, Optional, Union
 
 import numpy as np
 import onnx
 from onnx import TensorProto, helper, numpy_helper
-from torch import nn
+from torch import Tensor, nn
 
-import trainer
-from trainer.errors import TrainerError
-from trainer.files import write_bytes
-from trainer.settings import WITHOUT_EFFECT
+from . import __version__
+from .dataset import Dataset
+from .errors import TrainerError
+from .files import write_bytes
+from .network import Normalisation
+from .settings import WITHOUT_EFFECT, Settings
 
 OPSET = 16
 IR_VERSION = 8
@@ -20,12 +24,12 @@ BYTES_OF_A_NUMBER = 13                            # of a float32 in a JSON list,
 METADATA_KEYS = ("deltaCount", "deltaMode", "smoothingIterations", "affectCount", "fullCount", "subsetState",
                  "componentTagExpression", "geometry")
 
-ACTIVATION_NODES = {nn.Sigmoid: ("Sigmoid", {}), nn.Tanh: ("Tanh", {}), nn.ReLU: ("Relu", {})}
+ACTIVATION_NODES = {nn.Sigmoid: "Sigmoid", nn.Tanh: "Tanh", nn.ReLU: "Relu"}
 
 
 # --- model.onnx ---
 
-def onnx_model(network, normalisation, output_name):
+def onnx_model(network: nn.Sequential, normalisation: Normalisation, output_name: str) -> onnx.ModelProto:
     """The network from raw controls, float32 [C], to outputs, float32 [K]: one pose, as the deformer runs it."""
     graph = GraphWriter("controls")
     graph.add("Sub", normalisation.center)
@@ -39,16 +43,15 @@ def onnx_model(network, normalisation, output_name):
         elif isinstance(layer, nn.LeakyReLU):
             graph.add("LeakyRelu", alpha=layer.negative_slope)
         elif type(layer) in ACTIVATION_NODES:
-            name, attributes = ACTIVATION_NODES[type(layer)]
-            graph.add(name, **attributes)
+            graph.add(ACTIVATION_NODES[type(layer)])
     return graph.finish(output_name, layers[0].in_features, layers[-1].out_features)
 
 
-def scaled(parameter, scale):
+def scaled(parameter: Tensor, scale: float) -> np.ndarray:
     return (parameter.detach().numpy().astype(np.float64) * scale).astype(np.float32)
 
 
-def zero_model(control_count, output_count):
+def zero_model(control_count: int, output_count: int) -> onnx.ModelProto:
     """A network of the right shapes whose outputs are 0."""
     graph = GraphWriter("controls")
     graph.add("MatMul", np.zeros((control_count, 1), np.float32))
@@ -59,11 +62,13 @@ def zero_model(control_count, output_count):
 class GraphWriter:
     """A chain of nodes, each fed by the one before and at most one constant."""
 
-    def __init__(self, input_name):
-        self.nodes, self.constants = [], []
+    def __init__(self, input_name: str) -> None:
+        self.nodes: list[onnx.NodeProto] = []
+        self.constants: list[onnx.TensorProto] = []
         self.input_name = self.value = input_name
 
-    def add(self, kind, constant=None, **attributes):
+    def add(self, kind: str, constant: Union[np.ndarray, np.floating, None] = None,
+            **attributes: float) -> None:
         name = f"{kind.lower()}{len(self.nodes)}"
         inputs = [self.value]
         if constant is not None:
@@ -73,28 +78,28 @@ class GraphWriter:
         self.nodes.append(helper.make_node(kind, inputs, [name], name=name, **attributes))
         self.value = name
 
-    def finish(self, output_name, input_count, output_count):
+    def finish(self, output_name: str, input_count: int, output_count: int) -> onnx.ModelProto:
         self.nodes[-1].output[0] = output_name
         graph = helper.make_graph(
             self.nodes, "neuralWarp",
             [helper.make_tensor_value_info(self.input_name, TensorProto.FLOAT, [input_count])],
             [helper.make_tensor_value_info(output_name, TensorProto.FLOAT, [output_count])], self.constants)
         model = helper.make_model(graph, opset_imports=[helper.make_opsetid("", OPSET)], ir_version=IR_VERSION,
-                                  producer_name="neuralWarp trainer", producer_version=trainer.__version__)
+                                  producer_name="neuralWarp trainer", producer_version=__version__)
         onnx.checker.check_model(model, full_check=True)
         return model
 
 
 # --- metadata.json, principal_shapes.json ---
 
-def metadata(dataset, settings, seed):
+def metadata(dataset: Dataset, settings: Optional[Settings], seed: Optional[int]) -> dict[str, Any]:
     """What the deformer needs to know of the data set, and where the model comes from."""
     description = dataset.description
     result = {key: description[key] for key in METADATA_KEYS}
     if description["subsetState"] == "partial":
         result["affectMap"] = description["affectMap"]
     result["controlNames"] = description["controlNames"]
-    result["trainer"] = f"neuralWarp trainer {trainer.__version__}"
+    result["trainer"] = f"neuralWarp trainer {__version__}"
     result["dataSet"] = f"sha256:{dataset.digest}"
     if settings is not None:
         result["seed"] = seed
@@ -102,7 +107,7 @@ def metadata(dataset, settings, seed):
     return result
 
 
-def check_shapes_size(shape_count, delta_count):
+def check_shapes_size(shape_count: int, delta_count: int) -> None:
     size = BYTES_OF_A_NUMBER * 3 * shape_count * delta_count
     if size > SHAPES_LIMIT:
         raise TrainerError(f"{shape_count} principal shapes of {delta_count} vertices would take about "
@@ -110,7 +115,8 @@ def check_shapes_size(shape_count, delta_count):
                            "reads: give fewer (--principal-limit)")
 
 
-def write_model(folder, model, metadata_, shapes=None):
+def write_model(folder: Path, model: onnx.ModelProto, metadata_: dict[str, Any],
+                shapes: Optional[np.ndarray] = None) -> None:
     """Writes the files into an existing folder. shapes: float32 [S, 3 * D], in scene units, or none."""
     text = json.dumps(metadata_, indent=1, allow_nan=False) + "\n"
     if len(text) > METADATA_LIMIT:
@@ -122,7 +128,7 @@ def write_model(folder, model, metadata_, shapes=None):
         write_shapes(folder / "principal_shapes.json", shapes)
 
 
-def write_shapes(path, shapes):
+def write_shapes(path: Path, shapes: np.ndarray) -> None:
     # as text a float32 has the fewest digits that give it back
     rows = ",\n".join("[" + ",".join(shape.astype(str).tolist()) + "]" for shape in shapes)
     write_bytes(path, (f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '

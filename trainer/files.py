@@ -8,14 +8,15 @@ import os
 import shutil
 from contextlib import contextmanager
 from pathlib import Path
+from typing import Iterable, Iterator
 
-from trainer.errors import TrainerError
+from .errors import TrainerError
 
 AT_FDCWD, RENAME_EXCHANGE = -100, 2  # linux/fcntl.h, linux/fs.h
 
 
 @contextmanager
-def whole_folder(target, own_names):
+def whole_folder(target: Path, own_names: Iterable[str]) -> Iterator[Path]:
     """Gives TARGET.part to fill. On leaving without an exception it takes the place of `target`, else it goes.
 
     `own_names`: what a folder may hold that is replaced; one that holds anything else is refused. What a killed process
@@ -38,14 +39,14 @@ def whole_folder(target, own_names):
         os.close(lock)
 
 
-def write_bytes(path, content):
+def write_bytes(path: Path, content: bytes) -> None:
     """Writes a file; an error, such as a full disk, names it."""
     with naming(path), open(path, "wb") as file:
         file.write(content)
 
 
 @contextmanager
-def naming(path):
+def naming(path: Path) -> Iterator[None]:
     """Puts the path into errors of writing and closing, which come from the system without one."""
     try:
         yield
@@ -53,11 +54,11 @@ def naming(path):
         raise OSError(error.errno, error.strerror, str(path)) from error
 
 
-def sibling(target, ending):
+def sibling(target: Path, ending: str) -> Path:
     return target.with_name(target.name + ending)
 
 
-def check_replaceable(target, own_names):
+def check_replaceable(target: Path, own_names: Iterable[str]) -> None:
     if not target.exists() and not target.is_symlink():
         return
     if not target.is_dir():
@@ -67,7 +68,7 @@ def check_replaceable(target, own_names):
         raise TrainerError(f"{target} holds {others[0]}, which would be lost: move it away, or give another name")
 
 
-def claim(part, target):
+def claim(part: Path, target: Path) -> int:
     """Makes the folder and locks it; the system takes the lock from a process that dies."""
     part.mkdir(exist_ok=True)
     lock = os.open(part, os.O_RDONLY | os.O_DIRECTORY)
@@ -79,7 +80,7 @@ def claim(part, target):
     return lock
 
 
-def empty(folder):
+def empty(folder: Path) -> None:
     for entry in folder.iterdir():
         if entry.is_dir() and not entry.is_symlink():
             shutil.rmtree(entry)
@@ -87,7 +88,7 @@ def empty(folder):
             entry.unlink()
 
 
-def sync(folder):
+def sync(folder: Path) -> None:
     """The bytes reach the disk before the name does."""
     for path in [*folder.iterdir(), folder]:
         handle = os.open(path, os.O_RDONLY)
@@ -98,7 +99,7 @@ def sync(folder):
             os.close(handle)
 
 
-def replace(part, target, old):
+def replace(part: Path, target: Path, old: Path) -> None:
     if not target.exists():
         os.rename(part, target)
     elif not exchange(part, target):
@@ -109,7 +110,7 @@ def replace(part, target, old):
     shutil.rmtree(old, ignore_errors=True)
 
 
-def exchange(first, second):
+def exchange(first: Path, second: Path) -> bool:
     """Swaps two names in one step. False where the system does not offer that."""
     rename = getattr(ctypes.CDLL(None, use_errno=True), "renameat2", None)
     if rename is None:
@@ -122,7 +123,7 @@ def exchange(first, second):
     raise OSError(error, os.strerror(error), str(second))
 
 
-def model_path(text):
+def model_path(text: str) -> Path:
     """The path of a model directory: NAME.nwrp, with the ending added where it is missing."""
     path = Path(text)
     if not path.name or path.name == "..":

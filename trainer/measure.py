@@ -1,11 +1,16 @@
 # SPDX-License-Identifier: Apache-2.0
 """How far vertices end from where they should: mean, 99th percentile, largest, in mm and in parts of the character."""
 
+from typing import Any, Callable, Optional
+
 import numpy as np
 
-# So many distances are kept, and their percentile is exact. More are counted in bins of equal bits: a float32's exponent
-# and the first 11 bits of its fraction. Memory is bounded for any number of frames, and the percentile then within
-# 2^-11 (0.05 %) of the exact one.
+from .dataset import Dataset
+from .settings import Settings
+
+# So many distances are kept, and their percentile is exact. More are counted in bins of equal bits: a float32's
+# exponent and the first 11 bits of its fraction. Memory is bounded for any number of frames, and the percentile then
+# within 2^-11 (0.05 %) of the exact one.
 KEPT = 1 << 24
 DROPPED_BITS = 12
 ENOUGH_EXPLAINED = 0.99  # part of the deltas' sum of squares: what shapes that hold it leave is hardly seen
@@ -15,12 +20,13 @@ BINS = 1 << (31 - DROPPED_BITS)
 class Distances:
     """Statistics over frames and vertices of the length of a difference of deltas."""
 
-    def __init__(self):
+    def __init__(self) -> None:
         self.counts = np.zeros(BINS, np.int64)
         self.total, self.largest, self.where = 0.0, -1.0, (0, 0)
-        self.kept, self.kept_count = [], 0
+        self.kept: list[np.ndarray] = []
+        self.kept_count = 0
 
-    def add(self, rows, differences):
+    def add(self, rows: np.ndarray, differences: np.ndarray) -> None:
         """rows [n]: of the data set; differences [n, 3 * D], scene units."""
         lengths = np.linalg.norm(differences.reshape(len(rows), -1, 3).astype(np.float64), axis=2)
         self.counts += np.bincount(lengths.astype(np.float32).view(np.uint32).ravel() >> DROPPED_BITS, minlength=BINS)
@@ -31,11 +37,11 @@ class Distances:
             row, slot = divmod(worst, lengths.shape[1])
             self.largest, self.where = float(lengths.flat[worst]), (int(rows[row]), slot)
 
-    def keep(self, lengths):
+    def keep(self, lengths: np.ndarray) -> None:
         self.kept_count += lengths.size
         self.kept = self.kept + [lengths.ravel()] if self.kept_count <= KEPT else []
 
-    def percentile(self, part):
+    def percentile(self, part: float) -> float:
         if self.kept:
             return float(np.quantile(np.concatenate(self.kept), part))
         ranks = np.cumsum(self.counts)
@@ -43,8 +49,8 @@ class Distances:
         upper = np.array([(index + 1) << DROPPED_BITS], np.uint32).view(np.float32)[0]
         return float(min(upper, self.largest))
 
-    def summary(self, dataset):
-        def both(length):
+    def summary(self, dataset: Dataset) -> dict[str, Any]:
+        def both(length: float) -> dict[str, Optional[float]]:
             size = dataset.description["boundingBoxDiagonal"]
             return {"mm": length * dataset.description["metersPerUnit"] * 1000,
                     "percentOfDiagonal": length / size * 100 if size > 0 else None}
@@ -55,7 +61,8 @@ class Distances:
                 "worstVertex": dataset.vertex(slot)}
 
 
-def measure(dataset, rows, deltas_of, shapes=None):
+def measure(dataset: Dataset, rows: np.ndarray, deltas_of: Callable[[np.ndarray], np.ndarray],
+            shapes: Optional[np.ndarray] = None) -> dict[str, Any]:
     """The three errors over `rows`: without a correction, the best that the principal shapes could do, and the model's.
 
     deltas_of  gives predicted deltas [n, 3 * D] for controls [n, C]
@@ -73,7 +80,7 @@ def measure(dataset, rows, deltas_of, shapes=None):
             "basis": None if shapes is None else basis.summary(dataset), "network": network.summary(dataset)}
 
 
-def is_at_floor(errors, explained):
+def is_at_floor(errors: dict[str, Any], explained: float) -> bool:
     """Whether most of what is left is what the shapes cannot show, and more of them could be had.
 
     What the shapes cannot show and what the network does wrong in their span are at right angles: at 1.4 times the
@@ -82,10 +89,10 @@ def is_at_floor(errors, explained):
             and errors["network"]["mean"]["mm"] <= 2**0.5 * errors["basis"]["mean"]["mm"])
 
 
-def advice(errors, explained, settings):
+def advice(errors: dict[str, Any], explained: Optional[float], settings: Settings) -> list[str]:
     """What the errors say about the settings: sentences, none where there is nothing to be done."""
     sentences = []
-    if is_at_floor(errors, explained):
+    if explained is not None and is_at_floor(errors, explained):
         sentences.append(
             f"the shapes limit this model: with an accuracy of {settings.principalShapesAccuracy:g} and at most "
             f"{settings.principalShapesLimit} of them they hold {100 * explained:.1f} % of the deltas, and the network "
@@ -93,12 +100,12 @@ def advice(errors, explained, settings):
             "would leave less")
     worse = [name for name in ("mean", "p99") if errors["network"][name]["mm"] > errors["base"][name]["mm"]]
     if worse:
-        sentences.append(f"the network leaves more than no correction does ({' and '.join(worse)}): it needs more frames, "
-                         "or more epochs")
+        sentences.append(f"the network leaves more than no correction does ({' and '.join(worse)}): it needs more "
+                         "frames, or more epochs")
     return sentences
 
 
-def as_lines(errors):
+def as_lines(errors: dict[str, Any]) -> list[str]:
     lines = [f"{'':8} {'mean':>10} {'p99':>10} {'max':>10}   (mm, over {errors['frames']} frames)"]
     for name in ("base", "basis", "network"):
         if errors[name]:

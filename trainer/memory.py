@@ -1,12 +1,14 @@
 # SPDX-License-Identifier: Apache-2.0
 """What fits into this machine, and how fast its matrix products are."""
 
+from typing import Callable, Optional
 
-def text(size):
+
+def text(size: float) -> str:
     return f"{size / 1e9:.1f} GB" if size >= 1e9 else f"{size / 1e6:.1f} MB"
 
 
-def available():
+def available() -> Optional[int]:
     """Bytes that can be taken without swapping; None where the system does not say."""
     try:
         with open("/proc/meminfo", encoding="ascii") as file:
@@ -18,7 +20,7 @@ def available():
     return None
 
 
-def holds(size, wanted, say):
+def holds(size: int, wanted: bool, say: Callable[[str], None]) -> bool:
     """Whether to hold `size` bytes of deltas in memory. The model does not depend on it."""
     if not wanted:
         say(f"{text(size)} of deltas are read from the disk, batch by batch")
@@ -32,7 +34,7 @@ def holds(size, wanted, say):
     return True
 
 
-def warn_of_slow_blas(say):
+def warn_of_slow_blas(say: Callable[[str], None]) -> None:
     """NumPy and PyTorch of some systems multiply matrices with the reference BLAS, an order of magnitude slower."""
     try:
         with open("/proc/self/maps", encoding="utf-8", errors="replace") as file:

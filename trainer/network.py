@@ -7,7 +7,8 @@ import numpy as np
 import torch
 from torch import nn
 
-from trainer.errors import TrainerError
+from .errors import TrainerError
+from .settings import Settings
 
 WEIGHT_BYTES_LIMIT = 1_500_000_000  # an ONNX file of one piece ends at 2 GiB
 LEAKY_SLOPE = 0.01
@@ -27,11 +28,11 @@ class Normalisation:
     unit: float
     still: np.ndarray    # bool [C]: controls that never move
 
-    def normalised(self, controls):
+    def normalised(self, controls: np.ndarray) -> np.ndarray:
         return (controls - self.center) * np.float32(1 / self.deviation)
 
 
-def measure_controls(controls, unit):
+def measure_controls(controls: np.ndarray, unit: float) -> Normalisation:
     """Normalisation for the rows of `controls` [rows, C] and outputs whose root mean square is `unit`."""
     variances = np.var(controls, axis=0, dtype=np.float64)
     deviation = float(np.sqrt(np.mean(variances))) or 1.0
@@ -39,16 +40,16 @@ def measure_controls(controls, unit):
     return Normalisation(center, deviation, unit, np.sqrt(variances) <= CONSTANT * deviation)
 
 
-def layer_sizes(settings, inputs, outputs):
+def layer_sizes(settings: Settings, inputs: int, outputs: int) -> list[tuple[int, int]]:
     sizes = [inputs] + [settings.neuronsPerLayer] * settings.hiddenLayerCount + [outputs]
     return list(zip(sizes[:-1], sizes[1:]))
 
 
-def parameter_count(settings, inputs, outputs):
+def parameter_count(settings: Settings, inputs: int, outputs: int) -> int:
     return sum((before + 1) * after for before, after in layer_sizes(settings, inputs, outputs))
 
 
-def check_size(settings, inputs, outputs):
+def check_size(settings: Settings, inputs: int, outputs: int) -> None:
     """Refuses a network that no model file could hold, before anything is allocated."""
     size = 4 * parameter_count(settings, inputs, outputs)
     if size <= WEIGHT_BYTES_LIMIT:
@@ -60,9 +61,9 @@ def check_size(settings, inputs, outputs):
                        f"{WEIGHT_BYTES_LIMIT / 1e9} GB a model may have: {advice}")
 
 
-def build(settings, inputs, outputs, still):
+def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> nn.Sequential:
     """The layers, initialised by torch's generator. `still` [inputs]: controls that must have no influence."""
-    layers = []
+    layers: list[nn.Module] = []
     for before, after in layer_sizes(settings, inputs, outputs):
         layers.append(nn.Linear(before, after))
         if MODULES[settings.activationFunction]:
@@ -78,7 +79,7 @@ def build(settings, inputs, outputs, still):
     return network
 
 
-def predict(network, normalisation, controls):
+def predict(network: nn.Sequential, normalisation: Normalisation, controls: np.ndarray) -> np.ndarray:
     """Outputs of the network, float32 [rows, K] in units of the model, for raw controls [rows, C]."""
     network.eval()
     with torch.no_grad():

@@ -3,34 +3,41 @@
 
 import time
 from dataclasses import dataclass
+from pathlib import Path
+from typing import Any, Callable, Optional
 
 import numpy as np
 import torch
+from torch import nn
 
-from trainer import evaluator, export, files, memory, progress, report
-from trainer.errors import TrainerError
-from trainer.measure import measure
-from trainer.network import build, check_size, measure_controls, parameter_count, predict
-from trainer.shapes import principal_basis
-from trainer.training import fit, make_deterministic, split_rows
+from . import evaluator, export, files, memory, progress, report
+from .dataset import Dataset
+from .errors import TrainerError
+from .measure import measure
+from .network import Normalisation, build, check_size, measure_controls, parameter_count, predict
+from .settings import Settings
+from .shapes import principal_basis
+from .training import History, Split, fit, make_deterministic, split_rows
 
 MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json")
 VERIFIED_ROWS = 64
 TOLERANCE = 1e-4  # of the root mean square of the outputs
+
+Trained = tuple[nn.Sequential, Normalisation, History]
 
 
 @dataclass(frozen=True)
 class Job:
     """What a training run is asked for."""
 
-    dataset: object
-    settings: object
+    dataset: Dataset
+    settings: Settings
     seed: int
     threads: int
-    model: object       # path of the model directory
-    report: object      # path of the report folder
-    quarn: object       # path of the executable, or None
-    say: object         # takes a line for the user
+    model: Path                 # the model directory
+    report: Path                # the report folder
+    quarn: Optional[str]        # path of the executable
+    say: Callable[[str], None]  # takes a line for the user
     progress: bool
 
 
@@ -39,13 +46,13 @@ class Targets:
     """What the network learns: deltas, or coefficients of principal shapes."""
 
     count: int
-    of: object              # float32 [n, count] for an array of sorted rows, root mean square about 1
-    unit: float             # by which the network's last layer is scaled
-    shapes: object = None   # float32 [S, 3 * D] that the scaled outputs are coefficients of
-    explained: object = None
+    of: Callable[[np.ndarray], np.ndarray]  # float32 [n, count] for sorted rows, root mean square about 1
+    unit: float                             # by which the network's last layer is scaled
+    shapes: Optional[np.ndarray] = None     # float32 [S, 3 * D] that the scaled outputs are coefficients of
+    explained: Optional[float] = None
 
 
-def train(job):
+def train(job: Job) -> dict[str, Any]:
     """Trains, verifies and publishes. Returns the report."""
     start = time.monotonic()
     dataset, settings = job.dataset, job.settings
@@ -64,18 +71,18 @@ def train(job):
     return result
 
 
-def train_into(job, part, split):
+def train_into(job: Job, part: Path, split: Split) -> tuple[History, dict[str, Any]]:
     """Trains and writes the model's files. Returns the history and the report, without the seconds."""
     targets = make_targets(job, split[0])
     check_size(job.settings, job.dataset.control_count, targets.count)
-    network, normalisation, history = train_network(job, targets, split)
-    export_and_verify(job, part, network, normalisation, targets, split, history)
-    return history, summarise(job, network, normalisation, targets, split, history)
+    trained = train_network(job, targets, split)
+    export_and_verify(job, part, trained, targets, split)
+    return trained[2], summarise(job, trained, targets, split)
 
 
 # --- targets ---
 
-def make_targets(job, rows):
+def make_targets(job: Job, rows: np.ndarray) -> Targets:
     unit = root_mean_square(job.dataset, rows)
     if unit == 0:
         raise TrainerError(f"every delta of {job.dataset.folder} is 0: check that the targets were connected when it "
@@ -83,12 +90,12 @@ def make_targets(job, rows):
     return principal_targets(job, rows) if job.settings.principalShapesEnabled else direct_targets(job, unit)
 
 
-def root_mean_square(dataset, rows):
+def root_mean_square(dataset: Dataset, rows: np.ndarray) -> float:
     total = sum(float(np.sum(np.square(block, dtype=np.float64))) for _, block in dataset.blocks(rows))
     return float(np.sqrt(total / (len(rows) * dataset.deltas.shape[1])))
 
 
-def direct_targets(job, unit):
+def direct_targets(job: Job, unit: float) -> Targets:
     deltas = job.dataset.deltas
     if memory.holds(deltas.nbytes, job.settings.preloadData, job.say):
         deltas = np.array(deltas)
@@ -96,7 +103,7 @@ def direct_targets(job, unit):
     return Targets(deltas.shape[1], lambda rows: np.asarray(deltas[rows]) * scale, unit)
 
 
-def principal_targets(job, rows):
+def principal_targets(job: Job, rows: np.ndarray) -> Targets:
     dataset, settings = job.dataset, job.settings
     basis = principal_basis(dataset, rows, settings.principalShapesLimit, settings.principalShapesAccuracy, job.seed)
     job.say(f"{len(basis.shapes)} principal shapes hold {100 * basis.explained:.2f} % of the deltas")
@@ -116,13 +123,13 @@ def principal_targets(job, rows):
 
 # --- training and export ---
 
-def train_network(job, targets, split):
+def train_network(job: Job, targets: Targets, split: Split) -> Trained:
     dataset, settings = job.dataset, job.settings
     normalisation = measure_controls(dataset.controls[split[0]], targets.unit)
     if normalisation.still.any():
         names = [dataset.description["controlNames"][i] for i in np.flatnonzero(normalisation.still)]
-        job.say(f"{len(names)} of {dataset.control_count} controls never move in these frames and get no influence, as of a "
-                f"joint that turns about one axis only: {', '.join(names[:5])}"
+        job.say(f"{len(names)} of {dataset.control_count} controls never move in these frames and get no influence, "
+                f"as of a joint that turns about one axis only: {', '.join(names[:5])}"
                 + (", ..." if len(names) > 5 else ""))
     weights = 4 * parameter_count(settings, dataset.control_count, targets.count)
     job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
@@ -136,8 +143,9 @@ def train_network(job, targets, split):
     return network, normalisation, history
 
 
-def export_and_verify(job, part, network, normalisation, targets, split, history):
+def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split) -> None:
     """Writes the model's files, runs them as others will, and refuses them where the outputs differ."""
+    network, normalisation, history = trained
     model = export.onnx_model(network, normalisation, "deltas" if targets.shapes is None else "weights")
     metadata = export.metadata(job.dataset, job.settings, job.seed)
     if history.interrupted:
@@ -155,7 +163,7 @@ def export_and_verify(job, part, network, normalisation, targets, split, history
     compare(outputs, wanted, targets.unit, "the network as quarn runs it")
 
 
-def compare(found, wanted, unit, called):
+def compare(found: np.ndarray, wanted: np.ndarray, unit: float, called: str) -> None:
     if found.shape != wanted.shape:
         raise TrainerError(f"{called} gives {list(found.shape)} numbers where {list(wanted.shape)} are right: it is "
                            "not published")
@@ -165,13 +173,15 @@ def compare(found, wanted, unit, called):
                            f"{TOLERANCE * unit:g}: it is not published")
 
 
-def report_rows(split):
+def report_rows(split: Split) -> np.ndarray:
     """Rows that errors are measured on: those held out, or all where none was."""
     return split[1] if len(split[1]) else split[0]
 
 
-def summarise(job, network, normalisation, targets, split, history):
-    def deltas_of(controls):
+def summarise(job: Job, trained: Trained, targets: Targets, split: Split) -> dict[str, Any]:
+    network, normalisation, history = trained
+
+    def deltas_of(controls: np.ndarray) -> np.ndarray:
         outputs = predict(network, normalisation, controls)
         return outputs if targets.shapes is None else outputs @ targets.shapes
 

@@ -4,14 +4,18 @@
 import signal
 import sys
 from contextlib import contextmanager
+from types import FrameType
+from typing import Callable, Iterator, Optional
 
 from tqdm import tqdm
+
+from .training import History
 
 LINES = 20  # where there is no terminal to draw a bar on
 
 
 @contextmanager
-def counted(epochs, say, shown):
+def counted(epochs: int, say: Callable[[str], None], shown: bool) -> Iterator[Callable[[History], None]]:
     """Gives what fit() calls after each epoch: it moves a bar on a terminal; where there is none it says some lines."""
     if shown and sys.stderr.isatty():
         with tqdm(total=epochs, unit="epoch", leave=False) as bar:
@@ -20,22 +24,22 @@ def counted(epochs, say, shown):
         yield lambda history: say_line(len(history.train), epochs, history, say)
 
 
-def move(bar, history):
+def move(bar: tqdm, history: History) -> None:
     bar.set_postfix(loss=f"{history.train[-1]:.2e}", best=f"{history.best_loss:.2e}", refresh=False)
     bar.update()
 
 
-def say_line(done, epochs, history, say):
+def say_line(done: int, epochs: int, history: History, say: Callable[[str], None]) -> None:
     if done * LINES // epochs > (done - 1) * LINES // epochs:
         say(f"epoch {done} of {epochs}: loss {history.train[-1]:.2e}, best {history.best_loss:.2e}")
 
 
 @contextmanager
-def noted_interrupt():
+def noted_interrupt() -> Iterator[Callable[[], bool]]:
     """Gives what tells whether the user has pressed Ctrl-C in the meantime. A second one ends the program at once."""
-    asked = []
+    asked: list[int] = []
 
-    def on_interrupt(number, frame):
+    def on_interrupt(number: int, frame: Optional[FrameType]) -> None:
         asked.append(number)
         signal.signal(signal.SIGINT, signal.default_int_handler)
         print("trainer: interrupted: the training ends with the best network so far (Ctrl-C again: without)",

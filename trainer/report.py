@@ -4,18 +4,21 @@
 import io
 import json
 import os
+from pathlib import Path
+from typing import Any
 
-from trainer.files import write_bytes
+from .files import write_bytes
+from .training import History
 
 NAMES = ("report.json", "loss.png")
 
 
-def write_report(folder, report, history):
+def write_report(folder: Path, report: dict[str, Any], history: History) -> None:
     write_bytes(folder / "report.json", (json.dumps(report, indent=1, allow_nan=False) + "\n").encode())
     draw_losses(folder / "loss.png", history)
 
 
-def draw_losses(path, history):
+def draw_losses(path: Path, history: History) -> None:
     os.environ.setdefault("MPLBACKEND", "Agg")
     from matplotlib.backends.backend_agg import FigureCanvasAgg
     from matplotlib.figure import Figure

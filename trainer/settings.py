@@ -3,8 +3,9 @@
 
 import math
 from dataclasses import dataclass, fields, replace
+from typing import Any, Callable
 
-from trainer.errors import TrainerError
+from .errors import TrainerError
 
 ACTIVATIONS = ("Sigmoid", "Tanh", "ReLU", "LeakyReLU", "Linear")
 
@@ -46,16 +47,16 @@ MEANINGS = {
     "preloadData": "hold the deltas in memory; the model is the same without",
     "patience": "stop after so many epochs without a better validation loss",
 }
-LIMITS = {
+LIMITS: dict[str, tuple[float, float]] = {
     "batchSize": (1, 100000), "epochs": (1, 100000), "learningRate": (0, 1), "validationRatio": (0, 0.99),
     "hiddenLayerCount": (1, 100), "neuronsPerLayer": (1, 100000), "dropoutRatio": (0, 1),
     "principalShapesLimit": (1, 500), "principalShapesAccuracy": (0, 1), "patience": (1, 100000),
 }
-KINDS = {field.name: field.type for field in fields(Settings)}
+KINDS: dict[str, type] = {field.name: field.type for field in fields(Settings)}
 WORDS = {bool: "true or false", int: "a whole number", float: "a number", str: "a text"}
 
 
-def described(name):
+def described(name: str) -> str:
     """Meaning, limits and default of a setting, for a help text."""
     facts = [f"{LIMITS[name][0]} to {LIMITS[name][1]}"] if name in LIMITS else []
     default = getattr(Settings(), name)
@@ -64,7 +65,7 @@ def described(name):
     return MEANINGS[name] + (f" ({', '.join(facts)})" if facts else "")
 
 
-def read_settings(train, where):
+def read_settings(train: object, where: str) -> Settings:
     """Settings from the "train" object of a data set; what it lacks has the defaults. `where` names it in errors."""
     if not isinstance(train, dict):
         raise TrainerError(f"{where} is {train!r}, not an object of settings")
@@ -72,7 +73,7 @@ def read_settings(train, where):
     return checked(known, lambda name: f"{where}.{name}")
 
 
-def override(settings, changes, flag_of):
+def override(settings: Settings, changes: dict[str, Any], flag_of: Callable[[str], str]) -> Settings:
     """Settings with `changes`, a dictionary; `flag_of` gives the name by which an error calls a setting."""
     checked(changes, flag_of)
     changed = replace(settings, **normalised(changes))
@@ -84,13 +85,13 @@ def override(settings, changes, flag_of):
     return changed
 
 
-def checked(values, name_of):
+def checked(values: dict[str, Any], name_of: Callable[[str], str]) -> Settings:
     for name, value in values.items():
         check_value(name, value, name_of(name))
     return Settings(**normalised(values))
 
 
-def check_value(name, value, called):
+def check_value(name: str, value: Any, called: str) -> None:
     kind = KINDS[name]
     fits = isinstance(value, (int, float) if kind is float else kind) and (kind is bool or not isinstance(value, bool))
     if not fits:
@@ -102,7 +103,7 @@ def check_value(name, value, called):
         raise TrainerError(f"{called} is {value}, not between {low} and {high}")
 
 
-def normalised(values):
+def normalised(values: dict[str, Any]) -> dict[str, Any]:
     """The activation function with the capitals of its label."""
     labels = {label.lower(): label for label in ACTIVATIONS}
     return {name: labels[value.lower()] if name == "activationFunction" else value for name, value in values.items()}

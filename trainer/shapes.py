@@ -12,6 +12,8 @@ from dataclasses import dataclass
 import numpy as np
 import scipy.linalg
 
+from .dataset import Dataset
+
 EXACT_SIDE = 2048        # largest matrix whose eigenvectors are computed: some seconds
 OVERSAMPLING = 10        # Halko et al., section 4.2: 5 or 10
 POWER_ITERATIONS = 3
@@ -23,11 +25,11 @@ class Basis:
     shapes: np.ndarray   # float32 [S, 3 * D], orthonormal rows
     explained: float     # part of the sum of squares of the deltas that the shapes hold
 
-    def coefficients(self, deltas):
+    def coefficients(self, deltas: np.ndarray) -> np.ndarray:
         return deltas @ self.shapes.T
 
 
-def principal_basis(dataset, rows, limit, accuracy, seed):
+def principal_basis(dataset: Dataset, rows: np.ndarray, limit: int, accuracy: float, seed: int) -> Basis:
     """The fewest shapes, at most `limit`, that hold `accuracy` (0 to 1) of the sum of squares of the deltas of `rows`.
 
     At least one. The same arguments give the same bits on one machine.
@@ -43,7 +45,7 @@ def principal_basis(dataset, rows, limit, accuracy, seed):
     return Basis(with_fixed_signs(vectors[:count]).astype(np.float32), float(min(1.0, parts[count - 1])))
 
 
-def exact(dataset, rows, limit):
+def exact(dataset: Dataset, rows: np.ndarray, limit: int) -> tuple[np.ndarray, np.ndarray, float]:
     """The first right singular vectors [limit, 3 * D], singular values and the sum of squares of all deltas."""
     tall = len(rows) > dataset.deltas.shape[1]
     gram = inner_products(dataset, rows) if tall else outer_products(dataset, rows)
@@ -56,7 +58,7 @@ def exact(dataset, rows, limit):
     return vectors, values, np.trace(gram)
 
 
-def inner_products(dataset, rows):
+def inner_products(dataset: Dataset, rows: np.ndarray) -> np.ndarray:
     gram = np.zeros((dataset.deltas.shape[1],) * 2)
     for _, block in dataset.blocks(rows):
         block = block.astype(np.float64)
@@ -64,7 +66,7 @@ def inner_products(dataset, rows):
     return gram
 
 
-def outer_products(dataset, rows):
+def outer_products(dataset: Dataset, rows: np.ndarray) -> np.ndarray:
     """X X^T, by columns: each product sees all rows of a few columns."""
     gram = np.zeros((len(rows),) * 2)
     step = max(1, (64 << 20) // (8 * len(rows)))
@@ -74,7 +76,7 @@ def outer_products(dataset, rows):
     return gram
 
 
-def times_deltas(dataset, rows, left):
+def times_deltas(dataset: Dataset, rows: np.ndarray, left: np.ndarray) -> np.ndarray:
     """left [k, rows] times X: [k, 3 * D]."""
     product, done = np.zeros((len(left), dataset.deltas.shape[1])), 0
     for part, block in dataset.blocks(rows):
@@ -83,7 +85,8 @@ def times_deltas(dataset, rows, left):
     return product
 
 
-def randomized(dataset, rows, limit, seed):
+def randomized(dataset: Dataset, rows: np.ndarray, limit: int,
+               seed: int) -> tuple[np.ndarray, np.ndarray, float]:
     size = min(limit + OVERSAMPLING, len(rows), dataset.deltas.shape[1])
     right = np.linalg.qr(np.random.default_rng(seed).standard_normal((dataset.deltas.shape[1], size)))[0]
     for _ in range(POWER_ITERATIONS):
@@ -95,11 +98,11 @@ def randomized(dataset, rows, limit, seed):
     return (turn @ right.T)[:limit], values[:limit], total
 
 
-def deltas_times(dataset, rows, right):
+def deltas_times(dataset: Dataset, rows: np.ndarray, right: np.ndarray) -> np.ndarray:
     return np.concatenate([block.astype(np.float64) @ right for _, block in dataset.blocks(rows)])
 
 
-def with_fixed_signs(vectors):
+def with_fixed_signs(vectors: np.ndarray) -> np.ndarray:
     """A singular vector has no sign of its own: the entry of largest magnitude becomes positive."""
     largest = np.argmax(np.abs(vectors), axis=1)
     return vectors * np.where(vectors[np.arange(len(vectors)), largest] < 0, -1.0, 1.0)[:, None]

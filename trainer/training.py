@@ -4,29 +4,35 @@
 import copy
 import math
 from dataclasses import dataclass, field
+from typing import Callable, Optional
 
 import numpy as np
 import torch
+from torch import nn
 
-from trainer.errors import TrainerError
+from .errors import TrainerError
+from .settings import Settings
+
+Split = tuple[np.ndarray, np.ndarray]             # rows to train on, rows to validate on
+TargetsOf = Callable[[np.ndarray], np.ndarray]    # normalised outputs, float32 [n, K], for sorted rows
 
 
 @dataclass
 class History:
-    train: list = field(default_factory=list)       # mean loss of each epoch
-    validation: list = field(default_factory=list)  # empty without validation rows
+    train: list[float] = field(default_factory=list)       # mean loss of each epoch
+    validation: list[float] = field(default_factory=list)  # empty without validation rows
     best_epoch: int = 0                             # from 1
     best_loss: float = math.inf
     interrupted: bool = False                       # by the user, who gets what was best until then
 
 
-def make_deterministic(seed, threads):
+def make_deterministic(seed: int, threads: int) -> None:
     torch.manual_seed(seed)
     torch.use_deterministic_algorithms(True)
     torch.set_num_threads(threads)
 
 
-def split_rows(count, ratio, seed):
+def split_rows(count: int, ratio: float, seed: int) -> Split:
     """Sorted rows to train on, and rows to validate on, drawn at random: the poses of a data set are in no order.
 
     At least one row is left to train on; with a ratio above 0 and two rows, one validates."""
@@ -35,7 +41,8 @@ def split_rows(count, ratio, seed):
     return np.sort(order[held:]), np.sort(order[:held])
 
 
-def fit(network, inputs, targets_of, split, settings, seed, on_epoch, is_interrupted):
+def fit(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, split: Split, settings: Settings, seed: int,
+        on_epoch: Callable[[History], None], is_interrupted: Callable[[], bool]) -> History:
     """Trains `network` and leaves it with its best weights.
 
     inputs          float32 [F, C], normalised controls of all rows
@@ -75,12 +82,14 @@ def fit(network, inputs, targets_of, split, settings, seed, on_epoch, is_interru
     return history
 
 
-def cut(rows, size):
+def cut(rows: np.ndarray, size: int) -> list[np.ndarray]:
     """Batches, each in ascending order, in which rows are best read from a file."""
     return [np.sort(rows[first:first + size]) for first in range(0, len(rows), size)]
 
 
-def train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch, steps, is_interrupted):
+def train_epoch(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray],
+                optimizer: torch.optim.Optimizer, settings: Settings, epoch: int, steps: int,
+                is_interrupted: Callable[[], bool]) -> Optional[float]:
     """The mean loss; None where the epoch was not finished."""
     network.train()
     total = 0.0
@@ -98,12 +107,12 @@ def train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch
     return total / sum(map(len, batches))
 
 
-def mean_loss(network, inputs, targets_of, batches):
+def mean_loss(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray]) -> float:
     network.eval()
     with torch.no_grad():
         total = sum(float(batch_loss(network, inputs, targets_of, batch)) * len(batch) for batch in batches)
     return total / sum(map(len, batches))
 
 
-def batch_loss(network, inputs, targets_of, batch):
+def batch_loss(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, batch: np.ndarray) -> torch.Tensor:
     return torch.nn.functional.mse_loss(network(torch.from_numpy(inputs[batch])), torch.from_numpy(targets_of(batch)))

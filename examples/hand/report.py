@@ -12,9 +12,12 @@ import html
 import json
 import sys
 from pathlib import Path
+from typing import Any, Optional
 
 import numpy as np
 from PIL import Image
+
+Json = dict[str, Any]
 
 MODES, KINDS = ("surface", "offset"), ("principal", "direct")
 STAGES = ("skin", "base", "basis", "network")
@@ -23,17 +26,17 @@ MEAN_LIMIT, MAX_LIMIT = 1 / 5, 1 / 2
 PERCENTILES = {"p99": 99, "p9999": 99.99}
 
 
-def read_json(path):
+def read_json(path: Path) -> Any:
     with open(path, encoding="utf-8") as file:
         return json.load(file)
 
 
-def distances(points, target, scale):
+def distances(points: np.ndarray, target: np.ndarray, scale: float) -> np.ndarray:
     """Of each vertex in each frame from the target, in mm: [frames, vertices]."""
     return np.linalg.norm(points.astype(np.float64) - target.astype(np.float64), axis=2) * scale
 
 
-def statistics(errors, diagonal_mm):
+def statistics(errors: np.ndarray, diagonal_mm: float) -> Json:
     """Mean, percentiles and largest of distances in mm, the same in % of the diagonal, and where the largest is."""
     values = {"mean": float(errors.mean()), "max": float(errors.max())}
     values.update({name: float(np.percentile(errors, part)) for name, part in PERCENTILES.items()})
@@ -45,13 +48,13 @@ def statistics(errors, diagonal_mm):
     }
 
 
-def jitter(points, scale):
+def jitter(points: np.ndarray, scale: float) -> float:
     """Largest second difference over the motion, in mm: what shows as popping."""
     second = points[2:].astype(np.float64) - 2 * points[1:-1] + points[:-2]
     return float(np.linalg.norm(second, axis=2).max() * scale)
 
 
-def judged(stage):
+def judged(stage: Optional[Json]) -> Optional[Json]:
     """The trainer's figures of one stage, with the names of the report; none where the stage does not exist."""
     if stage is None:
         return None
@@ -63,7 +66,7 @@ def judged(stage):
     }
 
 
-def require_agreement(name, measured, by_quarn):
+def require_agreement(name: str, measured: Json, by_quarn: Json) -> None:
     """The plug-in's player and this script see the same files: their figures are the same."""
     for figure in ("mean", "max"):
         difference = abs(measured[f"{figure}_mm"] - by_quarn["mm"][figure])
@@ -71,11 +74,11 @@ def require_agreement(name, measured, by_quarn):
             sys.exit(f"report.py: {name}: {figure} differs by {difference:g} mm from what quarn play measured")
 
 
-def times(played):
+def times(played: Json) -> Json:
     return {"median_ms": played["medianMs"], "p99_ms": played["p99Ms"]}
 
 
-def gpu_of_row(played, on_cpu, on_gpu, scale, diagonal_mm):
+def gpu_of_row(played: Json, on_cpu: np.ndarray, on_gpu: np.ndarray, scale: float, diagonal_mm: float) -> Json:
     """Where and how fast the OpenCL device played the motion, and how far it came out from the CPU."""
     use = played["gpu"]
     return {
@@ -87,7 +90,7 @@ def gpu_of_row(played, on_cpu, on_gpu, scale, diagonal_mm):
     }
 
 
-def row_of_report(data, mode, kind):
+def row_of_report(data: Path, mode: str, kind: str) -> Json:
     name = f"{mode}_{kind}"
     played, on_device, evaluated = (read_json(data / "results" / name / f"{what}.json")
                                     for what in ("play_cpu", "play_gpu", "evaluate"))
@@ -95,7 +98,7 @@ def row_of_report(data, mode, kind):
     skin, target, network, network_gpu = (np.load(data / f"motion_{what}.npy")
                                           for what in ("skin", "target", f"{name}_cpu", f"{name}_gpu"))
     diagonal = played["boxDiagonalMm"]
-    errors = {
+    errors: Json = {
         "skin": statistics(distances(skin, target, scale), diagonal),
         "base": judged(evaluated["base"]),
         "basis": judged(evaluated.get("basis")),
@@ -116,7 +119,7 @@ def row_of_report(data, mode, kind):
     }
 
 
-def make_report(folder):
+def make_report(folder: Path) -> Json:
     data = folder / "data"
     # a demo that was not asked for --all has no direct models
     trained = [(mode, kind) for mode in MODES for kind in KINDS if (data / "results" / f"{mode}_{kind}").is_dir()]
@@ -136,13 +139,13 @@ def make_report(folder):
     }
 
 
-def cell(stage):
+def cell(stage: Optional[Json]) -> str:
     if stage is None:
         return f"{'-':>23}"
     return f"{stage['mean_mm']:7.3f} {stage['p99_mm']:7.3f} {stage['max_mm']:7.3f}"
 
 
-def table(report):
+def table(report: Json) -> str:
     """The errors in mm as text: a line a row, mean, p99 and maximum of each stage."""
     lines = [f"{'mm: mean, p99, max':18}" + "".join(f" | {stage:^23}" for stage in STAGES) +
              " |  mean   max | ms CPU   GPU | GPU from CPU, max"]
@@ -155,7 +158,7 @@ def table(report):
     return "\n".join(lines) + "\n" + device_line(report) + "\n"
 
 
-def device_line(report):
+def device_line(report: Json) -> str:
     """What "GPU" stands for in this report."""
     used = [row["gpu"] for row in report["rows"]]
     if any(gpu["deformations"] == 0 for gpu in used):
@@ -163,7 +166,7 @@ def device_line(report):
     return f"GPU: {used[0]['device']}"
 
 
-def write_preview(folder):
+def write_preview(folder: Path) -> Path:
     """All frames of the preview as one looping picture."""
     frames = [Image.open(path).convert("RGB") for path in sorted((folder / "data" / "preview").glob("*.png"))]
     if not frames:
@@ -173,7 +176,7 @@ def write_preview(folder):
     return path
 
 
-def embedded(path, text):
+def embedded(path: Path, text: str) -> str:
     kind = path.suffix.lstrip(".")
     content = base64.b64encode(path.read_bytes()).decode("ascii")
     return f'<img alt="{html.escape(text)}" src="data:image/{kind};base64,{content}">'
@@ -190,7 +193,7 @@ small { color: #5b6675; }
 """
 
 
-def html_cells(stage, best=False):
+def html_cells(stage: Optional[Json], best: bool = False) -> str:
     if stage is None:
         return "<td>-</td>" * 3
     mark = ' class="best"' if best else ""
@@ -198,7 +201,7 @@ def html_cells(stage, best=False):
     return "".join(f"<td{mark}>{mm:.3f}<br><small>{percent:.3f} %</small></td>" for mm, percent in figures)
 
 
-def html_table(report):
+def html_table(report: Json) -> str:
     head = "".join(f'<th colspan="3">{stage}</th>' for stage in STAGES)
     names = "<th>mean</th><th>p99</th><th>max</th>" * len(STAGES)
     lines = [f"<tr><th></th>{head}<th colspan='2'>network, part of before</th><th colspan='2'>CPU, ms a frame</th>"
@@ -214,30 +217,33 @@ def html_table(report):
     return "<table>" + "\n".join(lines) + "</table>"
 
 
-def html_worst(report):
+def html_worst(report: Json) -> str:
     items = []
     for row in report["rows"]:
         network, moves = row["network"], row["jitter_mm"]
         items.append(f"<li>{row['mode']}, {row['kind']}: p99.99 {network['p9999_mm']:.3f} mm; worst at vertex "
-                     f"{network['worst']['vertex']} in frame {network['worst']['frame']}; jitter {moves['network']:.3f} mm, "
+                     f"{network['worst']['vertex']} in frame {network['worst']['frame']}; "
+                     f"jitter {moves['network']:.3f} mm, "
                      f"of the target {moves['target']:.3f} mm, of the skin {moves['skin']:.3f} mm</li>")
     return "<ul>" + "".join(items) + "</ul>"
 
 
-def caption(path):
+def caption(path: Path) -> str:
     """Of a still, motion.0020.png or offset.0060.png: whose network it shows, and the frame."""
     name, frame = path.stem.split(".")
     return f"{'offsets' if name == 'offset' else 'surface deltas'}, principal shapes, frame {int(frame)}"
 
 
-def html_page(folder, report, preview):
+def html_page(folder: Path, report: Json, preview: Path) -> str:
     stills = "".join(f"<p>{embedded(path, path.stem)}<br><small>{caption(path)}</small></p>"
                      for path in sorted((folder / "pictures").glob("*.png")))
-    losses = "".join(f"<h3>{mode}, {kind}</h3>" + embedded(folder / "data" / "results" / f"{mode}_{kind}" / "loss.png",
-                                                          f"loss curves, {mode}, {kind}")
+    results = folder / "data" / "results"
+    losses = "".join(f"<h3>{mode}, {kind}</h3>" + embedded(results / f"{mode}_{kind}" / "loss.png",
+                                                           f"loss curves, {mode}, {kind}")
                      for mode, kind in ((row["mode"], row["kind"]) for row in report["rows"]))
     return f"""<!DOCTYPE html>
-<html lang="en"><head><meta charset="utf-8"><title>A hand that keeps its volume</title><style>{STYLE}</style></head><body>
+<html lang="en"><head><meta charset="utf-8"><title>A hand that keeps its volume</title><style>{STYLE}</style></head>
+<body>
 <h1>A hand that keeps its volume</h1>
 <p>{embedded(preview, "skin, target, neural and error, in motion")}</p>
 <p>A motion that the networks have not seen: linear skinning, the target shapes, the mesh that the deformer makes
@@ -245,9 +251,10 @@ with a network, and the distance that is left. {report['vertices']} vertices, {r
 {report['poses']} training poses, {report['epochs']} epochs.</p>
 <h2>Errors on the held-out motion, in mm and in % of the bounding box's diagonal</h2>
 {html_table(report)}
-<p><small>skin: linear skinning alone. base: the deformer with deltas of zero (in surface mode the rest surface carried by
-smoothed frames). basis: the best that the principal shapes could do. network: the trained model, through the plug-in.
-The part of before is of the smaller of skin and base; asked for are {MEAN_LIMIT:g} in the mean and {MAX_LIMIT:g} at most.
+<p><small>skin: linear skinning alone. base: the deformer with deltas of zero (in surface mode the rest surface carried
+by smoothed frames). basis: the best that the principal shapes could do. network: the trained model, through the
+plug-in. The part of before is of the smaller of skin and base; asked for are {MEAN_LIMIT:g} in the mean and
+{MAX_LIMIT:g} at most.
 {html.escape(device_line(report))}. GPU from CPU: the largest distance of a vertex between the two.</small></p>
 <h2>Where it is worst, and how smooth</h2>
 {html_worst(report)}
@@ -259,7 +266,7 @@ The part of before is of the smaller of skin and base; asked for are {MEAN_LIMIT
 """
 
 
-def main():
+def main() -> None:
     parser = argparse.ArgumentParser(description="The report of a demo.")
     parser.add_argument("folder", type=Path, help="what ./run demo calls its output folder")
     parser.add_argument("--judge", action="store_true", help="end with status 1 when the limits are not kept")
@@ -271,7 +278,8 @@ def main():
     (folder / "report.html").write_text(html_page(folder, report, write_preview(folder)), encoding="utf-8")
     print(table(report), end="")
     if arguments.judge and not report["limits"]["kept"]:
-        sys.exit(f"report.py: the network leaves more than {MEAN_LIMIT:g} of the mean or {MAX_LIMIT:g} of the largest error")
+        sys.exit(f"report.py: the network leaves more than {MEAN_LIMIT:g} of the mean or {MAX_LIMIT:g} of the largest "
+                 "error")
 
 
 if __name__ == "__main__":

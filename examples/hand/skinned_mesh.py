@@ -3,9 +3,12 @@
 
 import json
 from dataclasses import dataclass
+from typing import Any, Iterator, Optional
 
 import numpy as np
 from scipy import sparse
+
+Json = dict[str, Any]
 
 
 class BadInput(Exception):
@@ -23,7 +26,7 @@ class SkinnedMesh:
     weights: sparse.csr_matrix
 
 
-def read_skinned_mesh(path, mesh_name=None):
+def read_skinned_mesh(path: str, mesh_name: Optional[str] = None) -> SkinnedMesh:
     """The one mesh in the scene at `path` that a skinCluster deforms at index 0, or the one named `mesh_name`.
 
     Raises BadInput."""
@@ -38,7 +41,7 @@ def read_skinned_mesh(path, mesh_name=None):
         raise BadInput(f"{path}: not a scene with a skinned mesh ({type(error).__name__}: {error})") from error
 
 
-def _read_json(path):
+def _read_json(path: str) -> Any:
     try:
         with open(path, encoding="utf-8") as file:
             return json.load(file)
@@ -48,17 +51,17 @@ def _read_json(path):
         raise BadInput(f"{path}: not JSON ({error})") from error
 
 
-def _skinned_meshes(nodes, sources):
+def _skinned_meshes(nodes: Json, sources: dict[str, str]) -> Iterator[tuple[str, Json]]:
     for name, node in nodes.items():
         mesh = sources.get(f"{name}.input[0].inputGeometry", "").rpartition(".")[0]
         if node["type"] == "skinCluster" and nodes.get(mesh, {}).get("type") == "mesh":
             yield mesh, node["values"]
 
 
-def _choose(path, found, wanted):
+def _choose(path: str, found: list[str], wanted: Optional[str]) -> str:
     if wanted is None and len(found) == 1:
         return found[0]
-    if wanted in found:
+    if wanted is not None and wanted in found:
         return wanted
     if not found:
         raise BadInput(f"{path}: no mesh node is connected into input[0].inputGeometry of a skinCluster")
@@ -67,7 +70,7 @@ def _choose(path, found, wanted):
     raise BadInput(f"{path}: has no skinned mesh '{wanted}'; it has {', '.join(found)}")
 
 
-def _build(path, name, mesh, skin):
+def _build(path: str, name: str, mesh: Json, skin: Json) -> SkinnedMesh:
     points = np.array(mesh["points"], dtype=float).reshape(-1, 3)
     counts = np.array(mesh["counts"], dtype=int)
     corners = np.array(mesh["corners"], dtype=int)
@@ -76,14 +79,14 @@ def _build(path, name, mesh, skin):
     return SkinnedMesh(name, points, _fans(counts, corners), _weights(path, name, skin, len(points)))
 
 
-def _fans(counts, corners):
+def _fans(counts: np.ndarray, corners: np.ndarray) -> np.ndarray:
     """Polygons as triangles, each a fan around its first corner."""
     starts = np.cumsum(counts) - counts
     fans = [(corners[s], corners[s + k], corners[s + k + 1]) for s, n in zip(starts, counts) for k in range(1, n - 1)]
     return np.array(fans, dtype=int).reshape(-1, 3)
 
 
-def _weights(path, name, skin, vertex_count):
+def _weights(path: str, name: str, skin: Json, vertex_count: int) -> sparse.csr_matrix:
     counts = np.array(skin["skin[0].influenceCounts"], dtype=int)
     influences = np.array(skin["skin[0].influences"], dtype=int)
     weights = np.array(skin["skin[0].skinWeights"], dtype=float)

@@ -8,6 +8,7 @@ import os
 import signal
 import sys
 import tempfile
+from typing import BinaryIO
 
 # a process is one thread: sums are made in one order, and jobs stay out of each other's way
 for variable in ("OMP_NUM_THREADS", "OPENBLAS_NUM_THREADS", "MKL_NUM_THREADS"):
@@ -18,13 +19,13 @@ from concurrent.futures.process import BrokenProcessPool  # noqa: E402
 
 import numpy as np  # noqa: E402
 from relaxation import Relaxation  # noqa: E402
-from skinned_mesh import BadInput, read_skinned_mesh  # noqa: E402
+from skinned_mesh import BadInput, SkinnedMesh, read_skinned_mesh  # noqa: E402
 
 CHUNK = 8  # frames that a process takes at once
 LINES = 20  # of progress, where there is no terminal
 
 
-def main():
+def main() -> None:
     arguments = parse_arguments()
     signal.signal(signal.SIGTERM, lambda *_: sys.exit(143))
     try:
@@ -41,7 +42,7 @@ def main():
         sys.exit(130)
 
 
-def parse_arguments():
+def parse_arguments() -> argparse.Namespace:
     parser = argparse.ArgumentParser(description=__doc__)
     parser.add_argument("scene", metavar="SCENE", help="scene file with the mesh at rest and its skinCluster")
     parser.add_argument("skin", metavar="SKIN.npy", help="the posed skin, [frames, vertices, 3] float32, object space")
@@ -53,13 +54,13 @@ def parse_arguments():
     return parser.parse_args()
 
 
-def positive(text):
+def positive(text: str) -> int:
     if not text.isdecimal() or int(text) == 0:
         raise argparse.ArgumentTypeError(f"'{text}' is not a whole number of at least 1")
     return int(text)
 
 
-def open_skin(path, mesh):
+def open_skin(path: str, mesh: SkinnedMesh) -> np.memmap:
     """The file as an array that is read as it is used. Raises BadInput where it does not fit the mesh."""
     try:
         skin = np.load(path, mmap_mode="r", allow_pickle=False)
@@ -81,18 +82,18 @@ def open_skin(path, mesh):
 class Worker:
     """What a process keeps between its chunks."""
 
-    relaxation = None
-    skin = None
+    relaxation: Relaxation
+    skin: np.memmap
 
 
-def start_worker(mesh, path):
+def start_worker(mesh: SkinnedMesh, path: str) -> None:
     signal.signal(signal.SIGINT, signal.SIG_IGN)  # the process that has started this one ends it
     signal.signal(signal.SIGTERM, signal.SIG_DFL)
     Worker.relaxation = Relaxation(mesh)
     Worker.skin = open_skin(path, mesh)
 
 
-def relax_chunk(first):
+def relax_chunk(first: int) -> tuple[np.ndarray, float, float]:
     """The relaxed frames from `first` on; of the distances that vertices moved the sum and the largest."""
     skin = np.array(Worker.skin[first:first + CHUNK], dtype=float)
     if not np.isfinite(skin).all():
@@ -105,7 +106,7 @@ def relax_chunk(first):
 
 # --- the file ---
 
-def write_targets(mesh, skin_path, frame_count, arguments):
+def write_targets(mesh: SkinnedMesh, skin_path: str, frame_count: int, arguments: argparse.Namespace) -> None:
     """The output appears when it is complete, or not at all."""
     folder, name = os.path.split(os.path.abspath(arguments.output))
     if not os.path.isdir(folder):
@@ -127,7 +128,8 @@ def write_targets(mesh, skin_path, frame_count, arguments):
               f"in the mean, {largest:.3g} at most (scene units)")
 
 
-def write_frames(file, mesh, skin_path, frame_count, arguments):
+def write_frames(file: BinaryIO, mesh: SkinnedMesh, skin_path: str, frame_count: int,
+                 arguments: argparse.Namespace) -> tuple[float, float]:
     total, largest, done = 0.0, 0.0, 0
     pool = ProcessPoolExecutor(arguments.jobs, initializer=start_worker, initargs=(mesh, skin_path))
     try:
@@ -140,7 +142,7 @@ def write_frames(file, mesh, skin_path, frame_count, arguments):
     return total, largest
 
 
-def show_progress(done, count, quiet):
+def show_progress(done: int, count: int, quiet: bool) -> None:
     """On a terminal one line that changes, elsewhere about twenty."""
     if not quiet and sys.stderr.isatty():
         print(f"\rrelaxing: {done} of {count}", end="\n" if done == count else "", file=sys.stderr, flush=True)
@@ -148,7 +150,7 @@ def show_progress(done, count, quiet):
         print(f"relaxing: {done} of {count}", flush=True)
 
 
-def current_umask():
+def current_umask() -> int:
     mask = os.umask(0)
     os.umask(mask)
     return mask

@@ -112,8 +112,9 @@ def body(prefix, nodes=(), constants=()):
     nodes = [*nodes, node("Add", [prefix + "v", added], [prefix + "w"]),
              node("Identity", [prefix + "c"], [prefix + "d"])]
     return helper.make_graph(
-        nodes, prefix + "round", [tensor(prefix + "i", [], TensorProto.INT64), tensor(prefix + "c", [], TensorProto.BOOL),
-                        tensor(prefix + "v", [3])],
+        nodes, prefix + "round",
+        [tensor(prefix + "i", [], TensorProto.INT64), tensor(prefix + "c", [], TensorProto.BOOL),
+         tensor(prefix + "v", [3])],
         [tensor(prefix + "d", [], TensorProto.BOOL), tensor(prefix + "w", [3])],
         [numpy_helper.from_array(np.asarray(value), key) for key, value in constants])
 

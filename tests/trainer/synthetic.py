@@ -3,15 +3,16 @@
 
 import json
 from pathlib import Path
+from typing import Any, Optional, Sequence
 
 import numpy as np
 
 COLUMNS, ROWS = 8, 6
 
 
-def make(folder, frames=160, seed=7, affect=None, train=None, constant_control=False, **changes):
+def make(folder: Path, frames: int = 160, seed: int = 7, affect: Optional[Sequence[int]] = None,
+         train: Optional[dict[str, Any]] = None, constant_control: bool = False, **changes: Any) -> Path:
     """A bulge and a twist on a grid of 48 vertices, for three controls. `affect`: vertices of a partial subset."""
-    folder = Path(folder)
     folder.mkdir(parents=True)
     random = np.random.default_rng(seed)
     controls = random.uniform(-1, 1, (frames, 3))
@@ -44,7 +45,7 @@ def make(folder, frames=160, seed=7, affect=None, train=None, constant_control=F
     return folder
 
 
-def deltas_of(controls):
+def deltas_of(controls: np.ndarray) -> np.ndarray:
     u, v = (a.ravel() for a in np.meshgrid(np.linspace(-1, 1, COLUMNS), np.linspace(-1, 1, ROWS)))
     a, b, c = controls.T[:, :, None]
     bulge = np.maximum(a, 0) ** 2 * np.exp(-2 * (u**2 + v**2))

@@ -14,6 +14,7 @@ import tempfile
 import time
 import unittest
 from pathlib import Path
+from typing import Any
 
 import synthetic
 from trainer.settings import KINDS, described
@@ -35,48 +36,50 @@ np.save(sys.argv[6], outputs + np.float32(os.environ.get("WRONG", "0")))
 
 
 class CommandTest(unittest.TestCase):
-    def setUp(self):
+    def setUp(self) -> None:
         place = tempfile.TemporaryDirectory()
         self.addCleanup(place.cleanup)
         self.place = Path(place.name)
         synthetic.make(self.place / "data", frames=60, train={"epochs": 4})
 
-    def environment(self, **more):
+    def environment(self, **more: str) -> dict[str, str]:
         kept = {key: value for key, value in os.environ.items() if key != "QUARN"}
         return {**kept, "PYTHONPATH": f"{ROOT}", **more}
 
-    def start(self, *arguments, largest_file=resource.RLIM_INFINITY, **environment):
-        def prepare():
+    def start(self, *arguments: object, largest_file: int = resource.RLIM_INFINITY,
+              **environment: str) -> "subprocess.Popen[str]":
+        def prepare() -> None:
             resource.setrlimit(resource.RLIMIT_FSIZE, (largest_file, resource.RLIM_INFINITY))
-            signal.signal(signal.SIGINT, signal.default_int_handler)  # a shell ignores it in what it puts in the background
+            # a shell ignores it in what it puts in the background
+            signal.signal(signal.SIGINT, signal.default_int_handler)
 
         return subprocess.Popen([sys.executable, "-m", "trainer", *map(str, arguments)], cwd=self.place, text=True,
                                 stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
                                 env=self.environment(**environment), preexec_fn=prepare)
 
-    def run_trainer(self, *arguments, status=0, **environment):
+    def run_trainer(self, *arguments: object, status: int = 0, **environment: Any) -> tuple[str, str]:
         process = self.start(*arguments, **environment)
         out, err = process.communicate()
         self.assertEqual(process.returncode, status, out + err)
         return out, err
 
-    def refused(self, *arguments, status=1, **environment):
+    def refused(self, *arguments: object, status: int = 1, **environment: Any) -> str:
         out, err = self.run_trainer(*arguments, status=status, **environment)
         self.assertRegex(err, r"\Atrainer: [^\n]+\n\Z")
         return err
 
-    def digest(self, name="arm.nwrp"):
+    def digest(self, name: str = "arm.nwrp") -> str:
         """Of the names and bytes of a model directory."""
         digest = hashlib.sha256()
         for path in sorted((self.place / "m" / name).iterdir()):
             digest.update(path.name.encode() + path.read_bytes())
         return digest.hexdigest()
 
-    def test_same_data_and_seed_give_the_same_files(self):
+    def test_same_data_and_seed_give_the_same_files(self) -> None:
         for more in ((), ("--principal-shapes", "--principal-accuracy", "0.95", "--dropout", "0.1")):
             digests = []
-            for last, environment in ((("--no-preload",), {}), ((), {"OMP_NUM_THREADS": "2"}), (("--seed", "2"), {})):
-                self.run_trainer(*TRAIN, *more, *last, **environment)
+            for last, threads in ((("--no-preload",), "1"), ((), "2"), (("--seed", "2"), "1")):
+                self.run_trainer(*TRAIN, *more, *last, OMP_NUM_THREADS=threads)
                 digests.append(self.digest())
             self.assertEqual(digests[0], digests[1])
             self.assertNotEqual(digests[0], digests[2])
@@ -84,7 +87,7 @@ class CommandTest(unittest.TestCase):
         self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
         self.assertFalse((self.place / "m/arm.nwrp/principal_shapes.json").exists())
 
-    def test_killed_at_any_time(self):
+    def test_killed_at_any_time(self) -> None:
         self.run_trainer(*TRAIN, "--epochs", "30")
         wanted = self.digest()
         self.run_trainer(*TRAIN, "--seed", "2")
@@ -100,7 +103,7 @@ class CommandTest(unittest.TestCase):
         self.assertEqual(self.digest(), wanted)
         self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
 
-    def test_interrupted(self):
+    def test_interrupted(self) -> None:
         """SIGTERM leaves nothing, Ctrl-C the best network so far; and nothing where there is none yet."""
         for number, after, status, said, left in (
                 (signal.SIGTERM, "validating on", 143, "", []),
@@ -109,6 +112,7 @@ class CommandTest(unittest.TestCase):
             # epochs of one step, or of many slow ones
             more = ("--batch-size", "100000") if left else ("--batch-size", "1", "--neurons", "3000")
             process = self.start(*TRAIN, "--epochs", "40000", "--patience", "40000", *more)
+            assert process.stdout
             while after not in process.stdout.readline():
                 self.assertIsNone(process.poll())
             process.send_signal(number)
@@ -122,17 +126,18 @@ class CommandTest(unittest.TestCase):
                 self.assertTrue(report["interrupted"] and 2000 <= report["epochs"] < 40000)
                 self.assertEqual(metadata["interruptedAfterEpochs"], report["epochs"])
 
-    def test_a_full_disk_is_told_with_the_file(self):
+    def test_a_full_disk_is_told_with_the_file(self) -> None:
         synthetic.make(self.place / "two", frames=60, affect=[1, 2])
         shapes = ("--principal-shapes", "--neurons", "2")
         for name, size, data, more in (
-                ("metadata.json", 500, "data", ()), ("model.onnx", 5000, "data", ()), ("loss.png", 15000, "data", shapes),
+                ("metadata.json", 500, "data", ()), ("model.onnx", 5000, "data", ()),
+                ("loss.png", 15000, "data", shapes),
                 ("principal_shapes.json", 1500, "data", shapes), ("report.json", 1250, "two", ("--neurons", "1"))):
             error = self.refused("train", data, *TRAIN[2:], "--quiet", "--epochs", "1", *more, largest_file=size)
             self.assertRegex(error, rf"arm\.\w+\.part/{name}: File too large")
             self.assertEqual(os.listdir(self.place / "m"), [])
 
-    def test_streams_and_errors(self):
+    def test_streams_and_errors(self) -> None:
         self.assertEqual(self.run_trainer(*TRAIN, "--quiet"), ("", ""))
         out, err = self.run_trainer(*TRAIN, "--json", "--report", "elsewhere")
         self.assertEqual(json.loads(out), json.loads((self.place / "elsewhere/report.json").read_text()))
@@ -156,7 +161,7 @@ class CommandTest(unittest.TestCase):
             for name in KINDS:
                 self.assertTrue(name == "outputModelName" or described(name) in said, (command, name))
 
-    def test_zero_model_and_evaluation(self):
+    def test_zero_model_and_evaluation(self) -> None:
         self.run_trainer("zero", "data", "-o", "m/zero")
         self.run_trainer(*TRAIN)
         zero = json.loads(self.run_trainer("evaluate", "data", "m/zero.nwrp", "--json", "--quarn", "none")[0])
@@ -166,7 +171,7 @@ class CommandTest(unittest.TestCase):
         synthetic.make(self.place / "part", affect=[1, 2])
         self.assertIn("do not belong together", self.refused("evaluate", "part", "m/arm.nwrp", "--quarn", "none"))
 
-    def test_quarn_has_the_last_word(self):
+    def test_quarn_has_the_last_word(self) -> None:
         quarn = self.place / "quarn"
         quarn.write_text(STAND_IN)
         quarn.chmod(quarn.stat().st_mode | stat.S_IXUSR)
@@ -180,7 +185,7 @@ class CommandTest(unittest.TestCase):
         self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
         self.assertIn("ran with quarn", self.run_trainer("evaluate", "data", "m/arm.nwrp", QUARN=str(quarn))[0])
 
-    def test_the_real_quarn_runs_every_kind_of_model(self):
+    def test_the_real_quarn_runs_every_kind_of_model(self) -> None:
         quarn = os.environ.get("NW_TEST_QUARN", "")
         if not quarn or "--run" not in subprocess.run([quarn, "info", "--help"], capture_output=True, text=True,
                                                       check=False).stdout:

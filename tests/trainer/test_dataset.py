@@ -5,6 +5,7 @@ import json
 import tempfile
 import unittest
 from pathlib import Path
+from typing import Any, Callable
 
 import numpy as np
 
@@ -13,10 +14,12 @@ from trainer.dataset import load_dataset
 from trainer.errors import TrainerError
 from trainer.settings import Settings, override
 
+Change = Callable[[Path], Any]  # of a data set, in its folder
 
-def described(**changes):
+
+def described(**changes: object) -> Change:
     """Changes keys of dataset.json; None takes a key away."""
-    def change(folder):
+    def change(folder: Path) -> None:
         path = folder / "dataset.json"
         description = json.loads(path.read_text())
         description.update(changes)
@@ -24,35 +27,35 @@ def described(**changes):
     return change
 
 
-def written(name, make):
-    def change(folder):
+def written(name: str, make: Callable[[np.ndarray], np.ndarray]) -> Change:
+    def change(folder: Path) -> None:
         np.save(folder / name, make(np.load(folder / name)))
     return change
 
 
-def cut(name, size):
-    def change(folder):
+def cut(name: str, size: int) -> Change:
+    def change(folder: Path) -> None:
         (folder / name).write_bytes((folder / name).read_bytes()[:size])
     return change
 
 
-def appended(name):
+def appended(name: str) -> Change:
     return lambda folder: (folder / name).write_bytes((folder / name).read_bytes() + b"x")
 
 
-def with_value(at, value):
-    def make(array):
+def with_value(at: object, value: float) -> Callable[[np.ndarray], np.ndarray]:
+    def make(array: np.ndarray) -> np.ndarray:
         array[at] = value
         return array
     return make
 
 
-def pickled(folder):
+def pickled(folder: Path) -> None:
     with open(folder / "deltas.npy", "wb") as file:
         np.lib.format.write_array(file, np.array([{}], object), allow_pickle=True)
 
 
-HOSTILE = [
+HOSTILE: list[tuple[Change, str]] = [
     (lambda folder: (folder / "dataset.json").unlink(), "has no dataset.json (only a complete one has)"),
     (lambda folder: (folder / "dataset.json").write_text("{"), "dataset.json is not JSON"),
     (lambda folder: (folder / "dataset.json").write_text("[" * 100000), "dataset.json is not JSON"),
@@ -100,7 +103,7 @@ HOSTILE = [
 
 
 class DatasetTest(unittest.TestCase):
-    def test_what_is_wrong_is_named(self):
+    def test_what_is_wrong_is_named(self) -> None:
         for spoil, wanted in HOSTILE:
             with self.subTest(wanted), tempfile.TemporaryDirectory() as place:
                 folder = synthetic.make(Path(place) / "data")
@@ -111,7 +114,7 @@ class DatasetTest(unittest.TestCase):
                 self.assertIn(str(folder), str(caught.exception))
                 self.assertNotIn("\n", str(caught.exception))
 
-    def test_digest_follows_every_file(self):
+    def test_digest_follows_every_file(self) -> None:
         with tempfile.TemporaryDirectory() as place:
             folder = synthetic.make(Path(place) / "data")
             digests = [load_dataset(folder).digest]
@@ -122,16 +125,16 @@ class DatasetTest(unittest.TestCase):
             self.assertEqual(len(set(digests)), 5)
             self.assertEqual(load_dataset(folder).digest, digests[-1])
 
-    def test_partial_subset_knows_its_vertices(self):
+    def test_partial_subset_knows_its_vertices(self) -> None:
         with tempfile.TemporaryDirectory() as place:
             dataset = load_dataset(synthetic.make(Path(place) / "data", affect=[40, 3, 17]))
             self.assertEqual([dataset.vertex(slot) for slot in range(3)], [40, 3, 17])
 
-    def test_settings_that_cannot_work(self):
-        for change in ({"learningRate": 0.0}, {"learningRate": float("nan")}, {"dropoutRatio": 1.0},
-                       {"validationRatio": 1.0}, {"batchSize": 0}, {"principalShapesLimit": 501}):
-            with self.subTest(change), self.assertRaises(TrainerError):
-                override(Settings(), change, str)
+    def test_settings_that_cannot_work(self) -> None:
+        for name, value in (("learningRate", 0.0), ("learningRate", float("nan")), ("dropoutRatio", 1.0),
+                            ("validationRatio", 1.0), ("batchSize", 0), ("principalShapesLimit", 501)):
+            with self.subTest(name, value=value), self.assertRaises(TrainerError):
+                override(Settings(), {name: value}, str)
         self.assertEqual(override(Settings(), {"activationFunction": "leakyrelu"}, str).activationFunction, "LeakyReLU")
 
 

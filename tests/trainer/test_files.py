@@ -14,28 +14,28 @@ NAMES = ("a", "b")
 
 
 class WholeFolderTest(unittest.TestCase):
-    def setUp(self):
+    def setUp(self) -> None:
         place = tempfile.TemporaryDirectory()
         self.addCleanup(place.cleanup)
         self.place = Path(place.name)
         self.target = self.place / "deep" / "model.nwrp"
 
-    def write(self, text):
+    def write(self, text: str) -> None:
         with files.whole_folder(self.target, NAMES) as part:
             (part / "a").write_text(text)
 
-    def content(self):
+    def content(self) -> dict[str, str]:
         self.assertEqual(os.listdir(self.target.parent), ["model.nwrp"])
         return {path.name: path.read_text() for path in self.target.iterdir()}
 
-    def test_replaces_with_and_without_an_exchange(self):
+    def test_replaces_with_and_without_an_exchange(self) -> None:
         for exchange in (files.exchange, lambda *_: False):
             with mock.patch.object(files, "exchange", exchange):
                 for text in ("one", "two"):
                     self.write(text)
                     self.assertEqual(self.content(), {"a": text})
 
-    def test_an_exception_leaves_what_was_there(self):
+    def test_an_exception_leaves_what_was_there(self) -> None:
         for error in (ValueError, KeyboardInterrupt):
             with self.assertRaises(error), files.whole_folder(self.target, NAMES) as part:
                 (part / "a").write_text("half")
@@ -47,7 +47,7 @@ class WholeFolderTest(unittest.TestCase):
             raise ValueError
         self.assertEqual(self.content(), {"a": "one"})
 
-    def test_what_killed_processes_left_is_removed(self):
+    def test_what_killed_processes_left_is_removed(self) -> None:
         left = self.target.with_name("model.nwrp.part")
         (left / "folder").mkdir(parents=True)
         (left / "b").write_text("half")
@@ -59,7 +59,7 @@ class WholeFolderTest(unittest.TestCase):
             raise ValueError
         self.assertEqual(self.content(), {"a": "one"})
 
-    def test_nothing_of_others_is_replaced(self):
+    def test_nothing_of_others_is_replaced(self) -> None:
         self.target.mkdir(parents=True)
         (self.target / "thesis.txt").write_text("years")
         with self.assertRaisesRegex(TrainerError, "thesis.txt, which would be lost"):
@@ -69,14 +69,14 @@ class WholeFolderTest(unittest.TestCase):
         with self.assertRaisesRegex(TrainerError, "is a file"), files.whole_folder(self.place / "file.nwrp", NAMES):
             pass
 
-    def test_one_writer_at_a_time(self):
+    def test_one_writer_at_a_time(self) -> None:
         with files.whole_folder(self.target, NAMES) as part:
             (part / "a").write_text("first")
             with self.assertRaisesRegex(TrainerError, "another process is writing"):
                 self.write("second")
         self.assertEqual(self.content(), {"a": "first"})
 
-    def test_names_of_models(self):
+    def test_names_of_models(self) -> None:
         for text, wanted in (("m/arm", "m/arm.nwrp"), ("m/arm.nwrp", "m/arm.nwrp"), ("arm.v2", "arm.v2.nwrp")):
             self.assertEqual(str(files.model_path(text)), wanted)
         with self.assertRaises(TrainerError):

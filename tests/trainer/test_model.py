@@ -6,6 +6,7 @@ import tempfile
 import unittest
 from dataclasses import replace
 from pathlib import Path
+from typing import Any
 from unittest import mock
 
 import numpy as np
@@ -21,26 +22,28 @@ from trainer.settings import ACTIVATIONS, Settings
 
 
 class ModelTest(unittest.TestCase):
-    def setUp(self):
+    def setUp(self) -> None:
         place = tempfile.TemporaryDirectory()
         self.addCleanup(place.cleanup)
         self.place = Path(place.name)
-        self.said = []
+        self.said: list[str] = []
 
-    def train(self, data, name="model", **changes):
+    def train(self, data: Path, name: str = "model", **changes: Any) -> dict[str, Any]:
         dataset = load_dataset(data)
         job = pipeline.Job(dataset, replace(dataset.settings, **changes), 1, 1, self.place / f"{name}.nwrp",
                            self.place / f"{name}.report", None, self.said.append, False)
         return pipeline.train(job)
 
-    def read(self, name):
+    def read(self, name: str) -> Any:
         return json.loads((self.place / name).read_text())
 
-    def test_errors_fall_well_below_the_base(self):
+    def test_errors_fall_well_below_the_base(self) -> None:
         data = synthetic.make(self.place / "data")
         motion = load_dataset(synthetic.make(self.place / "motion", seed=8, frames=50))
-        for changes in ({}, {"principalShapesEnabled": True, "principalShapesAccuracy": 0.999},
-                        {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"}):
+        variants: list[dict[str, Any]] = [
+                        {}, {"principalShapesEnabled": True, "principalShapesAccuracy": 0.999},
+                        {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"}]
+        for changes in variants:
             with self.subTest(changes):
                 report = self.train(data, **changes)
                 errors = report["errors"]
@@ -54,25 +57,28 @@ class ModelTest(unittest.TestCase):
                 left = np.abs(model.deltas(motion.controls) - motion.deltas).mean()
                 self.assertLess(left, 0.3 * np.abs(motion.deltas).mean())
 
-    def test_every_activation_exports_what_was_trained(self):
+    def test_every_activation_exports_what_was_trained(self) -> None:
         # pipeline.train() itself compares the file with PyTorch; a comparison that cannot fail would show here
         data = synthetic.make(self.place / "data", frames=30)
         for activation in ACTIVATIONS:
             for layers in (1, 3):
                 with self.subTest(activation, layers=layers):
                     self.train(data, activationFunction=activation, hiddenLayerCount=layers, epochs=2, dropoutRatio=0.2)
-        spoiled = lambda parameter, scale: 1.001 * parameter.detach().numpy() * scale
+
+        def spoiled(parameter: Any, scale: float) -> np.ndarray:
+            return 1.001 * parameter.detach().numpy() * scale
+
         with mock.patch.object(export, "scaled", spoiled), self.assertRaisesRegex(TrainerError, "is not published"):
             self.train(data, "other", epochs=2)
         self.assertFalse(any(self.place.glob("other*")))
 
-    def test_graph_is_of_the_form_that_the_deformer_reads(self):
+    def test_graph_is_of_the_form_that_the_deformer_reads(self) -> None:
         self.train(synthetic.make(self.place / "data", frames=20), epochs=1)
         graph = NumpyModel(self.place / "model.nwrp/model.onnx").graph
         dims = [[d.dim_value for d in value.type.tensor_type.shape.dim] for value in (graph.input[0], graph.output[0])]
         self.assertEqual((graph.input[0].name, graph.output[0].name, dims), ("controls", "deltas", [[3], [144]]))
 
-    def test_metadata_of_a_partial_subset(self):
+    def test_metadata_of_a_partial_subset(self) -> None:
         affect = [40, 3, 17, 21]
         report = self.train(synthetic.make(self.place / "data", affect=affect), epochs=2)
         metadata = self.read("model.nwrp/metadata.json")
@@ -82,16 +88,16 @@ class ModelTest(unittest.TestCase):
         self.assertIn(report["errors"]["network"]["worstVertex"], affect)
         self.assertTrue(101 <= report["errors"]["network"]["worstFrame"] < 261)
 
-    def test_a_control_that_never_moves_has_no_influence(self):
+    def test_a_control_that_never_moves_has_no_influence(self) -> None:
         data = synthetic.make(self.place / "data", constant_control=True)
         self.train(data, epochs=3)
         self.assertTrue(any("never move" in line and "joint3.rotateX" in line for line in self.said))
         model = ModelDirectory(self.place / "model.nwrp", None)
         controls = load_dataset(data).controls[:5]
-        moved = controls + np.float32([0, 0, 0, 100])
+        moved = controls + np.array([0, 0, 0, 100], np.float32)
         np.testing.assert_array_equal(model.deltas(controls), model.deltas(moved))
 
-    def test_small_and_empty_data(self):
+    def test_small_and_empty_data(self) -> None:
         self.assertEqual(self.train(synthetic.make(self.place / "one", frames=1), epochs=3)["heldOut"], False)
         self.train(synthetic.make(self.place / "two", frames=2), epochs=3, principalShapesEnabled=True)
         still = synthetic.make(self.place / "still")
@@ -99,7 +105,7 @@ class ModelTest(unittest.TestCase):
         with self.assertRaisesRegex(TrainerError, "every delta .* is 0"):
             self.train(still)
 
-    def test_training_ends_early_and_keeps_the_best(self):
+    def test_training_ends_early_and_keeps_the_best(self) -> None:
         data = synthetic.make(self.place / "data", frames=30)
         report = self.train(data, epochs=200, patience=3, learningRate=0.5)
         self.assertEqual(report["epochs"], report["bestEpoch"] + 3)
@@ -107,7 +113,7 @@ class ModelTest(unittest.TestCase):
             with self.assertRaisesRegex(TrainerError, "epoch 1 is nan.*learning rate below 0.003"):
                 self.train(data)
 
-    def test_data_that_does_not_fit_stays_on_the_disk(self):
+    def test_data_that_does_not_fit_stays_on_the_disk(self) -> None:
         data = synthetic.make(self.place / "data", frames=40)
         self.train(data, epochs=2)
         held = (self.place / "model.nwrp/model.onnx").read_bytes()
@@ -118,7 +124,7 @@ class ModelTest(unittest.TestCase):
 
 
 class ShapesTest(unittest.TestCase):
-    def test_fewest_shapes_by_limit_and_accuracy(self):
+    def test_fewest_shapes_by_limit_and_accuracy(self) -> None:
         """Against NumPy's own decomposition, for tall, wide and (by a smaller limit) randomized cases."""
         with tempfile.TemporaryDirectory() as place:
             for frames in (20, 160, 400):
@@ -134,7 +140,7 @@ class ShapesTest(unittest.TestCase):
                             count = min(limit, int(np.searchsorted(parts, accuracy)) + 1)
                             self.check(basis, count, parts, vectors)
 
-    def check(self, basis, count, parts, vectors):
+    def check(self, basis: shapes.Basis, count: int, parts: np.ndarray, vectors: np.ndarray) -> None:
         self.assertEqual(len(basis.shapes), count)
         self.assertAlmostEqual(basis.explained, parts[count - 1], places=5)
         np.testing.assert_allclose(basis.shapes @ basis.shapes.T, np.eye(count), atol=1e-5)
@@ -142,7 +148,7 @@ class ShapesTest(unittest.TestCase):
         np.testing.assert_allclose(np.abs(np.sum(basis.shapes * vectors[:count], axis=1)), 1, atol=1e-3)
         self.assertTrue((np.max(basis.shapes, axis=1) >= -np.min(basis.shapes, axis=1)).all())
 
-    def test_text_of_shapes_gives_the_same_floats(self):
+    def test_text_of_shapes_gives_the_same_floats(self) -> None:
         random = np.random.default_rng(3)
         values = (random.standard_normal((3, 300)) * 10.0 ** random.integers(-30, 30, (3, 300))).astype(np.float32)
         with tempfile.TemporaryDirectory() as place:
@@ -153,19 +159,22 @@ class ShapesTest(unittest.TestCase):
 
 
 class AdviceTest(unittest.TestCase):
-    def test_says_what_the_errors_mean(self):
-        stage = lambda mean, p99: {"mean": {"mm": mean}, "p99": {"mm": p99}}
+    def test_says_what_the_errors_mean(self) -> None:
+        def stage(mean: float, p99: float) -> dict[str, dict[str, float]]:
+            return {"mean": {"mm": mean}, "p99": {"mm": p99}}
+
         for basis, network, explained, wanted in (
                 (stage(1, 3), stage(1.3, 3), 0.87, "an accuracy of 0.8 and at most 20 .* 87.0 %"),
                 (stage(1, 3), stage(1.5, 3), 0.87, None), (stage(1, 3), stage(1.3, 3), 0.995, None),
-                (None, stage(1, 3), None, None), (None, stage(5, 13), None, r"more than no correction does \(mean and p99\)"),
+                (None, stage(1, 3), None, None),
+                (None, stage(5, 13), None, r"more than no correction does \(mean and p99\)"),
                 (None, stage(1, 13), None, r"\(p99\)")):
             said = " ".join(advice({"base": stage(4, 12), "basis": basis, "network": network}, explained, Settings()))
             self.assertRegex(said, wanted or r"\A\Z")
 
 
 class SizesTest(unittest.TestCase):
-    def test_what_no_file_could_hold_is_refused(self):
+    def test_what_no_file_could_hold_is_refused(self) -> None:
         settings = Settings(neuronsPerLayer=2000)
         check_size(settings, 100, 180000)
         with self.assertRaisesRegex(TrainerError, r"1\.62 GB.*--principal-shapes.*--neurons"):
@@ -175,7 +184,7 @@ class SizesTest(unittest.TestCase):
 
 
 class DistancesTest(unittest.TestCase):
-    def test_percentile_is_exact_or_near_the_exact_one(self):
+    def test_percentile_is_exact_or_near_the_exact_one(self) -> None:
         random = np.random.default_rng(5)
         for scale, kept, tolerance in ((1e-4, 0, 1e-3), (1.0, 0, 1e-3), (1e4, 1000, 1e-3), (1.0, 2000, 1e-12)):
             differences = (scale * random.standard_normal((50, 3 * 40))).astype(np.float32)
