@@ -9,6 +9,9 @@ place=$work/checkout
 mkdir -p "$place" "$work/bin" "$work/onnxruntime/lib"
 touch "$work/onnxruntime/lib/libonnxruntime.so"
 cp -r "$root/run" "$root/scripts" "$place"
+for folder in libraries/geometry host/geometry host/graph plugin/gpu quarn/same plugin/x/same support; do
+  mkdir -p "$place/tests/$folder" && touch "$place/tests/$folder/CMakeLists.txt"
+done
 for program in apt-get npm cmake ctest; do
   printf '#!/bin/sh\necho "%s $*" >>"%s"\n' "$program" "$work/called" >"$work/bin/$program"
 done
@@ -48,6 +51,13 @@ run_row 2 "not also 'dev'" nothing build release dev
 run_row 2 "not 'most'" nothing check most
 run_row 2 "not 'long'" nothing fuzz long
 run_row 2 "not 'now'" nothing deps now
+for command in format hooks package; do run_row 2 "$command takes no arguments, not 'now'" nothing $command now; done
+for command in test coverage; do
+  run_row 2 "no folder of tests named 'grap'; they are: .*host/graph .*plugin/gpu" nothing $command graph grap
+  run_row 2 "'same' is the name of several folders of tests: plugin/x/same quarn/same" nothing $command same
+  run_row 2 "no folder of tests named 'support'" nothing $command support # it has none
+done
+run_row 1 "no git checkout" nothing hooks
 NW_JOBS=many run_row 2 "NW_JOBS is 'many'" nothing build
 run_row 2 "does not know '--sample'" nothing demo --sample 40
 run_row 2 "--epochs needs a value" nothing demo --epochs
@@ -57,6 +67,11 @@ done
 run_row 2 "needs a folder, not '--all'" nothing demo --output --all
 touch "$work/file"
 run_row 2 "$work/file: no folder" nothing demo --output file # which is in the caller's folder, not in the checkout
+
+# --- tests of one folder, of some, of all ---
+run_row 0 'testing libraries/geometry' '^cmake --build .* --target tests/libraries/geometry/all$' test geometry
+run_row 0 'testing plugin/gpu' '^ctest --test-dir build/release/tests/plugin/gpu .* -R one$' test tests/host/graph/ gpu -R one
+run_row 0 'testing release' '^ctest --preset release .* -R geometry$' test -R geometry
 
 # --- a demo says what is coming ---
 run_row 1 'posed 40 times.*its results go to .*/here' 'npm pack' demo --output here --samples 40 --epochs 3
