@@ -7,10 +7,11 @@ coverage_by_folder() {
     NR > 1 { folder = $1; sub("/[^/]*$", "", folder); lines[folder] += $2; reached[folder] += $3; all += $2; hit += $3 }
     END {
       row = "%-40s %7d of %7d lines  %5.1f %%\n"
-      for (folder in lines) printf row, folder, reached[folder], lines[folder], 100 * reached[folder] / (lines[folder] ? lines[folder] : 1) | "sort"
+      for (folder in lines) printf row, folder, reached[folder], lines[folder], part(reached[folder], lines[folder]) | "sort"
       close("sort")
-      printf row, "all", hit, all, 100 * hit / (all ? all : 1)
-    }' "$1"
+      printf row, "all", hit, all, part(hit, all)
+    }
+    function part(some, whole) { return 100 * some / (whole ? whole : 1) }' "$1"
 }
 
 command_coverage() {

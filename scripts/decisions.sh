@@ -48,9 +48,9 @@ A record says what was decided, why, and what was rejected, in half a page. It i
 that is a record of its own, to which the old one links.
 
 To add one, take the next free number: `NNNN-title.md`, which begins with `# NNNN: title`, an empty line and
-`**Date.** YYYY-MM-DD`. Then run `scripts/decisions.sh`, which fills in today's date where there is none and writes this
-page. Where a decision constrains one place in the code, name it there: `// decision NNNN`. A test sees that every number
-named in the tree has a record, and that this page is of today.
+`**Date.** YYYY-MM-DD`. Then run `scripts/decisions.sh`, which fills in today's date where there is none and writes
+this page. Where a decision constrains one place in the code, name it there: `// decision NNNN`. A test sees that every
+number named in the tree has a record, and that this page is of today.
 
 | | decision | date |
 |---|---|---|

@@ -4,8 +4,8 @@
 hook_text() {
   cat <<'HOOK'
 #!/usr/bin/env bash
-# neuralWarp's hook, installed by ./run hooks: what is about to be committed is looked at by scripts/pre_commit.sh of the
-# worktree that it comes from.
+# neuralWarp's hook, installed by ./run hooks: what is about to be committed is looked at by scripts/pre_commit.sh of
+# the worktree that it comes from.
 script=$(git rev-parse --show-toplevel)/scripts/pre_commit.sh
 [[ ! -x $script ]] || exec "$script"
 HOOK

@@ -36,8 +36,9 @@ read_test_words() {
   ctest_words=("$@")
 }
 
-# needed_targets PRESET FOLDER: what Ninja has to build for the tests of a folder: its own programs, and what the command
-# lines of its tests name of the build tree, as CMake has written them down; everything for a test of the whole tree
+# needed_targets PRESET FOLDER: what Ninja has to build for the tests of a folder: its own programs, and what the
+# command lines of its tests name of the build tree, as CMake has written them down; everything for a test of the whole
+# tree
 needed_targets() {
   local tree=$PWD/build/$1 place=$PWD/build/$1/tests/$2 paths
   paths=$(find "$place" -name CTestTestfile.cmake -exec grep -hE '^ *(add_test|set_tests_properties)\(' {} + |
@@ -80,7 +81,7 @@ test_as_said() {
 command_test() {
   local folders ctest_words
   read_test_words "$@"
-  need_packages "${python_packages[@]}" "${wheel_packages[@]}" # the trainer's tests, the demo and the package are among them
+  need_packages "${python_packages[@]}" "${wheel_packages[@]}" # for the trainer's tests, the demo, the package
   [[ -d ../shared/cases ]] || say "the reference cases were not there (../shared/cases): replay_cases is skipped"
   test_as_said release
 }

@@ -14,7 +14,17 @@ scripts/fetch_hand.sh
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 
-pack() { cpack -G "$1" --config "$build/CPackConfig.cmake" -B "$work/packages" >"$work/cpack.log" 2>&1 || { cat "$work/cpack.log"; fail "cpack -G $1"; }; }
+# or_tell LOG COMMAND...: what it said, when it fails
+or_tell() {
+  local log=$1
+  shift
+  "$@" >"$log" 2>&1 || {
+    cat "$log"
+    fail "$*"
+  }
+}
+
+pack() { or_tell "$work/cpack.log" cpack -G "$1" --config "$build/CPackConfig.cmake" -B "$work/packages"; }
 
 # --- the archive: unpacked and moved ---
 pack TGZ
@@ -28,22 +38,22 @@ cp build/deps/hand/left.glb "$work/left.glb"
 # --- the trainer in an environment of its own, without a network ---
 "$python" -m venv --system-site-packages "$work/env"
 cp -r "$work/moved/share/neuralWarp" "$work/trainer"
-PIP_NO_INDEX=1 "$work/env/bin/python" -m pip install -q --no-build-isolation --no-deps "$work/trainer" >"$work/pip.log" 2>&1 || {
-  cat "$work/pip.log"
-  fail "pip"
-}
+PIP_NO_INDEX=1 or_tell "$work/pip.log" \
+  "$work/env/bin/python" -m pip install -q --no-build-isolation --no-deps "$work/trainer"
 
 # --- from the hand to a model, as docs/installed.md says it ---
 # installed COMMAND...: in the folder of the work, with no other environment than a user's
 installed() {
   (cd "$work" && env -i HOME="$work/home" PATH="$work/moved/bin:${python%/*}:/usr/bin:/bin" LANG=C.UTF-8 \
-    POCL_CACHE_DIR="$work/pocl" "$@") >"$work/said" 2>"$work/errors" || { cat "$work/said" "$work/errors"; fail "$*"; }
-  [[ ! -s $work/errors ]] || cat "$work/errors"
+    POCL_CACHE_DIR="$work/pocl" "$@") >"$work/said" 2>"$work/errors" || {
+    cat "$work/said" "$work/errors"
+    fail "$*"
+  }
 }
 mkdir "$work/home" "$work/pocl"
 sed -n '/^hand=share/,/^```$/{/^```$/d;p}' "$work/moved/share/doc/neuralWarp/README.md" |
-  sed -e "s,\bshare/neuralWarp,moved/&," -e "s,^bin/,moved/bin/," -e "s,^python3 ,$python ," -e 's/--samples 600/--samples 60/' \
-    -e 's/--epochs 250/--epochs 20/' >"$work/commands"
+  sed -e "s,\bshare/neuralWarp,moved/&," -e "s,^bin/,moved/bin/," -e "s,^python3 ,$python ," \
+    -e 's/--samples 600/--samples 60/' -e 's/--epochs 250/--epochs 20/' >"$work/commands"
 (($(wc -l <"$work/commands") == 9)) || fail "docs/installed.md has other commands than this test knows"
 mkdir "$work/work"
 installed bash -euo pipefail commands
@@ -55,8 +65,10 @@ import json, sys
 errors = json.load(open(sys.argv[1]))
 if errors["ranWith"] != "quarn" or not errors["network"]["mean"]["mm"] < 0.9 * errors["base"]["mean"]["mm"]:
     sys.exit(f"the model is no better than none: {errors}")' "$work/said"
-[[ $(installed quarn --version && cat "$work/said") == *"$(<VERSION)"* ]] || fail "quarn --version is not $(<VERSION)"
-[[ $(installed env/bin/neuralwarp-train --version && cat "$work/said") == *"$(<VERSION)" ]] || fail "neuralwarp-train --version is not $(<VERSION)"
+for program in quarn neuralwarp-train env/bin/neuralwarp-train; do
+  installed "$program" --version
+  [[ $(<"$work/said") == *" $(<VERSION)" ]] || fail "$program is not of version $(<VERSION)"
+done
 
 # --- the Debian package, where there is what makes one ---
 have dpkg-shlibdeps && have file || exit 0
