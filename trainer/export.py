@@ -1,5 +1,8 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Writes the files of a model directory. They carry no time and no path: the same training gives the same bytes."""
+"""Writes the files of a model directory. They carry no time and no path: the same training gives the same bytes.
+
+The network is written node by node (decision 0084).
+"""
 
 import json
 from pathlib import Path

@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Folders that appear as a whole or not at all."""
+"""Folders that appear as a whole or not at all (decision 0085)."""
 
 import ctypes
 import errno

@@ -20,8 +20,8 @@ MODULES = {"Sigmoid": nn.Sigmoid, "Tanh": nn.Tanh, "ReLU": nn.ReLU, "LeakyReLU":
 
 @dataclass(frozen=True)
 class Normalisation:
-    """(controls - center) / deviation goes in, outputs * unit come out. One deviation and one unit for all of them:
-    with one for each channel, noise of channels that hardly move would count as much as motion."""
+    """(controls - center) / deviation goes in, outputs * unit come out. One deviation and one unit for all of them
+    (decision 0086): with one for each channel, noise of channels that hardly move would count as much as motion."""
 
     center: np.ndarray   # float32 [C]
     deviation: float

@@ -15,7 +15,8 @@ void checkSizes(const MeshTopology& topology, const IndexMapper& map) {
         throw std::length_error("quill: a mesh of more than 2^31 - 1 corners or affected vertices");
 }
 
-// A counting sort of both directions of every edge by their first end; a list may still repeat a neighbour.
+// A counting sort of both directions of every edge by their first end (decision 0012); a list may still repeat a
+// neighbour.
 NeighbourLists collectEdges(const MeshTopology& topology, const IndexMapper& map) {
     NeighbourLists lists;
     // list v is first counted at v + 2, then filled from v + 1, whose running end finally stands where list v ends

@@ -16,7 +16,7 @@ val3<float> FrameTables::normalSum(std::size_t vertex) const {
 }
 
 // val3::normalize for each vector: where it would leave one alone, multiplying by 1 does. Two loops, so that the
-// compiler does not move the square root behind the comparison, where it could not be vectorised.
+// compiler does not move the square root behind the comparison, where it could not be vectorised (decision 0013).
 void FrameBlock::normalize(Vectors& v, std::size_t count) {
     std::array<float, capacity> square, reciprocal;
     for (std::size_t j = 0; j < count; ++j) {

@@ -15,6 +15,7 @@ std::size_t availableSmoothingKernels(SmoothingKernel* out) {
     return count;
 }
 
+// the same bits from each, so the choice is nobody's concern (decision 0010)
 SmoothingKernel smoothingKernel() {
     static const SmoothingKernel fastest = [] {
         SmoothingKernel kernels[3];

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Branch and bound over pairs of balls (A. H. Land, A. G. Doig, "An automatic method of solving discrete programming
 // problems", 1960): a ball holds corners that lie near each other, and two balls are looked into only when some pair of
-// theirs may span as much as the best pair so far.
+// theirs may span as much as the best pair so far (decision 0122).
 #include "widestPairs.h"
 
 #include "quill/parallelFor.h"

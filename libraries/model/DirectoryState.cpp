@@ -13,6 +13,7 @@ using std::chrono::milliseconds;
 using std::chrono::nanoseconds;
 using std::chrono::seconds;
 
+// a directory that has just been changed may still be changing (decision 0119)
 constexpr milliseconds rest{20};
 constexpr milliseconds longestWait{100};
 

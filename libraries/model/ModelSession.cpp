@@ -16,7 +16,7 @@
 #include <system_error>
 
 // The header asks the library for the newest function table it knows, which an older library refuses. We fetch the
-// table ourselves and use nothing that is not in version 16.
+// table ourselves and use nothing that is not in version 16 (decision 0020).
 #define ORT_API_MANUAL_INIT
 #include <onnxruntime_cxx_api.h>
 
@@ -88,7 +88,7 @@ std::vector<std::int64_t> usableShape(const Ort::TypeInfo& type, const std::stri
     }
     std::vector<std::int64_t> shape = tensor.GetShape();
     if (shape.empty()) {
-        // The runtime reports a scalar and a shape that the model does not declare in the same way.
+        // The runtime reports a scalar and a shape that the model does not declare in the same way (decision 0021).
         throw std::runtime_error(what + " is a scalar or has no declared shape");
     }
     const std::int32_t count = elementCount(shape);
@@ -147,7 +147,7 @@ ModelType typeOf(const std::filesystem::path& path) {
     return extension == ".h5" || extension.empty() ? ModelType::H5Type : ModelType::UnrecognizedType;
 }
 
-/// Throws unless the first `count` values are there and finite.
+/// Throws unless the first `count` values are there and finite: all outputs, or none (decision 0022).
 void checkInputs(std::span<const float> inputs, std::size_t count) {
     if (inputs.size() < count) {
         throw std::invalid_argument("fewer control values than the model takes");
@@ -261,6 +261,7 @@ LoadResult ModelSession::setModel(const std::filesystem::path& path) {
     std::error_code error;
     const std::filesystem::file_status status = std::filesystem::status(path, error);
     if (status.type() == std::filesystem::file_type::not_found) {
+        // any other failed query is no proof that nothing is there (decision 0023)
         return LoadResult::NotFound;
     }
     if (error) {

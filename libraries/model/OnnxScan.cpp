@@ -12,6 +12,7 @@
 namespace neuralWarp {
 namespace {
 
+// what a file may ask for: decision 0118
 constexpr std::uint64_t unbounded = std::numeric_limits<std::uint64_t>::max();
 constexpr int deepest = 100;               // as deep as the runtime reads
 constexpr std::uint64_t longestName = 512; // of what is kept to compare: the longest that matters is "Constant"

@@ -61,7 +61,7 @@ bool open(std::filebuf& file, const std::filesystem::path& path, std::uint64_t l
 
 bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path) {
     StreambufInput input(source);
-    // Iterative: recursion would let a file of brackets overflow the stack of the evaluation thread.
+    // Iterative: recursion would let a file of brackets overflow the stack of the evaluation thread (decision 0024).
     document.ParseStream<rapidjson::kParseDefaultFlags | rapidjson::kParseIterativeFlag>(input);
     // the parser takes a zero byte for the end
     if (document.HasParseError() || !StreambufInput::isEnd(source)) {

@@ -28,6 +28,7 @@ void requireRegular(const std::filesystem::path& path, const struct stat& status
 }
 
 // looked at before it is opened, which may already do something to a device, and after it, when it cannot change
+// (decision 0128)
 Descriptor opened(const std::filesystem::path& path, struct stat& status) {
     if (::stat(path.c_str(), &status) != 0)
         failToRead(path, errno);

@@ -18,6 +18,7 @@ HStatus setElements(HArrayDataBuilder& builder, std::span<const double> values) 
 }
 
 // by position: somebody who asked for an element beyond the last has made one, so the indices may have gaps
+// (decision 0056)
 HStatus removeFrom(HArrayDataHandle& array, HArrayDataBuilder& builder, std::size_t firstSurplus) {
     for (unsigned position = array.elementCount(); position > 0; --position) {
         HStatus status = array.jumpToPosition(position - 1);

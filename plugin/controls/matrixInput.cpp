@@ -8,6 +8,7 @@
 namespace neuralWarp {
 namespace {
 
+// an element without a matrix is an error, not the identity (decision 0057)
 HStatus noMatrix(const HArrayDataHandle& matrices, const HDataHandle& element, const HStatus& status) {
     return {status.statusCode(), HFnAttribute(element.attribute()).name().asStdString() + '[' +
                                      std::to_string(matrices.elementIndex()) +

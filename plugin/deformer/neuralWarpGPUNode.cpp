@@ -24,7 +24,7 @@ using Status = HPxGPUDeformer::DeformerStatus;
 /// Below this, a target morph is off; this near to 1, it leaves nothing of the model to see.
 constexpr float smallestMorphEnvelope = 1e-6F;
 
-/// Runs `body`; what it throws is reported, and the host then evaluates on the CPU.
+/// Runs `body`; what it throws is reported, and the host then evaluates on the CPU (decision 0094).
 template <class Body>
 Status guardedEvaluation(Body&& body) noexcept {
     try {

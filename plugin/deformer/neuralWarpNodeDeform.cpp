@@ -140,7 +140,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     return writeBlended(block, iterator, multiIndex, blend);
 }
 
-/// A model that smooths for long is in force from now on: the user is told before the first frame.
+/// A model that smooths for long is in force from now on: the user is told before the first frame (decision 0123).
 void neuralWarpNode::announceSmoothing(HDataBlock& block, const neuralWarpData& data) const {
     constexpr std::int64_t manyPasses = 1000;
     const std::int64_t passes = data.modelSettings.smoothingIterations;

@@ -32,7 +32,7 @@ int compareVertices(const CharacterMesh& mesh, std::uint32_t a, std::uint32_t b)
     return byPosition != 0 ? byPosition : compare(mesh.influences[a], mesh.influences[b]);
 }
 
-// for every vertex the first one of the file that it equals
+// for every vertex the first one of the file that it equals, bit by bit (decision 0068)
 std::vector<std::uint32_t> firstEquals(const CharacterMesh& mesh) {
     std::vector<std::uint32_t> order(mesh.points.size());
     std::iota(order.begin(), order.end(), 0U);

@@ -154,6 +154,7 @@ void DatasetFolder::publish(FolderLock& lock) const {
         throw std::runtime_error(folder_.string() + " was not there at the beginning; the data set is complete in " +
                                  part_.string());
     requireOursOnly(folder_);
+    // both are locked, and what was there can be told from a begun export (decision 0129)
     FolderLock old(folder_);
     storage::writeWhole(folder_ / supersededFile, "");
     storage::exchangeFolders(part_, folder_);

@@ -38,6 +38,7 @@ void makeJoints(const Character& character, const std::vector<JointRest>& rests,
         if (joint.parent >= 0)
             connect(plugOf(scene.joints[static_cast<std::size_t>(joint.parent)], "worldMatrix"),
                     plugOf(node, "parentMatrix"));
+        // at rest the bind matrices have it (decision 0071)
         if (rests[i].shear > noticedShear)
             scene.notes.push_back("the joint \"" + joint.name +
                                   "\" is sheared in the file, which a joint of the scene cannot be: it is as in the "

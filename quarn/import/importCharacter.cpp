@@ -171,6 +171,7 @@ private:
             OpenQuarn::pathForScene(mapFile(options_.output, "{mesh}", character_.meshes.size()), folder));
         setNumber(plugOf(scene.character, "framesPerSecond"), options_.framesPerSecond);
         // maps before the scene, which knows them by their digests: a scene never goes with the maps of another
+        // (decision 0132)
         std::string digests;
         for (std::size_t i = 0; i < report_.meshes.size(); ++i) {
             const std::vector<std::uint32_t>& map = character_.meshes[i].joinedOf;

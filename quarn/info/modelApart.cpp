@@ -48,6 +48,7 @@ std::vector<float> outputsOf(neuralWarp::ModelSession& session, const ModelRepor
 }
 
 // in the process apart, whose standard output goes nowhere: what the readers print there becomes part of the answer
+// (decision 0120)
 ModelAnswer answerOf(const std::filesystem::path& directory, const FloatTable& controls) {
     char* text = nullptr;
     std::size_t size = 0;

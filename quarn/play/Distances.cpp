@@ -9,6 +9,7 @@ namespace quarn {
 namespace {
 
 // the positive floats in order are their bits in order: what is left of 13 bits is 1024 bins in every octave
+// (decision 0079)
 constexpr unsigned droppedBits = 13;
 constexpr std::size_t binCount = std::size_t{1} << (31U - droppedBits);
 

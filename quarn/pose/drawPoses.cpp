@@ -7,7 +7,7 @@
 namespace quarn {
 namespace {
 
-// the engine's bits are specified, those of the standard distributions are not
+// the engine's bits are specified, those of the standard distributions are not (decision 0073)
 class Dice {
 public:
     explicit Dice(std::uint64_t seed)

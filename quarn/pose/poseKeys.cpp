@@ -17,6 +17,7 @@
 namespace quarn {
 namespace {
 
+// the next `quarn pose` knows its curves by this name (decision 0074)
 std::string curveName(const HPlug& plug) {
     std::string name = writtenName(plug);
     for (char& letter : name)

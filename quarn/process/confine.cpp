@@ -84,6 +84,7 @@ void refuseChanges() {
 
 } // namespace
 
+// decision 0135
 void confine(const ApartLimits& limits) {
     prctl(PR_SET_PDEATHSIG, SIGKILL);
     beQuiet();

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The interpolations of glTF 2.0: Khronos Group, "glTF 2.0 Specification", appendix C, "Animation Sampler Interpolation
-// Modes".
+// Modes" (decision 0067).
 #include "rig/KeyTrack.h"
 
 #include "rig/texts.h"

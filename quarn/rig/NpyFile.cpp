@@ -64,6 +64,7 @@ auto NpyFile::parsed(Parse parse) const {
     }
 }
 
+// strictly: what another reader might guess is refused (decision 0065)
 void NpyFile::readHeader() {
     std::array<char, npyPreambleSize> first = {};
     const std::size_t size = std::min<std::uint64_t>(first.size(), identity_.size);

@@ -27,6 +27,7 @@ fs::path startFolder() {
 }
 [[maybe_unused]] const fs::path rememberStart = startFolder();
 
+// decision 0061
 std::vector<fs::path> placesOfDeformer() {
     std::vector<fs::path> places;
     if (const char* given = std::getenv("NEURALWARP_PLUGIN"); given != nullptr && *given != '\0')

@@ -46,6 +46,7 @@ std::string listed(const std::vector<std::string>& names) {
     return names.size() > most ? text + " ..." : text;
 }
 
+// only where there is no doubt which one is meant (decision 0136)
 ModelInUse takeTheOnlyOne(const Warp& warp, const WarpGeometry& geometry) {
     const std::string root = textOf(warp.plug("modelRoot"));
     const HostErrors unsaid; // the mesh is evaluated once more, and what is wrong is said then

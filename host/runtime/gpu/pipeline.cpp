@@ -42,7 +42,7 @@ void sayNoDevice(GpuGeometry& gpu) {
         showMessage(Severity::warning, "deformers are evaluated on the CPU: " + reason);
 }
 
-/// Nothing of a failed frame stays on the device, nor the device where it does not answer any more.
+/// Nothing of a failed frame stays on the device, nor the device where it does not answer any more (decision 0064).
 void clearAfterFailure(const Chain& chain, const std::shared_ptr<Device>& device) {
     if (clFinish(device->queue) != CL_SUCCESS) // what was handed over may still be read until then
         closeDevice();

@@ -130,7 +130,7 @@ cl_int writeMapped(const Positions& positions, Buffer& buffer, std::size_t bytes
     return mapped.unmap(&written);
 }
 
-// To map means to wait for the device, which takes longer than to copy what is small.
+// To map means to wait for the device, which takes longer than to copy what is small (decision 0099).
 cl_int writePositions(const Positions& positions, Buffer& buffer) {
     const TimedStep step(*buffer.device, "upload");
     const std::size_t bytes = positions.vertexCount() * bytesPerVertex;

@@ -60,6 +60,7 @@ double Attribute::stored(double value) const {
     }
 }
 
+// asked by setAttr and by the reader of scenes (decision 0112)
 std::string Attribute::refusal(double value) const {
     if (!std::isfinite(value))
         return printedNumber(value) + " is not a finite number";

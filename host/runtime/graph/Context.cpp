@@ -91,6 +91,7 @@ std::shared_ptr<Slot> slotIn(const NodeData& data, const Slot& slot, bool create
     return create ? parent->elementAt(slot.index) : parent->elements().find(slot.index);
 }
 
+// connections are always the scene's (decision 0033)
 std::shared_ptr<Slot> sourceInContext(const Slot& slot) {
     if (!slot.owner)
         return nullptr;

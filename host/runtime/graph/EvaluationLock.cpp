@@ -39,7 +39,7 @@ int EvaluationLock::release() {
     return depth;
 }
 
-// follows who waits for whom; a thread waits for one part at a time, and a part has one thread
+// follows who waits for whom; a thread waits for one part at a time, and a part has one thread (decision 0032)
 bool EvaluationLock::waitsForThisThread(std::thread::id thread) const {
     while (thread != std::this_thread::get_id()) {
         const auto wanted = waiting_.find(thread);

@@ -147,6 +147,7 @@ void Slot::unlink() {
     forEachPart([](Slot& part) { part.unlink(); });
 }
 
+// made when it is needed: a control value must stay small (decision 0113)
 Slot::Rare& Slot::rare() {
     if (!links)
         links = std::make_unique<Links>();

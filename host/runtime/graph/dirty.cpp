@@ -18,7 +18,7 @@ bool isAtOrAbove(const Slot& above, const Slot* slot) {
     return false;
 }
 
-/// One walk through the graph, breadth first, so that a long chain needs no deep stack.
+/// One walk through the graph, breadth first, so that a long chain needs no deep stack (decision 0031).
 class DirtyWalk {
 public:
     explicit DirtyWalk(bool force)

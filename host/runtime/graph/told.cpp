@@ -8,7 +8,7 @@
 namespace OpenQuarn {
 namespace {
 
-/// Upwards through the graph with a stack of its own, so that a long chain needs no deep one.
+/// Upwards through the graph with a stack of its own, so that a long chain needs no deep one (decision 0110).
 class ForgettingWalk {
 public:
     void from(Slot& slot) {

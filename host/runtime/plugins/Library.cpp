@@ -103,6 +103,7 @@ bool servesApiVersion(const std::string& required) {
     return wanted && present && wanted->first == present->first && wanted->second <= present->second;
 }
 
+// before anything of the plug-in runs (decision 0043)
 std::string checkedApiVersion(const char* version) {
     std::string text(version, std::find(version, version + versionLength, '\0'));
     if (!servesApiVersion(text))
