@@ -17,7 +17,7 @@ coverage_by_folder() {
 command_coverage() {
   local folders ctest_words failed=0 tree=build/coverage
   read_test_words "$@"
-  need_packages "${python_packages[@]}" "${wheel_packages[@]}"
+  need_packages "${python_packages[@]}" "${wheel_packages[@]}" "${package_packages[@]}"
   if [[ -d $tree ]]; then find "$tree" -name '*.gcda' -delete; fi # what earlier runs have counted
   test_as_said coverage || failed=1
   say "coverage: lines that the tests have reached, by folder; file by file in $tree/coverage.csv"

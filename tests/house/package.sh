@@ -71,7 +71,10 @@ for program in quarn neuralwarp-train env/bin/neuralwarp-train; do
 done
 
 # --- the Debian package, where there is what makes one ---
-have dpkg-shlibdeps && have file || exit 0
+have dpkg-shlibdeps && have file || {
+  echo "without dpkg-dev and file no Debian package can be made here: that part is not tried"
+  exit 0
+}
 pack DEB
 deb=("$work"/packages/*.deb)
 dpkg-deb --extract "${deb[0]}" "$work/root"
