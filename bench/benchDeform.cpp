@@ -7,7 +7,7 @@
 
 #include "deformer/deltas.h"
 #include "openquarn_app/Messages.h"
-#include "rig/finite.h"
+#include "storage/finite.h"
 
 #include <oneapi/tbb/global_control.h>
 
@@ -190,7 +190,7 @@ void benchFinite(const bench::Options& options) {
             frames.push_back(frame.run());
             std::fill(points.begin(), points.end(), 0.5F); // they have just been read when they are looked at
             const auto start = std::chrono::steady_clock::now();
-            if (rig::firstNotFinite(points))
+            if (storage::firstNotFinite(points))
                 throw std::runtime_error("0.5 is no finite number");
             checks.push_back(std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
         }

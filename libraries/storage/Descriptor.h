@@ -2,6 +2,8 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
+#include <filesystem>
 #include <span>
 #include <utility>
 
@@ -28,6 +30,13 @@ public:
 private:
     int number_;
 };
+
+/// Reads from byte `from` of a file on, until `bytes` are full or the file ends. Answers how many came; below 0, with
+/// errno, when the system fails.
+std::ptrdiff_t readAt(int descriptor, std::uint64_t from, std::span<std::byte> bytes);
+
+/// Whether a path, whose last part is no link, leads to the file that is open.
+bool isAt(const std::filesystem::path& path, int descriptor);
 
 /// Writes all of it where the descriptor stands. Answers 0, or the errno of what kept it from it.
 int writeAll(int descriptor, std::span<const std::byte> bytes);

@@ -2,13 +2,12 @@
 #include "storage/TemporaryFile.h"
 
 #include "storage/FileError.h"
+#include "storage/Fnv64.h"
 #include "storage/Folder.h"
 #include "storage/Target.h"
 
 #include <array>
 #include <cerrno>
-#include <charconv>
-#include <cstdint>
 #include <random>
 #include <string>
 
@@ -28,23 +27,18 @@ constexpr std::string_view ending = ".part";
 // of one target at the same time on one machine, and so many names are looked at for what a killed one has left
 constexpr int mostWriters = 64;
 
-// FNV-1a of 64 bits: the same name everywhere
-std::uint64_t sumOf(std::string_view text) {
-    std::uint64_t sum = 0xcbf29ce484222325U;
-    for (const char c : text)
-        sum = (sum ^ static_cast<unsigned char>(c)) * 0x100000001b3U;
-    return sum;
+std::string sumOf(std::span<const std::byte> bytes) {
+    Fnv64 sum;
+    sum.add(bytes);
+    return sum.text();
 }
 
-std::string hexText(std::uint64_t number) {
-    std::array<char, 16> digits{};
-    const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), number, 16).ptr;
-    return std::string(static_cast<std::size_t>(digits.data() + digits.size() - end), '0') +
-           std::string(digits.data(), end);
+std::string sumOf(std::string_view text) {
+    return sumOf(std::as_bytes(std::span(text)));
 }
 
 std::string beginningFor(std::string_view target) {
-    return std::string(prefix) + hexText(sumOf(target)) + "-";
+    return std::string(prefix) + sumOf(target) + "-";
 }
 
 std::string bootText() {
@@ -61,24 +55,18 @@ std::string markOfThisBoot() {
     const std::string boot = bootText();
     if (boot.empty() || ::uname(&host) != 0)
         return {};
-    return hexText(sumOf(boot + host.nodename));
+    return sumOf(boot + host.nodename);
 }
 
 std::string uniqueMark() {
     std::random_device random;
-    return "unlocked" + hexText((std::uint64_t{random()} << 32U) ^ random());
+    const std::array numbers{random(), random()};
+    return "unlocked" + sumOf(std::as_bytes(std::span(numbers)));
 }
 
 fs::path nameFor(const fs::path& target, const std::string& mark, int number) {
     return target.parent_path() /
            (beginningFor(target.filename().native()) + mark + "-" + std::to_string(number) + std::string(ending));
-}
-
-bool isAt(const fs::path& name, int descriptor) {
-    struct stat named = {};
-    struct stat open = {};
-    return ::lstat(name.c_str(), &named) == 0 && ::fstat(descriptor, &open) == 0 && named.st_dev == open.st_dev &&
-           named.st_ino == open.st_ino;
 }
 
 // takes away what a killed writer has left; a living one holds the lock

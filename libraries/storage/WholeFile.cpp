@@ -80,15 +80,15 @@ void WholeFile::finish() {
 
 void WholeFile::writeThrough() {
     std::array<std::byte, 1U << 16U> block{};
-    for (off_t done = 0;;) {
-        const ssize_t got = ::pread(memory_.number(), block.data(), block.size(), done);
+    for (std::uint64_t done = 0;;) {
+        const std::ptrdiff_t got = readAt(memory_.number(), done, block);
         if (got < 0)
             failToWrite(path_, errno);
         if (got == 0)
             return;
         if (const int error = writeAll(target_.through.number(), std::span(block).first(static_cast<std::size_t>(got))))
             failToWrite(path_, error);
-        done += got;
+        done += static_cast<std::size_t>(got);
     }
 }
 

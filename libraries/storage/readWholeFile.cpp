@@ -52,18 +52,15 @@ std::string readWholeFile(const std::filesystem::path& path, std::uint64_t most)
     std::string bytes(size + 1, '\0');
     std::size_t done = 0;
     for (;;) {
-        const ssize_t got = ::read(file.number(), bytes.data() + done, bytes.size() - done);
-        if (got < 0 && errno == EINTR)
-            continue;
+        const std::ptrdiff_t got = readAt(file.number(), done, std::as_writable_bytes(std::span(bytes)).subspan(done));
         if (got < 0)
             failToRead(path, errno);
-        if (got == 0)
-            break;
         done += static_cast<std::size_t>(got);
         if (done > most)
             refuseSize(path, "more than " + std::to_string(most), most);
-        if (done == bytes.size())
-            bytes.resize(std::min<std::uint64_t>(2 * bytes.size() + 4096, most + 1));
+        if (done < bytes.size())
+            break;
+        bytes.resize(std::min<std::uint64_t>(2 * bytes.size() + 4096, most + 1));
     }
     bytes.resize(done);
     return bytes;

@@ -2,6 +2,7 @@
 #include "quarn/character/prepareGltf.h"
 
 #include "quarn/character/checkGltf.h"
+#include "storage/base64.h"
 
 #include <rapidjson/error/en.h>
 #include <rapidjson/stringbuffer.h>
@@ -163,47 +164,34 @@ void removeUnread(rapidjson::Document& document, SourceHints& hints) {
     }
 }
 
-// three identity matrices in base 64, which take 192 bytes
-std::string threeIdentities() {
-    static constexpr std::string_view digits = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+std::string identities(std::size_t count) {
     std::string bytes;
-    for (int value = 0; value < 48; ++value)
+    for (std::size_t value = 0; value < 16 * count; ++value)
         bytes += value % 16 % 5 == 0 ? std::string("\0\0\x80\x3F", 4) : std::string(4, '\0');
-    std::string text;
-    for (std::size_t i = 0; i < bytes.size(); i += 3) {
-        std::uint32_t three = 0;
-        for (std::size_t k = 0; k < 3; ++k)
-            three = three << 8U | static_cast<unsigned char>(bytes[i + k]);
-        for (const unsigned shift : {18U, 12U, 6U, 0U})
-            text += digits[three >> shift & 63U];
-    }
-    return text;
+    return bytes;
 }
 
-// the index of a new accessor of at least `count` identity matrices, in a buffer of its own
+// the index of a new accessor of `count` identity matrices, in a buffer of its own
 rapidjson::SizeType addIdentities(rapidjson::Document& document, std::size_t count) {
     auto& memory = document.GetAllocator();
-    const std::size_t blocks = (count + 2) / 3;
-    std::string uri = "data:application/octet-stream;base64,";
-    for (std::size_t block = 0; block < blocks; ++block)
-        uri += threeIdentities();
-
+    const std::string bytes = identities(count);
+    const std::string uri = "data:application/octet-stream;base64," + storage::base64(bytes);
     const auto add = [&](const char* key, JsonValue& value) {
         JsonValue& values = arrayMember(document, key, document);
         values.PushBack(value, memory);
         return values.Size() - 1;
     };
     JsonValue buffer(rapidjson::kObjectType);
-    buffer.AddMember("byteLength", std::uint64_t{blocks * 192}, memory);
+    buffer.AddMember("byteLength", std::uint64_t{bytes.size()}, memory);
     buffer.AddMember("uri", JsonValue(uri.c_str(), memory), memory);
     JsonValue view(rapidjson::kObjectType);
     view.AddMember("buffer", add("buffers", buffer), memory);
-    view.AddMember("byteLength", std::uint64_t{blocks * 192}, memory);
+    view.AddMember("byteLength", std::uint64_t{bytes.size()}, memory);
     JsonValue accessor(rapidjson::kObjectType);
     accessor.AddMember("bufferView", add("bufferViews", view), memory);
     accessor.AddMember("componentType", 5126, memory);
     accessor.AddMember("type", "MAT4", memory);
-    accessor.AddMember("count", std::uint64_t{blocks * 3}, memory);
+    accessor.AddMember("count", std::uint64_t{count}, memory);
     return add("accessors", accessor);
 }
 

@@ -2,8 +2,8 @@
 #include "quarn/dataset/DatasetFolder.h"
 
 #include "quarn/dataset/DatasetWriter.h"
-#include "quarn/dataset/FolderLock.h"
 #include "storage/Folder.h"
+#include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
 
 #include <algorithm>
@@ -22,9 +22,9 @@ namespace fs = std::filesystem;
 
 // stands in a data set that is about to be replaced, and then in FOLDER.part: what is there is nothing to go on from
 constexpr const char* supersededFile = "superseded";
-constexpr std::array ourFiles = {datasetFile::controls, datasetFile::deltas, datasetFile::frames,
-                                 descriptionFile,       setupFile,           datasetFile::progress,
-                                 FolderLock::fileName,  supersededFile};
+constexpr std::array ourFiles = {
+    datasetFile::controls, datasetFile::deltas,           datasetFile::frames, descriptionFile, setupFile,
+    datasetFile::progress, storage::FolderLock::fileName, supersededFile};
 constexpr std::uint64_t roomForTexts = 1U << 20U; // the JSON files, and what the file system needs for itself
 
 bool isOneOf(const std::string& name, const char* file) {
@@ -45,7 +45,7 @@ void removeFile(const fs::path& file) {
 // what belongs to the making of a data set, and not to it
 bool isTool(const std::string& name) {
     const auto isBegun = [&](const char* file) { return name != file && isOneOf(name, file); };
-    return name == datasetFile::progress || name == FolderLock::fileName || name == supersededFile ||
+    return name == datasetFile::progress || name == storage::FolderLock::fileName || name == supersededFile ||
            std::any_of(ourFiles.begin(), ourFiles.end(), isBegun);
 }
 
@@ -53,7 +53,7 @@ bool isTool(const std::string& name) {
 void removeTools(const fs::path& folder) {
     std::vector<fs::path> tools;
     for (const fs::directory_entry& entry : fs::directory_iterator(folder))
-        if (const std::string name = entry.path().filename(); isTool(name) && name != FolderLock::fileName)
+        if (const std::string name = entry.path().filename(); isTool(name) && name != storage::FolderLock::fileName)
             tools.push_back(entry.path());
     std::for_each(tools.begin(), tools.end(), removeFile);
 }
@@ -62,9 +62,9 @@ void removeTools(const fs::path& folder) {
 void removeLeftTools(const fs::path& folder) {
     const bool isLeft = std::any_of(fs::directory_iterator(folder), {},
                                     [](const fs::directory_entry& entry) { return isTool(entry.path().filename()); });
-    if (!isLeft || FolderLock::isTaken(folder))
+    if (!isLeft || storage::FolderLock::isTaken(folder))
         return;
-    const FolderLock lock(folder);
+    const storage::FolderLock lock(folder, anotherExport);
     removeTools(folder);
 }
 
@@ -121,7 +121,7 @@ DatasetFolder::Begun DatasetFolder::begun(const Setup& setup) const {
 
 void DatasetFolder::discard() const {
     for (const char* file : ourFiles)
-        if (file != FolderLock::fileName && file != supersededFile)
+        if (file != storage::FolderLock::fileName && file != supersededFile)
             removeFile(part_ / file);
     removeTools(part_); // at last what says that the rest is nothing to go on from
 }
@@ -141,7 +141,7 @@ void DatasetFolder::requireSpace(std::uint64_t bytes) const {
                                  " bytes free, and the data set needs " + std::to_string(bytes + roomForTexts));
 }
 
-void DatasetFolder::publish(FolderLock& lock) const {
+void DatasetFolder::publish(storage::FolderLock& lock) const {
     storage::syncToDisk(part_);
     std::error_code none;
     if (fs::is_empty(folder_, none) || none) { // one that is empty is no data set
@@ -155,7 +155,7 @@ void DatasetFolder::publish(FolderLock& lock) const {
                                  part_.string());
     requireOursOnly(folder_);
     // both are locked, and what was there can be told from a begun export (decision 0129)
-    FolderLock old(folder_);
+    storage::FolderLock old(folder_, anotherExport);
     storage::writeWhole(folder_ / supersededFile, "");
     storage::exchangeFolders(part_, folder_);
     lock.follow(folder_);

@@ -8,9 +8,11 @@
 #include <filesystem>
 #include <string>
 
-namespace quarn {
-
+namespace storage {
 class FolderLock;
+}
+
+namespace quarn {
 
 /// Nothing that quarn did not make is ever removed. Errors are std::runtime_error with the sentence for the user.
 /// Thread: one at a time.
@@ -39,7 +41,7 @@ public:
     void requireSpace(std::uint64_t bytes) const;
     /// Puts what is in FOLDER.part, and complete, into its place. A data set that is there goes when the new one has
     /// come.
-    void publish(FolderLock& lock) const;
+    void publish(storage::FolderLock& lock) const;
 
 private:
     void requireOursOnly(const std::filesystem::path& folder) const;
@@ -48,6 +50,9 @@ private:
     std::filesystem::path part_;
     bool replaces_;
 };
+
+/// Who has a folder that is locked, for storage::FolderLock.
+inline constexpr const char* anotherExport = "another quarn export";
 
 inline constexpr const char* descriptionFile = "dataset.json";
 

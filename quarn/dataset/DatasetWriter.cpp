@@ -64,7 +64,7 @@ DatasetWriter::DatasetWriter(const std::filesystem::path& folder, const DatasetS
     , saved_(std::chrono::steady_clock::now()) {}
 
 void DatasetWriter::begin() {
-    for (RowFile* file : {&controls_, &deltas_, &frames_})
+    for (storage::NpyRows* file : {&controls_, &deltas_, &frames_})
         file->begin();
     isOpen_ = true;
     rows_ = 0;
@@ -105,7 +105,7 @@ void DatasetWriter::append(int frame, std::span<const float> controls, std::span
 void DatasetWriter::save() {
     if (!isOpen_)
         return;
-    for (RowFile* file : {&controls_, &deltas_, &frames_})
+    for (storage::NpyRows* file : {&controls_, &deltas_, &frames_})
         file->sync();
     storage::writeWhole(progress_, textOf({rows_, {controls_.sum(), deltas_.sum(), frames_.sum()}}));
     savedRows_ = rows_;

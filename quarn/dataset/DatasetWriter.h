@@ -2,7 +2,7 @@
 // The three arrays of a training data set while they are being made, and the record of how far they are.
 #pragma once
 
-#include "quarn/dataset/RowFile.h"
+#include "storage/NpyRows.h"
 
 #include <array>
 #include <chrono>
@@ -54,7 +54,7 @@ public:
 private:
     std::filesystem::path progress_;
     DatasetShape shape_;
-    RowFile controls_, deltas_, frames_;
+    storage::NpyRows controls_, deltas_, frames_;
     bool isOpen_ = false;
     std::size_t rows_ = 0;
     std::size_t savedRows_ = 0;

@@ -7,6 +7,7 @@
 #include "quarn/scene/units.h"
 
 #include "openquarn_app/Commands.h"
+#include "storage/npyHeader.h"
 
 #include <algorithm>
 #include <array>
@@ -18,8 +19,6 @@
 namespace quarn {
 namespace {
 
-constexpr std::streamoff headSize = 128; // of the array files
-
 struct Range {
     float least = 0;
     float largest = 0;
@@ -28,7 +27,7 @@ struct Range {
 // reads the file again: rows of an earlier run count as well
 std::vector<Range> rangesOf(const std::filesystem::path& controls, const DatasetShape& shape) {
     std::ifstream file(controls, std::ios::binary);
-    file.seekg(headSize);
+    file.seekg(storage::npyHeadSize);
     std::vector<Range> ranges(shape.controls);
     std::vector<float> row(shape.controls);
     for (std::size_t number = 0; number < shape.rows; ++number) {

@@ -2,11 +2,11 @@
 #include "quarn/dataset/exportDatasets.h"
 
 #include "quarn/dataset/DatasetFolder.h"
-#include "quarn/dataset/FolderLock.h"
 #include "quarn/dataset/description.h"
 #include "quarn/dataset/sceneSetup.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
 
 #include <algorithm>
@@ -108,7 +108,7 @@ public:
     ExportAnswer run() {
         if (folder_.isDone(setup_))
             return alreadyDone();
-        FolderLock lock(folder_.part());
+        storage::FolderLock lock(folder_.part(), anotherExport);
         if (folder_.isDone(setup_)) // by now, by another process
             return alreadyDone();
         const std::size_t before = write();

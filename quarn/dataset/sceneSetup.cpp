@@ -1,11 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/sceneSetup.h"
 
-#include "quarn/files/Fnv64.h"
 #include "quarn/scene/plugs.h"
 
 #include "openquarn_app/SceneFile.h"
-#include "rig/NpyFile.h"
+#include "storage/Fnv64.h"
+#include "storage/NpyFile.h"
 
 #include <fstream>
 #include <stdexcept>
@@ -16,7 +16,7 @@ namespace {
 std::string sumOfFile(const std::filesystem::path& path) {
     std::ifstream file(path, std::ios::binary);
     std::vector<char> block(1U << 18U);
-    Fnv64 sum;
+    storage::Fnv64 sum;
     while (file) {
         file.read(block.data(), static_cast<std::streamsize>(block.size()));
         sum.add(std::as_bytes(std::span(block).first(static_cast<std::size_t>(file.gcount()))));
@@ -27,14 +27,14 @@ std::string sumOfFile(const std::filesystem::path& path) {
 }
 
 std::string sumOf(const HUintArray& numbers) {
-    Fnv64 sum;
+    storage::Fnv64 sum;
     for (const unsigned number : numbers)
         sum.add(std::as_bytes(std::span(&number, 1)));
     return sum.text();
 }
 
 std::string stateOfFile(const std::string& path) {
-    const auto identity = rig::identityOf(path);
+    const auto identity = storage::identityOf(path);
     if (!identity)
         return "(not there)";
     return std::to_string(identity->size) + " bytes of " + std::to_string(identity->seconds) + " s " +

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/import/vertexMap.h"
 
-#include "quarn/files/npyArray.h"
+#include "storage/npyArray.h"
 
 namespace quarn {
 
 void writeVertexMap(const std::filesystem::path& path, const std::vector<std::uint32_t>& sceneVertexOf) {
-    writeIntegers(path, std::vector<std::int32_t>(sceneVertexOf.begin(), sceneVertexOf.end()));
+    storage::writeIntegers(path, std::vector<std::int32_t>(sceneVertexOf.begin(), sceneVertexOf.end()));
 }
 
 } // namespace quarn

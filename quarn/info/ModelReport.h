@@ -4,7 +4,7 @@
 
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
-#include "quarn/files/npyArray.h"
+#include "storage/npyArray.h"
 
 #include <cstdint>
 #include <filesystem>
@@ -44,7 +44,7 @@ struct ModelAnswer {
 /// readModel() in a process of its own, with limits of time and memory, and there the network with `rows` of controls,
 /// of `columns` each. Throws std::runtime_error that names the directory when that process does not come back, or the
 /// rows do not suit the network; Interrupted. Thread: main.
-ModelAnswer readModelApart(const std::filesystem::path& directory, const FloatTable& controls);
+ModelAnswer readModelApart(const std::filesystem::path& directory, const storage::FloatTable& controls);
 
 /// The deformed geometry that a model is held against.
 struct GeometryFacts {

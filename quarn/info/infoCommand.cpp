@@ -183,8 +183,8 @@ GeometryFacts factsOfScene(const Options& options) {
 
 void showModel(const Options& options) {
     // in this order: the process apart is a copy of this one while it has one thread
-    const FloatTable controls =
-        options.controls.empty() ? FloatTable() : readFloatTable(absolutePath(options.controls));
+    const storage::FloatTable controls =
+        options.controls.empty() ? storage::FloatTable() : storage::readFloatTable(absolutePath(options.controls));
     if (!options.controls.empty() && controls.columns == 0)
         throw std::runtime_error(options.controls.string() + " has no numbers in its rows");
     const ModelAnswer answer = readModelApart(absolutePath(options.path), controls);
@@ -196,7 +196,7 @@ void showModel(const Options& options) {
         fit = fitOf(model, factsOfScene(options));
     }
     if (!options.controls.empty())
-        writeFloatTable(absolutePath(options.outputs), {controls.rows, model.outputs, answer.outputs});
+        storage::writeFloatTable(absolutePath(options.outputs), {controls.rows, model.outputs, answer.outputs});
     std::cout << printable(options.json ? modelJson(model, fit) : modelText(model, fit));
     std::cout.flush();
     if (!model.problems.empty())

@@ -29,7 +29,8 @@ void transfer(Archive& archive, Answer& answer) {
 }
 
 // each row through the network as it is, for those who want to know whether it does what they trained
-std::vector<float> outputsOf(neuralWarp::ModelSession& session, const ModelReport& model, const FloatTable& controls) {
+std::vector<float> outputsOf(neuralWarp::ModelSession& session, const ModelReport& model,
+                             const storage::FloatTable& controls) {
     if (controls.columns == 0)
         return {};
     if (model.outputs == 0)
@@ -49,7 +50,7 @@ std::vector<float> outputsOf(neuralWarp::ModelSession& session, const ModelRepor
 
 // in the process apart, whose standard output goes nowhere: what the readers print there becomes part of the answer
 // (decision 0120)
-ModelAnswer answerOf(const std::filesystem::path& directory, const FloatTable& controls) {
+ModelAnswer answerOf(const std::filesystem::path& directory, const storage::FloatTable& controls) {
     char* text = nullptr;
     std::size_t size = 0;
     stdout = open_memstream(&text, &size);
@@ -73,7 +74,7 @@ void check(const ModelAnswer& answer, std::size_t rows) {
 
 } // namespace
 
-ModelAnswer readModelApart(const std::filesystem::path& directory, const FloatTable& controls) {
+ModelAnswer readModelApart(const std::filesystem::path& directory, const storage::FloatTable& controls) {
     if (!std::filesystem::is_directory(directory))
         throw std::runtime_error(directory.string() + " is no model directory");
     ApartLimits limits;

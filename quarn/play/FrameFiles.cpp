@@ -3,7 +3,7 @@
 
 #include "quarn/console/UsageError.h"
 #include "quarn/play/meshFiles.h"
-#include "rig/NpyFile.h"
+#include "storage/NpyWriter.h"
 #include "storage/WholeFile.h"
 
 #include <cstdlib>
@@ -49,7 +49,7 @@ FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygo
     , order_(std::move(order)) {
     const std::vector<float> any(3 * polygons.vertexCount);
     if (isCache(pattern_))
-        cache_ = std::make_unique<rig::NpyWriter>(pattern_.string(), order_.points(any).size() / 3);
+        cache_ = std::make_unique<storage::NpyWriter>(pattern_.string(), order_.points(any).size() / 3);
     else
         polygons_ = order_.polygons(polygons);
 }

@@ -11,7 +11,7 @@
 #include <span>
 #include <string>
 
-namespace rig {
+namespace storage {
 class NpyWriter;
 }
 
@@ -42,7 +42,7 @@ private:
     std::filesystem::path pattern_;
     VertexOrder order_;
     MeshPolygons polygons_; ///< only for mesh files
-    std::unique_ptr<rig::NpyWriter> cache_;
+    std::unique_ptr<storage::NpyWriter> cache_;
 };
 
 } // namespace quarn

@@ -4,7 +4,7 @@
 #include "openquarn_app/Evaluation.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
-#include "rig/finite.h"
+#include "storage/finite.h"
 
 #include <chrono>
 #include <optional>
@@ -43,7 +43,7 @@ void FramePlayer::requireNoErrors() const {
 }
 
 void requireFinite(const std::vector<float>& xyz, const HPlug& mesh, int frame) {
-    if (const std::optional<std::size_t> place = rig::firstNotFinite(xyz))
+    if (const std::optional<std::size_t> place = storage::firstNotFinite(xyz))
         throw std::runtime_error("frame " + std::to_string(frame) + ": vertex " + std::to_string(*place / 3) + " of " +
                                  mesh.name().asChar() + " has a coordinate that is no finite number");
 }

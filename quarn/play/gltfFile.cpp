@@ -3,6 +3,7 @@
 // bytes, then a JSON and a binary chunk, each padded to a multiple of 4).
 #include "quarn/console/json.h"
 #include "quarn/play/meshFiles.h"
+#include "storage/base64.h"
 
 #include <algorithm>
 #include <limits>
@@ -28,21 +29,6 @@ std::vector<std::uint32_t> trianglesOf(const MeshPolygons& polygons) {
 template <class Numbers>
 std::string_view bytesOf(const Numbers& numbers) {
     return {reinterpret_cast<const char*>(numbers.data()), numbers.size() * sizeof(numbers[0])};
-}
-
-std::string base64(std::string_view bytes) {
-    constexpr std::string_view letters = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-    std::string text;
-    text.reserve((bytes.size() + 2) / 3 * 4);
-    for (std::size_t at = 0; at < bytes.size(); at += 3) {
-        const std::size_t there = std::min<std::size_t>(3, bytes.size() - at);
-        std::uint32_t group = 0;
-        for (std::size_t i = 0; i < 3; ++i)
-            group = (group << 8U) | (i < there ? static_cast<unsigned char>(bytes[at + i]) : 0U);
-        for (std::size_t i = 0; i < 4; ++i)
-            text += i <= there ? letters[(group >> (18U - 6U * i)) & 63U] : '=';
-    }
-    return text;
 }
 
 void writeCount(JsonWriter& json, const char* key, std::size_t count) {
@@ -153,7 +139,8 @@ void writeGltf(std::ostream& out, std::span<const float> xyz, const MeshPolygons
     numbers.reserve(length);
     numbers.append(bytesOf(xyz)).append(bytesOf(triangles));
     if (!binary) {
-        out << documentOf(xyz, triangles.size(), "data:application/octet-stream;base64," + base64(numbers)) << '\n';
+        out << documentOf(xyz, triangles.size(), "data:application/octet-stream;base64," + storage::base64(numbers))
+            << '\n';
         return;
     }
     std::string json = documentOf(xyz, triangles.size(), "");

@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/sceneOrder.h"
 
-#include "rig/NpyFile.h"
+#include "storage/NpyFile.h"
+#include "storage/NpyWriter.h"
 
 #include <algorithm>
 #include <cmath>
@@ -81,8 +82,8 @@ void requireFit(const std::vector<std::int32_t>& map, std::size_t fileVertices, 
 
 double writeInSceneOrder(const std::filesystem::path& from, const std::filesystem::path& to,
                          const std::vector<std::int32_t>& map, std::size_t sceneVertices, const Console& console) {
-    const rig::NpyFile file(from.string());
-    rig::NpyWriter writer(to.string(), sceneVertices);
+    const storage::NpyFile file(from.string());
+    storage::NpyWriter writer(to.string(), sceneVertices);
     Joiner joiner(map, sceneVertices);
     Progress progress(console, "joining vertices", std::max<std::size_t>(1, file.frameCount()));
     for (std::size_t frame = 0; frame < file.frameCount(); ++frame) {

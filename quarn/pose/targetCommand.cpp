@@ -13,7 +13,7 @@
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/training.h"
 #include "quarn/scene/vertexMap.h"
-#include "rig/NpyFile.h"
+#include "storage/NpyFile.h"
 
 #include <CLI/CLI.hpp>
 
@@ -56,7 +56,7 @@ fs::path pathOfConverted(const Options& options, const WarpGeometry& geometry) {
     return path;
 }
 
-Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpGeometry& geometry,
+Cache inSceneOrder(const storage::NpyFile& file, const Options& options, const WarpGeometry& geometry,
                    std::size_t vertices) {
     const std::vector<std::int32_t> map = readVertexMap(geometry.name);
     requireFit(map, file.vertexCount(), vertices);
@@ -70,7 +70,7 @@ Cache inSceneOrder(const rig::NpyFile& file, const Options& options, const WarpG
 }
 
 Cache fittingCache(const Options& options, const WarpGeometry& geometry) {
-    const rig::NpyFile file(options.cache.string());
+    const storage::NpyFile file(options.cache.string());
     const std::size_t vertices = polygonsOf(restMesh(geometry)).vertexCount;
     if (file.frameCount() == 0)
         throw std::runtime_error(options.cache.string() + " has no frames");

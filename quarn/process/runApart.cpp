@@ -3,6 +3,7 @@
 
 #include "quarn/console/interrupt.h"
 #include "quarn/process/confine.h"
+#include "storage/Descriptor.h"
 
 #include <fcntl.h>
 #include <sys/poll.h>
@@ -41,14 +42,7 @@ std::string answerOf(const std::function<std::string()>& action) {
     int status = 1;
     try {
         const std::string answer = answerOf(action);
-        std::size_t sent = 0;
-        while (sent < answer.size()) {
-            const ssize_t now = write(pipe, answer.data() + sent, answer.size() - sent);
-            if (now < 0 && errno != EINTR)
-                _exit(1);
-            sent += now > 0 ? static_cast<std::size_t>(now) : 0;
-        }
-        status = 0;
+        status = storage::writeAll(pipe, std::as_bytes(std::span(answer))) == 0 ? 0 : 1;
     } catch (...) {
         status = 1; // nothing was sent that counts
     }

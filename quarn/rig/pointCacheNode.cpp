@@ -1,11 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/pointCacheNode.h"
 
-#include "rig/NpyFile.h"
-
 #include "openquarn/HFileObject.h"
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnMesh.h"
+#include "storage/NpyFile.h"
 
 #include <algorithm>
 #include <cmath>
@@ -86,7 +85,7 @@ Place placeAt(double offset, std::size_t frames, bool interpolate) {
 }
 
 /// The points of the file at a place, read in pieces that stay in the cache of the processor.
-HPointArray pointsAt(const NpyFile& file, const Place& place) {
+HPointArray pointsAt(const storage::NpyFile& file, const Place& place) {
     constexpr std::size_t pieceSize = 1024;
     std::vector<double> lower(3 * std::min(pieceSize, file.vertexCount()));
     std::vector<double> upper(place.fraction > 0.0 ? lower.size() : 0);
@@ -118,7 +117,7 @@ HDataHandle inputOf(HDataBlock& block, const HObject& attribute) {
 }
 
 /// Throws when the file has no points for the mesh.
-void requireFit(const NpyFile& file, const HObject& mesh) {
+void requireFit(const storage::NpyFile& file, const HObject& mesh) {
     if (mesh.isNull())
         throw std::runtime_error("inMesh holds no mesh for '" + file.path() + "', which has points only");
     const auto vertices = static_cast<std::size_t>(HFnMesh(mesh).numVertices());
@@ -172,10 +171,10 @@ void pointCacheNode::openFile(const HString& rawPath) {
     HFileObject resolver;
     resolver.setRawFullName(rawPath);
     const std::string path = resolver.resolvedFullName().asStdString();
-    if (file_ && file_->path() == path && identityOf(path) == file_->identity())
+    if (file_ && file_->path() == path && storage::identityOf(path) == file_->identity())
         return;
     file_.reset();
-    file_ = std::make_unique<NpyFile>(path);
+    file_ = std::make_unique<storage::NpyFile>(path);
 }
 
 void pointCacheNode::getExternalContent(HExternalContentInfoTable& table) const {

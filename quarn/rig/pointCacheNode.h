@@ -6,9 +6,11 @@
 
 #include <memory>
 
-namespace rig {
-
+namespace storage {
 class NpyFile;
+}
+
+namespace rig {
 
 /// outMesh is inMesh with the points that the file has for the time: its polygons and component tags, the file's
 /// positions in object space. docs/pointCache.md lists the attributes.
@@ -44,7 +46,7 @@ private:
     HStatus moveToCache(HDataBlock& block, HObject& mesh);
     void openFile(const HString& rawPath);
 
-    std::unique_ptr<NpyFile> file_; ///< as of the last compute; null before it, and after a failure to open it
+    std::unique_ptr<storage::NpyFile> file_; ///< as of the last compute; null before it, and after a failure to open it
 };
 
 } // namespace rig

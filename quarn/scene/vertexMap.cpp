@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/vertexMap.h"
 
-#include "quarn/files/Fnv64.h"
-#include "quarn/files/npyArray.h"
 #include "quarn/scene/plugs.h"
+#include "storage/Fnv64.h"
+#include "storage/npyArray.h"
 
 #include <stdexcept>
 
@@ -30,14 +30,14 @@ std::filesystem::path vertexMapFile(const std::string& meshName) {
 }
 
 std::string vertexMapDigest(std::span<const std::int32_t> map) {
-    Fnv64 sum;
+    storage::Fnv64 sum;
     sum.add(std::as_bytes(map));
     return sum.text();
 }
 
 std::vector<std::int32_t> readVertexMap(const std::string& meshName) {
     const std::filesystem::path path = vertexMapFile(meshName);
-    std::vector<std::int32_t> map = readIntegers(path);
+    std::vector<std::int32_t> map = storage::readIntegers(path);
     const std::string known = textOfCharacter("vertexMapDigests");
     if (!known.empty() && known.find(vertexMapDigest(map)) == std::string::npos)
         throw std::runtime_error(path.string() + " is another vertex map than the scene was imported with: import " +

@@ -7,10 +7,10 @@
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
 #include "quarn/dataset/readJson.h"
-#include "quarn/files/npyArray.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/pose/readKeys.h"
 #include "rig/registration.h"
+#include "storage/npyArray.h"
 
 #include <cmath>
 #include <functional>
@@ -60,10 +60,10 @@ bool fuzzNpyTable(const std::uint8_t* data, std::size_t size) {
     const MemoryFile file(data + 1, size - 1);
     return accepts(file.path(), [&] {
         if (data[0] == 'i') {
-            require(4 * quarn::readIntegers(file.path()).size() <= size);
+            require(4 * storage::readIntegers(file.path()).size() <= size);
             return;
         }
-        const quarn::FloatTable table = quarn::readFloatTable(file.path());
+        const storage::FloatTable table = storage::readFloatTable(file.path());
         require(table.values.size() == table.rows * table.columns && 4 * table.values.size() <= size);
     });
 }

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "npyTarget.h"
 
-#include "rig/NpyFile.h"
+#include "storage/NpyFile.h"
 
 #include <cstdlib>
 #include <optional>
@@ -18,21 +18,21 @@ void require(bool holds) {
         std::abort();
 }
 
-std::optional<rig::NpyFile> opened(const std::string& path) {
+std::optional<storage::NpyFile> opened(const std::string& path) {
     try {
-        return std::optional<rig::NpyFile>(std::in_place, path);
+        return std::optional<storage::NpyFile>(std::in_place, path);
     } catch (const std::runtime_error& error) {
         require(std::string(error.what()).find(path) != std::string::npos);
         return std::nullopt;
     }
 }
 
-void requireSameHeader(const rig::NpyFile& file) {
-    const std::string head = rig::makeNpyHead(file.frameCount(), file.vertexCount());
-    require(head.size() == rig::npyHeadSize);
-    const rig::NpyPlace place = rig::findNpyHeader(std::string_view(head).substr(0, rig::npyPreambleSize));
+void requireSameHeader(const storage::NpyFile& file) {
+    const std::string head = storage::makeNpyHead(file.frameCount(), file.vertexCount());
+    require(head.size() == storage::npyHeadSize);
+    const storage::NpyPlace place = storage::findNpyHeader(std::string_view(head).substr(0, storage::npyPreambleSize));
     require(place.start + place.length == head.size());
-    const rig::NpyHeader header = rig::parseNpyHeader(std::string_view(head).substr(place.start));
+    const storage::NpyHeader header = storage::parseNpyHeader(std::string_view(head).substr(place.start));
     require(header.frames == file.frameCount() && header.vertices == file.vertexCount());
 }
 
@@ -41,7 +41,7 @@ void requireSameHeader(const rig::NpyFile& file) {
 bool fuzzNpy(const std::uint8_t* data, std::size_t size) {
     const storage::Descriptor memory(memfd_create("fuzz", MFD_CLOEXEC));
     require(memory.isOpen());
-    require(write(memory.number(), data, size) == static_cast<ssize_t>(size));
+    require(storage::writeAll(memory.number(), std::as_bytes(std::span(data, size))) == 0);
     const auto file = opened("/proc/self/fd/" + std::to_string(memory.number()));
     if (!file)
         return false;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
-#include "rig/NpyFile.h"
+#include "storage/NpyWriter.h"
 
 #include <filesystem>
 #include <fstream>
@@ -11,7 +11,7 @@
 /// refuses and other programs write.
 inline void writeRawCache(const std::filesystem::path& path, const std::vector<std::vector<float>>& frames) {
     constexpr int headerSize = 128;
-    rig::NpyWriter writer(path.string(), frames.front().size() / 3);
+    storage::NpyWriter writer(path.string(), frames.front().size() / 3);
     for (const std::vector<float>& frame : frames)
         writer.append(std::vector<float>(frame.size()));
     writer.finish();

@@ -4,7 +4,7 @@
 
 #include "quarn/dataset/DatasetFolder.h"
 #include "quarn/dataset/DatasetWriter.h"
-#include "quarn/dataset/FolderLock.h"
+#include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
 
 #include <chrono>
@@ -82,7 +82,7 @@ void replaceDataset(const fs::path& output, const std::string& value) {
     quarn::Setup setup;
     setup.add("value", value);
     static_cast<void>(folder.isDone(setup));
-    quarn::FolderLock lock(folder.part());
+    storage::FolderLock lock(folder.part(), quarn::anotherExport);
     quarn::DatasetWriter writer(folder.part(), {1, 1, 1});
     if (folder.begun(setup) == quarn::DatasetFolder::Begun::no || !writer.resume().empty()) {
         folder.begin(setup);

@@ -3,7 +3,7 @@
 #include "quarn/dataset/ExportScene.h"
 
 #include "quarn/dataset/DatasetWriter.h"
-#include "quarn/dataset/FolderLock.h"
+#include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
 
 #include <cerrno>
@@ -150,7 +150,7 @@ TEST_F(ResumeTest, TouchesNothingThatIsNotItsOwn) {
 TEST_F(ResumeTest, OneAtATime) {
     leavePart(3);
     {
-        const quarn::FolderLock other(part());
+        const storage::FolderLock other(part(), quarn::anotherExport);
         EXPECT_THAT(errorOf(options()), HasSubstr("another quarn export is writing"));
     }
     EXPECT_EQ(exported(), expected_);

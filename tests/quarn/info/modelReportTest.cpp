@@ -81,7 +81,7 @@ TEST_F(ModelReports, ComeFromAnotherProcessAsTheyAre) {
     spec.shapes = {std::vector<float>(6)};
     spec.weights = std::vector<float>(24, 2.0F);
     const ModelReport here = read(spec);
-    const FloatTable controls{3, 2, {0, 0, 1, 0, 0.5F, 1}};
+    const storage::FloatTable controls{3, 2, {0, 0, 1, 0, 0.5F, 1}};
     const ModelAnswer apart = readModelApart(here.directory, controls);
     const auto textOf = [](const ModelReport& model) { return modelJson(model, fitOf(model, {"body", 4, {0, 3}, 1})); };
     EXPECT_EQ(textOf(apart.model), textOf(here));
@@ -94,7 +94,7 @@ TEST_F(ModelReports, ComeFromAnotherProcessAsTheyAre) {
 
     writeFile(here.directory / "principal_shapes.json", "[");
     EXPECT_EQ(readModelApart(here.directory, {}).printed, "Parse error\n");
-    const auto refusal = [&](const FloatTable& table) -> std::string {
+    const auto refusal = [&](const storage::FloatTable& table) -> std::string {
         try {
             readModelApart(here.directory, table);
         } catch (const std::runtime_error& error) {

@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 // Statistics against a plain computation, and files read back.
-#include "quarn/files/npyArray.h"
 #include "quarn/play/Distances.h"
 #include "quarn/play/FrameFiles.h"
 #include "quarn/play/FrameTimes.h"
@@ -151,21 +150,6 @@ TEST(FrameFiles, AreNamedByTheFrame) {
     EXPECT_EQ(frameFile("a#/b.##.obj", 123), "a#/b.123.obj");
     EXPECT_EQ(frameFile("b#.obj", -7), "b-7.obj");
     EXPECT_EQ(frameFile("b.obj", 7), "b.obj");
-}
-
-TEST(NpyArrays, ComeBackAndAreChecked) {
-    const TemporaryFolder folder;
-    const auto path = folder.path() / "a.npy";
-    writeIntegers(path, std::vector<std::int32_t>{3, -1});
-    EXPECT_THAT(readIntegers(path), ElementsAre(3, -1));
-    EXPECT_THAT(why([&] { readFloatTable(path); }), HasSubstr("'<i4' in the shape [2], where '<f4' in 2 dimensions"));
-    writeFloatTable(path, {2, 3, {1, 2, 3, 4, 5, 0.1F}});
-    const FloatTable table = readFloatTable(path);
-    EXPECT_EQ(table.columns, 3U);
-    EXPECT_THAT(table.values, ElementsAre(1, 2, 3, 4, 5, 0.1F));
-    std::ofstream(path, std::ios::app) << "x";
-    EXPECT_THAT(why([&] { readFloatTable(path); }), HasSubstr("takes 24 bytes, and 25 follow"));
-    EXPECT_THAT(why([&] { readFloatTable(folder.path() / "none"); }), HasSubstr("does not exist"));
 }
 
 } // namespace

@@ -2,11 +2,12 @@
 // quarn target: caches that fit, caches that do not, and vertices that a scene has joined.
 #include "PoseTest.h"
 
-#include "quarn/files/npyArray.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/vertexMap.h"
-#include "rig/NpyFile.h"
+#include "storage/NpyFile.h"
+#include "storage/NpyWriter.h"
+#include "storage/npyArray.h"
 #include "support/rawCache.h"
 
 #include <algorithm>
@@ -23,7 +24,7 @@ class TargetTest : public PoseTest {
 protected:
     /// Every coordinate of a frame is base + frame.
     std::string cache(const std::string& name, std::size_t frames, std::size_t count, float base) const {
-        rig::NpyWriter writer(path(name), count);
+        storage::NpyWriter writer(path(name), count);
         for (std::size_t frame = 0; frame < frames; ++frame)
             writer.append(std::vector<float>(3 * count, base + static_cast<float>(frame)));
         writer.finish();
@@ -131,13 +132,13 @@ TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
         std::fill_n(points.begin() + std::ptrdiff_t(3 * vertex), 3, static_cast<float>(vertex));
     points[3 * vertices] = 0.125F; // joined with vertex 0, at a distance
     points[3 * vertices + 1] = points[3 * vertices + 2] = 0.0F;
-    rig::NpyWriter writer(path("file.npy"), vertices + 1);
+    storage::NpyWriter writer(path("file.npy"), vertices + 1);
     writer.append(points);
     writer.finish();
-    const std::vector<std::int32_t> map = quarn::readIntegers(this->map("map.npy", reversedMap()));
+    const std::vector<std::int32_t> map = storage::readIntegers(this->map("map.npy", reversedMap()));
     EXPECT_EQ(map, reversedMap());
     EXPECT_EQ(quarn::writeInSceneOrder(path("file.npy"), path("scene.npy"), map, vertices, {true, false}), 0.125);
-    const rig::NpyFile converted(path("scene.npy"));
+    const storage::NpyFile converted(path("scene.npy"));
     ASSERT_EQ(converted.vertexCount(), vertices);
     std::vector<double> xyz(3 * vertices);
     converted.read(0, 0, xyz);
@@ -221,9 +222,9 @@ TEST_F(TargetTest, MapsThatDoNotFitAreRefused) {
     const std::string files[] = {this->map("map.npy", reversedMap(), "<i8"), write("a.npy", whole + "x"),
                                  write("b.npy", ""), write("c.npy", "{}"), path("missing.npy")};
     for (const std::string& file : files)
-        EXPECT_THROW(quarn::readIntegers(file), std::runtime_error) << file;
+        EXPECT_THROW(storage::readIntegers(file), std::runtime_error) << file;
     for (std::size_t length = 0; length < whole.size(); length += 7)
-        EXPECT_THROW(quarn::readIntegers(write("cut.npy", whole.substr(0, length))), std::runtime_error) << length;
+        EXPECT_THROW(storage::readIntegers(write("cut.npy", whole.substr(0, length))), std::runtime_error) << length;
 }
 
 } // namespace

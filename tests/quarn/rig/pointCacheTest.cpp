@@ -4,8 +4,8 @@
 #include "host/support/testDeformers.h"
 #include "support/TemporaryFolder.h"
 
-#include "rig/NpyFile.h"
 #include "rig/registration.h"
+#include "storage/NpyWriter.h"
 
 #include "openquarn/HExternalContentInfoTable.h"
 #include "openquarn/HExternalContentLocationTable.h"
@@ -39,7 +39,7 @@ public:
 
     /// A file where vertex v of frame f is at (xs[f], v, -f), in use by the node.
     void play(const std::vector<float>& xs, unsigned vertices = 4) const {
-        rig::NpyWriter writer(path(), vertices);
+        storage::NpyWriter writer(path(), vertices);
         for (std::size_t frame = 0; frame < xs.size(); ++frame) {
             std::vector<float> xyz;
             for (unsigned vertex = 0; vertex < vertices; ++vertex)

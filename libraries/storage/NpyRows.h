@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-// A NumPy array that grows on the disk, row by row, and can be taken up again after the program has died.
+// A NumPy array that grows on the disk, row by row, and can be taken up again after the program has died. It is written
+// in its place: its folder is one that nobody reads before it is published.
 #pragma once
 
-#include "quarn/files/Fnv64.h"
 #include "storage/Descriptor.h"
+#include "storage/Fnv64.h"
 
 #include <cstdint>
 #include <filesystem>
@@ -11,7 +12,7 @@
 #include <string>
 #include <vector>
 
-namespace quarn {
+namespace storage {
 
 /// What the array is when it is complete: shape[0] rows, in C order.
 struct ArrayLayout {
@@ -23,10 +24,10 @@ struct ArrayLayout {
     std::string head() const;
 };
 
-/// Errors are std::runtime_error with a sentence that names the path and the reason. Thread: one at a time.
-class RowFile {
+/// Errors are FileError. Thread: one at a time.
+class NpyRows {
 public:
-    RowFile(std::filesystem::path path, ArrayLayout layout);
+    NpyRows(std::filesystem::path path, ArrayLayout layout);
 
     /// An array without rows, whose header says how many there are going to be. What was at the path is replaced.
     void begin();
@@ -43,12 +44,11 @@ public:
 private:
     void cut(std::uint64_t rows);
     bool hasSum(std::uint64_t bytes, const std::string& sum);
-    [[noreturn]] void fail(int error) const;
 
     std::filesystem::path path_;
     ArrayLayout layout_;
-    storage::Descriptor file_;
+    Descriptor file_;
     Fnv64 sum_;
 };
 
-} // namespace quarn
+} // namespace storage

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Small arrays in NumPy files, read and written as a whole. Large ones, of points, go through rig::NpyFile.
+// Small arrays in NumPy files, read and written as a whole. Large ones, of points, go through NpyFile and NpyRows.
 #pragma once
 
 #include <cstdint>
@@ -7,7 +7,7 @@
 #include <span>
 #include <vector>
 
-namespace quarn {
+namespace storage {
 
 /// Rows of numbers, one row after the other.
 struct FloatTable {
@@ -29,4 +29,4 @@ std::vector<std::int32_t> readIntegers(const std::filesystem::path& path);
 void writeFloatTable(const std::filesystem::path& path, const FloatTable& table);
 void writeIntegers(const std::filesystem::path& path, std::span<const std::int32_t> values);
 
-} // namespace quarn
+} // namespace storage

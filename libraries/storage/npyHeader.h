@@ -12,7 +12,7 @@
 #include <string_view>
 #include <vector>
 
-namespace rig {
+namespace storage {
 
 /// What the array is: [frames, vertices, 3] numbers in C order.
 struct NpyHeader {
@@ -61,4 +61,4 @@ std::string makeNpyHead(std::string_view descr, const std::vector<std::uint64_t>
 /// The same of [frames, vertices, 3] '<f4'. [any]
 std::string makeNpyHead(std::uint64_t frames, std::uint64_t vertices);
 
-} // namespace rig
+} // namespace storage

@@ -1,38 +1,29 @@
 // SPDX-License-Identifier: Apache-2.0
 // Point caches as files: what is read, what is refused and why, and what is left when writing fails.
 #include "fuzz/npyTarget.h"
-#include "support/TemporaryFolder.h"
+#include "libraries/storage/StorageTest.h"
 #include "support/seedCorpus.h"
 
-#include "rig/NpyFile.h"
-#include "rig/finite.h"
-
-#include <gmock/gmock.h>
+#include "storage/NpyFile.h"
+#include "storage/NpyWriter.h"
+#include "storage/finite.h"
+#include "storage/npyArray.h"
 
 #include <bit>
 #include <cfloat>
 #include <cmath>
 #include <csignal>
-#include <cstring>
-#include <fstream>
-#include <functional>
 #include <random>
-#include <vector>
 
 #include <sys/resource.h>
 
 namespace {
 
-using rig::NpyFile;
-using rig::NpyWriter;
+using storage::NpyFile;
+using storage::NpyWriter;
 using ::testing::AllOf;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
-
-std::string bytesOf(const std::filesystem::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    return {std::istreambuf_iterator<char>(file), {}};
-}
 
 std::vector<double> frameOf(const NpyFile& file, std::size_t frame) {
     std::vector<double> xyz(3 * file.vertexCount());
@@ -47,29 +38,13 @@ std::string npy(const std::string& dictionary, std::size_t dataSize, char major 
     return bytes + std::string(major == 1 ? 0 : 2, '\0') + dictionary + std::string(dataSize, '\0');
 }
 
-class NpyFiles : public ::testing::Test {
+class NpyFiles : public StorageTest {
 public:
-    std::filesystem::path folder() const { return folder_.path(); }
-    std::string path(const std::string& name = "cache.npy") const { return folder() / name; }
+    std::string path(const std::string& name = "cache.npy") const { return StorageTest::path(name); }
     std::string write(const std::string& bytes) const {
-        std::ofstream(path(), std::ios::binary) << bytes;
+        put("cache.npy", bytes);
         return path();
     }
-    std::size_t entries() const {
-        const std::filesystem::directory_iterator entry(folder());
-        return static_cast<std::size_t>(std::distance(begin(entry), end(entry)));
-    }
-    static std::string why(const std::function<void()>& action) {
-        try {
-            action();
-        } catch (const std::exception& error) {
-            return error.what();
-        }
-        return "";
-    }
-
-private:
-    TemporaryFolder folder_;
 };
 
 // the bytes that numpy.save writes for [[[1, 2.5, -3]], [[4, 5, 0.1]]] as '<f4', and [[0.1, -2, 3]] as '<f8'
@@ -102,7 +77,7 @@ TEST_F(NpyFiles, RefusesWhatIsNoPointCache) {
     };
     const std::string good = npy("{'descr': '<f4', 'fortran_order': False, 'shape': (1, 3), } \n", 12);
     write(good);
-    ASSERT_EQ(why([&] { NpyFile{path()}; }), "") << "the rows differ from this one by what is wrong";
+    ASSERT_EQ(errorOf([&] { NpyFile{path()}; }), "(nothing)") << "the rows differ from this one by what is wrong";
     const std::vector<Refused> rows = {
         {"", "does not begin with"},
         {"\x93NUMPX" + good.substr(6), "does not begin with"},
@@ -142,24 +117,24 @@ TEST_F(NpyFiles, RefusesWhatIsNoPointCache) {
     };
     for (const Refused& row : rows) {
         write(row.bytes);
-        EXPECT_THAT(why([&] { NpyFile{path()}; }),
+        EXPECT_THAT(errorOf([&] { NpyFile{path()}; }),
                     AllOf(HasSubstr("'" + path() + "' cannot be read: "), HasSubstr(row.why)));
     }
 }
 
 TEST_F(NpyFiles, RefusesWhatIsNoFile) {
     ASSERT_EQ(mkfifo(path("pipe").c_str(), 0600), 0);
-    EXPECT_THAT(why([&] { NpyFile{path("pipe")}; }), HasSubstr("no regular file"));
-    EXPECT_THAT(why([&] { NpyFile{folder()}; }), HasSubstr("no regular file"));
-    EXPECT_THAT(why([&] { NpyFile{path("none.npy")}; }), HasSubstr("none.npy' cannot be read: No such file"));
+    EXPECT_THAT(errorOf([&] { NpyFile{path("pipe")}; }), HasSubstr("no regular file"));
+    EXPECT_THAT(errorOf([&] { NpyFile{folder.path()}; }), HasSubstr("no regular file"));
+    EXPECT_THAT(errorOf([&] { NpyFile{path("none.npy")}; }), HasSubstr("none.npy' cannot be read: No such file"));
 }
 
 TEST_F(NpyFiles, AFileThatIsCutWhileItIsOpenIsAnError) {
     const NpyFile file(write(npy("{'descr': '<f4', 'fortran_order': False, 'shape': (2, 1, 3)}", 24)));
     std::filesystem::resize_file(path(), std::filesystem::file_size(path()) - 4);
     EXPECT_THAT(frameOf(file, 0), ElementsAre(0, 0, 0));
-    EXPECT_THAT(why([&] { frameOf(file, 1); }), HasSubstr("cut short since it was opened"));
-    EXPECT_FALSE(rig::identityOf(path()) == file.identity());
+    EXPECT_THAT(errorOf([&] { frameOf(file, 1); }), HasSubstr("cut short since it was opened"));
+    EXPECT_FALSE(storage::identityOf(path()) == file.identity());
     std::vector<double> two(6);
     EXPECT_THROW(file.read(2, 0, std::span(two).first(3)), std::out_of_range);
     EXPECT_THROW(file.read(0, 0, two), std::out_of_range);
@@ -190,7 +165,7 @@ TEST_F(NpyFiles, WhatIsWrittenIsReadBackToTheBit) {
                 EXPECT_TRUE(std::equal(std::begin(part), std::end(part), given[1].begin() + 6));
             }
         }
-    EXPECT_EQ(entries(), 1U);
+    EXPECT_EQ(names().size(), 1U);
 }
 
 TEST_F(NpyFiles, NobodySeesAPartOfAFile) {
@@ -199,12 +174,12 @@ TEST_F(NpyFiles, NobodySeesAPartOfAFile) {
     {
         NpyWriter writer(path(), 1);
         writer.append(point);
-        EXPECT_EQ(bytesOf(path()), "before");
-        EXPECT_EQ(entries(), 2U) << "written in the same folder";
+        EXPECT_EQ(content("cache.npy"), "before");
+        EXPECT_EQ(names().size(), 2U) << "written in the same folder";
         EXPECT_THROW(writer.append(std::span(point).first(2)), std::invalid_argument);
     }
-    EXPECT_EQ(bytesOf(path()), "before");
-    EXPECT_EQ(entries(), 1U) << "nothing is left without finish()";
+    EXPECT_EQ(content("cache.npy"), "before");
+    EXPECT_EQ(names().size(), 1U) << "nothing is left without finish()";
     NpyWriter writer(path(), 1);
     writer.append(point);
     writer.finish();
@@ -242,34 +217,48 @@ TEST_F(NpyFiles, FailedWritingSaysWhyAndLeavesWhatWasThere) {
         const std::vector<float> frame(30000);
         const FileSizeLimit limit(200000);
         writer.append(frame);
-        reason = why([&] { writer.append(frame); });
+        reason = errorOf([&] { writer.append(frame); });
         EXPECT_THROW(writer.finish(), std::logic_error) << "not a file with the frames of before";
         EXPECT_EQ(writer.frameCount(), 1U);
     }
     EXPECT_EQ(reason, path() + " could not be written: File too large");
-    EXPECT_THAT(why([&] {
+    EXPECT_THAT(errorOf([&] {
                     NpyWriter(path(), 1).append(std::vector<float>{0, 0, -INFINITY});
                 }),
                 HasSubstr("vertex 0 of its frame 0 has a coordinate that is no finite number"));
-    EXPECT_EQ(bytesOf(path()), "before");
-    EXPECT_EQ(entries(), 1U);
-    EXPECT_THAT(why([&] { NpyWriter("/dev/fd/2", 1); }), HasSubstr("one after the other only"))
+    EXPECT_EQ(content("cache.npy"), "before");
+    EXPECT_EQ(names().size(), 1U);
+    EXPECT_THAT(errorOf([&] { NpyWriter("/dev/fd/2", 1); }), HasSubstr("one after the other only"))
         << "its head comes last";
+}
+
+TEST_F(NpyFiles, SmallArraysComeBackAndAreChecked) {
+    storage::writeIntegers(path(), std::vector<std::int32_t>{3, -1});
+    EXPECT_THAT(storage::readIntegers(path()), ElementsAre(3, -1));
+    EXPECT_THAT(errorOf([&] { storage::readFloatTable(path()); }),
+                HasSubstr("'<i4' in the shape [2], where '<f4' in 2 dimensions"));
+    storage::writeFloatTable(path(), {2, 3, {1, 2, 3, 4, 5, 0.1F}});
+    const storage::FloatTable table = storage::readFloatTable(path());
+    EXPECT_EQ(table.columns, 3U);
+    EXPECT_THAT(table.values, ElementsAre(1, 2, 3, 4, 5, 0.1F));
+    write(content("cache.npy") + "x");
+    EXPECT_THAT(errorOf([&] { storage::readFloatTable(path()); }), HasSubstr("takes 24 bytes, and 25 follow"));
+    EXPECT_THAT(errorOf([&] { storage::readFloatTable(path("none")); }), HasSubstr("does not exist"));
 }
 
 TEST(FirstNotFinite, IsFoundWhereverItIs) {
     for (const std::size_t size : {1U, 4096U, 4097U, 10000U}) {
         std::vector<float> values(size, -FLT_MAX);
-        EXPECT_EQ(rig::firstNotFinite(values), std::nullopt);
+        EXPECT_EQ(storage::firstNotFinite(values), std::nullopt);
         for (const std::size_t place : {std::size_t{0}, size / 2, size - 1})
             for (const float bad : {INFINITY, -INFINITY, NAN}) {
                 values.back() = bad;
                 values[place] = bad;
-                EXPECT_EQ(rig::firstNotFinite(values), place);
+                EXPECT_EQ(storage::firstNotFinite(values), place);
                 values.back() = values[place] = 1.0F;
             }
     }
-    EXPECT_EQ(rig::firstNotFinite({}), std::nullopt);
+    EXPECT_EQ(storage::firstNotFinite({}), std::nullopt);
 }
 
 TEST(NpySeeds, AreAcceptedOrRefusedAsTheirNamesSay) {

@@ -1,11 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-// Point caches: the points of a mesh, frame by frame, in a NumPy array file. What numpy.save writes is read, and what
-// is written numpy.load reads.
+// Point caches: the points of a mesh, frame by frame, in a NumPy array file. What numpy.save writes is read.
 #pragma once
 
-#include "rig/npyHeader.h"
 #include "storage/Descriptor.h"
-#include "storage/WholeFile.h"
+#include "storage/npyHeader.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -13,7 +11,7 @@
 #include <span>
 #include <string>
 
-namespace rig {
+namespace storage {
 
 /// Tells a file from another in its place, or from itself after it was written again.
 struct FileIdentity {
@@ -57,35 +55,9 @@ private:
     [[noreturn]] void fail(const std::string& why) const;
 
     std::string path_;
-    storage::Descriptor file_;
+    Descriptor file_;
     FileIdentity identity_;
     NpyHeader header_;
 };
 
-/// Writes an array of [frames, vertices, 3] '<f4', frame by frame, as a storage::WholeFile: finish() puts it into its
-/// place, and without it nothing is left. Errors are storage::FileError; after one, only destruction is left. One
-/// thread at a time. [any] throughout.
-class NpyWriter {
-public:
-    /// Makes the temporary file. Throws when the file could not be put into its place.
-    NpyWriter(const std::string& path, std::size_t vertexCount);
-
-    /// Adds a frame: `xyz` x, y, z of every vertex, 3 * vertexCount numbers. Throws std::invalid_argument, and writes
-    /// nothing, for another number of them; std::runtime_error, naming frame and vertex, for one that is not finite.
-    void append(std::span<const float> xyz);
-    /// Of those that have been written.
-    std::size_t frameCount() const { return frames_; }
-    /// Writes the header, brings everything to the disk and puts the file into its place. Called once.
-    void finish();
-
-private:
-    void beginStep();
-
-    std::string path_;
-    storage::WholeFile file_;
-    std::size_t vertexCount_;
-    std::size_t frames_ = 0;
-    bool isUsable_ = true;
-};
-
-} // namespace rig
+} // namespace storage

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "rig/npyHeader.h"
+#include "storage/npyHeader.h"
 
 #include <algorithm>
 #include <charconv>
 #include <stdexcept>
 #include <vector>
 
-namespace rig {
+namespace storage {
 namespace {
 
 constexpr std::string_view magic("\x93NUMPY", 6);
@@ -232,4 +232,4 @@ std::string makeNpyHead(std::uint64_t frames, std::uint64_t vertices) {
     return makeNpyHead("<f4", {frames, vertices, 3});
 }
 
-} // namespace rig
+} // namespace storage

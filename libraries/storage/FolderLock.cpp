@@ -1,5 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/dataset/FolderLock.h"
+#include "storage/FolderLock.h"
+
+#include "storage/FileError.h"
 
 #include <cerrno>
 #include <stdexcept>
@@ -7,56 +9,48 @@
 
 #include <fcntl.h>
 #include <sys/file.h>
-#include <sys/stat.h>
 #include <unistd.h>
 
-namespace quarn {
+namespace storage {
 namespace {
 
-[[noreturn]] void fail(const std::filesystem::path& folder, int error) {
-    throw std::runtime_error(folder.string() + " could not be locked: " + std::generic_category().message(error));
-}
-
-bool isAt(const std::filesystem::path& path, int file) {
-    struct stat named = {};
-    struct stat open = {};
-    return ::stat(path.c_str(), &named) == 0 && ::fstat(file, &open) == 0 && named.st_dev == open.st_dev &&
-           named.st_ino == open.st_ino;
+[[noreturn]] void failToLock(const std::filesystem::path& folder, int error) {
+    throw FileError(folder, "could not be locked: " + textOfErrno(error));
 }
 
 } // namespace
 
-FolderLock::FolderLock(const std::filesystem::path& folder)
+FolderLock::FolderLock(const std::filesystem::path& folder, const std::string& holder)
     : folder_(folder) {
     // another process may finish with the folder between two of these steps
     constexpr int attempts = 100;
     for (int attempt = 0; attempt < attempts; ++attempt)
-        if (take())
+        if (take(holder))
             return;
-    fail(folder_, EAGAIN);
+    failToLock(folder_, EAGAIN);
 }
 
 // false: the file that was locked is not the folder's any more
-bool FolderLock::take() {
+bool FolderLock::take(const std::string& holder) {
     std::error_code error;
     std::filesystem::create_directories(folder_, error);
     if (error)
         throw std::runtime_error("the folder " + folder_.string() + " could not be made: " + error.message());
-    lock_ = storage::Descriptor(::open(file().c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0666));
+    lock_ = Descriptor(::open(file().c_str(), O_RDWR | O_CREAT | O_NOFOLLOW | O_CLOEXEC, 0666));
     if (!lock_.isOpen() && errno == ENOENT)
         return false;
     if (!lock_.isOpen())
-        fail(folder_, errno);
+        failToLock(folder_, errno);
     if (::flock(lock_.number(), LOCK_EX | LOCK_NB) != 0) {
         if (errno == EWOULDBLOCK)
-            throw std::runtime_error("another quarn export is writing " + folder_.string() + "; wait until it is done");
-        fail(folder_, errno);
+            throw std::runtime_error(holder + " is writing " + folder_.string() + "; wait until it is done");
+        failToLock(folder_, errno);
     }
     return isAt(file(), lock_.number());
 }
 
 bool FolderLock::isTaken(const std::filesystem::path& folder) {
-    const storage::Descriptor lock(::open((folder / fileName).c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    const Descriptor lock(::open((folder / fileName).c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
     return lock.isOpen() && ::flock(lock.number(), LOCK_EX | LOCK_NB) != 0;
 }
 
@@ -65,4 +59,4 @@ FolderLock::~FolderLock() {
     ::rmdir(folder_.c_str()); // refused when there is more in it
 }
 
-} // namespace quarn
+} // namespace storage

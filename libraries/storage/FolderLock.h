@@ -4,15 +4,17 @@
 #include "storage/Descriptor.h"
 
 #include <filesystem>
+#include <string>
 
-namespace quarn {
+namespace storage {
 
 /// Keeps a folder for this process, against others that ask for the same, by a lock on a file "lock" in it. The system
 /// takes the lock away with the process, however that ends. Thread: one at a time.
 class FolderLock {
 public:
-    /// Makes the folder when there is none. Throws std::runtime_error when it is taken, or cannot be made.
-    explicit FolderLock(const std::filesystem::path& folder);
+    /// Makes the folder when there is none. `holder` is who has it when it is taken, as the error names it: "another
+    /// quarn export". Throws std::runtime_error when it is taken, or cannot be made.
+    FolderLock(const std::filesystem::path& folder, const std::string& holder);
     /// Removes its file, and the folder when nothing else is in it.
     ~FolderLock();
     FolderLock(const FolderLock&) = delete;
@@ -26,11 +28,11 @@ public:
     static constexpr const char* fileName = "lock";
 
 private:
-    bool take();
+    bool take(const std::string& holder);
     std::filesystem::path file() const { return folder_ / fileName; }
 
     std::filesystem::path folder_;
-    storage::Descriptor lock_;
+    Descriptor lock_;
 };
 
-} // namespace quarn
+} // namespace storage

@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "rig/finite.h"
+#include "storage/finite.h"
 
 #include <algorithm>
 #include <bit>
 #include <cmath>
 #include <cstdint>
 
-namespace rig {
+namespace storage {
 namespace {
 
 // Infinity and NaN are what has all bits of the exponent: one more in its lowest place, and it carries into the sign.
@@ -35,4 +35,4 @@ std::optional<std::size_t> firstNotFinite(std::span<const float> values) {
     return {};
 }
 
-} // namespace rig
+} // namespace storage

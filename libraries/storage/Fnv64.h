@@ -9,7 +9,7 @@
 #include <span>
 #include <string>
 
-namespace quarn {
+namespace storage {
 
 /// Thread: one at a time.
 class Fnv64 {
@@ -31,4 +31,4 @@ private:
     std::uint64_t value_ = 14695981039346656037U;
 };
 
-} // namespace quarn
+} // namespace storage

@@ -1,25 +1,22 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "rig/NpyFile.h"
+#include "storage/NpyFile.h"
+
+#include "storage/FileError.h"
 
 #include <algorithm>
 #include <array>
 #include <bit>
 #include <cerrno>
 #include <stdexcept>
-#include <system_error>
 
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
-namespace rig {
+namespace storage {
 namespace {
 
 static_assert(std::endian::native == std::endian::little, "numbers are read as they lie in the file");
-
-std::string reasonOf(int error) {
-    return std::generic_category().message(error);
-}
 
 FileIdentity identityFrom(const struct stat& status) {
     FileIdentity identity;
@@ -46,7 +43,7 @@ NpyFile::NpyFile(const std::string& path)
     , file_(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
     struct stat status = {};
     if (!file_.isOpen() || fstat(file_.number(), &status) != 0)
-        fail(reasonOf(errno));
+        fail(textOfErrno(errno));
     if (!S_ISREG(status.st_mode))
         fail("it is no regular file");
     identity_ = identityFrom(status);
@@ -114,21 +111,15 @@ void NpyFile::read(std::size_t frame, std::size_t firstVertex, std::span<double>
 }
 
 void NpyFile::readBytes(std::uint64_t from, std::span<std::byte> bytes) const {
-    while (!bytes.empty()) {
-        const ssize_t got = pread(file_.number(), bytes.data(), bytes.size(), static_cast<off_t>(from));
-        if (got < 0 && errno == EINTR)
-            continue;
-        if (got < 0)
-            fail(reasonOf(errno));
-        if (got == 0)
-            fail("it has been cut short since it was opened");
-        bytes = bytes.subspan(static_cast<std::size_t>(got));
-        from += static_cast<std::uint64_t>(got);
-    }
+    const std::ptrdiff_t got = readAt(file_.number(), from, bytes);
+    if (got < 0)
+        fail(textOfErrno(errno));
+    if (static_cast<std::size_t>(got) < bytes.size())
+        fail("it has been cut short since it was opened");
 }
 
 void NpyFile::fail(const std::string& why) const {
     throw std::runtime_error("point cache '" + path_ + "' cannot be read: " + why);
 }
 
-} // namespace rig
+} // namespace storage

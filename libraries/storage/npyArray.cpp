@@ -1,15 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/files/npyArray.h"
+#include "storage/npyArray.h"
 
-#include "rig/npyHeader.h"
 #include "storage/FileError.h"
 #include "storage/WholeFile.h"
+#include "storage/npyHeader.h"
 #include "storage/readWholeFile.h"
 
 #include <algorithm>
 #include <stdexcept>
 
-namespace quarn {
+namespace storage {
 namespace {
 
 using Shape = std::vector<std::uint64_t>;
@@ -25,21 +25,21 @@ struct Body {
 
 // what follows the header, once it is found to be as long as the shape says
 Body bodyOf(std::string_view bytes, const std::string& descr, std::size_t dimensions) {
-    const rig::NpyPlace place = rig::findNpyHeader(bytes.substr(0, rig::npyPreambleSize));
+    const NpyPlace place = findNpyHeader(bytes.substr(0, npyPreambleSize));
     if (place.start + place.length > bytes.size())
         throw std::runtime_error("it is cut short within its header");
-    const rig::NpyArray array = rig::parseNpyArray(bytes.substr(place.start, place.length));
+    const NpyArray array = parseNpyArray(bytes.substr(place.start, place.length));
     if (array.descr != descr || array.shape.size() != dimensions)
-        throw std::runtime_error("it has numbers '" + array.descr + "' in the shape " + rig::npyShapeText(array.shape) +
+        throw std::runtime_error("it has numbers '" + array.descr + "' in the shape " + npyShapeText(array.shape) +
                                  ", where '" + descr + "' in " + std::to_string(dimensions) +
                                  (dimensions == 1 ? " dimension is" : " dimensions are") + " expected");
     const std::string_view numbers = bytes.substr(place.start + place.length);
     std::uint64_t needed = sizeof(float);
     for (const std::uint64_t size : array.shape)
         if (__builtin_mul_overflow(needed, size, &needed))
-            throw std::runtime_error("its shape " + rig::npyShapeText(array.shape) + " is too large");
+            throw std::runtime_error("its shape " + npyShapeText(array.shape) + " is too large");
     if (needed != numbers.size())
-        throw std::runtime_error("its shape " + rig::npyShapeText(array.shape) + " takes " + std::to_string(needed) +
+        throw std::runtime_error("its shape " + npyShapeText(array.shape) + " takes " + std::to_string(needed) +
                                  " bytes, and " + std::to_string(numbers.size()) + " follow the header");
     return {array.shape, numbers};
 }
@@ -47,12 +47,12 @@ Body bodyOf(std::string_view bytes, const std::string& descr, std::size_t dimens
 template <class Number>
 Shape read(const std::filesystem::path& path, const char* descr, std::size_t dimensions, std::vector<Number>& values) {
     try {
-        const std::string bytes = storage::readWholeFile(path, npyArrayFileLimit);
+        const std::string bytes = readWholeFile(path, npyArrayFileLimit);
         const Body body = bodyOf(bytes, descr, dimensions);
         values.resize(body.numbers.size() / sizeof(Number));
         std::copy(body.numbers.begin(), body.numbers.end(), reinterpret_cast<char*>(values.data()));
         return body.shape;
-    } catch (const storage::FileError& error) {
+    } catch (const FileError& error) {
         fail(path, "it " + error.predicate());
     } catch (const std::runtime_error& error) {
         fail(path, error.what());
@@ -61,8 +61,8 @@ Shape read(const std::filesystem::path& path, const char* descr, std::size_t dim
 
 template <class Number>
 void write(const std::filesystem::path& path, const char* descr, const Shape& shape, std::span<const Number> values) {
-    storage::WholeFile file(path);
-    file.stream() << rig::makeNpyHead(descr, shape);
+    WholeFile file(path);
+    file.stream() << makeNpyHead(descr, shape);
     file.stream().write(reinterpret_cast<const char*>(values.data()),
                         static_cast<std::streamsize>(values.size_bytes()));
     file.finish();
@@ -92,4 +92,4 @@ void writeIntegers(const std::filesystem::path& path, std::span<const std::int32
     write(path, "<i4", {values.size()}, values);
 }
 
-} // namespace quarn
+} // namespace storage

@@ -1,14 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "rig/NpyFile.h"
-#include "rig/finite.h"
+#include "storage/NpyWriter.h"
+
+#include "storage/finite.h"
+#include "storage/npyHeader.h"
 
 #include <stdexcept>
 
-namespace rig {
+namespace storage {
 
 NpyWriter::NpyWriter(const std::string& path, std::size_t vertexCount)
     : path_(path)
-    , file_(path, storage::WholeFile::Writes::anywhere)
+    , file_(path, WholeFile::Writes::anywhere)
     , vertexCount_(vertexCount) {
     // no header yet: what a crash leaves is no array for anybody
     file_.stream() << std::string(npyHeadSize, '\0');
@@ -43,4 +45,4 @@ void NpyWriter::beginStep() {
     isUsable_ = false;
 }
 
-} // namespace rig
+} // namespace storage
