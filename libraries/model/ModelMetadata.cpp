@@ -10,6 +10,8 @@
 namespace neuralWarp {
 namespace {
 
+static_assert(storage::jsonRules::modelMetadata.mostBytes == metadataFileLimit);
+
 SubsetState toSubsetState(const std::string& text) {
     if (text == "empty") {
         return SubsetState::Empty;
@@ -38,7 +40,7 @@ std::vector<std::uint32_t> readAffectMap(const json::Value& root) {
 
 bool readMetadata(ModelMetadata& record, std::streambuf& source, const std::filesystem::path& path) {
     json::Document root;
-    if (!json::parseObject(root, source, path)) {
+    if (!json::parseObject(root, source, path, storage::jsonRules::modelMetadata)) {
         return false;
     }
     ModelMetadata read; // the record must not be left half filled when memory runs out
@@ -59,7 +61,7 @@ bool readMetadata(ModelMetadata& record, std::streambuf& source, const std::file
 bool readMetadataFile(ModelMetadata& record, const std::filesystem::path& path) noexcept {
     try {
         std::filebuf file;
-        return json::open(file, path, metadataFileLimit) && readMetadata(record, file, path);
+        return json::open(file, path, storage::jsonRules::modelMetadata) && readMetadata(record, file, path);
     } catch (...) {
         return json::refuseByException(path);
     }

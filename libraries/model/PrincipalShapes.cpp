@@ -13,6 +13,8 @@
 namespace neuralWarp {
 namespace {
 
+static_assert(storage::jsonRules::principalShapes.mostBytes == principalShapesFileLimit);
+
 /// Half a step of the last place above the largest float: what lies below still rounds to a finite value.
 constexpr double floatRoundingLimit = 0x1.ffffffp+127;
 
@@ -68,7 +70,7 @@ bool readShapes(PrincipalShapes& shapes, const json::Value& root, const std::fil
 
 bool readPrincipalShapes(PrincipalShapes& shapes, std::streambuf& source, const std::filesystem::path& path) {
     json::Document root;
-    if (!json::parseObject(root, source, path)) {
+    if (!json::parseObject(root, source, path, storage::jsonRules::principalShapes)) {
         return false;
     }
     shapes.shapeCount = json::readUint(root, "principalShapeCount", 0);
@@ -94,7 +96,8 @@ bool readPrincipalShapesFile(const std::filesystem::path& path, std::vector<floa
     try {
         std::filebuf file;
         PrincipalShapes shapes;
-        const bool ok = json::open(file, path, principalShapesFileLimit) && readPrincipalShapes(shapes, file, path);
+        const bool ok =
+            json::open(file, path, storage::jsonRules::principalShapes) && readPrincipalShapes(shapes, file, path);
         values.swap(shapes.values);
         shapeCount = shapes.shapeCount;
         vertCount = shapes.vertCount;

@@ -6,46 +6,8 @@
 #include <ios>
 
 namespace neuralWarp::json {
-namespace {
 
-/// RapidJSON input stream over a stream buffer. Its own wrapper goes through std::istream, whose per-character calls
-/// are several times slower; the end of the input reads as a zero byte here as there.
-class StreambufInput {
-public:
-    using Ch = char;
-
-    explicit StreambufInput(std::streambuf& source)
-        : source_(source) {}
-
-    Ch Peek() const { return toChar(source_.sgetc()); }
-    Ch Take() {
-        ++count_;
-        return toChar(source_.sbumpc());
-    }
-    std::size_t Tell() const { return count_; }
-
-    static bool isEnd(std::streambuf& source) { return Traits::eq_int_type(source.sgetc(), Traits::eof()); }
-
-    // Part of RapidJSON's stream concept; only parsing in place would call them.
-    Ch* PutBegin() { return nullptr; }
-    void Put(Ch) {}
-    void Flush() {}
-    std::size_t PutEnd(Ch*) { return 0; }
-
-private:
-    using Traits = std::streambuf::traits_type;
-
-    static Ch toChar(Traits::int_type c) {
-        return Traits::eq_int_type(c, Traits::eof()) ? '\0' : Traits::to_char_type(c);
-    }
-
-    std::streambuf& source_;
-    std::size_t count_ = 0;
-};
-
-} // namespace
-
-bool open(std::filebuf& file, const std::filesystem::path& path, std::uint64_t limit) {
+bool open(std::filebuf& file, const std::filesystem::path& path, const storage::JsonRules& rules) {
     std::error_code error;
     // A pipe would wait for a writer, and a directory opens on Linux but cannot be read.
     if (!std::filesystem::is_regular_file(path, error) || !file.open(path, std::ios::in)) {
@@ -53,18 +15,15 @@ bool open(std::filebuf& file, const std::filesystem::path& path, std::uint64_t l
         return false;
     }
     const std::uintmax_t size = std::filesystem::file_size(path, error);
-    if (!error && size > limit) {
-        return refuse(path, "the file is larger than " + std::to_string(limit) + " bytes");
+    if (!error && size > rules.mostBytes) {
+        return refuse(path, "the file is larger than " + std::to_string(rules.mostBytes) + " bytes");
     }
     return true;
 }
 
-bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path) {
-    StreambufInput input(source);
-    // Iterative: recursion would let a file of brackets overflow the stack of the evaluation thread (decision 0024).
-    document.ParseStream<rapidjson::kParseDefaultFlags | rapidjson::kParseIterativeFlag>(input);
-    // the parser takes a zero byte for the end
-    if (document.HasParseError() || !StreambufInput::isEnd(source)) {
+bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path,
+                 const storage::JsonRules& rules) {
+    if (!storage::parseJson(document, source, rules)) {
         std::fputs("Parse error\n", stdout);
         return false;
     }

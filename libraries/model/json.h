@@ -3,53 +3,26 @@
 #pragma once
 
 #include <cstdint>
-#include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <new>
 #include <streambuf>
 #include <string>
 
-#include <rapidjson/document.h>
+#include "storage/Json.h"
 
 namespace neuralWarp::json {
 
-/// RapidJSON writes through whatever its allocator returns; this one throws instead of returning null.
-class ThrowingAllocator {
-public:
-    static const bool kNeedFree = true; // the name and the type are RapidJSON's allocator concept
+using Document = storage::JsonDocument;
+using Value = storage::JsonValue;
 
-    void* Malloc(std::size_t size) { return size == 0 ? nullptr : checked(std::malloc(size)); }
-    void* Realloc(void* block, std::size_t, std::size_t newSize) {
-        if (newSize == 0) {
-            std::free(block);
-            return nullptr;
-        }
-        return checked(std::realloc(block, newSize));
-    }
-    static void Free(void* block) { std::free(block); }
+/// Opens a regular file of at most `rules.mostBytes` bytes. On failure prints "Failed to open metadata file stream\n",
+/// or what refuse() does for a file that is too large, and returns false.
+bool open(std::filebuf& file, const std::filesystem::path& path, const storage::JsonRules& rules);
 
-private:
-    static void* checked(void* block) {
-        if (block == nullptr) {
-            throw std::bad_alloc();
-        }
-        return block;
-    }
-};
-
-using Pool = rapidjson::MemoryPoolAllocator<ThrowingAllocator>;
-using Document = rapidjson::GenericDocument<rapidjson::UTF8<>, Pool, ThrowingAllocator>;
-using Value = Document::ValueType;
-
-/// Opens a regular file of at most `limit` bytes. On failure prints "Failed to open metadata file stream\n", or what
-/// refuse() does for a file that is too large, and returns false.
-bool open(std::filebuf& file, const std::filesystem::path& path, std::uint64_t limit);
-
-/// Parses the rest of `source` as one JSON document, nested to any depth: an object, and nothing but white space after
-/// it, not even behind a zero byte. On failure prints "Parse error\n", or what refuse() does for another root, and
-/// returns false. `path` is what the source is called. Throws std::bad_alloc.
-bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path);
+/// Parses the rest of `source` as one JSON object. On failure prints "Parse error\n", or what refuse() does for another
+/// root, and returns false. `path` is what the source is called. Throws std::bad_alloc.
+bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path,
+                 const storage::JsonRules& rules);
 
 /// Prints "Error: PATH: REASON\n" on standard output, and returns false.
 bool refuse(const std::filesystem::path& path, const char* reason) noexcept;

@@ -28,10 +28,6 @@ std::uint64_t ArrayLayout::rowBytes() const {
     return bytes;
 }
 
-std::string ArrayLayout::head() const {
-    return makeNpyHead(type, shape);
-}
-
 NpyRows::NpyRows(std::filesystem::path path, ArrayLayout layout)
     : path_(std::move(path))
     , layout_(std::move(layout)) {}
@@ -42,7 +38,7 @@ void NpyRows::begin() {
     if (!file_.isOpen())
         failToWrite(path_, errno);
     sum_ = Fnv64();
-    const std::string head = layout_.head();
+    const std::string head = makeNpyHead(layout_.type, layout_.shape);
     append(std::as_bytes(std::span(head)));
 }
 

@@ -20,8 +20,6 @@ struct ArrayLayout {
     std::vector<std::uint64_t> shape; ///< one to three dimensions
 
     std::uint64_t rowBytes() const;
-    /// The 128 bytes before the numbers: a header of NPY format version 1.0.
-    std::string head() const;
 };
 
 /// Errors are FileError. Thread: one at a time.

@@ -2,7 +2,7 @@
 // Looking things up in the JSON of a glTF file, which may hold anything.
 #pragma once
 
-#include <rapidjson/document.h>
+#include "storage/Json.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -12,7 +12,7 @@
 
 namespace quarn {
 
-using JsonValue = rapidjson::Value;
+using storage::JsonValue;
 
 /// The member of an object, or null when there is none (or `object` is none).
 inline const JsonValue* member(const JsonValue& object, const char* key) {

@@ -2,9 +2,8 @@
 #include "quarn/character/prepareGltf.h"
 
 #include "quarn/character/checkGltf.h"
-#include "storage/base64.h"
+#include "storage/encodings.h"
 
-#include <rapidjson/error/en.h>
 #include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 
@@ -49,7 +48,9 @@ Parts partsOf(std::string_view bytes) {
     std::string_view chunks = bytes.substr(glbHeader + chunkHeader + length);
     if (!chunks.empty() && (chunks.size() < chunkHeader || numberAt(chunks, 0) > chunks.size() - chunkHeader))
         throw std::runtime_error("the binary glTF file ends in its binary data");
-    return {bytes.substr(glbHeader + chunkHeader, length), chunks};
+    std::string_view json = bytes.substr(glbHeader + chunkHeader, length);
+    json.remove_suffix(json.size() - (json.find_last_not_of('\0') + 1)); // some writers fill it up so
+    return {json, chunks};
 }
 
 std::string joined(std::string json, std::string_view chunks) {
@@ -61,50 +62,26 @@ std::string joined(std::string json, std::string_view chunks) {
     return bytes + "JSON" + json + std::string(chunks);
 }
 
-// what reads and writes JSON by recursion must not be led too deep
-void checkDepth(std::string_view json) {
-    constexpr int most = 200;
-    int depth = 0;
-    bool inText = false;
-    for (std::size_t i = 0; i < json.size(); ++i) {
-        const char c = json[i];
-        if (inText && c == '\\')
-            ++i;
-        else if (c == '"')
-            inText = !inText;
-        else if (!inText && (c == '{' || c == '['))
-            ++depth;
-        else if (!inText && (c == '}' || c == ']'))
-            --depth;
-        if (depth > most)
-            throw std::runtime_error("the JSON text is nested more than " + std::to_string(most) + " deep");
-    }
-}
-
 void checkObjects(const JsonValue& list, const std::string& things) {
     for (const JsonValue& entry : list.GetArray())
         if (!entry.IsObject())
             throw std::runtime_error("one of the " + things + " is not an object");
 }
 
-void parse(rapidjson::Document& document, std::string_view json) {
-    checkDepth(json);
-    document.Parse<rapidjson::kParseValidateEncodingFlag | rapidjson::kParseFullPrecisionFlag>(json.data(),
-                                                                                               json.size());
-    if (document.HasParseError())
-        throw std::runtime_error("not JSON at byte " + std::to_string(document.GetErrorOffset()) + ": " +
-                                 rapidjson::GetParseError_En(document.GetParseError()));
+storage::JsonDocument parse(std::string_view json) {
+    storage::JsonDocument document = storage::parseJson(json, storage::jsonRules::character);
     const JsonValue* asset = member(document, "asset");
     const std::string version = asset == nullptr ? "" : textOf(*asset, "version");
     if (version.substr(0, 2) != "2.")
         throw std::runtime_error("glTF of version \"" + version + "\", not 2");
+    return document;
 }
 
 std::string nodeId(std::size_t index) {
     return "n" + std::to_string(index);
 }
 
-void renameNodes(rapidjson::Document& document, SourceHints& hints) {
+void renameNodes(storage::JsonDocument& document, SourceHints& hints) {
     const auto nodes = document.FindMember("nodes");
     if (nodes == document.MemberEnd())
         return;
@@ -117,14 +94,14 @@ void renameNodes(rapidjson::Document& document, SourceHints& hints) {
     }
 }
 
-rapidjson::Value& arrayMember(rapidjson::Value& object, const char* key, rapidjson::Document& document) {
+JsonValue& arrayMember(JsonValue& object, const char* key, storage::JsonDocument& document) {
     if (member(object, key) == nullptr)
-        object.AddMember(rapidjson::StringRef(key), rapidjson::Value(rapidjson::kArrayType), document.GetAllocator());
+        object.AddMember(rapidjson::StringRef(key), JsonValue(rapidjson::kArrayType), document.GetAllocator());
     return object[key];
 }
 
 // only what is read, and JOINTS_0 before JOINTS_1: the importer counts them as they come
-void keepReadAttributes(JsonValue& primitive, rapidjson::Document& document) {
+void keepReadAttributes(JsonValue& primitive, storage::JsonDocument& document) {
     JsonValue& attributes = primitive["attributes"];
     JsonValue kept(rapidjson::kObjectType);
     const auto keep = [&](const std::string& name) {
@@ -141,7 +118,7 @@ void keepReadAttributes(JsonValue& primitive, rapidjson::Document& document) {
 }
 
 // what is not read had better not be there: the importer would follow its indices
-void removeUnread(rapidjson::Document& document, SourceHints& hints) {
+void removeUnread(storage::JsonDocument& document, SourceHints& hints) {
     for (const char* key : {"materials", "textures", "images", "samplers", "cameras", "extensions", "extensionsUsed",
                             "extensionsRequired"})
         document.RemoveMember(key);
@@ -172,7 +149,7 @@ std::string identities(std::size_t count) {
 }
 
 // the index of a new accessor of `count` identity matrices, in a buffer of its own
-rapidjson::SizeType addIdentities(rapidjson::Document& document, std::size_t count) {
+rapidjson::SizeType addIdentities(storage::JsonDocument& document, std::size_t count) {
     auto& memory = document.GetAllocator();
     const std::string bytes = identities(count);
     const std::string uri = "data:application/octet-stream;base64," + storage::base64(bytes);
@@ -196,7 +173,7 @@ rapidjson::SizeType addIdentities(rapidjson::Document& document, std::size_t cou
 }
 
 // a skin without bind matrices has identities, which the importer does not know
-void addBindMatrices(rapidjson::Document& document) {
+void addBindMatrices(storage::JsonDocument& document) {
     for (JsonValue& skin : arrayMember(document, "skins", document).GetArray()) {
         if (member(skin, "inverseBindMatrices") != nullptr)
             continue;
@@ -245,8 +222,7 @@ void noteInterpolations(const JsonValue& animation, std::size_t index, SourceHin
 
 std::string prepareGltf(const std::string& bytes, SourceHints& hints) {
     const Parts parts = partsOf(bytes);
-    rapidjson::Document document;
-    parse(document, parts.json);
+    storage::JsonDocument document = parse(parts.json);
     for (const char* things : {"nodes", "meshes", "animations", "accessors", "bufferViews", "buffers", "skins"})
         checkObjects(listOf(document, things), things);
     checkGltf(document);

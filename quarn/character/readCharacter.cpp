@@ -10,6 +10,7 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/process/runApart.h"
 #include "storage/FileError.h"
+#include "storage/Json.h"
 #include "storage/readWholeFile.h"
 
 #include <assimp/BaseImporter.h>
@@ -42,9 +43,8 @@ bool isGltf(const std::string& ending) {
 }
 
 std::string readBytes(const std::string& path) {
-    constexpr std::uint64_t largest = UINT32_MAX; // what the head of a binary glTF file can say
     try {
-        std::string bytes = storage::readWholeFile(path, largest);
+        std::string bytes = storage::readWholeFile(path, storage::jsonRules::character.mostBytes);
         if (bytes.empty())
             throw std::runtime_error("the file is empty");
         return bytes;

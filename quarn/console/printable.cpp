@@ -1,30 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/console/printable.h"
 
-#include <cstdint>
+#include "storage/encodings.h"
+
+#include <algorithm>
 
 namespace quarn {
 namespace {
 
 unsigned byteAt(std::string_view text, std::size_t i) {
     return i < text.size() ? static_cast<unsigned char>(text[i]) : 0;
-}
-
-// how many bytes of a character follow its first one; 0 for those that stand alone, and for what begins none
-std::size_t continuations(unsigned first) {
-    return first >= 0xc2 && first < 0xe0   ? 1
-           : first >= 0xe0 && first < 0xf0 ? 2
-           : first >= 0xf0 && first < 0xf5 ? 3
-                                           : 0;
-}
-
-// the bytes of the character at `i`; 1 for what is none
-std::size_t lengthAt(std::string_view text, std::size_t i) {
-    const std::size_t more = continuations(byteAt(text, i));
-    for (std::size_t k = 1; k <= more; ++k)
-        if ((byteAt(text, i + k) & 0xc0U) != 0x80)
-            return 1;
-    return 1 + more;
 }
 
 void appendEscape(std::string& out, unsigned code) {
@@ -45,7 +30,7 @@ std::string printable(std::string_view text) {
     out.reserve(text.size());
     for (std::size_t i = 0; i < text.size();) {
         const unsigned first = byteAt(text, i);
-        const std::size_t length = lengthAt(text, i);
+        const std::size_t length = std::max<std::size_t>(1, storage::utf8Length(text.substr(i)));
         if (length == 2 && first == 0xc2 && byteAt(text, i + 1) < 0xa0)
             appendEscape(out, byteAt(text, i + 1)); // the second set of control characters
         else if (length == 1 && (isControl(first) || first >= 0x80))

@@ -2,7 +2,7 @@
 #include "quarn/dataset/DatasetWriter.h"
 
 #include "quarn/console/json.h"
-#include "quarn/dataset/readJson.h"
+#include "storage/Json.h"
 #include "storage/WholeFile.h"
 
 #include <optional>
@@ -35,12 +35,12 @@ std::string textOf(const ProgressRecord& record) {
     return buffer.GetString() + std::string("\n");
 }
 
-std::optional<ProgressRecord> readProgress(const std::filesystem::path& path) {
-    const std::optional<rapidjson::Document> json = readJson(path);
-    if (!json || !json->IsObject() || !json->HasMember("rows") || !json->HasMember("sums"))
+std::optional<ProgressRecord> readProgress(const std::filesystem::path& path) try {
+    const storage::JsonDocument json = storage::readJson(path, storage::jsonRules::dataset);
+    if (!json.IsObject() || !json.HasMember("rows") || !json.HasMember("sums"))
         return {};
-    const auto& rows = (*json)["rows"];
-    const auto& sums = (*json)["sums"];
+    const auto& rows = json["rows"];
+    const auto& sums = json["sums"];
     ProgressRecord record;
     if (!rows.IsUint64() || !sums.IsArray() || sums.Size() != record.sums.size())
         return {};
@@ -51,6 +51,8 @@ std::optional<ProgressRecord> readProgress(const std::filesystem::path& path) {
         record.sums[i] = sums[i].GetString();
     }
     return record;
+} catch (const std::runtime_error&) { // not there, or damaged
+    return {};
 }
 
 } // namespace

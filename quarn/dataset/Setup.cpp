@@ -2,9 +2,10 @@
 #include "quarn/dataset/Setup.h"
 
 #include "quarn/console/json.h"
-#include "quarn/dataset/readJson.h"
+#include "storage/Json.h"
 
 #include <map>
+#include <stdexcept>
 
 namespace quarn {
 namespace {
@@ -38,17 +39,19 @@ std::string Setup::json() const {
     return buffer.GetString() + std::string("\n");
 }
 
-std::optional<Setup> Setup::read(const std::filesystem::path& file) {
-    const std::optional<rapidjson::Document> json = readJson(file);
-    if (!json || !json->IsObject())
+std::optional<Setup> Setup::read(const std::filesystem::path& file) try {
+    const storage::JsonDocument json = storage::readJson(file, storage::jsonRules::dataset);
+    if (!json.IsObject())
         return {};
     Setup setup;
-    for (const auto& member : json->GetObject()) {
+    for (const auto& member : json.GetObject()) {
         if (!member.value.IsString())
             return {};
         setup.add(member.name.GetString(), std::string(member.value.GetString()));
     }
     return setup;
+} catch (const std::runtime_error&) { // not there, or damaged
+    return {};
 }
 
 } // namespace quarn

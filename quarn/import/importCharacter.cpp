@@ -8,11 +8,11 @@
 #include "quarn/import/jsonFiles.h"
 #include "quarn/import/posedJoints.h"
 #include "quarn/import/reparent.h"
-#include "quarn/import/vertexMap.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/vertexMap.h"
 #include "storage/WholeFile.h"
+#include "storage/npyArray.h"
 
 #include <algorithm>
 #include <stdexcept>
@@ -174,9 +174,10 @@ private:
         // (decision 0132)
         std::string digests;
         for (std::size_t i = 0; i < report_.meshes.size(); ++i) {
-            const std::vector<std::uint32_t>& map = character_.meshes[i].joinedOf;
-            writeVertexMap(folder / report_.meshes[i].vertexMap, map);
-            digests += (i > 0 ? " " : "") + vertexMapDigest(std::vector<std::int32_t>(map.begin(), map.end()));
+            const std::vector<std::uint32_t>& sceneVertexOf = character_.meshes[i].joinedOf;
+            const std::vector<std::int32_t> map(sceneVertexOf.begin(), sceneVertexOf.end());
+            storage::writeIntegers(folder / report_.meshes[i].vertexMap, map);
+            digests += (i > 0 ? " " : "") + vertexMapDigest(map);
         }
         set("vertexMapDigests", digests);
         session.save(options_.output);

@@ -3,7 +3,7 @@
 // bytes, then a JSON and a binary chunk, each padded to a multiple of 4).
 #include "quarn/console/json.h"
 #include "quarn/play/meshFiles.h"
-#include "storage/base64.h"
+#include "storage/encodings.h"
 
 #include <algorithm>
 #include <limits>

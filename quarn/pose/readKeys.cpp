@@ -5,10 +5,8 @@
 #include "quarn/pose/PoseControls.h"
 #include "quarn/pose/smoothSlopes.h"
 #include "quarn/scene/plugs.h"
+#include "storage/Json.h"
 #include "storage/readWholeFile.h"
-
-#include <rapidjson/document.h>
-#include <rapidjson/error/en.h>
 
 #include <algorithm>
 #include <array>
@@ -22,7 +20,7 @@ namespace {
 constexpr double largestFrame = 1e8;
 constexpr double radiansPerDegree = 3.14159265358979323846 / 180.0;
 
-std::string textOf(const rapidjson::Value& value) {
+std::string textOf(const storage::JsonValue& value) {
     return {value.GetString(), value.GetStringLength()};
 }
 
@@ -33,15 +31,13 @@ public:
         : name_(name) {}
 
     std::vector<PlugKeys> read(const std::string& text) {
-        rapidjson::Document document;
-        parse(text, document);
-        if (!document.IsObject())
+        const storage::JsonDocument file = parse(text);
+        if (!file.IsObject())
             fail("holds no JSON object");
-        checkMembers(document);
-        degrees_ = choice(document, "unit", {"radians", "degrees"}) == 1;
+        checkMembers(file);
+        degrees_ = choice(file, "unit", {"radians", "degrees"}) == 1;
         constexpr std::array kinds{PoseKeys::Kind::linear, PoseKeys::Kind::spline, PoseKeys::Kind::step};
-        kind_ = kinds[static_cast<std::size_t>(choice(document, "interpolation", {"linear", "smooth", "step"}))];
-        const rapidjson::Value& file = document; // its iterators compare in both compilers only where it is const
+        kind_ = kinds[static_cast<std::size_t>(choice(file, "interpolation", {"linear", "smooth", "step"}))];
         const auto keys = file.FindMember("keys");
         if (keys == file.MemberEnd() || !keys->value.IsObject() || keys->value.ObjectEmpty())
             fail(R"(has no "keys", an object with a list of [frame, value] for each plug)");
@@ -55,20 +51,15 @@ public:
 private:
     [[noreturn]] void fail(const std::string& why) const { throw std::runtime_error(name_ + " " + why); }
 
-    void parse(const std::string& text, rapidjson::Document& document) const {
-        constexpr unsigned flags =
-            rapidjson::kParseFullPrecisionFlag | rapidjson::kParseIterativeFlag | rapidjson::kParseValidateEncodingFlag;
-        document.Parse<flags>(text.data(), text.size());
-        if (!document.HasParseError())
-            return;
-        const std::string before = text.substr(0, document.GetErrorOffset());
-        const auto line = std::count(before.begin(), before.end(), '\n') + 1;
-        const std::size_t column = before.size() - (before.rfind('\n') + 1) + 1;
-        fail("is no JSON at line " + std::to_string(line) + ", column " + std::to_string(column) + ": " +
-             rapidjson::GetParseError_En(document.GetParseError()));
+    storage::JsonDocument parse(const std::string& text) const {
+        try {
+            return storage::parseJson(text, storage::jsonRules::keys);
+        } catch (const storage::JsonError& error) {
+            fail("is no JSON at " + std::string(error.what()));
+        }
     }
 
-    void checkMembers(const rapidjson::Value& object) const {
+    void checkMembers(const storage::JsonValue& object) const {
         std::map<std::string, int> seen{{"unit", 0}, {"interpolation", 0}, {"keys", 0}};
         for (const auto& member : object.GetObject()) {
             const auto known = seen.find(textOf(member.name));
@@ -81,7 +72,7 @@ private:
     }
 
     // the number of the label that the member has; 0 without it
-    int choice(const rapidjson::Value& object, const char* member, const std::vector<std::string>& labels) const {
+    int choice(const storage::JsonValue& object, const char* member, const std::vector<std::string>& labels) const {
         const auto found = object.FindMember(member);
         if (found == object.MemberEnd())
             return 0;
@@ -96,13 +87,13 @@ private:
         return static_cast<int>(label - labels.begin());
     }
 
-    PlugKeys plugKeys(const std::string& name, const rapidjson::Value& list) {
+    PlugKeys plugKeys(const std::string& name, const storage::JsonValue& list) {
         PlugKeys made;
         made.plug = usablePlug(name);
         if (!list.IsArray() || list.Empty())
             fail("has no list of [frame, value] for " + name);
         const double unit = degrees_ && isAngle(made.plug) ? radiansPerDegree : 1.0;
-        for (const rapidjson::Value& key : list.GetArray())
+        for (const storage::JsonValue& key : list.GetArray())
             addKey(name, key, unit, made.keys);
         made.keys.kind = kind_;
         if (kind_ == PoseKeys::Kind::spline)
@@ -113,7 +104,7 @@ private:
         return made;
     }
 
-    void addKey(const std::string& name, const rapidjson::Value& key, double unit, PoseKeys& keys) const {
+    void addKey(const std::string& name, const storage::JsonValue& key, double unit, PoseKeys& keys) const {
         const std::string which = "key " + std::to_string(keys.times.size() + 1) + " of " + name;
         if (!key.IsArray() || key.Size() != 2 || !key[0].IsNumber() || !key[1].IsNumber())
             fail("has a " + which + " that is not [frame, value], two numbers");
@@ -160,8 +151,7 @@ std::vector<PlugKeys> parseKeys(const std::string& text, const std::string& name
 }
 
 std::vector<PlugKeys> readKeys(const std::filesystem::path& file) {
-    constexpr std::uint64_t largest = std::uint64_t{1} << 30U;
-    return parseKeys(storage::readWholeFile(file, largest), file.string());
+    return parseKeys(storage::readWholeFile(file, storage::jsonRules::keys.mostBytes), file.string());
 }
 
 } // namespace quarn

@@ -58,26 +58,18 @@ std::string answerOf(const std::function<std::string()>& action) {
     throw NoAnswer(Why::outOfMemory, "takes more than " + std::to_string(limits.memory >> 20U) + " MiB of memory");
 }
 
-// both ends of a pipe; closed with their owner
 class Pipe {
 public:
     Pipe() {
-        if (pipe2(ends_.data(), O_CLOEXEC) != 0)
+        std::array<int, 2> ends{};
+        if (pipe2(ends.data(), O_CLOEXEC) != 0)
             failToStart("make a pipe to");
+        reading_ = storage::Descriptor(ends[0]);
+        writing_ = storage::Descriptor(ends[1]);
     }
-    ~Pipe() {
-        close(ends_[0]);
-        closeWriting();
-    }
-    Pipe(const Pipe&) = delete;
-    Pipe& operator=(const Pipe&) = delete;
 
-    int writing() const { return ends_[1]; }
-    void closeWriting() {
-        if (ends_[1] >= 0)
-            close(ends_[1]);
-        ends_[1] = -1;
-    }
+    int writing() const { return writing_.number(); }
+    void closeWriting() { writing_.close(); }
     /// All that comes until the other side is gone.
     std::string readAll(const ApartLimits& limits) const {
         const Clock::time_point end = Clock::now() + limits.wallClock;
@@ -85,7 +77,7 @@ public:
         std::array<char, 65536> piece{};
         for (;;) {
             waitForBytes(limits, end);
-            const ssize_t count = read(ends_[0], piece.data(), piece.size());
+            const ssize_t count = read(reading_.number(), piece.data(), piece.size());
             if (count == 0 || (count < 0 && errno != EINTR))
                 return bytes;
             bytes.append(piece.data(), count > 0 ? static_cast<std::size_t>(count) : 0);
@@ -97,7 +89,7 @@ public:
 private:
     void waitForBytes(const ApartLimits& limits, Clock::time_point end) const {
         constexpr int milliseconds = 100;
-        pollfd side{ends_[0], POLLIN, 0};
+        pollfd side{reading_.number(), POLLIN, 0};
         while (poll(&side, 1, milliseconds) <= 0) {
             throwIfInterrupted();
             if (Clock::now() > end)
@@ -106,7 +98,7 @@ private:
         }
     }
 
-    std::array<int, 2> ends_{-1, -1};
+    storage::Descriptor reading_, writing_;
 };
 
 // a process, which does not stay behind

@@ -6,10 +6,10 @@
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
-#include "quarn/dataset/readJson.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/pose/readKeys.h"
 #include "rig/registration.h"
+#include "storage/Json.h"
 #include "storage/npyArray.h"
 
 #include <cmath>
@@ -82,6 +82,6 @@ bool fuzzSideJson(const std::uint8_t* data, std::size_t size) {
             readKeysInScene({reinterpret_cast<const char*>(data) + 1, size - 1}, "keys.json");
         });
     default:
-        return quarn::readJson(file.path()).has_value();
+        return accepts("", [&] { storage::readJson(file.path(), storage::jsonRules::dataset); });
     }
 }

@@ -15,7 +15,7 @@ void writeMembers(JsonWriter& writer, const std::vector<KeptMember>& members) {
     writer.EndArray();
 }
 
-std::vector<KeptMember> readMembers(const rapidjson::Value& list) {
+std::vector<KeptMember> readMembers(const storage::JsonValue& list) {
     std::vector<KeptMember> members;
     members.reserve(list.Size() / 2);
     for (rapidjson::SizeType i = 0; i + 1 < list.Size(); i += 2)
@@ -46,11 +46,10 @@ KeptNode KeptNode::fromText(const std::string& text) {
     KeptNode kept;
     if (text.empty())
         return kept;
-    rapidjson::Document document;
-    parseJson(document, text);
+    const storage::JsonDocument document = storage::parseJson(text, storage::jsonRules::scene);
     kept.members = readMembers(document[0]);
     kept.values = readMembers(document[1]);
-    for (const rapidjson::Value& item : document[2].GetArray())
+    for (const storage::JsonValue& item : document[2].GetArray())
         kept.locked.push_back(jsonOf(item));
     return kept;
 }

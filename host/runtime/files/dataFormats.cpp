@@ -13,7 +13,7 @@
 namespace OpenQuarn {
 namespace {
 
-using rapidjson::Value;
+using Value = storage::JsonValue;
 
 template <class Numbers>
 void writeNumbers(JsonWriter& writer, const Numbers& numbers) {

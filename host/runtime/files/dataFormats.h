@@ -20,7 +20,7 @@ bool preparePluginData(const Data& data, std::string& text, std::string& why);
 void writeData(JsonWriter& writer, const Data& data, const std::string& text);
 
 /// The data that the value stands for, of the attribute's kind. Null with a reason in `why` when it does not fit.
-std::shared_ptr<Data> readData(const Attribute& attribute, const rapidjson::Value& value, std::string& why);
+std::shared_ptr<Data> readData(const Attribute& attribute, const storage::JsonValue& value, std::string& why);
 
 /// The keys that readData() understands in a value that is an object.
 const std::vector<std::string>& knownDataKeys(HFnData::Type type);

@@ -1,67 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "files/json.h"
 
-#include <rapidjson/encodings.h>
-#include <rapidjson/error/en.h>
-#include <rapidjson/memorystream.h>
+#include "storage/encodings.h"
 
 #include <array>
 #include <bit>
 #include <charconv>
 #include <cmath>
 #include <cstdint>
-#include <stdexcept>
 
 namespace OpenQuarn {
 namespace {
 
-constexpr int deepest = 200; // what is kept is written again by recursion
 constexpr std::uint64_t usualNan = 0x7ff8000000000000U;
-
-[[noreturn]] void failAt(const std::string& text, std::size_t offset, const std::string& what) {
-    std::size_t line = 1;
-    std::size_t lineStart = 0;
-    for (std::size_t i = 0; i < offset && i < text.size(); ++i)
-        if (text[i] == '\n') {
-            ++line;
-            lineStart = i + 1;
-        }
-    throw std::runtime_error("line " + std::to_string(line) + ", column " + std::to_string(offset - lineStart + 1) +
-                             ": " + what);
-}
-
-// Up to the place where a text stops being JSON, brackets outside of strings are its nesting.
-void checkDepth(const std::string& text) {
-    bool inString = false;
-    int depth = 0;
-    for (std::size_t i = 0; i < text.size(); ++i) {
-        const char c = text[i];
-        if (inString) {
-            i += c == '\\' ? 1 : 0;
-            inString = c != '"';
-        } else if (c == '"') {
-            inString = true;
-        } else if (c == '[' || c == '{') {
-            if (++depth > deepest)
-                failAt(text, i, "nested more than " + std::to_string(deepest) + " levels deep");
-        } else if (c == ']' || c == '}') {
-            --depth;
-        }
-    }
-}
-
-struct NoOutput {
-    void Put(char) {}
-};
-
-bool isUtf8(std::string_view text) {
-    rapidjson::MemoryStream in(text.data(), text.size());
-    NoOutput out;
-    while (in.Tell() < text.size())
-        if (!rapidjson::UTF8<>::Validate(in, out))
-            return false;
-    return true;
-}
 
 std::string hexOf(std::string_view bytes) {
     constexpr std::string_view digits = "0123456789abcdef";
@@ -131,18 +82,6 @@ bool isPlainInteger(double value) {
 
 } // namespace
 
-void parseJson(rapidjson::Document& document, const std::string& text) {
-    constexpr std::string_view byteOrderMark = "\xef\xbb\xbf";
-    const std::size_t start = text.compare(0, byteOrderMark.size(), byteOrderMark) == 0 ? byteOrderMark.size() : 0;
-    checkDepth(text);
-    rapidjson::MemoryStream stream(text.data() + start, text.size() - start);
-    document.ParseStream<rapidjson::kParseFullPrecisionFlag | rapidjson::kParseIterativeFlag>(stream);
-    if (document.HasParseError())
-        failAt(text, start + document.GetErrorOffset(), rapidjson::GetParseError_En(document.GetParseError()));
-    if (start + stream.Tell() < text.size()) // a NUL ends the text for the parser
-        failAt(text, start + stream.Tell(), "a NUL byte");
-}
-
 bool JsonWriter::Double(double value) {
     if (const std::string word = wordFor(value); !word.empty()) {
         plainText(word);
@@ -173,7 +112,7 @@ void JsonWriter::floatNumber(float value) {
 }
 
 void JsonWriter::text(std::string_view value) {
-    if (isUtf8(value)) {
+    if (storage::isUtf8(value)) {
         plainText(value);
         return;
     }
@@ -183,13 +122,13 @@ void JsonWriter::text(std::string_view value) {
     EndObject();
 }
 
-std::optional<double> numberOf(const rapidjson::Value& value) {
+std::optional<double> numberOf(const storage::JsonValue& value) {
     if (value.IsNumber())
         return value.GetDouble();
     return value.IsString() ? numberFromWord(viewOf(value)) : std::nullopt;
 }
 
-std::optional<std::string> textOf(const rapidjson::Value& value) {
+std::optional<std::string> textOf(const storage::JsonValue& value) {
     if (value.IsString())
         return std::string(viewOf(value));
     if (!value.IsObject() || value.MemberCount() != 1)
@@ -198,7 +137,7 @@ std::optional<std::string> textOf(const rapidjson::Value& value) {
     return viewOf(member->name) == "hex" && member->value.IsString() ? bytesOf(viewOf(member->value)) : std::nullopt;
 }
 
-std::string jsonOf(const rapidjson::Value& value) {
+std::string jsonOf(const storage::JsonValue& value) {
     rapidjson::StringBuffer buffer;
     JsonWriter writer(buffer);
     value.Accept(writer);

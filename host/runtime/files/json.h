@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-// JSON as scene files use it: numbers that come back bit by bit, texts of any bytes, and errors with line and column.
+// JSON as scene files use it: numbers that come back bit by bit, and texts of any bytes.
 #pragma once
 
-#include <rapidjson/document.h>
+#include "storage/Json.h"
+
 #include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 
@@ -11,10 +12,6 @@
 #include <string_view>
 
 namespace OpenQuarn {
-
-/// Parses a whole text. Throws std::runtime_error "line 3, column 7: …" for one that is no JSON, is nested more than
-/// 200 levels deep, or holds a number beyond the range of a double.
-void parseJson(rapidjson::Document& document, const std::string& text);
 
 /// Writes JSON without spaces. Line breaks between values are the caller's.
 ///
@@ -38,15 +35,12 @@ private:
 };
 
 /// Values as JsonWriter writes them; nothing for a value of another kind.
-std::optional<double> numberOf(const rapidjson::Value& value);
-std::optional<std::string> textOf(const rapidjson::Value& value);
+std::optional<double> numberOf(const storage::JsonValue& value);
+std::optional<std::string> textOf(const storage::JsonValue& value);
 
 /// The value as JSON, as JsonWriter writes it.
-std::string jsonOf(const rapidjson::Value& value);
+std::string jsonOf(const storage::JsonValue& value);
 
-/// A text of the file that is shown or looked up: its bytes, whatever they are.
-inline std::string_view viewOf(const rapidjson::Value& text) {
-    return {text.GetString(), text.GetStringLength()};
-}
+using storage::viewOf;
 
 } // namespace OpenQuarn

@@ -19,7 +19,7 @@
 namespace OpenQuarn {
 namespace {
 
-using rapidjson::Value;
+using Value = storage::JsonValue;
 
 std::string quoted(std::string_view text) {
     return "'" + std::string(text) + "'";
@@ -402,21 +402,22 @@ private:
 
 } // namespace
 
-void parseScene(rapidjson::Document& document, const std::string& text) {
-    parseJson(document, text);
+storage::JsonDocument parseScene(const std::string& text) {
+    storage::JsonDocument document = storage::parseJson(text, storage::jsonRules::scene);
     if (!document.IsObject())
         throw std::runtime_error("is no scene file: it holds no JSON object");
     const auto version = document.FindMember(SceneKey::version);
     if (version == document.MemberEnd() || !version->value.IsInt() || version->value.GetInt() < 1)
         throw std::runtime_error(std::string("is no scene file: it has no key '") + SceneKey::version +
                                  "' with a whole number from 1");
+    return document;
 }
 
-int sceneVersion(const rapidjson::Document& document) {
+int sceneVersion(const storage::JsonDocument& document) {
     return document[SceneKey::version].GetInt();
 }
 
-void readScene(const rapidjson::Document& document, Graph& graph, Warnings& warnings) {
+void readScene(const storage::JsonDocument& document, Graph& graph, Warnings& warnings) {
     const int version = sceneVersion(document);
     const ReadingSceneFile reading(version);
     SceneReader(graph, warnings).run(document, version);

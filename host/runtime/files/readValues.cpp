@@ -16,7 +16,7 @@
 namespace OpenQuarn {
 namespace {
 
-using rapidjson::Value;
+using Value = storage::JsonValue;
 
 /// A value as a slot holds it.
 struct Decoded {

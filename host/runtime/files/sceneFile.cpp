@@ -18,7 +18,9 @@
 namespace OpenQuarn {
 namespace {
 
-constexpr std::uint64_t largestScene = std::uint64_t{1} << 32; // bytes of text
+std::string readText(const std::filesystem::path& path) {
+    return storage::readWholeFile(Workspace::callersPath(path), storage::jsonRules::scene.mostBytes);
+}
 
 /// Runs `work(warnings)`, and makes of what it finds and throws the outcome, with the file's name before every text.
 template <class Work>
@@ -52,7 +54,7 @@ FileOutcome sceneOperation(const char* function, const std::string& fileName, Wo
 }
 
 // What was read only in part must not be saved in the place of the whole.
-void readWhole(const rapidjson::Document& document, Graph& graph, Warnings& warnings) {
+void readWhole(const storage::JsonDocument& document, Graph& graph, Warnings& warnings) {
     try {
         readScene(document, graph, warnings);
     } catch (...) {
@@ -62,32 +64,32 @@ void readWhole(const rapidjson::Document& document, Graph& graph, Warnings& warn
     }
 }
 
-std::string textMember(const rapidjson::Value& object, const char* key) {
+std::string textMember(const storage::JsonValue& object, const char* key) {
     if (!object.IsObject())
         return {};
     const auto member = object.FindMember(key);
     return member != object.MemberEnd() && member->value.IsString() ? std::string(viewOf(member->value)) : "";
 }
 
-const rapidjson::Value* listMember(const rapidjson::Value& object, const char* key) {
+const storage::JsonValue* listMember(const storage::JsonValue& object, const char* key) {
     const auto member = object.FindMember(key);
     return member != object.MemberEnd() && member->value.IsArray() ? &member->value : nullptr;
 }
 
-void summarize(const rapidjson::Document& document, SceneSummary& summary) {
+void summarize(const storage::JsonDocument& document, SceneSummary& summary) {
     summary.version = sceneVersion(document);
     summary.writtenBy = textMember(document, SceneKey::writtenBy);
     if (const auto time = document.FindMember(SceneKey::time); time != document.MemberEnd() && time->value.IsNumber())
         summary.time = time->value.GetDouble();
-    if (const rapidjson::Value* nodes = listMember(document, SceneKey::nodes)) {
+    if (const storage::JsonValue* nodes = listMember(document, SceneKey::nodes)) {
         summary.nodes = nodes->Size();
-        for (const rapidjson::Value& node : nodes->GetArray())
+        for (const storage::JsonValue& node : nodes->GetArray())
             ++summary.nodesByType[textMember(node, SceneKey::type)];
     }
-    if (const rapidjson::Value* connections = listMember(document, SceneKey::connections))
+    if (const storage::JsonValue* connections = listMember(document, SceneKey::connections))
         summary.connections = connections->Size();
-    if (const rapidjson::Value* plugins = listMember(document, SceneKey::plugins))
-        for (const rapidjson::Value& plugin : plugins->GetArray())
+    if (const storage::JsonValue* plugins = listMember(document, SceneKey::plugins))
+        for (const storage::JsonValue& plugin : plugins->GetArray())
             if (plugin.IsString())
                 summary.plugins.emplace_back(viewOf(plugin));
     for (const auto& [type, count] : summary.nodesByType)
@@ -99,9 +101,8 @@ void summarize(const rapidjson::Document& document, SceneSummary& summary) {
 
 FileOutcome openScene(const std::filesystem::path& path) {
     return sceneOperation("openScene", path.string(), [&](Warnings& warnings) {
-        rapidjson::Document document;
         Graph& graph = currentGraph();
-        parseScene(document, storage::readWholeFile(Workspace::callersPath(path), largestScene));
+        const storage::JsonDocument document = parseScene(readText(path));
         setCurrentSceneFile(path.string()); // nodes look for files beside it
         readWhole(document, graph, warnings);
     });
@@ -127,9 +128,8 @@ FileOutcome moveScene(const std::filesystem::path& folder) {
 
 FileOutcome sceneFromText(const std::string& text, const std::string& fileName) {
     return sceneOperation("sceneFromText", fileName, [&](Warnings& warnings) {
-        rapidjson::Document document;
         Graph& graph = currentGraph();
-        parseScene(document, text);
+        const storage::JsonDocument document = parseScene(text);
         readWhole(document, graph, warnings);
     });
 }
@@ -146,9 +146,8 @@ std::string currentFile() {
 SceneSummary readSummary(const std::filesystem::path& path) {
     SceneSummary summary;
     summary.outcome = fileOperation(path.string(), [&](Warnings&) {
-        const std::string text = storage::readWholeFile(Workspace::callersPath(path), largestScene);
-        rapidjson::Document document;
-        parseScene(document, text);
+        const std::string text = readText(path);
+        const storage::JsonDocument document = parseScene(text);
         registerBaseNodes();
         summary.bytes = text.size();
         summarize(document, summary);

@@ -17,7 +17,7 @@
 #include "files/Warnings.h"
 #include "graph/Graph.h"
 
-#include <rapidjson/document.h>
+#include "storage/Json.h"
 
 #include <string>
 
@@ -45,11 +45,11 @@ constexpr const char* locked = "locked";
 std::string writeScene(const Graph& graph, Warnings& warnings);
 
 /// Parses a text that must be a scene file. Throws std::runtime_error saying what is wrong, and where.
-void parseScene(rapidjson::Document& document, const std::string& text);
+storage::JsonDocument parseScene(const std::string& text);
 /// The version of a parsed scene file.
-int sceneVersion(const rapidjson::Document& document);
+int sceneVersion(const storage::JsonDocument& document);
 
 /// Replaces the scene. Plug-ins' callbacks do not run for values; their nodes are told of connections.
-void readScene(const rapidjson::Document& document, Graph& graph, Warnings& warnings);
+void readScene(const storage::JsonDocument& document, Graph& graph, Warnings& warnings);
 
 } // namespace OpenQuarn

@@ -21,7 +21,7 @@ void writeValues(JsonWriter& writer, const Node& node, const std::vector<KeptMem
 
 /// Sets the values of a node that has just been created and is not connected yet; nobody is told. What names no plug,
 /// or does not fit, goes to `kept` with a warning; a number that setAttr would refuse, with an error.
-void readValues(const rapidjson::Value& values, const std::shared_ptr<Node>& node, std::vector<KeptMember>& kept,
+void readValues(const storage::JsonValue& values, const std::shared_ptr<Node>& node, std::vector<KeptMember>& kept,
                 Warnings& warnings);
 
 } // namespace OpenQuarn

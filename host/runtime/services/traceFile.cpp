@@ -3,10 +3,9 @@
 #include "openquarn_app/Profiling.h"
 #include "services/ProfilingRecords.h"
 #include "storage/WholeFile.h"
+#include "storage/encodings.h"
 
-#include <rapidjson/memorystream.h>
 #include <rapidjson/ostreamwrapper.h>
-#include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
 
 #include <array>
@@ -35,15 +34,6 @@ constexpr std::array<const char*, 16> palette = {"thread_state_running",
                                                  "black",
                                                  "white"};
 
-bool isUtf8(const std::string& text) {
-    rapidjson::MemoryStream in(text.data(), text.size());
-    rapidjson::StringBuffer out;
-    while (in.Tell() < text.size())
-        if (!rapidjson::UTF8<>::Validate(in, out))
-            return false;
-    return true;
-}
-
 /// The bytes of a text as one code point each, which is what can be shown of a text that is not UTF-8.
 std::string bytesAsUtf8(const std::string& text) {
     std::string converted;
@@ -58,7 +48,7 @@ std::string bytesAsUtf8(const std::string& text) {
 }
 
 void writeText(JsonWriter& json, const char* key, const std::string& text) {
-    const std::string shown = isUtf8(text) ? text : bytesAsUtf8(text);
+    const std::string shown = storage::isUtf8(text) ? text : bytesAsUtf8(text);
     json.Key(key);
     json.String(shown.data(), static_cast<rapidjson::SizeType>(shown.size()));
 }

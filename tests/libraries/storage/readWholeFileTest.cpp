@@ -3,6 +3,7 @@
 
 #include "storage/FileError.h"
 #include "storage/Folder.h"
+#include "storage/FolderLock.h"
 #include "storage/readWholeFile.h"
 
 #include <fcntl.h>
@@ -52,6 +53,22 @@ TEST_F(FolderTest, TwoExchangeTheirNames) {
     EXPECT_THAT(errorOf([&] { storage::exchangeFolders(path("none"), path("old")); }),
                 ::testing::HasSubstr("old could not be replaced by "));
     EXPECT_THAT(names(), ElementsAre("next", "old"));
+}
+
+TEST_F(FolderTest, IsLockedByOne) {
+    {
+        storage::FolderLock lock(path("locked"), "a friend");
+        EXPECT_TRUE(storage::FolderLock::isTaken(path("locked")));
+        EXPECT_EQ(errorOf([&] { storage::FolderLock(path("locked"), "a friend"); }),
+                  "a friend is writing " + path("locked").string() + "; wait until it is done");
+        fs::rename(path("locked"), path("moved"));
+        lock.follow(path("moved"));
+        put("moved/file", "");
+    }
+    EXPECT_FALSE(storage::FolderLock::isTaken(path("moved")));
+    EXPECT_EQ(std::distance(fs::directory_iterator(path("moved")), {}), 1) << "the file alone";
+    { const storage::FolderLock lock(path("empty"), ""); }
+    EXPECT_THAT(names(), ElementsAre("moved"));
 }
 
 } // namespace

@@ -68,7 +68,8 @@ TEST_F(WholeFileTest, IsThereAsAWholeOrNotAtAll) {
 
 TEST_F(WholeFileTest, LinksPermissionsAndGroupStay) {
     put("real", "old");
-    ASSERT_EQ(::chmod(path("real").c_str(), 0640), 0);
+    const gid_t group = ::chown(path("real").c_str(), ~0U, 12345) == 0 ? 12345 : ::getegid();
+    ASSERT_EQ(::chmod(path("real").c_str(), 04640), 0);
     fs::create_directory(path("folder"));
     fs::create_symlink("../real", path("folder/link"));
     fs::create_symlink(path("folder/link"), path("link"));
@@ -76,7 +77,9 @@ TEST_F(WholeFileTest, LinksPermissionsAndGroupStay) {
     writeWhole(path("link"), "new");
     writeWhole(path("dangling"), "now");
     EXPECT_EQ(content("real"), "new");
-    EXPECT_EQ(modeOf(path("real")), 0640U);
+    EXPECT_EQ(modeOf(path("real")), 0640U) << "and no right to be somebody else";
+    struct stat status = {};
+    EXPECT_TRUE(::stat(path("real").c_str(), &status) == 0 && status.st_gid == group);
     EXPECT_EQ(content("later"), "now");
     EXPECT_TRUE(fs::is_symlink(path("link")) && fs::is_symlink(path("folder/link")) &&
                 fs::is_symlink(path("dangling")));

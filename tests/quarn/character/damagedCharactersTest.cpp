@@ -64,8 +64,8 @@ TEST(DamagedCharacters, TextsAreRefusedWithTheReason) {
     const std::string nested(100000, '[');
     const std::vector<Damage> damages{
         {"glTF of version \"1.0\", not 2", "\"2.0\"", "\"1.0\""},
-        {"not JSON at byte", "\"scene\":0", "\"scene\":"},
-        {"nested more than 200 deep", "\"scene\":0", "\"scene\":" + nested},
+        {"line 1, column ", "\"scene\":0", "\"scene\":"},
+        {"nested more than 200 levels deep", "\"scene\":0", "\"scene\":" + nested},
         {"\"nodes\" is not an array", "\"nodes\":[{", "\"nodes\":7,\"x\":[{"},
         {"one of the nodes is not an object", "\"nodes\":[{", "\"nodes\":[1,{"},
         {"nodes[0] refers to nodes[9], but there are 3", "\"children\":[1]", "\"children\":[9]"},

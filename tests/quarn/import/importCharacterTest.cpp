@@ -228,7 +228,7 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
 TEST_F(ImportCharacter, DamagedJsonFilesAreRefusedByName) {
     const auto parents = [&](const std::string& text) { return errorOf([&] { readParents(write("p.json", text)); }); };
     const auto limits = [&](const std::string& text) { return errorOf([&] { readLimits(write("l.json", text)); }); };
-    EXPECT_THAT(parents("{\n\"a\": \"b\",\n}"), HasSubstr("p.json: line 3: "));
+    EXPECT_THAT(parents("{\n\"a\": \"b\",\n}"), HasSubstr("p.json: line 3, column 1: "));
     EXPECT_THAT(parents("[]"), HasSubstr("holds no JSON object"));
     EXPECT_THAT(parents(""), HasSubstr("line 1"));
     EXPECT_THAT(parents(R"({"a": 1})"), HasSubstr("\"a\": its parent is not a text"));

@@ -1,10 +1,32 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "storage/base64.h"
+#include "storage/encodings.h"
+
+#include <rapidjson/encodings.h>
+#include <rapidjson/memorystream.h>
 
 #include <algorithm>
 #include <cstdint>
 
 namespace storage {
+namespace {
+
+struct NoOutput {
+    void Put(char) {}
+};
+
+} // namespace
+
+std::size_t utf8Length(std::string_view text) {
+    rapidjson::MemoryStream in(text.data(), text.size());
+    NoOutput out;
+    return rapidjson::UTF8<>::Validate(in, out) ? in.Tell() : 0;
+}
+
+bool isUtf8(std::string_view text) {
+    while (const std::size_t length = utf8Length(text))
+        text.remove_prefix(length);
+    return text.empty();
+}
 
 std::string base64(std::string_view bytes) {
     constexpr std::string_view letters = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
