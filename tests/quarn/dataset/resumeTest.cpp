@@ -2,6 +2,7 @@
 // Going on after an end that came too early, and everything that must not be gone on from.
 #include "quarn/dataset/ExportScene.h"
 
+#include "quarn/dataset/DatasetFolder.h"
 #include "quarn/dataset/DatasetWriter.h"
 #include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
