@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 // bench_deform: single frames of the whole deformer in the host, with where the time goes, and the product of the
 // principal shapes beside the memory's own speed.
+#include "PhaseClock.h"
 #include "harness.h"
 #include "options.h"
 #include "warpFrame.h"
 
-#include "deformer/deltas.h"
+#include "frame/deltas.h"
 #include "openquarn_app/Messages.h"
 #include "storage/finite.h"
 
@@ -22,11 +23,11 @@
 namespace {
 
 using bench::modelName;
+using bench::PhaseClock;
 using bench::quantile;
 using bench::WarpFrame;
 using bench::WarpSetting;
-using neuralWarp::PhaseClock;
-using neuralWarp::phaseCount;
+using neuralWarp::frameStepCount;
 
 template <class T>
 std::size_t bytesOf(const std::vector<T>& values) {
@@ -44,7 +45,7 @@ double stateBytesPerVertex(const neuralWarp::neuralWarpData& data, std::size_t v
 
 // Phases and total of each frame, after a pause of one frame time.
 struct Samples {
-    std::array<std::vector<double>, phaseCount> phases;
+    std::array<std::vector<double>, frameStepCount> phases;
     std::vector<double> total, rest;
 };
 
@@ -52,7 +53,7 @@ Samples sample(WarpFrame& frame, double seconds) {
     constexpr std::size_t fewest = 20;
     Samples samples;
     PhaseClock clock;
-    frame.state().phases = &clock;
+    frame.state().observer = &clock;
     const auto start = std::chrono::steady_clock::now();
     const auto elapsed = [&] {
         return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
@@ -61,14 +62,14 @@ Samples sample(WarpFrame& frame, double seconds) {
         std::this_thread::sleep_for(std::chrono::duration<double>(last));
         last = frame.run();
         double known = 0.0;
-        for (std::size_t p = 0; p < phaseCount; ++p) {
+        for (std::size_t p = 0; p < frameStepCount; ++p) {
             samples.phases[p].push_back(clock.seconds[p]);
             known += clock.seconds[p];
         }
         samples.total.push_back(last);
         samples.rest.push_back(last - known);
     }
-    frame.state().phases = nullptr;
+    frame.state().observer = &neuralWarp::FrameObserver::none();
     return samples;
 }
 
@@ -158,8 +159,6 @@ void benchProduct(const bench::Options& options) {
         for (const std::size_t shapes : {20U, 50U, 100U}) {
             if (vertices == 1000000 && (shapes != 20 || options.isQuick))
                 continue;
-            neuralWarp::neuralWarpData data;
-            data.componentMap.setIdentity(vertices);
             const std::vector<float> basis(3 * shapes * vertices, 0.5F), coefficients(shapes, 0.25F);
             neuralWarp::Points deltas;
             bench::Phase phase;
@@ -168,7 +167,7 @@ void benchProduct(const bench::Options& options) {
             phase.vertices = vertices;
             phase.bytes = basis.size() * sizeof(float);
             phase.ours = [&] {
-                extractPrincipalDeltas(deltas, coefficients, shapes, basis, neuralWarp::DrivenVertices(data));
+                extractPrincipalDeltas(deltas, coefficients, shapes, basis, neuralWarp::DrivenVertices(vertices));
             };
             for (const unsigned threads : {1U, 2U}) {
                 const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // bench_gpu: the deformer's frames on an OpenCL device: where their time goes, how fast the kernels are beside a kernel
 // that only copies, and whole frames beside those of the same scene on the CPU.
+#include "PhaseClock.h"
 #include "deviceProbes.h"
 #include "kernelBytes.h"
 #include "options.h"
@@ -23,11 +24,11 @@
 
 namespace {
 
+using bench::PhaseClock;
 using bench::quantile;
 using bench::WarpFrame;
 using bench::WarpSetting;
-using neuralWarp::Phase;
-using neuralWarp::PhaseClock;
+using neuralWarp::FrameStep;
 using OpenQuarn::Gpu;
 using OpenQuarn::GpuCounts;
 
@@ -194,11 +195,11 @@ void addCounts(Phases& phases, const GpuCounts& counts, const PhaseClock& clock)
     phases.kernels.push_back(kernels);
     for (const auto& [name, seconds] : counts.hostSeconds)
         phases.host[name].push_back(seconds);
-    const auto of = [&](Phase phase) { return clock.seconds[static_cast<std::size_t>(phase)]; };
-    phases.host["inference"].push_back(of(Phase::network));
-    phases.host["prepare, controls"].push_back(of(Phase::prepare) + of(Phase::gather));
-    phases.host["upload outputs, find kernels"].push_back(of(Phase::points));
-    phases.host["enqueue"].push_back(of(Phase::apply));
+    const auto of = [&](FrameStep phase) { return clock.seconds[static_cast<std::size_t>(phase)]; };
+    phases.host["inference"].push_back(of(FrameStep::network));
+    phases.host["prepare, controls"].push_back(of(FrameStep::prepare) + of(FrameStep::gather));
+    phases.host["upload outputs, find kernels"].push_back(of(FrameStep::points));
+    phases.host["enqueue"].push_back(of(FrameStep::apply));
 }
 
 // One pass at a time: a copy of that many bytes.
@@ -224,7 +225,7 @@ Phases measurePhases(WarpFrame& frame, const WarpSetting& setting, const bench::
         addCopies(phases, probes, setting, bytes); // the first time, memory is new
         probes.timeBufferCopy(bench::bytesOf(frame.vertices(), 0));
         phases.copies.clear();
-        frame.state().phases = &clock;
+        frame.state().observer = &clock;
         const auto start = std::chrono::steady_clock::now();
         const std::chrono::duration<double> wanted(3.0 * options.seconds);
         for (double last = 0.0; phases.kernels.size() < 10 || std::chrono::steady_clock::now() - start < wanted;) {
@@ -235,7 +236,7 @@ Phases measurePhases(WarpFrame& frame, const WarpSetting& setting, const bench::
             addCounts(phases, Gpu::counts(), clock);
             addCopies(phases, probes, setting, bytes);
         }
-        frame.state().phases = nullptr;
+        frame.state().observer = &neuralWarp::FrameObserver::none();
     }
     Gpu::setTiming(false);
     return phases;

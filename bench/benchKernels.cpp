@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // bench_kernels: every OpenCL kernel on the first device, launched and waited for, beside the library's own code on the
 // same data and beside a kernel that only copies. See Report::legend for the columns.
-#include "deformer/deltas.h"
+#include "frame/deltas.h"
 #include "harness.h"
 #include "kernelBytes.h"
 #include "options.h"
@@ -39,7 +39,6 @@ struct Subject {
     quill::VertexFrames frames;
     std::vector<float> weights, coefficients, basis;
     std::vector<quill::mat4d> restFramesInverse;
-    neuralWarp::neuralWarpData data;
 
     explicit Subject(std::size_t side)
         : n(side * side)
@@ -52,7 +51,6 @@ struct Subject {
         for (std::size_t i = 0; i < n; ++i)
             list.push_back(static_cast<std::uint32_t>(i));
         map.setIdentity(n);
-        data.componentMap.setIdentity(n);
         connections.build(grid.topology(), map, 0, false);
         frames.build(grid.topology(), map, &points);
         connections.calculateConnectionWeights(weights, points, 1.0, 0.0);
@@ -166,8 +164,7 @@ Row smoothing(Subject& s, OnDevice& d) {
 }
 
 void extract(Subject& s) {
-    neuralWarp::extractPrincipalDeltas(s.deltas, s.coefficients, shapeCount, s.basis,
-                                       neuralWarp::DrivenVertices(s.data));
+    neuralWarp::extractPrincipalDeltas(s.deltas, s.coefficients, shapeCount, s.basis, neuralWarp::DrivenVertices(s.n));
 }
 
 Row shapes(Subject& s, OnDevice& d) {

@@ -2,6 +2,7 @@
 #include "deformer/geometryReaders.h"
 
 #include "deformer/neuralWarpUtils.h"
+#include "frame/smoothing.h"
 #include "messages/sourceUnits.h"
 #include "openquarn/HFnMesh.h"
 #include "openquarn/HItGeometry.h"
@@ -9,7 +10,6 @@
 #include "openquarn/HNodeClass.h"
 #include "quill/parallelFor.h"
 
-#include <algorithm>
 #include <stdexcept>
 #include <string>
 
@@ -23,20 +23,6 @@ HObject filterAttribute(const char* name) {
     if (status.error())
         throw std::runtime_error(status.errorString().asStdString());
     return attribute;
-}
-
-/// The passes that the settings in force ask for.
-void smoothPoints(const neuralWarpData& data, Points& points) {
-    if (!data.activeSettings.isSmoothed())
-        return;
-    constexpr std::int64_t passesPerLook = 64; // a quarter of a second for a million vertices
-    Points scratch;
-    for (std::int64_t left = data.activeSettings.smoothingIterations; left > 0; left -= passesPerLook) {
-        if (HLongWork::isInterrupted())
-            throw quill::Cancelled();
-        data.vertexConnections.mushArray(points, scratch, static_cast<std::size_t>(std::min(left, passesPerLook)), 1.0F,
-                                         nullptr, &data.connectionWeights, false);
-    }
 }
 
 } // namespace
@@ -76,7 +62,7 @@ HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, 
         return reported(status, sourceUnit::node);
     readGeometryPoints(geometry, points, data.componentMap);
     if (smooth)
-        smoothPoints(data, points);
+        smoothPoints(points, data.frameModel().rest, data.activeSettings.smoothingIterations, HLongWork::isInterrupted);
     return HStatus::kSuccess;
 }
 

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "deformer/neuralWarpData.h"
 
-#include <algorithm>
+#include <utility>
 
 namespace neuralWarp {
 namespace {
@@ -16,17 +16,6 @@ quill::IndexMapper slotsOf(const ModelMetadata& metadata) {
     else
         map.set({}, metadata.fullCount);
     return map;
-}
-
-bool sameVertices(const quill::IndexMapper& a, const quill::IndexMapper& b) {
-    if (a.affectCount() != b.affectCount())
-        return false;
-    if (a.isIdentity() && b.isIdentity())
-        return true;
-    for (std::size_t k = 0; k < a.affectCount(); ++k)
-        if (a.toFull(k) != b.toFull(k))
-            return false;
-    return true;
 }
 
 } // namespace
@@ -139,6 +128,15 @@ bool neuralWarpData::canApplyModel() const {
     return session.lastResult() == LoadResult::Loaded && session.isLoaded() && modelValid;
 }
 
+FrameModel neuralWarpData::frameModel() const {
+    return {.settings = activeSettings,
+            .vertexCount = componentMap.affectCount(),
+            .driven = driven(),
+            .slotCount = slotCount(),
+            .shapes = {principalShapes, principalShapeCount, principalVertCount},
+            .rest = {vertexConnections, connectionWeights, vertexFrames, restPoints, restFramesInverse}};
+}
+
 void neuralWarpData::buildAffectMap() {
     affectMap.clear();
     affectedVertices.clear();
@@ -146,21 +144,11 @@ void neuralWarpData::buildAffectMap() {
     bump(affectMapCache);
     if (!modelValid)
         return;
-    const quill::IndexMapper slots = slotsOf(metadata);
-    useAffectMap = !sameVertices(slots, componentMap);
-    if (!useAffectMap)
-        return;
-    affectMap.resize(componentMap.affectCount());
-    for (std::size_t k = 0; k < affectMap.size(); ++k) {
-        const std::uint32_t slot = slots.toAffected(componentMap.toFull(k));
-        affectMap[k] = slot;
-        if (slot != quill::missingIndex) {
-            affectedVertices.push_back(static_cast<std::uint32_t>(k));
-            mappedSlotCount = std::max<std::size_t>(mappedSlotCount, std::size_t{slot} + 1);
-        }
-    }
-    if (affectedVertices.empty())
-        affectMap.clear();
+    SlotMap map = mapSlots(slotsOf(metadata), componentMap);
+    useAffectMap = !map.isIdentity;
+    affectMap = std::move(map.slots);
+    affectedVertices = std::move(map.vertices);
+    mappedSlotCount = map.slotCount;
 }
 
 } // namespace neuralWarp

@@ -2,8 +2,8 @@
 // What the deformer knows of one geometry from one evaluation to the next.
 #pragma once
 
-#include "deformer/DeltaSettings.h"
-#include "deformer/PhaseClock.h"
+#include "frame/FrameModel.h"
+#include "frame/FrameObserver.h"
 #include "nw_model/DirectoryState.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
@@ -12,9 +12,7 @@
 #include "quill/VertexConnections.h"
 #include "quill/VertexFrames.h"
 #include "quill/mat4d.h"
-#include "quill/val3.h"
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
@@ -22,9 +20,6 @@
 #include <vector>
 
 namespace neuralWarp {
-
-/// Points and deltas are stored in single precision, in affected index space.
-using Points = std::vector<quill::val3<float>>;
 
 /// The state of one deformed geometry, held in the element of the node's attribute `deformerData` that has the
 /// geometry's index. Flags say what must be made again; whoever makes it clears them. The counters in cacheVersions say
@@ -68,9 +63,13 @@ public:
     /// The model is in use and drives none of the deformed vertices.
     bool drivesNothing() const { return useAffectMap && affectMap.empty(); }
     /// The model drives deformed vertex `i`. False for an index that no vertex has.
-    bool isVertexAffected(std::size_t i) const {
-        return !useAffectMap || (i < affectMap.size() && affectMap[i] != quill::missingIndex);
+    bool isVertexAffected(std::size_t i) const { return driven().contains(i); }
+    /// The vertices that the model drives. A view of this object.
+    DrivenVertices driven() const {
+        return useAffectMap ? DrivenVertices(affectedVertices, affectMap) : DrivenVertices(componentMap.affectCount());
     }
+    /// What a frame is computed through, with the settings in force. Views of this object.
+    FrameModel frameModel() const;
     /// Compares the vertices of the metadata with componentMap; empties the map and goes no further unless modelValid.
     void buildAffectMap();
 
@@ -129,15 +128,8 @@ public:
     std::size_t slotCount() const { return useAffectMap ? mappedSlotCount : componentMap.affectCount(); }
     std::size_t mappedSlotCount = 0;
 
-    /// For whoever looks for a fault: when set, each evaluation leaves the raw outputs of the network here; empty when
-    /// it did not run. Not owned.
-    std::vector<float>* observedOutputs = nullptr;
-    /// For benchmarks: when set, each evaluation starts it, and laps it as it goes. Not owned.
-    PhaseClock* phases = nullptr;
-    void endPhase(Phase phase) const {
-        if (phases)
-            phases->lap(phase);
-    }
+    /// Hears of each evaluation, on the CPU and on the GPU. Not owned, never null.
+    FrameObserver* observer = &FrameObserver::none();
 };
 
 } // namespace neuralWarp

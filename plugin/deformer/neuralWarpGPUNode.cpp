@@ -2,14 +2,14 @@
 // An evaluation on the GPU, up to what goes to the device.
 #include "deformer/neuralWarpGPUNode.h"
 
-#include "deformer/checkOutputs.h"
+#include "deformer/ProfiledFrame.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
+#include "frame/FrameCheck.h"
 #include "messages/displayErrorGated.h"
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
-#include "openquarn/HProfilingScope.h"
 
 #include <algorithm>
 #include <cmath>
@@ -48,17 +48,18 @@ Status neuralWarpGPUNode::evaluate(HDataBlock& block, const HEvaluationNode& eva
         neuralWarpData* data = fetchNodeData(block, multiIndex());
         if (!data)
             return kDeformerFailure;
-        if (data->observedOutputs)
-            data->observedOutputs->clear();
-        if (data->phases)
-            data->phases->start();
+        data->observer->beginFrame();
         if (data->exportMode)
             return kDeformerPassThrough;
-        takeSettings(*data);
         HOpenCLEvent event;
-        Status status = prepareEvaluation(block, evaluationNode, outputPlug, inputPlugs, inputData, outputData, event);
-        if (status == kDeformerSuccess)
-            status = findMorph(block, evaluationNode, inputData);
+        Status status = kDeformerSuccess;
+        {
+            const ObservedStep step(*data->observer, FrameStep::prepare);
+            takeSettings(*data);
+            status = prepareEvaluation(block, evaluationNode, outputPlug, inputPlugs, inputData, outputData, event);
+            if (status == kDeformerSuccess)
+                status = findMorph(block, evaluationNode, inputData);
+        }
         std::vector<float> outputs;
         if (status == kDeformerSuccess && deltasActive_)
             status = computeOutputs(block, *data, outputs);
@@ -110,11 +111,11 @@ cl_int neuralWarpGPUNode::findTarget(const HEvaluationNode& evaluationNode, cons
 }
 
 Status neuralWarpGPUNode::computeOutputs(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs) {
-    data.endPhase(Phase::prepare);
     if (!runInference(block, data, outputs))
         return kDeformerPassThrough;
     const bool isSameGeometry = data.componentMap.affectCount() == affectCount();
-    return isSameGeometry && areEnoughForAllSlots(data, outputs.size()) ? kDeformerSuccess : kDeformerFailure;
+    return isSameGeometry && areEnoughForAllSlots(data.frameModel(), outputs.size()) ? kDeformerSuccess
+                                                                                     : kDeformerFailure;
 }
 
 bool neuralWarpGPUNode::runInference(HDataBlock& block, neuralWarpData& data, std::vector<float>& outputs) {
@@ -126,18 +127,11 @@ bool neuralWarpGPUNode::runInference(HDataBlock& block, neuralWarpData& data, st
         raiseMessage<Text::kErrorMLModelInvalid>(displayErrorGated, multiIndex());
         return false;
     }
-    const HStatus status = gatherControlValues(block, data.session.inputCount(), controls_);
+    ProfiledFrame observer(*data.observer, "InferenceDeltasForGPU",
+                           "Inference Neural Warp deltas to be applied on the GPU.", false);
+    const HStatus status = runNetwork(block, data, observer, controls_, outputs);
     if (reported(status, sourceUnit::gpuNode).error())
         return false;
-    data.endPhase(Phase::gather);
-    {
-        const HProfilingScope scope(evaluationCategory(), 0, "InferenceDeltasForGPU",
-                                    "Inference Neural Warp deltas to be applied on the GPU.");
-        outputs = data.session.run(controls_);
-    }
-    data.endPhase(Phase::network);
-    if (data.observedOutputs)
-        *data.observedOutputs = outputs;
     if (outputs.empty())
         raiseMessage<Text::kErrorMLModelNoDeltas>(displayErrorGated);
     return !outputs.empty();
@@ -146,15 +140,19 @@ bool neuralWarpGPUNode::runInference(HDataBlock& block, neuralWarpData& data, st
 Status neuralWarpGPUNode::deformPrepared(const HEvaluationNode& evaluationNode, const neuralWarpData& data,
                                          const std::vector<float>& outputs, HOpenCLEvent& event,
                                          HGPUDeformerData& outputData) {
-    prepareAffectMapBuffer();
-    prepareWeightsBuffer(evaluationNode);
-    syncState_.capture(*this);
-    if (!uploadSetupBuffers() || (deltasActive_ && !uploadOutputs(data, outputs)) || !loadKernels())
-        return kDeformerFailure;
-    data.endPhase(Phase::points);
-    if (initializeOutputPositions(event) != CL_SUCCESS || enqueueDeformation(event) != CL_SUCCESS)
-        return kDeformerFailure;
-    data.endPhase(Phase::apply);
+    {
+        const ObservedStep step(*data.observer, FrameStep::points);
+        prepareAffectMapBuffer();
+        prepareWeightsBuffer(evaluationNode);
+        syncState_.capture(*this);
+        if (!uploadSetupBuffers() || (deltasActive_ && !uploadOutputs(data, outputs)) || !loadKernels())
+            return kDeformerFailure;
+    }
+    {
+        const ObservedStep step(*data.observer, FrameStep::apply);
+        if (initializeOutputPositions(event) != CL_SUCCESS || enqueueDeformation(event) != CL_SUCCESS)
+            return kDeformerFailure;
+    }
     return finishEvaluation(event, outputData);
 }
 

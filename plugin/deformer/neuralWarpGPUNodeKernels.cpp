@@ -3,7 +3,6 @@
 #include "deformer/KernelCall.h"
 #include "deformer/neuralWarpGPUNode.h"
 
-#include "deformer/checkOutputs.h"
 #include "messages/guard.h"
 #include "messages/sourceUnits.h"
 #include "openquarn/HGlobal.h"
@@ -91,7 +90,7 @@ void neuralWarpGPUNode::forgetSetupEvents() {
 }
 
 bool neuralWarpGPUNode::uploadOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {
-    principalActive_ = usesPrincipalShapes(data);
+    principalActive_ = data.frameModel().shapes.isUsed();
     shapeCount_ = static_cast<std::uint32_t>(data.principalShapeCount);
     deltaVertexCount_ = static_cast<std::uint32_t>(principalActive_ ? data.principalVertCount : outputs.size() / 3);
     return uploadFloats(outputs, principalActive_ ? coefficientsBuffer_ : deltasBuffer_) == CL_SUCCESS;

@@ -14,6 +14,7 @@
 namespace neuralWarp {
 
 struct Blend;
+enum class Attempt;
 
 /// What is kept of a geometry between evaluations is a neuralWarpData, in the element of `deformerData` that has the
 /// geometry's index. docs/neuralWarp.md lists the attributes.
@@ -127,45 +128,32 @@ private:
     HStatus resolveModelDirectory(HDataBlock& block, neuralWarpData& data);
     HStatus loadMetadata(neuralWarpData& data, bool force);
     HStatus loadModel(neuralWarpData& data, bool force);
+    HStatus validateModel(neuralWarpData& data);
+    /// The first two as far as they are due, and the model's settings put in force. False: no model in this evaluation.
+    bool updateModelSettings(HDataBlock& block, neuralWarpData& data);
     /// loadModel(), from the directory on while that is replaced or written into, a few times; then it says so. Fails
     /// only when the rest caches do.
     HStatus loadWholeModel(HDataBlock& block, neuralWarpData& data);
-    HStatus validateModel(neuralWarpData& data);
-    HStatus findModelDirectory(HDataBlock& block, neuralWarpData& data);
-    HStatus loadNetwork(neuralWarpData& data);
 
     // Geometry into affected index space.
     HStatus prepareRestState(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
-    HStatus updateComponentMap(neuralWarpData& data);
-    HStatus rebuildRestCaches(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
-    HStatus rebuildRestFrames(neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex);
     HStatus readTargetPoints(const neuralWarpData& data, std::uint32_t multiIndex, Points& points);
     bool readTargetMorph(HDataBlock& block, std::uint32_t multiIndex, double& morphEnvelope, Points& points,
                          HStatus& status);
-    HStatus readMorphPoints(HDataBlock& block, std::uint32_t multiIndex, Points& points);
-    HStatus readInputPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex, Points& points);
+    HStatus readInputPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex, Points& points,
+                            bool smooth);
     HStatus readSmoothedRestPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
                                    Points& points, bool smooth);
 
-    // Training deltas.
-    struct TrainingPoints;
-    struct RestSurface;
-    HStatus readTrainingPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                               TargetDeltaType type, TrainingPoints& points);
-    static HStatus pointDifferences(HDoubleArray& out, const Points& target, const Points& base);
-    HStatus findRestSurface(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                            RestSurface& surface) const;
-    HStatus surfaceDeltas(HDoubleArray& out, const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                          TargetDeltaType type, const TrainingPoints& points);
-
     // Evaluation.
+    struct TargetMorph;
     HStatus evaluate(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex);
-    void announceSmoothing(HDataBlock& block, const neuralWarpData& data) const;
-    bool updateModelSettings(HDataBlock& block, neuralWarpData& data);
+    /// Up to the decision whether the model is applied, which goes into the state.
+    HStatus prepare(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, bool isActive,
+                    TargetMorph& morph, Attempt& attempt);
     HStatus applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, Points& result);
-    std::vector<float> runNetwork(neuralWarpData& data, const std::vector<float>& controls) const;
-    HStatus applyDeltas(const neuralWarpData& data, const Points& points, const Points& deltas, Points& result) const;
-    HStatus writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex, const Blend& blend);
+    HStatus writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex, const neuralWarpData& data,
+                         const Blend& blend);
 
     HCallbackId attributeCallback_ = 0;
 };

@@ -1,21 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 // The evaluation of one geometry.
-#include "deformer/blend.h"
-#include "deformer/checkOutputs.h"
-#include "deformer/deltas.h"
-#include "deformer/geometryReaders.h"
+#include "deformer/ProfiledFrame.h"
+#include "deformer/framePlan.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
+#include "frame/FrameSampler.h"
+#include "frame/blend.h"
 #include "messages/displayErrorGated.h"
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
 #include "openquarn/HItGeometry.h"
 #include "openquarn/HLongWork.h"
-#include "openquarn/HProfilingScope.h"
-#include "quill/parallelFor.h"
 
-#include <algorithm>
 #include <string>
 
 namespace neuralWarp {
@@ -26,43 +23,10 @@ HStatus noDeltas(const std::string& reason) {
     return {HStatus::kFailure, reason};
 }
 
-HStatus tooFewDeltas(std::size_t predicted, std::size_t needed) {
-    raiseMessage<Text::kMlNodeVertexCountMismatch>(displayErrorGated, predicted, needed);
-    return {HStatus::kFailure,
-            "the model gives " + std::to_string(predicted) + " deltas where " + std::to_string(needed) + " are needed"};
-}
-
-/// A failure, which the user is told of, when there is not enough to drive every vertex from.
-HStatus requireOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {
-    const OutputCheck check = checkOutputs(data, outputs.size());
-    switch (check.outcome) {
-    case Outputs::kEnough:
-        break;
-    case Outputs::kNone:
-        return noDeltas("the model gave no values: " + data.session.errorText());
-    case Outputs::kTooFewCoefficients:
-        return noDeltas("the model gives " + std::to_string(check.has) + " coefficients for " +
-                        std::to_string(check.needed) + " principal shapes");
-    case Outputs::kTooFewDeltas:
-        return tooFewDeltas(check.has, check.needed);
-    }
-    return HStatus::kSuccess;
-}
-
-void extractDeltas(Points& deltas, const neuralWarpData& data, const std::vector<float>& outputs,
-                   const DrivenVertices& driven) {
-    if (usesPrincipalShapes(data))
-        extractPrincipalDeltas(deltas, outputs, static_cast<std::size_t>(data.principalShapeCount),
-                               data.principalShapes, driven);
-    else
-        extractComputedDeltas(deltas, outputs, driven);
-}
-
-void applyOffsets(Points& result, const Points& points, const Points& deltas, const DrivenVertices& driven) {
-    quill::parallelFor(driven.count, [&](std::size_t k) {
-        const std::size_t v = driven.vertex(k);
-        result[v] = points[v] + deltas[k];
-    });
+HStatus tooFewDeltas(const FrameCheck& check) {
+    raiseMessage<Text::kMlNodeVertexCountMismatch>(displayErrorGated, check.has, check.needed);
+    return {HStatus::kFailure, "the model gives " + std::to_string(check.has) + " deltas where " +
+                                   std::to_string(check.needed) + " are needed"};
 }
 
 HStatus misfit(const char* what, std::size_t has, std::size_t needed) {
@@ -70,7 +34,33 @@ HStatus misfit(const char* what, std::size_t has, std::size_t needed) {
                                    std::to_string(needed) + " vertices are deformed"};
 }
 
+/// A failure, which the user is told of when it is the model's, for a frame without positions.
+HStatus statusOf(const FrameCheck& check, const ModelSession& session) {
+    switch (check.fault) {
+    case FrameFault::none:
+        break;
+    case FrameFault::noOutputs:
+        return noDeltas("the model gave no values: " + session.errorText());
+    case FrameFault::tooFewCoefficients:
+        return noDeltas("the model gives " + std::to_string(check.has) + " coefficients for " +
+                        std::to_string(check.needed) + " principal shapes");
+    case FrameFault::tooFewDeltas:
+        return tooFewDeltas(check);
+    case FrameFault::otherPointCount:
+        return misfit("the input geometry", check.has, check.needed);
+    case FrameFault::tooFewRestPoints:
+        return misfit("the rest geometry", check.has, check.needed);
+    }
+    return HStatus::kSuccess;
+}
+
 } // namespace
+
+struct neuralWarpNode::TargetMorph {
+    bool isOn = false;
+    double weight = 0.0;
+    Points points;
+};
 
 HStatus neuralWarpNode::deform(HDataBlock& block, HItGeometry& iterator, const HMatrix&, unsigned multiIndex) {
     return guarded(*this, "deform", [&] { return evaluate(block, iterator, multiIndex); });
@@ -81,7 +71,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     const HDataHandle model = existingElement(block, models, multiIndex, status);
     if (status.error())
         return status;
-    bool isActive = model.child(modelActive).asShort() == 1;
+    const bool isActive = model.child(modelActive).asShort() == 1;
     const float envelopeValue = block.inputValue(envelope, &status).asFloat();
     if (status.error())
         return reported(status, sourceUnit::node);
@@ -90,162 +80,94 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     neuralWarpData* data = fetchNodeData(block, multiIndex);
     if (!data)
         return {HStatus::kFailure, "there is no state for geometry " + std::to_string(multiIndex)};
-    if (data->observedOutputs)
-        data->observedOutputs->clear();
-    if (data->phases)
-        data->phases->start();
+    data->observer->beginFrame();
     if (data->exportMode) {
         data->modelApplied = false;
         return HStatus::kSuccess;
     }
-
-    bool isGivenUp = isActive && !updateModelSettings(block, *data);
-    isActive = isActive && !isGivenUp;
-    status = prepareRestState(*data, block, multiIndex);
-    if (status.error())
+    TargetMorph morph;
+    Attempt attempt = Attempt::nothing;
+    status = prepare(block, multiIndex, *data, isActive, morph, attempt);
+    if (status.error() || attempt == Attempt::nothing)
         return status;
-    Points target;
-    double morphEnvelope = 0.0;
-    const bool isMorphed = readTargetMorph(block, multiIndex, morphEnvelope, target, status);
-    if (status.error())
-        return reported(status, sourceUnit::node);
-
-    if (isMorphed && morphEnvelope == 1.0) {
-        isActive = false; // nothing of the model would be left to see
-    } else if (isActive) {
-        if (data->modelLoadPending)
-            status = loadWholeModel(block, *data);
-        if (status.error())
-            return status;
-        isGivenUp = data->modelLoadPending;
-    } else if (!isMorphed) {
-        data->modelApplied = false;
-        data->leaveLoads(isGivenUp);
-        return HStatus::kSuccess;
-    }
-    data->leaveLoads(isGivenUp);
-    isActive = isActive && data->canApplyModel() && !data->drivesNothing();
-    data->modelApplied = isActive;
-
-    data->endPhase(Phase::prepare);
-
     Points result;
-    if (isActive) {
+    if (data->modelApplied) {
         status = applyNeuralModel(block, multiIndex, *data, result);
         if (status.error())
             return reported(status, sourceUnit::node);
     }
-    const Blend blend{data, isActive ? &result : nullptr, isMorphed ? &target : nullptr,
-                      static_cast<float>(morphEnvelope), envelopeValue};
-    return writeBlended(block, iterator, multiIndex, blend);
+    const Blend blend{data->driven(), data->modelApplied ? &result : nullptr, morph.isOn ? &morph.points : nullptr,
+                      static_cast<float>(morph.weight), envelopeValue};
+    return writeBlended(block, iterator, multiIndex, *data, blend);
 }
 
-/// A model that smooths for long is in force from now on: the user is told before the first frame (decision 0123).
-void neuralWarpNode::announceSmoothing(HDataBlock& block, const neuralWarpData& data) const {
-    constexpr std::int64_t manyPasses = 1000;
-    const std::int64_t passes = data.modelSettings.smoothingIterations;
-    if (passes < manyPasses)
-        return;
-    HStatus status;
-    const HDataHandle geometry = inputGeometryHandle(block, data.multiIndex, status);
-    const double count = status.error() ? 0.0 : HItGeometry(geometry).count();
-    constexpr double perPass = 3e-6, perVertex = 7e-9; // seconds of one core, its loop without vector instructions
-    HLongWork::announce("'" + name().asStdString() + "' smooths geometry " + std::to_string(data.multiIndex) + " in " +
-                            std::to_string(passes) + " passes, as its model says, in each frame",
-                        static_cast<double>(passes) * (perPass + count * perVertex));
-}
-
-bool neuralWarpNode::updateModelSettings(HDataBlock& block, neuralWarpData& data) {
-    if (data.modelPathDirty && resolveModelDirectory(block, data).error())
-        return false;
-    if (data.metadataDirty) {
-        const bool isRead = !loadMetadata(data, false).error();
-        // the map is that of the model before: the new one is loaded in the next evaluation
-        if (!isRead || data.drivesNothing())
-            return false;
+HStatus neuralWarpNode::prepare(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, bool isActive,
+                                TargetMorph& morph, Attempt& attempt) {
+    const ObservedStep step(*data.observer, FrameStep::prepare);
+    bool isGivenUp = isActive && !updateModelSettings(block, data);
+    HStatus status = prepareRestState(data, block, multiIndex);
+    if (status.error())
+        return status;
+    morph.isOn = readTargetMorph(block, multiIndex, morph.weight, morph.points, status);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    attempt = whatToAttempt(isActive && !isGivenUp, morph.isOn, morph.weight);
+    if (attempt == Attempt::withModel) {
+        if (data.modelLoadPending)
+            status = loadWholeModel(block, data);
+        if (status.error())
+            return status;
+        isGivenUp = data.modelLoadPending;
     }
-    if (data.modelSettings.smoothingIterations != data.activeSettings.smoothingIterations)
-        announceSmoothing(block, data);
-    data.applySettings(data.modelSettings);
-    data.releaseUnusedCaches();
-    return true;
+    data.leaveLoads(isGivenUp);
+    data.modelApplied = isModelApplied(attempt, data.canApplyModel(), data.drivesNothing());
+    return HStatus::kSuccess;
 }
 
 HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data,
                                          Points& result) {
     if (!data.canApplyModel())
         return {HStatus::kFailure, "there is no model to apply"};
-    std::vector<float> controls;
-    if (const HStatus status = gatherControlValues(block, data.session.inputCount(), controls); status.error())
+    ProfiledFrame observer(*data.observer, "InferenceDeltas", name(), data.activeSettings.isSurface());
+    std::vector<float> controls, outputs;
+    if (const HStatus status = runNetwork(block, data, observer, controls, outputs); status.error())
         return reported(status, sourceUnit::node);
-    data.endPhase(Phase::gather);
-    const std::vector<float> outputs = runNetwork(data, controls);
-    data.endPhase(Phase::network);
-
     const HProfilingScope scope(evaluationCategory(), 9, "ApplyDeltas", name());
     Points points;
-    if (HStatus status = readInputPoints(data, block, multiIndex, points); status.error())
-        return status;
-    const std::size_t count = data.componentMap.affectCount();
-    if (points.size() != count)
-        return misfit("the input geometry", points.size(), count);
-    if (HStatus status = requireOutputs(data, outputs); status.error())
-        return status;
-    data.endPhase(Phase::points);
-    result.resize(count);
-    Points deltas;
-    extractDeltas(deltas, data, outputs, DrivenVertices(data));
-    data.endPhase(Phase::deltas);
-    return applyDeltas(data, points, deltas, result);
-}
-
-std::vector<float> neuralWarpNode::runNetwork(neuralWarpData& data, const std::vector<float>& controls) const {
-    const HProfilingScope scope(evaluationCategory(), 0, "InferenceDeltas", name());
-    std::vector<float> outputs = data.session.run(controls);
-    if (data.observedOutputs)
-        *data.observedOutputs = outputs;
-    return outputs;
-}
-
-HStatus neuralWarpNode::applyDeltas(const neuralWarpData& data, const Points& points, const Points& deltas,
-                                    Points& result) const {
-    const DrivenVertices driven(data);
-    if (data.activeSettings.deltaMode == kOffsetMode) {
-        applyOffsets(result, points, deltas, driven);
-        data.endPhase(Phase::apply);
+    {
+        const ObservedStep step(observer, FrameStep::points);
+        if (const HStatus status = readInputPoints(data, block, multiIndex, points, false); status.error())
+            return status;
     }
-    if (!data.activeSettings.isSurface())
-        return HStatus::kSuccess;
-    if (data.restPoints.size() < points.size() || data.restFramesInverse.size() < points.size())
-        return misfit("the rest geometry", std::min(data.restPoints.size(), data.restFramesInverse.size()),
-                      points.size());
-    const HProfilingScope scope(evaluationCategory(), 10, "CalculateVertexFrames", name());
-    data.vertexFrames.transportDeltas(result, deltas, data.restPoints, data.restFramesInverse, points, driven.vertices);
-    data.endPhase(Phase::apply);
-    return HStatus::kSuccess;
+    const FrameSampler sampler(data.frameModel(), observer);
+    return statusOf(sampler.place(result, points, outputs, HLongWork::isInterrupted), data.session);
 }
 
 HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex,
-                                     const Blend& blend) {
-    HStatus status;
-    const std::size_t count = indexMapper(multiIndex, &status).affectCount();
-    if (status.error())
-        return reported(status, sourceUnit::node);
-    const float* vertexWeights = envelopeWeights(block, multiIndex, &status);
-    if (status.error())
-        return reported(status, sourceUnit::node);
+                                     const neuralWarpData& data, const Blend& blend) {
+    const float* vertexWeights = nullptr;
     HPointArray positions;
-    status = iterator.allPositions(positions, HSpace::kObject);
-    if (status.error())
-        return reported(status, sourceUnit::node);
-    if (positions.length() != count || !blend.fits(count))
-        return misfit("the deformed geometry", positions.length(), count);
-    blend.data->endPhase(Phase::fetch);
-    blendPositions(positions, vertexWeights, blend);
-    blend.data->endPhase(Phase::blend);
-    status = iterator.setAllPositions(positions, HSpace::kObject);
-    blend.data->endPhase(Phase::writeBack);
-    return reported(status, sourceUnit::node);
+    {
+        const ObservedStep step(*data.observer, FrameStep::fetch);
+        HStatus status;
+        const std::size_t count = indexMapper(multiIndex, &status).affectCount();
+        if (status.error())
+            return reported(status, sourceUnit::node);
+        vertexWeights = envelopeWeights(block, multiIndex, &status);
+        if (status.error())
+            return reported(status, sourceUnit::node);
+        status = iterator.allPositions(positions, HSpace::kObject);
+        if (status.error())
+            return reported(status, sourceUnit::node);
+        if (positions.length() != count || !blend.fits(count))
+            return misfit("the deformed geometry", positions.length(), count);
+    }
+    {
+        const ObservedStep step(*data.observer, FrameStep::blend);
+        blendPositions(positions.data(), positions.length(), vertexWeights, blend);
+    }
+    const ObservedStep step(*data.observer, FrameStep::writeBack);
+    return reported(iterator.setAllPositions(positions, HSpace::kObject), sourceUnit::node);
 }
 
 } // namespace neuralWarp

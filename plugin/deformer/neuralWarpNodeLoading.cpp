@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // From the attributes of the node to a loaded model.
+#include "deformer/geometryReaders.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
 #include "messages/displayErrorGated.h"
@@ -8,6 +9,8 @@
 #include "messages/sourceUnits.h"
 #include "nw_model/PrincipalShapes.h"
 #include "openquarn/HGlobal.h"
+#include "openquarn/HItGeometry.h"
+#include "openquarn/HLongWork.h"
 #include "openquarn/Instrumenter.h"
 
 #include <system_error>
@@ -43,9 +46,40 @@ HStatus noPath() {
     return {HStatus::kFailure, "modelRoot or modelName is empty"};
 }
 
-/// `name` is one below `models`.
 HString modelNameIn(const HDataHandle& element) {
     return element.child(neuralWarpNode::modelName).asString();
+}
+
+/// Fills modelRootPath and modelDirectory.
+HStatus findModelDirectory(HDataBlock& block, neuralWarpData& data) {
+    HStatus status;
+    const HString rootText = block.inputValue(neuralWarpNode::modelRoot, &status).asString();
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    if (rootText.isEmpty())
+        return noPath();
+    const fs::path root(rootText.asStdString());
+    const Entry rootEntry(root);
+    if (rootEntry.status.error())
+        return reported(rootEntry.status, sourceUnit::node);
+    if (!rootEntry.exists())
+        return badPath(rootText);
+    data.modelRootPath = root;
+
+    const HDataHandle element = existingElement(block, neuralWarpNode::models, data.multiIndex, status);
+    if (status.error())
+        return reported(status, sourceUnit::node);
+    const HString nameText = modelNameIn(element);
+    if (nameText.isEmpty())
+        return noPath();
+    const fs::path directory = (root / nameText.asStdString()).replace_extension(".nwrp");
+    const Entry entry(directory);
+    if (entry.status.error())
+        return reported(entry.status, sourceUnit::node);
+    if (!entry.isDirectory())
+        return badPath(directory.string());
+    data.modelDirectory = directory;
+    return HStatus::kSuccess;
 }
 
 void showLoadResult(LoadResult result, const fs::path& file) {
@@ -72,6 +106,21 @@ HStatus dueAgain(neuralWarpData& data) {
     return HStatus::kFailure;
 }
 
+HStatus loadNetwork(neuralWarpData& data) {
+    const fs::path file = data.modelDirectory / "model.onnx";
+    const LoadResult result = data.session.load(file, true);
+    if (data.isReplaced())
+        return dueAgain(data); // whatever came of it
+    showLoadResult(result, file);
+    if (data.session.isLoaded())
+        return HStatus::kSuccess;
+    raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
+    const std::string& reason = data.session.errorText();
+    if (reason.empty())
+        return HStatus::kFailure;
+    return reported({HStatus::kFailure, "'" + file.string() + "' cannot be used: " + reason}, sourceUnit::node);
+}
+
 /// None when the directory has no such file, or a bad one.
 HStatus loadPrincipalShapes(neuralWarpData& data) {
     const fs::path file = data.modelDirectory / "principal_shapes.json";
@@ -83,6 +132,21 @@ HStatus loadPrincipalShapes(neuralWarpData& data) {
         data.principalVertCount = vertices;
     }
     return entry.status;
+}
+
+/// A model that smooths for long is in force from now on: the user is told before the first frame (decision 0123).
+void announceSmoothing(HDataBlock& block, const neuralWarpData& data, const HString& nodeName) {
+    constexpr std::int64_t manyPasses = 1000;
+    const std::int64_t passes = data.modelSettings.smoothingIterations;
+    if (passes < manyPasses)
+        return;
+    HStatus status;
+    const HDataHandle geometry = inputGeometryHandle(block, data.multiIndex, status);
+    const double count = status.error() ? 0.0 : HItGeometry(geometry).count();
+    constexpr double perPass = 3e-6, perVertex = 7e-9; // seconds of one core, its loop without vector instructions
+    HLongWork::announce("'" + nodeName.asStdString() + "' smooths geometry " + std::to_string(data.multiIndex) +
+                            " in " + std::to_string(passes) + " passes, as its model says, in each frame",
+                        static_cast<double>(passes) * (perPass + count * perVertex));
 }
 
 } // namespace
@@ -97,37 +161,6 @@ HStatus neuralWarpNode::resolveModelDirectory(HDataBlock& block, neuralWarpData&
     data.modelRootPath.clear();
     data.directoryState.reset();
     return findModelDirectory(block, data);
-}
-
-HStatus neuralWarpNode::findModelDirectory(HDataBlock& block, neuralWarpData& data) {
-    HStatus status;
-    const HString rootText = block.inputValue(modelRoot, &status).asString();
-    if (status.error())
-        return reported(status, sourceUnit::node);
-    if (rootText.isEmpty())
-        return noPath();
-    const fs::path root(rootText.asStdString());
-    const Entry rootEntry(root);
-    if (rootEntry.status.error())
-        return reported(rootEntry.status, sourceUnit::node);
-    if (!rootEntry.exists())
-        return badPath(rootText);
-    data.modelRootPath = root;
-
-    const HDataHandle element = existingElement(block, models, data.multiIndex, status);
-    if (status.error())
-        return reported(status, sourceUnit::node);
-    const HString nameText = modelNameIn(element);
-    if (nameText.isEmpty())
-        return noPath();
-    const fs::path directory = (root / nameText.asStdString()).replace_extension(".nwrp");
-    const Entry entry(directory);
-    if (entry.status.error())
-        return reported(entry.status, sourceUnit::node);
-    if (!entry.isDirectory())
-        return badPath(directory.string());
-    data.modelDirectory = directory;
-    return HStatus::kSuccess;
 }
 
 HStatus neuralWarpNode::loadMetadata(neuralWarpData& data, bool force) {
@@ -179,19 +212,20 @@ HStatus neuralWarpNode::loadModel(neuralWarpData& data, bool force) {
     return network;
 }
 
-HStatus neuralWarpNode::loadNetwork(neuralWarpData& data) {
-    const fs::path file = data.modelDirectory / "model.onnx";
-    const LoadResult result = data.session.load(file, true);
-    if (data.isReplaced())
-        return dueAgain(data); // whatever came of it
-    showLoadResult(result, file);
-    if (data.session.isLoaded())
-        return HStatus::kSuccess;
-    raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
-    const std::string& reason = data.session.errorText();
-    if (reason.empty())
-        return HStatus::kFailure;
-    return reported({HStatus::kFailure, "'" + file.string() + "' cannot be used: " + reason}, sourceUnit::node);
+bool neuralWarpNode::updateModelSettings(HDataBlock& block, neuralWarpData& data) {
+    if (data.modelPathDirty && resolveModelDirectory(block, data).error())
+        return false;
+    if (data.metadataDirty) {
+        const bool isRead = !loadMetadata(data, false).error();
+        // the map is that of the model before: the new one is loaded in the next evaluation
+        if (!isRead || data.drivesNothing())
+            return false;
+    }
+    if (data.modelSettings.smoothingIterations != data.activeSettings.smoothingIterations)
+        announceSmoothing(block, data, name());
+    data.applySettings(data.modelSettings);
+    data.releaseUnusedCaches();
+    return true;
 }
 
 HStatus neuralWarpNode::loadWholeModel(HDataBlock& block, neuralWarpData& data) {

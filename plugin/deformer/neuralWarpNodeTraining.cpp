@@ -35,52 +35,21 @@ HStatus tooFew(const char* what, std::size_t has, std::size_t needed) {
                                    std::to_string(needed) + " points of the target"};
 }
 
-} // namespace
-
 /// What training deltas are measured between. `input` and `rest` are smoothed; empty when the type has no use for them.
-struct neuralWarpNode::TrainingPoints {
+struct TrainingPoints {
     Points input, rest, target;
 };
 
 /// The frame topology and the unsmoothed rest points that the surface types are measured with: those of the state, or,
 /// while the settings in force have no use for frames, a set made for one call.
-struct neuralWarpNode::RestSurface {
+struct MeasuredRest {
     const quill::VertexFrames* frames = nullptr;
     const Points* restPoints = nullptr;
     quill::VertexFrames ownFrames;
     Points ownRestPoints;
 };
 
-HStatus neuralWarpNode::getVertexDeltas(HDoubleArray& out, std::uint32_t multiIndex, TargetDeltaType type) {
-    return guarded(*this, "extracting training deltas", [&]() -> HStatus {
-        if (type >= TargetDeltaType::invalid)
-            return HStatus::kInvalidParameter;
-        HDataBlock block = forceCache();
-        neuralWarpData* data = fetchNodeData(block, multiIndex);
-        if (!data)
-            return HStatus::kInvalidParameter;
-        if (const HStatus status = prepareRestState(*data, block, multiIndex); status.error())
-            return reported(status, sourceUnit::node);
-        TrainingPoints points;
-        if (const HStatus status = readTrainingPoints(*data, block, multiIndex, type, points); status.error())
-            return reported(status, sourceUnit::node);
-        return isSurfaceType(type)
-                   ? surfaceDeltas(out, *data, block, multiIndex, type, points)
-                   : pointDifferences(out, points.target, needsInputPoints(type) ? points.input : points.rest);
-    });
-}
-
-HStatus neuralWarpNode::readTrainingPoints(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                                           TargetDeltaType type, TrainingPoints& points) {
-    HStatus status;
-    if (needsRestPoints(type))
-        status = readSmoothedRestPoints(data, block, multiIndex, points.rest, true);
-    if (!status.error() && needsInputPoints(type))
-        status = readInputPoints(data, block, multiIndex, points.input);
-    if (!status.error())
-        status = readTargetPoints(data, multiIndex, points.target);
-    if (status.error())
-        return status;
+HStatus requirePoints(const TrainingPoints& points, TargetDeltaType type) {
     const std::size_t count = points.target.size();
     if (needsRestPoints(type) && points.rest.size() < count)
         return tooFew("the rest geometry", points.rest.size(), count);
@@ -89,7 +58,7 @@ HStatus neuralWarpNode::readTrainingPoints(const neuralWarpData& data, HDataBloc
     return HStatus::kSuccess;
 }
 
-HStatus neuralWarpNode::pointDifferences(HDoubleArray& out, const Points& target, const Points& base) {
+HStatus pointDifferences(HDoubleArray& out, const Points& target, const Points& base) {
     if (HStatus status = out.setLength(3 * target.size()); status.error())
         return status;
     quill::parallelFor(target.size(), [&](std::size_t j) {
@@ -100,8 +69,8 @@ HStatus neuralWarpNode::pointDifferences(HDoubleArray& out, const Points& target
     return HStatus::kSuccess;
 }
 
-HStatus neuralWarpNode::findRestSurface(const neuralWarpData& data, HDataBlock& block, std::uint32_t multiIndex,
-                                        RestSurface& surface) const {
+HStatus findRestSurface(const neuralWarpNode& node, const neuralWarpData& data, HDataBlock& block,
+                        std::uint32_t multiIndex, MeasuredRest& surface) {
     const std::size_t count = data.componentMap.affectCount();
     if (data.activeSettings.isSurface() && !data.framesTopologyDirty && data.restPoints.size() == count) {
         surface.frames = &data.vertexFrames;
@@ -120,23 +89,23 @@ HStatus neuralWarpNode::findRestSurface(const neuralWarpData& data, HDataBlock& 
     quill::MeshTopology topology;
     if (status = readMeshTopology(mesh, topology); status.error())
         return reported(status, sourceUnit::node);
-    buildFrames(surface.ownFrames, topology, data.componentMap, surface.ownRestPoints, name());
+    buildFrames(surface.ownFrames, topology, data.componentMap, surface.ownRestPoints, node.name());
     surface.frames = &surface.ownFrames;
     surface.restPoints = &surface.ownRestPoints;
     return HStatus::kSuccess;
 }
 
-HStatus neuralWarpNode::surfaceDeltas(HDoubleArray& out, const neuralWarpData& data, HDataBlock& block,
-                                      std::uint32_t multiIndex, TargetDeltaType type, const TrainingPoints& points) {
-    RestSurface surface;
-    if (const HStatus status = findRestSurface(data, block, multiIndex, surface); status.error())
+HStatus surfaceDeltas(HDoubleArray& out, const neuralWarpNode& node, const neuralWarpData& data, HDataBlock& block,
+                      std::uint32_t multiIndex, TargetDeltaType type, const TrainingPoints& points) {
+    MeasuredRest surface;
+    if (const HStatus status = findRestSurface(node, data, block, multiIndex, surface); status.error())
         return reported(status, sourceUnit::node);
     const bool isCarried = type != TargetDeltaType::targetInInputFrames;
     Frames inputInverse;
     Frames rest;
-    calculateVertexFrames(*surface.frames, data.componentMap, inputInverse, points.input, true, nullptr);
+    node.calculateVertexFrames(*surface.frames, data.componentMap, inputInverse, points.input, true, nullptr);
     if (isCarried)
-        calculateVertexFrames(*surface.frames, data.componentMap, rest, points.rest, false, nullptr);
+        node.calculateVertexFrames(*surface.frames, data.componentMap, rest, points.rest, false, nullptr);
     Points deltas(points.target.size());
     quill::parallelFor(deltas.size(), [&](std::size_t j) {
         deltas[j] = quill::transformAsPoint(points.target[j], inputInverse[j]);
@@ -150,6 +119,36 @@ HStatus neuralWarpNode::surfaceDeltas(HDoubleArray& out, const neuralWarpData& d
         return HStatus::kInsufficientMemory;
     out = std::move(converted);
     return HStatus::kSuccess;
+}
+
+} // namespace
+
+HStatus neuralWarpNode::getVertexDeltas(HDoubleArray& out, std::uint32_t multiIndex, TargetDeltaType type) {
+    return guarded(*this, "extracting training deltas", [&]() -> HStatus {
+        if (type >= TargetDeltaType::invalid)
+            return HStatus::kInvalidParameter;
+        HDataBlock block = forceCache();
+        neuralWarpData* data = fetchNodeData(block, multiIndex);
+        if (!data)
+            return HStatus::kInvalidParameter;
+        if (const HStatus status = prepareRestState(*data, block, multiIndex); status.error())
+            return reported(status, sourceUnit::node);
+        TrainingPoints points;
+        HStatus status;
+        if (needsRestPoints(type))
+            status = readSmoothedRestPoints(*data, block, multiIndex, points.rest, true);
+        if (!status.error() && needsInputPoints(type))
+            status = readInputPoints(*data, block, multiIndex, points.input, true);
+        if (!status.error())
+            status = readTargetPoints(*data, multiIndex, points.target);
+        if (!status.error())
+            status = requirePoints(points, type);
+        if (status.error())
+            return reported(status, sourceUnit::node);
+        return isSurfaceType(type)
+                   ? surfaceDeltas(out, *this, *data, block, multiIndex, type, points)
+                   : pointDifferences(out, points.target, needsInputPoints(type) ? points.input : points.rest);
+    });
 }
 
 } // namespace neuralWarp

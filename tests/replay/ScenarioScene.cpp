@@ -158,7 +158,7 @@ HObject ScenarioScene::meshOf(unsigned index, const Json& pointList) const {
 
 HStatus ScenarioScene::deform(unsigned index) {
     observeOutputs(index);
-    modelOutputs_.clear();
+    modelOutputs_.values.clear();
     return rig_.deform(index);
 }
 
@@ -184,7 +184,7 @@ void ScenarioScene::observeOutputs(unsigned index) {
     neuralWarp::neuralWarpData* state = rig_.state(index);
     if (!state)
         throw std::runtime_error("geometry " + std::to_string(index) + " has no state");
-    state->observedOutputs = &modelOutputs_;
+    state->observer = &modelOutputs_;
 }
 
 HStatus ScenarioScene::runCommand(const std::string& words, const Json* indices, HCommandResult& result) const {

@@ -5,6 +5,7 @@
 
 #include "openquarn/HCommandResult.h"
 #include "openquarn_app/Session.h"
+#include "plugin/deformer/support/SeenOutputs.h"
 #include "plugin/deformer/support/warpRig.h"
 
 #include <string>
@@ -38,7 +39,7 @@ public:
     void close();
 
     const warpRig::Rig& rig() const { return rig_; }
-    const std::vector<float>& modelOutputs() const { return modelOutputs_; }
+    const std::vector<float>& modelOutputs() const { return modelOutputs_.values; }
     // The text with "<ROOT>" in place of the model root.
     std::string withoutRoot(std::string text) const;
 
@@ -48,7 +49,7 @@ private:
     HObject meshOf(unsigned index, const Json& points) const;
 
     std::string root_;
-    std::vector<float> modelOutputs_;
+    SeenOutputs modelOutputs_;
     OpenQuarn::Session session_;
     std::string plugin_;
     warpRig::Rig rig_;

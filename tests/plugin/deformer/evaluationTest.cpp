@@ -2,6 +2,7 @@
 // Whole evaluations, from a model directory to moved points, against the formulas.
 #include "openquarn_app/Evaluation.h"
 #include "plugin/deformer/reference.h"
+#include "plugin/deformer/support/SeenOutputs.h"
 #include "plugin/deformer/support/WarpTest.h"
 #include "plugin/deformer/sweep.h"
 
@@ -36,7 +37,7 @@ private:
         expected::Request request = {};
         ModelSpec model = {};
         std::string subset = {};
-        std::vector<float> outputs = {};
+        SeenOutputs outputs = {};
     };
 
     void add(unsigned index, const ZooMesh& mesh, const expected::Vertices& affected, bool isWeighted);
@@ -75,7 +76,7 @@ Walk::Walk(const std::filesystem::path& folder, const ZooMesh& mesh, const ZooMe
     changeControls();
     for (Driven& driven : all_) { // after this there are states, which changes can be asked of
         compare(driven);
-        rig_.state(driven.index)->observedOutputs = &driven.outputs;
+        rig_.state(driven.index)->observer = &driven.outputs;
     }
 }
 
@@ -238,10 +239,10 @@ void Walk::compare(Driven& driven) {
         << "mode " << driven.model.deltaMode << ", " << driven.model.smoothingIterations << " passes, "
         << driven.model.shapes.size() << " shapes, " << driven.subset;
     EXPECT_EQ(rig_.state(driven.index)->modelApplied, driven.reference.modelApplied());
-    if (driven.request.envelope == 0.0F || !rig_.state(driven.index)->observedOutputs)
+    if (driven.request.envelope == 0.0F || rig_.state(driven.index)->observer != &driven.outputs)
         return;
     const bool isApplied = driven.reference.modelApplied();
-    EXPECT_EQ(driven.outputs,
+    EXPECT_EQ(driven.outputs.values,
               isApplied ? expected::outputsOf(driven.model, driven.request.controls) : std::vector<float>());
     if (!isApplied)
         return;

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "KernelTest.h"
-#include "deformer/deltas.h"
+#include "frame/deltas.h"
 #include "support/meshZoo.h"
 
 #include "quill/VertexFrames.h"
@@ -18,10 +18,9 @@ TEST_F(DeformerKernels, PrincipalShapesGiveTheBitsOfTheProcessor) {
         for (const std::size_t shapes : {1U, 2U, 50U, 51U}) {
             const auto basis = numbers.floats(3 * slots * shapes);
             const auto coefficients = shapes == 1 ? std::vector<float>{2.0F} : numbers.floats(shapes);
-            neuralWarp::neuralWarpData data;
-            data.componentMap.setIdentity(slots);
             Points expected;
-            neuralWarp::extractPrincipalDeltas(expected, coefficients, shapes, basis, neuralWarp::DrivenVertices(data));
+            neuralWarp::extractPrincipalDeltas(expected, coefficients, shapes, basis,
+                                               neuralWarp::DrivenVertices(slots));
             Launch launch(program, "gpu_principal_shapes_kernel");
             launch.output(Points(slots)).input(coefficients).input(basis);
             launch.value(static_cast<std::uint32_t>(shapes)).value(static_cast<std::uint32_t>(slots));

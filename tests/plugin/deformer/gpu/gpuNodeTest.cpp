@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The GPU deformer: what it answers, what it says, and where its points are.
 #include "plugin/deformer/gpu/GpuTest.h"
+#include "plugin/deformer/support/SeenOutputs.h"
 
 #include "openquarn_app/Resources.h"
 
@@ -106,14 +107,15 @@ TEST_F(GpuTest, AnswersAndSaysWhatIsWrong) {
         SCOPED_TRACE(row.name);
         writeModel(modelDirectory(), modelSpec());
         makeEvaluated();
-        std::vector<float> observed{1.0F};
-        state().observedOutputs = &observed;
+        SeenOutputs observed;
+        observed.values = {1.0F};
+        state().observer = &observed;
         row.spoil(*this);
         EXPECT_EQ(evaluate(), row.status);
         OpenQuarn::Resources::setPath("");
         EXPECT_EQ(shown(), row.messages);
         EXPECT_THAT(positions, IsEmpty());
-        EXPECT_TRUE(observed.empty() || row.status != passThrough) << "nothing came of the network";
+        EXPECT_TRUE(observed.values.empty() || row.status != passThrough) << "nothing came of the network";
         EXPECT_TRUE(Gpu::counts().launches.empty()) << "something was enqueued";
         gpu.reset();
     }
@@ -204,8 +206,8 @@ protected:
 TEST_F(Uploads, AreOfWhatHasANewVersionAndOfAllAfterItsEnd) {
     writeModel(modelDirectory(), spec());
     make();
-    std::vector<float> observed;
-    state().observedOutputs = &observed;
+    SeenOutputs observed;
+    state().observer = &observed;
     const std::vector<Texts> bySlot = {{"FramesIndexer", "FramesPairs"},
                                        {"ConnectionWeights", "Connections", "ConnectionsIndexer"},
                                        {"OriginalVerts", "SmoothOriginalFramesInverse"},
@@ -218,7 +220,7 @@ TEST_F(Uploads, AreOfWhatHasANewVersionAndOfAllAfterItsEnd) {
         Gpu::resetCounts();
         EXPECT_EQ(evaluate(), success);
         EXPECT_LT(distanceTo(result(*rig)), rounding);
-        EXPECT_EQ(observed, spec().bias);
+        EXPECT_EQ(observed.values, spec().bias);
         Texts names;
         for (const auto& [name, count] : Gpu::counts().uploads)
             if (std::count(all.begin(), all.end(), name) != 0)

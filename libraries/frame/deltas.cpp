@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "deformer/deltas.h"
+#include "frame/deltas.h"
 
 #include "quill/parallelFor.h"
 

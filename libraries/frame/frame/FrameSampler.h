@@ -1,0 +1,53 @@
+// SPDX-License-Identifier: Apache-2.0
+// One frame: from control values to the positions that the model gives its vertices. Blending towards them is a step of
+// its own (frame/blend.h).
+#pragma once
+
+#include "frame/FrameCheck.h"
+#include "frame/FrameModel.h"
+#include "frame/FrameObserver.h"
+#include "frame/Network.h"
+#include "frame/smoothing.h"
+
+#include <span>
+#include <vector>
+
+namespace neuralWarp {
+
+/// Computes frames of a geometry. Costs nothing to make, and keeps nothing from frame to frame; the working arrays of a
+/// frame are allocated in it and freed with it. Loops run on oneTBB's workers and give the same bits on any number of
+/// threads.
+///
+/// Thread: one at a time for one object and what it views. All throw what `observer` and the network throw, and
+/// std::bad_alloc.
+class FrameSampler {
+public:
+    /// The observer, and what the model views, outlive this.
+    explicit FrameSampler(const FrameModel& model, FrameObserver& observer = FrameObserver::none())
+        : model_(model)
+        , observer_(observer) {}
+
+    /// Runs the network, and shows its outputs to the observer.
+    ///   controls  as Network::run() takes them
+    /// Returns the outputs; empty when the network failed.
+    std::vector<float> predict(Network& network, std::span<const float> controls) const;
+
+    /// Where the model puts the vertices that it drives, in object space:
+    ///   Offset    smoothed point + delta
+    ///   Surface   rest point + delta, carried from the frame of the smoothed rest shape to that of the smoothed points
+    /// and nowhere, for another mode.
+    ///   result       out, resized to model.vertexCount; zero where no slot drives a vertex. As it was after a fault
+    ///   points       in: the points that come in [model.vertexCount]; out: smoothed. May not be `result`
+    ///   outputs      of the network: deltas [slots][3], or coefficients of the principal shapes [shapes]; any number
+    ///   isCancelled  asked in long smoothing, which then throws quill::Cancelled
+    FrameCheck place(Points& result, Points& points, const std::vector<float>& outputs,
+                     const IsCancelled& isCancelled = {}) const;
+
+private:
+    FrameCheck check(std::size_t outputCount) const;
+
+    FrameModel model_;
+    FrameObserver& observer_;
+};
+
+} // namespace neuralWarp

@@ -1,0 +1,49 @@
+// SPDX-License-Identifier: Apache-2.0
+// The last step of a frame: from where the points are towards where they should be.
+#pragma once
+
+#include "frame/Points.h"
+#include "frame/SlotMap.h"
+#include "quill/parallelFor.h"
+
+#include <cstddef>
+
+namespace neuralWarp {
+
+/// What points are blended towards. Nothing is owned.
+struct Blend {
+    /// The arrays have an element for each of the deformed vertices.
+    bool fits(std::size_t count) const {
+        return (!model || model->size() == count) && (!target || target->size() == count);
+    }
+
+    DrivenVertices driven;          ///< by the model
+    const Points* model = nullptr;  ///< positions by the model; null: none is applied
+    const Points* target = nullptr; ///< null: no target morph
+    float targetWeight = 0.0F;      ///< of the way to the target
+    float envelope = 1.0F;
+};
+
+/// Moves each position p by f * (c - p), where c is the model's position of a driven vertex and p itself (in single
+/// precision) of any other, then brought towards the target, and f = envelope * weight.
+///   positions  [count] object space, of any type with members x, y and z in double precision; others stay as they are
+///   weights    [count], or null: all 1
+///   blend      must fit `count`
+template <class Point>
+void blendPositions(Point* positions, std::size_t count, const float* weights, const Blend& blend) {
+    quill::parallelFor(count, [&](std::size_t i) {
+        Point& p = positions[i];
+        const bool isDriven = blend.model && blend.driven.contains(i);
+        quill::val3<float> current =
+            isDriven ? (*blend.model)[i]
+                     : quill::val3<float>(static_cast<float>(p.x), static_cast<float>(p.y), static_cast<float>(p.z));
+        if (blend.target)
+            current = current + ((*blend.target)[i] - current) * blend.targetWeight;
+        const auto f = static_cast<double>(weights ? weights[i] * blend.envelope : blend.envelope);
+        p.x += (static_cast<double>(current.x) - p.x) * f;
+        p.y += (static_cast<double>(current.y) - p.y) * f;
+        p.z += (static_cast<double>(current.z) - p.z) * f;
+    });
+}
+
+} // namespace neuralWarp

@@ -1,0 +1,210 @@
+// SPDX-License-Identifier: Apache-2.0
+// Frames without a host: the formulas in plain loops, what is refused, and what an observer sees.
+#include "frame/FrameSampler.h"
+#include "frame/blend.h"
+#include "quill/WorkWatch.h"
+#include "support/meshZoo.h"
+
+#include <gmock/gmock.h>
+
+namespace {
+
+using namespace neuralWarp;
+using quill::missingIndex;
+using testing::ElementsAre;
+using Indices = std::vector<std::uint32_t>;
+using Vec = quill::val3<float>;
+
+/// Gives what it holds; with controls, the first of them on top of each.
+struct Given final : Network {
+    std::vector<float> run(std::span<const float> controls) override {
+        std::vector<float> outputs = values;
+        for (float& output : outputs)
+            output += controls[0];
+        return outputs;
+    }
+    std::vector<float> values;
+};
+
+struct Seen final : FrameObserver {
+    void beginStep(FrameStep step) override { steps.push_back(step); }
+    void endStep(FrameStep step) override { ended.push_back(step); }
+    void takeOutputs(const std::vector<float>& values) override { outputs = values; }
+    std::vector<FrameStep> steps, ended;
+    std::vector<float> outputs;
+};
+
+/// A grid of nine vertices, two of which a model drives from slots 3 and 0 when it is `mapped`.
+struct Grid {
+    explicit Grid(DeltaSettings settings, bool isMapped = false, std::uint64_t shapes = 0)
+        : shapeCount(shapes)
+        , model{settings,
+                count,
+                isMapped ? DrivenVertices(vertices, slots) : DrivenVertices(count),
+                isMapped ? std::size_t{4} : count,
+                {basis, shapeCount, shapes ? count : 0},
+                {connections, weights, frames, rest, restFramesInverse}} {
+        map.setIdentity(count);
+        connections.build(mesh.topology(), map, 0, false);
+        connections.calculateConnectionWeights(weights, rest, 1.0, 0.0);
+        frames.build(mesh.topology(), map, &rest);
+        Points smoothed = rest;
+        smoothPoints(smoothed, model.rest, settings.smoothingIterations);
+        frames.calculateFrames(restFramesInverse, smoothed, map, true, nullptr);
+        for (std::size_t i = 0; i < 3 * count * shapes; ++i)
+            basis.push_back(0.25F * static_cast<float>(i));
+    }
+    Vec deltaOf(std::size_t slot, const std::vector<float>& outputs) const {
+        if (shapeCount == 0)
+            return {outputs[3 * slot], outputs[3 * slot + 1], outputs[3 * slot + 2]};
+        Vec sum;
+        for (std::size_t j = 0; j < shapeCount; ++j)
+            for (std::size_t axis = 0; axis < 3; ++axis)
+                sum[axis] += outputs[j] * basis[3 * (shapeCount * slot + j) + axis];
+        return sum;
+    }
+
+    static constexpr std::size_t count = 9;
+    ZooMesh mesh = makeGrid(2, 2);
+    Points rest = mesh.points;
+    Indices vertices{1, 4},
+        slots{missingIndex, 3, missingIndex, missingIndex, 0, missingIndex, missingIndex, missingIndex, missingIndex};
+    quill::IndexMapper map;
+    quill::VertexConnections connections;
+    std::vector<float> weights, basis;
+    quill::VertexFrames frames;
+    std::vector<quill::mat4d> restFramesInverse;
+    std::uint64_t shapeCount;
+    FrameModel model;
+};
+
+TEST(FrameSampler, PutsDrivenVerticesWhereTheFormulasSay) {
+    for (const DeltaSettings settings : {DeltaSettings{0, 0}, {2, 0}, {0, 1}, {2, 1}, {0, 7}})
+        for (const bool isMapped : {false, true})
+            for (const std::uint64_t shapes : {0U, 2U}) {
+                SCOPED_TRACE(testing::Message() << "mode " << settings.deltaMode << ", " << settings.smoothingIterations
+                                                << " passes, " << shapes << " shapes, mapped " << isMapped);
+                const Grid grid(settings, isMapped, shapes);
+                Given network;
+                for (std::size_t i = 0; i < (shapes ? shapes : 3 * Grid::count); ++i)
+                    network.values.push_back(0.5F - 0.125F * static_cast<float>(i));
+                Seen seen;
+                const FrameSampler sampler(grid.model, seen);
+                const std::vector<float> outputs = sampler.predict(network, std::vector<float>{0.25F});
+                EXPECT_EQ(seen.outputs, outputs);
+                EXPECT_EQ(outputs.at(0), 0.75F);
+
+                Points points = grid.rest, smoothed = grid.rest, result(2);
+                for (std::size_t v = 0; v < points.size(); ++v)
+                    points[v].z = smoothed[v].z = points[v].x * points[v].y;
+                smoothPoints(smoothed, grid.model.rest, settings.smoothingIterations);
+                ASSERT_EQ(sampler.place(result, points, outputs).fault, FrameFault::none);
+                EXPECT_EQ(points, smoothed);
+                std::vector<quill::mat4d> now;
+                grid.frames.calculateFrames(now, smoothed, grid.map, false, nullptr);
+                Points wanted(Grid::count);
+                for (std::size_t v = 0; v < Grid::count; ++v) {
+                    const std::size_t slot = isMapped ? grid.slots[v] : v;
+                    if (slot == missingIndex || settings.deltaMode > 1)
+                        continue;
+                    const Vec delta = grid.deltaOf(slot, outputs);
+                    wanted[v] = settings.deltaMode == 0
+                                    ? smoothed[v] + delta
+                                    : transportDelta(grid.rest[v], delta, grid.restFramesInverse[v], now[v]);
+                }
+                EXPECT_EQ(result, wanted);
+                EXPECT_THAT(seen.steps,
+                            ElementsAre(FrameStep::network, FrameStep::points, FrameStep::deltas, FrameStep::apply));
+                EXPECT_EQ(seen.ended, seen.steps);
+            }
+}
+
+TEST(FrameSampler, RefusesWhatDoesNotReachEveryVertex) {
+    struct Row {
+        const char* name;
+        std::size_t points, outputs;
+        std::uint64_t shapes;
+        std::size_t basis, restFrames;
+        FrameFault fault;
+        std::size_t has, needed;
+        bool reachesAllSlots;
+    };
+    const Row rows[] = {
+        {"all there", 9, 27, 0, 0, 9, FrameFault::none, 9, 9, true},
+        {"more than that", 9, 29, 0, 0, 9, FrameFault::none, 9, 9, true},
+        {"points", 8, 27, 0, 0, 9, FrameFault::otherPointCount, 8, 9, true},
+        {"no outputs", 9, 0, 0, 0, 9, FrameFault::noOutputs, 0, 0, false},
+        {"a third of a delta", 9, 26, 0, 0, 9, FrameFault::tooFewDeltas, 8, 9, false},
+        {"coefficients", 9, 2, 2, 54, 9, FrameFault::none, 9, 9, true},
+        {"too few coefficients", 9, 1, 2, 54, 9, FrameFault::tooFewCoefficients, 1, 2, false},
+        {"basis", 9, 2, 2, 53, 9, FrameFault::tooFewDeltas, 8, 9, false},
+        {"rest frames", 9, 27, 0, 0, 8, FrameFault::tooFewRestPoints, 8, 9, true},
+    };
+    for (const Row& row : rows) {
+        SCOPED_TRACE(row.name);
+        Grid grid({0, 1}, false, row.shapes);
+        grid.basis.resize(row.basis);
+        grid.restFramesInverse.resize(row.restFrames);
+        Points points(row.points), result{{1, 2, 3}};
+        const std::vector<float> outputs(row.outputs);
+        const FrameCheck check = FrameSampler(grid.model).place(result, points, outputs);
+        EXPECT_EQ(check.fault, row.fault);
+        EXPECT_EQ(result.size(), row.fault == FrameFault::none ? Grid::count : 1U);
+        if (row.fault != FrameFault::none) {
+            EXPECT_EQ(check.has, row.has);
+            EXPECT_EQ(check.needed, row.needed);
+        }
+        EXPECT_EQ(areEnoughForAllSlots(grid.model, row.outputs), row.reachesAllSlots);
+    }
+    Grid grid({0, 0}, true, 2); // reads four slots; the counts of the basis speak of nine
+    grid.basis.resize(6 * 4);
+    EXPECT_EQ(checkOutputs(grid.model, 2).fault, FrameFault::none);
+    EXPECT_FALSE(areEnoughForAllSlots(grid.model, 2));
+}
+
+TEST(FrameSampler, EndsLongSmoothingOnRequest) {
+    const Grid grid({1000, 0});
+    int looks = 0;
+    Points points = grid.rest, result;
+    Seen seen;
+    EXPECT_THROW(FrameSampler(grid.model, seen).place(result, points, {}, [&] { return ++looks == 3; }),
+                 quill::Cancelled);
+    EXPECT_EQ(looks, 3);
+    EXPECT_THAT(seen.ended, ElementsAre(FrameStep::points));
+}
+
+struct HomogeneousPoint {
+    double x, y, z, w;
+};
+
+TEST(Blend, GoesByEnvelopeAndWeightTowardsTheModelAndTheTarget) {
+    const Indices vertices{1}, slots{missingIndex, 0};
+    const Points model{{9, 9, 9}, {3, 0, 0}}, target{{1, 1, 0}, {1, 2, 0}};
+    const std::vector<float> weights{1.0F, 0.5F};
+    struct Row {
+        const char* name;
+        const Points *model, *target;
+        const float* weights;
+        double x0, x1, y1;
+    };
+    const double third = 1.0 / 3.0, rounded = static_cast<double>(static_cast<float>(third));
+    const double same = third + (rounded - third) * 0.5;
+    for (const Row& row :
+         {Row{"nothing", nullptr, nullptr, nullptr, same, 1.0, 0.0},
+          {"model", &model, nullptr, nullptr, same, 2.0, 0.0},
+          {"weights", &model, nullptr, weights.data(), same, 1.5, 0.0},
+          {"target", nullptr, &target, nullptr, third + (0.5 * (1 + rounded) - third) * 0.5, 1.0, 0.5},
+          {"both", &model, &target, weights.data(), third + (0.5 * (1 + rounded) - third) * 0.5, 1.25, 0.25}}) {
+        SCOPED_TRACE(row.name);
+        std::vector<HomogeneousPoint> points{{third, 0, 0, 7}, {1, 0, 0, 8}};
+        const Blend blend{DrivenVertices(vertices, slots), row.model, row.target, 0.5F, 0.5F};
+        ASSERT_TRUE(blend.fits(2) && (!(row.model || row.target) || !blend.fits(3)));
+        blendPositions(points.data(), points.size(), row.weights, blend);
+        EXPECT_NEAR(points[0].x, row.x0, row.target ? 1e-7 : 0.0);
+        EXPECT_EQ(points[1].x, row.x1);
+        EXPECT_EQ(points[1].y, row.y1);
+        EXPECT_EQ(points[0].w + points[1].w, 15.0);
+    }
+}
+
+} // namespace
