@@ -85,38 +85,38 @@ public:
 
     // --- attributes ---
 
-    static HObject modelRoot;
-    static HObject modelName;
-    static HObject modelActive;
-    static HObject models;
-    static HObject trainingDataRoot;
-    static HObject trainingDataName;
-    static HObject deltaMode;
-    static HObject smoothingIterations;
-    static HObject exportStartFrame;
-    static HObject exportEndFrame;
-    static HObject exportList; ///< "export"
-    static HObject outputModelName;
-    static HObject batchSize;
-    static HObject epochs;
-    static HObject learningRate;
-    static HObject validationRatio;
-    static HObject hiddenLayerCount;
-    static HObject neuronsPerLayer;
-    static HObject activationFunction;
-    static HObject dropoutRatio;
-    static HObject principalShapesEnabled;
-    static HObject principalShapesLimit;
-    static HObject principalShapesAccuracy;
-    static HObject preloadData;
-    static HObject train;
-    static HObject controlValues;
-    static HObject targetGeometry;
-    static HObject targetMorphGeometry;
-    static HObject targetMorphEnabled;
-    static HObject targetMorphEnvelope;
-    static HObject poseGenerator;
-    static HObject deformerData;
+    static inline HObject modelRoot;
+    static inline HObject modelName;
+    static inline HObject modelActive;
+    static inline HObject models;
+    static inline HObject trainingDataRoot;
+    static inline HObject trainingDataName;
+    static inline HObject deltaMode;
+    static inline HObject smoothingIterations;
+    static inline HObject exportStartFrame;
+    static inline HObject exportEndFrame;
+    static inline HObject exportList; ///< "export"
+    static inline HObject outputModelName;
+    static inline HObject batchSize;
+    static inline HObject epochs;
+    static inline HObject learningRate;
+    static inline HObject validationRatio;
+    static inline HObject hiddenLayerCount;
+    static inline HObject neuronsPerLayer;
+    static inline HObject activationFunction;
+    static inline HObject dropoutRatio;
+    static inline HObject principalShapesEnabled;
+    static inline HObject principalShapesLimit;
+    static inline HObject principalShapesAccuracy;
+    static inline HObject preloadData;
+    static inline HObject train;
+    static inline HObject controlValues;
+    static inline HObject targetGeometry;
+    static inline HObject targetMorphGeometry;
+    static inline HObject targetMorphEnabled;
+    static inline HObject targetMorphEnvelope;
+    static inline HObject poseGenerator;
+    static inline HObject deformerData;
 
 private:
     static void attributeChanged(int mask, HPlug& plug, HPlug& otherPlug, void* clientData);

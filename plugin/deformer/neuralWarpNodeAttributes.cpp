@@ -119,39 +119,6 @@ const HObject& filterInputGeometry() {
 
 } // namespace
 
-HObject neuralWarpNode::modelRoot;
-HObject neuralWarpNode::modelName;
-HObject neuralWarpNode::modelActive;
-HObject neuralWarpNode::models;
-HObject neuralWarpNode::trainingDataRoot;
-HObject neuralWarpNode::trainingDataName;
-HObject neuralWarpNode::deltaMode;
-HObject neuralWarpNode::smoothingIterations;
-HObject neuralWarpNode::exportStartFrame;
-HObject neuralWarpNode::exportEndFrame;
-HObject neuralWarpNode::exportList;
-HObject neuralWarpNode::outputModelName;
-HObject neuralWarpNode::batchSize;
-HObject neuralWarpNode::epochs;
-HObject neuralWarpNode::learningRate;
-HObject neuralWarpNode::validationRatio;
-HObject neuralWarpNode::hiddenLayerCount;
-HObject neuralWarpNode::neuronsPerLayer;
-HObject neuralWarpNode::activationFunction;
-HObject neuralWarpNode::dropoutRatio;
-HObject neuralWarpNode::principalShapesEnabled;
-HObject neuralWarpNode::principalShapesLimit;
-HObject neuralWarpNode::principalShapesAccuracy;
-HObject neuralWarpNode::preloadData;
-HObject neuralWarpNode::train;
-HObject neuralWarpNode::controlValues;
-HObject neuralWarpNode::targetGeometry;
-HObject neuralWarpNode::targetMorphGeometry;
-HObject neuralWarpNode::targetMorphEnabled;
-HObject neuralWarpNode::targetMorphEnvelope;
-HObject neuralWarpNode::poseGenerator;
-HObject neuralWarpNode::deformerData;
-
 HStatus neuralWarpNode::initialize() {
     modelRoot = makeString("modelRoot", "mlrt", true);
     modelName = makeString("modelName", "mlnm");

@@ -97,7 +97,9 @@ TEST(FrameSampler, PutsDrivenVerticesWhereTheFormulasSay) {
                 Points points = grid.rest, smoothed = grid.rest, result(2);
                 for (std::size_t v = 0; v < points.size(); ++v)
                     points[v].z = smoothed[v].z = points[v].x * points[v].y;
-                smoothPoints(smoothed, grid.model.rest, settings.smoothingIterations);
+                Points scratch;
+                grid.connections.mushArray(smoothed, scratch, static_cast<std::size_t>(settings.smoothingIterations),
+                                           1.0F, nullptr, &grid.weights, false);
                 ASSERT_EQ(sampler.place(result, points, outputs).fault, FrameFault::none);
                 EXPECT_EQ(points, smoothed);
                 std::vector<quill::mat4d> now;

@@ -52,6 +52,14 @@ TEST_F(FourControls, AnEnvelopeOfZeroTouchesNothing) {
     EXPECT_TRUE(rig.state(0)->modelPathDirty && rig.state(0)->indexMapDirty);
 }
 
+TEST_F(FourControls, AMorphBelowWhatCountsIsNotLookedFor) {
+    rig.setControls({1, 2, 3, 4});
+    rig.plug("targetMorphEnabled").setBool(true);
+    rig.plug("targetMorphEnvelope").setDouble(0.9e-6); // and there is no target
+    EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
+    EXPECT_TRUE(rig.state(0)->modelApplied);
+}
+
 /// What makes evaluations leave the controls unread.
 struct UnreadControls {
     const char* name;

@@ -99,6 +99,8 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
              t.rig->plug("export[0].smoothingIterations").setInt(3);
              nodeOf(*t.rig).setExportActive(0, true);
              t.rig->deform(0);
+             EXPECT_FALSE(t.rig->state(0)->modelApplied);
+             EXPECT_EQ(result(*t.rig), coordinates(warpRig::pointsOf(moved(1.0)))) << "it is left as it came";
              nodeOf(*t.rig).setExportActive(0, false);
          },
          none},

@@ -160,10 +160,8 @@ bool Scene::appliesModel(std::size_t geometry) const {
 }
 
 bool Scene::isForTheCpu(std::size_t geometry) const {
-    const GeometryWish& wish = all_[geometry].wish;
-    if (!wish.isModelOn)
-        return false;
-    return wish.deltaMode == 1 && state(geometry).vertexFrames.framesPairs().empty();
+    const neuralWarp::neuralWarpData& data = state(geometry);
+    return data.activeSettings.isSurface() && data.vertexFrames.framesPairs().empty();
 }
 
 std::map<std::string, std::uint64_t> Scene::launches(std::size_t geometry) const {
