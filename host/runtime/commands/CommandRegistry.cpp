@@ -2,7 +2,6 @@
 #include "commands/CommandRegistry.h"
 
 #include "commands/WordValues.h"
-#include "commands/builtins/builtins.h"
 #include "core/apiCall.h"
 
 #include <algorithm>
@@ -19,11 +18,7 @@ bool isCommandName(const std::string& name) {
 } // namespace
 
 CommandRegistry& CommandRegistry::instance() {
-    static CommandRegistry registry = [] {
-        CommandRegistry filled;
-        addBuiltins(filled);
-        return filled;
-    }();
+    static CommandRegistry registry;
     return registry;
 }
 

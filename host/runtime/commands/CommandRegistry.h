@@ -27,7 +27,7 @@ struct CommandType {
 /// Thread: main.
 class CommandRegistry {
 public:
-    /// The one of the process, with the host's own commands in it.
+    /// The one of the process; the first session brings the host's own commands (builtins/).
     static CommandRegistry& instance();
 
     /// Adds a command. Fails with kInvalidParameter for a name that is not a letter followed by letters, digits and

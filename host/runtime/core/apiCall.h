@@ -3,7 +3,7 @@
 // exceptions made statuses.
 #pragma once
 
-#include "faults/FaultPoints.h"
+#include "core/FaultPoints.h"
 #include "openquarn/HStatus.h"
 
 #include <exception>

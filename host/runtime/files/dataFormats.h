@@ -3,8 +3,8 @@
 #pragma once
 
 #include "files/json.h"
-#include "graph/Attribute.h"
-#include "graph/Data.h"
+#include "types/Attribute.h"
+#include "types/Data.h"
 
 #include <memory>
 #include <string>

@@ -4,10 +4,10 @@
 #include "files/json.h"
 #include "files/sceneText.h"
 #include "files/valueFiles.h"
-#include "graph/baseNodes.h"
 #include "graph/plugImpl.h"
 #include "graph/plugName.h"
 #include "services/SceneFileState.h"
+#include "types/baseNodes.h"
 
 #include <algorithm>
 #include <cmath>

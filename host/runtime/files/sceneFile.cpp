@@ -5,13 +5,13 @@
 #include "files/Rebasing.h"
 #include "files/json.h"
 #include "files/sceneText.h"
-#include "graph/baseNodes.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Workspace.h"
 #include "services/SceneFileState.h"
 #include "storage/FileError.h"
 #include "storage/WholeFile.h"
 #include "storage/readWholeFile.h"
+#include "types/baseNodes.h"
 
 #include <stdexcept>
 

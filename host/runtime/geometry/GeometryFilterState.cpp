@@ -2,7 +2,6 @@
 #include "geometry/GeometryFilterState.h"
 
 #include "geometry/filterAttributes.h"
-#include "gpu/GpuGeometry.h"
 #include "graph/arrayLock.h"
 #include "graph/values.h"
 
@@ -46,9 +45,6 @@ bool GeometrySources::sameAs(const GeometrySources& other) const {
 }
 
 // --- GeometryState ---
-
-GeometryState::GeometryState() = default;
-GeometryState::~GeometryState() = default;
 
 std::shared_ptr<const IndexMap> GeometryState::affectedVertices(const MeshData& mesh,
                                                                 const std::shared_ptr<Data>& expression) {
@@ -116,15 +112,15 @@ void GeometryFilterState::edited(Slot& slot) {
             element = outermostElement(slot);
     const std::scoped_lock lock(mutex_);
     for (const auto& [index, geometry] : geometries_)
-        if (geometry->gpu && (!element || element->index == index))
-            geometry->gpu->isPrimed = false;
+        if (geometry->onDevice && (!element || element->index == index))
+            geometry->onDevice->isPrimed = false;
 }
 
 void GeometryFilterState::takeFromDevice() {
-    std::vector<std::unique_ptr<GpuGeometry>> left; // without the lock: a plug-in's code may ask for a geometry
+    std::vector<std::unique_ptr<DeviceGeometry>> left; // without the lock: a plug-in's code may ask for a geometry
     const std::scoped_lock lock(mutex_);
     for (const auto& [index, geometry] : geometries_)
-        left.push_back(std::move(geometry->gpu));
+        left.push_back(std::move(geometry->onDevice));
 }
 
 void GeometryFilterState::connectionsChanged() {

@@ -2,6 +2,7 @@
 // What the host keeps of each geometry of a filter from one evaluation to the next.
 #pragma once
 
+#include "geometry/GeometryDevice.h"
 #include "geometry/IndexMap.h"
 #include "graph/Node.h"
 
@@ -10,8 +11,6 @@
 #include <vector>
 
 namespace OpenQuarn {
-
-class GpuGeometry;
 
 /// What a geometry's first state was built from: when it is no longer the same, the plug-in builds it anew.
 struct GeometrySources {
@@ -28,11 +27,6 @@ struct GeometrySources {
 /// Thread: the one that evaluates the geometry, or main; affectedVertices() any.
 class GeometryState {
 public:
-    GeometryState();
-    ~GeometryState();
-    GeometryState(const GeometryState&) = delete;
-    GeometryState& operator=(const GeometryState&) = delete;
-
     /// The vertices that an expression (text data, or null) stands for on a mesh; the last answer is kept. Null when
     /// there is no such component tag.
     std::shared_ptr<const IndexMap> affectedVertices(const MeshData& mesh, const std::shared_ptr<Data>& expression);
@@ -50,7 +44,7 @@ public:
     std::uint64_t weightsVersion() const { return weightsVersion_; }
 
     const std::shared_ptr<PositionPool> pool = std::make_shared<PositionPool>();
-    std::unique_ptr<GpuGeometry> gpu; ///< null: not evaluated yet since the pipeline is on
+    std::unique_ptr<DeviceGeometry> onDevice; ///< null: not evaluated yet since the device is on
 
 private:
     std::mutex mutex_; // of the three below

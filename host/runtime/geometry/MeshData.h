@@ -3,10 +3,10 @@
 #pragma once
 
 #include "geometry/Positions.h"
-#include "graph/Data.h"
 #include "openquarn/HIntArray.h"
 #include "openquarn/HPointArray.h"
 #include "openquarn/HUintArray.h"
+#include "types/Data.h"
 
 #include <map>
 #include <memory>

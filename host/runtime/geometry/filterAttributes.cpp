@@ -2,8 +2,8 @@
 #include "geometry/filterAttributes.h"
 
 #include "geometry/GeometryFilterState.h"
-#include "graph/baseNodes.h"
 #include "openquarn/HPxDeformerNode.h"
+#include "types/baseNodes.h"
 
 namespace OpenQuarn {
 namespace {

@@ -2,7 +2,7 @@
 // The attributes and classes of the nodes that hold and deform geometry.
 #pragma once
 
-#include "graph/NodeClass.h"
+#include "types/NodeClass.h"
 
 namespace OpenQuarn {
 

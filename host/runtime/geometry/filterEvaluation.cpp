@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "geometry/filterEvaluation.h"
 
+#include "geometry/GeometryDevice.h"
 #include "geometry/GeometryPoints.h"
 #include "geometry/filterAttributes.h"
-#include "gpu/pipeline.h"
 #include "graph/Context.h"
 #include "graph/evaluation.h"
 #include "graph/values.h"
@@ -127,6 +127,28 @@ std::optional<GeometrySources> sourcesOf(const NodeData& data, unsigned index, c
 
 namespace {
 
+thread_local int withoutDevice = 0;
+
+/// Has everything on this thread evaluated on the CPU, for as long as it lives.
+class CpuOnly {
+public:
+    explicit CpuOnly(bool on)
+        : count_(on ? 1 : 0) {
+        withoutDevice += count_;
+    }
+    ~CpuOnly() { withoutDevice -= count_; }
+    CpuOnly(const CpuOnly&) = delete;
+    CpuOnly& operator=(const CpuOnly&) = delete;
+
+private:
+    int count_;
+};
+
+/// Null for none: contexts are evaluated on the CPU.
+GeometryDevice* deviceFor(const NodeData& data) {
+    return data.context ? nullptr : GeometryDevice::current();
+}
+
 HStatus evaluateOnCpu(HPxGeometryFilter& filter, NodeData& data, HDataBlock& block, Slot& output, bool deviceFailed) {
     const CpuOnly cpuOnly(deviceFailed);
     const FilterAttributes& attributes = filterAttributes();
@@ -139,7 +161,8 @@ HStatus evaluateOnCpu(HPxGeometryFilter& filter, NodeData& data, HDataBlock& blo
         return HStatus::kSuccess;
     }
     HStatus status = Evaluation(filter, data, block, index).run(*input, mesh, output);
-    evaluatedOnCpu(data, block, index, status, deviceFailed);
+    if (GeometryDevice* device = deviceFor(data))
+        device->evaluatedOnCpu(data, block, index, status, deviceFailed);
     return status;
 }
 
@@ -152,7 +175,8 @@ HStatus evaluateGeometry(HPxGeometryFilter& filter, NodeData& data, HDataBlock& 
         return {HStatus::kFailure, "'" + data.node.name() + ".outputGeom[" + std::to_string(index) + "]' is not there"};
     bool deviceFailed = false;
     HStatus status;
-    if (const std::shared_ptr<MeshData> deformed = evaluateOnDevice(data, index, deviceFailed))
+    GeometryDevice* device = withoutDevice == 0 ? deviceFor(data) : nullptr;
+    if (const std::shared_ptr<MeshData> deformed = device ? device->evaluate(data, index, deviceFailed) : nullptr)
         output->data = deformed;
     else
         status = evaluateOnCpu(filter, data, block, *output, deviceFailed);

@@ -48,7 +48,7 @@ std::optional<Link> linkOf(NodeData& data, unsigned index) {
     link.state = filterStateOf(data).geometry(index);
     link.input = elementOf(data, *attributes.input, index);
     link.output = elementOf(data, *attributes.outputGeom, index);
-    if (!link.input || !link.output || !link.state->gpu || !link.state->gpu->isPrimed)
+    if (!link.input || !link.output || !link.state->onDevice || !link.state->onDevice->isPrimed)
         return {};
     link.geometry = childOf(*link.input, *attributes.inputGeometry);
     if (primingValues(data, index) != link.gpu().primedValues || isDueOnCpu(data, index))
@@ -112,7 +112,7 @@ bool dropUnfit(Chain& chain) {
 } // namespace
 
 GpuGeometry& Link::gpu() const {
-    return *state->gpu;
+    return static_cast<GpuGeometry&>(*state->onDevice); // nobody else makes one
 }
 
 std::optional<Chain> findChain(NodeData& data, unsigned index) {

@@ -2,7 +2,7 @@
 // What the pipeline keeps of one geometry whose node type has a GPU deformer.
 #pragma once
 
-#include "geometry/MeshData.h"
+#include "geometry/GeometryDevice.h"
 #include "gpu/Device.h"
 #include "openquarn/HObjectArray.h"
 #include "openquarn/gpu/HGPUDeformerData.h"
@@ -35,16 +35,14 @@ struct DeformerTraits {
     bool isGeometryFilter = true;
 };
 
-/// Thread: as GeometryState; the destructor where no evaluation is going on.
-class GpuGeometry {
+/// The destructor runs where no evaluation is going on.
+class GpuGeometry final : public DeviceGeometry {
 public:
     /// `node` whose geometry it is; outlives this.
     GpuGeometry(HGPUDeformerRegistrationInfo& registration, const Node& node)
         : info(registration)
         , node_(node) {}
-    ~GpuGeometry() { leaveDevice(); }
-    GpuGeometry(const GpuGeometry&) = delete;
-    GpuGeometry& operator=(const GpuGeometry&) = delete;
+    ~GpuGeometry() override { leaveDevice(); }
 
     /// Makes the deformer, unless it is there and its buffers are on that device. False when the plug-in makes none.
     bool enterDevice(const std::shared_ptr<Device>& onto);
@@ -54,9 +52,7 @@ public:
     HGPUDeformerRegistrationInfo& info;
     DeformerTraits traits;
 
-    /// The last evaluation on the CPU succeeded, and nothing has changed since but what comes along connections.
-    bool isPrimed = false;
-    /// Numbers of the priming attributes in that evaluation; none for a plug that is not there.
+    /// Numbers of the priming attributes in the last evaluation on the CPU; none for a plug that is not there.
     std::vector<std::optional<double>> primedValues;
     /// The user has been told that the device is not used, and why.
     bool isFailing = false;

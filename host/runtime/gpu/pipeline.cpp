@@ -4,6 +4,7 @@
 #include "core/threads.h"
 #include "geometry/filterAttributes.h"
 #include "gpu/Chain.h"
+#include "gpu/GPUDeformers.h"
 #include "gpu/activity.h"
 #include "gpu/chainRun.h"
 #include "gpu/failure.h"
@@ -12,7 +13,6 @@
 #include "openquarn/HPxGeometryFilter.h"
 #include "openquarn_app/Gpu.h"
 #include "openquarn_app/Messages.h"
-#include "plugins/GPUDeformers.h"
 
 #include <atomic>
 #include <utility>
@@ -20,14 +20,8 @@
 namespace OpenQuarn {
 namespace {
 
-std::atomic<bool> isOn{false};
 // the user has been told that there is no device
 std::atomic<bool> saidNoDevice{false};
-thread_local int cpuOnly = 0;
-
-bool mayUseDevice(const NodeData& data) {
-    return isOn.load(std::memory_order_relaxed) && cpuOnly == 0 && !data.context;
-}
 
 void sayOnce(GpuGeometry& gpu, const Slot& output, const std::string& reason) {
     if (!gpu.isFailing)
@@ -102,23 +96,17 @@ bool isAccepted(GpuGeometry& gpu, const NodeData& data, HDataBlock& block, const
     return isAccepted && gpu.traits.output == HPxGeometryFilter::outputGeom;
 }
 
-} // namespace
+class Pipeline final : public GeometryDevice {
+public:
+    std::shared_ptr<MeshData> evaluate(NodeData& data, unsigned index, bool& failed) override;
+    void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HStatus& status,
+                        bool isFallback) override;
+};
 
-CpuOnly::CpuOnly(bool on)
-    : on_(on) {
-    if (on_)
-        ++cpuOnly;
-}
+constinit Pipeline pipeline;
 
-CpuOnly::~CpuOnly() {
-    if (on_)
-        --cpuOnly;
-}
-
-std::shared_ptr<MeshData> evaluateOnDevice(NodeData& data, unsigned index, bool& failed) {
+std::shared_ptr<MeshData> Pipeline::evaluate(NodeData& data, unsigned index, bool& failed) {
     failed = false;
-    if (!mayUseDevice(data))
-        return nullptr;
     std::optional<Chain> chain = findChain(data, index);
     if (!chain)
         return nullptr;
@@ -135,17 +123,16 @@ std::shared_ptr<MeshData> evaluateOnDevice(NodeData& data, unsigned index, bool&
     return mesh;
 }
 
-void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HStatus& status, bool isFallback) {
-    if (!isOn.load(std::memory_order_relaxed) || data.context)
-        return;
+void Pipeline::evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HStatus& status,
+                              bool isFallback) {
     HGPUDeformerRegistrationInfo* info = findGPUDeformer(data.node.type().name);
     if (!info)
         return;
     countEvaluation(false, isFallback);
     GeometryState& state = *filterStateOf(data).geometry(index);
-    if (!state.gpu)
-        state.gpu = std::make_unique<GpuGeometry>(*info, data.node);
-    GpuGeometry& gpu = *state.gpu;
+    if (!state.onDevice)
+        state.onDevice = std::make_unique<GpuGeometry>(*info, data.node);
+    auto& gpu = static_cast<GpuGeometry&>(*state.onDevice);
     gpu.isPrimed = false;
     if (status.error())
         return;
@@ -156,6 +143,8 @@ void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HSt
     if (!refusal.empty())
         sayOnce(gpu, *output, refusal);
 }
+
+} // namespace
 
 void takeFromDevice(const std::string& nodeType) {
     Graph* graph = Graph::current();
@@ -171,12 +160,12 @@ void Gpu::setEnabled(bool enabled) {
         return;
     if (!enabled)
         takeFromDevice("");
-    isOn = enabled;
+    GeometryDevice::setCurrent(enabled ? &pipeline : nullptr);
     saidNoDevice = false;
 }
 
 bool Gpu::isEnabled() noexcept {
-    return isOn;
+    return GeometryDevice::current() != nullptr;
 }
 
 } // namespace OpenQuarn

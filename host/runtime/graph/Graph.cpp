@@ -2,9 +2,9 @@
 #include "graph/Graph.h"
 
 #include "core/text.h"
-#include "graph/baseNodes.h"
 #include "graph/dirty.h"
 #include "graph/plugImpl.h"
+#include "types/baseNodes.h"
 
 #include <algorithm>
 #include <stdexcept>

@@ -2,9 +2,9 @@
 // A node of the scene.
 #pragma once
 
-#include "graph/NodeClass.h"
 #include "graph/Slot.h"
 #include "openquarn/HNodeMessage.h"
+#include "types/NodeClass.h"
 
 #include <atomic>
 #include <memory>

@@ -2,8 +2,8 @@
 // The place of one value: of an attribute on a node, of an element of an array, of a child of a compound.
 #pragma once
 
-#include "graph/Attribute.h"
 #include "graph/SparseArray.h"
+#include "types/Attribute.h"
 
 #include <atomic>
 #include <cstdint>

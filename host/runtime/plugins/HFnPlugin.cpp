@@ -4,9 +4,9 @@
 #include "core/apiCall.h"
 #include "core/text.h"
 #include "core/threads.h"
-#include "graph/baseNodes.h"
 #include "plugins/Library.h"
 #include "plugins/Plugin.h"
+#include "types/baseNodes.h"
 
 #include <filesystem>
 #include <string_view>

@@ -2,7 +2,7 @@
 #include "openquarn/gpu/HGPUDeformerRegistry.h"
 
 #include "core/apiCall.h"
-#include "plugins/GPUDeformers.h"
+#include "gpu/GPUDeformers.h"
 #include "plugins/PluginTable.h"
 
 #include <stdexcept>

@@ -3,10 +3,10 @@
 
 #include "commands/CommandRegistry.h"
 #include "core/text.h"
-#include "graph/Data.h"
+#include "gpu/GPUDeformers.h"
 #include "graph/Graph.h"
-#include "graph/baseNodes.h"
-#include "plugins/GPUDeformers.h"
+#include "types/Data.h"
+#include "types/baseNodes.h"
 
 #include <algorithm>
 #include <iterator>

@@ -2,7 +2,7 @@
 #include "openquarn_app/NodeTypes.h"
 
 #include "core/threads.h"
-#include "graph/NodeClass.h"
+#include "types/NodeClass.h"
 
 #include <stdexcept>
 

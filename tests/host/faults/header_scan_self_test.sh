@@ -6,7 +6,7 @@ here=$(cd "$(dirname "$0")" && pwd)
 tree=$(mktemp -d)
 trap 'rm -rf "$tree"' EXIT
 failed=0
-mkdir -p "$tree/host/api/openquarn/gpu" "$tree/host/runtime/faults"
+mkdir -p "$tree/host/api/openquarn/gpu" "$tree/host/runtime/core/faults"
 
 write_tree() {
   cat >"$tree/host/api/openquarn/HThing.h" <<'HEADER'
@@ -46,7 +46,7 @@ public:
     static HStatus open() noexcept; ///< [any]
 };
 HEADER
-  cat >"$tree/host/runtime/faults/thing.def" <<'TABLE'
+  cat >"$tree/host/runtime/core/faults/thing.def" <<'TABLE'
 FAULT_POINT(HThing, change, main)
 FAULT_POINT(HThing, value, eval)
 FAULT_POINT(HThing, other, eval)
@@ -104,7 +104,7 @@ plant() {
 }
 
 header=api/openquarn/HThing.h
-table=runtime/faults/thing.def
+table=runtime/core/faults/thing.def
 plant '' $header ''
 plant 'HThing::planted can fail and has no fault point' $header 's/^    HThing();/&\n    HStatus planted(int number);/'
 plant 'HThing::planted can fail and has no fault point' $header 's/^    HThing();/&\n    HObject planted(int a,\n    HStatus* status = nullptr);/'
