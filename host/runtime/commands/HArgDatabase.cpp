@@ -8,15 +8,15 @@
 #include "openquarn/HSelectionList.h"
 
 using OpenQuarn::Access;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 HArgDatabase::HArgDatabase(const HSyntax& syntax, const HArgList& args, HStatus* status)
-    : HArgParser(OpenQuarn::apiValue(FaultPoint::HArgDatabase_HArgDatabase, status,
+    : HArgParser(OpenQuarn::apiValue(Operation::HArgDatabase_HArgDatabase, status,
                                      std::shared_ptr<const OpenQuarn::ParsedArgs>(),
                                      [&](HStatus& outcome) { return OpenQuarn::parseArgs(syntax, args, outcome); })) {}
 
 HStatus HArgDatabase::getCommandArgument(unsigned index, HSelectionList& result) const {
-    return OpenQuarn::apiCall(FaultPoint::HArgDatabase_getCommandArgument, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HArgDatabase_getCommandArgument, [&]() -> HStatus {
         const auto& parsed = Access::impl(static_cast<const HArgParser&>(*this));
         if (!parsed || index >= parsed->args.length())
             return {HStatus::kFailure, "there is no argument " + std::to_string(index)};

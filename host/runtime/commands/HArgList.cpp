@@ -4,12 +4,12 @@
 #include "commands/WordValues.h"
 #include "core/apiCall.h"
 
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
 template <class Value, class Words>
-Value wordAt(FaultPoint point, const Words& words, unsigned index, HStatus* status) {
+Value wordAt(Operation point, const Words& words, unsigned index, HStatus* status) {
     return OpenQuarn::apiValue(point, status, Value{}, [&](HStatus& outcome) {
         Value value{};
         if (index < words.size())
@@ -24,19 +24,19 @@ Value wordAt(FaultPoint point, const Words& words, unsigned index, HStatus* stat
 } // namespace
 
 HString HArgList::asString(unsigned index, HStatus* status) const {
-    return wordAt<HString>(FaultPoint::HArgList_asString, impl_, index, status);
+    return wordAt<HString>(Operation::HArgList_asString, impl_, index, status);
 }
 
 int HArgList::asInt(unsigned index, HStatus* status) const {
-    return wordAt<int>(FaultPoint::HArgList_asInt, impl_, index, status);
+    return wordAt<int>(Operation::HArgList_asInt, impl_, index, status);
 }
 
 double HArgList::asDouble(unsigned index, HStatus* status) const {
-    return wordAt<double>(FaultPoint::HArgList_asDouble, impl_, index, status);
+    return wordAt<double>(Operation::HArgList_asDouble, impl_, index, status);
 }
 
 bool HArgList::asBool(unsigned index, HStatus* status) const {
-    return wordAt<bool>(FaultPoint::HArgList_asBool, impl_, index, status);
+    return wordAt<bool>(Operation::HArgList_asBool, impl_, index, status);
 }
 
 void HArgList::addArg(const HString& word) {

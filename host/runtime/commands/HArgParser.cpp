@@ -10,7 +10,7 @@
 
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 using OpenQuarn::ParsedArgs;
 using ParsedPointer = std::shared_ptr<const ParsedArgs>;
 
@@ -48,7 +48,7 @@ HStatus readFrom(const HArgList& args, unsigned index, Value& result) {
 
 template <class Value>
 HStatus readFlag(const ParsedPointer& parsed, const HString& flag, unsigned index, Value& result) {
-    return apiCall(FaultPoint::HArgParser_getFlagArgument, [&]() -> HStatus {
+    return apiCall(Operation::HArgParser_getFlagArgument, [&]() -> HStatus {
         const OpenQuarn::FlagUse* use = nullptr;
         if (HStatus status = findUse(parsed, flag, 0, use); status.error())
             return status;
@@ -58,12 +58,12 @@ HStatus readFlag(const ParsedPointer& parsed, const HString& flag, unsigned inde
 
 template <class Value>
 HStatus readArgument(const ParsedPointer& parsed, unsigned index, Value& result) {
-    return apiCall(FaultPoint::HArgParser_getCommandArgument,
+    return apiCall(Operation::HArgParser_getCommandArgument,
                    [&]() { return parsed ? readFrom(parsed->args, index, result) : notParsed(); });
 }
 
 template <class Value>
-Value argumentValue(FaultPoint point, const ParsedPointer& parsed, unsigned index, HStatus* status) {
+Value argumentValue(Operation point, const ParsedPointer& parsed, unsigned index, HStatus* status) {
     return apiValue(point, status, Value{}, [&](HStatus& outcome) {
         Value value{};
         outcome = parsed ? readFrom(parsed->args, index, value) : notParsed();
@@ -74,14 +74,14 @@ Value argumentValue(FaultPoint point, const ParsedPointer& parsed, unsigned inde
 } // namespace
 
 HArgParser::HArgParser(const HSyntax& syntax, const HArgList& args, HStatus* status)
-    : impl_(apiValue(FaultPoint::HArgParser_HArgParser, status, ParsedPointer(),
+    : impl_(apiValue(Operation::HArgParser_HArgParser, status, ParsedPointer(),
                      [&](HStatus& outcome) { return OpenQuarn::parseArgs(syntax, args, outcome); })) {}
 HArgParser::HArgParser(std::shared_ptr<const OpenQuarn::ParsedArgs> parsed) noexcept
     : impl_(std::move(parsed)) {}
 HArgParser::~HArgParser() = default;
 
 bool HArgParser::isFlagSet(const HString& flag, HStatus* status) const {
-    return apiValue(FaultPoint::HArgParser_isFlagSet, status, false, [&](HStatus& outcome) {
+    return apiValue(Operation::HArgParser_isFlagSet, status, false, [&](HStatus& outcome) {
         if (!impl_)
             outcome = notParsed();
         else if (OpenQuarn::flagIndex(impl_->syntax, flag.asStdString()) == OpenQuarn::noFlag)
@@ -128,7 +128,7 @@ HStatus HArgParser::getFlagArgument(const HString& flag, unsigned index, HString
 }
 
 HStatus HArgParser::getFlagArgumentList(const HString& flag, unsigned use, HArgList& result) const {
-    return apiCall(FaultPoint::HArgParser_getFlagArgumentList, [&]() -> HStatus {
+    return apiCall(Operation::HArgParser_getFlagArgumentList, [&]() -> HStatus {
         const OpenQuarn::FlagUse* found = nullptr;
         HStatus status = findUse(impl_, flag, use, found);
         if (!status.error())
@@ -138,16 +138,16 @@ HStatus HArgParser::getFlagArgumentList(const HString& flag, unsigned use, HArgL
 }
 
 HString HArgParser::commandArgumentString(unsigned index, HStatus* status) const {
-    return argumentValue<HString>(FaultPoint::HArgParser_commandArgumentString, impl_, index, status);
+    return argumentValue<HString>(Operation::HArgParser_commandArgumentString, impl_, index, status);
 }
 int HArgParser::commandArgumentInt(unsigned index, HStatus* status) const {
-    return argumentValue<int>(FaultPoint::HArgParser_commandArgumentInt, impl_, index, status);
+    return argumentValue<int>(Operation::HArgParser_commandArgumentInt, impl_, index, status);
 }
 double HArgParser::commandArgumentDouble(unsigned index, HStatus* status) const {
-    return argumentValue<double>(FaultPoint::HArgParser_commandArgumentDouble, impl_, index, status);
+    return argumentValue<double>(Operation::HArgParser_commandArgumentDouble, impl_, index, status);
 }
 bool HArgParser::commandArgumentBool(unsigned index, HStatus* status) const {
-    return argumentValue<bool>(FaultPoint::HArgParser_commandArgumentBool, impl_, index, status);
+    return argumentValue<bool>(Operation::HArgParser_commandArgumentBool, impl_, index, status);
 }
 
 HStatus HArgParser::getCommandArgument(unsigned index, bool& result) const {
@@ -167,7 +167,7 @@ HStatus HArgParser::getCommandArgument(unsigned index, HString& result) const {
 }
 
 HStatus HArgParser::getObjects(HArgList& result) const {
-    return apiCall(FaultPoint::HArgParser_getObjects, [&]() -> HStatus {
+    return apiCall(Operation::HArgParser_getObjects, [&]() -> HStatus {
         if (!impl_)
             return notParsed();
         result = impl_->objects;

@@ -3,16 +3,14 @@
 
 #include "commands/Results.h"
 #include "core/apiCall.h"
-#include "core/threads.h"
 
 #include <algorithm>
 #include <limits>
 #include <optional>
 
 using OpenQuarn::CommandValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -83,7 +81,7 @@ bool read(const CommandValue& value, HStringArray& result) {
 
 template <class Result>
 HStatus readResult(const CommandValue& value, HCommandResult::Type wanted, Result& result) {
-    return OpenQuarn::apiCall(FaultPoint::HCommandResult_getResult, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HCommandResult_getResult, [&]() -> HStatus {
         if (read(value, result))
             return {};
         const std::string shown = std::get_if<long long>(&value) ? " (" + OpenQuarn::printedValue(value) + ")" : "";
@@ -106,7 +104,7 @@ HCommandResult& HCommandResult::operator=(const HCommandResult& other) {
 }
 
 HCommandResult::Type HCommandResult::resultType() const noexcept {
-    return isRefused(ThreadTag::main, "HCommandResult::resultType") ? kInvalid : OpenQuarn::kindOf(impl_->value);
+    return isRefused(Operation::HCommandResult_resultType) ? kInvalid : OpenQuarn::kindOf(impl_->value);
 }
 
 HStatus HCommandResult::getResult(int& result) const {

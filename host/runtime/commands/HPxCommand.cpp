@@ -2,12 +2,12 @@
 #include "openquarn/HPxCommand.h"
 
 #include "commands/CommandRegistry.h"
-#include "core/threads.h"
+#include "core/Operations.h"
 #include "openquarn/HString.h"
 #include "openquarn_app/Messages.h"
 
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 HPxCommand::HPxCommand() noexcept = default;
 HPxCommand::~HPxCommand() = default;
@@ -29,7 +29,7 @@ bool HPxCommand::hasSyntax() const {
 }
 
 HSyntax HPxCommand::syntax() const {
-    return !isRefused(ThreadTag::main, "HPxCommand::syntax") && hasSyntax() ? *impl_->syntax : HSyntax();
+    return !isRefused(Operation::HPxCommand_syntax) && hasSyntax() ? *impl_->syntax : HSyntax();
 }
 
 void HPxCommand::displayError(const HString& text) noexcept {

@@ -121,7 +121,7 @@ std::string describeSyntax(const Syntax& syntax) {
 } // namespace OpenQuarn
 
 using OpenQuarn::apiCall;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 HSyntax::HSyntax()
     : impl_(std::make_unique<OpenQuarn::Syntax>()) {}
@@ -135,7 +135,7 @@ HSyntax& HSyntax::operator=(const HSyntax& other) {
 
 HStatus HSyntax::addFlag(const HString& shortName, const HString& longName, ArgType argType1, ArgType argType2,
                          ArgType argType3, ArgType argType4, ArgType argType5, ArgType argType6) {
-    return apiCall(FaultPoint::HSyntax_addFlag, [&]() -> HStatus {
+    return apiCall(Operation::HSyntax_addFlag, [&]() -> HStatus {
         OpenQuarn::SyntaxFlag flag{std::string(OpenQuarn::withoutDash(shortName.asStdString())),
                                    std::string(OpenQuarn::withoutDash(longName.asStdString())),
                                    {},
@@ -146,7 +146,7 @@ HStatus HSyntax::addFlag(const HString& shortName, const HString& longName, ArgT
 }
 
 HStatus HSyntax::makeFlagMultiUse(const HString& flag) {
-    return apiCall(FaultPoint::HSyntax_makeFlagMultiUse, [&]() -> HStatus {
+    return apiCall(Operation::HSyntax_makeFlagMultiUse, [&]() -> HStatus {
         const std::size_t index = OpenQuarn::flagIndex(*impl_, flag.asStdString());
         if (index == OpenQuarn::noFlag)
             return {HStatus::kInvalidParameter, "there is no flag " + OpenQuarn::inQuotes(flag.asStdString())};
@@ -156,7 +156,7 @@ HStatus HSyntax::makeFlagMultiUse(const HString& flag) {
 }
 
 HStatus HSyntax::addArg(ArgType type) {
-    return apiCall(FaultPoint::HSyntax_addArg, [&]() -> HStatus {
+    return apiCall(Operation::HSyntax_addArg, [&]() -> HStatus {
         if (!OpenQuarn::argTypeName(type))
             return {HStatus::kInvalidParameter, "an argument of no known type"};
         impl_->args.push_back(type);
@@ -165,7 +165,7 @@ HStatus HSyntax::addArg(ArgType type) {
 }
 
 HStatus HSyntax::setObjectType(ObjectFormat format, unsigned minimum, unsigned maximum) {
-    return apiCall(FaultPoint::HSyntax_setObjectType, [&]() -> HStatus {
+    return apiCall(Operation::HSyntax_setObjectType, [&]() -> HStatus {
         if (minimum > maximum)
             return {HStatus::kInvalidParameter, "at least " + std::to_string(minimum) + " objects and at most " +
                                                     std::to_string(maximum) + " leave no number of them"};

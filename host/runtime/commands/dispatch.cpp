@@ -75,7 +75,7 @@ HStatus run(const std::vector<ScriptWord>& words, CommandValue& result) {
 HStatus dispatch(const std::vector<ScriptWord>& words, CommandValue& result) noexcept {
     try {
         result = std::monostate();
-        if (HStatus refused = threadStatus(ThreadTag::main, "running a command"); refused.error())
+        if (HStatus refused = threadStatus({"running a command", ThreadTag::main}); refused.error())
             return refused;
         return run(words, result);
     } catch (...) {

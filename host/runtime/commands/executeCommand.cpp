@@ -8,7 +8,7 @@
 #include "openquarn_app/Messages.h"
 
 using OpenQuarn::CommandValue;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -31,7 +31,7 @@ void show(const std::string& line, const CommandValue& result) {
 }
 
 HStatus execute(const HString& command, CommandValue& result, bool displayEnabled) {
-    return OpenQuarn::apiCall(FaultPoint::HGlobal_executeCommand, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HGlobal_executeCommand, [&]() -> HStatus {
         HStatus status = runLine(command.asStdString(), result);
         if (!status.error() && displayEnabled)
             show(command.asStdString(), result);

@@ -2,17 +2,15 @@
 // The static functions of HPxCommand that make the result of the running command.
 #include "commands/Results.h"
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "openquarn/HPxCommand.h"
 
 #include <algorithm>
 #include <iterator>
 
 using OpenQuarn::CommandValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::isRefused;
+using OpenQuarn::Operation;
 using OpenQuarn::RunningResult;
-using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -21,7 +19,7 @@ HStatus noneRuns() {
 }
 
 HStatus set(const std::function<CommandValue()>& made) {
-    return OpenQuarn::apiCall(FaultPoint::HPxCommand_setResult, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HPxCommand_setResult, [&]() -> HStatus {
         CommandValue* result = RunningResult::current();
         if (!result)
             return noneRuns();
@@ -70,7 +68,7 @@ bool appendAll(std::vector<Items>* to, const Array& items) {
 
 template <class Append>
 HStatus append(const char* kind, Append&& appendTo) {
-    return OpenQuarn::apiCall(FaultPoint::HPxCommand_appendToResult, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HPxCommand_appendToResult, [&]() -> HStatus {
         CommandValue* result = RunningResult::current();
         if (!result)
             return noneRuns();
@@ -91,7 +89,7 @@ bool appendOne(std::vector<Item>* to, Item item) {
 } // namespace
 
 void HPxCommand::clearResult() noexcept {
-    if (isRefused(ThreadTag::main, "HPxCommand::clearResult"))
+    if (isRefused(Operation::HPxCommand_clearResult))
         return;
     if (CommandValue* result = RunningResult::current())
         *result = std::monostate();
@@ -150,7 +148,7 @@ HStatus HPxCommand::appendToResult(const HStringArray& values) {
 }
 
 HCommandResult::Type HPxCommand::currentResultType() noexcept {
-    if (isRefused(ThreadTag::main, "HPxCommand::currentResultType"))
+    if (isRefused(Operation::HPxCommand_currentResultType))
         return HCommandResult::kInvalid;
     const CommandValue* result = RunningResult::current();
     return result ? OpenQuarn::kindOf(*result) : HCommandResult::kInvalid;

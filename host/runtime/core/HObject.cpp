@@ -25,7 +25,7 @@ bool HObject::hasFn(HFn::Type type) const noexcept {
 HFnBase::~HFnBase() = default;
 
 HStatus HFnBase::setObject(const HObject& object) {
-    return OpenQuarn::apiCall(OpenQuarn::FaultPoint::HFnBase_setObject, [&]() -> HStatus {
+    return OpenQuarn::apiCall(OpenQuarn::Operation::HFnBase_setObject, [&]() -> HStatus {
         object_ = object.hasFn(type()) ? object : HObject::kNullObj;
         if (object_.isNull())
             return {HStatus::kInvalidParameter,

@@ -24,13 +24,13 @@ const char* brokenRule(ThreadTag tag) noexcept {
     return isMainThread() ? "during an evaluation" : "on another thread than the main one";
 }
 
-std::string sentence(ThreadTag tag, const char* function) {
-    return std::string(function) + " was called " + brokenRule(tag);
+std::string sentence(const HostCall& call) {
+    return std::string(call.name) + " was called " + brokenRule(call.tag);
 }
 
-void endDebugBuild([[maybe_unused]] ThreadTag tag, [[maybe_unused]] const char* function) noexcept {
+void endDebugBuild([[maybe_unused]] const HostCall& call) noexcept {
 #ifndef NDEBUG
-    std::fprintf(stderr, "OpenQuarn: %s was called %s\n", function, brokenRule(tag));
+    std::fprintf(stderr, "OpenQuarn: %s was called %s\n", call.name, brokenRule(call.tag));
     std::abort();
 #endif
 }
@@ -51,25 +51,25 @@ void setMainThread() {
     said.clear();
 }
 
-HStatus misuse(ThreadTag tag, const char* function) noexcept {
-    endDebugBuild(tag, function);
+HStatus misuse(const HostCall& call) noexcept {
+    endDebugBuild(call);
     try {
-        return {HStatus::kFailure, sentence(tag, function)};
+        return {HStatus::kFailure, sentence(call)};
     } catch (...) {
         return HStatus::kFailure;
     }
 }
 
-void requireThread(ThreadTag tag, const char* function) {
-    if (const HStatus refused = threadStatus(tag, function); refused.error())
+void requireThread(const HostCall& call) {
+    if (const HStatus refused = threadStatus(call); refused.error())
         throw std::runtime_error(refused.errorString().asStdString());
 }
 
-void showMisuse(ThreadTag tag, const char* function) noexcept {
-    endDebugBuild(tag, function);
+void showMisuse(const HostCall& call) noexcept {
+    endDebugBuild(call);
     try {
-        if (isNewToTheUser(function))
-            showMessage(Severity::error, sentence(tag, function));
+        if (isNewToTheUser(call.name))
+            showMessage(Severity::error, sentence(call));
     } catch (...) {
         showMessage(Severity::error, "a function of the host was called on a thread that may not call it");
     }

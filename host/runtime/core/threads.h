@@ -15,6 +15,12 @@ enum class ThreadTag : unsigned char {
     eval, ///< the main thread, or a thread inside an evaluation
 };
 
+/// A function of the host as its callers know it, and where they may call it.
+struct HostCall {
+    const char* name;
+    ThreadTag tag;
+};
+
 /// What a thread does for the host.
 enum class ThreadWork : unsigned char {
     none,
@@ -62,25 +68,25 @@ private:
 // debug build ends with it instead.
 
 /// Of a call that the thread may not make: kFailure with the sentence.
-HStatus misuse(ThreadTag tag, const char* function) noexcept;
+HStatus misuse(const HostCall& call) noexcept;
 
 /// Success when the thread may make the call.
-inline HStatus threadStatus(ThreadTag tag, const char* function) noexcept {
-    return mayCall(tag) ? HStatus() : misuse(tag, function);
+inline HStatus threadStatus(const HostCall& call) noexcept {
+    return mayCall(call.tag) ? HStatus() : misuse(call);
 }
 
 /// For a function that throws: std::runtime_error with the sentence when the thread may not make the call.
-void requireThread(ThreadTag tag, const char* function);
+void requireThread(const HostCall& call);
 
 /// Shows the sentence as an error, once for each function and session.
-void showMisuse(ThreadTag tag, const char* function) noexcept;
+void showMisuse(const HostCall& call) noexcept;
 
 /// For a function that has no way to say so: true when the thread may not make the call, which the user is told. It
 /// then gives what it gives for a null object.
-inline bool isRefused(ThreadTag tag, const char* function) noexcept {
-    if (mayCall(tag))
+inline bool isRefused(const HostCall& call) noexcept {
+    if (mayCall(call.tag))
         return false;
-    showMisuse(tag, function);
+    showMisuse(call);
     return true;
 }
 

@@ -48,7 +48,7 @@ FileOutcome fileOperation(const std::string& fileName, Work&& work) {
 template <class Work>
 FileOutcome sceneOperation(const char* function, const std::string& fileName, Work&& work) {
     return fileOperation(fileName, [&](Warnings& warnings) {
-        requireThread(ThreadTag::main, function);
+        requireThread({function, ThreadTag::main});
         work(warnings);
     });
 }

@@ -2,7 +2,6 @@
 #include "openquarn/HFnMesh.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "geometry/MeshData.h"
 #include "graph/Context.h"
 #include "graph/evaluation.h"
@@ -13,10 +12,9 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::MeshData;
+using OpenQuarn::Operation;
 using OpenQuarn::threadStatus;
-using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -26,7 +24,7 @@ HStatus noMesh() {
 
 /// Runs `read` on the mesh that a set is attached to.
 template <class Read>
-HStatus withMesh(FaultPoint point, const HObject& object, Read&& read) {
+HStatus withMesh(Operation point, const HObject& object, Read&& read) {
     return apiCall(point, [&]() -> HStatus {
         const auto mesh = Access::as<MeshData>(object);
         return mesh ? read(*mesh) : noMesh();
@@ -35,7 +33,7 @@ HStatus withMesh(FaultPoint point, const HObject& object, Read&& read) {
 
 /// Attaches the set to what `make` makes of its mesh; what it refuses is an invalid parameter.
 template <class Make>
-HStatus replaceMesh(FaultPoint point, HObject& object, Make&& make) {
+HStatus replaceMesh(Operation point, HObject& object, Make&& make) {
     return withMesh(point, object, [&](const MeshData& mesh) -> HStatus {
         try {
             object = Access::object(make(mesh));
@@ -66,7 +64,7 @@ unsigned HFnGeometryData::vertexCount() const {
 }
 
 HStatus HFnGeometryData::getComponentTags(HStringArray& names) const {
-    return withMesh(FaultPoint::HFnGeometryData_getComponentTags, object_, [&](const MeshData& mesh) -> HStatus {
+    return withMesh(Operation::HFnGeometryData_getComponentTags, object_, [&](const MeshData& mesh) -> HStatus {
         names.clear();
         if (!mesh.tags)
             return HStatus::kSuccess;
@@ -79,7 +77,7 @@ HStatus HFnGeometryData::getComponentTags(HStringArray& names) const {
 }
 
 HStatus HFnGeometryData::getComponentTag(const HString& name, HUintArray& vertices) const {
-    return withMesh(FaultPoint::HFnGeometryData_getComponentTag, object_, [&](const MeshData& mesh) -> HStatus {
+    return withMesh(Operation::HFnGeometryData_getComponentTag, object_, [&](const MeshData& mesh) -> HStatus {
         const auto found = mesh.tag(name.asStdString());
         if (!found)
             return noTag(name);
@@ -89,12 +87,12 @@ HStatus HFnGeometryData::getComponentTag(const HString& name, HUintArray& vertic
 }
 
 HStatus HFnGeometryData::setComponentTag(const HString& name, const HUintArray& vertices) {
-    return replaceMesh(FaultPoint::HFnGeometryData_setComponentTag, object_,
+    return replaceMesh(Operation::HFnGeometryData_setComponentTag, object_,
                        [&](const MeshData& mesh) { return withTag(mesh, name.asStdString(), vertices); });
 }
 
 HStatus HFnGeometryData::removeComponentTag(const HString& name) {
-    return withMesh(FaultPoint::HFnGeometryData_removeComponentTag, object_, [&](const MeshData& mesh) -> HStatus {
+    return withMesh(Operation::HFnGeometryData_removeComponentTag, object_, [&](const MeshData& mesh) -> HStatus {
         if (!mesh.tag(name.asStdString()))
             return noTag(name);
         object_ = Access::object(withoutTag(mesh, name.asStdString()));
@@ -109,7 +107,7 @@ HFnMeshData::HFnMeshData(const HObject& data, HStatus* status)
 
 HObject HFnMeshData::create(const HPointArray& points, const HIntArray& polygonCounts, const HIntArray& polygonConnects,
                             HStatus* status) {
-    return apiValue(FaultPoint::HFnMeshData_create, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnMeshData_create, status, HObject(), [&](HStatus& outcome) {
         object_ = HObject();
         try {
             object_ = Access::object(OpenQuarn::makeMesh(points, polygonCounts, polygonConnects));
@@ -126,7 +124,7 @@ namespace {
 
 /// The mesh that a mesh node gives, evaluated.
 HObject meshOf(OpenQuarn::Node& node, HStatus& status) {
-    status = threadStatus(ThreadTag::eval, "HFnMesh::HFnMesh");
+    status = threadStatus(Operation::HFnMesh_HFnMesh);
     if (status.error())
         return {};
     const OpenQuarn::Field* field = node.type().find("outMesh");
@@ -162,7 +160,7 @@ HFnMesh::HFnMesh(const HObject& mesh, HStatus* status) {
 }
 
 int HFnMesh::numVertices(HStatus* status) const {
-    return apiValue(FaultPoint::HFnMesh_numVertices, status, 0, [&](HStatus& outcome) {
+    return apiValue(Operation::HFnMesh_numVertices, status, 0, [&](HStatus& outcome) {
         const auto mesh = Access::as<MeshData>(object_);
         outcome = mesh ? HStatus() : noMesh();
         return mesh ? static_cast<int>(mesh->vertexCount()) : 0;
@@ -170,7 +168,7 @@ int HFnMesh::numVertices(HStatus* status) const {
 }
 
 int HFnMesh::numPolygons(HStatus* status) const {
-    return apiValue(FaultPoint::HFnMesh_numPolygons, status, 0, [&](HStatus& outcome) {
+    return apiValue(Operation::HFnMesh_numPolygons, status, 0, [&](HStatus& outcome) {
         const auto mesh = Access::as<MeshData>(object_);
         outcome = mesh ? HStatus() : noMesh();
         return mesh ? static_cast<int>(mesh->topology->polygonCount()) : 0;
@@ -178,7 +176,7 @@ int HFnMesh::numPolygons(HStatus* status) const {
 }
 
 HStatus HFnMesh::getPolygonVertices(int polygon, HIntArray& vertices) const {
-    return withMesh(FaultPoint::HFnMesh_getPolygonVertices, object_, [&](const MeshData& mesh) -> HStatus {
+    return withMesh(Operation::HFnMesh_getPolygonVertices, object_, [&](const MeshData& mesh) -> HStatus {
         const OpenQuarn::Topology& topology = *mesh.topology;
         if (polygon < 0 || static_cast<std::size_t>(polygon) >= topology.polygonCount())
             return {HStatus::kInvalidParameter, "there is no polygon " + std::to_string(polygon) + ": the mesh has " +
@@ -189,11 +187,11 @@ HStatus HFnMesh::getPolygonVertices(int polygon, HIntArray& vertices) const {
 }
 
 HStatus HFnMesh::getPoints(HPointArray& points) const {
-    return withMesh(FaultPoint::HFnMesh_getPoints, object_,
+    return withMesh(Operation::HFnMesh_getPoints, object_,
                     [&](const MeshData& mesh) -> HStatus { return copyPoints(*mesh.points, points); });
 }
 
 HStatus HFnMesh::setPoints(const HPointArray& points) {
-    return replaceMesh(FaultPoint::HFnMesh_setPoints, object_,
+    return replaceMesh(Operation::HFnMesh_setPoints, object_,
                        [&](const MeshData& mesh) { return withPoints(mesh, points); });
 }

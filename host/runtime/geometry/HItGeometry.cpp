@@ -2,16 +2,14 @@
 #include "openquarn/HItGeometry.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "geometry/GeometryPoints.h"
 
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::GeometryPoints;
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -39,7 +37,7 @@ HStatus noGeometry() {
 } // namespace
 
 HItGeometry::HItGeometry(const HDataHandle& geometry, HStatus* status)
-    : owned_(apiValue(FaultPoint::HItGeometry_HItGeometry, status, std::shared_ptr<GeometryPoints>(),
+    : owned_(apiValue(Operation::HItGeometry_HItGeometry, status, std::shared_ptr<GeometryPoints>(),
                       [&](HStatus& outcome) -> std::shared_ptr<GeometryPoints> {
                           const std::shared_ptr<OpenQuarn::Slot>& slot = Access::impl(geometry);
                           auto mesh = slot ? std::dynamic_pointer_cast<OpenQuarn::MeshData>(slot->data) : nullptr;
@@ -69,18 +67,18 @@ HItGeometry::~HItGeometry() {
 }
 
 unsigned HItGeometry::index() const {
-    return isDone() || isRefused(ThreadTag::eval, "HItGeometry::index") ? current_ : impl_->fullIndex(current_);
+    return isDone() || isRefused(Operation::HItGeometry_index) ? current_ : impl_->fullIndex(current_);
 }
 
 HPoint HItGeometry::position(HSpace::Space space, HStatus* status) const {
-    return apiValue(FaultPoint::HItGeometry_position, status, HPoint(), [&](HStatus& outcome) {
+    return apiValue(Operation::HItGeometry_position, status, HPoint(), [&](HStatus& outcome) {
         outcome = placeStatus(impl_, current_, space);
         return outcome.error() ? HPoint() : impl_->point(current_);
     });
 }
 
 HStatus HItGeometry::setPosition(const HPoint& point, HSpace::Space space) {
-    return apiCall(FaultPoint::HItGeometry_setPosition, [&]() -> HStatus {
+    return apiCall(Operation::HItGeometry_setPosition, [&]() -> HStatus {
         HStatus status = placeStatus(impl_, current_, space);
         if (!status.error())
             impl_->setPoint(current_, point);
@@ -89,7 +87,7 @@ HStatus HItGeometry::setPosition(const HPoint& point, HSpace::Space space) {
 }
 
 HStatus HItGeometry::allPositions(HPointArray& points, HSpace::Space space) const {
-    return apiCall(FaultPoint::HItGeometry_allPositions, [&]() -> HStatus {
+    return apiCall(Operation::HItGeometry_allPositions, [&]() -> HStatus {
         const HStatus status = impl_ ? spaceStatus(space) : noGeometry();
         return status.error() ? status : impl_->copyTo(points);
     });
@@ -97,14 +95,14 @@ HStatus HItGeometry::allPositions(HPointArray& points, HSpace::Space space) cons
 
 const double* HItGeometry::rawPositions(HStatus* status) const {
     const double* none = nullptr;
-    return apiValue(FaultPoint::HItGeometry_rawPositions, status, none, [&](HStatus& outcome) {
+    return apiValue(Operation::HItGeometry_rawPositions, status, none, [&](HStatus& outcome) {
         outcome = impl_ ? HStatus() : noGeometry();
         return impl_ ? impl_->raw() : nullptr;
     });
 }
 
 HStatus HItGeometry::setAllPositions(const HPointArray& points, HSpace::Space space) {
-    return apiCall(FaultPoint::HItGeometry_setAllPositions, [&]() -> HStatus {
+    return apiCall(Operation::HItGeometry_setAllPositions, [&]() -> HStatus {
         HStatus status = impl_ ? spaceStatus(space) : noGeometry();
         if (status.error())
             return status;

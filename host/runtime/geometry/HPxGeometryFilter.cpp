@@ -11,7 +11,7 @@
 
 using OpenQuarn::Access;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 using OpenQuarn::Slot;
 
 HPxGeometryFilter::HPxGeometryFilter() = default;
@@ -57,7 +57,7 @@ HStatus HPxGeometryFilter::deform(HDataBlock&, HItGeometry&, const HMatrix&, uns
 }
 
 HIndexMapper HPxGeometryFilter::indexMapper(unsigned multiIndex, HStatus* status) const {
-    return apiValue(FaultPoint::HPxGeometryFilter_indexMapper, status, HIndexMapper(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPxGeometryFilter_indexMapper, status, HIndexMapper(), [&](HStatus& outcome) {
         const auto node = Access::as<OpenQuarn::Node>(thisHObject());
         if (!node) {
             outcome = {HStatus::kInvalidParameter, "the node is none of the scene"};
@@ -85,7 +85,7 @@ bool HPxDeformerNode::isDueOnCpu(HDataBlock&, unsigned) {
 
 const float* HPxDeformerNode::envelopeWeights(HDataBlock& block, unsigned multiIndex, HStatus* status) {
     const float* none = nullptr;
-    return apiValue(FaultPoint::HPxDeformerNode_envelopeWeights, status, none, [&](HStatus& outcome) {
+    return apiValue(Operation::HPxDeformerNode_envelopeWeights, status, none, [&](HStatus& outcome) {
         const std::shared_ptr<OpenQuarn::NodeData>& data = Access::impl(block);
         if (!data || data->isGone() || Access::pointer(thisHObject()).get() != &data->node) {
             outcome = {HStatus::kInvalidParameter, "the data block is not one of node '" + name().asStdString() + "'"};

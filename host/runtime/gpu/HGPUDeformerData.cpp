@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn/gpu/HGPUDeformerData.h"
 
-#include "core/threads.h"
+#include "core/Operations.h"
 
 #include <utility>
 
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 HGPUDeformerData::HGPUDeformerData() = default;
 HGPUDeformerData::~HGPUDeformerData() = default;
@@ -14,7 +14,7 @@ HGPUDeformerData::~HGPUDeformerData() = default;
 HOpenCLBuffer HGPUDeformerData::getBuffer(const HPlug& plug, const HString& name, cl_int* status) const {
     cl_int outcome = CL_SUCCESS;
     HOpenCLBuffer buffer;
-    if (isRefused(ThreadTag::eval, "HGPUDeformerData::getBuffer"))
+    if (isRefused(Operation::HGPUDeformerData_getBuffer))
         outcome = CL_INVALID_OPERATION;
     for (const Entry& entry : entries_)
         if (outcome == CL_SUCCESS && entry.plug == plug && entry.name == name)
@@ -33,7 +33,7 @@ HGPUDeformerData::Entry& HGPUDeformerData::entryOf(const HPlug& plug, const HStr
 }
 
 void HGPUDeformerData::setBuffer(const HPlug& plug, const HString& name, const HOpenCLBuffer& buffer) {
-    if (isRefused(ThreadTag::eval, "HGPUDeformerData::setBuffer"))
+    if (isRefused(Operation::HGPUDeformerData_setBuffer))
         return;
     Entry& entry = entryOf(plug, name);
     entry.buffer = buffer;
@@ -41,13 +41,13 @@ void HGPUDeformerData::setBuffer(const HPlug& plug, const HString& name, const H
 }
 
 void HGPUDeformerData::setSupplier(const HPlug& plug, const HString& name, Supplier supplier) {
-    if (isRefused(ThreadTag::eval, "HGPUDeformerData::setSupplier"))
+    if (isRefused(Operation::HGPUDeformerData_setSupplier))
         return;
     entryOf(plug, name).supplier = std::move(supplier);
 }
 
 void HGPUDeformerData::clear() noexcept {
-    if (isRefused(ThreadTag::eval, "HGPUDeformerData::clear"))
+    if (isRefused(Operation::HGPUDeformerData_clear))
         return;
     entries_.clear();
 }

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn/gpu/HPxGPUDeformer.h"
 
-#include "core/threads.h"
+#include "core/Operations.h"
 #include "gpu/deformerImpl.h"
 #include "gpu/failure.h"
 #include "gpu/publishedBuffer.h"
@@ -12,7 +12,7 @@
 #include "openquarn/gpu/HOpenCLUtils.h"
 
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 const HString HPxGPUDeformer::sPositionsName("positions");
 
@@ -56,11 +56,11 @@ bool HPxGPUDeformer::passThroughWithZeroEnvelope() const {
 }
 
 HObject HPxGPUDeformer::dependencyNode() const {
-    return isRefused(ThreadTag::eval, "HPxGPUDeformer::dependencyNode") ? HObject() : impl_->node;
+    return isRefused(Operation::HPxGPUDeformer_dependencyNode) ? HObject() : impl_->node;
 }
 
 unsigned HPxGPUDeformer::multiIndex() const {
-    return isRefused(ThreadTag::eval, "HPxGPUDeformer::multiIndex") ? 0U : impl_->multiIndex;
+    return isRefused(Operation::HPxGPUDeformer_multiIndex) ? 0U : impl_->multiIndex;
 }
 
 namespace {
@@ -105,7 +105,7 @@ HObject publishedBuffer(const HObject& dependencyNode, const HString& name, unsi
 void HPxGPUDeformer::uploadFixedSetupData(const HString& name, HOpenCLBuffer& buffer, cl_int& status,
                                           unsigned& elementCount) {
     elementCount = 0;
-    if (isRefused(ThreadTag::eval, "HPxGPUDeformer::uploadFixedSetupData"))
+    if (isRefused(Operation::HPxGPUDeformer_uploadFixedSetupData))
         status = CL_INVALID_OPERATION;
     if (status != CL_SUCCESS)
         return;

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn/gpu/HPxGPUStandardDeformer.h"
 
-#include "core/threads.h"
+#include "core/Operations.h"
 #include "gpu/Device.h"
 #include "gpu/activity.h"
 #include "gpu/deformerImpl.h"
@@ -15,7 +15,7 @@
 #include <vector>
 
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 namespace {
 const HOpenCLBuffer noBuffer;
@@ -36,7 +36,7 @@ HPxGPUStandardDeformer::HPxGPUStandardDeformer()
 HPxGPUStandardDeformer::~HPxGPUStandardDeformer() = default;
 
 void HPxGPUStandardDeformer::terminate() {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::terminate"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_terminate))
         return;
     *standard_ = Standard();
     HPxGPUDeformer::terminate();
@@ -54,7 +54,7 @@ float envelopeOf(HDataBlock& block, bool isGeometryFilter, HStatus& status) {
 HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::prepareEvaluation(
     HDataBlock& block, const HEvaluationNode& /*evaluationNode*/, const HPlug& outputPlug, const HPlugArray& inputPlugs,
     const HGPUDeformerData& inputData, HGPUDeformerData& outputData, HOpenCLEvent& event) {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::prepareEvaluation"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_prepareEvaluation))
         return kDeformerFailure;
     Standard& now = *standard_;
     now.status = CL_SUCCESS;
@@ -79,7 +79,7 @@ HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::prepareEvaluation(
 }
 
 void HPxGPUStandardDeformer::prepareAffectMapBuffer() {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::prepareAffectMapBuffer"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_prepareAffectMapBuffer))
         return;
     Standard& now = *standard_;
     if (isIdentityMap() || now.uploadedMap == impl_->affected || now.status != CL_SUCCESS)
@@ -92,7 +92,7 @@ void HPxGPUStandardDeformer::prepareAffectMapBuffer() {
 }
 
 void HPxGPUStandardDeformer::prepareWeightsBuffer(const HEvaluationNode& /*evaluationNode*/) {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::prepareWeightsBuffer"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_prepareWeightsBuffer))
         return;
     Standard& now = *standard_;
     if (!hasEnvelopeWeights() || now.uploadedWeights == impl_->weightsVersion || now.status != CL_SUCCESS)
@@ -103,7 +103,7 @@ void HPxGPUStandardDeformer::prepareWeightsBuffer(const HEvaluationNode& /*evalu
 }
 
 cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::initializeOutputPositions"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_initializeOutputPositions))
         return CL_INVALID_OPERATION;
     Standard& now = *standard_;
     if (now.status != CL_SUCCESS || isIdentityMap())
@@ -125,7 +125,7 @@ cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
 
 HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::finishEvaluation(const HOpenCLEvent& event,
                                                                         HGPUDeformerData& outputData) {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::finishEvaluation"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_finishEvaluation))
         return kDeformerFailure;
     standard_->output.setBufferReadyEvent(event);
     outputData.setBuffer(standard_->outputPlug, sPositionsName, standard_->output);
@@ -133,47 +133,44 @@ HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::finishEvaluation(const HO
 }
 
 const HOpenCLBuffer& HPxGPUStandardDeformer::inputPositions() const {
-    if (isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::inputPositions"))
+    if (isRefused(Operation::HPxGPUStandardDeformer_inputPositions))
         return noBuffer;
     return standard_->input;
 }
 
 HOpenCLBuffer& HPxGPUStandardDeformer::outputPositions() {
-    isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::outputPositions"); // said; a reference has to be given
+    isRefused(Operation::HPxGPUStandardDeformer_outputPositions); // said; a reference has to be given
     return standard_->output;
 }
 
 unsigned HPxGPUStandardDeformer::vertexCount() const {
-    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::vertexCount") ? 0 : standard_->vertexCount;
+    return isRefused(Operation::HPxGPUStandardDeformer_vertexCount) ? 0 : standard_->vertexCount;
 }
 
 unsigned HPxGPUStandardDeformer::affectCount() const {
-    return impl_->affected && !isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::affectCount")
-               ? impl_->affected->affectCount()
-               : 0;
+    return impl_->affected && !isRefused(Operation::HPxGPUStandardDeformer_affectCount) ? impl_->affected->affectCount()
+                                                                                        : 0;
 }
 
 const HOpenCLBuffer& HPxGPUStandardDeformer::affectMapBuffer() const {
-    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::affectMapBuffer") || isIdentityMap()
-               ? noBuffer
-               : standard_->affectMap;
+    return isRefused(Operation::HPxGPUStandardDeformer_affectMapBuffer) || isIdentityMap() ? noBuffer
+                                                                                           : standard_->affectMap;
 }
 
 bool HPxGPUStandardDeformer::isIdentityMap() const {
-    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::isIdentityMap") || !impl_->affected ||
+    return isRefused(Operation::HPxGPUStandardDeformer_isIdentityMap) || !impl_->affected ||
            impl_->affected->isIdentity();
 }
 
 const HOpenCLBuffer& HPxGPUStandardDeformer::weightsBuffer() const {
-    return !isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::weightsBuffer") && hasEnvelopeWeights()
-               ? standard_->weights
-               : noBuffer;
+    return !isRefused(Operation::HPxGPUStandardDeformer_weightsBuffer) && hasEnvelopeWeights() ? standard_->weights
+                                                                                               : noBuffer;
 }
 
 bool HPxGPUStandardDeformer::hasEnvelopeWeights() const {
-    return !isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::hasEnvelopeWeights") && impl_->weights != nullptr;
+    return !isRefused(Operation::HPxGPUStandardDeformer_hasEnvelopeWeights) && impl_->weights != nullptr;
 }
 
 float HPxGPUStandardDeformer::envelope() const {
-    return isRefused(ThreadTag::eval, "HPxGPUStandardDeformer::envelope") ? 0.0F : standard_->envelope;
+    return isRefused(Operation::HPxGPUStandardDeformer_envelope) ? 0.0F : standard_->envelope;
 }

@@ -1,18 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn/gpu/SourceNodeSyncState.h"
 
-#include "core/threads.h"
+#include "core/Operations.h"
 #include "gpu/publishedBuffer.h"
 #include "openquarn/TapiCastAnim.h"
 #include "openquarn/gpu/HPxGPUDeformer.h"
 
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 namespace deformer_utils {
 
 void SourceNodeSyncState::capture(const HPxGPUDeformer& deformer) {
-    if (isRefused(ThreadTag::eval, "SourceNodeSyncState::capture"))
+    if (isRefused(Operation::SourceNodeSyncState_capture))
         return;
     const HObject published = OpenQuarn::publishedBuffer(deformer.dependencyNode(), "Sync", deformer.multiIndex());
     const TuInt32Array* versions = TapiCastAnim::uInt32Array(published);
@@ -22,7 +22,7 @@ void SourceNodeSyncState::capture(const HPxGPUDeformer& deformer) {
 }
 
 bool SourceNodeSyncState::isDirty() const {
-    if (isRefused(ThreadTag::eval, "SourceNodeSyncState::isDirty") || captured.length() == 0 ||
+    if (isRefused(Operation::SourceNodeSyncState_isDirty) || captured.length() == 0 ||
         captured.length() != uploaded.length())
         return true;
     for (unsigned slot = 0; slot < captured.length(); ++slot)
@@ -32,7 +32,7 @@ bool SourceNodeSyncState::isDirty() const {
 }
 
 bool SourceNodeSyncState::isDirty(unsigned slot) const {
-    return isRefused(ThreadTag::eval, "SourceNodeSyncState::isDirty") || slot >= captured.length() ||
+    return isRefused(Operation::SourceNodeSyncState_isDirty) || slot >= captured.length() ||
            slot >= uploaded.length() || captured[slot] != uploaded[slot];
 }
 

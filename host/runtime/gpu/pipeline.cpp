@@ -156,7 +156,7 @@ void takeFromDevice(const std::string& nodeType) {
 }
 
 void Gpu::setEnabled(bool enabled) {
-    if (isRefused(ThreadTag::main, "Gpu::setEnabled"))
+    if (isRefused({"Gpu::setEnabled", ThreadTag::main}))
         return;
     if (!enabled)
         takeFromDevice("");

@@ -12,8 +12,8 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::Node;
+using OpenQuarn::Operation;
 using OpenQuarn::Slot;
 
 namespace {
@@ -78,20 +78,20 @@ HStatus removeNow(const HPlug& element, bool breakConnections) {
 } // namespace
 
 HObject HDGModifier::createNode(const HString& typeName, HStatus* status) {
-    return apiValue(FaultPoint::HDGModifier_createNode, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDGModifier_createNode, status, HObject(), [&](HStatus& outcome) {
         return ::createNode(OpenQuarn::findNodeClass(typeName.asStdString()), "'" + typeName.asStdString() + "'",
                             outcome);
     });
 }
 
 HObject HDGModifier::createNode(const HTypeId& type, HStatus* status) {
-    return apiValue(FaultPoint::HDGModifier_createNode, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDGModifier_createNode, status, HObject(), [&](HStatus& outcome) {
         return ::createNode(OpenQuarn::findNodeClass(type), OpenQuarn::hexText(type), outcome);
     });
 }
 
 HStatus HDGModifier::deleteNode(const HObject& node) {
-    return apiCall(FaultPoint::HDGModifier_deleteNode, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_deleteNode, [&]() -> HStatus {
         if (!Access::as<Node>(node))
             return noNode();
         changes_.emplace_back([node]() -> HStatus {
@@ -106,7 +106,7 @@ HStatus HDGModifier::deleteNode(const HObject& node) {
 }
 
 HStatus HDGModifier::renameNode(const HObject& node, const HString& name) {
-    return apiCall(FaultPoint::HDGModifier_renameNode, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_renameNode, [&]() -> HStatus {
         if (!Access::as<Node>(node))
             return noNode();
         changes_.emplace_back([node, name]() -> HStatus {
@@ -121,7 +121,7 @@ HStatus HDGModifier::renameNode(const HObject& node, const HString& name) {
 }
 
 HStatus HDGModifier::connect(const HPlug& source, const HPlug& destination) {
-    return apiCall(FaultPoint::HDGModifier_connect, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_connect, [&]() -> HStatus {
         if (source.isNull() || destination.isNull())
             return noPlug();
         changes_.emplace_back([source, destination] { return connectNow(source, destination); });
@@ -130,7 +130,7 @@ HStatus HDGModifier::connect(const HPlug& source, const HPlug& destination) {
 }
 
 HStatus HDGModifier::disconnect(const HPlug& source, const HPlug& destination) {
-    return apiCall(FaultPoint::HDGModifier_disconnect, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_disconnect, [&]() -> HStatus {
         if (source.isNull() || destination.isNull())
             return noPlug();
         changes_.emplace_back([source, destination] { return disconnectNow(source, destination); });
@@ -139,7 +139,7 @@ HStatus HDGModifier::disconnect(const HPlug& source, const HPlug& destination) {
 }
 
 HStatus HDGModifier::removeMultiInstance(const HPlug& element, bool breakConnections) {
-    return apiCall(FaultPoint::HDGModifier_removeMultiInstance, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_removeMultiInstance, [&]() -> HStatus {
         if (!element.isElement())
             return {HStatus::kInvalidParameter, "'" + element.name().asStdString() + "' is no element of an array"};
         changes_.emplace_back([element, breakConnections] { return removeNow(element, breakConnections); });
@@ -148,7 +148,7 @@ HStatus HDGModifier::removeMultiInstance(const HPlug& element, bool breakConnect
 }
 
 HStatus HDGModifier::newPlugValueDouble(const HPlug& plug, double value) {
-    return apiCall(FaultPoint::HDGModifier_newPlugValueDouble, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_newPlugValueDouble, [&]() -> HStatus {
         if (plug.isNull())
             return noPlug();
         changes_.emplace_back([plug = HPlug(plug), value]() mutable { return plug.setDouble(value); });
@@ -157,7 +157,7 @@ HStatus HDGModifier::newPlugValueDouble(const HPlug& plug, double value) {
 }
 
 HStatus HDGModifier::newPlugValueInt(const HPlug& plug, int value) {
-    return apiCall(FaultPoint::HDGModifier_newPlugValueInt, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_newPlugValueInt, [&]() -> HStatus {
         if (plug.isNull())
             return noPlug();
         changes_.emplace_back([plug = HPlug(plug), value]() mutable { return plug.setInt(value); });
@@ -166,7 +166,7 @@ HStatus HDGModifier::newPlugValueInt(const HPlug& plug, int value) {
 }
 
 HStatus HDGModifier::newPlugValueString(const HPlug& plug, const HString& value) {
-    return apiCall(FaultPoint::HDGModifier_newPlugValueString, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_newPlugValueString, [&]() -> HStatus {
         if (plug.isNull())
             return noPlug();
         changes_.emplace_back([plug = HPlug(plug), value]() mutable { return plug.setString(value); });
@@ -175,7 +175,7 @@ HStatus HDGModifier::newPlugValueString(const HPlug& plug, const HString& value)
 }
 
 HStatus HDGModifier::newPlugValue(const HPlug& plug, const HObject& data) {
-    return apiCall(FaultPoint::HDGModifier_newPlugValue, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_newPlugValue, [&]() -> HStatus {
         if (plug.isNull())
             return noPlug();
         changes_.emplace_back([plug = HPlug(plug), data]() mutable { return plug.setHObject(data); });
@@ -184,7 +184,7 @@ HStatus HDGModifier::newPlugValue(const HPlug& plug, const HObject& data) {
 }
 
 HStatus HDGModifier::commandToExecute(const HString& command) {
-    return apiCall(FaultPoint::HDGModifier_commandToExecute, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_commandToExecute, [&]() -> HStatus {
         if (command.isEmpty())
             return {HStatus::kInvalidParameter, "the command is empty"};
         changes_.emplace_back([command] { return HGlobal::executeCommand(command); });
@@ -193,7 +193,7 @@ HStatus HDGModifier::commandToExecute(const HString& command) {
 }
 
 HStatus HDGModifier::doIt() {
-    return apiCall(FaultPoint::HDGModifier_doIt, [&]() -> HStatus {
+    return apiCall(Operation::HDGModifier_doIt, [&]() -> HStatus {
         std::size_t made = 0;
         HStatus status;
         for (; made < changes_.size(); ++made) {

@@ -2,7 +2,6 @@
 #include "openquarn/HDataBlock.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/ArrayBuild.h"
 #include "graph/Context.h"
 #include "graph/arrayLock.h"
@@ -15,11 +14,10 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::isRefused;
 using OpenQuarn::NodeData;
+using OpenQuarn::Operation;
 using OpenQuarn::Slot;
-using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -97,49 +95,49 @@ HDataBlock::HDataBlock(std::shared_ptr<NodeData> impl)
     : impl_(std::move(impl)) {}
 
 HDataHandle HDataBlock::inputValue(const HObject& attribute, HStatus* status) {
-    return apiValue(FaultPoint::HDataBlock_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataBlock_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = slotOf(impl_, attribute, outcome);
         return isOneValue(slot, outcome) ? handleOn(evaluated(std::move(slot))) : HDataHandle();
     });
 }
 
 HDataHandle HDataBlock::inputValue(const HPlug& plug, HStatus* status) {
-    return apiValue(FaultPoint::HDataBlock_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataBlock_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = slotOf(impl_, plug, false, outcome);
         return isOneValue(slot, outcome) ? handleOn(evaluated(std::move(slot))) : HDataHandle();
     });
 }
 
 HArrayDataHandle HDataBlock::inputArrayValue(const HObject& attribute, HStatus* status) {
-    return apiValue(FaultPoint::HDataBlock_inputArrayValue, status, HArrayDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataBlock_inputArrayValue, status, HArrayDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = slotOf(impl_, attribute, outcome);
         return isArray(slot, outcome) ? Access::make<HArrayDataHandle>(evaluated(std::move(slot))) : HArrayDataHandle();
     });
 }
 
 HDataHandle HDataBlock::outputValue(const HObject& attribute, HStatus* status) {
-    return apiValue(FaultPoint::HDataBlock_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataBlock_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = slotOf(impl_, attribute, outcome);
         return isOneValue(slot, outcome) ? handleOn(std::move(slot)) : HDataHandle();
     });
 }
 
 HDataHandle HDataBlock::outputValue(const HPlug& plug, HStatus* status) {
-    return apiValue(FaultPoint::HDataBlock_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataBlock_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = slotOf(impl_, plug, true, outcome);
         return isOneValue(slot, outcome) ? handleOn(std::move(slot)) : HDataHandle();
     });
 }
 
 HArrayDataHandle HDataBlock::outputArrayValue(const HObject& attribute, HStatus* status) {
-    return apiValue(FaultPoint::HDataBlock_outputArrayValue, status, HArrayDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataBlock_outputArrayValue, status, HArrayDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = slotOf(impl_, attribute, outcome);
         return isArray(slot, outcome) ? Access::make<HArrayDataHandle>(std::move(slot)) : HArrayDataHandle();
     });
 }
 
 HStatus HDataBlock::setClean(const HPlug& plug) {
-    return apiCall(FaultPoint::HDataBlock_setClean, [&]() -> HStatus {
+    return apiCall(Operation::HDataBlock_setClean, [&]() -> HStatus {
         HStatus status;
         if (const SlotPointer slot = slotOf(impl_, plug, false, status))
             setSlotClean(*slot);
@@ -148,7 +146,7 @@ HStatus HDataBlock::setClean(const HPlug& plug) {
 }
 
 HStatus HDataBlock::setClean(const HObject& attribute) {
-    return apiCall(FaultPoint::HDataBlock_setClean, [&]() -> HStatus {
+    return apiCall(Operation::HDataBlock_setClean, [&]() -> HStatus {
         HStatus status;
         if (const SlotPointer slot = slotOf(impl_, attribute, status))
             setSlotClean(*slot);
@@ -157,7 +155,7 @@ HStatus HDataBlock::setClean(const HObject& attribute) {
 }
 
 bool HDataBlock::isClean(const HPlug& plug) const {
-    if (isRefused(ThreadTag::eval, "HDataBlock::isClean"))
+    if (isRefused(Operation::HDataBlock_isClean))
         return false;
     HStatus status;
     const SlotPointer slot = slotOf(impl_, plug, false, status);
@@ -179,7 +177,7 @@ bool HDataHandle::isValid() const {
 }
 
 HFnData::Type HDataHandle::type() const {
-    if (!impl_ || isRefused(ThreadTag::eval, "HDataHandle::type"))
+    if (!impl_ || isRefused(Operation::HDataHandle_type))
         return HFnData::kInvalid;
     if (impl_->data)
         return impl_->data->dataType();
@@ -196,58 +194,58 @@ HObject HDataHandle::attribute() const {
 
 namespace {
 
-const Slot* toRead(const SlotPointer& slot, const char* function) {
-    return isRefused(ThreadTag::eval, function) ? nullptr : slot.get();
+const Slot* toRead(const SlotPointer& slot, Operation operation) {
+    return isRefused(operation) ? nullptr : slot.get();
 }
 
 } // namespace
 
 bool HDataHandle::asBool() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asBool");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asBool);
     return slot && numberIn(*slot) != 0.0;
 }
 short HDataHandle::asShort() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asShort");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asShort);
     return slot ? shortIn(*slot) : short{0};
 }
 int HDataHandle::asInt() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asInt");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asInt);
     return slot ? intIn(*slot) : 0;
 }
 float HDataHandle::asFloat() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asFloat");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asFloat);
     return slot ? static_cast<float>(numberIn(*slot)) : 0.0F;
 }
 double HDataHandle::asDouble() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asDouble");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asDouble);
     return slot ? numberIn(*slot) : 0.0;
 }
 HString HDataHandle::asString() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asString");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asString);
     return slot ? HString(textIn(*slot)) : HString();
 }
 HMatrix HDataHandle::asMatrix() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asMatrix");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asMatrix);
     return slot ? OpenQuarn::toMatrix(matrixIn(*slot)) : HMatrix();
 }
 
 HObject HDataHandle::asMesh() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asMesh");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asMesh);
     return slot && slot->data && slot->data->dataType() == HFnData::kMesh ? Access::object(slot->data) : HObject();
 }
 HObject HDataHandle::data() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::data");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_data);
     return slot && slot->data ? Access::object(slot->data) : HObject();
 }
 
 HPxData* HDataHandle::asPluginData() const {
-    const Slot* slot = toRead(impl_, "HDataHandle::asPluginData");
+    const Slot* slot = toRead(impl_, Operation::HDataHandle_asPluginData);
     const auto* data = slot ? dynamic_cast<const OpenQuarn::PluginData*>(slot->data.get()) : nullptr;
     return data ? data->value.get() : nullptr;
 }
 
 HDataHandle HDataHandle::child(const HObject& attribute) const {
-    const bool isReadable = impl_ && !isRefused(ThreadTag::eval, "HDataHandle::child");
+    const bool isReadable = impl_ && !isRefused(Operation::HDataHandle_child);
     const auto wanted = isReadable ? Access::as<OpenQuarn::Attribute>(attribute) : nullptr;
     if (wanted)
         for (const SlotPointer& part : impl_->children())
@@ -269,7 +267,7 @@ HStatus noChild(const SlotPointer& slot, const HObject& attribute) {
 } // namespace
 
 HArrayDataHandle HDataHandle::childArray(const HObject& attribute, HStatus* status) const {
-    return apiValue(FaultPoint::HDataHandle_childArray, status, HArrayDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HDataHandle_childArray, status, HArrayDataHandle(), [&](HStatus& outcome) {
         SlotPointer slot = child(attribute).impl_;
         if (!slot)
             outcome = noChild(impl_, attribute);
@@ -281,7 +279,7 @@ namespace {
 
 template <class Put>
 HStatus write(const SlotPointer& slot, Put&& put) {
-    return apiCall(FaultPoint::HDataHandle_set, [&]() -> HStatus {
+    return apiCall(Operation::HDataHandle_set, [&]() -> HStatus {
         if (!slot)
             return {HStatus::kInvalidParameter, "the data handle is not valid"};
         const std::string refused = put(*slot);
@@ -341,7 +339,7 @@ HStatus HDataHandle::set(HPxData* data) {
 }
 
 HStatus HDataHandle::copy(const HDataHandle& source) {
-    return apiCall(FaultPoint::HDataHandle_copy, [&]() -> HStatus {
+    return apiCall(Operation::HDataHandle_copy, [&]() -> HStatus {
         if (!impl_ || !source.impl_)
             return {HStatus::kInvalidParameter, "the data handle is not valid"};
         if (impl_->isArray() != source.impl_->isArray() ||
@@ -354,7 +352,7 @@ HStatus HDataHandle::copy(const HDataHandle& source) {
 }
 
 void HDataHandle::setClean() {
-    if (impl_ && !isRefused(ThreadTag::eval, "HDataHandle::setClean"))
+    if (impl_ && !isRefused(Operation::HDataHandle_setClean))
         setSlotClean(*impl_);
 }
 
@@ -383,7 +381,7 @@ HArrayDataHandle::HArrayDataHandle(SlotPointer impl)
     , current_(firstFrom(*impl_, 0)) {}
 
 HArrayDataHandle::HArrayDataHandle(const HDataHandle& array, HStatus* status) {
-    *this = apiValue(FaultPoint::HArrayDataHandle_HArrayDataHandle, status, HArrayDataHandle(), [&](HStatus& outcome) {
+    *this = apiValue(Operation::HArrayDataHandle_HArrayDataHandle, status, HArrayDataHandle(), [&](HStatus& outcome) {
         if (!array.impl_)
             outcome = {HStatus::kInvalidParameter, "the data handle is not valid"};
         return isArray(array.impl_, outcome) ? HArrayDataHandle(array.impl_) : HArrayDataHandle();
@@ -395,14 +393,14 @@ bool HArrayDataHandle::isValid() const {
 }
 
 unsigned HArrayDataHandle::elementCount() const {
-    if (!impl_ || isRefused(ThreadTag::eval, "HArrayDataHandle::elementCount"))
+    if (!impl_ || isRefused(Operation::HArrayDataHandle_elementCount))
         return 0;
     const OpenQuarn::ArrayReadLock lock(impl_->owner);
     return static_cast<unsigned>(impl_->elements().size());
 }
 
 unsigned HArrayDataHandle::elementIndex(HStatus* status) const {
-    return apiValue(FaultPoint::HArrayDataHandle_elementIndex, status, 0U, [&](HStatus& outcome) {
+    return apiValue(Operation::HArrayDataHandle_elementIndex, status, 0U, [&](HStatus& outcome) {
         if (current_)
             return current_->index;
         outcome = beyondLast(impl_);
@@ -411,7 +409,7 @@ unsigned HArrayDataHandle::elementIndex(HStatus* status) const {
 }
 
 HStatus HArrayDataHandle::next() {
-    return apiCall(FaultPoint::HArrayDataHandle_next, [&]() -> HStatus {
+    return apiCall(Operation::HArrayDataHandle_next, [&]() -> HStatus {
         if (!current_)
             return beyondLast(impl_);
         const unsigned index = current_->index;
@@ -436,16 +434,15 @@ HStatus jump(const SlotPointer& array, SlotPointer& current, unsigned logicalInd
 } // namespace
 
 HStatus HArrayDataHandle::jumpToElement(unsigned logicalIndex) {
-    return apiCall(FaultPoint::HArrayDataHandle_jumpToElement, [&] { return jump(impl_, current_, logicalIndex); });
+    return apiCall(Operation::HArrayDataHandle_jumpToElement, [&] { return jump(impl_, current_, logicalIndex); });
 }
 
 HStatus HArrayDataHandle::jumpToArrayElement(unsigned logicalIndex) {
-    return apiCall(FaultPoint::HArrayDataHandle_jumpToArrayElement,
-                   [&] { return jump(impl_, current_, logicalIndex); });
+    return apiCall(Operation::HArrayDataHandle_jumpToArrayElement, [&] { return jump(impl_, current_, logicalIndex); });
 }
 
 HStatus HArrayDataHandle::jumpToPosition(unsigned position) {
-    return apiCall(FaultPoint::HArrayDataHandle_jumpToPosition, [&]() -> HStatus {
+    return apiCall(Operation::HArrayDataHandle_jumpToPosition, [&]() -> HStatus {
         if (!impl_)
             return {HStatus::kInvalidParameter, "the array handle is not valid"};
         const OpenQuarn::ArrayReadLock lock(impl_->owner);
@@ -459,7 +456,7 @@ HStatus HArrayDataHandle::jumpToPosition(unsigned position) {
 }
 
 HDataHandle HArrayDataHandle::inputValue(HStatus* status) {
-    return apiValue(FaultPoint::HArrayDataHandle_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HArrayDataHandle_inputValue, status, HDataHandle(), [&](HStatus& outcome) {
         if (!current_)
             outcome = beyondLast(impl_);
         return handleOn(evaluated(current_));
@@ -467,7 +464,7 @@ HDataHandle HArrayDataHandle::inputValue(HStatus* status) {
 }
 
 HDataHandle HArrayDataHandle::outputValue(HStatus* status) {
-    return apiValue(FaultPoint::HArrayDataHandle_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HArrayDataHandle_outputValue, status, HDataHandle(), [&](HStatus& outcome) {
         if (!current_)
             outcome = beyondLast(impl_);
         return handleOn(current_);
@@ -475,7 +472,7 @@ HDataHandle HArrayDataHandle::outputValue(HStatus* status) {
 }
 
 HArrayDataBuilder HArrayDataHandle::builder(HStatus* status) {
-    return apiValue(FaultPoint::HArrayDataHandle_builder, status, HArrayDataBuilder(), [&](HStatus& outcome) {
+    return apiValue(Operation::HArrayDataHandle_builder, status, HArrayDataBuilder(), [&](HStatus& outcome) {
         if (!impl_) {
             outcome = {HStatus::kInvalidParameter, "the array handle is not valid"};
             return HArrayDataBuilder();
@@ -491,7 +488,7 @@ HArrayDataBuilder HArrayDataHandle::builder(HStatus* status) {
 }
 
 HStatus HArrayDataHandle::set(HArrayDataBuilder& builder) {
-    return apiCall(FaultPoint::HArrayDataHandle_set, [&]() -> HStatus {
+    return apiCall(Operation::HArrayDataHandle_set, [&]() -> HStatus {
         const auto& build = Access::impl(builder);
         if (!impl_ || !build || build->array != impl_)
             return {HStatus::kInvalidParameter, "the builder is not one of this array"};
@@ -502,7 +499,7 @@ HStatus HArrayDataHandle::set(HArrayDataBuilder& builder) {
 }
 
 HStatus HArrayDataHandle::setAllClean() {
-    return apiCall(FaultPoint::HArrayDataHandle_setAllClean, [&]() -> HStatus {
+    return apiCall(Operation::HArrayDataHandle_setAllClean, [&]() -> HStatus {
         if (!impl_)
             return {HStatus::kInvalidParameter, "the array handle is not valid"};
         setSlotClean(*impl_);
@@ -511,7 +508,7 @@ HStatus HArrayDataHandle::setAllClean() {
 }
 
 HStatus HArrayDataHandle::setClean() {
-    return apiCall(FaultPoint::HArrayDataHandle_setClean, [&]() -> HStatus {
+    return apiCall(Operation::HArrayDataHandle_setClean, [&]() -> HStatus {
         if (!current_)
             return beyondLast(impl_);
         setSlotClean(*current_);
@@ -526,7 +523,7 @@ HArrayDataBuilder::HArrayDataBuilder(std::shared_ptr<OpenQuarn::ArrayBuild> impl
     : impl_(std::move(impl)) {}
 
 HDataHandle HArrayDataBuilder::addElement(unsigned logicalIndex, HStatus* status) {
-    return apiValue(FaultPoint::HArrayDataBuilder_addElement, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HArrayDataBuilder_addElement, status, HDataHandle(), [&](HStatus& outcome) {
         if (impl_)
             return handleOn(impl_->add(logicalIndex));
         outcome = {HStatus::kInvalidParameter, "the builder is not valid"};
@@ -535,7 +532,7 @@ HDataHandle HArrayDataBuilder::addElement(unsigned logicalIndex, HStatus* status
 }
 
 HStatus HArrayDataBuilder::removeElement(unsigned logicalIndex) {
-    return apiCall(FaultPoint::HArrayDataBuilder_removeElement, [&]() -> HStatus {
+    return apiCall(Operation::HArrayDataBuilder_removeElement, [&]() -> HStatus {
         if (!impl_)
             return {HStatus::kInvalidParameter, "the builder is not valid"};
         if (!impl_->remove(logicalIndex))
@@ -545,7 +542,5 @@ HStatus HArrayDataBuilder::removeElement(unsigned logicalIndex) {
 }
 
 unsigned HArrayDataBuilder::elementCount() const {
-    return impl_ && !isRefused(ThreadTag::eval, "HArrayDataBuilder::elementCount")
-               ? static_cast<unsigned>(impl_->size())
-               : 0U;
+    return impl_ && !isRefused(Operation::HArrayDataBuilder_elementCount) ? static_cast<unsigned>(impl_->size()) : 0U;
 }

@@ -10,9 +10,9 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::Node;
 using OpenQuarn::NodeClass;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -52,7 +52,7 @@ HFnDependencyNode::HFnDependencyNode(const HObject& node, HStatus* status) {
 }
 
 HObject HFnDependencyNode::create(const HString& typeName, const HString& name, HStatus* status) {
-    return apiValue(FaultPoint::HFnDependencyNode_create, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnDependencyNode_create, status, HObject(), [&](HStatus& outcome) {
         object_ = HObject();
         object_ = createNode(OpenQuarn::findNodeClass(typeName.asStdString()), "'" + typeName.asStdString() + "'", name,
                              outcome);
@@ -61,7 +61,7 @@ HObject HFnDependencyNode::create(const HString& typeName, const HString& name, 
 }
 
 HObject HFnDependencyNode::create(const HTypeId& type, const HString& name, HStatus* status) {
-    return apiValue(FaultPoint::HFnDependencyNode_create, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnDependencyNode_create, status, HObject(), [&](HStatus& outcome) {
         object_ = HObject();
         object_ = createNode(OpenQuarn::findNodeClass(type), OpenQuarn::hexText(type), name, outcome);
         return object_;
@@ -74,7 +74,7 @@ HString HFnDependencyNode::name() const {
 }
 
 HStatus HFnDependencyNode::setName(const HString& name) {
-    return apiCall(FaultPoint::HFnDependencyNode_setName, [&]() -> HStatus {
+    return apiCall(Operation::HFnDependencyNode_setName, [&]() -> HStatus {
         const std::shared_ptr<Node> node = attached(object_);
         if (!node)
             return nothingAttached();
@@ -94,7 +94,7 @@ HTypeId HFnDependencyNode::typeId() const {
 }
 
 HPxNode* HFnDependencyNode::userNode(HStatus* status) const {
-    return apiValue(FaultPoint::HFnDependencyNode_userNode, status, static_cast<HPxNode*>(nullptr),
+    return apiValue(Operation::HFnDependencyNode_userNode, status, static_cast<HPxNode*>(nullptr),
                     [&](HStatus& outcome) -> HPxNode* {
                         const std::shared_ptr<Node> node = attached(object_);
                         if (!node)
@@ -104,7 +104,7 @@ HPxNode* HFnDependencyNode::userNode(HStatus* status) const {
 }
 
 HObject HFnDependencyNode::attribute(const HString& name, HStatus* status) const {
-    return apiValue(FaultPoint::HFnDependencyNode_attribute, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnDependencyNode_attribute, status, HObject(), [&](HStatus& outcome) {
         const std::shared_ptr<Node> node = attached(object_);
         const OpenQuarn::Field* field = node ? node->type().find(name.asStdString()) : nullptr;
         if (field)
@@ -122,7 +122,7 @@ unsigned HFnDependencyNode::attributeCount() const {
 }
 
 HObject HFnDependencyNode::attribute(unsigned index, HStatus* status) const {
-    return apiValue(FaultPoint::HFnDependencyNode_attribute, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnDependencyNode_attribute, status, HObject(), [&](HStatus& outcome) {
         const std::shared_ptr<Node> node = attached(object_);
         if (node && index < node->type().fields().size())
             return attributeObject(*node->type().fields()[index]);
@@ -134,7 +134,7 @@ HObject HFnDependencyNode::attribute(unsigned index, HStatus* status) const {
 }
 
 HPlug HFnDependencyNode::findPlug(const HString& name, HStatus* status) const {
-    return apiValue(FaultPoint::HFnDependencyNode_findPlug, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnDependencyNode_findPlug, status, HPlug(), [&](HStatus& outcome) {
         const std::shared_ptr<Node> node = attached(object_);
         const OpenQuarn::Field* field = node ? node->type().find(name.asStdString()) : nullptr;
         if (field)
@@ -147,7 +147,7 @@ HPlug HFnDependencyNode::findPlug(const HString& name, HStatus* status) const {
 }
 
 HPlug HFnDependencyNode::findPlug(const HObject& attribute, HStatus* status) const {
-    return apiValue(FaultPoint::HFnDependencyNode_findPlug, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnDependencyNode_findPlug, status, HPlug(), [&](HStatus& outcome) {
         HPlug plug(object_, attribute);
         if (plug.isNull())
             outcome = noAttribute(attached(object_), Access::as<OpenQuarn::Attribute>(attribute));
@@ -166,7 +166,7 @@ void addConnected(const OpenQuarn::Slot& slot, HPlugArray& plugs) {
 } // namespace
 
 HStatus HFnDependencyNode::getConnections(HPlugArray& plugs) const {
-    return apiCall(FaultPoint::HFnDependencyNode_getConnections, [&]() -> HStatus {
+    return apiCall(Operation::HFnDependencyNode_getConnections, [&]() -> HStatus {
         const std::shared_ptr<Node> node = attached(object_);
         if (!node)
             return nothingAttached();
@@ -197,7 +197,7 @@ HTypeId HNodeClass::typeId() const {
 }
 
 HObject HNodeClass::attribute(const HString& name, HStatus* status) const {
-    return apiValue(FaultPoint::HNodeClass_attribute, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HNodeClass_attribute, status, HObject(), [&](HStatus& outcome) {
         const auto type = impl_.lock();
         const OpenQuarn::Field* field = type ? type->find(name.asStdString()) : nullptr;
         if (field)

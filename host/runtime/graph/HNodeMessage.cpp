@@ -5,10 +5,10 @@
 #include "graph/Graph.h"
 
 using OpenQuarn::Access;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 HStatus HMessage::removeCallback(HCallbackId id) {
-    return OpenQuarn::apiCall(FaultPoint::HMessage_removeCallback, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HMessage_removeCallback, [&]() -> HStatus {
         OpenQuarn::currentGraph().removeCallback(id);
         return HStatus::kSuccess;
     });
@@ -17,7 +17,7 @@ HStatus HMessage::removeCallback(HCallbackId id) {
 HCallbackId HNodeMessage::addAttributeChangedCallback(const HObject& node, HAttributeChangedFunction function,
                                                       void* clientData, HStatus* status) {
     return OpenQuarn::apiValue(
-        FaultPoint::HNodeMessage_addAttributeChangedCallback, status, HCallbackId{0}, [&](HStatus& outcome) {
+        Operation::HNodeMessage_addAttributeChangedCallback, status, HCallbackId{0}, [&](HStatus& outcome) {
             const auto watched = Access::as<OpenQuarn::Node>(node);
             if (watched && function)
                 return watched->graph().addCallback(*watched, function, clientData);

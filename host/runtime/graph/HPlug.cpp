@@ -16,8 +16,8 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::nearestExisting;
+using OpenQuarn::Operation;
 using OpenQuarn::resolvePlug;
 using OpenQuarn::Slot;
 using OpenQuarn::slotToEvaluate;
@@ -67,7 +67,7 @@ const Slot& orDefault(const HPlug& plug, const std::shared_ptr<Slot>& slot, std:
 }
 
 template <class Value, class Read>
-Value readPlug(const HPlug& plug, FaultPoint point, HStatus* status, Value fallback, Read&& read) {
+Value readPlug(const HPlug& plug, Operation point, HStatus* status, Value fallback, Read&& read) {
     return apiValue(point, status, fallback, [&](HStatus& outcome) {
         std::shared_ptr<Slot> made;
         const std::shared_ptr<Slot> slot = evaluated(plug, outcome);
@@ -93,7 +93,7 @@ std::string setRefusal(const HPlug& plug, const HPlug::Impl& impl, Put&& put) {
 
 /// Runs `put` on the plug's slot when it may be set, then announces the change.
 template <class Put>
-HStatus setPlug(const HPlug& plug, FaultPoint point, Put&& put) {
+HStatus setPlug(const HPlug& plug, Operation point, Put&& put) {
     return apiCall(point, [&]() -> HStatus {
         const HPlug::Impl* impl = OpenQuarn::plugImpl(plug);
         if (!impl)
@@ -113,7 +113,7 @@ HStatus setPlug(const HPlug& plug, FaultPoint point, Put&& put) {
     });
 }
 
-HStatus setNumber(const HPlug& plug, FaultPoint point, double value) {
+HStatus setNumber(const HPlug& plug, Operation point, double value) {
     return setPlug(plug, point, [value](Slot& slot) { return putNumber(slot, slot.field.attribute->limited(value)); });
 }
 
@@ -195,7 +195,7 @@ bool HPlug::isChild() const {
 }
 
 unsigned HPlug::logicalIndex(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_logicalIndex, status, 0U, [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_logicalIndex, status, 0U, [&](HStatus& outcome) {
         if (isElement())
             return *impl_->indices.back();
         outcome = failed(*this, "is not an element of an array");
@@ -204,7 +204,7 @@ unsigned HPlug::logicalIndex(HStatus* status) const {
 }
 
 unsigned HPlug::numElements(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_numElements, status, 0U, [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_numElements, status, 0U, [&](HStatus& outcome) {
         if (!isArray()) {
             outcome = failed(*this, "is not an array");
             return 0U;
@@ -215,7 +215,7 @@ unsigned HPlug::numElements(HStatus* status) const {
 }
 
 HStatus HPlug::getExistingArrayAttributeIndices(std::vector<unsigned>& indices) const {
-    return apiCall(FaultPoint::HPlug_getExistingArrayAttributeIndices, [&]() -> HStatus {
+    return apiCall(Operation::HPlug_getExistingArrayAttributeIndices, [&]() -> HStatus {
         if (!isArray())
             return failed(*this, "is not an array");
         indices.clear();
@@ -239,7 +239,7 @@ HPlug elementOf(const HPlug::Impl& array, unsigned index) {
 } // namespace
 
 HPlug HPlug::elementByLogicalIndex(unsigned index, HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_elementByLogicalIndex, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_elementByLogicalIndex, status, HPlug(), [&](HStatus& outcome) {
         if (isArray())
             return elementOf(*impl_, index);
         outcome = failed(*this, "is not an array");
@@ -248,7 +248,7 @@ HPlug HPlug::elementByLogicalIndex(unsigned index, HStatus* status) const {
 }
 
 HPlug HPlug::elementByPhysicalIndex(unsigned position, HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_elementByPhysicalIndex, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_elementByPhysicalIndex, status, HPlug(), [&](HStatus& outcome) {
         const std::shared_ptr<Slot> slot = isArray() ? resolvePlug(*this) : nullptr;
         const auto* entry = slot ? slot->elements().at(position) : nullptr;
         if (entry)
@@ -259,7 +259,7 @@ HPlug HPlug::elementByPhysicalIndex(unsigned position, HStatus* status) const {
 }
 
 HPlug HPlug::array(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_array, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_array, status, HPlug(), [&](HStatus& outcome) {
         if (!isElement()) {
             outcome = failed(*this, "is not an element of an array");
             return HPlug();
@@ -271,7 +271,7 @@ HPlug HPlug::array(HStatus* status) const {
 }
 
 unsigned HPlug::numChildren(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_numChildren, status, 0U, [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_numChildren, status, 0U, [&](HStatus& outcome) {
         if (!isNull() && impl_->field->isCompound())
             return static_cast<unsigned>(impl_->field->children.size());
         outcome = failed(*this, "is not a compound");
@@ -292,7 +292,7 @@ HPlug childOf(const HPlug::Impl& parent, const OpenQuarn::Field& field) {
 } // namespace
 
 HPlug HPlug::child(unsigned number, HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_child, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_child, status, HPlug(), [&](HStatus& outcome) {
         if (!isNull() && number < impl_->field->children.size())
             return childOf(*impl_, *impl_->field->children[number]);
         outcome = failed(*this, "has no child number " + std::to_string(number));
@@ -301,7 +301,7 @@ HPlug HPlug::child(unsigned number, HStatus* status) const {
 }
 
 HPlug HPlug::child(const HObject& attribute, HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_child, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_child, status, HPlug(), [&](HStatus& outcome) {
         const auto wanted = Access::as<OpenQuarn::Attribute>(attribute);
         const OpenQuarn::Field* field = !isNull() && wanted ? impl_->node->type().find(*wanted) : nullptr;
         if (field && field->parent == impl_->field)
@@ -312,7 +312,7 @@ HPlug HPlug::child(const HObject& attribute, HStatus* status) const {
 }
 
 HPlug HPlug::parent(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_parent, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_parent, status, HPlug(), [&](HStatus& outcome) {
         if (!isChild()) {
             outcome = failed(*this, "is not a child of a compound");
             return HPlug();
@@ -326,7 +326,7 @@ HPlug HPlug::parent(HStatus* status) const {
 }
 
 HStatus HPlug::selectAncestorLogicalIndex(unsigned index, const HObject& ancestor) {
-    return apiCall(FaultPoint::HPlug_selectAncestorLogicalIndex, [&]() -> HStatus {
+    return apiCall(Operation::HPlug_selectAncestorLogicalIndex, [&]() -> HStatus {
         if (isNull())
             return nullPlug();
         const auto wanted = Access::as<OpenQuarn::Attribute>(ancestor);
@@ -378,7 +378,7 @@ std::shared_ptr<Slot> partBelow(const std::shared_ptr<Slot>& source, const Slot&
 } // namespace
 
 HPlug HPlug::source(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_source, status, HPlug(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_source, status, HPlug(), [&](HStatus& outcome) {
         if (isNull()) {
             outcome = nullPlug();
             return HPlug();
@@ -394,7 +394,7 @@ HPlug HPlug::source(HStatus* status) const {
 }
 
 HStatus HPlug::destinations(HPlugArray& plugs) const {
-    return apiCall(FaultPoint::HPlug_destinations, [&]() -> HStatus {
+    return apiCall(Operation::HPlug_destinations, [&]() -> HStatus {
         if (isNull())
             return nullPlug();
         plugs.clear();
@@ -414,7 +414,7 @@ bool HPlug::isLocked() const {
 }
 
 HStatus HPlug::setLocked(bool on) {
-    return apiCall(FaultPoint::HPlug_setLocked, [&]() -> HStatus {
+    return apiCall(Operation::HPlug_setLocked, [&]() -> HStatus {
         const std::shared_ptr<Slot> slot = resolvePlug(*this, true);
         if (!slot)
             return isNull() ? nullPlug() : failed(*this, "does not name one value: an index is not chosen");
@@ -424,65 +424,65 @@ HStatus HPlug::setLocked(bool on) {
 }
 
 bool HPlug::asBool(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asBool, status, false,
+    return readPlug(*this, Operation::HPlug_asBool, status, false,
                     [](const Slot& slot) { return numberIn(slot) != 0.0; });
 }
 short HPlug::asShort(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asShort, status, short{0}, [](const Slot& slot) { return shortIn(slot); });
+    return readPlug(*this, Operation::HPlug_asShort, status, short{0}, [](const Slot& slot) { return shortIn(slot); });
 }
 int HPlug::asInt(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asInt, status, 0, [](const Slot& slot) { return intIn(slot); });
+    return readPlug(*this, Operation::HPlug_asInt, status, 0, [](const Slot& slot) { return intIn(slot); });
 }
 float HPlug::asFloat(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asFloat, status, 0.0F,
+    return readPlug(*this, Operation::HPlug_asFloat, status, 0.0F,
                     [](const Slot& slot) { return static_cast<float>(numberIn(slot)); });
 }
 double HPlug::asDouble(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asDouble, status, 0.0, [](const Slot& slot) { return numberIn(slot); });
+    return readPlug(*this, Operation::HPlug_asDouble, status, 0.0, [](const Slot& slot) { return numberIn(slot); });
 }
 HString HPlug::asString(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asString, status, HString(),
+    return readPlug(*this, Operation::HPlug_asString, status, HString(),
                     [](const Slot& slot) { return HString(textIn(slot)); });
 }
 HMatrix HPlug::asMatrix(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asMatrix, status, HMatrix(),
+    return readPlug(*this, Operation::HPlug_asMatrix, status, HMatrix(),
                     [](const Slot& slot) { return OpenQuarn::toMatrix(matrixIn(slot)); });
 }
 HObject HPlug::asHObject(HStatus* status) const {
-    return readPlug(*this, FaultPoint::HPlug_asHObject, status, HObject(),
+    return readPlug(*this, Operation::HPlug_asHObject, status, HObject(),
                     [](const Slot& slot) { return Access::object(slot.data); });
 }
 
 HStatus HPlug::setBool(bool value) {
-    return setNumber(*this, FaultPoint::HPlug_setBool, value ? 1.0 : 0.0);
+    return setNumber(*this, Operation::HPlug_setBool, value ? 1.0 : 0.0);
 }
 HStatus HPlug::setShort(short value) {
-    return setNumber(*this, FaultPoint::HPlug_setShort, value);
+    return setNumber(*this, Operation::HPlug_setShort, value);
 }
 HStatus HPlug::setInt(int value) {
-    return setNumber(*this, FaultPoint::HPlug_setInt, value);
+    return setNumber(*this, Operation::HPlug_setInt, value);
 }
 HStatus HPlug::setFloat(float value) {
-    return setNumber(*this, FaultPoint::HPlug_setFloat, static_cast<double>(value));
+    return setNumber(*this, Operation::HPlug_setFloat, static_cast<double>(value));
 }
 HStatus HPlug::setDouble(double value) {
-    return setNumber(*this, FaultPoint::HPlug_setDouble, value);
+    return setNumber(*this, Operation::HPlug_setDouble, value);
 }
 
 HStatus HPlug::setString(const HString& value) {
-    return setPlug(*this, FaultPoint::HPlug_setString, [&](Slot& slot) {
+    return setPlug(*this, Operation::HPlug_setString, [&](Slot& slot) {
         return putData(slot, std::make_shared<OpenQuarn::StringData>(value.asStdString()));
     });
 }
 
 HStatus HPlug::setMatrix(const HMatrix& value) {
-    return setPlug(*this, FaultPoint::HPlug_setMatrix, [&](Slot& slot) {
+    return setPlug(*this, Operation::HPlug_setMatrix, [&](Slot& slot) {
         return putData(slot, std::make_shared<OpenQuarn::MatrixData>(OpenQuarn::fromMatrix(value)));
     });
 }
 
 HStatus HPlug::setHObject(const HObject& data) {
-    return setPlug(*this, FaultPoint::HPlug_setHObject, [&](Slot& slot) -> std::string {
+    return setPlug(*this, Operation::HPlug_setHObject, [&](Slot& slot) -> std::string {
         const auto value = Access::as<OpenQuarn::Data>(data);
         if (!value && !data.isNull())
             return "the object is not a piece of data";
@@ -491,7 +491,7 @@ HStatus HPlug::setHObject(const HObject& data) {
 }
 
 HDataHandle HPlug::asHDataHandle(HStatus* status) const {
-    return apiValue(FaultPoint::HPlug_asHDataHandle, status, HDataHandle(), [&](HStatus& outcome) {
+    return apiValue(Operation::HPlug_asHDataHandle, status, HDataHandle(), [&](HStatus& outcome) {
         std::shared_ptr<Slot> slot = evaluated(*this, outcome);
         if (!slot && !outcome.error())
             outcome = failed(*this, "does not exist");
@@ -500,7 +500,7 @@ HDataHandle HPlug::asHDataHandle(HStatus* status) const {
 }
 
 HStatus HPlug::destructHandle(HDataHandle& handle) const {
-    return apiCall(FaultPoint::HPlug_destructHandle, [&]() -> HStatus {
+    return apiCall(Operation::HPlug_destructHandle, [&]() -> HStatus {
         if (!handle.isValid())
             return {HStatus::kInvalidParameter, "the data handle is not valid"};
         handle = HDataHandle();

@@ -2,7 +2,6 @@
 #include "openquarn/HPxNode.h"
 
 #include "core/apiCall.h"
-#include "core/threads.h"
 #include "graph/Context.h"
 #include "graph/Graph.h"
 #include "graph/evaluation.h"
@@ -15,9 +14,8 @@
 
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 const HObject HPxNode::message = Access::object(OpenQuarn::messageAttribute());
 
@@ -59,7 +57,7 @@ HTypeId HPxNode::typeId() const {
 }
 
 HDataBlock HPxNode::forceCache() {
-    const auto node = isRefused(ThreadTag::eval, "HPxNode::forceCache") ? nullptr : impl_.lock();
+    const auto node = isRefused(Operation::HPxNode_forceCache) ? nullptr : impl_.lock();
     return node ? Access::make<HDataBlock>(dataInCurrentContext(*node)) : HDataBlock();
 }
 
@@ -67,12 +65,12 @@ namespace {
 
 /// Runs `change` on the type whose initializer is running.
 template <class Change>
-HStatus changeType(FaultPoint point, Change&& change) {
+HStatus changeType(Operation point, Change&& change) {
     return apiCall(point, [&]() -> HStatus {
         OpenQuarn::NodeClass* type = OpenQuarn::ClassUnderConstruction::current();
         if (!type)
             return {HStatus::kFailure,
-                    std::string(OpenQuarn::faultPointName(point)) + ": no node type is being registered"};
+                    std::string(OpenQuarn::operationName(point)) + ": no node type is being registered"};
         return change(*type);
     });
 }
@@ -80,7 +78,7 @@ HStatus changeType(FaultPoint point, Change&& change) {
 } // namespace
 
 HStatus HPxNode::addAttribute(const HObject& attribute) {
-    return changeType(FaultPoint::HPxNode_addAttribute, [&](OpenQuarn::NodeClass& type) -> HStatus {
+    return changeType(Operation::HPxNode_addAttribute, [&](OpenQuarn::NodeClass& type) -> HStatus {
         const auto added = Access::as<OpenQuarn::Attribute>(attribute);
         if (!added)
             return {HStatus::kInvalidParameter, "the object is no attribute"};
@@ -94,7 +92,7 @@ HStatus HPxNode::attributeAffects(const HObject& affecting, const HObject& affec
 }
 
 HStatus HPxNode::attributeAffects(const HObject& affecting, const HObject& affected, bool affectsTree) {
-    return changeType(FaultPoint::HPxNode_attributeAffects, [&](OpenQuarn::NodeClass& type) -> HStatus {
+    return changeType(Operation::HPxNode_attributeAffects, [&](OpenQuarn::NodeClass& type) -> HStatus {
         const auto from = Access::as<OpenQuarn::Attribute>(affecting);
         const auto to = Access::as<OpenQuarn::Attribute>(affected);
         if (!from || !to)
@@ -149,7 +147,7 @@ void HPxNode::getExternalContent(HExternalContentInfoTable&) const {}
 void HPxNode::setExternalContent(const HExternalContentLocationTable&) {}
 
 HStatus HPxNode::addExternalContentForFileAttr(HExternalContentInfoTable& table, const HObject& attribute) const {
-    return apiCall(FaultPoint::HPxNode_addExternalContentForFileAttr, [&]() -> HStatus {
+    return apiCall(Operation::HPxNode_addExternalContentForFileAttr, [&]() -> HStatus {
         const auto node = impl_.lock();
         const auto slot = textSlot(node.get(), attribute);
         if (!slot)
@@ -165,7 +163,7 @@ HStatus HPxNode::addExternalContentForFileAttr(HExternalContentInfoTable& table,
 }
 
 HStatus HPxNode::setExternalContentForFileAttr(const HObject& attribute, const HExternalContentLocationTable& table) {
-    return apiCall(FaultPoint::HPxNode_setExternalContentForFileAttr, [&]() -> HStatus {
+    return apiCall(Operation::HPxNode_setExternalContentForFileAttr, [&]() -> HStatus {
         const auto node = impl_.lock();
         const auto slot = textSlot(node.get(), attribute);
         if (!slot)

@@ -10,7 +10,7 @@
 
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 HStatus HSelectionList::addItem(Item item) {
     const bool present = std::any_of(items_.begin(), items_.end(), [&](const Item& other) {
@@ -22,7 +22,7 @@ HStatus HSelectionList::addItem(Item item) {
 }
 
 HStatus HSelectionList::add(const HString& name) {
-    return apiCall(FaultPoint::HSelectionList_add, [&]() -> HStatus {
+    return apiCall(Operation::HSelectionList_add, [&]() -> HStatus {
         const OpenQuarn::Graph& graph = OpenQuarn::currentGraph();
         const std::string& text = name.asStdString();
         try {
@@ -48,7 +48,7 @@ HStatus HSelectionList::add(const HString& name) {
 }
 
 HStatus HSelectionList::add(const HObject& node) {
-    return apiCall(FaultPoint::HSelectionList_add, [&]() -> HStatus {
+    return apiCall(Operation::HSelectionList_add, [&]() -> HStatus {
         if (!node.hasFn(HFn::kDependencyNode))
             return {HStatus::kInvalidParameter, "the object is no node"};
         return addItem({node, HPlug()});
@@ -56,7 +56,7 @@ HStatus HSelectionList::add(const HObject& node) {
 }
 
 HStatus HSelectionList::add(const HPlug& plug) {
-    return apiCall(FaultPoint::HSelectionList_add, [&]() -> HStatus {
+    return apiCall(Operation::HSelectionList_add, [&]() -> HStatus {
         if (plug.isNull())
             return {HStatus::kInvalidParameter, "the plug is null"};
         return addItem({HObject(), plug});
@@ -73,7 +73,7 @@ HStatus noEntry(unsigned index, unsigned length) {
 } // namespace
 
 HStatus HSelectionList::getDependNode(unsigned index, HObject& node) const {
-    return apiCall(FaultPoint::HSelectionList_getDependNode, [&]() -> HStatus {
+    return apiCall(Operation::HSelectionList_getDependNode, [&]() -> HStatus {
         if (index >= items_.size())
             return noEntry(index, length());
         const Item& item = items_[index];
@@ -86,7 +86,7 @@ HStatus HSelectionList::getDependNode(unsigned index, HObject& node) const {
 }
 
 HStatus HSelectionList::getPlug(unsigned index, HPlug& plug) const {
-    return apiCall(FaultPoint::HSelectionList_getPlug, [&]() -> HStatus {
+    return apiCall(Operation::HSelectionList_getPlug, [&]() -> HStatus {
         if (index >= items_.size())
             return noEntry(index, length());
         if (items_[index].plug.isNull())

@@ -9,7 +9,7 @@
 #include <string>
 #include <utility>
 
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -39,7 +39,7 @@ Name nameOf(const HStringResourceId& id) {
 } // namespace
 
 HStatus HStringResource::registerString(const HStringResourceId& id) {
-    return OpenQuarn::apiCall(FaultPoint::HStringResource_registerString, [&]() -> HStatus {
+    return OpenQuarn::apiCall(Operation::HStringResource_registerString, [&]() -> HStatus {
         HStatus status = checkId(id);
         if (status.error())
             return status;
@@ -51,7 +51,7 @@ HStatus HStringResource::registerString(const HStringResourceId& id) {
 }
 
 HString HStringResource::getString(const HStringResourceId& id, HStatus& status) {
-    return OpenQuarn::apiValue(FaultPoint::HStringResource_getString, &status, HString(), [&](HStatus& s) -> HString {
+    return OpenQuarn::apiValue(Operation::HStringResource_getString, &status, HString(), [&](HStatus& s) -> HString {
         s = checkId(id);
         if (s.error())
             return {};

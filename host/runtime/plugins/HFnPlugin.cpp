@@ -3,7 +3,6 @@
 
 #include "core/apiCall.h"
 #include "core/text.h"
-#include "core/threads.h"
 #include "plugins/Library.h"
 #include "plugins/Plugin.h"
 #include "types/baseNodes.h"
@@ -12,11 +11,10 @@
 #include <string_view>
 
 using OpenQuarn::apiCall;
-using OpenQuarn::FaultPoint;
 using OpenQuarn::isRefused;
+using OpenQuarn::Operation;
 using OpenQuarn::Plugin;
 using OpenQuarn::Registration;
-using OpenQuarn::ThreadTag;
 
 namespace {
 
@@ -26,7 +24,7 @@ std::shared_ptr<Plugin> pluginOf(const HFnBase& set) {
 
 /// Wraps an operation on the attached plug-in.
 template <class Body>
-HStatus pluginCall(const HFnBase& set, FaultPoint point, Body&& body) {
+HStatus pluginCall(const HFnBase& set, Operation point, Body&& body) {
     return apiCall(point, [&]() -> HStatus {
         const std::shared_ptr<Plugin> plugin = pluginOf(set);
         if (!plugin)
@@ -36,8 +34,8 @@ HStatus pluginCall(const HFnBase& set, FaultPoint point, Body&& body) {
 }
 
 /// Null too when the function may not be called on this thread.
-std::shared_ptr<Plugin> readablePlugin(const HFnBase& set, const char* function) {
-    return isRefused(ThreadTag::main, function) ? nullptr : pluginOf(set);
+std::shared_ptr<Plugin> readablePlugin(const HFnBase& set, Operation operation) {
+    return isRefused(operation) ? nullptr : pluginOf(set);
 }
 
 HStatus unusable(const HString& name, const HTypeId& id, const char* what) {
@@ -65,29 +63,29 @@ HFnPlugin::HFnPlugin(const HObject& plugin, const char* vendor, const char* vers
 HFnPlugin::~HFnPlugin() = default;
 
 HString HFnPlugin::name() const {
-    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::name");
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, Operation::HFnPlugin_name);
     return plugin ? HString(plugin->name) : HString();
 }
 HString HFnPlugin::vendor() const {
-    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::vendor");
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, Operation::HFnPlugin_vendor);
     return plugin ? HString(plugin->vendor()) : HString();
 }
 HString HFnPlugin::version() const {
-    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::version");
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, Operation::HFnPlugin_version);
     return plugin ? HString(plugin->version()) : HString();
 }
 HString HFnPlugin::apiVersion() const {
-    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::apiVersion");
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, Operation::HFnPlugin_apiVersion);
     return plugin ? HString(plugin->apiVersion) : HString();
 }
 HString HFnPlugin::loadPath() const {
-    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, "HFnPlugin::loadPath");
+    const std::shared_ptr<Plugin> plugin = readablePlugin(*this, Operation::HFnPlugin_loadPath);
     return plugin ? HString(std::filesystem::path(plugin->path).parent_path().string()) : HString();
 }
 
 HStatus HFnPlugin::registerNode(const HString& typeName, const HTypeId& id, HPxNode* (*creator)(),
                                 HStatus (*initializer)(), HPxNode::Type type) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_registerNode, [&](Plugin& plugin) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_registerNode, [&](Plugin& plugin) -> HStatus {
         if (!OpenQuarn::isIdentifier(typeName.asStdString()) || id.id() == 0 || !creator)
             return unusable(typeName, id, "a node type needs an identifier for its name, an id and a creator");
         if (!OpenQuarn::hasBaseClass(type))
@@ -98,14 +96,14 @@ HStatus HFnPlugin::registerNode(const HString& typeName, const HTypeId& id, HPxN
 }
 
 HStatus HFnPlugin::deregisterNode(const HTypeId& id) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_deregisterNode, [&](Plugin& plugin) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_deregisterNode, [&](Plugin& plugin) -> HStatus {
         plugin.deregister(Registration::Kind::node, id);
         return HStatus::kSuccess;
     });
 }
 
 HStatus HFnPlugin::registerData(const HString& typeName, const HTypeId& id, HPxData* (*creator)(), HPxData::Type type) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_registerData, [&](Plugin& plugin) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_registerData, [&](Plugin& plugin) -> HStatus {
         if (typeName.isEmpty() || id.id() == 0 || !creator || type != HPxData::kData)
             return unusable(typeName, id, "a data type needs a name, an id, a creator and the kind kData");
         plugin.registerData(typeName.asStdString(), id, creator);
@@ -114,27 +112,27 @@ HStatus HFnPlugin::registerData(const HString& typeName, const HTypeId& id, HPxD
 }
 
 HStatus HFnPlugin::deregisterData(const HTypeId& id) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_deregisterData, [&](Plugin& plugin) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_deregisterData, [&](Plugin& plugin) -> HStatus {
         plugin.deregister(Registration::Kind::data, id);
         return HStatus::kSuccess;
     });
 }
 
 HStatus HFnPlugin::registerCommand(const HString& name, HPxCommand* (*creator)(), HSyntax (*syntax)()) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_registerCommand, [&](Plugin& plugin) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_registerCommand, [&](Plugin& plugin) -> HStatus {
         return plugin.registerCommand(name.asStdString(), creator, syntax);
     });
 }
 
 HStatus HFnPlugin::deregisterCommand(const HString& name) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_deregisterCommand, [&](Plugin& plugin) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_deregisterCommand, [&](Plugin& plugin) -> HStatus {
         plugin.deregister(Registration::Kind::command, name.asStdString());
         return HStatus::kSuccess;
     });
 }
 
 HStatus HFnPlugin::registerUIStrings(HStatus (*registrar)(), const HString& resourceFile) {
-    return pluginCall(*this, FaultPoint::HFnPlugin_registerUIStrings, [&](Plugin&) -> HStatus {
+    return pluginCall(*this, Operation::HFnPlugin_registerUIStrings, [&](Plugin&) -> HStatus {
         if (!registrar || !resourceFile.isEmpty())
             return {HStatus::kInvalidParameter,
                     "texts are registered by a function, and from no file: '" + resourceFile.asStdString() + "'"};

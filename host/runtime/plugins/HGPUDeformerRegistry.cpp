@@ -8,7 +8,7 @@
 #include <stdexcept>
 
 using OpenQuarn::apiCall;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 using OpenQuarn::Plugin;
 using OpenQuarn::Registration;
 
@@ -25,7 +25,7 @@ Plugin& activePlugin() {
 
 HStatus HGPUDeformerRegistry::registerGPUDeformerCreator(const HString& nodeType, const HString& registrantId,
                                                          HGPUDeformerRegistrationInfo* info) {
-    return apiCall(FaultPoint::HGPUDeformerRegistry_registerGPUDeformerCreator, [&]() -> HStatus {
+    return apiCall(Operation::HGPUDeformerRegistry_registerGPUDeformerCreator, [&]() -> HStatus {
         if (nodeType.isEmpty() || registrantId.isEmpty() || !info)
             return {HStatus::kInvalidParameter, "a GPU deformer needs a node type, a registrant and an object: '" +
                                                     nodeType.asStdString() + "', '" + registrantId.asStdString() + "'"};
@@ -35,7 +35,7 @@ HStatus HGPUDeformerRegistry::registerGPUDeformerCreator(const HString& nodeType
 }
 
 HStatus HGPUDeformerRegistry::deregisterGPUDeformerCreator(const HString& nodeType, const HString& registrantId) {
-    return apiCall(FaultPoint::HGPUDeformerRegistry_deregisterGPUDeformerCreator, [&]() -> HStatus {
+    return apiCall(Operation::HGPUDeformerRegistry_deregisterGPUDeformerCreator, [&]() -> HStatus {
         std::string registrant;
         if (activePlugin().hasTakenBack(Registration::Kind::gpuDeformer, nodeType.asStdString()))
             return HStatus::kSuccess;

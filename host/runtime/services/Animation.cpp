@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn_app/Animation.h"
 
-#include "core/threads.h"
+#include "core/Operations.h"
 #include "openquarn/HAnimControl.h"
 #include "openquarn/HDGContext.h"
 #include "services/AnimationState.h"
@@ -44,7 +44,7 @@ void Animation::setRange(double startFrame, double endFrame) {
 
 using OpenQuarn::animationState;
 using OpenQuarn::isRefused;
-using OpenQuarn::ThreadTag;
+using OpenQuarn::Operation;
 
 bool HAnimControl::isPlaying() noexcept {
     return animationState().isPlaying;
@@ -55,7 +55,7 @@ bool HAnimControl::isScrubbing() noexcept {
 }
 
 HTime HAnimControl::currentTime() noexcept {
-    return isRefused(ThreadTag::eval, "HAnimControl::currentTime") ? HTime() : HTime(HDGContext().time());
+    return isRefused(Operation::HAnimControl_currentTime) ? HTime() : HTime(HDGContext().time());
 }
 
 HTime HAnimControl::animationStartTime() noexcept {

@@ -7,7 +7,7 @@
 
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -58,7 +58,7 @@ HStatus HExternalContentInfoTable::add(HExternalContentInfo info) {
 
 HStatus HExternalContentInfoTable::addUnresolvedEntry(const HString& key, const HString& unresolvedLocation,
                                                       const HString& contextNode, const HString& role) {
-    return apiCall(FaultPoint::HExternalContentInfoTable_addUnresolvedEntry, [&]() -> HStatus {
+    return apiCall(Operation::HExternalContentInfoTable_addUnresolvedEntry, [&]() -> HStatus {
         return add({key, unresolvedLocation, {}, contextNode, role, false});
     });
 }
@@ -66,13 +66,13 @@ HStatus HExternalContentInfoTable::addUnresolvedEntry(const HString& key, const 
 HStatus HExternalContentInfoTable::addResolvedEntry(const HString& key, const HString& unresolvedLocation,
                                                     const HString& resolvedLocation, const HString& contextNode,
                                                     const HString& role) {
-    return apiCall(FaultPoint::HExternalContentInfoTable_addResolvedEntry, [&]() -> HStatus {
+    return apiCall(Operation::HExternalContentInfoTable_addResolvedEntry, [&]() -> HStatus {
         return add({key, unresolvedLocation, resolvedLocation, contextNode, role, true});
     });
 }
 
 HString HExternalContentInfoTable::key(unsigned index, HStatus* status) const {
-    return apiValue(FaultPoint::HExternalContentInfoTable_key, status, HString(), [&](HStatus& s) -> HString {
+    return apiValue(Operation::HExternalContentInfoTable_key, status, HString(), [&](HStatus& s) -> HString {
         if (index < entries_.size())
             return entries_[index].key;
         s = noSuchIndex(index, entries_.size());
@@ -81,7 +81,7 @@ HString HExternalContentInfoTable::key(unsigned index, HStatus* status) const {
 }
 
 HStatus HExternalContentInfoTable::getInfo(const HString& key, HExternalContentInfo& info) const {
-    return apiCall(FaultPoint::HExternalContentInfoTable_getInfo, [&]() -> HStatus {
+    return apiCall(Operation::HExternalContentInfoTable_getInfo, [&]() -> HStatus {
         const auto found = indexOf_.find(key.asStdString());
         if (found == indexOf_.end())
             return noSuchKey(key);
@@ -92,7 +92,7 @@ HStatus HExternalContentInfoTable::getInfo(const HString& key, HExternalContentI
 }
 
 HStatus HExternalContentLocationTable::addEntry(const HString& key, const HString& location) {
-    return apiCall(FaultPoint::HExternalContentLocationTable_addEntry, [&]() -> HStatus {
+    return apiCall(Operation::HExternalContentLocationTable_addEntry, [&]() -> HStatus {
         HStatus status = checkNewKey(indexOf_, key);
         if (!status.error())
             append(indexOf_, entries_, key, std::pair(key, location));
@@ -101,7 +101,7 @@ HStatus HExternalContentLocationTable::addEntry(const HString& key, const HStrin
 }
 
 HString HExternalContentLocationTable::key(unsigned index, HStatus* status) const {
-    return apiValue(FaultPoint::HExternalContentLocationTable_key, status, HString(), [&](HStatus& s) -> HString {
+    return apiValue(Operation::HExternalContentLocationTable_key, status, HString(), [&](HStatus& s) -> HString {
         if (index < entries_.size())
             return entries_[index].first;
         s = noSuchIndex(index, entries_.size());
@@ -110,7 +110,7 @@ HString HExternalContentLocationTable::key(unsigned index, HStatus* status) cons
 }
 
 HStatus HExternalContentLocationTable::getLocation(const HString& key, HString& location) const {
-    return apiCall(FaultPoint::HExternalContentLocationTable_getLocation, [&]() -> HStatus {
+    return apiCall(Operation::HExternalContentLocationTable_getLocation, [&]() -> HStatus {
         const auto found = indexOf_.find(key.asStdString());
         if (found == indexOf_.end())
             return noSuchKey(key);

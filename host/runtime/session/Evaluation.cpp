@@ -34,12 +34,12 @@ HStatus pullPlug(const HPlug& plug) noexcept {
 } // namespace
 
 HStatus evaluate(const HPlug& plug) {
-    const HStatus refused = threadStatus(ThreadTag::main, "evaluate");
+    const HStatus refused = threadStatus({"evaluate", ThreadTag::main});
     return refused.error() ? refused : pullPlug(plug);
 }
 
 HStatus evaluate(const HPlugArray& plugs, bool parallel) {
-    if (HStatus refused = threadStatus(ThreadTag::main, "evaluate"); refused.error())
+    if (HStatus refused = threadStatus({"evaluate", ThreadTag::main}); refused.error())
         return refused;
     std::vector<HStatus> statuses(plugs.size());
     if (parallel) {
@@ -59,7 +59,7 @@ HStatus evaluate(const HPlugArray& plugs, bool parallel) {
 }
 
 HStatus makeDirty(const HPlug& plug) {
-    if (HStatus refused = threadStatus(ThreadTag::main, "makeDirty"); refused.error())
+    if (HStatus refused = threadStatus({"makeDirty", ThreadTag::main}); refused.error())
         return refused;
     const std::shared_ptr<Slot> slot = resolvePlug(plug);
     if (!slot)
@@ -70,7 +70,7 @@ HStatus makeDirty(const HPlug& plug) {
 }
 
 HStatus makeDirty(const HObject& node) {
-    if (HStatus refused = threadStatus(ThreadTag::main, "makeDirty"); refused.error())
+    if (HStatus refused = threadStatus({"makeDirty", ThreadTag::main}); refused.error())
         return refused;
     const auto found = Access::as<Node>(node);
     if (!found)
@@ -116,7 +116,7 @@ void EvaluationContext::setTime(double frame) {
 
 HDataHandle EvaluationContext::evaluateAt(const HPlug& plug, HStatus* status) {
     const ContextScope scope(&impl_->context);
-    HStatus outcome = threadStatus(ThreadTag::main, "EvaluationContext::evaluateAt");
+    HStatus outcome = threadStatus({"EvaluationContext::evaluateAt", ThreadTag::main});
     std::shared_ptr<Slot> slot;
     if (!outcome.error()) {
         outcome = pullPlug(plug);

@@ -61,7 +61,7 @@ void appendTree(const NodeClass& type, const Field& field, std::vector<Attribute
 } // namespace
 
 std::vector<std::string> nodeTypes() {
-    requireThread(ThreadTag::main, "nodeTypes");
+    requireThread({"nodeTypes", ThreadTag::main});
     std::vector<std::string> names;
     const std::vector<std::shared_ptr<const NodeClass>> types = nodeClasses();
     names.reserve(types.size());
@@ -71,7 +71,7 @@ std::vector<std::string> nodeTypes() {
 }
 
 std::vector<AttributeInfo> attributesOf(const std::string& nodeType) {
-    requireThread(ThreadTag::main, "attributesOf");
+    requireThread({"attributesOf", ThreadTag::main});
     const std::shared_ptr<const NodeClass> type = typeNamed(nodeType);
     std::vector<AttributeInfo> all;
     for (const std::unique_ptr<Field>& field : type->fields())
@@ -80,7 +80,7 @@ std::vector<AttributeInfo> attributesOf(const std::string& nodeType) {
 }
 
 std::vector<AffectsInfo> dependenciesOf(const std::string& nodeType) {
-    requireThread(ThreadTag::main, "dependenciesOf");
+    requireThread({"dependenciesOf", ThreadTag::main});
     const std::shared_ptr<const NodeClass> type = typeNamed(nodeType);
     std::vector<AffectsInfo> all;
     all.reserve(type->declarations().size());

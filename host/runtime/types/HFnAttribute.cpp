@@ -13,7 +13,7 @@ using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
 using OpenQuarn::Attribute;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -27,7 +27,7 @@ HStatus nothingAttached() {
 
 /// Runs `change` on the attached attribute while it may still be changed.
 template <class Change>
-HStatus changeAttribute(const HObject& object, FaultPoint point, Change&& change) {
+HStatus changeAttribute(const HObject& object, Operation point, Change&& change) {
     return apiCall(point, [&]() -> HStatus {
         const std::shared_ptr<Attribute> attribute = attached(object);
         if (!attribute)
@@ -38,7 +38,7 @@ HStatus changeAttribute(const HObject& object, FaultPoint point, Change&& change
     });
 }
 
-HStatus setFlag(const HObject& object, FaultPoint point, bool Attribute::*flag, bool on) {
+HStatus setFlag(const HObject& object, Operation point, bool Attribute::*flag, bool on) {
     return changeAttribute(object, point, [&](Attribute& attribute) -> HStatus {
         attribute.*flag = on;
         return HStatus::kSuccess;
@@ -118,38 +118,38 @@ HFnAttribute::DisconnectBehavior HFnAttribute::disconnectBehavior() const {
 }
 
 HStatus HFnAttribute::setArray(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setArray, &Attribute::array, on);
+    return setFlag(object_, Operation::HFnAttribute_setArray, &Attribute::array, on);
 }
 HStatus HFnAttribute::setReadable(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setReadable, &Attribute::readable, on);
+    return setFlag(object_, Operation::HFnAttribute_setReadable, &Attribute::readable, on);
 }
 HStatus HFnAttribute::setWritable(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setWritable, &Attribute::writable, on);
+    return setFlag(object_, Operation::HFnAttribute_setWritable, &Attribute::writable, on);
 }
 HStatus HFnAttribute::setConnectable(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setConnectable, &Attribute::connectable, on);
+    return setFlag(object_, Operation::HFnAttribute_setConnectable, &Attribute::connectable, on);
 }
 HStatus HFnAttribute::setStorable(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setStorable, &Attribute::storable, on);
+    return setFlag(object_, Operation::HFnAttribute_setStorable, &Attribute::storable, on);
 }
 HStatus HFnAttribute::setKeyable(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setKeyable, &Attribute::keyable, on);
+    return setFlag(object_, Operation::HFnAttribute_setKeyable, &Attribute::keyable, on);
 }
 HStatus HFnAttribute::setHidden(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setHidden, &Attribute::hidden, on);
+    return setFlag(object_, Operation::HFnAttribute_setHidden, &Attribute::hidden, on);
 }
 HStatus HFnAttribute::setIndexMatters(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setIndexMatters, &Attribute::indexMatters, on);
+    return setFlag(object_, Operation::HFnAttribute_setIndexMatters, &Attribute::indexMatters, on);
 }
 HStatus HFnAttribute::setUsesArrayDataBuilder(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setUsesArrayDataBuilder, &Attribute::builder, on);
+    return setFlag(object_, Operation::HFnAttribute_setUsesArrayDataBuilder, &Attribute::builder, on);
 }
 HStatus HFnAttribute::setUsedAsFilename(bool on) {
-    return setFlag(object_, FaultPoint::HFnAttribute_setUsedAsFilename, &Attribute::filename, on);
+    return setFlag(object_, Operation::HFnAttribute_setUsedAsFilename, &Attribute::filename, on);
 }
 
 HStatus HFnAttribute::setDisconnectBehavior(DisconnectBehavior behavior) {
-    return changeAttribute(object_, FaultPoint::HFnAttribute_setDisconnectBehavior,
+    return changeAttribute(object_, Operation::HFnAttribute_setDisconnectBehavior,
                            [&](Attribute& attribute) -> HStatus {
                                attribute.onDisconnect = behavior;
                                return HStatus::kSuccess;
@@ -162,7 +162,7 @@ namespace {
 
 /// Makes an attribute, lets `fill` complete it, and attaches it. `fill` answers with why it cannot, empty on success.
 template <class Fill>
-HObject createAttribute(FaultPoint point, HStatus* status, HObject& attachTo, HFn::Type kind, const HString& longName,
+HObject createAttribute(Operation point, HStatus* status, HObject& attachTo, HFn::Type kind, const HString& longName,
                         const HString& shortName, Fill&& fill) {
     return apiValue(point, status, HObject(), [&](HStatus& outcome) {
         attachTo = HObject();
@@ -198,7 +198,7 @@ HFnNumericAttribute::HFnNumericAttribute(const HObject& object, HStatus* status)
 
 HObject HFnNumericAttribute::create(const HString& longName, const HString& shortName, HFnNumericData::Type kind,
                                     double defaultValue, HStatus* status) {
-    return createAttribute(FaultPoint::HFnNumericAttribute_create, status, object_, HFn::kNumericAttribute, longName,
+    return createAttribute(Operation::HFnNumericAttribute_create, status, object_, HFn::kNumericAttribute, longName,
                            shortName, [&](Attribute& attribute) -> std::string {
                                if (kind < HFnNumericData::kBoolean || kind > HFnNumericData::kDouble)
                                    return "there is no kind of number " + std::to_string(kind);
@@ -222,7 +222,7 @@ double HFnNumericAttribute::defaultValue() const {
 }
 
 HStatus HFnNumericAttribute::setDefault(double value) {
-    return changeAttribute(object_, FaultPoint::HFnNumericAttribute_setDefault, [&](Attribute& attribute) -> HStatus {
+    return changeAttribute(object_, Operation::HFnNumericAttribute_setDefault, [&](Attribute& attribute) -> HStatus {
         if (std::isnan(value))
             return refused(attribute, notANumber("its default"));
         attribute.defaultNumber = attribute.stored(value);
@@ -242,7 +242,7 @@ std::string outOfOrder(const char* lower, std::optional<double> low, const char*
            OpenQuarn::printedNumber(*high);
 }
 
-HStatus setLimit(const HObject& object, FaultPoint point, Limit limit, double value) {
+HStatus setLimit(const HObject& object, Operation point, Limit limit, double value) {
     return changeAttribute(object, point, [&](Attribute& attribute) -> HStatus {
         if (std::isnan(value))
             return refused(attribute, notANumber("its limit"));
@@ -257,7 +257,7 @@ HStatus setLimit(const HObject& object, FaultPoint point, Limit limit, double va
     });
 }
 
-double getLimit(const HObject& object, FaultPoint point, Limit limit, HStatus* status) {
+double getLimit(const HObject& object, Operation point, Limit limit, HStatus* status) {
     return apiValue(point, status, 0.0, [&](HStatus& outcome) {
         const std::shared_ptr<Attribute> attribute = attached(object);
         if (attribute && (*attribute).*limit)
@@ -276,16 +276,16 @@ bool hasLimit(const HObject& object, Limit limit) {
 } // namespace
 
 HStatus HFnNumericAttribute::setMin(double value) {
-    return setLimit(object_, FaultPoint::HFnNumericAttribute_setMin, &Attribute::min, value);
+    return setLimit(object_, Operation::HFnNumericAttribute_setMin, &Attribute::min, value);
 }
 HStatus HFnNumericAttribute::setMax(double value) {
-    return setLimit(object_, FaultPoint::HFnNumericAttribute_setMax, &Attribute::max, value);
+    return setLimit(object_, Operation::HFnNumericAttribute_setMax, &Attribute::max, value);
 }
 HStatus HFnNumericAttribute::setSoftMin(double value) {
-    return setLimit(object_, FaultPoint::HFnNumericAttribute_setSoftMin, &Attribute::softMin, value);
+    return setLimit(object_, Operation::HFnNumericAttribute_setSoftMin, &Attribute::softMin, value);
 }
 HStatus HFnNumericAttribute::setSoftMax(double value) {
-    return setLimit(object_, FaultPoint::HFnNumericAttribute_setSoftMax, &Attribute::softMax, value);
+    return setLimit(object_, Operation::HFnNumericAttribute_setSoftMax, &Attribute::softMax, value);
 }
 bool HFnNumericAttribute::hasMin() const {
     return hasLimit(object_, &Attribute::min);
@@ -300,16 +300,16 @@ bool HFnNumericAttribute::hasSoftMax() const {
     return hasLimit(object_, &Attribute::softMax);
 }
 double HFnNumericAttribute::getMin(HStatus* status) const {
-    return getLimit(object_, FaultPoint::HFnNumericAttribute_getMin, &Attribute::min, status);
+    return getLimit(object_, Operation::HFnNumericAttribute_getMin, &Attribute::min, status);
 }
 double HFnNumericAttribute::getMax(HStatus* status) const {
-    return getLimit(object_, FaultPoint::HFnNumericAttribute_getMax, &Attribute::max, status);
+    return getLimit(object_, Operation::HFnNumericAttribute_getMax, &Attribute::max, status);
 }
 double HFnNumericAttribute::getSoftMin(HStatus* status) const {
-    return getLimit(object_, FaultPoint::HFnNumericAttribute_getSoftMin, &Attribute::softMin, status);
+    return getLimit(object_, Operation::HFnNumericAttribute_getSoftMin, &Attribute::softMin, status);
 }
 double HFnNumericAttribute::getSoftMax(HStatus* status) const {
-    return getLimit(object_, FaultPoint::HFnNumericAttribute_getSoftMax, &Attribute::softMax, status);
+    return getLimit(object_, Operation::HFnNumericAttribute_getSoftMax, &Attribute::softMax, status);
 }
 
 // --- HFnTypedAttribute ---
@@ -323,7 +323,7 @@ HFnTypedAttribute::HFnTypedAttribute(const HObject& object, HStatus* status) {
 HObject HFnTypedAttribute::create(const HString& longName, const HString& shortName, HFnData::Type kind,
                                   const HObject& defaultValue, HStatus* status) {
     return createAttribute(
-        FaultPoint::HFnTypedAttribute_create, status, object_, HFn::kTypedAttribute, longName, shortName,
+        Operation::HFnTypedAttribute_create, status, object_, HFn::kTypedAttribute, longName, shortName,
         [&](Attribute& attribute) -> std::string {
             constexpr std::array kinds = {HFnData::kString, HFnData::kMatrix, HFnData::kDoubleArray, HFnData::kMesh};
             if (std::find(kinds.begin(), kinds.end(), kind) == kinds.end())
@@ -335,7 +335,7 @@ HObject HFnTypedAttribute::create(const HString& longName, const HString& shortN
 
 HObject HFnTypedAttribute::create(const HString& longName, const HString& shortName, const HTypeId& pluginDataType,
                                   const HObject& defaultValue, HStatus* status) {
-    return createAttribute(FaultPoint::HFnTypedAttribute_create, status, object_, HFn::kTypedAttribute, longName,
+    return createAttribute(Operation::HFnTypedAttribute_create, status, object_, HFn::kTypedAttribute, longName,
                            shortName, [&](Attribute& attribute) -> std::string {
                                if (pluginDataType.id() == 0)
                                    return "0 is no type id";
@@ -360,7 +360,7 @@ HFnEnumAttribute::HFnEnumAttribute(const HObject& object, HStatus* status) {
 
 HObject HFnEnumAttribute::create(const HString& longName, const HString& shortName, short defaultValue,
                                  HStatus* status) {
-    return createAttribute(FaultPoint::HFnEnumAttribute_create, status, object_, HFn::kEnumAttribute, longName,
+    return createAttribute(Operation::HFnEnumAttribute_create, status, object_, HFn::kEnumAttribute, longName,
                            shortName, [&](Attribute& attribute) -> std::string {
                                attribute.number = HFnNumericData::kShort;
                                attribute.keyable = true;
@@ -370,7 +370,7 @@ HObject HFnEnumAttribute::create(const HString& longName, const HString& shortNa
 }
 
 HStatus HFnEnumAttribute::addField(const HString& label, short value) {
-    return changeAttribute(object_, FaultPoint::HFnEnumAttribute_addField, [&](Attribute& attribute) -> HStatus {
+    return changeAttribute(object_, Operation::HFnEnumAttribute_addField, [&](Attribute& attribute) -> HStatus {
         for (const auto& [other, number] : attribute.fields) {
             if (number == value)
                 return {HStatus::kFailure, "attribute '" + attribute.name + "' labels " + std::to_string(value) +
@@ -385,7 +385,7 @@ HStatus HFnEnumAttribute::addField(const HString& label, short value) {
 }
 
 HString HFnEnumAttribute::fieldName(short value, HStatus* status) const {
-    return apiValue(FaultPoint::HFnEnumAttribute_fieldName, status, HString(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnEnumAttribute_fieldName, status, HString(), [&](HStatus& outcome) {
         if (const std::shared_ptr<Attribute> attribute = attached(object_))
             for (const auto& [label, number] : attribute->fields)
                 if (number == value)
@@ -396,7 +396,7 @@ HString HFnEnumAttribute::fieldName(short value, HStatus* status) const {
 }
 
 short HFnEnumAttribute::fieldIndex(const HString& label, HStatus* status) const {
-    return apiValue(FaultPoint::HFnEnumAttribute_fieldIndex, status, short{0}, [&](HStatus& outcome) {
+    return apiValue(Operation::HFnEnumAttribute_fieldIndex, status, short{0}, [&](HStatus& outcome) {
         if (const std::shared_ptr<Attribute> attribute = attached(object_))
             for (const auto& [text, number] : attribute->fields)
                 if (text == label.asStdString())
@@ -412,7 +412,7 @@ short HFnEnumAttribute::defaultValue() const {
 }
 
 HStatus HFnEnumAttribute::setDefault(short value) {
-    return changeAttribute(object_, FaultPoint::HFnEnumAttribute_setDefault, [&](Attribute& attribute) -> HStatus {
+    return changeAttribute(object_, Operation::HFnEnumAttribute_setDefault, [&](Attribute& attribute) -> HStatus {
         attribute.defaultNumber = value;
         return HStatus::kSuccess;
     });
@@ -427,7 +427,7 @@ HFnCompoundAttribute::HFnCompoundAttribute(const HObject& object, HStatus* statu
 }
 
 HObject HFnCompoundAttribute::create(const HString& longName, const HString& shortName, HStatus* status) {
-    return createAttribute(FaultPoint::HFnCompoundAttribute_create, status, object_, HFn::kCompoundAttribute, longName,
+    return createAttribute(Operation::HFnCompoundAttribute_create, status, object_, HFn::kCompoundAttribute, longName,
                            shortName, [](Attribute&) { return std::string(); });
 }
 
@@ -441,7 +441,7 @@ bool isAtOrAbove(const Attribute& above, const Attribute& attribute) {
 } // namespace
 
 HStatus HFnCompoundAttribute::addChild(const HObject& child) {
-    return changeAttribute(object_, FaultPoint::HFnCompoundAttribute_addChild, [&](Attribute& attribute) -> HStatus {
+    return changeAttribute(object_, Operation::HFnCompoundAttribute_addChild, [&](Attribute& attribute) -> HStatus {
         const std::shared_ptr<Attribute> added = attached(child);
         if (!added)
             return {HStatus::kInvalidParameter, "the child is no attribute"};
@@ -463,7 +463,7 @@ unsigned HFnCompoundAttribute::numChildren() const {
 }
 
 HObject HFnCompoundAttribute::child(unsigned index, HStatus* status) const {
-    return apiValue(FaultPoint::HFnCompoundAttribute_child, status, HObject(), [&](HStatus& outcome) {
+    return apiValue(Operation::HFnCompoundAttribute_child, status, HObject(), [&](HStatus& outcome) {
         const std::shared_ptr<Attribute> attribute = attached(object_);
         if (attribute && index < attribute->children.size())
             return Access::object(attribute->children[index]);
@@ -481,7 +481,7 @@ HFnMessageAttribute::HFnMessageAttribute(const HObject& object, HStatus* status)
 }
 
 HObject HFnMessageAttribute::create(const HString& longName, const HString& shortName, HStatus* status) {
-    return createAttribute(FaultPoint::HFnMessageAttribute_create, status, object_, HFn::kMessageAttribute, longName,
+    return createAttribute(Operation::HFnMessageAttribute_create, status, object_, HFn::kMessageAttribute, longName,
                            shortName, [](Attribute&) { return std::string(); });
 }
 
@@ -492,7 +492,7 @@ HFnMatrixAttribute::HFnMatrixAttribute(const HObject& object, HStatus* status) {
 }
 
 HObject HFnMatrixAttribute::create(const HString& longName, const HString& shortName, HStatus* status) {
-    return createAttribute(FaultPoint::HFnMatrixAttribute_create, status, object_, HFn::kMatrixAttribute, longName,
+    return createAttribute(Operation::HFnMatrixAttribute_create, status, object_, HFn::kMatrixAttribute, longName,
                            shortName, [](Attribute& attribute) {
                                attribute.data = HFnData::kMatrix;
                                attribute.defaultData =

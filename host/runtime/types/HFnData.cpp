@@ -7,7 +7,7 @@
 
 using OpenQuarn::Access;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -19,7 +19,7 @@ void attach(HFnBase& set, const HObject& object, HStatus* status) {
 
 /// Makes a piece of data, and attaches it.
 template <class Make>
-HObject createData(FaultPoint point, HStatus* status, HObject& attachTo, Make&& make) {
+HObject createData(Operation point, HStatus* status, HObject& attachTo, Make&& make) {
     return apiValue(point, status, HObject(), [&](HStatus&) {
         attachTo = HObject();
         attachTo = Access::object(make());
@@ -43,7 +43,7 @@ HFnStringData::HFnStringData(const HObject& object, HStatus* status) {
 }
 
 HObject HFnStringData::create(const HString& text, HStatus* status) {
-    return createData(FaultPoint::HFnStringData_create, status, object_,
+    return createData(Operation::HFnStringData_create, status, object_,
                       [&] { return std::make_shared<OpenQuarn::StringData>(text.asStdString()); });
 }
 
@@ -57,7 +57,7 @@ HFnMatrixData::HFnMatrixData(const HObject& object, HStatus* status) {
 }
 
 HObject HFnMatrixData::create(const HMatrix& matrix, HStatus* status) {
-    return createData(FaultPoint::HFnMatrixData_create, status, object_,
+    return createData(Operation::HFnMatrixData_create, status, object_,
                       [&] { return std::make_shared<OpenQuarn::MatrixData>(OpenQuarn::fromMatrix(matrix)); });
 }
 
@@ -71,7 +71,7 @@ HFnDoubleArrayData::HFnDoubleArrayData(const HObject& object, HStatus* status) {
 }
 
 HObject HFnDoubleArrayData::create(const std::vector<double>& values, HStatus* status) {
-    return createData(FaultPoint::HFnDoubleArrayData_create, status, object_,
+    return createData(Operation::HFnDoubleArrayData_create, status, object_,
                       [&] { return std::make_shared<OpenQuarn::DoubleArrayData>(values); });
 }
 
@@ -85,7 +85,7 @@ HFnPluginData::HFnPluginData(const HObject& object, HStatus* status) {
 }
 
 HObject HFnPluginData::create(const HTypeId& type, HStatus* status) {
-    return createData(FaultPoint::HFnPluginData_create, status, object_,
+    return createData(Operation::HFnPluginData_create, status, object_,
                       [&] { return OpenQuarn::createPluginData(type); });
 }
 

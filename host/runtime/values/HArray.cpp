@@ -5,13 +5,13 @@
 
 #include <string>
 
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 static_assert(sizeof(unsigned) == 4 && sizeof(int) == 4, "HIntArray and HUintArray hold 32 bits");
 
 HStatus HArrayBase::admit(Call call, std::size_t length) noexcept {
-    constexpr FaultPoint points[] = {FaultPoint::HArray_setLength, FaultPoint::HArray_reserve,
-                                     FaultPoint::HArray_append, FaultPoint::HArray_assign};
+    constexpr Operation points[] = {Operation::HArray_setLength, Operation::HArray_reserve, Operation::HArray_append,
+                                    Operation::HArray_assign};
     return OpenQuarn::apiCall(points[static_cast<unsigned>(call)], [&]() -> HStatus {
         return length > std::numeric_limits<unsigned>::max() ? noMemory(call, length) : HStatus::kSuccess;
     });

@@ -12,7 +12,7 @@
 #include <cstdio>
 #include <string>
 
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -119,7 +119,7 @@ double HMatrix::det3x3() const noexcept {
 }
 
 HMatrix HMatrix::inverse(HStatus* status) const noexcept {
-    return OpenQuarn::apiValue(FaultPoint::HMatrix_inverse, status, HMatrix(), [&](HStatus& outcome) {
+    return OpenQuarn::apiValue(Operation::HMatrix_inverse, status, HMatrix(), [&](HStatus& outcome) {
         HMatrix result;
         if (!OpenQuarn::invertMatrix(*this, result))
             outcome = {HStatus::kFailure, singularText(*this)};

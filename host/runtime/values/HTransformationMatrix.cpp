@@ -14,7 +14,7 @@
 
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::FaultPoint;
+using OpenQuarn::Operation;
 
 namespace {
 
@@ -163,7 +163,7 @@ HMatrix HTransformationMatrix::asMatrix() const noexcept {
 }
 
 HVector HTransformationMatrix::translation(HSpace::Space space, HStatus* status) const noexcept {
-    return apiValue(FaultPoint::HTransformationMatrix_translation, status, HVector(), [&](HStatus& outcome) {
+    return apiValue(Operation::HTransformationMatrix_translation, status, HVector(), [&](HStatus& outcome) {
         if (space != HSpace::kObject) {
             outcome = isSpace(space) ? HStatus(HStatus::kSuccess) : badSpace(space);
             return outcome.error() ? HVector() : translation_;
@@ -176,7 +176,7 @@ HVector HTransformationMatrix::translation(HSpace::Space space, HStatus* status)
 }
 
 HStatus HTransformationMatrix::setTranslation(const HVector& translation, HSpace::Space space) noexcept {
-    return apiCall(FaultPoint::HTransformationMatrix_setTranslation, [&]() -> HStatus {
+    return apiCall(Operation::HTransformationMatrix_setTranslation, [&]() -> HStatus {
         if (!isSpace(space))
             return badSpace(space);
         translation_ = space == HSpace::kObject ? translation * linear() : translation;
@@ -185,19 +185,19 @@ HStatus HTransformationMatrix::setTranslation(const HVector& translation, HSpace
 }
 
 HStatus HTransformationMatrix::getScale(double scale[3], HSpace::Space space) const noexcept {
-    return apiCall(FaultPoint::HTransformationMatrix_getScale, [&] { return readTriple(scale_, scale, space); });
+    return apiCall(Operation::HTransformationMatrix_getScale, [&] { return readTriple(scale_, scale, space); });
 }
 
 HStatus HTransformationMatrix::setScale(const double scale[3], HSpace::Space space) noexcept {
-    return apiCall(FaultPoint::HTransformationMatrix_setScale, [&] { return writeTriple(scale_, scale, space); });
+    return apiCall(Operation::HTransformationMatrix_setScale, [&] { return writeTriple(scale_, scale, space); });
 }
 
 HStatus HTransformationMatrix::getShear(double shear[3], HSpace::Space space) const noexcept {
-    return apiCall(FaultPoint::HTransformationMatrix_getShear, [&] { return readTriple(shear_, shear, space); });
+    return apiCall(Operation::HTransformationMatrix_getShear, [&] { return readTriple(shear_, shear, space); });
 }
 
 HStatus HTransformationMatrix::setShear(const double shear[3], HSpace::Space space) noexcept {
-    return apiCall(FaultPoint::HTransformationMatrix_setShear, [&] { return writeTriple(shear_, shear, space); });
+    return apiCall(Operation::HTransformationMatrix_setShear, [&] { return writeTriple(shear_, shear, space); });
 }
 
 HQuaternion HTransformationMatrix::rotation() const noexcept {
@@ -218,7 +218,7 @@ void HTransformationMatrix::setRotation(const HEulerRotation& rotation) noexcept
 }
 
 HStatus HTransformationMatrix::reorderRotation(HEulerRotation::RotationOrder order) noexcept {
-    return apiCall(FaultPoint::HTransformationMatrix_reorderRotation, [&]() -> HStatus {
+    return apiCall(Operation::HTransformationMatrix_reorderRotation, [&]() -> HStatus {
         if (order < HEulerRotation::kXYZ || order > HEulerRotation::kZYX)
             return {HStatus::kInvalidParameter,
                     "rotation order " + std::to_string(static_cast<int>(order)) + " is none of the six (0 to 5)"};

@@ -27,7 +27,7 @@ template <class Array>
 HObject convert(Array* array, HStatus* status) noexcept {
     std::unique_ptr<const Array> owned(array);
     return OpenQuarn::apiValue(
-        OpenQuarn::FaultPoint::TapiCastAnim_convertArrayToObject, status, HObject(), [&](HStatus& /*outcome*/) {
+        OpenQuarn::Operation::TapiCastAnim_convertArrayToObject, status, HObject(), [&](HStatus& /*outcome*/) {
             return owned ? Access::object(std::make_shared<ArrayObject<Array>>(std::move(owned))) : HObject();
         });
 }

@@ -1,8 +1,8 @@
 # SPDX-License-Identifier: Apache-2.0
-# Reads sources of the runtime and says, separated by tabs, which function of a class goes through which fault point:
-# "uses", place, function, point. These are the points that its body names and those of the file's own helpers that it
-# calls. "none" stands for a function that can fail and has no point, neither calls another overload of itself; "loses"
-# for one that drops the status of the point. Relies on the formatting: a definition begins in the first column.
+# Reads sources of the runtime and says, separated by tabs, which function of a class goes through which row of the table
+# of operations: "uses", place, function, operation. These are the operations that its body names and those of the file's
+# own helpers that it calls. "none" stands for a function that can fail and names none, neither calls another overload of
+# itself; "loses" for one that drops the status. Relies on the formatting: a definition begins in the first column.
 
 function finish() {
     if (name == "")
@@ -24,8 +24,8 @@ function pointsOf(i,    text, point, found, j) {
         return known[i]
     known[i] = "" # a helper that calls itself
     text = bodyOf[i]
-    while (match(text, /FaultPoint::[A-Za-z0-9]+_[A-Za-z0-9]+/)) {
-        point = substr(text, RSTART + 12, RLENGTH - 12)
+    while (match(text, /Operation::[A-Za-z0-9]+_[A-Za-z0-9]+/)) {
+        point = substr(text, RSTART + 11, RLENGTH - 11)
         sub(/_/, "::", point)
         found = found " " point
         text = substr(text, RSTART + RLENGTH)

@@ -1,12 +1,10 @@
 #!/usr/bin/env bash
 # SPDX-License-Identifier: Apache-2.0
-# header_scan.sh ROOT: compares the headers below ROOT/host/api with the tables of fault points and the sources of the
+# header_scan.sh ROOT: compares the headers below ROOT/host/api with the tables of operations and the sources of the
 # runtime. Lists what does not fit, one line each, and fails then:
-#   - a function that can fail and has no fault point, and a fault point whose function has gone;
-#   - a function without a thread tag, and a fault point whose tag is not its function's;
-#   - a function that is [main] or [eval], cannot fail, and does not check it by a call that names it, as in
-#     isRefused(ThreadTag::main, "HPxCommand::syntax");
-#   - a function that can fail and does not go through its own fault point, and through no other: all overloads.
+#   - a function that can fail and has no row FAULT_POINT; one that cannot, is [main] or [eval], and has no CANNOT_FAIL;
+#   - a row whose function has gone, or whose tag is not its function's; a function without a thread tag;
+#   - a function with a row that does not go through it, or goes through another's: all overloads.
 # What counts as a function, and which are exempt: see operations.awk and fault_points.awk.
 set -euo pipefail
 here=$(cd "$(dirname "$0")" && pwd)
@@ -18,12 +16,7 @@ find host/api/openquarn -name '*.h' -print0 | sort -z | xargs -0 awk -f "$here/o
 
 {
   sed 's/^/function\t/' "$scratch"
-  find host/runtime -name '*.def' -exec sed -nE 's|^FAULT_POINT\((\w+), (\w+)(, (\w+))?\)$|point\t\1\t\2\t\4|p' {} +
-  # toRead() of HDataBlock.cpp and readablePlugin() of HFnPlugin.cpp check for their callers
-  find host/runtime -name '*.cpp' -exec sed -nE \
-    -e 's|.*ThreadTag::(\w+), "(\w+)::(\w+)"\).*|checked\t\2\t\3\t\1|p' \
-    -e 's|.*toRead\(.*"(\w+)::(\w+)"\).*|checked\t\1\t\2\teval|p' \
-    -e 's|.*readablePlugin\(.*"(\w+)::(\w+)"\).*|checked\t\1\t\2\tmain|p' {} +
+  find host/runtime -name '*.def' -exec sed -nE 's/^(FAULT_POINT|CANNOT_FAIL)\((\w+), (\w+)(, (\w+))?\)$/\1\t\2\t\3\t\5/p' {} +
   find host/runtime -name '*.cpp' -print0 | sort -z | xargs -0 awk -f "$here/fault_points.awk"
 } | awk -F '\t' '
   function bad(text) {
@@ -33,14 +26,14 @@ find host/api/openquarn -name '*.h' -print0 | sort -z | xargs -0 awk -f "$here/o
       ++failures
   }
   { name = $2 "::" $3 }
-  $1 == "point" {
-      if (name in point)
-          bad(name " has two fault points")
-      point[name] = $4 == "" ? "any" : $4
+  $1 == "FAULT_POINT" || $1 == "CANNOT_FAIL" {
+      if (name in kind_of)
+          bad(name " has two rows")
+      kind_of[name] = $1
+      tag_of[name] = $4 == "" ? "any" : $4
   }
-  $1 == "checked" { checked[name] = $4 }
   # the templates of HArray, which are in its header, go through HArrayBase::admit
-  $1 == "uses" && $3 != $4 && $3 != "HArrayBase::admit" { bad($3 " fails under the name of " $4 " (" $2 ")") }
+  $1 == "uses" && $3 != $4 && $3 != "HArrayBase::admit" { bad($3 " goes through the row of " $4 " (" $2 ")") }
   $1 == "uses" { used[$4] = 1 }
   $1 == "none" { without[$3] = $2 }
   $1 == "loses" { bad($3 " loses the status of its fault point (" $2 ")") }
@@ -59,20 +52,21 @@ find host/api/openquarn -name '*.h' -print0 | sort -z | xargs -0 awk -f "$here/o
           declared[name] = 1
           if (tag == "-")
               bad(name " has no thread tag" where)
-          else if (kind == "plain" && tag != "any" && checked[name] != tag)
-              bad(name " is [" tag "] and does not check it" where)
-          if (kind == "fails" && !(name in point))
-              bad(name " can fail and has no fault point" where)
-          else if (kind == "fails" && tag != "-" && point[name] != tag)
-              bad(name " is [" tag "], and its fault point says [" point[name] "]" where)
+          if (kind == "plain" && tag == "any")
+              continue
+          wanted = kind == "fails" ? "FAULT_POINT" : "CANNOT_FAIL"
+          if (kind_of[name] != wanted)
+              bad(name " has no row " wanted where)
+          else if (tag != "-" && tag_of[name] != tag)
+              bad(name " is [" tag "], and its row says [" tag_of[name] "]" where)
       }
-      for (name in point) {
-          if (!(name in declared))
-              bad(name " has a fault point and is no function of the headers")
+      for (name in kind_of) {
+          if (kind_of[name] == "FAULT_POINT" && !(name in declared))
+              bad(name " has a row and is no function of the headers")
           else if (!(name in used))
-              bad(name " has a fault point that nothing goes through")
-          if (name in without)
-              bad(name " does not go through its fault point (" without[name] ")")
+              bad(name " has a row that nothing goes through")
+          if (kind_of[name] == "FAULT_POINT" && name in without)
+              bad(name " does not go through its row (" without[name] ")")
       }
       exit failures > 0
   }'

@@ -6,7 +6,7 @@ here=$(cd "$(dirname "$0")" && pwd)
 tree=$(mktemp -d)
 trap 'rm -rf "$tree"' EXIT
 failed=0
-mkdir -p "$tree/host/api/openquarn/gpu" "$tree/host/runtime/core/faults"
+mkdir -p "$tree/host/api/openquarn/gpu" "$tree/host/runtime/core/operations"
 
 write_tree() {
   cat >"$tree/host/api/openquarn/HThing.h" <<'HEADER'
@@ -46,23 +46,24 @@ public:
     static HStatus open() noexcept; ///< [any]
 };
 HEADER
-  cat >"$tree/host/runtime/core/faults/thing.def" <<'TABLE'
+  cat >"$tree/host/runtime/core/operations/thing.def" <<'TABLE'
 FAULT_POINT(HThing, change, main)
 FAULT_POINT(HThing, value, eval)
 FAULT_POINT(HThing, other, eval)
 FAULT_POINT(HPxThing, help, main)
 FAULT_POINT(HBare, open)
+CANNOT_FAIL(HThing, width, main)
 TABLE
   cat >"$tree/host/runtime/HThing.cpp" <<'SOURCE'
 namespace {
 
 HStatus changed(int first) {
-    return apiCall(FaultPoint::HThing_change, [&] { return HStatus(first); });
+    return apiCall(Operation::HThing_change, [&] { return HStatus(first); });
 }
 
 } // namespace
 
-unsigned HThing::width() const { isRefused(ThreadTag::main, "HThing::width"); }
+unsigned HThing::width() const { isRefused(Operation::HThing_width); }
 
 HStatus HThing::change(int first, int second) {
     return changed(first + second);
@@ -72,19 +73,19 @@ HStatus HThing::change() {
 }
 
 int HThing::value(HStatus* status) const {
-    return apiValue(FaultPoint::HThing_value, status, 0, [&](HStatus&) { return 1; });
+    return apiValue(Operation::HThing_value, status, 0, [&](HStatus&) { return 1; });
 }
 
 int HThing::other(HStatus& status) const {
-    return apiValue(FaultPoint::HThing_other, &status, 0, [&](HStatus&) { return 2; });
+    return apiValue(Operation::HThing_other, &status, 0, [&](HStatus&) { return 2; });
 }
 
 HStatus HPxThing::help() const {
-    return OpenQuarn::apiCall(OpenQuarn::FaultPoint::HPxThing_help, [] { return HStatus(); });
+    return OpenQuarn::apiCall(OpenQuarn::Operation::HPxThing_help, [] { return HStatus(); });
 }
 
 HStatus HBare::open() noexcept {
-    return apiCall(FaultPoint::HBare_open, [] { return HStatus(); });
+    return apiCall(Operation::HBare_open, [] { return HStatus(); });
 }
 SOURCE
 }
@@ -104,26 +105,28 @@ plant() {
 }
 
 header=api/openquarn/HThing.h
-table=runtime/core/faults/thing.def
+table=runtime/core/operations/thing.def
 plant '' $header ''
-plant 'HThing::planted can fail and has no fault point' $header 's/^    HThing();/&\n    HStatus planted(int number);/'
-plant 'HThing::planted can fail and has no fault point' $header 's/^    HThing();/&\n    HObject planted(int a,\n    HStatus* status = nullptr);/'
-plant 'HThing::planted can fail and has no fault point' $header 's/^    HThing();/&\n    static HStatus planted() { return {}; }/'
-plant 'HBare::HBare can fail and has no fault point' api/openquarn/gpu/HBare.h 's/^public:/&\n    HBare(HStatus* status);/'
-plant 'HPxThing::planted can fail and has no fault point' $header 's/^protected:/&\n    HStatus planted();/'
-plant 'HThing::other can fail and has no fault point' $table '/other/d'
-plant 'HThing::gone has a fault point and is no function' $table 's/^FAULT_POINT(HBare.*/&\nFAULT_POINT(HThing, gone)/'
-plant 'HPxThing::doIt has a fault point and is no function' $table 's/help/doIt/'
-plant 'HThing::change has two fault points' $table 's/value, eval/change, main/'
-plant 'HThing::change is [main], and its fault point says [any]' $table 's/, main//'
-plant 'HThing::value is [main], and its fault point says [eval]' $header 's/eval/main/'
-plant 'HThing::width is [main] and does not check it' runtime/HThing.cpp 's/width"/length"/'
-plant 'HThing::width is [eval] and does not check it' $header 's/width() const; .*/width() const; \/\/\/< [eval]/'
+plant 'HThing::planted has no row FAULT_POINT' $header 's/^    HThing();/&\n    HStatus planted(int number);/'
+plant 'HThing::planted has no row FAULT_POINT' $header 's/^    HThing();/&\n    HObject planted(int a,\n    HStatus* status = nullptr);/'
+plant 'HThing::planted has no row FAULT_POINT' $header 's/^    HThing();/&\n    static HStatus planted() { return {}; }/'
+plant 'HBare::HBare has no row FAULT_POINT' api/openquarn/gpu/HBare.h 's/^public:/&\n    HBare(HStatus* status);/'
+plant 'HPxThing::planted has no row FAULT_POINT' $header 's/^protected:/&\n    HStatus planted();/'
+plant 'HThing::other has no row FAULT_POINT' $table '/other/d'
+plant 'HThing::gone has a row and is no function' $table 's/^FAULT_POINT(HBare.*/&\nFAULT_POINT(HThing, gone)/'
+plant 'HPxThing::doIt has a row and is no function' $table 's/help/doIt/'
+plant 'HThing::change has two rows' $table 's/value, eval/change, main/'
+plant 'HThing::change is [main], and its row says [any]' $table 's/, main//'
+plant 'HThing::value is [main], and its row says [eval]' $header 's/eval/main/'
+plant 'HThing::width has no row CANNOT_FAIL' $table '/width/d'
+plant 'HThing::width is [eval], and its row says [main]' $header 's/width() const; .*/width() const; \/\/\/< [eval]/'
+plant 'HThing::change has no row FAULT_POINT' $table 's/^FAULT_POINT(HThing, change/CANNOT_FAIL(HThing, change/'
 source=runtime/HThing.cpp
-plant 'HThing::value fails under the name of HThing::other' $source 's/HThing_value/HThing_other/'
-plant 'HThing::change fails under the name of HThing::value' $source 's/HThing_change/HThing_value/'
-plant 'HThing::change does not go through its fault point' $source 's/return change(1, 2)/return {}/'
-plant 'HBare::open has a fault point that nothing goes through' $source 's/apiCall(FaultPoint::HBare_open, .*/HStatus();/'
+plant 'HThing::width has a row that nothing goes through' $source 's/isRefused(.*);/return 1;/'
+plant 'HThing::value goes through the row of HThing::other' $source 's/HThing_value/HThing_other/'
+plant 'HThing::change goes through the row of HThing::value' $source 's/HThing_change/HThing_value/'
+plant 'HThing::change does not go through its row' $source 's/return change(1, 2)/return {}/'
+plant 'HBare::open has a row that nothing goes through' $source 's/apiCall(Operation::HBare_open, .*/HStatus();/'
 plant 'HThing::value loses the status' $source 's/HThing_value, status/HThing_value, nullptr/'
 plant 'HPxThing::help loses the status' $source 's/return OpenQuarn::apiCall/OpenQuarn::apiCall/'
 plant 'HBare::open has no thread tag' api/openquarn/gpu/HBare.h 's/\[any\]//'

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "core/FaultPoints.h"
+#include "core/Operations.h"
 
 #include "core/apiCall.h"
 #include "openquarn_app/Faults.h"
@@ -11,13 +11,7 @@
 namespace OpenQuarn {
 namespace {
 
-constexpr auto pointCount = static_cast<std::size_t>(FaultPoint::count);
-
-constexpr std::array<const char*, pointCount> pointNames = {
-#define FAULT_POINT(type, operation, ...) #type "::" #operation,
-#include "core/faults/all.def"
-#undef FAULT_POINT
-};
+constexpr auto pointCount = static_cast<std::size_t>(Operation::faultPoints);
 
 struct Plan {
     long long callsBefore = 0; // calls that still pass
@@ -30,7 +24,7 @@ std::array<Plan, pointCount> plans;
 
 std::size_t pointNumber(std::string_view name) {
     for (std::size_t i = 0; i < pointCount; ++i)
-        if (name == pointNames[i])
+        if (name == detail::operations[i].name)
             return i;
     throw std::invalid_argument("no operation named '" + std::string(name) + "' can be made to fail");
 }
@@ -39,7 +33,7 @@ std::size_t pointNumber(std::string_view name) {
 
 std::atomic<bool> detail::faultsArmed{false};
 
-bool detail::countFault(FaultPoint point) noexcept {
+bool detail::countFault(Operation point) noexcept {
     const std::scoped_lock lock(planMutex);
     Plan& plan = plans[static_cast<std::size_t>(point)];
     if (plan.failures == 0)
@@ -53,13 +47,9 @@ bool detail::countFault(FaultPoint point) noexcept {
     return true;
 }
 
-const char* faultPointName(FaultPoint point) {
-    return pointNames[static_cast<std::size_t>(point)];
-}
-
-HStatus faultStatus(FaultPoint point) noexcept {
+HStatus faultStatus(Operation point) noexcept {
     try {
-        return {HStatus::kFailure, std::string(faultPointName(point)) + ": failed on demand"};
+        return {HStatus::kFailure, std::string(operationName(point)) + ": failed on demand"};
     } catch (...) {
         return HStatus::kFailure;
     }
@@ -78,7 +68,11 @@ HStatus statusOfException(const char* operation) noexcept {
 }
 
 std::vector<std::string> Faults::operations() {
-    return {pointNames.begin(), pointNames.end()};
+    std::vector<std::string> names;
+    names.reserve(pointCount);
+    for (std::size_t i = 0; i < pointCount; ++i)
+        names.emplace_back(detail::operations[i].name);
+    return names;
 }
 
 void Faults::fail(std::string_view operation, int call, int times) {
