@@ -28,7 +28,7 @@ void connect(const HPlug& from, const HPlug& to) {
 
 // breaking a connection may remove the element that it leads to: everything is found by plug again
 void connectInstead(const HPlug& present, const HPlug& from, const HPlug& to) {
-    currentGraph().disconnect(*resolvePlug(to));
+    currentGraph().disconnect(*resolvePlug(normalContext, to));
     try {
         connect(from, to);
     } catch (...) {
@@ -41,7 +41,7 @@ class ConnectAttr : public Builtin {
     HStatus run(const Arguments& args) override {
         const HPlug from = plugNamed(args.text(0));
         const HPlug to = plugNamed(args.text(1));
-        const std::shared_ptr<Slot> slot = resolvePlug(to);
+        const std::shared_ptr<Slot> slot = resolvePlug(normalContext, to);
         const HPlug present = slot && slot->source() ? makePlug(*slot->source()) : HPlug();
         if (present.isNull() || !args.has("force"))
             connect(from, to);
@@ -55,8 +55,8 @@ class DisconnectAttr : public Builtin {
     HStatus run(const Arguments& args) override {
         const HPlug source = plugNamed(args.text(0));
         const HPlug destination = plugNamed(args.text(1));
-        const std::shared_ptr<Slot> from = resolvePlug(source);
-        const std::shared_ptr<Slot> to = resolvePlug(destination);
+        const std::shared_ptr<Slot> from = resolvePlug(normalContext, source);
+        const std::shared_ptr<Slot> to = resolvePlug(normalContext, destination);
         if (!from || !to || to->source() != from.get())
             throw std::invalid_argument("'" + source.name().asStdString() + "' is not connected to '" +
                                         destination.name().asStdString() + "'");
@@ -74,7 +74,7 @@ class ListConnections : public Builtin {
         const std::string& name = args.text(0);
         if (!namesPlug(name))
             visitNode(*nodeNamed(name));
-        else if (const std::shared_ptr<Slot> slot = resolvePlug(plugNamed(name)))
+        else if (const std::shared_ptr<Slot> slot = resolvePlug(normalContext, plugNamed(name)))
             visit(*slot);
         give(std::move(names_));
         return {};

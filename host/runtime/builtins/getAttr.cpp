@@ -109,7 +109,7 @@ CommandValue labelOf(const Slot& slot) {
 class GetAttr : public Builtin {
     HStatus run(const Arguments& args) override {
         const HPlug plug = plugNamed(args.text(0));
-        const std::shared_ptr<Slot> slot = slotToEvaluate(plug);
+        const std::shared_ptr<Slot> slot = slotToEvaluate(normalContext, plug);
         if (!slot)
             throw std::invalid_argument("'" + plug.name().asStdString() + "' does not exist");
         if (args.has("lock")) {
@@ -118,7 +118,7 @@ class GetAttr : public Builtin {
         }
         HStatus status = pull(slot);
         if (!status.error())
-            give(asked(args, *resolvePlug(plug)));
+            give(asked(args, *resolvePlug(normalContext, plug)));
         return status;
     }
 

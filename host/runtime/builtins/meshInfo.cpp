@@ -78,12 +78,12 @@ std::string compare(const MeshData& mesh, const MeshData& other) {
 
 std::shared_ptr<MeshData> evaluatedMesh(const std::string& name) {
     const HPlug plug = plugNamed(name);
-    const std::shared_ptr<Slot> slot = slotToEvaluate(plug);
+    const std::shared_ptr<Slot> slot = slotToEvaluate(normalContext, plug);
     if (!slot)
         throw std::invalid_argument("'" + name + "' does not exist");
     if (const HStatus status = pull(slot); status.error())
         throw std::runtime_error(status.errorString().asStdString());
-    auto mesh = std::dynamic_pointer_cast<MeshData>(resolvePlug(plug)->data);
+    auto mesh = std::dynamic_pointer_cast<MeshData>(resolvePlug(normalContext, plug)->data);
     if (!mesh)
         throw std::invalid_argument("'" + name + "' holds no mesh");
     return mesh;

@@ -121,7 +121,7 @@ void setElements(const HPlug& array, const Attribute& attribute, const std::vect
     std::vector<double> numbers;
     numbers.reserve(words.size());
     for (unsigned i = 0; i < words.size(); ++i) {
-        const std::shared_ptr<Slot> present = nearestExisting(array.elementByLogicalIndex(i));
+        const std::shared_ptr<Slot> present = nearestExisting(normalContext, array.elementByLogicalIndex(i));
         if (const std::string refused = present ? Graph::setRefusal(*present) : ""; !refused.empty())
             throw std::invalid_argument(refused);
         if (attribute.isNumber())

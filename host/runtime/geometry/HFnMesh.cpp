@@ -128,7 +128,7 @@ HObject meshOf(OpenQuarn::Node& node, HStatus& status) {
     if (status.error())
         return {};
     const OpenQuarn::Field* field = node.type().find("outMesh");
-    const auto slot = field ? dataInCurrentContext(node)->slot(*field) : nullptr;
+    const auto slot = field ? dataIn(OpenQuarn::currentContext(), node)->slot(*field) : nullptr;
     if (slot)
         status = pull(slot);
     auto mesh = slot ? std::dynamic_pointer_cast<MeshData>(slot->data) : nullptr;

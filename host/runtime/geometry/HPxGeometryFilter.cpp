@@ -64,7 +64,7 @@ HIndexMapper HPxGeometryFilter::indexMapper(unsigned multiIndex, HStatus* status
             return HIndexMapper();
         }
         return Access::make<HIndexMapper>(
-            OpenQuarn::affectedVertices(*dataInCurrentContext(*node), multiIndex, outcome));
+            OpenQuarn::affectedVertices(*dataIn(OpenQuarn::currentContext(), *node), multiIndex, outcome));
     });
 }
 

@@ -76,8 +76,8 @@ void Context::fill(NodeData& data) {
     data.node.graph().setTimeIn(data, time_);
 }
 
-std::shared_ptr<NodeData> dataInCurrentContext(Node& node) {
-    return current ? current->dataOf(node) : node.data();
+std::shared_ptr<NodeData> dataIn(Context* context, Node& node) {
+    return context ? context->dataOf(node) : node.data();
 }
 
 std::shared_ptr<Slot> slotIn(const NodeData& data, const Slot& slot, bool create) {

@@ -38,10 +38,11 @@ private:
     std::unordered_map<const Node*, Entry> data_;
 };
 
-/// The context of the evaluation that the thread is in; null for the normal one.
+/// The context that the thread computes in: what a plug-in's call inside of compute() finds. For the bodies of the API
+/// alone; the runtime itself says in which context it means a thing.
 Context* currentContext();
 
-/// Puts the thread into a context.
+/// Holds while the plug-in's compute() runs.
 class ContextScope {
 public:
     explicit ContextScope(Context* context);
@@ -56,7 +57,8 @@ private:
 /// The API's handle on a context; null: the normal one.
 HDGContext contextHandle(const Context* context);
 
-std::shared_ptr<NodeData> dataInCurrentContext(Node& node);
+/// The data of a node in a context.
+std::shared_ptr<NodeData> dataIn(Context* context, Node& node);
 
 /// The slot at the same place in another context's data of the node; null when it is not there. `create` makes elements
 /// that are missing.

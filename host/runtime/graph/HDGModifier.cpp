@@ -50,8 +50,8 @@ HStatus connectNow(const HPlug& source, const HPlug& destination) {
 }
 
 HStatus disconnectNow(const HPlug& source, const HPlug& destination) {
-    const std::shared_ptr<Slot> from = OpenQuarn::resolvePlug(source);
-    const std::shared_ptr<Slot> to = OpenQuarn::resolvePlug(destination);
+    const std::shared_ptr<Slot> from = OpenQuarn::resolvePlug(OpenQuarn::normalContext, source);
+    const std::shared_ptr<Slot> to = OpenQuarn::resolvePlug(OpenQuarn::normalContext, destination);
     if (!from || !to || to->source() != from.get())
         return {HStatus::kFailure,
                 "'" + source.name().asStdString() + "' is not connected to '" + destination.name().asStdString() + "'"};
@@ -66,7 +66,7 @@ bool isLinked(const Slot& slot) {
 }
 
 HStatus removeNow(const HPlug& element, bool breakConnections) {
-    const std::shared_ptr<Slot> slot = OpenQuarn::resolvePlug(element);
+    const std::shared_ptr<Slot> slot = OpenQuarn::resolvePlug(OpenQuarn::normalContext, element);
     if (!slot || !slot->isElement)
         return {HStatus::kFailure, "'" + element.name().asStdString() + "' is no element that exists"};
     if (!breakConnections && isLinked(*slot))

@@ -16,11 +16,8 @@
 using OpenQuarn::Access;
 using OpenQuarn::apiCall;
 using OpenQuarn::apiValue;
-using OpenQuarn::nearestExisting;
 using OpenQuarn::Operation;
-using OpenQuarn::resolvePlug;
 using OpenQuarn::Slot;
-using OpenQuarn::slotToEvaluate;
 
 namespace {
 
@@ -38,6 +35,11 @@ bool namesWholeArray(const HPlug::Impl& impl) {
     return impl.field->isArray() && !impl.indices.back();
 }
 
+/// The plug's slot where the thread computes; null when there is none.
+std::shared_ptr<Slot> existing(const HPlug& plug) {
+    return resolvePlug(OpenQuarn::currentContext(), plug);
+}
+
 /// Evaluates the plug; null, with the status set, when there is no value to read.
 std::shared_ptr<Slot> evaluated(const HPlug& plug, HStatus& status) {
     const HPlug::Impl* impl = OpenQuarn::plugImpl(plug);
@@ -45,13 +47,13 @@ std::shared_ptr<Slot> evaluated(const HPlug& plug, HStatus& status) {
         status = nullPlug();
         return nullptr;
     }
-    std::shared_ptr<Slot> slot = slotToEvaluate(plug);
+    std::shared_ptr<Slot> slot = slotToEvaluate(OpenQuarn::currentContext(), plug);
     if (!slot)
         return nullptr;
     status = pull(slot);
     if (slot->owner)
         return slot;
-    slot = resolvePlug(plug); // the evaluation has put another in its place, or removed it
+    slot = existing(plug); // the evaluation has put another in its place, or removed it
     if (!slot)
         status = failed(plug, "does not exist after its node was evaluated");
     return slot;
@@ -82,8 +84,8 @@ template <class Put>
 std::string setRefusal(const HPlug& plug, const HPlug::Impl& impl, Put&& put) {
     if (!impl.field->attribute->writable)
         return "'" + plug.name().asStdString() + "' is an output and cannot be set";
-    if (const std::shared_ptr<Slot> existing = nearestExisting(plug))
-        if (std::string refused = OpenQuarn::Graph::setRefusal(*existing); !refused.empty())
+    if (const std::shared_ptr<Slot> nearest = nearestExisting(OpenQuarn::normalContext, plug))
+        if (std::string refused = OpenQuarn::Graph::setRefusal(*nearest); !refused.empty())
             return refused;
     if (namesWholeArray(impl))
         return "'" + plug.name().asStdString() + "' is an array: set its elements";
@@ -100,8 +102,8 @@ HStatus setPlug(const HPlug& plug, Operation point, Put&& put) {
             return nullPlug();
         if (const std::string refused = setRefusal(plug, *impl, put); !refused.empty())
             return {HStatus::kFailure, refused};
-        const bool isNew = !resolvePlug(plug);
-        const std::shared_ptr<Slot> slot = resolvePlug(plug, true);
+        const bool isNew = !resolvePlug(OpenQuarn::normalContext, plug);
+        const std::shared_ptr<Slot> slot = resolvePlug(OpenQuarn::normalContext, plug, true);
         if (!slot)
             return failed(plug, "does not name one value: an index is not chosen");
         put(*slot);
@@ -209,7 +211,7 @@ unsigned HPlug::numElements(HStatus* status) const {
             outcome = failed(*this, "is not an array");
             return 0U;
         }
-        const std::shared_ptr<Slot> slot = resolvePlug(*this);
+        const std::shared_ptr<Slot> slot = existing(*this);
         return slot ? static_cast<unsigned>(slot->elements().size()) : 0U;
     });
 }
@@ -219,7 +221,7 @@ HStatus HPlug::getExistingArrayAttributeIndices(std::vector<unsigned>& indices) 
         if (!isArray())
             return failed(*this, "is not an array");
         indices.clear();
-        const std::shared_ptr<Slot> slot = resolvePlug(*this);
+        const std::shared_ptr<Slot> slot = existing(*this);
         if (!slot)
             return HStatus::kSuccess;
         indices.reserve(slot->elements().size());
@@ -249,7 +251,7 @@ HPlug HPlug::elementByLogicalIndex(unsigned index, HStatus* status) const {
 
 HPlug HPlug::elementByPhysicalIndex(unsigned position, HStatus* status) const {
     return apiValue(Operation::HPlug_elementByPhysicalIndex, status, HPlug(), [&](HStatus& outcome) {
-        const std::shared_ptr<Slot> slot = isArray() ? resolvePlug(*this) : nullptr;
+        const std::shared_ptr<Slot> slot = isArray() ? existing(*this) : nullptr;
         const auto* entry = slot ? slot->elements().at(position) : nullptr;
         if (entry)
             return elementOf(*impl_, entry->index);
@@ -347,12 +349,12 @@ HStatus HPlug::selectAncestorLogicalIndex(unsigned index, const HObject& ancesto
 }
 
 bool HPlug::isDestination() const {
-    const std::shared_ptr<Slot> slot = resolvePlug(*this);
+    const std::shared_ptr<Slot> slot = existing(*this);
     return slot && sourceInContext(*slot);
 }
 
 bool HPlug::isSource() const {
-    const std::shared_ptr<Slot> slot = resolvePlug(*this);
+    const std::shared_ptr<Slot> slot = existing(*this);
     return slot && slot->hasDestinations();
 }
 
@@ -383,7 +385,7 @@ HPlug HPlug::source(HStatus* status) const {
             outcome = nullPlug();
             return HPlug();
         }
-        const std::shared_ptr<Slot> slot = resolvePlug(*this);
+        const std::shared_ptr<Slot> slot = existing(*this);
         for (const Slot* at = slot.get(); at; at = at->parent)
             if (const std::shared_ptr<Slot> source = sourceInContext(*at)) {
                 const std::shared_ptr<Slot> part = partBelow(source, *at, *slot);
@@ -398,7 +400,7 @@ HStatus HPlug::destinations(HPlugArray& plugs) const {
         if (isNull())
             return nullPlug();
         plugs.clear();
-        const std::shared_ptr<Slot> slot = resolvePlug(*this);
+        const std::shared_ptr<Slot> slot = existing(*this);
         if (!slot || !slot->links)
             return HStatus::kSuccess;
         plugs.reserve(slot->links->destinations.size());
@@ -409,13 +411,13 @@ HStatus HPlug::destinations(HPlugArray& plugs) const {
 }
 
 bool HPlug::isLocked() const {
-    const std::shared_ptr<Slot> slot = resolvePlug(*this);
+    const std::shared_ptr<Slot> slot = existing(*this);
     return slot && slot->locked;
 }
 
 HStatus HPlug::setLocked(bool on) {
     return apiCall(Operation::HPlug_setLocked, [&]() -> HStatus {
-        const std::shared_ptr<Slot> slot = resolvePlug(*this, true);
+        const std::shared_ptr<Slot> slot = resolvePlug(OpenQuarn::normalContext, *this, true);
         if (!slot)
             return isNull() ? nullPlug() : failed(*this, "does not name one value: an index is not chosen");
         slot->owner->node.graph().setLocked(*slot, on);

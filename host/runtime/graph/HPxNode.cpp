@@ -58,7 +58,7 @@ HTypeId HPxNode::typeId() const {
 
 HDataBlock HPxNode::forceCache() {
     const auto node = isRefused(Operation::HPxNode_forceCache) ? nullptr : impl_.lock();
-    return node ? Access::make<HDataBlock>(dataInCurrentContext(*node)) : HDataBlock();
+    return node ? Access::make<HDataBlock>(dataIn(OpenQuarn::currentContext(), *node)) : HDataBlock();
 }
 
 namespace {

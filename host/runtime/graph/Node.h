@@ -18,6 +18,9 @@ class Context;
 class Graph;
 class Node;
 
+/// Stands for the scene's own data wherever a context is asked for.
+inline constexpr Context* normalContext = nullptr;
+
 /// What the host keeps for a geometry filter beside its attributes, in one context.
 class FilterState {
 public:

@@ -68,7 +68,7 @@ private:
         HPlugArray affected;
         callPlugin(data.node, "setDependentsDirty", [&] { return user->setDependentsDirty(makePlug(slot), affected); });
         for (const HPlug& plug : affected)
-            if (const std::shared_ptr<Slot> dependent = resolvePlug(plug)) {
+            if (const std::shared_ptr<Slot> dependent = resolvePlug(data.context, plug)) {
                 announce(slot, *dependent);
                 queue_.push_back(dependent.get());
             }

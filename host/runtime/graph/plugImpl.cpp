@@ -80,38 +80,38 @@ std::shared_ptr<Slot> resolvePlugIn(const NodeData& data, const HPlug& plug, boo
     return impl ? descend(data, *impl, *impl->field, create, used) : nullptr;
 }
 
-std::shared_ptr<Slot> nearestExisting(const HPlug& plug) {
+std::shared_ptr<Slot> nearestExisting(Context* context, const HPlug& plug) {
     const HPlug::Impl* impl = plugImpl(plug);
     bool exists = true;
-    return impl ? nearestIn(*dataInCurrentContext(*impl->node), *impl, *impl->field, exists) : nullptr;
+    return impl ? nearestIn(*dataIn(context, *impl->node), *impl, *impl->field, exists) : nullptr;
 }
 
-std::shared_ptr<Slot> resolvePlug(const HPlug& plug, bool create) {
+std::shared_ptr<Slot> resolvePlug(Context* context, const HPlug& plug, bool create) {
     const HPlug::Impl* impl = plugImpl(plug);
-    return impl ? resolvePlugIn(*dataInCurrentContext(*impl->node), plug, create) : nullptr;
+    return impl ? resolvePlugIn(*dataIn(context, *impl->node), plug, create) : nullptr;
 }
 
-std::shared_ptr<Slot> slotToEvaluate(const HPlug& plug) {
+std::shared_ptr<Slot> slotToEvaluate(Context* context, const HPlug& plug) {
     const HPlug::Impl* impl = plugImpl(plug);
     if (!impl)
         return nullptr;
-    std::shared_ptr<Slot> slot = resolvePlug(plug, impl->field->computed);
+    std::shared_ptr<Slot> slot = resolvePlug(context, plug, impl->field->computed);
     if (slot)
         return slot;
-    for (const Slot* at = nearestExisting(plug).get(); at; at = at->parent)
+    for (const Slot* at = nearestExisting(context, plug).get(); at; at = at->parent)
         if (sourceInContext(*at)) {
             pull(std::const_pointer_cast<Slot>(at->shared_from_this()));
-            return resolvePlug(plug);
+            return resolvePlug(context, plug);
         }
     return nullptr;
 }
 
 TentativeSlot::TentativeSlot(const HPlug& plug)
-    : slot_(resolvePlug(plug)) {
+    : slot_(resolvePlug(normalContext, plug)) {
     if (slot_)
         return;
-    const std::shared_ptr<Slot> existing = nearestExisting(plug);
-    slot_ = resolvePlug(plug, true);
+    const std::shared_ptr<Slot> existing = nearestExisting(normalContext, plug);
+    slot_ = resolvePlug(normalContext, plug, true);
     for (Slot* at = slot_.get(); at && at != existing.get(); at = at->parent)
         made_ = at;
 }

@@ -26,22 +26,22 @@ namespace OpenQuarn {
 /// The plug of a slot; null for one that has been cut off.
 HPlug makePlug(const Slot& slot);
 
-/// The slot in the data of the calling thread's context; null when the plug is null, an index is not chosen, or an
-/// element does not exist. `create` makes elements that are missing.
-std::shared_ptr<Slot> resolvePlug(const HPlug& plug, bool create = false);
-/// The same in the data of a certain context.
+/// The slot in the data of a context; null when the plug is null, an index is not chosen, or an element does not exist.
+/// `create` makes elements that are missing.
+std::shared_ptr<Slot> resolvePlug(Context* context, const HPlug& plug, bool create = false);
+/// The same in given data of its node.
 std::shared_ptr<Slot> resolvePlugIn(const NodeData& data, const HPlug& plug, bool create);
 
 /// The slot of the plug, or the nearest one above it that exists; null for a null plug.
-std::shared_ptr<Slot> nearestExisting(const HPlug& plug);
+std::shared_ptr<Slot> nearestExisting(Context* context, const HPlug& plug);
 
 /// The slot that a plug's value comes from when it is evaluated. An element that does not exist may come into being
 /// with the evaluation: of an output it is made, below a connected array the array is evaluated first. Null as for
 /// resolvePlug().
-std::shared_ptr<Slot> slotToEvaluate(const HPlug& plug);
+std::shared_ptr<Slot> slotToEvaluate(Context* context, const HPlug& plug);
 
-/// The slot of a plug, made where it is missing, for as long as it is not clear whether it is needed: what was made is
-/// taken away again unless keep() is called.
+/// The slot of a plug in the normal context, made where it is missing, for as long as it is not clear whether it is
+/// needed: what was made is taken away again unless keep() is called.
 class TentativeSlot {
 public:
     explicit TentativeSlot(const HPlug& plug);

@@ -19,9 +19,9 @@ HStatus nullPlug() {
     return {HStatus::kInvalidParameter, "the plug is null"};
 }
 
-HStatus pullPlug(const HPlug& plug) noexcept {
+HStatus pullPlug(Context* context, const HPlug& plug) noexcept {
     try {
-        const std::shared_ptr<Slot> slot = slotToEvaluate(plug);
+        const std::shared_ptr<Slot> slot = slotToEvaluate(context, plug);
         if (slot)
             return pull(slot);
         return plug.isNull() ? nullPlug()
@@ -35,7 +35,7 @@ HStatus pullPlug(const HPlug& plug) noexcept {
 
 HStatus evaluate(const HPlug& plug) {
     const HStatus refused = threadStatus({"evaluate", ThreadTag::main});
-    return refused.error() ? refused : pullPlug(plug);
+    return refused.error() ? refused : pullPlug(normalContext, plug);
 }
 
 HStatus evaluate(const HPlugArray& plugs, bool parallel) {
@@ -44,13 +44,14 @@ HStatus evaluate(const HPlugArray& plugs, bool parallel) {
     std::vector<HStatus> statuses(plugs.size());
     if (parallel) {
         for (const HPlug& plug : plugs)
-            slotToEvaluate(plug);
+            slotToEvaluate(normalContext, plug);
         const ParallelSection section;
         const WorkScope waiting(ThreadWork::waiting);
-        tbb::parallel_for(std::size_t{0}, plugs.size(), [&](std::size_t i) { statuses[i] = pullPlug(plugs[i]); });
+        tbb::parallel_for(std::size_t{0}, plugs.size(),
+                          [&](std::size_t i) { statuses[i] = pullPlug(normalContext, plugs[i]); });
     } else {
         for (std::size_t i = 0; i < plugs.size(); ++i)
-            statuses[i] = pullPlug(plugs[i]);
+            statuses[i] = pullPlug(normalContext, plugs[i]);
     }
     for (const HStatus& status : statuses)
         if (status.error())
@@ -61,7 +62,7 @@ HStatus evaluate(const HPlugArray& plugs, bool parallel) {
 HStatus makeDirty(const HPlug& plug) {
     if (HStatus refused = threadStatus({"makeDirty", ThreadTag::main}); refused.error())
         return refused;
-    const std::shared_ptr<Slot> slot = resolvePlug(plug);
+    const std::shared_ptr<Slot> slot = resolvePlug(normalContext, plug);
     if (!slot)
         return plug.isNull() ? nullPlug()
                              : HStatus(HStatus::kFailure, "'" + plug.name().asStdString() + "' does not exist");
@@ -115,12 +116,11 @@ void EvaluationContext::setTime(double frame) {
 }
 
 HDataHandle EvaluationContext::evaluateAt(const HPlug& plug, HStatus* status) {
-    const ContextScope scope(&impl_->context);
     HStatus outcome = threadStatus({"EvaluationContext::evaluateAt", ThreadTag::main});
     std::shared_ptr<Slot> slot;
     if (!outcome.error()) {
-        outcome = pullPlug(plug);
-        slot = resolvePlug(plug);
+        outcome = pullPlug(&impl_->context, plug);
+        slot = resolvePlug(&impl_->context, plug);
     }
     if (status)
         *status = outcome;
