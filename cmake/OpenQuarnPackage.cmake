@@ -5,7 +5,7 @@ set(_openquarn_package_dir "${CMAKE_INSTALL_LIBDIR}/cmake/OpenQuarn")
 
 install(TARGETS OpenQuarn EXPORT OpenQuarnTargets DESTINATION "${CMAKE_INSTALL_LIBDIR}")
 nw_link_runpath(OpenQuarn)
-install(DIRECTORY host/api/openquarn host/runtime/application/openquarn_app
+install(DIRECTORY host/api/openquarn host/helpers/openquarn_helpers host/runtime/application/openquarn_app
   DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}" FILES_MATCHING PATTERN "*.h")
 
 configure_package_config_file("${CMAKE_CURRENT_LIST_DIR}/OpenQuarnConfig.cmake.in"

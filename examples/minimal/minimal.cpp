@@ -4,15 +4,14 @@
 //
 // Everything a plug-in keeps in static variables belongs to the library, and goes when the plug-in is unloaded.
 #include "openquarn/HArgDatabase.h"
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HFnPlugin.h"
 #include "openquarn/HItGeometry.h"
 #include "openquarn/HPxCommand.h"
 #include "openquarn/HPxDeformerNode.h"
 #include "openquarn/HSelectionList.h"
-
-#include <initializer_list>
+#include "openquarn_helpers/AttributeMaker.h"
+#include "openquarn_helpers/guard.h"
 
 namespace {
 
@@ -20,13 +19,8 @@ namespace {
 constexpr HTypeId pushId{0x6d000001};
 constexpr HTypeId remapId{0x6d000002};
 
-// For the functions that make attributes: the first step that fails is the answer.
-HStatus addAttributes(std::initializer_list<HObject> attributes) {
-    for (const HObject& attribute : attributes)
-        if (HStatus status = HPxNode::addAttribute(attribute); status.error())
-            return status;
-    return HStatus::kSuccess;
-}
+using openquarn_helpers::AttributeMaker; // remembers the first step that fails
+using openquarn_helpers::guarded;        // nothing is thrown at the host
 
 // --- a deformer: moves vertices along a direction ---
 
@@ -41,38 +35,37 @@ public:
     static HPxNode* create() { return new PushDeformer; }
 
     static HStatus initialize() {
-        HFnNumericAttribute number;
-        amount = number.create("amount", "am", HFnNumericData::kDouble, 0.0);
-        number.setKeyable(true);
-        directionX = number.create("directionX", "dx", HFnNumericData::kDouble, 0.0);
-        directionY = number.create("directionY", "dy", HFnNumericData::kDouble, 1.0);
-        directionZ = number.create("directionZ", "dz", HFnNumericData::kDouble, 0.0);
-        HStatus status = addAttributes({amount, directionX, directionY, directionZ});
+        AttributeMaker make;
+        amount = make.real("amount", "am");
+        directionX = make.real("directionX", "dx");
+        directionY = make.real("directionY", "dy", 1.0);
+        directionZ = make.real("directionZ", "dz");
+        make.add({amount, directionX, directionY, directionZ});
         // whatever changes one of these, the deformed geometry has to be made again
-        for (const HObject& input : {amount, directionX, directionY, directionZ})
-            if (!status.error())
-                status = attributeAffects(input, outputGeom);
-        return status;
+        make.affects({amount, directionX, directionY, directionZ}, {outputGeom});
+        return make.status();
     }
 
     // Called for each geometry that needs it. The iterator visits the vertices that the node affects, in the order of
     // the weights. Nothing to do is a success.
     HStatus deform(HDataBlock& block, HItGeometry& vertices, const HMatrix&, unsigned multiIndex) override {
-        const double distance = block.inputValue(amount).asDouble() * block.inputValue(envelope).asFloat();
-        const HVector step(distance * block.inputValue(directionX).asDouble(),
-                           distance * block.inputValue(directionY).asDouble(),
-                           distance * block.inputValue(directionZ).asDouble());
-        HStatus status;
-        const float* vertexWeights = envelopeWeights(block, multiIndex, &status); // null: all are 1
-        if (status.error())
-            return status;
-        HPointArray points; // not a member: several geometries may be deformed at the same time
-        status = vertices.allPositions(points);
-        if (status.error())
-            return status;
-        for (unsigned i = 0; i < points.length(); ++i)
-            points[i] += vertexWeights ? step * static_cast<double>(vertexWeights[i]) : step;
-        return vertices.setAllPositions(points);
+        return guarded(*this, "deform", [&]() -> HStatus {
+            const double distance = block.inputValue(amount).asDouble() * block.inputValue(envelope).asFloat();
+            const HVector step(distance * block.inputValue(directionX).asDouble(),
+                               distance * block.inputValue(directionY).asDouble(),
+                               distance * block.inputValue(directionZ).asDouble());
+            HStatus status;
+            const float* vertexWeights = envelopeWeights(block, multiIndex, &status); // null: all are 1
+            if (status.error())
+                return status;
+            HPointArray points; // not a member: several geometries may be deformed at the same time
+            status = vertices.allPositions(points);
+            if (status.error())
+                return status;
+            for (unsigned i = 0; i < points.length(); ++i)
+                points[i] += vertexWeights ? step * static_cast<double>(vertexWeights[i]) : step;
+            return vertices.setAllPositions(points);
+        });
     }
 };
 
@@ -93,19 +86,14 @@ public:
     static HPxNode* create() { return new RemapNode; }
 
     static HStatus initialize() {
-        HFnNumericAttribute number;
-        input = number.create("input", "i", HFnNumericData::kDouble);
-        number.setKeyable(true);
-        inputMax = number.create("inputMax", "im", HFnNumericData::kDouble, 1.0);
-        outputMax = number.create("outputMax", "om", HFnNumericData::kDouble, 1.0);
-        output = number.create("output", "o", HFnNumericData::kDouble);
-        number.setWritable(false); // nobody but compute() writes it
-        number.setStorable(false); // it can be computed again
-        HStatus status = addAttributes({input, inputMax, outputMax, output});
-        for (const HObject& from : {input, inputMax, outputMax})
-            if (!status.error())
-                status = attributeAffects(from, output);
-        return status;
+        AttributeMaker make;
+        input = make.real("input", "i");
+        inputMax = make.real("inputMax", "im", 1.0);
+        outputMax = make.real("outputMax", "om", 1.0);
+        output = make.real("output", "o", 0.0, openquarn_helpers::outputFlags);
+        make.add({input, inputMax, outputMax, output});
+        make.affects({input, inputMax, outputMax}, {output});
+        return make.status();
     }
 
     HStatus compute(const HPlug& plug, HDataBlock& block) override {

@@ -1,14 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "controls/controlCollectorNode.h"
 
-#include "controls/NodeAttributes.h"
 #include "controls/arrayOutput.h"
 #include "controls/guardedCompute.h"
 #include "openquarn/HDGModifier.h"
+#include "openquarn_helpers/AttributeMaker.h"
 
 #include <vector>
 
 namespace neuralWarp {
+
+using openquarn_helpers::AttributeFlags;
+using openquarn_helpers::AttributeMaker;
 
 const HTypeId controlCollectorNode::id(0x58000973);
 const HString controlCollectorNode::typeName("controlCollector");
@@ -32,21 +35,13 @@ HPxNode* controlCollectorNode::create() {
     return new (std::nothrow) controlCollectorNode;
 }
 
-namespace {
-
-void limit(NodeAttributes& attributes, const HObject& number, double least) {
-    attributes.note(HFnNumericAttribute(number).setMin(least));
-}
-
-} // namespace
-
 HStatus controlCollectorNode::initialize() {
     constexpr auto real = HFnNumericData::kDouble;
     constexpr AttributeFlags list{.array = true, .onDisconnect = HFnAttribute::kDelete};
     constexpr AttributeFlags builtList{.array = true, .builder = true, .onDisconnect = HFnAttribute::kDelete};
     constexpr AttributeFlags setting{.keyable = false};
 
-    NodeAttributes attributes;
+    AttributeMaker attributes;
     input = attributes.number("input", "in", real, 0.0, list);
     inputList = attributes.compound("inputList", "inl", {input}, builtList);
     minValue = attributes.number("minValue", "mnv", real, 0.0, setting);
@@ -54,11 +49,8 @@ HStatus controlCollectorNode::initialize() {
     defaultValue = attributes.number("defaultValue", "dv", real, 0.0, setting);
     limits = attributes.compound("limits", "lim", {minValue, maxValue, defaultValue}, list);
     limitsList = attributes.compound("limitsList", "liml", {limits}, builtList);
-    samples = attributes.number("samples", "sa", HFnNumericData::kInt, 1000.0, setting);
-    limit(attributes, samples, 1.0);
-    activationRate = attributes.number("activationRate", "ar", real, 0.2, setting);
-    limit(attributes, activationRate, 0.0);
-    attributes.note(HFnNumericAttribute(activationRate).setMax(1.0));
+    samples = attributes.number("samples", "sa", HFnNumericData::kInt, 1000.0, setting, {.min = 1.0});
+    activationRate = attributes.number("activationRate", "ar", real, 0.2, setting, {.min = 0.0, .max = 1.0});
     samplesStartFrame = attributes.number("samplesStartFrame", "ssf", HFnNumericData::kInt, 1.0, setting);
     output = attributes.number("output", "out", real, 0.0, {.array = true, .builder = true, .writable = false});
 

@@ -1,16 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "controls/matrixConverterNode.h"
 
-#include "controls/NodeAttributes.h"
 #include "controls/arrayOutput.h"
 #include "controls/guardedCompute.h"
 #include "controls/matrixChannels.h"
 #include "controls/matrixInput.h"
 #include "messages/messageText.h"
+#include "openquarn_helpers/AttributeMaker.h"
 
 #include <vector>
 
 namespace neuralWarp {
+
+using openquarn_helpers::AttributeFlags;
+using openquarn_helpers::AttributeMaker;
 
 const HTypeId matrixConverterNode::id(0x58000975);
 const HString matrixConverterNode::typeName("matrixConverter");
@@ -42,20 +45,15 @@ HPxNode* matrixConverterNode::create() {
 
 namespace {
 
-HObject makeSwitch(NodeAttributes& attributes, const char* longName, const char* shortName) {
-    return attributes.number(longName, shortName, HFnNumericData::kBoolean, 1.0, {.keyable = false});
+HObject makeSwitch(AttributeMaker& attributes, const char* longName, const char* shortName) {
+    return attributes.boolean(longName, shortName, true, {.keyable = false});
 }
 
-HObject makeConversion(NodeAttributes& attributes) {
-    HFnEnumAttribute set;
-    HStatus status;
-    HObject attribute = set.create("rotationConversion", "rc", ChannelChoice::kEuler, &status);
-    attributes.note(status);
-    attributes.note(set.addField(messageText(Text::kEuler), ChannelChoice::kEuler));
-    attributes.note(set.addField(messageText(Text::kQuaternion), ChannelChoice::kQuaternion));
-    attributes.note(set.addField(messageText(Text::kDoubleAxis), ChannelChoice::kDoubleAxis));
-    attributes.note(set.addField(messageText(Text::kTripleAxis), ChannelChoice::kTripleAxis));
-    return attribute;
+HObject makeConversion(AttributeMaker& attributes) { // in the order of ChannelChoice::Conversion
+    return attributes.choice("rotationConversion", "rc",
+                             {messageText(Text::kEuler), messageText(Text::kQuaternion), messageText(Text::kDoubleAxis),
+                              messageText(Text::kTripleAxis)},
+                             ChannelChoice::kEuler);
 }
 
 } // namespace
@@ -64,8 +62,8 @@ HStatus matrixConverterNode::initialize() {
     constexpr AttributeFlags result{
         .array = true, .builder = true, .writable = false, .onDisconnect = HFnAttribute::kDelete};
 
-    NodeAttributes attributes;
-    input = attributes.matrix("input", "in", {.array = true, .onDisconnect = HFnAttribute::kDelete});
+    AttributeMaker attributes;
+    input = attributes.data("input", "in", HFnData::kMatrix, {.array = true, .onDisconnect = HFnAttribute::kDelete});
     extractRotation = makeSwitch(attributes, "extractRotation", "er");
     extractScale = makeSwitch(attributes, "extractScale", "es");
     extractTranslation = makeSwitch(attributes, "extractTranslation", "et");

@@ -1,15 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "controls/orthoAxisFromMatrixArray.h"
 
-#include "controls/NodeAttributes.h"
 #include "controls/arrayOutput.h"
 #include "controls/axes.h"
 #include "controls/guardedCompute.h"
 #include "controls/matrixInput.h"
+#include "openquarn_helpers/AttributeMaker.h"
 
 #include <array>
 
 namespace neuralWarp {
+
+using openquarn_helpers::AttributeMaker;
 
 const HTypeId orthoAxisFromMatrixArray::id(0x58000974);
 const HString orthoAxisFromMatrixArray::typeName("orthoAxisFromMatrixArray");
@@ -26,8 +28,8 @@ HPxNode* orthoAxisFromMatrixArray::create() {
 }
 
 HStatus orthoAxisFromMatrixArray::initialize() {
-    NodeAttributes attributes;
-    input = attributes.matrix("input", "in", {.array = true, .onDisconnect = HFnAttribute::kDelete});
+    AttributeMaker attributes;
+    input = attributes.data("input", "in", HFnData::kMatrix, {.array = true, .onDisconnect = HFnAttribute::kDelete});
     output = attributes.number("output", "out", HFnNumericData::kDouble, 0.0, {.array = true, .builder = true});
     outputList = attributes.compound("outputList", "outl", {output},
                                      {.array = true, .builder = true, .onDisconnect = HFnAttribute::kDelete});

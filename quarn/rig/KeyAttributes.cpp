@@ -1,15 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/KeyAttributes.h"
 
+#include "openquarn_helpers/AttributeMaker.h"
+
 namespace rig {
 
-void KeyAttributes::make(AttributeMaker& maker) {
+void KeyAttributes::make(openquarn_helpers::AttributeMaker& maker) {
     keyTimes = maker.data("keyTimes", "kt", HFnData::kDoubleArray);
     keyValues = maker.data("keyValues", "kv", HFnData::kDoubleArray);
     keyInTangents = maker.data("keyInTangents", "kit", HFnData::kDoubleArray);
     keyOutTangents = maker.data("keyOutTangents", "kot", HFnData::kDoubleArray);
     interpolation = maker.choice("interpolation", "ip", {"step", "linear", "spline"}, 1);
-    time = maker.number("time", "ti");
+    time = maker.real("time", "ti");
     maker.add({keyTimes, keyValues, keyInTangents, keyOutTangents, interpolation, time});
 }
 

@@ -2,9 +2,12 @@
 // The attributes that both kinds of animation curves have.
 #pragma once
 
-#include "rig/AttributeMaker.h"
 #include "rig/Inputs.h"
 #include "rig/KeyTrack.h"
+
+namespace openquarn_helpers {
+class AttributeMaker;
+}
 
 namespace rig {
 
@@ -17,7 +20,7 @@ struct KeyAttributes {
     HObject time;
 
     /// Makes and adds them; what they affect is the caller's to say. [main]
-    void make(AttributeMaker& maker);
+    void make(openquarn_helpers::AttributeMaker& maker);
     /// Reads the interpolation, and brings the track up to date. [eval]
     HStatus read(Inputs& inputs, KeyTrack& track, Interpolation& kind) const;
 };

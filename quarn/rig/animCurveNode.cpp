@@ -1,9 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/animCurveNode.h"
 
-#include "rig/guard.h"
+#include "openquarn_helpers/AttributeMaker.h"
+#include "openquarn_helpers/guard.h"
 
 namespace rig {
+
+using openquarn_helpers::AttributeMaker;
+using openquarn_helpers::guarded;
+using openquarn_helpers::outputFlags;
 
 const HTypeId animCurveNode::id(0x6e770012);
 const HString animCurveNode::typeName("animCurve");
@@ -21,11 +26,11 @@ HPxNode* animCurveNode::create() {
 HStatus animCurveNode::initialize() {
     AttributeMaker make;
     keys.make(make);
-    output = make.number("output", "o", 0.0, Role::output);
+    output = make.real("output", "o", 0.0, outputFlags);
     make.add({output});
     make.affects(
         {keys.keyTimes, keys.keyValues, keys.keyInTangents, keys.keyOutTangents, keys.interpolation, keys.time},
-        {output});
+        {output}, true);
     return make.status();
 }
 

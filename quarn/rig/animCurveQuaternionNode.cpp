@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/animCurveQuaternionNode.h"
 
-#include "rig/guard.h"
+#include "openquarn_helpers/AttributeMaker.h"
+#include "openquarn_helpers/guard.h"
+
 #include "rig/texts.h"
 
 #include "openquarn/HQuaternion.h"
@@ -9,6 +11,10 @@
 #include <cmath>
 
 namespace rig {
+
+using openquarn_helpers::AttributeMaker;
+using openquarn_helpers::guarded;
+using openquarn_helpers::outputFlags;
 
 using Node = animCurveQuaternionNode;
 
@@ -30,14 +36,14 @@ HStatus animCurveQuaternionNode::initialize() {
     AttributeMaker make;
     keys.make(make);
     rotateOrder = make.rotationOrder("rotateOrder", "ro");
-    outputRotateX = make.number("outputRotateX", "orx", 0.0, Role::output);
-    outputRotateY = make.number("outputRotateY", "ory", 0.0, Role::output);
-    outputRotateZ = make.number("outputRotateZ", "orz", 0.0, Role::output);
-    outputRotate = make.compound("outputRotate", "or", {outputRotateX, outputRotateY, outputRotateZ}, Role::output);
+    outputRotateX = make.real("outputRotateX", "orx", 0.0, outputFlags);
+    outputRotateY = make.real("outputRotateY", "ory", 0.0, outputFlags);
+    outputRotateZ = make.real("outputRotateZ", "orz", 0.0, outputFlags);
+    outputRotate = make.compound("outputRotate", "or", {outputRotateX, outputRotateY, outputRotateZ}, outputFlags);
     make.add({rotateOrder, outputRotate});
     make.affects({keys.keyTimes, keys.keyValues, keys.keyInTangents, keys.keyOutTangents, keys.interpolation, keys.time,
                   rotateOrder},
-                 {outputRotate});
+                 {outputRotate}, true);
     return make.status();
 }
 

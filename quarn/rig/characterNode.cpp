@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/characterNode.h"
 
-#include "rig/AttributeMaker.h"
+#include "openquarn_helpers/AttributeMaker.h"
 
 #include "openquarn/HExternalContentInfoTable.h"
 
@@ -11,6 +11,8 @@
 #include <system_error>
 
 namespace rig {
+
+using openquarn_helpers::AttributeMaker;
 
 const HTypeId characterNode::id(0x6e770022);
 const HString characterNode::typeName("character");
@@ -30,12 +32,10 @@ HPxNode* characterNode::create() {
 
 HStatus characterNode::initialize() {
     AttributeMaker make;
-    metersPerUnit = make.number("metersPerUnit", "mpu", 1.0);
-    framesPerSecond = make.number("framesPerSecond", "fps", 24.0);
-    sourceFile = make.data("sourceFile", "sf", HFnData::kString);
-    vertexMapFile = make.data("vertexMapFile", "vmf", HFnData::kString);
-    for (const HObject& file : {sourceFile, vertexMapFile})
-        HFnTypedAttribute(file).setUsedAsFilename(true);
+    metersPerUnit = make.real("metersPerUnit", "mpu", 1.0);
+    framesPerSecond = make.real("framesPerSecond", "fps", 24.0);
+    sourceFile = make.data("sourceFile", "sf", HFnData::kString, {.filename = true});
+    vertexMapFile = make.data("vertexMapFile", "vmf", HFnData::kString, {.filename = true});
     vertexMapDigests = make.data("vertexMapDigests", "vmd", HFnData::kString);
     make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile, vertexMapDigests});
     return make.status();

@@ -1,11 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/jointNode.h"
 
-#include "rig/AttributeMaker.h"
+#include "openquarn_helpers/AttributeMaker.h"
+#include "openquarn_helpers/guard.h"
+
 #include "rig/Inputs.h"
-#include "rig/guard.h"
 
 namespace rig {
+
+using openquarn_helpers::AttributeMaker;
+using openquarn_helpers::guarded;
+using openquarn_helpers::outputFlags;
 
 using Node = jointNode;
 
@@ -32,33 +37,33 @@ HPxNode* jointNode::create() {
 
 HStatus jointNode::initialize() {
     AttributeMaker make;
-    translateX = make.number("translateX", "tx");
-    translateY = make.number("translateY", "ty");
-    translateZ = make.number("translateZ", "tz");
+    translateX = make.real("translateX", "tx");
+    translateY = make.real("translateY", "ty");
+    translateZ = make.real("translateZ", "tz");
     translate = make.compound("translate", "t", {translateX, translateY, translateZ});
-    rotateX = make.number("rotateX", "rx");
-    rotateY = make.number("rotateY", "ry");
-    rotateZ = make.number("rotateZ", "rz");
+    rotateX = make.real("rotateX", "rx");
+    rotateY = make.real("rotateY", "ry");
+    rotateZ = make.real("rotateZ", "rz");
     rotate = make.compound("rotate", "r", {rotateX, rotateY, rotateZ});
     rotateOrder = make.rotationOrder("rotateOrder", "ro");
-    jointOrientX = make.number("jointOrientX", "jox");
-    jointOrientY = make.number("jointOrientY", "joy");
-    jointOrientZ = make.number("jointOrientZ", "joz");
+    jointOrientX = make.real("jointOrientX", "jox");
+    jointOrientY = make.real("jointOrientY", "joy");
+    jointOrientZ = make.real("jointOrientZ", "joz");
     jointOrient = make.compound("jointOrient", "jo", {jointOrientX, jointOrientY, jointOrientZ});
-    scaleX = make.number("scaleX", "sx", 1.0);
-    scaleY = make.number("scaleY", "sy", 1.0);
-    scaleZ = make.number("scaleZ", "sz", 1.0);
+    scaleX = make.real("scaleX", "sx", 1.0);
+    scaleY = make.real("scaleY", "sy", 1.0);
+    scaleZ = make.real("scaleZ", "sz", 1.0);
     scale = make.compound("scale", "s", {scaleX, scaleY, scaleZ});
     parentMatrix = make.matrix("parentMatrix", "pm");
     restMatrix = make.matrix("restMatrix", "rsm");
-    matrix = make.matrix("matrix", "m", Role::output);
-    worldMatrix = make.matrix("worldMatrix", "wm", Role::output);
-    relativeMatrix = make.matrix("relativeMatrix", "rm", Role::output);
+    matrix = make.matrix("matrix", "m", outputFlags);
+    worldMatrix = make.matrix("worldMatrix", "wm", outputFlags);
+    relativeMatrix = make.matrix("relativeMatrix", "rm", outputFlags);
     make.add({translate, rotate, rotateOrder, jointOrient, scale, parentMatrix, restMatrix, matrix, worldMatrix,
               relativeMatrix});
-    make.affects({translate, rotate, rotateOrder, jointOrient, scale}, {matrix, worldMatrix, relativeMatrix});
-    make.affects({parentMatrix}, {worldMatrix});
-    make.affects({restMatrix}, {relativeMatrix});
+    make.affects({translate, rotate, rotateOrder, jointOrient, scale}, {matrix, worldMatrix, relativeMatrix}, true);
+    make.affects({parentMatrix}, {worldMatrix}, true);
+    make.affects({restMatrix}, {relativeMatrix}, true);
     return make.status();
 }
 

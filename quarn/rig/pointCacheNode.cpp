@@ -2,8 +2,8 @@
 #include "rig/pointCacheNode.h"
 
 #include "openquarn/HFileObject.h"
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnMesh.h"
+#include "openquarn_helpers/AttributeMaker.h"
 #include "storage/NpyFile.h"
 
 #include <algorithm>
@@ -16,6 +16,9 @@
 #include <vector>
 
 namespace rig {
+
+using openquarn_helpers::AttributeMaker;
+using openquarn_helpers::outputFlags;
 
 const HTypeId pointCacheNode::id(0x6e770021);
 const HString pointCacheNode::typeName("pointCache");
@@ -35,31 +38,16 @@ HPxNode* pointCacheNode::create() {
 }
 
 HStatus pointCacheNode::initialize() {
-    HFnTypedAttribute typed;
-    HFnNumericAttribute number;
-    cacheFile = typed.create("cacheFile", "cf", HFnData::kString);
-    typed.setUsedAsFilename(true);
-    time = number.create("time", "t", HFnNumericData::kDouble, 1.0);
-    startFrame = number.create("startFrame", "sf", HFnNumericData::kDouble, 1.0);
-    number.setKeyable(false);
-    interpolate = number.create("interpolate", "ip", HFnNumericData::kBoolean, 1.0);
-    number.setKeyable(false);
-    inMesh = typed.create("inMesh", "inm", HFnData::kMesh);
-    outMesh = typed.create("outMesh", "outm", HFnData::kMesh);
-    typed.setWritable(false);
-    typed.setStorable(false);
-
-    const auto inputs = {cacheFile, time, startFrame, interpolate, inMesh};
-    HStatus status;
-    for (const HObject& attribute : inputs)
-        if (!status.error())
-            status = addAttribute(attribute);
-    if (!status.error())
-        status = addAttribute(outMesh);
-    for (const HObject& attribute : inputs)
-        if (!status.error())
-            status = attributeAffects(attribute, outMesh);
-    return status;
+    AttributeMaker make;
+    cacheFile = make.data("cacheFile", "cf", HFnData::kString, {.filename = true});
+    time = make.real("time", "t", 1.0);
+    startFrame = make.real("startFrame", "sf", 1.0, {.keyable = false});
+    interpolate = make.boolean("interpolate", "ip", true, {.keyable = false});
+    inMesh = make.data("inMesh", "inm", HFnData::kMesh);
+    outMesh = make.data("outMesh", "outm", HFnData::kMesh, outputFlags);
+    make.add({cacheFile, time, startFrame, interpolate, inMesh, outMesh});
+    make.affects({cacheFile, time, startFrame, interpolate, inMesh}, {outMesh});
+    return make.status();
 }
 
 namespace {

@@ -1,13 +1,17 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/skinClusterNode.h"
 
-#include "rig/AttributeMaker.h"
+#include "openquarn_helpers/AttributeMaker.h"
+#include "openquarn_helpers/guard.h"
+
 #include "rig/Inputs.h"
 #include "rig/SkinState.h"
-#include "rig/guard.h"
 #include "rig/texts.h"
 
 namespace rig {
+
+using openquarn_helpers::AttributeMaker;
+using openquarn_helpers::guarded;
 
 using Node = skinClusterNode;
 
@@ -30,18 +34,17 @@ HPxNode* skinClusterNode::create() {
 }
 
 HStatus skinClusterNode::initialize() {
+    constexpr openquarn_helpers::AttributeFlags list{.array = true};
     AttributeMaker make;
-    matrix = make.data("matrix", "m", HFnData::kMatrix);
-    bindPreMatrix = make.matrix("bindPreMatrix", "bpm");
+    matrix = make.data("matrix", "m", HFnData::kMatrix, list);
+    bindPreMatrix = make.matrix("bindPreMatrix", "bpm", list);
     influenceCounts = make.data("influenceCounts", "ifc", HFnData::kDoubleArray);
     influences = make.data("influences", "ifl", HFnData::kDoubleArray);
     skinWeights = make.data("skinWeights", "skw", HFnData::kDoubleArray);
-    skin = make.compound("skin", "skn", {influenceCounts, influences, skinWeights});
+    skin = make.compound("skin", "skn", {influenceCounts, influences, skinWeights}, list);
     normalize = make.boolean("normalize", "nrm", true);
-    for (const HObject& array : {matrix, bindPreMatrix, skin})
-        make.makeArray(array);
     make.add({matrix, bindPreMatrix, skin, normalize});
-    make.affects({matrix, bindPreMatrix, skin, normalize}, {outputGeom});
+    make.affects({matrix, bindPreMatrix, skin, normalize}, {outputGeom}, true);
     return make.status();
 }
 
