@@ -6,9 +6,6 @@ namespace OpenQuarn {
 
 class CommandRegistry;
 
-/// Registers them, once a process. Thread: main.
-void registerBuiltins();
-
 void addConnectionCommands(CommandRegistry& registry);
 void addDuplicate(CommandRegistry& registry);
 void addFileCommand(CommandRegistry& registry);

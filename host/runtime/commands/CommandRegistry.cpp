@@ -10,6 +10,8 @@
 namespace OpenQuarn {
 namespace {
 
+void (*addOwn)(CommandRegistry&) = nullptr; // constant before any initializer runs
+
 bool isCommandName(const std::string& name) {
     return !name.empty() && std::isalpha(static_cast<unsigned char>(name.front())) != 0 &&
            std::all_of(name.begin(), name.end(), [](unsigned char c) { return std::isalnum(c) != 0 || c == '_'; });
@@ -18,8 +20,18 @@ bool isCommandName(const std::string& name) {
 } // namespace
 
 CommandRegistry& CommandRegistry::instance() {
-    static CommandRegistry registry;
+    static CommandRegistry registry = [] {
+        CommandRegistry filled;
+        if (addOwn)
+            addOwn(filled);
+        return filled;
+    }();
     return registry;
+}
+
+bool CommandRegistry::bringOwn(void (*add)(CommandRegistry&)) noexcept {
+    addOwn = add;
+    return true;
 }
 
 HStatus CommandRegistry::add(CommandType type) {

@@ -27,8 +27,11 @@ struct CommandType {
 /// Thread: main.
 class CommandRegistry {
 public:
-    /// The one of the process; the first session brings the host's own commands (builtins/).
+    /// The one of the process, with the host's own commands in it.
     static CommandRegistry& instance();
+    /// Has `add` put the host's own commands into the one of the process when it is first asked for: they lie in a
+    /// folder above this one. True.
+    static bool bringOwn(void (*add)(CommandRegistry&)) noexcept;
 
     /// Adds a command. Fails with kInvalidParameter for a name that is not a letter followed by letters, digits and
     /// underscores, without a creator, and when there is a command of that name already.

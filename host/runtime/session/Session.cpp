@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn_app/Session.h"
 
-#include "builtins/builtins.h"
 #include "core/threads.h"
 #include "geometry/filterAttributes.h"
 #include "gpu/Device.h"
@@ -23,7 +22,6 @@ struct Session::Impl {
 Session::Session() {
     setMainThread();
     registerGeometryNodes();
-    registerBuiltins();
     impl_ = std::make_unique<Impl>();
 }
 
