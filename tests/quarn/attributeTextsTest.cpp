@@ -72,71 +72,37 @@ TEST(AttributeTextsTest, LinesSayWhatIsNotAsUsual) {
         "array data builder, deleted when disconnected\n");
 }
 
-// each row: where in the JSON, and what stands there
+// what stands there of each attribute, all of the first
 TEST(AttributeTextsTest, JsonSaysEverything) {
-    rapidjson::Document document;
-    document.Parse(quarn::attributeJson(everything()).c_str());
-    ASSERT_FALSE(document.HasParseError());
-    ASSERT_EQ(document.Size(), 7U);
-    const struct {
-        unsigned attribute;
-        const char* key;
-        const char* json;
-    } rows[] = {
-        {0, "name", R"("group")"},
-        {0, "shortName", R"("g")"},
-        {0, "parent", "null"},
-        {0, "inherited", "true"},
-        {0, "kind", R"("compound")"},
-        {0, "array", "true"},
-        {0, "default", "null"},
-        {0, "affects", R"([{"attribute":"state","tree":true,"sameElement":true,"inherited":true}])"},
-        {1, "parent", R"("group")"},
-        {1, "inherited", "false"},
-        {1, "kind", R"("numeric")"},
-        {1, "type", R"("float")"},
-        {1, "dataTypeId", "null"},
-        {1, "fields", "null"},
-        {1, "default", "0.2"},
-        {1, "min", "-100000"},
-        {1, "max", R"("inf")"},
-        {1, "softMin", "0.0001"},
-        {1, "softMax", "1e20"},
-        {1, "readable", "false"},
-        {1, "storable", "false"},
-        {1, "keyable", "false"},
-        {1, "affects", "[]"},
-        {2, "default", "3"},
-        {2, "fields", R"([{"value":0,"label":"None"},{"value":3,"label":"Two \"words\""}])"},
-        {2, "min", "null"},
-        {2, "keyable", "true"},
-        {2, "disconnect", R"("reset")"},
-        {3, "default", "true"},
-        {3, "disconnect", R"("nothing")"},
-        {4, "default", R"("a b")"},
-        {4, "usedAsFilename", "true"},
-        {5, "kind", R"("matrix")"},
-        {5, "default", "[1,0,0,0,0,1,0,0,0,0,1,0,0,0,0,1]"},
-        {6, "kind", R"("typed")"},
-        {6, "type", R"("pluginData")"},
-        {6, "dataTypeId", "1476397426"},
-        {6, "writable", "false"},
-        {6, "connectable", "false"},
-        {6, "hidden", "true"},
-        {6, "indexMatters", "false"},
-        {6, "usesArrayDataBuilder", "true"},
-        {6, "disconnect", R"("delete")"},
-    };
-    for (const auto& row : rows) {
-        rapidjson::Document expected;
-        expected.Parse(row.json);
-        ASSERT_FALSE(expected.HasParseError()) << row.json;
-        const rapidjson::Value& attribute = document[row.attribute];
-        ASSERT_TRUE(attribute.HasMember(row.key)) << row.attribute << ' ' << row.key;
-        EXPECT_TRUE(attribute[row.key] == expected) << row.attribute << ' ' << row.key;
+    rapidjson::Document document, expected;
+    ASSERT_FALSE(document.Parse(quarn::attributeJson(everything()).c_str()).HasParseError());
+    ASSERT_FALSE(expected
+                     .Parse(R"([
+        {"name": "group", "shortName": "g", "parent": null, "inherited": true, "kind": "compound", "type": "compound",
+         "dataTypeId": null, "fields": null, "default": null, "min": null, "max": null, "softMin": null,
+         "softMax": null, "array": true, "readable": true, "writable": true, "connectable": true, "storable": true,
+         "keyable": false, "hidden": false, "indexMatters": true, "usesArrayDataBuilder": false,
+         "usedAsFilename": false, "disconnect": "nothing",
+         "affects": [{"attribute": "state", "tree": true, "sameElement": true, "inherited": true}]},
+        {"parent": "group", "inherited": false, "kind": "numeric", "type": "float", "default": 0.2, "min": -100000,
+         "max": "inf", "softMin": 0.0001, "softMax": 1e20, "readable": false, "storable": false, "keyable": false,
+         "affects": []},
+        {"default": 3, "fields": [{"value": 0, "label": "None"}, {"value": 3, "label": "Two \"words\""}],
+         "keyable": true, "disconnect": "reset"},
+        {"default": true},
+        {"default": "a b", "usedAsFilename": true},
+        {"kind": "matrix", "default": [1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1]},
+        {"kind": "typed", "type": "pluginData", "dataTypeId": 1476397426, "writable": false, "connectable": false,
+         "hidden": true, "indexMatters": false, "usesArrayDataBuilder": true, "disconnect": "delete"}])")
+                     .HasParseError());
+    ASSERT_EQ(document.Size(), expected.Size());
+    for (rapidjson::SizeType i = 0; i < expected.Size(); ++i) {
+        EXPECT_EQ(document[i].MemberCount(), 25U);
+        for (const auto& member : expected[i].GetObject()) {
+            ASSERT_TRUE(document[i].HasMember(member.name)) << i << ' ' << member.name.GetString();
+            EXPECT_TRUE(document[i][member.name] == member.value) << i << ' ' << member.name.GetString();
+        }
     }
-    for (const rapidjson::Value& attribute : document.GetArray())
-        EXPECT_EQ(attribute.MemberCount(), 25U);
 }
 
 } // namespace

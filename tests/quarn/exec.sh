@@ -4,20 +4,7 @@ set -euo pipefail
 quarn=$1 plugin=$2 script=$3
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-bad=0
-
-# expect STATUS OUT-PATTERN ERR-PATTERN ARGS...: patterns are regular expressions, "" for an empty stream
-expect() {
-  local status=0 wanted=$1 out=$2 err=$3
-  shift 3
-  "$quarn" "$@" >"$work/out" 2>"$work/err" <"$work/in" || status=$?
-  if [[ $status != "$wanted" ]] || ! fits "$out" "$work/out" || ! fits "$err" "$work/err"; then
-    printf 'quarn %s: status %s, not %s, or the streams do not fit /%s/ and /%s/:\n' "$*" "$status" "$wanted" "$out" "$err"
-    cat "$work/out" "$work/err"
-    bad=1
-  fi
-}
-fits() { if [[ $1 ]]; then grep -Pqz -- "$1" "$2"; else [[ ! -s $2 ]]; fi; }
+source tests/support/expect.sh
 
 : >"$work/in"
 expect 0 '^lift\n0\.2\npush\n0\.4\n2\n$' 'lift is one of mine' exec --plugin "$plugin" "$script"

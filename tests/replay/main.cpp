@@ -2,7 +2,6 @@
 // replay_cases DIR: replays reference cases through the real code; `usage` lists the options.
 #include "replayOnDevice.h"
 #include "run.h"
-#include "selfCheck.h"
 
 #include <cstdio>
 #include <cstring>
@@ -17,10 +16,9 @@ using replay::Kind;
 using CasesByKind = std::map<std::string, std::vector<Case*>>;
 
 constexpr const char* usage =
-    "usage: replay_cases DIR [--exact | --self-check | --evaluator gpu [--device DEVICE]] [--skip-if-absent]\n"
+    "usage: replay_cases DIR [--exact | --evaluator gpu [--device DEVICE]] [--skip-if-absent]\n"
     "  DIR               a folder of reference cases, one JSON file each\n"
     "  --exact           compare with tolerance 0\n"
-    "  --self-check      change one expected value per key and kind: each change must be noticed\n"
     "  --evaluator gpu   replay the scenarios alone, and compare the positions that an OpenCL device gives\n"
     "  --device DEVICE   which device: a number, or a part of its name; else the first\n"
     "  --skip-if-absent  exit 77 instead of 2 when DIR, or a device, is not there\n"
@@ -29,7 +27,6 @@ constexpr const char* usage =
 struct Options {
     std::string folder;
     bool exact = false;
-    bool selfCheck = false;
     bool skipIfAbsent = false;
     std::string evaluator = "cpu";
     std::string device;
@@ -45,7 +42,7 @@ std::string* valueOf(const std::string& argument, Options& options) {
 bool isConsistent(const Options& options) {
     const bool isGpu = options.evaluator == "gpu";
     return !options.folder.empty() && (isGpu || options.evaluator == "cpu") && (isGpu || options.device.empty()) &&
-           options.exact + options.selfCheck + isGpu <= 1;
+           options.exact + isGpu <= 1;
 }
 
 bool parse(int argc, char** argv, Options& options) {
@@ -55,8 +52,6 @@ bool parse(int argc, char** argv, Options& options) {
             *value = argv[++i];
         else if (argument == "--exact")
             options.exact = true;
-        else if (argument == "--self-check")
-            options.selfCheck = true;
         else if (argument == "--skip-if-absent")
             options.skipIfAbsent = true;
         else if (argument.starts_with("-") || !options.folder.empty())
@@ -96,18 +91,6 @@ void replayKind(const Kind& kind, const std::vector<Case*>& cases, bool exact, T
     std::printf("%zu cases of kind %s, %zu failed\n", cases.size(), kind.name.data(), failed);
 }
 
-void checkKind(const Kind& kind, const std::vector<Case*>& cases, Tally& tally) {
-    const auto result = replay::selfCheck(kind, cases);
-    for (const std::string& key : result.unnoticed)
-        std::printf("kind %s: a change of \"%s\" went unnoticed\n", kind.name.data(), key.c_str());
-    for (const std::string& key : result.unperturbed)
-        tally.failure(std::string("kind ") + kind.name.data() + ": no case has a value to change in \"" + key + '"');
-    tally.passed += result.perturbed - result.unnoticed.size();
-    tally.failed += result.unnoticed.size();
-    std::printf("%zu cases of kind %s, %zu keys changed, %zu unnoticed\n", cases.size(), kind.name.data(),
-                result.perturbed, result.unnoticed.size());
-}
-
 void runAll(CasesByKind& byKind, const Options& options, Tally& tally) {
     for (const Kind& kind : replay::kinds) {
         const auto& cases = byKind[std::string(kind.name)];
@@ -116,8 +99,6 @@ void runAll(CasesByKind& byKind, const Options& options, Tally& tally) {
                         kind.name.data());
         else if (cases.empty())
             tally.failure("0 cases of kind " + std::string(kind.name) + ": there must be some");
-        else if (options.selfCheck)
-            checkKind(kind, cases, tally);
         else
             replayKind(kind, cases, options.exact, tally);
     }

@@ -2,6 +2,7 @@
 // Loading plug-ins from files, and unloading them: every step that can fail, and what is left behind.
 #include "host/plugins/TinyTypes.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include "openquarn/HFnData.h"
 #include "openquarn/HFnDependencyNode.h"
@@ -41,16 +42,6 @@ bool isMapped(const std::string& name) {
     if (handle)
         dlclose(handle);
     return handle != nullptr;
-}
-
-/// The text of what is thrown; empty when nothing is.
-std::string errorOf(const std::function<void()>& work) {
-    try {
-        work();
-        return {};
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
 }
 
 bool hasType(const char* name) {
@@ -112,7 +103,7 @@ TEST_F(Loading, EveryStepThatFailsIsNamedAndLeavesNothing) {
         {module("tinyMakesNode"), "a node is left"},
     };
     for (const FailingLoad& row : rows) {
-        const std::string error = errorOf([&] { loadPlugin(row.path); });
+        const std::string error = failureOf([&] { loadPlugin(row.path); });
         EXPECT_THAT(error, HasSubstr("plug-in '" + row.path + "' cannot be loaded"));
         EXPECT_THAT(error, HasSubstr(row.reason));
         expectNothingLeft();
@@ -140,19 +131,20 @@ TEST_F(Loading, TellsWhatIsLoadedAndLoadsAgainAfterUnloading) {
         expectNothingLeft();
         EXPECT_FALSE(isMapped("tinyGood"));
     }
-    EXPECT_THAT(errorOf([] { pluginInfo("tinyGood"); }), HasSubstr("no plug-in named 'tinyGood'"));
-    EXPECT_THAT(errorOf([] { unloadPlugin("tinyGood"); }), HasSubstr("no plug-in named 'tinyGood'"));
+    EXPECT_THAT(failureOf([] { pluginInfo("tinyGood"); }), HasSubstr("no plug-in named 'tinyGood'"));
+    EXPECT_THAT(failureOf([] { unloadPlugin("tinyGood"); }), HasSubstr("no plug-in named 'tinyGood'"));
 }
 
 TEST_F(Loading, OnlyOneOfAName) {
     const fs::path other = copies_.path() / "tinyGood.so";
     fs::copy_file(module("tinyGood"), other, fs::copy_options::overwrite_existing);
     loadPlugin(module("tinyGood"));
-    EXPECT_THAT(errorOf([&] { loadPlugin(other.string()); }), HasSubstr("is loaded already, from " + folder.string()));
+    EXPECT_THAT(failureOf([&] { loadPlugin(other.string()); }),
+                HasSubstr("is loaded already, from " + folder.string()));
     // another name, but the same node type: the first one stays whole
     const fs::path renamed = copies_.path() / "tinyCopy.so";
     fs::copy_file(module("tinyGood"), renamed, fs::copy_options::overwrite_existing);
-    EXPECT_THAT(errorOf([&] { loadPlugin(renamed.string()); }), HasSubstr("is in the way of 'tinyNode'"));
+    EXPECT_THAT(failureOf([&] { loadPlugin(renamed.string()); }), HasSubstr("is in the way of 'tinyNode'"));
     EXPECT_TRUE(hasType("tinyNode"));
     EXPECT_TRUE(runCommand("tinyCommand").ok);
     EXPECT_EQ(loadPlugin(module("tinyOther")), "tinyOther");
@@ -165,14 +157,14 @@ TEST_F(Loading, StaysLoadedWhileNodesOrDataOfItExist) {
     const HObject node = first.create("tinyNode", "kept");
     const HPlug plug = first.findPlug("value");
     HFnDependencyNode().create("tinyNode", "second");
-    EXPECT_THAT(errorOf([] { unloadPlugin("tinyGood"); }),
+    EXPECT_THAT(failureOf([] { unloadPlugin("tinyGood"); }),
                 HasSubstr("there are still 2 nodes of type 'tinyNode', such as 'kept'"));
     EXPECT_TRUE(hasType("tinyNode"));
     session_.newScene();
 
     HObject data = HFnPluginData().create(HTypeId(0x7002));
     ASSERT_FALSE(data.isNull());
-    EXPECT_THAT(errorOf([] { unloadPlugin("tinyGood"); }), HasSubstr("1 object of data type 'tinyNodeData'"));
+    EXPECT_THAT(failureOf([] { unloadPlugin("tinyGood"); }), HasSubstr("1 object of data type 'tinyNodeData'"));
     data = HObject();
 
     // handles on what was there are stale, and nothing else
@@ -191,7 +183,7 @@ TEST(Unloading, AFailingUninitializeLeavesItLoadedUntilTheSessionEnds) {
     for (const auto& [name, reason] : rows) {
         const Session session;
         loadPlugin(module(name));
-        const std::string unloading = errorOf([&, plugin = name] { unloadPlugin(plugin); });
+        const std::string unloading = failureOf([&, plugin = name] { unloadPlugin(plugin); });
         EXPECT_THAT(unloading, HasSubstr("'" + name + "' cannot be unloaded: uninitializePlugin failed"));
         EXPECT_THAT(unloading, HasSubstr(reason));
         EXPECT_THAT(loadedPlugins(), ElementsAre(name));
@@ -219,12 +211,12 @@ TEST_F(Loading, AnUnloadThatFailsHalfWayIsDoneByTheNextOne) {
         loadPlugin(module("tinyGood"));
         Faults::fail(row.failing, 1, 2);
         for (int attempt = 0; attempt < 2; ++attempt) {
-            EXPECT_THAT(errorOf([] { unloadPlugin("tinyGood"); }),
+            EXPECT_THAT(failureOf([] { unloadPlugin("tinyGood"); }),
                         HasSubstr("uninitializePlugin failed, and it stays loaded" +
                                   (without.empty() ? ": " : " without " + without + ", until")));
             EXPECT_EQ(hasType("tinyNode"), without.empty());
             session_.newScene();
-            const std::string loading = errorOf([] { loadPlugin(module("tinyGood")); });
+            const std::string loading = failureOf([] { loadPlugin(module("tinyGood")); });
             EXPECT_EQ(loading.empty(), without.empty()) << loading;
             EXPECT_THAT(loading, HasSubstr(without.empty() ? "" : "'tinyGood' is half unloaded, without " + without));
         }
@@ -289,7 +281,7 @@ TEST(Unloading, TheEndOfASessionUnloadsEverything) {
     EXPECT_THAT(loadedPlugins(), IsEmpty());
     EXPECT_FALSE(isMapped("tinyGood"));
     EXPECT_FALSE(isMapped("tinyWorker"));
-    EXPECT_THAT(errorOf([] { loadPlugin(module("tinyGood")); }), HasSubstr("no session"));
+    EXPECT_THAT(failureOf([] { loadPlugin(module("tinyGood")); }), HasSubstr("no session"));
     EXPECT_FALSE(isMapped("tinyGood"));
 }
 

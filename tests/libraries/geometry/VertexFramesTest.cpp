@@ -161,17 +161,6 @@ TEST(VertexFrames, WhoWaitsForALargePolygonIsToldAndMayEndIt) {
     EXPECT_EQ(frames.framesPairs(), before);
 }
 
-TEST(VertexFrames, AConcaveCornerStillHasAnEdgeNeighbourAsTangentReference) {
-    // seen from corner 0, the diagonal to the far corner 2 spans the largest area: the first pair begins with it
-    const ZooMesh mesh{
-        "fan", {{0, 1, 2, 3}, {0, 4, 1}}, {{0, 0, 0}, {0.1F, -0.1F, 0}, {4, 0, 0}, {0, 2, 0}, {0, -1, 0}}};
-    quill::IndexMapper map;
-    map.setIdentity(5);
-    const Built built(mesh);
-    EXPECT_THAT(std::vector<std::uint32_t>(built.frames.framesPairs().begin(), built.frames.framesPairs().begin() + 4),
-                ElementsAre(4, 1, 2, 3));
-}
-
 TEST(VertexFrames, ATriangleHasTheStatedFrame) {
     const Built built({"triangle", {{0, 1, 2}}, {{0, 0, 0}, {1, 0, 0}, {0, 1, 0}}});
     EXPECT_EQ(built.on(built.points)[0], (mat4d{{0, 1, 0, 0, 1, 0, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1}}));
@@ -200,28 +189,6 @@ TEST(VertexFrames, FramesAgreeWithTheDirectFormulaToTheBit) {
     }
 }
 
-TEST(VertexFrames, FramesAreLeftHandedOrthonormalAndStandOnTheirVertex) {
-    forEachBuilt([](const ZooMesh& mesh, const Built& built) {
-        const auto frames = built.on(built.points);
-        ASSERT_EQ(frames.size(), built.map.affectCount());
-        for (std::size_t v = 0; v < frames.size(); ++v) {
-            const auto& p = built.points[v];
-            EXPECT_EQ(row(frames[v], 3), Vector(p.x, p.y, p.z));
-            if (!built.hasPairs(v)) {
-                mat4d rest = frames[v];
-                rest.m[12] = rest.m[13] = rest.m[14] = 0.0;
-                EXPECT_EQ(rest, mat4d()) << "no polygon: the identity at the vertex";
-            } else if (!mesh.degenerate) {
-                const Vector x = row(frames[v], 0), y = row(frames[v], 1), z = row(frames[v], 2);
-                EXPECT_NEAR(length(x), 1.0, 1e-6);
-                EXPECT_NEAR(length(y), 1.0, 1e-6);
-                EXPECT_NEAR(length(z), 1.0, 1e-6);
-                EXPECT_LT(length(cross(x, y) + z), 1e-6);
-            }
-        }
-    });
-}
-
 TEST(VertexFrames, InverseFramesUndoTheFramesAndAreAlwaysFinite) {
     forEachBuilt([](const ZooMesh& mesh, const Built& built) {
         const auto frames = built.on(built.points), inverses = built.on(built.points, true);
@@ -231,19 +198,6 @@ TEST(VertexFrames, InverseFramesUndoTheFramesAndAreAlwaysFinite) {
             if (!mesh.degenerate) {
                 EXPECT_TRUE((frames[v] * inverses[v]).isIdentity(1e-9)) << frames[v] * inverses[v];
             }
-        }
-    });
-}
-
-TEST(VertexFrames, TransportBetweenEqualFramesAddsTheDelta) {
-    forEachBuilt([](const ZooMesh& mesh, const Built& built) {
-        if (mesh.degenerate)
-            return;
-        const auto current = built.on(built.points), restInverse = built.on(built.points, true);
-        for (std::size_t v = 0; v < current.size(); ++v) {
-            const quill::val3<float> delta{0.25F, -0.5F, 0.125F * static_cast<float>(v % 5)};
-            const auto moved = transportDelta(built.points[v], delta, restInverse[v], current[v]);
-            EXPECT_LT(length(moved - (built.points[v] + delta)), 2e-6F);
         }
     });
 }

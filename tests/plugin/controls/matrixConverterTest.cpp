@@ -102,22 +102,6 @@ TEST_F(MatrixConverter, WithoutMatricesFlatIsEmptyAndTheListStays) {
     EXPECT_THAT(indices("m.outputList"), ElementsAre(4, 6));
 }
 
-TEST_F(MatrixConverter, EveryInputChangesBothOutputs) {
-    const char* changes[] = {"extractRotation off", "extractScale off", "extractTranslation off",
-                             "rotationX off",       "rotationY off",    "rotationZ off",
-                             "scaleX off",          "scaleY off",       "scaleZ off",
-                             "translationX off",    "translationY off", "translationZ off",
-                             "rotationConversion 1"};
-    for (const std::string change : changes) {
-        run("file -new; createNode matrixConverter -name m; setAttr m.input[0]" + turned);
-        const Values flat = values("m.flatOutput");
-        const Values list = values("m.outputList[0].output");
-        run("setAttr m." + change);
-        EXPECT_NE(values("m.flatOutput"), flat) << change;
-        EXPECT_NE(values("m.outputList[0].output"), list) << change;
-    }
-}
-
 TEST_F(MatrixConverter, AnElementWithoutAMatrixFailsAndLeavesTheOutputs) {
     run("setAttr m.input[0]" + turned);
     const Values flat = values("m.flatOutput");

@@ -3,6 +3,7 @@
 #include "quarn/character/characterFiles.h"
 #include "quarn/character/readCharacter.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include <assimp/Exporter.hpp>
 #include <assimp/Importer.hpp>
@@ -19,21 +20,12 @@ namespace {
 using testing::AllOf;
 using testing::HasSubstr;
 
-std::string errorOf(const std::function<void()>& action) {
-    try {
-        action();
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
-    return "no error";
-}
-
 TEST(DamagedCharacters, PathsThatAreNoFiles) {
     const TemporaryFolder folder;
     const std::string base = folder.path().string();
     std::filesystem::create_directory(base + "/folder.glb");
     const auto refused = [](const std::string& path, const std::string& reason) {
-        EXPECT_EQ(errorOf([&] { readCharacter(path); }), path + ": " + reason);
+        EXPECT_EQ(failureOf([&] { readCharacter(path); }), path + ": " + reason);
     };
     refused(base + "/none.gltf", "does not exist");
     refused(base + "/folder.glb", "is no regular file");
@@ -48,7 +40,7 @@ TEST(DamagedCharacters, PathsThatAreNoFiles) {
     const std::size_t data = text.find("data:application");
     text.replace(data, text.find('"', data) - data, "buffer.bin");
     std::ofstream(base + "/pipe.gltf") << text;
-    EXPECT_THAT(errorOf([&] { readCharacter(base + "/pipe.gltf"); }), HasSubstr("buffer.bin"));
+    EXPECT_THAT(failureOf([&] { readCharacter(base + "/pipe.gltf"); }), HasSubstr("buffer.bin"));
     refused(base + "/x.obj", "\".obj\" is not one of the endings .gltf, .glb, .fbx and .dae");
 }
 
@@ -102,7 +94,7 @@ TEST(DamagedCharacters, TextsAreRefusedWithTheReason) {
         const std::size_t at = text.find(damage.what);
         ASSERT_NE(at, std::string::npos) << damage.what;
         text.replace(at, damage.what.size(), damage.by);
-        EXPECT_THAT(errorOf([&] { readBytesAs("damaged.gltf", text); }),
+        EXPECT_THAT(failureOf([&] { readBytesAs("damaged.gltf", text); }),
                     AllOf(HasSubstr("damaged.gltf: "), HasSubstr(damage.reason)));
     }
 }
@@ -116,7 +108,7 @@ TEST(DamagedCharacters, NumbersAreRefusedWithTheReason) {
             const std::size_t at = file.meshes[0].find(what + ":") + what.size() + 1;
             file.meshes[0].replace(at, 1, std::to_string(other(file)));
         };
-        EXPECT_THAT(errorOf([&] { read(strip.write()); }), AllOf(HasSubstr("character.gltf: "), HasSubstr(reason)));
+        EXPECT_THAT(failureOf([&] { read(strip.write()); }), AllOf(HasSubstr("character.gltf: "), HasSubstr(reason)));
     };
     auto points = stripPoints();
     points[5] = nan;
@@ -153,7 +145,8 @@ TEST(DamagedCharacters, OtherFormatsAreRefusedToo) {
         ASSERT_NE(at, std::string::npos) << damage.what;
         text.replace(at, damage.what.size(), damage.by);
         const std::string name = format == "fbxa" ? "damaged.fbx" : "damaged.dae";
-        EXPECT_THAT(errorOf([&] { readBytesAs(name, text); }), AllOf(HasSubstr(name + ": "), HasSubstr(damage.reason)));
+        EXPECT_THAT(failureOf([&] { readBytesAs(name, text); }),
+                    AllOf(HasSubstr(name + ": "), HasSubstr(damage.reason)));
     }
 }
 

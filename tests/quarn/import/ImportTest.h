@@ -7,6 +7,7 @@
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "support/failureOf.h"
 
 #include <gmock/gmock.h>
 
@@ -20,15 +21,6 @@ constexpr double testFrameRate = 20.0;
 
 inline void findDeformer() {
     ::setenv("NEURALWARP_PLUGIN", NW_PLUGIN, 1);
-}
-
-inline std::string errorOf(const std::function<void()>& action) {
-    try {
-        action();
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
-    return "no error";
 }
 
 /// A session with the scene of a character.

@@ -5,20 +5,7 @@ set -euo pipefail
 quarn=$1
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-bad=0
-
-# expect STATUS OUT-PATTERN ERR-PATTERN ARGS...: patterns are regular expressions, "" for an empty stream
-expect() {
-  local status=0 wanted=$1 out=$2 err=$3
-  shift 3
-  "$quarn" import "$@" >"$work/out" 2>"$work/err" || status=$?
-  if [[ $status != "$wanted" ]] || ! fits "$out" "$work/out" || ! fits "$err" "$work/err"; then
-    printf 'quarn import %s: status %s, not %s, or the streams do not fit /%s/ and /%s/:\n' "$*" "$status" "$wanted" "$out" "$err"
-    cat "$work/out" "$work/err"
-    bad=1
-  fi
-}
-fits() { if [[ $1 ]]; then grep -Pqz -- "$1" "$2"; else [[ ! -s $2 ]]; fi; }
+source "$(dirname "$0")/../../support/expect.sh"
 
 # a triangle that joint "bone" moves, below "root"
 cd "$work"
@@ -34,20 +21,20 @@ cat >bone.gltf <<EOF
 {"bufferView":1,"componentType":5121,"count":3,"type":"VEC4"},
 {"bufferView":2,"componentType":5126,"count":3,"type":"VEC4"}]}
 EOF
-expect 0 'mesh skin: 3 vertices in the file, joined to 3; 1 polygons(.|\n)*scene .*/bone\.json\n$' '' bone.gltf -o bone.json
-expect 0 '"poseInputs": 3(.|\n)*"notes": \[\n' '(?s)place the character.*: root' bone.gltf -o bone.json --neural-warp --json
-expect 0 'deformer warp: 6 angles' '' bone.gltf -o bone.json --neural-warp --with-roots -q
-expect 1 '' '^quarn: .*none\.glb: does not exist\n$' none.glb -o bone.json
-expect 2 '' '^quarn: --fps must be a number above 0\n' bone.gltf -o bone.json --fps 0
-expect 2 '' '^quarn: --meters-per-unit must be' bone.gltf -o bone.json --meters-per-unit -1
-expect 2 '' '--output is required' bone.gltf
-expect 2 '' '--limits requires --neural-warp' bone.gltf -o bone.json --limits limits.json
-expect 2 '' '--controls' bone.gltf -o bone.json --neural-warp --controls axis
+expect 0 'mesh skin: 3 vertices in the file, joined to 3; 1 polygons(.|\n)*scene .*/bone\.json\n$' '' import bone.gltf -o bone.json
+expect 0 '"poseInputs": 3(.|\n)*"notes": \[\n' '(?s)place the character.*: root' import bone.gltf -o bone.json --neural-warp --json
+expect 0 'deformer warp: 6 angles' '' import bone.gltf -o bone.json --neural-warp --with-roots -q
+expect 1 '' '^quarn: .*none\.glb: does not exist\n$' import none.glb -o bone.json
+expect 2 '' '^quarn: --fps must be a number above 0\n' import bone.gltf -o bone.json --fps 0
+expect 2 '' '^quarn: --meters-per-unit must be' import bone.gltf -o bone.json --meters-per-unit -1
+expect 2 '' '--output is required' import bone.gltf
+expect 2 '' '--limits requires --neural-warp' import bone.gltf -o bone.json --limits limits.json
+expect 2 '' '--controls' import bone.gltf -o bone.json --neural-warp --controls axis
 # a buffer of its own, under a name that a URI writes otherwise
 base64 -d <<<"$buffer" >'my buffer #1.bin'
 sed 's|"data:[^"]*"|"my%20buffer%20%231.bin"|' bone.gltf >uri.gltf
-expect 0 'mesh skin: 3 vertices' '' uri.gltf -o bone.json
+expect 0 'mesh skin: 3 vertices' '' import uri.gltf -o bone.json
 rm 'my buffer #1.bin' uri.gltf
-expect 1 '' 'a\$b\.vertices\.npy cannot be named in a scene' bone.gltf -o 'a$b.json'
+expect 1 '' 'a\$b\.vertices\.npy cannot be named in a scene' import bone.gltf -o 'a$b.json'
 [[ $(ls) == $'bone.gltf\nbone.json\nbone.vertices.npy\nerr\nout' ]] || { ls; bad=1; }
 exit $bad

@@ -201,7 +201,7 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
     const auto refused = [&](const std::string& why, const std::function<void(ImportOptions&)>& change) {
         ImportOptions options = options_;
         change(options);
-        EXPECT_THAT(errorOf([&] { importCharacter(options); }), HasSubstr(why));
+        EXPECT_THAT(failureOf([&] { importCharacter(options); }), HasSubstr(why));
         EXPECT_FALSE(fs::exists(path("scene.json")));
     };
     refused("strip.gltf has no animation \"run\"", [](ImportOptions& options) { options.animation = "run"; });
@@ -226,15 +226,17 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
 }
 
 TEST_F(ImportCharacter, DamagedJsonFilesAreRefusedByName) {
-    const auto parents = [&](const std::string& text) { return errorOf([&] { readParents(write("p.json", text)); }); };
-    const auto limits = [&](const std::string& text) { return errorOf([&] { readLimits(write("l.json", text)); }); };
+    const auto parents = [&](const std::string& text) {
+        return failureOf([&] { readParents(write("p.json", text)); });
+    };
+    const auto limits = [&](const std::string& text) { return failureOf([&] { readLimits(write("l.json", text)); }); };
     EXPECT_THAT(parents("{\n\"a\": \"b\",\n}"), HasSubstr("p.json: line 3, column 1: "));
     EXPECT_THAT(parents("[]"), HasSubstr("holds no JSON object"));
     EXPECT_THAT(parents(""), HasSubstr("line 1"));
     EXPECT_THAT(parents(R"({"a": 1})"), HasSubstr("\"a\": its parent is not a text"));
     EXPECT_THAT(parents(R"({"a": "b", "a": "c"})"), HasSubstr("\"a\": the joint stands twice"));
-    EXPECT_THAT(errorOf([&] { readParents(path("none.json")); }), HasSubstr("none.json does not exist"));
-    EXPECT_THAT(errorOf([] { readLimits("/dev/zero"); }), HasSubstr("/dev/zero is no regular file"));
+    EXPECT_THAT(failureOf([&] { readParents(path("none.json")); }), HasSubstr("none.json does not exist"));
+    EXPECT_THAT(failureOf([] { readLimits("/dev/zero"); }), HasSubstr("/dev/zero is no regular file"));
     EXPECT_THAT(limits(R"({"a": []})"), HasSubstr("\"a\": not an object of axes"));
     EXPECT_THAT(limits(R"({"a": {"rotatex": [0, 1]}})"), HasSubstr("\"rotatex\" is not one of"));
     EXPECT_THAT(limits(R"({"a": {"rotateX": [0, 1, 2]}})"), HasSubstr("rotateX is not [least, largest]"));

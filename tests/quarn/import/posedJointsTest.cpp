@@ -72,9 +72,9 @@ TEST(PosedJoints, ThoseThatTellTheDeformerSomething) {
     const LimitMap map{{"root", limits}, {"knee", limits}, {"toe", limits}};
     EXPECT_THAT(chosen({&map, &animation, 24.0, false}), ElementsAre("root y-1..20", "knee y-1..20"));
     const LimitMap unknown{{"kneee", limits}};
-    EXPECT_THAT(errorOf([&] { chosen({&unknown, nullptr, 24.0, false}); }), HasSubstr("no joint \"kneee\""));
+    EXPECT_THAT(failureOf([&] { chosen({&unknown, nullptr, 24.0, false}); }), HasSubstr("no joint \"kneee\""));
     const LimitMap still{{"toe", limits}};
-    EXPECT_THAT(errorOf([&] { chosen({&still, nullptr, 24.0, false}); }), HasSubstr("no joint is left"));
+    EXPECT_THAT(failureOf([&] { chosen({&still, nullptr, 24.0, false}); }), HasSubstr("no joint is left"));
 }
 
 TEST(PosedJoints, ThoseLeftOutAreTold) {

@@ -63,7 +63,7 @@ TEST(Reparent, WhatCannotBeIsRefusedByName) {
     const auto refused = [](const ParentMap& parents, const testing::Matcher<std::string>& why) {
         Character character = randomCharacter(1, {6, true, true, true});
         character.joints[3].restTransform = HMatrix() * 0.0;
-        EXPECT_THAT(errorOf([&] { reparent(character, parents, testFrameRate); }), why);
+        EXPECT_THAT(failureOf([&] { reparent(character, parents, testFrameRate); }), why);
     };
     refused({{"none", "joint1"}}, AllOf(HasSubstr("no joint \"none\""), HasSubstr("joint0, joint1")));
     refused({{"joint1", "none"}}, HasSubstr("no joint \"none\""));
@@ -71,7 +71,7 @@ TEST(Reparent, WhatCannotBeIsRefusedByName) {
     refused({{"joint1", "joint2"}, {"joint2", "joint4"}, {"joint4", "joint1"}}, HasSubstr("would hang below itself"));
     Character endless = randomCharacter(1, {6, true, true, true});
     endless.animations[0].seconds = 1e12;
-    EXPECT_THAT(errorOf([&] { reparent(endless, chain, testFrameRate); }), HasSubstr("\"dance\" is more than"));
+    EXPECT_THAT(failureOf([&] { reparent(endless, chain, testFrameRate); }), HasSubstr("\"dance\" is more than"));
     refused({{"joint1", "joint3"}}, HasSubstr("nothing can hang below the joint \"joint3\""));
 }
 

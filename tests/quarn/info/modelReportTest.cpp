@@ -4,6 +4,7 @@
 #include "plugin/deformer/support/modelFolder.h"
 #include "quarn/console/printable.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -18,6 +19,7 @@ using namespace quarn;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
+using ::testing::Not;
 
 ModelSpec fourVertices() {
     ModelSpec spec;
@@ -70,6 +72,32 @@ TEST_F(ModelReports, SayWhatDoesNotFitAGeometry) {
     const ModelReport part = read(partial);
     EXPECT_THAT(fitOf(part, {"body", 4, {1, 2}, 2}).warnings, ElementsAre(HasSubstr("1, and the deformer affects 2")));
     EXPECT_THAT(fitOf(part, {"body", 4, {2, 3}, 2}).errors, ElementsAre(HasSubstr("none of the vertices")));
+    const Fit turned = fitOf(part, {"body", 4, {1, 0}, 2}); // the same vertices in another order
+    EXPECT_THAT(turned.errors, IsEmpty());
+    EXPECT_THAT(turned.warnings, IsEmpty());
+}
+
+TEST_F(ModelReports, DamageIsNoFit) {
+    ModelSpec few = fourVertices();
+    few.bias.resize(11);
+    few.smoothingIterations = 1000;
+    ModelReport damaged = read(few);
+    const GeometryFacts geometry{"body", 4, {0, 1, 2, 3}, 2};
+    EXPECT_THAT(fitOf(damaged, geometry).errors, IsEmpty());
+    EXPECT_THAT(modelText(damaged, fitOf(damaged, geometry)), Not(HasSubstr("fits\n")));
+    EXPECT_THAT(modelText(damaged, {}), HasSubstr("warning: so many smoothing passes"));
+    EXPECT_THAT(modelJson(damaged, fitOf(damaged, geometry)), HasSubstr("\"fits\": false"));
+    EXPECT_THAT(modelJson(damaged, {}), Not(HasSubstr("\"fits\"")));
+    damaged.metadata.smoothingIterations = 999;
+    damaged.problems.clear();
+    EXPECT_THAT(modelText(damaged, fitOf(damaged, geometry)), HasSubstr("\nfits\n"));
+    EXPECT_THAT(modelText(damaged, {}), Not(HasSubstr("warning")));
+
+    writeFile(damaged.directory / "model.onnx", "no network");
+    neuralWarp::ModelSession session;
+    const ModelReport silent = readModel(damaged.directory, session);
+    EXPECT_THAT(silent.problems, ElementsAre(HasSubstr("model.onnx cannot be used")));
+    EXPECT_THAT(fitOf(silent, geometry).warnings, IsEmpty()) << "nobody knows how many controls it takes";
 }
 
 TEST_F(ModelReports, ComeFromAnotherProcessAsTheyAre) {
@@ -94,13 +122,8 @@ TEST_F(ModelReports, ComeFromAnotherProcessAsTheyAre) {
 
     writeFile(here.directory / "principal_shapes.json", "[");
     EXPECT_EQ(readModelApart(here.directory, {}).printed, "Parse error\n");
-    const auto refusal = [&](const storage::FloatTable& table) -> std::string {
-        try {
-            readModelApart(here.directory, table);
-        } catch (const std::runtime_error& error) {
-            return error.what();
-        }
-        return "none";
+    const auto refusal = [&](const storage::FloatTable& table) {
+        return failureOf([&] { readModelApart(here.directory, table); });
     };
     EXPECT_THAT(refusal({1, 3, {0, 0, 0}}), HasSubstr("has 3 numbers, and the network takes 2"));
     EXPECT_THAT(refusal({2, 2, {0, 0, 0, std::numeric_limits<float>::infinity()}}),

@@ -7,6 +7,7 @@
 #include "plugin/deformer/support/modelFolder.h"
 #include "plugin/deformer/support/warpRig.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -49,16 +50,13 @@ protected:
     static std::string refusal(
         const std::vector<HPlug>& meshes, const std::function<void()>& nextFrame = [] {}) {
         AppliedModels models(meshes);
-        try {
+        return failureOf([&] {
             for (const HPlug& mesh : meshes)
                 OpenQuarn::evaluate(mesh);
             models.requireSound();
             nextFrame();
             models.requireSound();
-        } catch (const std::runtime_error& error) {
-            return error.what();
-        }
-        return "";
+        });
     }
     std::string refusal() const { return refusal({rig_->output(0)}); }
 

@@ -5,18 +5,7 @@ source tests/support/movingWave.sh
 quarn=$1
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
-bad=0
-
-fail() { echo "$*"; cat "$work/out" "$work/err"; bad=1; }
-# expect STATUS OUT-PATTERN ERR-PATTERN ARGS...: patterns are regular expressions, "" for an empty stream
-expect() {
-  local status=0 wanted=$1 out=$2 err=$3
-  shift 3
-  "$quarn" "$@" >"$work/out" 2>"$work/err" || status=$?
-  [[ $status == "$wanted" ]] && fits "$out" "$work/out" && fits "$err" "$work/err" ||
-    fail "quarn $*: status $status, not $wanted, or not /$out/ and /$err/:"
-}
-fits() { if [[ $1 ]]; then grep -Pqz -- "$1" "$2"; else [[ ! -s $2 ]]; fi; }
+source tests/support/expect.sh
 
 moving_wave "$quarn" "$work" <<'EOF'
 createNode pointCache -name lost
@@ -43,6 +32,7 @@ scene=$work/moving.json
 # the wave of the first control at 1 is 0.4 units high, as the scene's own page says; half of it half-way
 expect 0 'max 400 mm .* in frame 11\n' '' play "$scene" --frames 1-11 --against strip.outMesh --repeat 2
 expect 0 '"otherJitterMm": 0.0' '' play "$scene" --frames 1-11 --against strip.outMesh --json
+expect 0 '"before": null' '' play "$scene" --plug strip.outMesh --geometry 0 --against strip.outMesh --frames 1 --json
 expect 0 'InferenceDeltas: median' '' play "$scene" --frames 1-3 --profile "$work/trace.json"
 grep -q traceEvents "$work/trace.json" || fail "no trace"
 expect 0 '' 'wrote 3 frames of 369 vertices' bake "$scene" 'wave.outputGeom[0]' --frames 1-3 -o "$work/a.npy"

@@ -6,6 +6,7 @@
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/meshFiles.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include <assimp/Importer.hpp>
 #include <assimp/scene.h>
@@ -23,17 +24,6 @@ namespace {
 using namespace quarn;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
-
-// what the body throws; "" when it does not
-template <class Body>
-std::string why(Body body) {
-    try {
-        body();
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
-    return "";
-}
 
 // two at the same place, one that no polygon uses, a quad and a triangle
 const std::vector<float> points{0, 0, 0, 1, 0, 0, 1, 1, 0.1F, 0, 1, 0, 0, 0, 0, 2e-8F, -3, 4};
@@ -131,6 +121,11 @@ TEST(MeshFiles, PlyAndGltfAreReadByAnotherProgram) {
         const aiFace& last = mesh.mFaces[mesh.mNumFaces - 1];
         EXPECT_THAT(std::vector<unsigned>(last.mIndices, last.mIndices + last.mNumIndices), ElementsAre(4, 3, 2));
     }
+    std::ostringstream gltf; // the box, which that program does not look at
+    writeGltf(gltf, std::vector<float>{1, 2, -3, 4, 5, -6, 1, 5, -3}, {3, {3}, {0, 1, 2}}, false);
+    std::string text = gltf.str();
+    std::erase_if(text, [](char c) { return c == ' ' || c == '\n'; });
+    EXPECT_THAT(text, HasSubstr(R"("min":[1.0,2.0,-6.0],"max":[4.0,5.0,-3.0])"));
 }
 
 TEST(VertexOrder, WritesEveryVertexOfTheFile) {
@@ -138,8 +133,8 @@ TEST(VertexOrder, WritesEveryVertexOfTheFile) {
     EXPECT_THAT(order.points(std::vector<float>{0, 0, 0, 1, 1, 1, 2, 2, 2}),
                 ElementsAre(2, 2, 2, 0, 0, 0, 1, 1, 1, 0, 0, 0));
     EXPECT_THAT(order.polygons({3, {3}, {0, 1, 2}}).corners, ElementsAre(1, 2, 0));
-    EXPECT_THAT(why([] { VertexOrder({0, 3}, 3); }), HasSubstr("from vertex 1 to 3, and the mesh has 3"));
-    EXPECT_THAT(why([] {
+    EXPECT_THAT(failureOf([] { VertexOrder({0, 3}, 3); }), HasSubstr("from vertex 1 to 3, and the mesh has 3"));
+    EXPECT_THAT(failureOf([] {
                     static_cast<void>(VertexOrder({0, 1}, 3).polygons({3, {3}, {0, 1, 2}}));
                 }),
                 HasSubstr("vertex 2 of the scene"));
