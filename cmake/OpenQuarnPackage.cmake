@@ -8,6 +8,8 @@ nw_link_runpath(OpenQuarn)
 install(DIRECTORY host/api/openquarn host/helpers/openquarn_helpers host/runtime/application/openquarn_app
   DESTINATION "${CMAKE_INSTALL_INCLUDEDIR}" FILES_MATCHING PATTERN "*.h")
 
+install(FILES host/gdb/openquarn.py DESTINATION "${CMAKE_INSTALL_DATADIR}/OpenQuarn/gdb")
+
 configure_package_config_file("${CMAKE_CURRENT_LIST_DIR}/OpenQuarnConfig.cmake.in"
   "${PROJECT_BINARY_DIR}/OpenQuarnConfig.cmake" INSTALL_DESTINATION "${_openquarn_package_dir}")
 write_basic_package_version_file("${PROJECT_BINARY_DIR}/OpenQuarnConfigVersion.cmake"

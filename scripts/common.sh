@@ -57,6 +57,7 @@ declare -A probe_of=(
   [mypy]=mypy
   [flake8]=flake8
   [gcovr]=gcovr
+  [gdb]=gdb
   [dpkg-dev]=dpkg-source
   [file]=file # by which CPack sees what is a program
   [git]=git

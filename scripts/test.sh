@@ -81,8 +81,8 @@ test_as_said() {
 command_test() {
   local folders ctest_words
   read_test_words "$@"
-  # for the trainer's tests, the demo and the package
-  need_packages "${python_packages[@]}" "${wheel_packages[@]}" "${package_packages[@]}"
+  # for the trainer's tests, the demo, the package and the debugger's test
+  need_packages gdb "${python_packages[@]}" "${wheel_packages[@]}" "${package_packages[@]}"
   [[ -d ../shared/cases ]] || say "the reference cases were not there (../shared/cases): replay_cases is skipped"
   test_as_said release
 }
