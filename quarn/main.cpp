@@ -1,10 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
 // quarn: the host without a screen.
 #include "openquarn_app/Messages.h"
-#include "quarn/commands.h"
+#include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/printable.h"
+#include "quarn/dataset/commands.h"
+#include "quarn/exec/commands.h"
+#include "quarn/import/commands.h"
+#include "quarn/info/commands.h"
+#include "quarn/play/commands.h"
+#include "quarn/pose/commands.h"
+#include "quarn/render/commands.h"
 
 #include <CLI/CLI.hpp>
 
@@ -33,7 +41,16 @@ void requireCommand(const CLI::App& app, int argc, char** argv) {
 
 // as the host does it, but for control characters in names that come from files
 void print(const OpenQuarn::Message& message) {
-    std::cerr << std::string(OpenQuarn::severityName(message.severity)) + ": " + quarn::printable(message.text) + "\n";
+    const std::string line = std::string(OpenQuarn::severityName(message.severity)) + ": " + message.text;
+    std::cerr << quarn::printable(line) + "\n";
+    quarn::Log::keep(line);
+}
+
+// answers with the status to end with
+int fail(const std::string& why, int status, const char* advice = "") {
+    std::cerr << "quarn: " << quarn::printable(why) << '\n' << advice;
+    quarn::Log::keep("failed with " + std::to_string(status) + ": " + why);
+    return status;
 }
 
 int run(int argc, char** argv) {
@@ -51,6 +68,14 @@ int run(int argc, char** argv) {
     quarn::addTargetCommand(app);
     quarn::addRenderCommand(app);
 
+    quarn::LogOptions log;
+    for (CLI::App* command : app.get_subcommands({}))
+        quarn::addLogOptions(*command, log);
+    app.parse_complete_callback([&] {
+        if (log.verbose || !log.file.empty())
+            quarn::Log::begin(log.verbose, log.file, argc, argv);
+    });
+
     requireCommand(app, argc, argv);
     try {
         app.parse(argc, argv);
@@ -59,6 +84,7 @@ int run(int argc, char** argv) {
     }
     if (!std::cout.flush())
         throw std::runtime_error("standard output could not be written");
+    quarn::log([] { return std::string("done"); });
     return 0;
 }
 
@@ -69,12 +95,10 @@ int main(int argc, char** argv) {
         OpenQuarn::setMessageSink(print);
         return run(argc, argv);
     } catch (const quarn::UsageError& error) {
-        std::cerr << "quarn: " << quarn::printable(error.what()) << "\nRun with --help for more information.\n";
-        return wrongUsage;
+        return fail(error.what(), wrongUsage, "Run with --help for more information.\n");
     } catch (const std::exception& error) {
         // an evaluation that was given up on request fails with a sentence of its own
         const bool isEnded = quarn::isInterrupted();
-        std::cerr << "quarn: " << (isEnded ? quarn::Interrupted().what() : quarn::printable(error.what())) << '\n';
-        return isEnded ? endedBySignal : 1;
+        return isEnded ? fail(quarn::Interrupted().what(), endedBySignal) : fail(error.what(), 1);
     }
 }

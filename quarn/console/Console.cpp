@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/console/Console.h"
 
+#include "quarn/console/Log.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/printable.h"
 
@@ -31,16 +32,18 @@ std::string timeText(double seconds) {
 void Console::note(const std::string& sentence) const {
     if (!quiet)
         std::cerr << printable(sentence) + "\n";
+    Log::keep(sentence);
 }
 
 void Console::warn(const std::string& sentence) const {
     std::cerr << "warning: " + printable(sentence) + "\n";
+    Log::keep("warning: " + sentence);
 }
 
 Progress::Progress(const Console& console, std::string what, std::size_t total)
     : what_(std::move(what))
     , total_(total)
-    , shown_(!console.quiet && ::isatty(STDERR_FILENO) == 1)
+    , shown_(!console.quiet && !Log::isVerbose() && ::isatty(STDERR_FILENO) == 1)
     , started_(std::chrono::steady_clock::now())
     , drawn_(started_ - redrawAfter) {}
 

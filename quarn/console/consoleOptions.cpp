@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/console/consoleOptions.h"
+
 #include "quarn/console/Console.h"
 
 #include <CLI/CLI.hpp>
@@ -10,6 +11,14 @@ void addConsoleOptions(CLI::App& command, Console& console, bool hasAnswer) {
     command.add_flag("-q,--quiet", console.quiet, "No progress and no notes");
     if (hasAnswer)
         command.add_flag("--json", console.json, "Answer in JSON");
+}
+
+void addLogOptions(CLI::App& command, LogOptions& options) {
+    CLI::Option* verbose =
+        command.add_flag("-v,--verbose", options.verbose, "Say on standard error what is done, and how long it takes");
+    if (CLI::Option* quiet = command.get_option_no_throw("--quiet"))
+        verbose->excludes(quiet);
+    command.add_option("--log", options.file, "Write the same to a file, behind what it holds")->type_name("FILE");
 }
 
 } // namespace quarn

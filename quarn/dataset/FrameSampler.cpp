@@ -2,6 +2,7 @@
 #include "quarn/dataset/FrameSampler.h"
 
 #include "quarn/dataset/controlNames.h"
+#include "quarn/scene/FrameLog.h"
 #include "quarn/scene/HostErrors.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
@@ -147,6 +148,7 @@ void FrameSampler::readMap() {
 }
 
 void FrameSampler::sample(int frame) {
+    const FrameLog log(frame);
     host_.setTime(frame);
     strictly(frame, [&] {
         evaluateInputs();

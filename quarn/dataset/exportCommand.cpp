@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
+#include "quarn/dataset/commands.h"
 #include "quarn/dataset/exportDatasets.h"
 
 #include <CLI/CLI.hpp>

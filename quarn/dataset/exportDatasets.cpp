@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/exportDatasets.h"
 
+#include "quarn/console/Log.h"
 #include "quarn/dataset/DatasetFolder.h"
 #include "quarn/dataset/description.h"
 #include "quarn/dataset/sceneSetup.h"
@@ -106,6 +107,8 @@ public:
     }
 
     ExportAnswer run() {
+        Stage stage([&] { return "exporting " + geometry_.name + " to " + folder_.path().string(); });
+        stage.result([&] { return std::to_string(facts_.shape.rows) + " rows"; });
         if (folder_.isDone(setup_))
             return alreadyDone();
         storage::FolderLock lock(folder_.part(), anotherExport);

@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/exec/commands.h"
 
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Session.h"
+#include "quarn/console/Log.h"
 #include "quarn/console/printable.h"
 #include "quarn/scene/SceneSession.h"
 
@@ -39,6 +40,7 @@ void execute(const Options& options) {
     const SceneFolder folder;
     const OpenQuarn::Session session;
     loadPlugins(options.plugins, false);
+    const Stage stage([&] { return "running " + options.file; });
     const OpenQuarn::CommandOutcome outcome =
         runFile(options.file, options.stops ? OpenQuarn::OnShownError::stop : OpenQuarn::OnShownError::goOn);
     const std::string& shown = outcome.shownError;

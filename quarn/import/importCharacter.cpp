@@ -4,6 +4,7 @@
 #include "openquarn_app/SceneFile.h"
 #include "quarn/character/readCharacter.h"
 #include "quarn/character/rootsWarning.h"
+#include "quarn/console/Log.h"
 #include "quarn/import/animationCurves.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/import/posedJoints.h"
@@ -80,7 +81,12 @@ public:
 
 private:
     void readInput() {
+        Stage stage([&] { return "reading character " + options_.file.string(); });
         character_ = readCharacter(options_.file.string());
+        stage.result([&] {
+            return std::to_string(character_.meshes.size()) + " meshes, " + std::to_string(character_.joints.size()) +
+                   " joints, " + std::to_string(character_.animations.size()) + " animations";
+        });
         if (!options_.parents.empty())
             changeParents();
         report_.warnings = std::exchange(character_.warnings, {});
@@ -176,6 +182,7 @@ private:
         for (std::size_t i = 0; i < report_.meshes.size(); ++i) {
             const std::vector<std::uint32_t>& sceneVertexOf = character_.meshes[i].joinedOf;
             const std::vector<std::int32_t> map(sceneVertexOf.begin(), sceneVertexOf.end());
+            log([&] { return "writing " + (folder / report_.meshes[i].vertexMap).string(); });
             storage::writeIntegers(folder / report_.meshes[i].vertexMap, map);
             digests += (i > 0 ? " " : "") + vertexMapDigest(map);
         }

@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/printable.h"
+#include "quarn/import/commands.h"
 #include "quarn/import/importCharacter.h"
 
 #include <CLI/CLI.hpp>

@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/info/commands.h"
 
 #include "openquarn_app/Gpu.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/SceneFile.h"
+#include "quarn/console/Log.h"
 #include "quarn/console/StdoutAside.h"
 #include "quarn/console/UsageError.h"
 #include "quarn/console/interrupt.h"
@@ -48,7 +49,9 @@ struct OpenedScene {
 class Silence {
 public:
     Silence()
-        : before_(OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {})) {}
+        : before_(OpenQuarn::setMessageSink([](const OpenQuarn::Message& message) {
+            log([&] { return std::string(OpenQuarn::severityName(message.severity)) + ": " + message.text; });
+        })) {}
     ~Silence() { OpenQuarn::setMessageSink(std::move(before_)); }
     Silence(const Silence&) = delete;
     Silence& operator=(const Silence&) = delete;
@@ -135,6 +138,7 @@ struct Options {
 
 void showDevices(bool asJson) {
     const std::vector<OpenQuarn::GpuDevice> devices = OpenQuarn::Gpu::devices();
+    log([&] { return std::to_string(devices.size()) + " OpenCL devices"; });
     rapidjson::StringBuffer buffer;
     JsonWriter writer(buffer);
     writer.StartArray();
@@ -164,6 +168,7 @@ void showDevices(bool asJson) {
 
 void showScene(const Options& options) {
     requireNoCharacter(options.path);
+    const Stage stage([&] { return "looking into scene " + options.path.string(); });
     const SceneSummary summary = OpenQuarn::readSummary(absolutePath(options.path));
     if (!summary.outcome)
         throw std::runtime_error(summary.outcome.error);

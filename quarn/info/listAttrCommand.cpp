@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn_app/Session.h"
-#include "quarn/commands.h"
+#include "quarn/console/Log.h"
 #include "quarn/info/attributeTexts.h"
+#include "quarn/info/commands.h"
 #include "quarn/scene/SceneSession.h"
 
 #include <CLI/CLI.hpp>
@@ -21,6 +22,7 @@ void listAttributes(const Options& options) {
     const OpenQuarn::Session session;
     loadPlugins(options.plugins, false);
     const AttributeList list{OpenQuarn::attributesOf(options.nodeType), OpenQuarn::dependenciesOf(options.nodeType)};
+    log([&] { return options.nodeType + " has " + std::to_string(list.attributes.size()) + " attributes"; });
     std::cout << (options.json ? attributeJson(list) + "\n" : attributeLines(list));
 }
 

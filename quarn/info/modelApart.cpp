@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // A model is read in another process: the runtime was not written for hostile files.
+#include "quarn/console/Log.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/info/ModelReport.h"
 #include "quarn/process/answerBytes.h"
@@ -77,6 +78,7 @@ void check(const ModelAnswer& answer, std::size_t rows) {
 ModelAnswer readModelApart(const std::filesystem::path& directory, const storage::FloatTable& controls) {
     if (!std::filesystem::is_directory(directory))
         throw std::runtime_error(directory.string() + " is no model directory");
+    Stage stage([&] { return "reading model " + directory.string() + " in a process apart"; });
     ApartLimits limits;
     limits.processorTime += std::chrono::seconds(controls.rows); // a network that takes a second a row is a large one
     limits.wallClock += std::chrono::seconds(controls.rows);
@@ -101,6 +103,7 @@ ModelAnswer readModelApart(const std::filesystem::path& directory, const storage
         throw;
     }
     answer.model.directory = directory;
+    stage.result([&] { return std::to_string(answer.model.problems.size()) + " problems"; });
     return answer;
 }
 

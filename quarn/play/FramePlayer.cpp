@@ -2,6 +2,7 @@
 #include "quarn/play/FramePlayer.h"
 
 #include "openquarn_app/Evaluation.h"
+#include "quarn/scene/FrameLog.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
 #include "storage/finite.h"
@@ -20,6 +21,7 @@ double FramePlayer::show(int frame) {
     using Clock = std::chrono::steady_clock;
     errors_.clear();
     frame_ = frame;
+    const FrameLog log(frame);
     const Clock::time_point begin = Clock::now();
     session_.host().setTime(frame);
     const HStatus status = OpenQuarn::evaluate(mesh_);

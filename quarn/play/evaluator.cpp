@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/play/evaluator.h"
 
+#include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
 
 #include "openquarn_app/Gpu.h"
@@ -33,6 +34,7 @@ void chooseEvaluator(const std::string& evaluator, const std::string& device) {
     }
     OpenQuarn::Gpu::setEnabled(isGpu);
     OpenQuarn::Gpu::resetCounts();
+    log([&] { return "deformers run on the " + evaluator + (device.empty() ? "" : ", on device " + device); });
 }
 
 GpuUse gpuUse() {

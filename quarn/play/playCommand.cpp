@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/play/commands.h"
 
 #include "quarn/console/Console.h"
 #include "quarn/console/StdoutAside.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/printable.h"
 #include "quarn/play/evaluator.h"

@@ -3,6 +3,7 @@
 
 #include "openquarn_app/Profiling.h"
 #include "quarn/console/Console.h"
+#include "quarn/console/Log.h"
 #include "quarn/play/FrameFiles.h"
 #include "quarn/play/FramePlayer.h"
 #include "quarn/play/phaseTimes.h"
@@ -37,6 +38,10 @@ public:
     }
 
     PlayResult play() {
+        Stage stage([&] { return std::string("playing ") + plan_.mesh.name().asChar(); });
+        stage.result([&] {
+            return std::to_string(plan_.frames.count()) + " frames, " + std::to_string(plan_.repeats) + " times";
+        });
         for (int repeat = 0; repeat < plan_.repeats; ++repeat) {
             const bool isTimed = repeat > 0 || plan_.repeats == 1;
             if (isTimed && !plan_.trace.empty() && !OpenQuarn::Profiling::isRecording())
@@ -49,7 +54,7 @@ public:
         if (!plan_.trace.empty())
             result_.phases = writeTraceAndReadPhases(plan_.trace);
         if (plan_.isOnGpu)
-            result_.gpu = gpuUse();
+            takeGpuUse();
         return std::move(result_);
     }
 
@@ -62,6 +67,15 @@ private:
         if (isLookedAt)
             lookAt(frame);
         progress_.advance();
+    }
+
+    void takeGpuUse() {
+        const GpuUse& use = result_.gpu.emplace(gpuUse());
+        log([&] {
+            return (use.device.empty() ? "no device" : "device " + use.device) + ": " + std::to_string(use.onGpu) +
+                   " deformations there, " + std::to_string(use.onCpu) + " on the CPU, " +
+                   std::to_string(use.fallbacks) + " of them after a failure";
+        });
     }
 
     // once is enough: each repeat shows the same

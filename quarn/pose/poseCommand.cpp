@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/pose/commands.h"
 
+#include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/pose/keyPoses.h"
@@ -117,6 +119,7 @@ void sample(SceneSession& session, Options& options) {
 void key(SceneSession& session, const Options& options) {
     const bool hasWarp = !options.deformer.empty() || !nodesOfType("neuralWarp").empty();
     const std::optional<Warp> warp = hasWarp ? std::optional(Warp::find(options.deformer)) : std::nullopt;
+    const Stage stage([&] { return "putting the keys of " + options.keys.string() + " on the rig"; });
     const KeysReport report = keyPoses(warp, readKeys(options.keys), options.others == "rest");
     session.save(options.output);
     print(report, options);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/samplePoses.h"
 
+#include "quarn/console/Log.h"
 #include "quarn/console/numberText.h"
 #include "quarn/pose/animationPoses.h"
 #include "quarn/pose/drawPoses.h"
@@ -130,6 +131,7 @@ void noteWhatStillMoves(const Console& console) {
 } // namespace
 
 SampleReport samplePoses(const Warp& warp, const SampleOptions& options, const Console& console) {
+    Stage stage([&] { return "sampling poses for " + warp.name; });
     const HObject collector = poseCollector(warp);
     const std::vector<PoseControl> controls = poseControls(collector);
     warnOfDefaults(console, controls);
@@ -152,6 +154,8 @@ SampleReport samplePoses(const Warp& warp, const SampleOptions& options, const C
     setNumber(warp.plug("exportStartFrame"), report.firstFrame);
     setNumber(warp.plug("exportEndFrame"), report.lastFrame);
     noteWhatStillMoves(console);
+    stage.result(
+        [&] { return std::to_string(report.poses) + " poses of " + std::to_string(report.values) + " values"; });
     return report;
 }
 

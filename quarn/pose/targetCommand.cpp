@@ -1,8 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/pose/commands.h"
 
 #include "openquarn_app/SceneFile.h"
+#include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/console/numberText.h"
@@ -70,6 +72,7 @@ Cache inSceneOrder(const storage::NpyFile& file, const Options& options, const W
 }
 
 Cache fittingCache(const Options& options, const WarpGeometry& geometry) {
+    const Stage stage([&] { return "reading point cache " + options.cache.string() + " for " + geometry.name; });
     const storage::NpyFile file(options.cache.string());
     const std::size_t vertices = polygonsOf(restMesh(geometry)).vertexCount;
     if (file.frameCount() == 0)

@@ -1,15 +1,18 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/commands.h"
+#include "quarn/render/commands.h"
 
 #include "quarn/console/Console.h"
+#include "quarn/console/Log.h"
 #include "quarn/console/StdoutAside.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
 #include "quarn/scene/AppliedModels.h"
+#include "quarn/scene/FrameLog.h"
 #include "quarn/scene/HostErrors.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/frames.h"
@@ -172,12 +175,14 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
     double largest = 0.0;
     const std::size_t count = shot.frames.count();
     const std::size_t looks = std::min(count, mostFramesLookedAt);
+    const Stage stage([] { return std::string("looking at the frames"); });
     const HostErrors errors;
     AppliedModels models = modelsOf(shot.panels);
     Progress progress(options.console, "looking at the frames", looks);
     for (std::size_t number = 0; number < looks; ++number) {
         // with more frames than looks, spread evenly from the first to the last
         const int frame = shot.frames.frame(looks == count ? number : number * (count - 1) / (looks - 1));
+        const FrameLog log(frame);
         session.host().setTime(frame);
         models.blame([&] {
             for (const Panel& panel : shot.panels) {
@@ -211,6 +216,8 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
     Progress progress(options.console, "drawing", count);
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
+        const std::filesystem::path name = pictureName(pattern, frame, count > 1);
+        const Stage stage([&] { return "drawing " + name.string(); });
         session.host().setTime(frame);
         Picture picture(shot.layout.width * static_cast<int>(shot.panels.size()), shot.layout.height);
         int left = 0;
@@ -222,10 +229,10 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
         }
         throwIfAny(errors, frame);
         models.requireSound();
-        storage::WholeFile file(pictureName(pattern, frame, count > 1));
+        storage::WholeFile file(name);
         writePng(file.stream(), picture);
         file.finish();
-        answer.pictures.push_back(pictureName(pattern, frame, count > 1));
+        answer.pictures.push_back(name);
         progress.advance();
     }
 }

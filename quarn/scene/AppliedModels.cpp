@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/AppliedModels.h"
 
+#include "quarn/console/Log.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/modelDirectory.h"
 #include "quarn/scene/modelFiles.h"
@@ -152,6 +153,10 @@ bool AppliedModels::canChange(const Geometry& one) {
 }
 
 void AppliedModels::requireSound(const Geometry& one) {
+    const Stage stage([&] {
+        return one.warp.name + " applies the model " + modelDirectory(one.warp, one.geometry).string() + " to " +
+               one.geometry.name + ": looking at its files";
+    });
     requireSoundFiles(one.warp, one.geometry);
     requireFittingRest(one.warp, one.geometry);
 }

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/HostErrors.h"
 
+#include "quarn/console/Log.h"
+
 namespace quarn {
 
 using OpenQuarn::Severity;
@@ -24,13 +26,16 @@ HostErrors::~HostErrors() {
 }
 
 void HostErrors::take(const OpenQuarn::Message& message) {
+    const auto line = [&] { return std::string(OpenQuarn::severityName(message.severity)) + ": " + message.text; };
     constexpr std::size_t kept = 3; // the causes; what follows from them comes later
     switch (message.severity) {
     case Severity::error:
+        log(line);
         if (errors_.size() < kept)
             errors_.push_back(message.text);
         break;
     case Severity::report:
+        log(line);
         if (report_.empty() || (!saysWhy(report_) && saysWhy(message.text)))
             report_ = message.text;
         break;

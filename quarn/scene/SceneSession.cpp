@@ -5,6 +5,7 @@
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Workspace.h"
+#include "quarn/console/Log.h"
 #include "quarn/console/interrupt.h"
 #include "rig/registration.h"
 
@@ -44,6 +45,15 @@ void must(const OpenQuarn::FileOutcome& outcome) {
         throw std::runtime_error(outcome.error);
 }
 
+void load(const fs::path& path) {
+    Stage stage([&] { return "loading plug-in " + path.lexically_normal().string(); });
+    const std::string name = OpenQuarn::loadPlugin(path);
+    stage.result([&] {
+        const OpenQuarn::PluginInfo plugin = OpenQuarn::pluginInfo(name);
+        return name + " " + plugin.version + ", " + std::to_string(plugin.nodeTypes.size()) + " node types";
+    });
+}
+
 std::optional<fs::path> findDeformer() {
     for (const fs::path& place : placesOfDeformer())
         if (fs::exists(place))
@@ -76,9 +86,9 @@ fs::path deformerPlugin() {
 void loadPlugins(const std::vector<std::string>& further, bool deformerRequired) {
     OpenQuarn::addPlugin("quarnRig", rig::registerNodes, rig::deregisterNodes);
     if (deformerRequired || findDeformer())
-        OpenQuarn::loadPlugin(deformerPlugin());
+        load(deformerPlugin());
     for (const std::string& path : further)
-        OpenQuarn::loadPlugin(absolutePath(path));
+        load(absolutePath(path));
 }
 
 void addSceneOptions(CLI::App& command, SceneOptions& options) {
@@ -95,6 +105,7 @@ SceneFolder::SceneFolder()
     : before_(fs::current_path()) {
     OpenQuarn::Workspace::setCallersFolder(startFolder());
     OpenQuarn::setSceneFolderSink([](const fs::path& folder) {
+        log([&] { return "paths of the scene count from " + (folder.empty() ? startFolder() : folder).string(); });
         // the caller's folder may have been removed, and a scene's be made only when it is saved, which tells again
         std::error_code notThere;
         fs::current_path(folder.empty() ? startFolder() : folder, notThere);
@@ -130,7 +141,9 @@ void requireNoCharacter(const fs::path& scene) {
 
 void SceneSession::open(const fs::path& scene) {
     requireNoCharacter(scene);
+    Stage stage([&] { return "opening scene " + absolutePath(scene).string(); });
     must(OpenQuarn::openScene(absolutePath(scene)));
+    stage.result([&] { return std::to_string(session_.nodeCount()) + " nodes"; });
 }
 
 void SceneSession::moveTo(const fs::path& folder) {
@@ -138,6 +151,7 @@ void SceneSession::moveTo(const fs::path& folder) {
 }
 
 void SceneSession::save(const fs::path& scene) {
+    const Stage stage([&] { return "saving scene " + absolutePath(scene).string(); });
     must(OpenQuarn::saveScene(absolutePath(scene)));
 }
 

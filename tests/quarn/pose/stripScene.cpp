@@ -2,7 +2,7 @@
 #include "stripScene.h"
 
 #include "openquarn_app/Commands.h"
-#include "quarn/commands.h"
+#include "quarn/pose/commands.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
