@@ -4,8 +4,7 @@
 #include "quarn/console/printable.h"
 #include "storage/Descriptor.h"
 #include "storage/FileError.h"
-#include "storage/Folder.h"
-#include "storage/Target.h"
+#include "storage/openToAppend.h"
 
 #include <array>
 #include <atomic>
@@ -16,9 +15,7 @@
 #include <mutex>
 #include <span>
 #include <string_view>
-#include <vector>
 
-#include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
@@ -82,35 +79,15 @@ bool isSame(int descriptor, const struct stat& file) {
     return ::fstat(descriptor, &other) == 0 && other.st_dev == file.st_dev && other.st_ino == file.st_ino;
 }
 
-// what a user names by mistake, a scene say, would be none any more with a log behind it
-void requireLog(const storage::Descriptor& file, const struct stat& status, const fs::path& path) {
-    std::array<char, firstWords.size()> first = {};
-    const ssize_t size = ::pread(file.number(), first.data(), first.size(), 0);
-    if (status.st_size != 0 &&
-        (size < 0 || std::string_view(first.data(), static_cast<std::size_t>(size)) != firstWords))
-        throw storage::FileError(path, "is there already and is no log of quarn: name another file for the log");
-}
-
 storage::Descriptor openedLog(const fs::path& path) {
-    storage::Target target = storage::findTarget(path, true);
+    storage::Descriptor file = storage::openToAppend(path, firstWords);
     struct stat status = {};
-    if (target.isFile()) {
-        const std::vector<fs::path> made = storage::makeFolders(target.file.parent_path(), path);
-        target.through =
-            storage::Descriptor(::open(target.file.c_str(), O_RDWR | O_APPEND | O_CREAT | O_CLOEXEC, 0666));
-        if (const int error = errno; !target.through.isOpen()) {
-            storage::removeFolders(made);
-            storage::failToWrite(path, error);
-        }
-    }
-    if (::fstat(target.through.number(), &status) != 0)
+    if (::fstat(file.number(), &status) != 0)
         storage::failToWrite(path, errno);
     const bool isAnswer = isSame(STDOUT_FILENO, status) && !isSame(STDERR_FILENO, status);
-    if (isAnswer && fs::path("/dev/null") != path)
+    if (isAnswer && path != "/dev/null")
         throw storage::FileError(path, "is standard output, where the answer goes: name another file for the log");
-    if (target.isFile())
-        requireLog(target.through, status, path);
-    return std::move(target.through);
+    return file;
 }
 
 std::string timeOfDay() {

@@ -20,7 +20,8 @@ stamps='^ *\d+\.\d{3} s  '
 
 # says ARGS... -- PATTERN...: the command says so in its log, and on standard error, and answers as it does without
 says() {
-  local -a command=() patterns=("$stamps"'loading plug-in .*neuralWarp\.so: neuralWarp [\d.]+, \d+ node types, [\d.]+ ms$')
+  local plugin="$stamps"'loading plug-in .*neuralWarp\.so: neuralWarp [\d.]+, \d+ node types, [\d.]+ ms$'
+  local -a command=() patterns=("$plugin")
   while [[ $1 != -- ]]; do command+=("$1") && shift; done
   shift
   [[ ${command[0]} == info && ${command[1]} != *.json ]] && patterns=()
@@ -37,8 +38,8 @@ says() {
 }
 opens() { echo "opening scene .*/$1: \\d+ nodes, [\\d.]+ ms\$"; }
 
-says import bone.gltf -o bone.json --neural-warp --with-roots --json -- 'reading character .*bone\.gltf: 1 meshes, \d+ joints, .*ms$' \
-  'writing .*\.vertices\.npy' 'saving scene .*/bone\.json: [\d.]+ ms$'
+says import bone.gltf -o bone.json --neural-warp --with-roots --json -- \
+  'reading character .*bone\.gltf: 1 meshes, \d+ joints, .*ms$' 'writing .*\.vertices\.npy' 'saving scene .*/bone\.json: [\d.]+ ms$'
 says pose bone.json -o posed.json --samples 3 -- "$(opens bone.json)" 'sampling poses for \w+: 3 poses of \d+ values, '
 says bake moving.json 'strip.outMesh' --frames 1-3 -o target.npy -- "$(opens moving.json)" \
   'playing strip\.outMesh: 3 frames, 1 times, ' 'frame 2: \d+ plugs of \d+ nodes computed, [\d.]+ ms$'
@@ -67,7 +68,7 @@ refused() {
   "$quarn" exec script.txt --log "$@" >out 2>err || status=$?
   [[ $status == "$wanted" && ! -s out ]] && has err "$sentence" && cmp before moving.json || fail "--log $*: $status"
 }
-refused 1 'moving\.json is there already and is no log of quarn: name another file' moving.json
+refused 1 'moving\.json is there already and is another kind of file' moving.json
 refused 1 'models could not be written: Is a directory' models
 refused 1 '/dev/full could not be written: it is a device' /dev/full
 refused 1 '/dev/stdout is standard output' /dev/stdout
