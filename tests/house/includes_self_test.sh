@@ -93,6 +93,7 @@ try no_layer somewhere/alone.cpp ''
 
 try_table '' 'geometry quill' 'model m quill' 'storage s m quill'
 try_table 'there is no folder gone' 'geometry quill' 'gone g' 'model m quill'
+try_table 'model: quil is no prefix and no library' 'geometry quill' 'model m quil'
 try_table 'a cycle: model -> storage -> model' 'geometry quill m' 'model m s' 'storage s m'
 try_table 'a cycle: geometry -> model -> storage -> geometry' 'geometry quill m' 'model m s' 'storage s quill'
 # of two rows with one prefix the nearer one is meant
