@@ -5,6 +5,7 @@
 #include <rapidjson/prettywriter.h>
 #include <rapidjson/stringbuffer.h>
 
+#include <cstdint>
 #include <string>
 
 namespace quarn {
@@ -23,6 +24,11 @@ inline void writeText(JsonWriter& writer, const char* key, const std::string& te
 inline void writeBool(JsonWriter& writer, const char* key, bool value) {
     writer.Key(key);
     writer.Bool(value);
+}
+
+inline void writeCount(JsonWriter& writer, const char* key, std::uint64_t count) {
+    writer.Key(key);
+    writer.Uint64(count);
 }
 
 } // namespace quarn

@@ -50,11 +50,6 @@ void writeNumber(JsonWriter& writer, Number value) {
     writer.RawValue(text.data(), static_cast<std::size_t>(end - text.data()), rapidjson::kNumberType);
 }
 
-void writeCount(JsonWriter& writer, const char* key, std::size_t count) {
-    writer.Key(key);
-    writer.Uint64(count);
-}
-
 std::string labelOf(const HPlug& plug) {
     const auto outcome = OpenQuarn::runCommand("getAttr -asString " + OpenQuarn::quotedWord(plug.name().asChar()));
     const auto* label = std::get_if<std::string>(&outcome.result);

@@ -12,11 +12,6 @@
 namespace quarn {
 namespace {
 
-void writeCount(JsonWriter& writer, const char* key, std::uint64_t count) {
-    writer.Key(key);
-    writer.Uint64(count);
-}
-
 void printJson(const std::vector<ExportAnswer>& answers) {
     rapidjson::StringBuffer buffer;
     JsonWriter writer(buffer);

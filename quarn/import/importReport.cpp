@@ -7,11 +7,6 @@
 namespace quarn {
 namespace {
 
-void writeCount(JsonWriter& writer, const char* key, std::size_t count) {
-    writer.Key(key);
-    writer.Uint64(count);
-}
-
 void writeNumber(JsonWriter& writer, const char* key, double value) {
     writer.Key(key);
     writer.Double(value);

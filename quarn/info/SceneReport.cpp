@@ -90,18 +90,18 @@ std::string geometryLine(const DeformedGeometry& geometry) {
            (geometry.isModelThere ? "" : ", not there: training makes " + geometry.modelDirectory);
 }
 
-void writeCount(JsonWriter& json, const char* key, std::int64_t count) {
+void writeInteger(JsonWriter& json, const char* key, std::int64_t value) {
     json.Key(key);
-    json.Int64(count);
+    json.Int64(value);
 }
 
 void writeGeometry(JsonWriter& json, const DeformedGeometry& geometry) {
     json.StartObject();
-    writeCount(json, "index", geometry.index);
+    writeInteger(json, "index", geometry.index);
     writeText(json, "name", geometry.facts.name);
-    writeCount(json, "vertices", static_cast<std::int64_t>(geometry.facts.vertices));
-    writeCount(json, "affected", static_cast<std::int64_t>(geometry.facts.affected.size()));
-    writeCount(json, "controls", static_cast<std::int64_t>(geometry.facts.controls));
+    writeInteger(json, "vertices", static_cast<std::int64_t>(geometry.facts.vertices));
+    writeInteger(json, "affected", static_cast<std::int64_t>(geometry.facts.affected.size()));
+    writeInteger(json, "controls", static_cast<std::int64_t>(geometry.facts.controls));
     writeText(json, "modelName", geometry.modelName);
     writeText(json, "modelDirectory", geometry.modelDirectory);
     writeBool(json, "modelActive", geometry.isModelActive);
@@ -150,8 +150,8 @@ void writeScene(JsonWriter& json, const SceneReport& scene) {
     for (const DeformerReport& deformer : scene.deformers) {
         json.StartObject();
         writeText(json, "name", deformer.name);
-        writeCount(json, "firstFrame", deformer.firstFrame);
-        writeCount(json, "lastFrame", deformer.lastFrame);
+        writeInteger(json, "firstFrame", deformer.firstFrame);
+        writeInteger(json, "lastFrame", deformer.lastFrame);
         json.Key("geometries");
         json.StartArray();
         for (const DeformedGeometry& geometry : deformer.geometries)

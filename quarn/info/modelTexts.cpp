@@ -19,11 +19,6 @@ std::string deltaModeText(std::uint32_t mode) {
     return mode == 0 ? "Offset" : mode == 1 ? "Surface" : std::to_string(mode);
 }
 
-void writeCount(JsonWriter& json, const char* key, std::uint64_t count) {
-    json.Key(key);
-    json.Uint64(count);
-}
-
 void writeTexts(JsonWriter& json, const char* key, const std::vector<std::string>& texts) {
     json.Key(key);
     json.StartArray();

@@ -31,11 +31,6 @@ std::string_view bytesOf(const Numbers& numbers) {
     return {reinterpret_cast<const char*>(numbers.data()), numbers.size() * sizeof(numbers[0])};
 }
 
-void writeCount(JsonWriter& json, const char* key, std::size_t count) {
-    json.Key(key);
-    json.Uint64(count);
-}
-
 // the box that glTF wants of positions
 void writeBox(JsonWriter& json, std::span<const float> xyz) {
     for (const bool isMin : {true, false}) {

@@ -31,11 +31,6 @@ struct Options {
     Console console;
 };
 
-void writeCount(JsonWriter& writer, const char* key, std::size_t count) {
-    writer.Key(key);
-    writer.Uint64(count);
-}
-
 void writeFrames(JsonWriter& writer, int first, int last) {
     writer.Key("firstFrame");
     writer.Int(first);
