@@ -43,8 +43,9 @@ TEST(RunApart, GivesWhatTheActionGivesOrThrows) {
 }
 
 TEST(RunApart, SurvivesWhatTheActionDoesNot) {
-    const ApartLimits tight{std::chrono::seconds(60), std::chrono::seconds(1), std::uint64_t{64} << 20U};
-    const ApartLimits hasty{std::chrono::seconds(1), std::chrono::seconds(60), tight.memory};
+    const ApartLimits tight{std::chrono::seconds(60), std::chrono::seconds(60), std::uint64_t{64} << 20U};
+    const ApartLimits lazy{tight.wallClock, std::chrono::seconds(1), tight.memory};
+    const ApartLimits hasty{std::chrono::seconds(1), tight.processorTime, tight.memory};
     struct Row {
         std::function<std::string()> action;
         ApartLimits limits;
@@ -59,7 +60,7 @@ TEST(RunApart, SurvivesWhatTheActionDoesNot) {
              for (;;)
                  static_cast<void>(getppid());
          },
-         tight, Why::outOfTime, "more than 1 seconds of processor time"},
+         lazy, Why::outOfTime, "more than 1 seconds of processor time"},
         {[]() -> std::string {
              for (;;)
                  pause();
