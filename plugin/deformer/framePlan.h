@@ -11,9 +11,9 @@ enum class Attempt {
 };
 
 /// `isActive`    the model is on, and nothing has kept it from being loaded so far.
-/// `isMorphed`   a target morph is in force, which takes the vertices `morphWeight` of the way to the target. At
-/// exactly
-///               1 nothing of the model would be left to see.
+/// `isMorphed`   a target morph is in force.
+/// `morphWeight` how much of the way to the target it takes the vertices: at exactly 1, nothing of the model would be
+///               left to see.
 constexpr Attempt whatToAttempt(bool isActive, bool isMorphed, double morphWeight) {
     if (isActive && !(isMorphed && morphWeight == 1.0))
         return Attempt::withModel;
