@@ -4,10 +4,10 @@
 
 #include "stripScene.h"
 
-#include "openquarn/HFnData.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/plugs.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
@@ -33,9 +33,8 @@ protected:
         arguments.insert(arguments.begin(), {"pose", scene(), "-o", path("posed.json")});
         return stripScene::quarn(arguments);
     }
-    std::string poseFailure(std::vector<std::string> arguments) const {
-        arguments.insert(arguments.begin(), {"pose", scene(), "-o", path("posed.json")});
-        return stripScene::failureOf(arguments);
+    std::string poseFailure(const std::vector<std::string>& arguments) const {
+        return failureOf([&] { pose(arguments); });
     }
     std::unique_ptr<quarn::SceneSession> open(const std::string& name = "posed.json") const {
         auto session = std::make_unique<quarn::SceneSession>();
@@ -45,9 +44,6 @@ protected:
     static double at(quarn::SceneSession& session, double frame, const std::string& plug) {
         session.host().setTime(frame);
         return quarn::numberOf(quarn::findPlug(plug));
-    }
-    static std::vector<double> list(const std::string& plug) {
-        return HFnDoubleArrayData(quarn::findPlug(plug).asHObject()).values();
     }
 
 private:

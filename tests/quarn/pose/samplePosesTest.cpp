@@ -2,15 +2,13 @@
 // quarn pose with poses from limits and from the scene's animation.
 #include "PoseTest.h"
 
-#include "openquarn_app/Commands.h"
-#include "openquarn_app/SceneFile.h"
+#include "openquarn/HFnData.h"
 
 #include <rapidjson/document.h>
 
 namespace {
 
-using stripScene::limits;
-using stripScene::sampledPlugs;
+using stripScene::sampled;
 using ::testing::AllOf;
 using ::testing::HasSubstr;
 
@@ -47,16 +45,16 @@ TEST_F(SamplePosesTest, PosesPlayBackWithinTheLimitsAfterTheDefaultOne) {
                                                        {"poses.activationRate", 0.5}};
     for (const auto& [plug, value] : settings)
         EXPECT_EQ(quarn::numberOf(quarn::findPlug(plug)), value) << plug;
-    for (std::size_t i = 0; i < sampledPlugs().size(); ++i) {
-        const HObject curve = quarn::findPlug(sampledPlugs()[i]).source().node();
-        const std::vector<double> keys = list(quarn::nodeName(curve) + ".keyValues");
+    for (const auto& [plug, place, least, most, rest] : sampled) {
+        const HObject curve = quarn::findPlug(plug).source().node();
+        const std::vector<double> keys = HFnDoubleArrayData(quarn::plugOf(curve, "keyValues").asHObject()).values();
         ASSERT_EQ(keys.size(), 40U);
-        EXPECT_EQ(keys.front(), limits()[i].rest);
+        EXPECT_EQ(keys.front(), rest);
         for (std::size_t frame = 0; frame < keys.size(); ++frame) {
-            EXPECT_EQ(at(*session, double(frame) - 5.0, sampledPlugs()[i]), keys[frame]);
-            EXPECT_EQ(at(*session, double(frame) - 4.5, sampledPlugs()[i]), keys[frame]); // steps
-            EXPECT_GE(keys[frame], limits()[i].least);
-            EXPECT_LE(keys[frame], limits()[i].most);
+            EXPECT_EQ(at(*session, double(frame) - 5.0, plug), keys[frame]);
+            EXPECT_EQ(at(*session, double(frame) - 4.5, plug), keys[frame]); // steps
+            EXPECT_GE(keys[frame], least);
+            EXPECT_LE(keys[frame], most);
         }
     }
 }
@@ -114,8 +112,8 @@ TEST_F(SamplePosesTest, FramesOfTheAnimationFollowDrawnPoses) {
     EXPECT_THAT(pose({"--from", "both", "--samples", "6", "--frames", "3-13x5", "--json"}),
                 AllOf(HasSubstr("\"poses\": 9,"), HasSubstr("\"fromLimits\": 6,"), HasSubstr("\"fromAnimation\": 3,")));
     EXPECT_NEAR(at(*open(), 8, "tip.rotateZ"), 1.25, 1e-12);
-    EXPECT_THAT(stripScene::failureOf({"pose", path("posed.json"), "-o", path("again.json"), "--from", "animation"}),
-                HasSubstr("earlier quarn pose"));
+    std::filesystem::rename(path("posed.json"), scene());
+    EXPECT_THAT(poseFailure({"--from", "animation"}), HasSubstr("earlier quarn pose"));
 }
 
 // each row: what is done to the scene, flags, and what the failure says

@@ -1,15 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "stripScene.h"
 
+#include "host/support/testDeformers.h"
+
 #include "openquarn_app/Commands.h"
 #include "quarn/pose/commands.h"
 #include "quarn/scene/SceneSession.h"
-#include "quarn/scene/meshes.h"
-#include "quarn/scene/plugs.h"
 #include "support/StdoutCapture.h"
 
 #include <CLI/CLI.hpp>
-#include <gtest/gtest.h>
 
 #include <cstdlib>
 #include <sstream>
@@ -18,31 +17,12 @@
 namespace stripScene {
 namespace {
 
-constexpr unsigned columns = vertexCount / 2;
-
 void run(const std::string& script) {
     if (const auto outcome = OpenQuarn::runScript(script, "strip"); !outcome)
         throw std::runtime_error(outcome.error);
 }
 
-// 2 long, from the first joint to behind the last
-HObject stripMesh() {
-    std::vector<double> xyz;
-    quarn::MeshPolygons polygons;
-    polygons.vertexCount = vertexCount;
-    for (unsigned vertex = 0; vertex < vertexCount; ++vertex)
-        for (const double coordinate : {0.25 * (vertex % columns), vertex < columns ? 0.0 : 0.25, 0.0})
-            xyz.push_back(coordinate);
-    for (unsigned i = 0; i + 1 < columns; ++i) {
-        polygons.sizes.push_back(4);
-        for (const unsigned corner : {i, i + 1, i + 1 + columns, i + columns})
-            polygons.corners.push_back(corner);
-    }
-    return quarn::meshData(xyz, polygons);
-}
-
 const char* const rig = R"(
-createNode mesh -name strip
 createNode joint -name root; createNode joint -name middle; createNode joint -name tip
 setAttr middle.translateX 1; setAttr tip.translateX 0.5
 connectAttr root.worldMatrix middle.parentMatrix
@@ -77,36 +57,18 @@ connectAttr axes.outputList[1].output controls.inputList[1].input
 connectAttr controls.output warp.controlValues
 )";
 
-std::string limitsScript() {
-    std::ostringstream script;
-    for (unsigned i = 0; i < limits().size(); ++i) {
-        const std::string place = i < 3 ? "poses.limitsList[0].limits[" + std::to_string(i) + "]."
-                                        : std::string("poses.limitsList[1].limits[0].");
-        script << "setAttr " << place << "minValue " << limits()[i].least << "; setAttr " << place << "maxValue "
-               << limits()[i].most << "; setAttr " << place << "defaultValue " << limits()[i].rest << '\n';
-    }
-    return script.str();
-}
-
 } // namespace
-
-const std::vector<std::string>& sampledPlugs() {
-    static const std::vector<std::string> plugs{"middle.rotateX", "middle.rotateY", "middle.rotateZ", "tip.rotateZ"};
-    return plugs;
-}
-
-const std::vector<Limits>& limits() {
-    static const std::vector<Limits> all{{-0.5, 0.5, 0.0}, {-0.25, 0.75, 0.0}, {0.0, 2.0, 0.0}, {0.25, 1.5, 0.5}};
-    return all;
-}
 
 void write(const std::filesystem::path& scene, const std::string& further) {
     ::setenv("NEURALWARP_PLUGIN", NW_PLUGIN, 1);
     quarn::SceneSession session;
+    testDeformers::meshNode("strip", testDeformers::grid(vertexCount / 2, 2));
     run(rig);
-    HPlug mesh = quarn::findPlug("strip.inMesh");
-    mesh.setHObject(stripMesh());
-    run(limitsScript() + further);
+    std::ostringstream limits;
+    for (const auto& [plug, place, least, most, rest] : sampled)
+        limits << "setAttr poses." << place << ".minValue " << least << "; setAttr poses." << place << ".maxValue "
+               << most << "; setAttr poses." << place << ".defaultValue " << rest << '\n';
+    run(limits.str() + further);
     session.save(scene);
 }
 
@@ -119,15 +81,6 @@ std::string quarn(const std::vector<std::string>& arguments) {
     StdoutCapture capture;
     app.parse(reversed);
     return capture.take();
-}
-
-std::string failureOf(const std::vector<std::string>& arguments) {
-    try {
-        ADD_FAILURE() << "succeeded: " << quarn(arguments);
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
-    return {};
 }
 
 } // namespace stripScene

@@ -10,13 +10,16 @@ namespace stripScene {
 
 constexpr std::size_t vertexCount = 18;
 
-/// The plugs that are sampled: "middle.rotateX", "middle.rotateY", "middle.rotateZ", "tip.rotateZ", in order.
-const std::vector<std::string>& sampledPlugs();
-/// Their limits and defaults: least, most, default.
-struct Limits {
+/// A plug that is sampled, where "poses" has its limits, and these.
+struct Sampled {
+    const char *plug, *place;
     double least, most, rest;
 };
-const std::vector<Limits>& limits();
+/// In order.
+inline constexpr Sampled sampled[] = {{"middle.rotateX", "limitsList[0].limits[0]", -0.5, 0.5, 0.0},
+                                      {"middle.rotateY", "limitsList[0].limits[1]", -0.25, 0.75, 0.0},
+                                      {"middle.rotateZ", "limitsList[0].limits[2]", 0.0, 2.0, 0.0},
+                                      {"tip.rotateZ", "limitsList[1].limits[0]", 0.25, 1.5, 0.5}};
 
 /// Writes the scene: mesh "strip", joints "root", "middle", "tip", skin cluster "strip_skin", deformer "warp",
 /// collectors "poses" and "controls". `further` host commands that run before it is saved.
@@ -24,7 +27,5 @@ void write(const std::filesystem::path& scene, const std::string& further = {});
 
 /// Runs `quarn ARGUMENTS` in this process. Gives what it printed; throws what it failed with.
 std::string quarn(const std::vector<std::string>& arguments);
-/// The sentence of the failure; fails the test when there is none.
-std::string failureOf(const std::vector<std::string>& arguments);
 
 } // namespace stripScene
