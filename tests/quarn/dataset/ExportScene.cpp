@@ -1,11 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/ExportScene.h"
 
-#include "quarn/scene/meshes.h"
-#include "quarn/scene/plugs.h"
-
+#include "host/support/testDeformers.h"
 #include "openquarn_app/Commands.h"
-#include "support/rawCache.h"
 
 #include <cmath>
 #include <cstdlib>
@@ -14,16 +11,20 @@
 
 namespace {
 
-constexpr std::uint32_t columns = 6;
+constexpr unsigned columns = 6;
 
 // controls: the axes of the joint, its angle, and a number that is set; with gaps between the lists
 constexpr const char* script = R"(
+createNode animCurve -name swing
 createNode joint -name arm
 connectAttr swing.output arm.rotateZ
 connectAttr time1.outTime swing.time
 createNode skinCluster -name strip_skin
 connectAttr strip.outMesh strip_skin.input[0].inputGeometry
 connectAttr arm.worldMatrix strip_skin.matrix[0]
+setAttr strip_skin.skin[0].influenceCounts 1 1 1 1 1 1 1 1 1 1 1 1
+setAttr strip_skin.skin[0].influences 0 0 0 0 0 0 0 0 0 0 0 0
+setAttr strip_skin.skin[0].skinWeights 1 1 1 1 1 1 1 1 1 1 1 1
 createNode pointCache -name strip_target
 connectAttr strip.outMesh strip_target.inMesh
 connectAttr time1.outTime strip_target.time
@@ -48,16 +49,6 @@ void run(const std::string& text) {
     ASSERT_TRUE(outcome) << outcome.error;
 }
 
-quarn::MeshPolygons polygons() {
-    quarn::MeshPolygons result;
-    result.vertexCount = std::size_t{2} * columns;
-    for (unsigned column = 0; column + 1 < columns; ++column) {
-        result.sizes.push_back(4);
-        result.corners.insert(result.corners.end(), {column, column + 1, columns + column + 1, columns + column});
-    }
-    return result;
-}
-
 } // namespace
 
 ExportScene::ExportScene() {
@@ -78,23 +69,12 @@ std::vector<float> ExportScene::targetAt(std::size_t frame) {
     return xyz;
 }
 
-void ExportScene::writeCache(const std::vector<std::vector<float>>& frames) const {
-    writeRawCache(folder.path() / "strip.npy", frames);
-}
-
 void ExportScene::build(std::size_t frames, const std::string& more) {
-    const std::vector<float> rest = restPoints();
-    const HObject strip = quarn::createNode("mesh", "strip");
-    quarn::plugOf(strip, "inMesh")
-        .setHObject(quarn::meshData(std::vector<double>(rest.begin(), rest.end()), polygons()));
-    const HObject swing = quarn::createNode("animCurve", "swing");
-    quarn::setList(quarn::plugOf(swing, "keyTimes"), {1, static_cast<double>(frames + 1)});
-    quarn::setList(quarn::plugOf(swing, "keyValues"), {0, turn * static_cast<double>(frames)});
+    testDeformers::meshNode("strip", testDeformers::grid(columns, vertexCount / columns));
     run(script);
-    for (const char* list : {"influenceCounts", "influences", "skinWeights"})
-        quarn::setList(quarn::findPlug(std::string("strip_skin.skin[0].") + list),
-                       std::vector<double>(vertexCount, list[2] == 'f' && list[9] == 's' ? 0 : 1));
-    run("setAttr warp.exportEndFrame " + std::to_string(frames) + "\n" + more);
+    run("setAttr swing.keyTimes 1 " + std::to_string(frames + 1) + "; setAttr swing.keyValues 0 " +
+        OpenQuarn::printedValue(turn * static_cast<double>(frames)) + "; setAttr warp.exportEndFrame " +
+        std::to_string(frames) + "\n" + more);
 }
 
 void ExportScene::save(std::size_t frames, const std::string& more) const {
@@ -108,15 +88,6 @@ quarn::ExportOptions ExportScene::options() const {
     options.scene.scene = scene();
     options.console.quiet = true;
     return options;
-}
-
-std::string ExportScene::errorOf(const quarn::ExportOptions& options) {
-    try {
-        quarn::exportDatasets(options);
-    } catch (const std::runtime_error& error) {
-        return error.what();
-    }
-    return "(none)";
 }
 
 std::string ExportScene::contentOf(const std::filesystem::path& path) {

@@ -4,6 +4,8 @@
 
 #include "quarn/dataset/exportDatasets.h"
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
+#include "support/rawCache.h"
 
 #include <gmock/gmock.h>
 
@@ -31,7 +33,9 @@ protected:
     void writeTarget(std::size_t frames) {
         writeTarget(frames, [](std::size_t, std::vector<float>&) {});
     }
-    void writeCache(const std::vector<std::vector<float>>& frames) const;
+    void writeCache(const std::vector<std::vector<float>>& frames) const {
+        writeRawCache(folder.path() / "strip.npy", frames);
+    }
     /// x, y, z of the strip at rest, and of the target in a frame that counts from 0.
     static std::vector<float> restPoints();
     static std::vector<float> targetAt(std::size_t frame);
@@ -44,7 +48,9 @@ protected:
     std::filesystem::path data() const { return folder.path() / "data" / "strip"; }
     quarn::ExportOptions options() const;
     /// The sentence of the error that an export ends with.
-    static std::string errorOf(const quarn::ExportOptions& options);
+    static std::string errorOf(const quarn::ExportOptions& options) {
+        return failureOf([&] { quarn::exportDatasets(options); });
+    }
     /// The numbers of an array file, after its header.
     template <class Number>
     static std::vector<Number> numbersOf(const std::filesystem::path& file) {

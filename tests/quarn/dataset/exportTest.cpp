@@ -6,8 +6,7 @@
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
 
-#include "openquarn/HFnMeshData.h"
-#include "openquarn_app/Commands.h"
+#include "host/support/testDeformers.h"
 
 #include <rapidjson/pointer.h>
 #include <rapidjson/stringbuffer.h>
@@ -138,12 +137,8 @@ TEST_F(ExportTest, DeformedVerticesKeepTheirOrder) {
     {
         quarn::SceneSession session;
         build(2, "setAttr warp.input[0].componentTagExpression tip; setAttr warp.export[0].deltaMode Offset");
-        const HPlug mesh = quarn::findPlug("strip.inMesh");
-        HFnMeshData tagged(mesh.asHObject());
-        HUintArray tip(2);
-        tip[0] = 7, tip[1] = 3;
-        ASSERT_FALSE(tagged.setComponentTag("tip", tip).error());
-        HPlug(mesh).setHObject(tagged.object());
+        HPlug mesh = quarn::findPlug("strip.inMesh");
+        mesh.setHObject(testDeformers::withTag(mesh.asHObject(), "tip", HUintArray{7, 3}));
         session.save(scene());
     }
     quarn::exportDatasets(options());
@@ -204,8 +199,7 @@ TEST_F(ExportTest, ErrorsNameTheFrameAndTheThing) {
     {
         quarn::SceneSession session;
         build(3, "createNode mesh -name small; connectAttr -force small.outMesh warp.targetGeometry[0]");
-        const quarn::MeshPolygons triangle{3, {3}, {0, 1, 2}};
-        quarn::findPlug("small.inMesh").setHObject(quarn::meshData(std::vector<double>(9), triangle));
+        quarn::findPlug("small.inMesh").setHObject(testDeformers::grid(3, 1));
         session.save(scene());
     }
     EXPECT_THAT(errorOf(options()), StartsWith("frame 1: the target small.outMesh has 3 vertices, and strip has 12"));
@@ -219,13 +213,7 @@ TEST_F(ExportTest, ErrorsNameTheFrameAndTheThing) {
     EXPECT_EQ(errorOf(options()), "frame 2: the delta of vertex 5 of strip is no finite number");
     EXPECT_FALSE(std::filesystem::exists(data()));
     writeTarget(3);
-    {
-        quarn::SceneSession session;
-        build(3);
-        quarn::setList(quarn::findPlug("swing.keyTimes"), {1, 2, 3});
-        quarn::setList(quarn::findPlug("swing.keyValues"), {0, 0, 1e300});
-        session.save(scene());
-    }
+    save(3, "setAttr swing.keyTimes 1 2 3; setAttr swing.keyValues 0 0 1e300");
     quarn::ExportOptions flags = options();
     flags.overwrite = true;
     EXPECT_THAT(errorOf(flags), AllOf(StartsWith("frame 3: "), HasSubstr("controlValues[6] (arm.rotateZ) is ")));
