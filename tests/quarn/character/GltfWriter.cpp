@@ -43,6 +43,11 @@ std::size_t GltfWriter::shorts(const std::string& type, const std::vector<std::u
     return add(type, 5123, values.size(), values.data(), values.size() * sizeof(std::uint16_t));
 }
 
+void GltfWriter::replace(const std::string& name, std::size_t accessor) {
+    const std::size_t at = meshes[0].find('"' + name + "\":") + name.size() + 3;
+    meshes[0].replace(at, 1, std::to_string(accessor));
+}
+
 std::size_t GltfWriter::add(const std::string& type, int componentType, std::size_t count, const void* data,
                             std::size_t size) {
     static const std::map<std::string, std::size_t> widths{

@@ -13,6 +13,8 @@ public:
     /// Add an accessor, with a buffer view of its own, and give its index. `type` "SCALAR", "VEC3", ...
     std::size_t floats(const std::string& type, const std::vector<float>& values);
     std::size_t shorts(const std::string& type, const std::vector<std::uint16_t>& values);
+    /// Lets the first mesh have another accessor as its "POSITION", "indices" and so on.
+    void replace(const std::string& name, std::size_t accessor);
 
     /// The objects of the lists, as JSON.
     std::vector<std::string> nodes;
@@ -32,14 +34,5 @@ private:
     std::vector<std::string> views_;
     std::vector<std::string> accessors_;
 };
-
-/// Numbers with commas between them.
-template <class Number>
-std::string list(const std::vector<Number>& numbers) {
-    std::string text;
-    for (const Number number : numbers)
-        text += (text.empty() ? "" : ",") + std::to_string(number);
-    return text;
-}
 
 } // namespace quarn

@@ -23,6 +23,18 @@ inline void findDeformer() {
     ::setenv("NEURALWARP_PLUGIN", NW_PLUGIN, 1);
 }
 
+inline std::vector<double> pointsOf(const HPlug& plug) {
+    std::vector<double> points;
+    readPoints(plug, points);
+    return points;
+}
+
+inline void expectNear(const std::vector<double>& points, std::size_t vertex, const HPoint& wanted) {
+    EXPECT_NEAR(points[3 * vertex], wanted.x, 1e-6) << vertex;
+    EXPECT_NEAR(points[3 * vertex + 1], wanted.y, 1e-6) << vertex;
+    EXPECT_NEAR(points[3 * vertex + 2], wanted.z, 1e-6) << vertex;
+}
+
 /// A session with the scene of a character.
 class TestScene {
 public:
@@ -41,7 +53,7 @@ public:
         const std::vector<HMatrix> worlds = plainWorlds(character_, seconds);
         for (std::size_t m = 0; m < character_.meshes.size(); ++m) {
             const CharacterMesh& mesh = character_.meshes[m];
-            const std::vector<double> points = pointsOf(scene_.meshes[m].skin, "outputGeom[0]");
+            const std::vector<double> points = pointsOf(plugOf(scene_.meshes[m].skin, "outputGeom[0]"));
             for (std::size_t v = 0; v < mesh.points.size(); ++v)
                 if (!mesh.influences[v].empty())
                     expectNear(points, v, plainPoint(mesh, worlds, v));
@@ -51,8 +63,9 @@ public:
     /// The skins leave the rest meshes where they are.
     void expectStill() {
         for (const SceneMesh& mesh : scene_.meshes) {
-            const std::vector<double> rest = pointsOf(mesh.mesh, "outMesh");
-            EXPECT_THAT(pointsOf(mesh.skin, "outputGeom[0]"), testing::Pointwise(testing::DoubleNear(1e-9), rest));
+            const std::vector<double> rest = pointsOf(plugOf(mesh.mesh, "outMesh"));
+            EXPECT_THAT(pointsOf(plugOf(mesh.skin, "outputGeom[0]")),
+                        testing::Pointwise(testing::DoubleNear(1e-9), rest));
         }
     }
 
@@ -60,17 +73,6 @@ public:
     const CharacterScene& scene() const { return scene_; }
 
 private:
-    static std::vector<double> pointsOf(const HObject& node, const std::string& plug) {
-        std::vector<double> points;
-        readPoints(plugOf(node, plug), points);
-        return points;
-    }
-    static void expectNear(const std::vector<double>& points, std::size_t vertex, const HPoint& wanted) {
-        EXPECT_NEAR(points[3 * vertex], wanted.x, 1e-6) << vertex;
-        EXPECT_NEAR(points[3 * vertex + 1], wanted.y, 1e-6) << vertex;
-        EXPECT_NEAR(points[3 * vertex + 2], wanted.z, 1e-6) << vertex;
-    }
-
     const Character& character_;
     std::vector<JointRest> rests_; // finds the deformer, which the session needs
     SceneSession session_;
