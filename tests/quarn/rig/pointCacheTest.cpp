@@ -1,18 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 // The point cache node: which points it gives at which time, and what it does with a file that does not fit.
-#include "host/support/SceneTest.h"
 #include "host/support/testDeformers.h"
+#include "quarn/rig/RigTest.h"
 #include "support/TemporaryFolder.h"
 
-#include "rig/registration.h"
 #include "storage/NpyWriter.h"
 
-#include "openquarn/HExternalContentInfoTable.h"
-#include "openquarn/HExternalContentLocationTable.h"
-#include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HFnMesh.h"
-#include "openquarn_app/Evaluation.h"
-#include "openquarn_app/Plugins.h"
 
 #include <fstream>
 #include <limits>
@@ -26,10 +20,9 @@ using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 
 /// A grid of four vertices, "base.outMesh", whose points come from "cache".
-class PointCache : public SceneTest {
+class PointCache : public RigTest {
 public:
     PointCache() {
-        OpenQuarn::addPlugin("quarnRig", rig::registerNodes, rig::deregisterNodes);
         testDeformers::meshNode("base", testDeformers::withTag(testDeformers::grid(2, 2), "tip", {3, 1}));
         create("pointCache", "cache");
         connect("base.outMesh", "cache.inMesh");
@@ -152,23 +145,6 @@ TEST_F(PointCache, PassesTheMeshThroughWhenTheFileDoesNotFit) {
     plug("cache.inMesh").setHObject(HObject::kNullObj);
     EXPECT_TRUE(OpenQuarn::evaluate(plug("cache.outMesh")).error());
     EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("inMesh holds no mesh")));
-}
-
-TEST_F(PointCache, TheFileCanBeArchivedAndMoved) {
-    play({1});
-    HPxNode* node = HFnDependencyNode(plug("cache.outMesh").node()).userNode();
-    const HStringArray files = node->getFilesToArchive();
-    ASSERT_EQ(files.length(), 1U);
-    EXPECT_EQ(files[0].asStdString(), path());
-    HExternalContentInfoTable table;
-    node->getExternalContent(table);
-    HExternalContentInfo info;
-    EXPECT_EQ(text(table.getInfo("cacheFile", info)), "");
-    EXPECT_EQ(info.unresolvedLocation.asStdString(), path());
-    HExternalContentLocationTable places;
-    places.addEntry("cacheFile", "moved.npy");
-    node->setExternalContent(places);
-    EXPECT_EQ(plug("cache.cacheFile").asString(), "moved.npy");
 }
 
 } // namespace

@@ -2,6 +2,8 @@
 #include "host/support/testDeformers.h"
 #include "quarn/rig/RigTest.h"
 
+#include "openquarn_app/SceneFile.h"
+
 namespace {
 
 /// Two grids of four vertices. The joint at x = 1, index 5, turns; the one at index 2 stays.
@@ -89,7 +91,6 @@ TEST_F(SkinCluster, DamageLeavesTheGeometryAndSaysWhere) {
     const Row rows[] = {
         {"1 1 1", "5 5 5", "1 1 1", "influenceCounts has 3 values; the geometry has 4 vertices"},
         {"1 1 1 1 1", "5 5 5 5 5", "1 1 1 1 1", "influenceCounts has 5 values; the geometry has 4 vertices"},
-        {"1 1 -1 1", "5 5", "1 1", "influenceCounts[2] is -1, not a whole number from 0 to 4294967295"},
         {"1 1 1 1", "5 5 5", "1 1 1 1", "influences has 3 values; the influenceCounts add up to 4"},
         {"1 1 1 1", "5 5 4 5", "1 1 1 1", "an influence is 4, but there is no matrix[4]"},
         {"1 1 1 1", "5 5 4294967295 5", "1 1 1 1", "an influence is 4294967295, but there is no matrix[4294967295]"},
@@ -124,7 +125,9 @@ TEST_F(SkinCluster, IsTheSameInParallelAndFromAFile) {
         ASSERT_EQ(deformed("0"), first);
         ASSERT_EQ(deformed("3"), second);
     }
-    saveAndOpen();
+    std::string saved;
+    EXPECT_TRUE(OpenQuarn::sceneToText(saved));
+    EXPECT_TRUE(OpenQuarn::sceneFromText(saved, "saved"));
     EXPECT_EQ(deformed("0"), first);
     EXPECT_EQ(deformed("3"), second);
 }
