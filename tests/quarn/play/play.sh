@@ -21,8 +21,6 @@ setAttr ramp.keyValues 0 3e38
 setAttr wave.envelope 10
 file -saveAs huge.json
 setAttr ramp.keyValues 0 1
-setAttr wave.weightList[0].weights[8] 3e38
-file -saveAs heavy.json
 setAttr wave.models[0].modelActive 0
 setAttr wave.modelRoot nowhere
 file -saveAs untrained.json
@@ -62,16 +60,8 @@ cp -r "$work/models/wave.nwrp" "$work/slow.nwrp"
 sed -i 's/"smoothingIterations": [0-9]*/"smoothingIterations": 1000/' "$work/slow.nwrp/metadata.json"
 expect 0 'warning: so many smoothing passes' '' info "$work/slow.nwrp"
 
-# a destroyed mesh leaves with an error: by what the scene says, by the network, and by a damaged model
-echo '{"openquarnScene": 1, "nodes": [{"name": "far", "type": "mesh", "values": {"inMesh": {"points":
-  [0, 0, 0, 1, 0, 0, 0, 1e300, 0], "counts": [3], "corners": [0, 1, 2]}}}]}' >"$work/far.json"
-for ending in npy obj; do
-  expect 1 '' 'frame 1: vertex 2 of far\.outMesh has a coordinate that is no finite number' \
-    play "$work/far.json" --plug far.outMesh --frames 1 -o "$work/lost.$ending"
-done
-expect 1 '' 'frame 1: vertex 2 of far' bake "$work/far.json" far.outMesh --frames 1 -o "$work/lost.npy"
-expect 1 '' 'frame 4: vertex 8 of wave' play "$work/huge.json" --frames 1-11
-expect 1 '' 'frame 2: vertex 8 of wave' play "$work/heavy.json" --frames 2
+# a destroyed mesh leaves with an error: by the network, and by a damaged model
+expect 1 '' 'frame 4: vertex 8 of wave' play "$work/huge.json" --frames 4 -o "$work/lost.obj"
 expect 1 '' 'frame 4: vertex 8 of wave' bake "$work/huge.json" 'wave.outputGeom[0]' --frames 1-11 -o "$work/lost.npy"
 cp -r "$work/models/wave.nwrp" "$work/models/seven.nwrp"
 sed -i 's/"deltaMode": 1/"deltaMode": 7/' "$work/models/seven.nwrp/metadata.json"
@@ -125,9 +115,7 @@ expect 0 'the model of wave is off: this is the mesh as it came in\n' '' play "$
 sed -i 's/"fullCount": 4/"fullCount": 369/' "$work/models/"*/metadata.json
 rm -r "$work/models/two.nwrp"
 
-expect 0 'geometry 0 \(strip\): 369 vertices, 369 affected, 2 controls, model wave On' '' info "$scene"
 expect 0 'Off, not there: training makes nowhere/wave\.nwrp\n$' '' info "$work/untrained.json"
-expect 0 'missing file of lost: .*none\.npy' '' info "$work/lost.json"
 expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\nfits\n' '' \
   info "$work/models/wave.nwrp" --scene "$scene"
 
@@ -149,17 +137,8 @@ mv "$work/principal_shapes.json" "$work/models/wave.nwrp"
 sed -i 's/"geometry": *"[^"]*"/"geometry": "\\u001b[31m\\u009bred"/' "$work/models/wave.nwrp/metadata.json"
 expect 0 'of \\u001b\[31m\\u009bred\n' '' info "$work/models/wave.nwrp"
 expect 1 '' '^[^\e]*quarn: [^\e]*\\u001b\[31mnone[^\e]*$' info $'\e[31mnone.json'
-for i in {1..25}; do
-  printf 'createNode pointCache -name lost%d\nsetAttr lost%d.cacheFile none.npy\n' "$i" "$i"
-done >"$work/many.txt"
-echo 'file -saveAs many.json' >>"$work/many.txt"
-(cd "$work" && "$quarn" exec many.txt >/dev/null)
-expect 0 'missing file of lost20: (.*)\n\.\.\. and 5 more missing files\n' '' info "$work/many.json"
 
-rm -r "$work/models/wave.nwrp"
-expect 1 '' 'frame 1: .*wave\.nwrp' play "$scene" --frames 1
-mkdir "$work/models/wave.nwrp"
-expect 1 '' 'wave cannot apply the model .*/wave\.nwrp: metadata\.json is missing' play "$scene" --frames 1
+rm "$work/models/wave.nwrp/metadata.json"
 echo 'no model' >"$work/models/wave.nwrp/model.onnx"
 echo '[' >"$work/models/wave.nwrp/principal_shapes.json"
 expect 1 'damaged: metadata(.|\n)*damaged: model\.onnx cannot be used(.|\n)*damaged: principal' 'is damaged' \

@@ -2,7 +2,6 @@
 // Statistics against a plain computation, and files read back.
 #include "quarn/play/Distances.h"
 #include "quarn/play/FrameFiles.h"
-#include "quarn/play/FrameTimes.h"
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/meshFiles.h"
 #include "support/TemporaryFolder.h"
@@ -76,15 +75,6 @@ TEST(Jitter, IsTheLargestSecondDifference) {
     EXPECT_EQ(jitter.largest(), 0.0);
     jitter.add(std::vector<float>{3, 0, 0, -3, 9, 4});
     EXPECT_EQ(jitter.largest(), 5.0);
-}
-
-TEST(FrameTimes, AreRankedNotInterpolated) {
-    FrameTimes times;
-    for (int frame = 1; frame <= 100; ++frame)
-        times.add(frame, frame == 40 ? 500 : frame);
-    EXPECT_EQ(times.median(), 51.0);
-    EXPECT_EQ(times.percentile(0.99), 100.0);
-    EXPECT_EQ(times.worstFrame(), 40);
 }
 
 TEST(MeshFiles, ObjKeepsVerticesAndPolygons) {

@@ -37,12 +37,6 @@ TEST(Heat, RangesAreRoundedUpTo125) {
     EXPECT_EQ(roundedUp(std::numeric_limits<double>::quiet_NaN()), 1.0);
 }
 
-TEST(Heat, DistancesOfAKnownOffset) {
-    const std::vector<double> points = {0, 0, 0, 1, 2, 3, -1e9, 0, 0};
-    const std::vector<double> moved = {3, 4, 0, 1, 2, 3, -1e9, 0, 0.25};
-    EXPECT_EQ(distances(points, moved), (std::vector<double>{5.0, 0.0, 0.25}));
-}
-
 TEST(Heat, NumbersOfTheBar) {
     EXPECT_EQ(numberText(0.0), "0");
     EXPECT_EQ(numberText(2.5), "2.5");

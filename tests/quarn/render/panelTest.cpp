@@ -26,14 +26,14 @@ protected:
 };
 
 TEST_F(PanelTest, LabelsAndPlugsAreTakenApart) {
-    addMesh("a", {0, 0, 0, 1, 0, 0, 0, 1, 0});
-    addMesh("b", {0, 0, 2, 1, 0, 0, 0, 1, 0});
+    addMesh("a", {0, 0, 0, 1, 0, 0, -1e9, 1, 0});
+    addMesh("b", {3, 4, 0, 1, 0, 0, -1e9, 1, 0.25});
     const Panel plain = panelFrom("error = 0=a.outMesh");
     EXPECT_EQ(plain.label, "error = 0");
     EXPECT_FALSE(plain.isHeat());
     const Panel heat = heatPanelFrom("a: to b=a.outMesh:b.outMesh");
     EXPECT_EQ(heat.label, "a: to b");
-    EXPECT_EQ(evaluatePanel(heat, 1).distances, (std::vector<double>{2.0, 0.0, 0.0}));
+    EXPECT_EQ(evaluatePanel(heat, 1).distances, (std::vector<double>{5.0, 0.0, 0.25}));
     for (const char* text : {"a.outMesh", "label=", ""})
         EXPECT_THAT([&] { panelFrom(text); }, ThrowsMessage<std::runtime_error>(HasSubstr("write LABEL=PLUG")));
     for (const char* text : {"x=a.outMesh", "x=a.outMesh:", "x=:a.outMesh"})

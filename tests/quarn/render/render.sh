@@ -4,17 +4,12 @@ set -euo pipefail
 quarn=$1 scene=examples/wave/wave.json
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
+source tests/support/expect.sh
 
-fail() { echo "$1" >&2; exit 1; }
 # the four bytes of width and height in a PNG file, in hexadecimal
 size_of() { od -An -tx1 -j16 -N8 "$1" | tr -d ' \n'; }
 draw() { "$quarn" render "$scene" --plug strip.outMesh --size 40x30 "$@" 2>>"$work/err"; }
-refused() {
-    local expected=$1
-    shift
-    if "$quarn" render "$scene" "$@" >"$work/out" 2>"$work/refused"; then fail "not refused: $*"; fi
-    grep -qF -- "$expected" "$work/refused" || { cat "$work/refused" >&2; fail "another reason for: $*"; }
-}
+refused() { expect "$1" '' "$2" render "$scene" "${@:3}"; }
 
 draw -o "$work/one.png"
 [ "$(size_of "$work/one.png")" = 000000280000001e ] || fail "the picture has another size"
@@ -29,13 +24,14 @@ draw -o "$work/pic.###.png" --frames 1-5x2 --heat "moved=strip.outMesh:wave.orig
 cmp "$work/pic.001.png" "$work/pic.005.png" # nothing moves in this scene
 grep -q '"rangeMillimetres"' "$work/json"
 
-refused "must end in .png" -o "$work/no.jpg"
-refused "Not a directory" -o "$work/one.png/no.png"
-refused "takes one picture" -o /dev/stdout --frames 1-2 --plug strip.outMesh --size 40x30
-refused '"10x" is no size' -o "$work/no.png" --size 10x
-refused "cannot be made" -o "$work/no.png" --size 9000x100 --panel a=strip.outMesh --panel b=strip.outMesh
-refused "there is no plug strip.none" -o "$work/no.png" --plug strip.none
-refused "no deformer none" -o "$work/no.png" --model x --deformer none
-refused "none.nwrp, which is wave.modelRoot" -o "$work/no.png" --model none
+refused 2 "must end in .png" -o "$work/no.jpg"
+refused 1 "Not a directory" -o "$work/one.png/no.png"
+refused 1 "takes one picture" -o /dev/stdout --frames 1-2 --plug strip.outMesh --size 40x30
+refused 2 '"10x" is no size' -o "$work/no.png" --size 10x
+refused 2 "cannot be made" -o "$work/no.png" --size 9000x100 --panel a=strip.outMesh --panel b=strip.outMesh
+refused 1 "there is no plug strip.none" -o "$work/no.png" --plug strip.none
+refused 1 "no deformer none" -o "$work/no.png" --model x --deformer none
+refused 1 "none.nwrp, which is wave.modelRoot" -o "$work/no.png" --model none
 [ ! -e "$work/no.png" ] || fail "a refused picture was written"
 if ls "$work"/.whole-* 2>/dev/null; then fail "a part of a picture is left"; fi
+exit $bad

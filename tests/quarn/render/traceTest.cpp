@@ -72,11 +72,6 @@ Picture pictureOf(const PanelFrame& frame, const Camera& camera) {
     return picture;
 }
 
-Picture background() {
-    const PanelFrame nothing;
-    return pictureOf(nothing, cameraFor(nothing));
-}
-
 TEST(Trace, ASphereCoversItsSilhouette) {
     const PanelFrame ball = sphere();
     const Camera camera = cameraFor(ball);
@@ -143,8 +138,7 @@ TEST(Trace, BothSidesAreShownAlike) {
 }
 
 TEST(Trace, HeatOfAKnownDistanceHasItsColour) {
-    PanelFrame ball = sphere();
-    ball.distances.assign(ball.points.size() / 3, 0.25);
+    const PanelFrame ball = sphere();
     const Camera camera = cameraFor(ball);
     Surface surface = makeSurface(ball.polygons, camera.toCamera(ball.points));
     surface.heat.assign(surface.points.size(), 0.25F);
@@ -157,8 +151,8 @@ TEST(Trace, HeatOfAKnownDistanceHasItsColour) {
 }
 
 TEST(Trace, NothingToSeeIsTheBackground) {
-    const std::vector<std::uint8_t> empty = background().rgb;
     PanelFrame lines;
+    const std::vector<std::uint8_t> empty = pictureOf(lines, cameraFor(lines)).rgb;
     lines.points = {0, 0, 0, 1, 0, 0, 0, 1, 0};
     lines.polygons = {3, {2, 2}, {0, 1, 1, 2}};
     EXPECT_EQ(pictureOf(lines, cameraFor(lines)).rgb, empty);
