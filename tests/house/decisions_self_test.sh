@@ -1,29 +1,20 @@
 #!/usr/bin/env bash
-# decisions_self_test.sh SCRIPT: plants one fault at a time into a small tree and asks decisions.sh --check for its verdict.
-set -euo pipefail
+# decisions_self_test.sh SCRIPT: plants one fault at a time into a small tree and asks decisions.sh --check for its
+# verdict.
+. "$(dirname "$0")/self_test.sh"
 script=$1
-tree=$(mktemp -d)
-trap 'rm -rf "$tree"' EXIT
-failed=0
 records=$tree/docs/decisions
 
 # try PATTERN COMMAND: what --check says after the command was run in a tree without faults; '' where it says nothing
 try() {
-  local pattern=$1 said status=0
   rm -rf "$tree/docs" && mkdir -p "$records"
   printf '# 0001: one\n\n**Date.** 2024-02-29\n\nLeads to [0002](0002-b.md).\n' >"$records/0001-a.md"
   printf '# 0002: two\n\n**Date.** 2024-03-01\n' >"$records/0002-b.md"
   printf '// decision 0001\n// by decisions 0001 and 0002, in 1970\n' >"$tree/docs/code.cpp"
   "$script" "$tree" || failed=1
   (cd "$tree/docs" && eval "$2")
-  said=$("$script" --check "$tree") || status=$?
-  if [[ $pattern ]]; then
-    [[ $status == 1 && $said =~ $pattern ]] && return
-  else
-    [[ $status == 0 && ! $said ]] && return
-  fi
-  printf 'expected "%s" after: %s\nstatus %s, output: %s\n' "$pattern" "$2" "$status" "$said"
-  failed=1
+  ask "$script" --check "$tree"
+  if [[ $1 ]]; then [[ $status == 1 && $said =~ $1 ]]; else [[ $status == 0 && ! $said ]]; fi || wrong "'$1' after: $2"
 }
 
 try '' true

@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # includes.sh ROOT [TABLE]: reads every C++ file of every layer under ROOT and lists the includes that TABLE, layers.txt
-# beside this script if none is given, does not allow. The table itself is judged too: its folders and names exist, and no
-# chain of "may include" leads back to where it began. Exit status 1 when there is something to list.
+# beside this script if none is given, does not allow. The table itself is judged too: its folders and names exist, and
+# no chain of "may include" leads back to where it began. Exit status 1 when there is something to list.
 set -euo pipefail
 shopt -s extglob
 table=$(realpath "${2:-$(dirname "$0")/layers.txt}")
@@ -85,7 +85,8 @@ check_table() {
   local row right
   for row in "${rows[@]}"; do
     for right in ${allowed_of[$row]}; do
-      [[ ${rows_of[$right]:-}${patterns_of[$right]:-} ]] || complain "${table##*/}: $row: $right is no prefix and no library"
+      [[ ${rows_of[$right]:-}${patterns_of[$right]:-} ]] ||
+        complain "${table##*/}: $row: $right is no prefix and no library"
     done
     [[ ${state_of[$row]:-} ]] || descend "$row" " -> $row -> "
   done
@@ -114,8 +115,10 @@ find_prefix() {
   prefix=
 }
 
+standard_c='@(assert|ctype|errno|float|limits|math|signal|stdarg|stddef|stdint|stdio|stdlib|string|time).h'
 is_standard() {
-  [[ $1 != *[./]* || $1 == @(assert|ctype|errno|float|limits|math|signal|stdarg|stddef|stdint|stdio|stdlib|string|time).h ]]
+  # shellcheck disable=SC2053 # the right side is a pattern
+  [[ $1 != *[./]* || $1 == $standard_c ]]
 }
 
 # Whether a file of folder $1, in row $2, may include $4, which stands behind the quote $3.

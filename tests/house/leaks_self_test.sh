@@ -1,20 +1,11 @@
 #!/usr/bin/env bash
 # Plants one line at a time and asks leaks.sh for its verdict. The lines are put together here so that this file has none.
-set -euo pipefail
-here=$(cd "$(dirname "$0")" && pwd)
-tree=$(mktemp -d)
-trap 'rm -rf "$tree"' EXIT
-failed=0
+. "$(dirname "$0")/self_test.sh"
 
 try() {
-  local expected=$1 text=$2 status=0
-  printf 'before\n%s\n' "$text" >"$tree/file.txt"
-  "$here/leaks.sh" "$tree" >"$tree.log" || status=$?
-  [[ $status == "$expected" ]] || {
-    printf 'expected status %s, had %s: %s\n' "$expected" "$status" "$text"
-    failed=1
-  }
-  rm -f "$tree.log"
+  printf 'before\n%s\n' "$2" >"$tree/file.txt"
+  ask "$here/leaks.sh" "$tree"
+  [[ $status == "$1" ]] || wrong "status $1: $2"
 }
 
 for folder in root home/ann work Users/Ann; do

@@ -1,27 +1,20 @@
 #!/usr/bin/env bash
 # places_self_test.sh ROOT: places.sh is content with the product, and finds each second place that is planted in a copy.
-set -euo pipefail
-here=$(cd "$(dirname "$0")" && pwd)
+. "$(dirname "$0")/self_test.sh"
 root=$(cd "$1" && pwd)
-tree=$(mktemp -d)
-trap 'rm -rf "$tree"' EXIT
 
 copy() {
   rm -rf "${tree:?}"/*
   (cd "$root" && find libraries host plugin quarn -name '*.cpp' -o -name '*.h' | tar -cf - -T -) | tar -xf - -C "$tree"
 }
 
-fail() {
-  printf '%s\n' "$*"
-  exit 1
-}
-
 copy
-"$here/places.sh" "$tree" || fail "the product is refused"
+ask "$here/places.sh" "$tree"
+[[ $status == 0 ]] || wrong "the product to be content with"
 while IFS='|' read -r file line; do
   printf '%s\n' "$line" >>"$tree/$file"
-  answer=$("$here/places.sh" "$tree") && fail "not found in $file: $line"
-  [[ $answer == *"$file:"*"$line"* ]] || fail "not named: $file: $line, but: $answer"
+  ask "$here/places.sh" "$tree"
+  [[ $status == 1 && $said == *"$file:"*"$line"* ]] || wrong "$file to be named for: $line"
   copy
 done <<'END'
 quarn/main.cpp|document.Parse(text.c_str());
@@ -34,5 +27,6 @@ quarn/main.cpp|constexpr auto digits = "uvwxyz0123456789+/";
 END
 # and that a place has lost what belongs there
 sed -i '/::rename(/d' "$tree/libraries/storage/TemporaryFile.cpp"
-"$here/places.sh" "$tree" >/dev/null && fail "a rename that has gone is not missed"
-exit 0
+ask "$here/places.sh" "$tree"
+[[ $status == 1 ]] || wrong "a rename that has gone to be missed"
+exit $failed
