@@ -20,7 +20,6 @@ Json replayConverter(Input& input, JsonAllocator& allocator);
 Json replayOrtho(Input& input, JsonAllocator& allocator);
 Json replayScenario(Input& input, JsonAllocator& allocator);
 
-// A kind of case. A null replay: the code it exercises does not exist yet.
 struct Kind {
     std::string_view name;
     Replay replay;

@@ -5,6 +5,7 @@
 #include "quill/VertexConnections.h"
 #include "quill/VertexFrames.h"
 #include "quill/bulk.h"
+#include "support/meshZoo.h"
 
 #include <optional>
 #include <stdexcept>
@@ -33,17 +34,10 @@ Json replayPairs(const Json& pairs, JsonAllocator& allocator) {
 }
 
 quill::MeshTopology readTopology(const Json& polygons, std::size_t vertexCount) {
-    quill::MeshTopology topology;
-    topology.polygonOffsets.push_back(0);
-    for (const Json& polygon : polygons.GetArray()) {
-        for (const std::uint32_t vertex : readIndices(polygon))
-            topology.polygonVertices.push_back(vertex);
-        topology.polygonOffsets.push_back(static_cast<std::uint32_t>(topology.polygonVertices.size()));
-    }
-    topology.polygonCount = polygons.Size();
-    topology.vertexCount = static_cast<int>(vertexCount);
-    topology.valid = true;
-    return topology;
+    std::vector<std::vector<std::uint32_t>> lists;
+    for (const Json& polygon : polygons.GetArray())
+        lists.push_back(readIndices(polygon));
+    return makeTopology(lists, vertexCount);
 }
 
 quill::IndexMapper readMap(const Json& affected, std::size_t fullCount) {
