@@ -2,11 +2,13 @@
 #pragma once
 
 #include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
 
 #include <gmock/gmock.h>
 
 #include <algorithm>
 #include <cerrno>
+#include <csignal>
 #include <fstream>
 #include <functional>
 #include <sstream>
@@ -15,6 +17,7 @@
 #include <vector>
 
 #include <linux/capability.h>
+#include <sys/resource.h>
 #include <sys/syscall.h>
 #include <unistd.h>
 
@@ -44,15 +47,26 @@ protected:
     TemporaryFolder folder;
 };
 
-/// What `work` throws.
-inline std::string errorOf(const std::function<void()>& work) {
-    try {
-        work();
-    } catch (const std::exception& error) {
-        return error.what();
+/// Files of this process may have so many bytes while it lives; beyond that writing fails, as on a full disk.
+class FileSizeLimit {
+public:
+    explicit FileSizeLimit(rlim_t bytes)
+        : handler_(std::signal(SIGXFSZ, SIG_IGN)) {
+        getrlimit(RLIMIT_FSIZE, &before_);
+        const rlimit limit{bytes, before_.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
     }
-    return "(nothing)";
-}
+    ~FileSizeLimit() {
+        setrlimit(RLIMIT_FSIZE, &before_);
+        std::signal(SIGXFSZ, handler_);
+    }
+    FileSizeLimit(const FileSizeLimit&) = delete;
+    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+
+private:
+    rlimit before_ = {};
+    void (*handler_)(int);
+};
 
 /// Runs `work` on a thread for which permissions count, also when root runs the tests. Not run, and answers the errno,
 /// where that could not be had.

@@ -40,7 +40,7 @@ TEST_F(ReadWholeFileTest, TakesRegularFilesUpToASize) {
         {"/proc/self/maps", " has more than 9 bytes, and at most 9 are read"},
     };
     for (const auto& [file, error] : rows)
-        EXPECT_EQ(errorOf([&, name = file] { readWholeFile(name, 9); }), file.string() + error);
+        EXPECT_EQ(failureOf([&, name = file] { readWholeFile(name, 9); }), file.string() + error);
 }
 
 TEST_F(FolderTest, TwoExchangeTheirNames) {
@@ -50,7 +50,7 @@ TEST_F(FolderTest, TwoExchangeTheirNames) {
     put("next/two", "2");
     storage::exchangeFolders(path("next"), path("old"));
     EXPECT_EQ(content("old/two") + content("next/one"), "21");
-    EXPECT_THAT(errorOf([&] { storage::exchangeFolders(path("none"), path("old")); }),
+    EXPECT_THAT(failureOf([&] { storage::exchangeFolders(path("none"), path("old")); }),
                 ::testing::HasSubstr("old could not be replaced by "));
     EXPECT_THAT(names(), ElementsAre("next", "old"));
 }
@@ -59,7 +59,7 @@ TEST_F(FolderTest, IsLockedByOne) {
     {
         storage::FolderLock lock(path("locked"), "a friend");
         EXPECT_TRUE(storage::FolderLock::isTaken(path("locked")));
-        EXPECT_EQ(errorOf([&] { storage::FolderLock(path("locked"), "a friend"); }),
+        EXPECT_EQ(failureOf([&] { storage::FolderLock(path("locked"), "a friend"); }),
                   "a friend is writing " + path("locked").string() + "; wait until it is done");
         fs::rename(path("locked"), path("moved"));
         lock.follow(path("moved"));
