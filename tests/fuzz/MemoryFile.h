@@ -1,9 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "require.h"
+
 #include <cstddef>
 #include <cstdint>
-#include <cstdlib>
 #include <string>
 
 #include <sys/mman.h>
@@ -14,8 +15,7 @@ class MemoryFile {
 public:
     MemoryFile(const std::uint8_t* data, std::size_t size)
         : descriptor_(memfd_create("fuzz", MFD_CLOEXEC)) {
-        if (descriptor_ < 0 || write(descriptor_, data, size) != static_cast<ssize_t>(size))
-            std::abort();
+        require(descriptor_ >= 0 && write(descriptor_, data, size) == static_cast<ssize_t>(size));
     }
     ~MemoryFile() { close(descriptor_); }
     MemoryFile(const MemoryFile&) = delete;

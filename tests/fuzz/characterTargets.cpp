@@ -3,20 +3,15 @@
 
 #include "quarn/character/prepareGltf.h"
 #include "quarn/character/transfer.h"
+#include "require.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <stdexcept>
 #include <string>
 
 namespace {
 
 using namespace quarn;
-
-void require(bool holds) {
-    if (!holds)
-        std::abort();
-}
 
 // a triangle that follows the second of two joints, which turns
 std::string soundAnswer() {

@@ -8,6 +8,7 @@
 #include "openquarn_app/Session.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/pose/readKeys.h"
+#include "require.h"
 #include "rig/registration.h"
 #include "storage/Json.h"
 #include "storage/npyArray.h"
@@ -17,11 +18,6 @@
 #include <stdexcept>
 
 namespace {
-
-void require(bool holds) {
-    if (!holds)
-        std::abort();
-}
 
 // true when `read` throws nothing; its error has to begin with, or hold, the name of the file
 bool accepts(const std::string& name, const std::function<void()>& read) {

@@ -3,8 +3,6 @@
 
 #include <algorithm>
 #include <cmath>
-#include <cstdio>
-#include <cstdlib>
 #include <filesystem>
 #include <streambuf>
 #include <vector>
@@ -14,6 +12,7 @@
 
 #include "nw_model/ModelSession.h"
 #include "readers.h"
+#include "require.h"
 #include "support/TemporaryFolder.h"
 
 using namespace neuralWarp;
@@ -30,12 +29,6 @@ public:
 private:
     std::vector<char> bytes_;
 };
-
-void require(bool condition) {
-    if (!condition) {
-        std::abort();
-    }
-}
 
 /// A file in memory under a path that ends in ".onnx".
 class MemoryModelFile {
@@ -99,8 +92,4 @@ bool fuzzOnnxLoad(const std::uint8_t* data, std::size_t size) {
     require(outputs.empty() == !session.errorText().empty());
     require(accepted || outputs.empty());
     return accepted;
-}
-
-void silenceStandardOutput() {
-    require(std::freopen("/dev/null", "w", stdout) != nullptr);
 }

@@ -11,6 +11,3 @@
 bool fuzzMetadata(const std::uint8_t* data, std::size_t size);
 bool fuzzPrincipalShapes(const std::uint8_t* data, std::size_t size);
 bool fuzzOnnxLoad(const std::uint8_t* data, std::size_t size);
-
-/// Sends standard output to nowhere: refused inputs print their line, and the fuzzer reports on standard error.
-void silenceStandardOutput();

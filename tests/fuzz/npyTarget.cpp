@@ -1,22 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "npyTarget.h"
 
+#include "MemoryFile.h"
+#include "require.h"
 #include "storage/NpyFile.h"
 
-#include <cstdlib>
 #include <optional>
 #include <stdexcept>
 #include <string>
 #include <vector>
 
-#include <sys/mman.h>
-
 namespace {
-
-void require(bool holds) {
-    if (!holds)
-        std::abort();
-}
 
 std::optional<storage::NpyFile> opened(const std::string& path) {
     try {
@@ -39,10 +33,8 @@ void requireSameHeader(const storage::NpyFile& file) {
 } // namespace
 
 bool fuzzNpy(const std::uint8_t* data, std::size_t size) {
-    const storage::Descriptor memory(memfd_create("fuzz", MFD_CLOEXEC));
-    require(memory.isOpen());
-    require(storage::writeAll(memory.number(), std::as_bytes(std::span(data, size))) == 0);
-    const auto file = opened("/proc/self/fd/" + std::to_string(memory.number()));
+    const MemoryFile memory(data, size);
+    const auto file = opened(memory.path());
     if (!file)
         return false;
     requireSameHeader(*file);

@@ -2,6 +2,7 @@
 #include "sceneTarget.h"
 
 #include "host/files/fileNodes.h"
+#include "require.h"
 
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
@@ -12,16 +13,10 @@
 #include "openquarn_app/Session.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <string>
 #include <vector>
 
 namespace {
-
-void require(bool holds) {
-    if (!holds)
-        std::abort();
-}
 
 std::string written() {
     std::string text;

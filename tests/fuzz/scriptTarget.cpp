@@ -2,18 +2,13 @@
 #include "scriptTarget.h"
 
 #include "commands/ScriptText.h"
+#include "require.h"
 
 #include <algorithm>
-#include <cstdlib>
 
 namespace {
 
 using namespace OpenQuarn;
-
-void expect(bool holds) {
-    if (!holds)
-        std::abort();
-}
 
 std::string writtenAgain(const std::vector<ScriptCommand>& commands) {
     std::string text;
@@ -25,12 +20,12 @@ std::string writtenAgain(const std::vector<ScriptCommand>& commands) {
     return text;
 }
 
-void expectSame(const std::vector<ScriptCommand>& one, const std::vector<ScriptCommand>& other) {
+void requireSame(const std::vector<ScriptCommand>& one, const std::vector<ScriptCommand>& other) {
     const auto sameWord = [](const ScriptWord& a, const ScriptWord& b) { return a.text == b.text; };
     const auto sameCommand = [&](const ScriptCommand& a, const ScriptCommand& b) {
         return std::equal(a.words.begin(), a.words.end(), b.words.begin(), b.words.end(), sameWord);
     };
-    expect(std::equal(one.begin(), one.end(), other.begin(), other.end(), sameCommand));
+    require(std::equal(one.begin(), one.end(), other.begin(), other.end(), sameCommand));
 }
 
 } // namespace
@@ -41,11 +36,11 @@ bool fuzzScript(const std::uint8_t* data, std::size_t size) {
     try {
         const std::vector<ScriptCommand> commands = splitScript(text);
         for (const ScriptCommand& command : commands)
-            expect(!command.words.empty() && command.line >= 1 && command.line <= lines);
-        expectSame(commands, splitScript(writtenAgain(commands)));
+            require(!command.words.empty() && command.line >= 1 && command.line <= lines);
+        requireSame(commands, splitScript(writtenAgain(commands)));
         return true;
     } catch (const ScriptError& error) {
-        expect(error.line() >= 1 && error.line() <= lines);
+        require(error.line() >= 1 && error.line() <= lines);
         return false;
     }
 }

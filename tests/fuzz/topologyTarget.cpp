@@ -3,17 +3,14 @@
 
 #include "quill/VertexConnections.h"
 #include "quill/VertexFrames.h"
+#include "require.h"
 
 #include <algorithm>
 #include <bit>
-#include <cstdlib>
+
+#include <tbb/global_control.h>
 
 namespace {
-
-void require(bool condition) {
-    if (!condition)
-        std::abort();
-}
 
 // Takes small numbers off the front of the input; zeros when it is used up.
 class Bytes {
@@ -69,42 +66,53 @@ void requireTable(const std::vector<std::uint32_t>& indexer, const std::vector<s
 
 } // namespace
 
+bool useTopology(const quill::MeshTopology& topology, const quill::IndexMapper& map, const TopologyUse& use) {
+    const std::size_t count = map.affectCount();
+    quill::VertexConnections connections;
+    connections.build(topology, map, use.rings, use.self);
+    requireTable(connections.connectionsIndexer(), connections.connections(), count);
+    std::vector<float> weights;
+    connections.calculateConnectionWeights(weights, use.points, use.exponent, use.offset);
+    require(weights.size() == connections.connections().size());
+    std::vector<std::uint8_t> mask(count, 1);
+    auto smoothed = use.points, scratch = use.points;
+    connections.mushArray(smoothed, scratch, 3, use.step, use.masked ? &mask : nullptr, &weights, use.self);
+
+    quill::VertexFrames frames;
+    frames.build(topology, map, use.invert ? &use.points : nullptr);
+    requireTable(frames.framesIndexer(), frames.framesPairs(), count);
+    require(frames.framesPairs().size() % 2 == 0);
+    std::vector<quill::mat4d> matrices;
+    frames.calculateFrames(matrices, smoothed, connections.connectionsIndexer(), connections.connections(), weights,
+                           use.rings, map, use.invert, use.masked ? &use.subset : nullptr);
+    require(matrices.size() == count);
+    frames.calculateDisplacements(smoothed, use.points, scratch);
+    // tables from anywhere: the offsets and corners themselves
+    frames.calculateFrames(matrices, smoothed, topology.polygonOffsets, topology.polygonVertices, weights, 2, map,
+                           use.invert, &use.subset);
+    return !connections.connections().empty() && !frames.framesPairs().empty();
+}
+
 bool fuzzTopology(const std::uint8_t* data, std::size_t size) {
+    // coverage then depends on the input alone
+    const tbb::global_control oneThread(tbb::global_control::max_allowed_parallelism, 1);
     Bytes bytes(data, size);
     const auto map = readMap(bytes);
     quill::MeshTopology topology;
     topology.polygonOffsets = bytes.indices();
     topology.polygonVertices = bytes.indices();
     topology.polygonCount = bytes.bit() ? bytes.index() : topology.polygonOffsets.size();
-    const std::size_t rings = bytes.byte() % 4;
-    const bool self = bytes.bit(), masked = bytes.bit(), invert = bytes.bit();
-    const auto subset = bytes.indices();
-    const std::size_t count = map.affectCount();
-    std::vector<quill::val3<float>> points(count);
-    for (auto& p : points)
+    TopologyUse use;
+    use.rings = bytes.byte() % 4;
+    use.self = bytes.bit();
+    use.masked = bytes.bit();
+    use.invert = bytes.bit();
+    use.subset = bytes.indices();
+    use.points.resize(map.affectCount());
+    for (auto& p : use.points)
         p = {bytes.coordinate(), bytes.coordinate(), bytes.coordinate()};
-
-    quill::VertexConnections connections;
-    connections.build(topology, map, rings, self);
-    requireTable(connections.connectionsIndexer(), connections.connections(), count);
-    std::vector<float> weights;
-    connections.calculateConnectionWeights(weights, points, bytes.coordinate(), bytes.coordinate());
-    require(weights.size() == connections.connections().size());
-    std::vector<std::uint8_t> mask(count, 1);
-    auto smoothed = points, scratch = points;
-    connections.mushArray(smoothed, scratch, 3, bytes.coordinate(), masked ? &mask : nullptr, &weights, self);
-
-    quill::VertexFrames frames;
-    frames.build(topology, map, invert ? &points : nullptr);
-    requireTable(frames.framesIndexer(), frames.framesPairs(), count);
-    require(frames.framesPairs().size() % 2 == 0);
-    std::vector<quill::mat4d> matrices;
-    frames.calculateFrames(matrices, smoothed, connections.connectionsIndexer(), connections.connections(), weights,
-                           rings, map, invert, masked ? &subset : nullptr);
-    require(matrices.size() == count);
-    frames.calculateDisplacements(smoothed, points, scratch);
-    // tables from anywhere: the offsets and corners themselves
-    frames.calculateFrames(matrices, smoothed, topology.polygonOffsets, topology.polygonVertices, weights, 2, map,
-                           invert, &subset);
-    return !connections.connections().empty() && !frames.framesPairs().empty();
+    use.exponent = bytes.coordinate();
+    use.offset = bytes.coordinate();
+    use.step = bytes.coordinate();
+    return useTopology(topology, map, use);
 }

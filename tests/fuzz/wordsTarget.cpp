@@ -2,6 +2,7 @@
 #include "wordsTarget.h"
 
 #include "host/files/fileNodes.h"
+#include "require.h"
 
 #include "openquarn/HArgDatabase.h"
 #include "openquarn/HSelectionList.h"
@@ -9,7 +10,6 @@
 #include "openquarn_app/Session.h"
 
 #include <cmath>
-#include <cstdlib>
 #include <sstream>
 #include <string>
 #include <vector>
@@ -17,11 +17,6 @@
 namespace {
 
 using Words = std::vector<std::string>;
-
-void require(bool holds) {
-    if (!holds)
-        std::abort();
-}
 
 Words wordsOf(const std::uint8_t* data, std::size_t size) {
     std::istringstream text(std::string(reinterpret_cast<const char*>(data), size));

@@ -1,15 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 // Topologies and maps that nobody should have made: nothing is read or written out of bounds (the sanitizer builds
 // watch), every index that comes out is in range, and what is skipped is what the headers say.
+#include "fuzz/topologyTarget.h"
 #include "support/indexMaps.h"
 #include "support/meshZoo.h"
+#include "support/seedCorpus.h"
 
 #include "quill/VertexConnections.h"
 #include "quill/VertexFrames.h"
 
 #include <gmock/gmock.h>
 
-#include <algorithm>
 #include <random>
 
 namespace {
@@ -28,38 +29,16 @@ Polygons walk(const quill::MeshTopology& topology) {
     return polygons;
 }
 
-void expectTableInRange(const std::vector<std::uint32_t>& indexer, const std::vector<std::uint32_t>& entries,
-                        std::size_t count) {
-    ASSERT_EQ(indexer.size(), count + 1);
-    EXPECT_TRUE(std::is_sorted(indexer.begin(), indexer.end()));
-    EXPECT_EQ(indexer.back(), entries.size());
-    for (const std::uint32_t entry : entries)
-        ASSERT_LT(entry, count);
-}
-
 // Builds everything and runs everything on it.
 void exercise(const quill::MeshTopology& topology, const quill::IndexMapper& map) {
-    std::vector<quill::val3<float>> points(map.affectCount()), scratch;
-    for (std::size_t i = 0; i < points.size(); ++i)
-        points[i] = {static_cast<float>(i % 7), static_cast<float>(i % 3), static_cast<float>(i % 2)};
-    for (const std::size_t rings : {0U, 2U}) {
-        quill::VertexConnections connections;
-        connections.build(topology, map, rings, true);
-        expectTableInRange(connections.connectionsIndexer(), connections.connections(), points.size());
-        std::vector<float> weights;
-        connections.calculateConnectionWeights(weights, points, 1.0, 0.0);
-        auto smoothed = points;
-        connections.mushArray(smoothed, scratch, 2, 1.0F, nullptr, &weights, false);
-        for (const bool withPoints : {true, false}) {
-            quill::VertexFrames frames;
-            frames.build(topology, map, withPoints ? &points : nullptr);
-            expectTableInRange(frames.framesIndexer(), frames.framesPairs(), points.size());
-            std::vector<quill::mat4d> matrices;
-            frames.calculateFrames(matrices, smoothed, connections.connectionsIndexer(), connections.connections(),
-                                   weights, 1, map, true, nullptr);
-            frames.calculateDisplacements(smoothed, points, scratch);
+    TopologyUse use;
+    for (std::size_t i = 0; i < map.affectCount(); ++i)
+        use.points.emplace_back(static_cast<float>(i % 7), static_cast<float>(i % 3), static_cast<float>(i % 2));
+    for (use.rings = 0; use.rings < 3; use.rings += 2)
+        for (const bool invert : {false, true}) {
+            use.invert = invert;
+            useTopology(topology, map, use);
         }
-    }
 }
 
 TEST(HostileTopology, PolygonsThatDoNotFitAreSkippedOrCut) {
@@ -147,28 +126,18 @@ TEST(HostileTopology, ANewMapForgetsTheReverseTableOfTheOld) {
 
 TEST(HostileTopology, RandomNonsenseStaysInBounds) {
     std::mt19937 random(20);
-    const auto upTo = [&](std::uint32_t n) { return std::uniform_int_distribution<std::uint32_t>(0, n)(random); };
-    const auto wild = [&](std::uint32_t usual) { return upTo(9) == 0 ? upTo(0xFFFFFFFF) : upTo(usual); };
-    for (int round = 0; round < 400; ++round) {
-        quill::MeshTopology topology;
-        topology.polygonVertices.resize(upTo(40));
-        std::generate(topology.polygonVertices.begin(), topology.polygonVertices.end(), [&] { return wild(12); });
-        topology.polygonOffsets.resize(upTo(14));
-        std::generate(topology.polygonOffsets.begin(), topology.polygonOffsets.end(), [&] { return wild(42); });
-        if (round % 2 == 0)
-            std::sort(topology.polygonOffsets.begin(), topology.polygonOffsets.end());
-        topology.polygonCount = wild(16);
-        quill::IndexMapper map;
-        if (round % 3 == 0) {
-            map.setIdentity(upTo(13));
-        } else {
-            std::vector<std::uint32_t> list(upTo(10));
-            std::generate(list.begin(), list.end(), [&] { return wild(13); });
-            map.set(list, upTo(13));
-        }
-        SCOPED_TRACE("round " + std::to_string(round));
-        exercise(topology, map);
+    int withFrames = 0;
+    for (int round = 0; round < 1000; ++round) {
+        std::vector<std::uint8_t> bytes(random() % 200);
+        for (std::uint8_t& byte : bytes) // small numbers, which meet, and some from anywhere
+            byte = static_cast<std::uint8_t>(random() % 16 == 0 ? 0xFF : random() % 13);
+        withFrames += fuzzTopology(bytes.data(), bytes.size()) ? 1 : 0;
     }
+    EXPECT_GT(withFrames, 50);
+}
+
+TEST(HostileTopology, SeedsAreAcceptedOrRefusedAsNamed) {
+    EXPECT_GE(runSeedCorpus("fuzz_topology", fuzzTopology), 2);
 }
 
 } // namespace

@@ -82,6 +82,10 @@ quill::val3<float> onCircle(float turn, float = 0.0F, std::uint32_t = 0) {
     return {std::cos(6.2831853F * turn), std::sin(6.2831853F * turn), 0.0F};
 }
 
+quill::val3<float> onLine(float, float chance, std::uint32_t) {
+    return {chance, 0.3F * chance, 0.7F * chance};
+}
+
 ZooMesh largePolygon(Shape shape, std::uint32_t corners) {
     ZooMesh mesh{"large", {{}}, {}};
     std::uint32_t state = corners;
@@ -108,7 +112,7 @@ const std::pair<const char*, Shape> shapes[] = {
     {"by chance", [](float t, float r, std::uint32_t) { return onCircle(3 * r) * t + quill::val3<float>(0, 0, r); }},
     {"on a grid",
      [](float, float r, std::uint32_t c) { return quill::val3<float>(std::round(3 * r), float(c % 4), 0); }},
-    {"on a line", [](float, float r, std::uint32_t) { return quill::val3<float>(r, 0.3F * r, 0.7F * r); }},
+    {"on a line", onLine},
     {"on an axis", [](float, float r, std::uint32_t) { return quill::val3<float>(0, r, 0); }},
     {"one point", [](float, float, std::uint32_t) { return quill::val3<float>(1, 2, 3); }},
     {"with a NaN", [](float t, float, std::uint32_t c) { return onCircle(t) * (c == 17 ? std::nanf("") : 1.0F); }},
@@ -139,11 +143,7 @@ TEST(VertexFrames, WhoWaitsForALargePolygonIsToldAndMayEndIt) {
     map.setIdentity(3004);
     frames.build(mesh.topology(), map, nullptr);
     const auto before = frames.framesPairs();
-    const ZooMesh line =
-        largePolygon(std::find_if(std::begin(shapes), std::end(shapes),
-                                  [](const auto& named) { return named.first == std::string("on a line"); })
-                         ->second,
-                     3000);
+    const ZooMesh line = largePolygon(onLine, 3000);
     mesh.polygons.push_back(line.polygons[0]);
     for (std::uint32_t& corner : mesh.polygons[1])
         corner += 4;

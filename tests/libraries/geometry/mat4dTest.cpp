@@ -4,6 +4,7 @@
 
 #include <gmock/gmock.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstring>
 #include <random>
@@ -30,38 +31,29 @@ mat4d randomMatrix(std::mt19937& random) {
     return matrix;
 }
 
-double largestDifference(const mat4d& a, const mat4d& b) {
-    double largest = 0.0;
-    for (std::size_t k = 0; k < 16; ++k)
-        largest = std::max(largest, std::abs(a.m[k] - b.m[k]));
-    return largest;
-}
-
-// The longest vector that stays as it is, and the next longer one, which does not.
-template <typename T>
-void expectNormalizeLimit() {
-    const T limit = static_cast<T>(1e-20);
-    T x = static_cast<T>(1e-10);
-    for (int ulps = 0; ulps < 8; ++ulps)
-        x = std::nextafter(x, T(1));
-    while (x * x > limit)
-        x = std::nextafter(x, T(0));
-    val3<T> unchanged{0, x, 0}, changed{0, std::nextafter(x, T(1)), 0};
-    unchanged.normalize();
-    changed.normalize();
-    EXPECT_EQ(unchanged.y, x);
-    EXPECT_NEAR(changed.y, 1.0, 1e-6);
+bool areNear(const mat4d& a, const mat4d& b, double tolerance) {
+    return std::equal(a.m.begin(), a.m.end(), b.m.begin(),
+                      [=](double x, double y) { return std::abs(x - y) < tolerance; });
 }
 
 TEST(val3, NormalizeLeavesShortVectorsAlone) {
-    expectNormalizeLimit<float>();
-    expectNormalizeLimit<double>();
-    val3<float> zero, v{3, 0, 4};
-    zero.normalize();
-    v.normalize();
-    EXPECT_EQ(zero, val3<float>());
-    EXPECT_FLOAT_EQ(v.x, 0.6F);
-    EXPECT_FLOAT_EQ(v.z, 0.8F);
+    for (const double tiny : {0.0, 0.99e-10}) {
+        val3<double> two{0, tiny, 0};
+        val3<float> one{0, static_cast<float>(tiny), 0};
+        const auto before = one;
+        two.normalize();
+        one.normalize();
+        EXPECT_EQ(two.y, tiny);
+        EXPECT_EQ(one, before);
+    }
+    for (const double scale : {1.0, 0.21e-10}) {
+        val3<double> two{3 * scale, 0, 4 * scale};
+        val3<float> one{static_cast<float>(two.x), 0, static_cast<float>(two.z)};
+        two.normalize();
+        one.normalize();
+        EXPECT_DOUBLE_EQ(two.x, 0.6);
+        EXPECT_FLOAT_EQ(one.z, 0.8F);
+    }
 }
 
 TEST(mat4d, InverseTimesMatrixIsTheIdentityByBothRoutes) {
@@ -77,7 +69,7 @@ TEST(mat4d, InverseTimesMatrixIsTheIdentityByBothRoutes) {
             continue;
         ++compared;
         EXPECT_TRUE((matrix * adjugate).isIdentity(1e-10)) << matrix;
-        EXPECT_LT(largestDifference(adjugate, elimination), 1e-9) << matrix;
+        EXPECT_TRUE(areNear(adjugate, elimination, 1e-9)) << matrix;
     }
     EXPECT_GT(compared, 1500);
 }
@@ -92,34 +84,17 @@ TEST(mat4d, InverseOfSpecialMatrices) {
          {Row{"identity", {}, {}}, Row{"determinant 1e-9", diagonal(1e-3, 1e-3, 1e-3, 1), diagonal(1e3, 1e3, 1e3, 1)},
           Row{"zero", diagonal(0, 0, 0, 0), {}}, Row{"flat", diagonal(2, 0, 4, 1), diagonal(0.5, 1, 0.25, 1)},
           Row{"translation", translation(1, 2, 3), translation(-1, -2, -3)},
+          Row{"a tiny pivot below the largest",
+              {{0, 1, 0, 0, 5, 1, 0, 0, 1e-13, 1, 1, 0, 0, 0, 0, 1}},
+              {{-0.2, 0.2, 0, 0, 1, 0, 0, 0, -1, 0, 1, 0, 0, 0, 0, 1}}},
           Row{"pivot from below",
               {{0, 2, 0, 0, 4, 0, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1}},
               {{0, 0.25, 0, 0, 0.5, 0, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1}}}}) {
         mat4d inverse = row.matrix, elimination = row.matrix;
         inverse.inverse();
         elimination.gaussJordanInverse();
-        EXPECT_LT(largestDifference(inverse, row.inverse), 1e-12) << row.what << ": " << inverse;
-        EXPECT_LT(largestDifference(elimination, row.inverse), 1e-12) << row.what << ": " << elimination;
-    }
-}
-
-TEST(mat4d, RankDeficientFramesHaveAFiniteInverse) {
-    std::mt19937 random(7);
-    for (int i = 0; i < 3000; ++i) {
-        mat4d matrix = randomMatrix(random);
-        for (std::size_t c = 0; c < 4; ++c) {
-            if (i % 3 == 0)
-                matrix(1, c) = 2.0 * matrix(0, c);
-            if (i % 3 <= 1)
-                matrix(2, c) = 0.0;
-            if (i % 5 == 0)
-                matrix(0, c) = matrix(3, c) = 0.0;
-        }
-        mat4d elimination = matrix;
-        elimination.gaussJordanInverse();
-        matrix.inverse();
-        for (std::size_t k = 0; k < 16; ++k)
-            EXPECT_TRUE(std::isfinite(matrix.m[k]) && std::isfinite(elimination.m[k]));
+        EXPECT_TRUE(areNear(inverse, row.inverse, 1e-12)) << row.what << ": " << inverse;
+        EXPECT_TRUE(areNear(elimination, row.inverse, 1e-12)) << row.what << ": " << elimination;
     }
 }
 

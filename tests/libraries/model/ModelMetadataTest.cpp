@@ -10,6 +10,7 @@
 
 using namespace neuralWarp;
 using testing::ElementsAre;
+using testing::ElementsAreArray;
 using testing::IsEmpty;
 
 namespace {
@@ -25,17 +26,19 @@ ModelMetadata read(const std::string& text) {
     return record;
 }
 
+std::vector<std::uint64_t> countsOf(const ModelMetadata& record) {
+    return {record.deltaCount, record.deltaMode, record.smoothingIterations, record.affectCount, record.fullCount};
+}
+
+constexpr std::uint64_t defaultCounts[] = {0, 1, 0, 0, 0};
+
 } // namespace
 
 TEST(ModelMetadata, ReadsEveryKey) {
     const ModelMetadata record = read(R"({"geometry": "hand", "affectMap": [4, 0, 4294967295], "deltaCount": 1,
         "deltaMode": 0, "smoothingIterations": 3, "affectCount": 4, "fullCount": 4294967295, "unknown": {"deltaMode": 9},
         "subsetState": "partial", "componentTagExpression": "palm\u00e9\n"})");
-    EXPECT_EQ(record.deltaCount, 1u);
-    EXPECT_EQ(record.deltaMode, 0u);
-    EXPECT_EQ(record.smoothingIterations, 3u);
-    EXPECT_EQ(record.affectCount, 4u);
-    EXPECT_EQ(record.fullCount, 4294967295u);
+    EXPECT_THAT(countsOf(record), ElementsAre(1, 0, 3, 4, 4294967295));
     EXPECT_THAT(record.affectMap, ElementsAre(4u, 0u, 4294967295u));
     EXPECT_EQ(record.subsetState, SubsetState::Partial);
     EXPECT_EQ(record.componentTagExpression, "palm\u00e9\n");
@@ -44,22 +47,11 @@ TEST(ModelMetadata, ReadsEveryKey) {
 
 TEST(ModelMetadata, EmptyObjectReplacesEveryFieldByItsDefault) {
     const ModelMetadata record = read("{}");
-    EXPECT_EQ(record.deltaCount, 0u);
-    EXPECT_EQ(record.deltaMode, 1u);
-    EXPECT_EQ(record.smoothingIterations, 0u);
-    EXPECT_EQ(record.affectCount, 0u);
-    EXPECT_EQ(record.fullCount, 0u);
+    EXPECT_THAT(countsOf(record), ElementsAreArray(defaultCounts));
     EXPECT_THAT(record.affectMap, IsEmpty());
     EXPECT_EQ(record.subsetState, SubsetState::Unrecognized);
     EXPECT_EQ(record.componentTagExpression, "");
     EXPECT_EQ(record.geometry, "");
-}
-
-TEST(ModelMetadata, FreshRecordIsNotLoadedAndAllZero) {
-    const ModelMetadata record;
-    EXPECT_FALSE(record.loaded);
-    EXPECT_EQ(record.deltaMode, 0u);
-    EXPECT_EQ(record.subsetState, SubsetState::Unrecognized);
 }
 
 TEST(ModelMetadata, CountsThatAreNoUnsignedIntegersGiveTheDefault) {
@@ -69,12 +61,7 @@ TEST(ModelMetadata, CountsThatAreNoUnsignedIntegersGiveTheDefault) {
         for (const char* key : {"deltaCount", "deltaMode", "smoothingIterations", "affectCount", "fullCount"}) {
             text += '"' + std::string(key) + "\": " + value + ',';
         }
-        const ModelMetadata record = read(text + R"("geometry": ""})");
-        EXPECT_EQ(record.deltaCount, 0u) << value;
-        EXPECT_EQ(record.deltaMode, 1u) << value;
-        EXPECT_EQ(record.smoothingIterations, 0u) << value;
-        EXPECT_EQ(record.affectCount, 0u) << value;
-        EXPECT_EQ(record.fullCount, 0u) << value;
+        EXPECT_THAT(countsOf(read(text + R"("geometry": ""})")), ElementsAreArray(defaultCounts)) << value;
     }
     EXPECT_EQ(read(R"({"deltaMode": -0})").deltaMode, 0u); // zero with a sign is still an unsigned zero
 }

@@ -6,9 +6,7 @@
 
 #include <gmock/gmock.h>
 
-#include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
-#include "nw_model/PrincipalShapes.h"
 #include "support.h"
 #include "support/limitedNew.h"
 
@@ -47,36 +45,14 @@ TEST(NoMemory, RunGivesAnEmptyResult) {
     EXPECT_EQ(session.run(inputs).size(), count);
 }
 
-TEST(NoMemory, MetadataRecordIsUnchanged) {
+TEST(NoMemory, ReadersRefuseTheirFiles) {
     const TestFolder folder;
-    const auto path = folder.write("metadata.json", R"({"fullCount": 1, "affectMap": )" + numbers() + "}");
-    ModelMetadata record;
-    StdoutCapture out;
+    const auto path =
+        folder.write("file.json", R"({"principalShapeCount": 1, "principalVertCount": 1000, "principalShapes": [)" +
+                                      numbers() + R"(], "affectMap": )" + numbers() + "}");
     {
         const NoLargeArrays limit;
-        EXPECT_FALSE(readMetadataFile(record, path));
+        expectRefused(path, "Error: " + path.string() + ": out of memory\n");
     }
-    EXPECT_EQ(out.take(), "Error: " + path.string() + ": out of memory\n");
-    EXPECT_FALSE(record.loaded);
-    EXPECT_EQ(record.fullCount, 0u);
-    EXPECT_TRUE(readMetadataFile(record, path));
-}
-
-TEST(NoMemory, PrincipalShapesAreEmpty) {
-    const TestFolder folder;
-    const auto path = folder.write("principal_shapes.json",
-                                   R"({"principalShapeCount": 1, "principalVertCount": 1000, "principalShapes": [)" +
-                                       numbers() + "]}");
-    std::vector<float> values = {1};
-    std::uint64_t shapeCount = 9;
-    std::uint64_t vertCount = 9;
-    StdoutCapture out;
-    {
-        const NoLargeArrays limit;
-        EXPECT_FALSE(readPrincipalShapesFile(path, values, shapeCount, vertCount));
-    }
-    EXPECT_EQ(out.take(), "Error: " + path.string() + ": out of memory\n");
-    EXPECT_THAT(values, IsEmpty());
-    EXPECT_EQ(shapeCount + vertCount, 0u);
-    EXPECT_TRUE(readPrincipalShapesFile(path, values, shapeCount, vertCount));
+    expectAccepted(path);
 }

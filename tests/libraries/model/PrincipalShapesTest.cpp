@@ -90,7 +90,6 @@ TEST(PrincipalShapes, RefusedShapesLeaveNoShapesButTheVertexCount) {
     const std::string noFloat = " has no number that a float can hold at place ";
     const std::vector<std::pair<std::string, std::string>> cases = {
         {withShapes("[[1, 2, 3], [4, 5, 6], [7, 8, 9]]", 2), countMismatch},
-        {withShapes("null", 2), countMismatch},
         {withShapes("{}"), countMismatch},
         {R"({"principalShapeCount": 4294967295, "principalVertCount": 1})", countMismatch},
         {withShapes("[[1, 2], 3]"), countMismatch}, // the number of shapes is checked before the shapes
@@ -102,7 +101,6 @@ TEST(PrincipalShapes, RefusedShapesLeaveNoShapesButTheVertexCount) {
         {withShapes("[[1, 2, 3, \"4\"]]"), shape("0" + noFloat + "3")},
         {withShapes("[[[1, 2, 3]]]"), shape("0 has 1 numbers, and 3 are needed")},
         {withShapes("[7]"), shape("0 is no array")},
-        {withShapes("[\"123\"]"), shape("0 is no array")},
         {withShapes("[{\"0\": 1}]"), shape("0 is no array")},
         {withShapes("[[1e39, 2, 3]]"), shape("0" + noFloat + "0")},
         {withShapes("[[1, 2, -3.4028235677973367e38]]"), shape("0" + noFloat + "2")}, // rounds to minus infinity

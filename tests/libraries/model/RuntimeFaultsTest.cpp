@@ -189,13 +189,3 @@ TEST(RuntimeFaults, NamesAndShapesAreReadOncePerLoad) {
     session.inputCount();
     EXPECT_EQ(reads(), before + 4);
 }
-
-TEST(RuntimeFaults, LoadOfAnEqualPathTouchesNoRuntime) {
-    ModelSession session;
-    session.load(testModel("direct"), true);
-    const int sessions = Hook<&OrtApi::CreateSession>::calls;
-    session.load(testModel("direct"), false);
-    EXPECT_EQ(Hook<&OrtApi::CreateSession>::calls, sessions);
-    session.load(testModel("direct"), true);
-    EXPECT_EQ(Hook<&OrtApi::CreateSession>::calls, sessions + 1);
-}
