@@ -4,20 +4,15 @@
 
 #include "controls/guardedCompute.h"
 #include "openquarn/HFnDependencyNode.h"
-#include "openquarn_app/Profiling.h"
-#include "support/TemporaryFolder.h"
+#include "plugin/traceEvents.h"
 #include "support/pageExamples.h"
 
-#include <rapidjson/document.h>
-#include <rapidjson/istreamwrapper.h>
-
-#include <fstream>
+#include <algorithm>
 #include <functional>
 #include <stdexcept>
 
 namespace {
 
-using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
 
@@ -39,28 +34,17 @@ TEST_F(ControlNodes, NothingIsThrownAtTheHost) {
 }
 
 TEST_F(ControlNodes, EveryComputeShowsInTheProfile) {
-    run("createNode controlCollector -name c; createNode matrixConverter -name m;"
-        "createNode orthoAxisFromMatrixArray -name o");
-    OpenQuarn::Profiling::start();
-    for (const char* output : {"c.output", "m.flatOutput", "o.outputList"})
-        EXPECT_FALSE(OpenQuarn::evaluate(testNodes::plug(output)).error());
-    OpenQuarn::Profiling::stop();
-
-    const TemporaryFolder folder;
-    OpenQuarn::Profiling::writeTrace(folder.path() / "trace.json");
-    std::ifstream file(folder.path() / "trace.json");
-    rapidjson::IStreamWrapper stream(file);
-    rapidjson::Document trace;
-    trace.ParseStream(stream);
-    std::vector<std::string> shown;
-    for (const auto& event : trace["traceEvents"].GetArray())
-        if (event["ph"] == "X" && std::string(event["name"].GetString()).ends_with("::compute"))
-            shown.push_back(std::string(event["cat"].GetString()) + ' ' + event["name"].GetString() + ' ' +
-                            event["args"]["description"].GetString() + ' ' +
-                            std::to_string(event["args"]["color"].GetInt()));
-    EXPECT_THAT(shown, ElementsAre("Evaluation controlCollectorNode::compute c 10",
-                                   "Evaluation matrixConverterNode::compute m 10",
-                                   "Evaluation orthoAxisFromMatrixArray::compute o 10"));
+    const struct {
+        const char *type, *output, *label;
+    } rows[] = {{"controlCollector", "n.output", "Evaluation controlCollectorNode::compute 10"},
+                {"matrixConverter", "n.flatOutput", "Evaluation matrixConverterNode::compute 10"},
+                {"orthoAxisFromMatrixArray", "n.outputList", "Evaluation orthoAxisFromMatrixArray::compute 10"}};
+    for (const auto& row : rows) {
+        run(std::string("file -new; createNode ") + row.type + " -name n");
+        const std::vector<TraceEvent> events =
+            recordedEvents("n", [&] { EXPECT_FALSE(OpenQuarn::evaluate(testNodes::plug(row.output)).error()); });
+        EXPECT_TRUE(std::ranges::any_of(events, [&](const TraceEvent& e) { return e.label == row.label; })) << row.type;
+    }
 }
 
 TEST_F(ControlNodes, MatricesBecomeControlValues) {
