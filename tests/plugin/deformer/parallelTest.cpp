@@ -78,7 +78,9 @@ protected:
         spec.smoothingIterations = smoothing;
         for (std::size_t s = 0; s < shapes; ++s)
             spec.shapes.push_back(dice.floats(std::size_t{3} * vertices, 0.1));
-        dice.fillNetwork(spec, shapes ? shapes : std::size_t{3} * vertices);
+        spec.controls = 3;
+        spec.bias = dice.floats(shapes ? shapes : std::size_t{3} * vertices, 0.3);
+        spec.weights = dice.floats(spec.controls * spec.bias.size(), 1.0);
         writeModel(modelDirectory(name), spec);
     }
 

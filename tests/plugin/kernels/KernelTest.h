@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "plugin/Dice.h"
 #include "plugin/kernels/OpenCl.h"
 
 #include "quill/val3.h"
@@ -9,7 +10,6 @@
 
 #include <cstring>
 #include <memory>
-#include <random>
 #include <string>
 #include <vector>
 
@@ -102,43 +102,14 @@ inline float roundingLimit() {
     return KernelTest::device()->isExact() ? 0.0F : 2e-5F;
 }
 
-// Numbers of a test run: the same in every one.
-class Numbers {
-public:
-    explicit Numbers(std::uint32_t seed)
-        : engine_(seed) {}
-    std::uint32_t below(std::size_t end) { return static_cast<std::uint32_t>(engine_() % end); }
-    std::uint64_t bits() {
-        const std::uint64_t high = engine_();
-        return high << 32U | engine_();
+inline Points randomPoints(Dice& dice, std::size_t count) {
+    Points points(count);
+    for (auto& p : points) {
+        const std::vector<float> xyz = dice.floats(3, 2.0);
+        p = {xyz[0], xyz[1], xyz[2]};
     }
-    float coordinate() { return static_cast<float>(engine_()) * 0x1p-30F - 2.0F; } // -2 .. 2
-    std::vector<float> floats(std::size_t count) {
-        std::vector<float> values(count);
-        for (float& value : values)
-            value = coordinate();
-        return values;
-    }
-    Points points(std::size_t count) {
-        Points points(count);
-        for (auto& p : points)
-            p = {coordinate(), coordinate(), coordinate()};
-        return points;
-    }
-    // n different indices below end >= n, in any order.
-    Indices choice(std::size_t n, std::size_t end) {
-        Indices all(end);
-        for (std::size_t i = 0; i < end; ++i)
-            all[i] = static_cast<std::uint32_t>(i);
-        for (std::size_t i = 0; i < n; ++i)
-            std::swap(all[i], all[i + below(end - i)]);
-        all.resize(n);
-        return all;
-    }
-
-private:
-    std::mt19937 engine_;
-};
+    return points;
+}
 
 // Around the sizes of work groups.
 inline const std::vector<std::size_t> oddSizes{1, 63, 64, 65, 1000};

@@ -12,11 +12,11 @@ using DeformerKernels = KernelTest;
 
 TEST_F(DeformerKernels, PrincipalShapesGiveTheBitsOfTheProcessor) {
     const kernels::Program program(*device(), "neuralWarpGPUNode.cl", true);
-    Numbers numbers(4);
+    Dice dice(4);
     for (const std::size_t slots : oddSizes)
         for (const std::size_t shapes : {1U, 51U}) {
-            const auto basis = numbers.floats(3 * slots * shapes);
-            const auto coefficients = numbers.floats(shapes);
+            const auto basis = dice.floats(3 * slots * shapes, 2.0);
+            const auto coefficients = dice.floats(shapes, 2.0);
             Points expected;
             neuralWarp::extractPrincipalDeltas(expected, coefficients, shapes, basis,
                                                neuralWarp::DrivenVertices(slots));
@@ -30,13 +30,14 @@ TEST_F(DeformerKernels, PrincipalShapesGiveTheBitsOfTheProcessor) {
 // offsets of a shuffled part of the geometry; of the slots some are missing and some are beyond the deltas
 TEST_F(DeformerKernels, ApplyMovesWhatHasASlotAndWritesNothingElse) {
     const kernels::Program program(*device(), "neuralWarpGPUNode.cl", true);
-    Numbers numbers(5);
+    Dice dice(5);
     for (const std::size_t n : oddSizes) {
-        const Points input = numbers.points(n + 9), target = numbers.points(n + 9), current = numbers.points(n);
-        const Points deltas = numbers.points(n - n / 5), before = numbers.points(n + 9);
-        const auto weights = numbers.floats(n);
-        const Indices map = numbers.choice(n, n + 9);
-        Indices slots = numbers.choice(n, n);
+        const Points input = randomPoints(dice, n + 9), target = randomPoints(dice, n + 9),
+                     current = randomPoints(dice, n);
+        const Points deltas = randomPoints(dice, n - n / 5), before = randomPoints(dice, n + 9);
+        const auto weights = dice.floats(n, 2.0);
+        const Indices map = dice.chosen(n, n + 9);
+        Indices slots = dice.chosen(n, n);
         for (std::size_t i = 0; i < n; i += 3)
             slots[i] = quill::missingIndex;
         Points expected = before;

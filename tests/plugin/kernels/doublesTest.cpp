@@ -4,6 +4,7 @@
 #include <bit>
 #include <cmath>
 #include <limits>
+#include <random>
 
 namespace {
 
@@ -32,10 +33,11 @@ std::vector<double> doublesToNarrow() {
     for (const double base : {1.0, 1.5, 0x1.fffffep0, 0x1p-126, 0x1p-140, 0x1p127})
         for (const double tie : {base + base * 0x1p-24, base + base * 0x3p-24, base + 0x1p-150, base + 0x3p-150})
             values.push_back(tie);
-    Numbers numbers(3);
+    std::mt19937_64 bits(3);
+    Dice dice(3);
     for (int k = 0; k < 20000; ++k) {
-        values.push_back(std::bit_cast<double>(numbers.bits())); // of any size, mostly far beyond floats
-        values.push_back(std::ldexp(numbers.coordinate() + 0x1p-26, static_cast<int>(numbers.below(320)) - 170));
+        values.push_back(std::bit_cast<double>(std::uint64_t{bits()})); // of any size, mostly far beyond floats
+        values.push_back(std::ldexp(dice.real(2.0) + 0x1p-26, static_cast<int>(dice.below(320)) - 170));
     }
     for (std::size_t k = values.size(); k-- > 0;)
         for (const double neighbour : {std::nextafter(values[k], -1e308), std::nextafter(values[k], 1e308)})

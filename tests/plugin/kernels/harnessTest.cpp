@@ -21,26 +21,11 @@ TEST_F(Harness, SeesWritesBesideTheOutputAndIntoInputs) {
     }
 }
 
-TEST_F(Harness, EverySourceCompilesWithoutAWordAndHasItsKernels) {
-    struct Source {
-        const char* file;
-        bool withIncludes;
-        std::vector<std::pair<const char*, cl_uint>> kernels; // and their numbers of arguments
-    };
-    const Source sources[] = {
-        {"quillBuffers.cl", false, {{"copyToAffectBuffer", 4}}},
-        {"quillUtils.cl", true, {{"averageVertKernel", 8}}},
-        {"neuralWarpGPUNode.cl", true, {{"gpu_principal_shapes_kernel", 5}, {"gpu_apply_deltas_kernel", 16}}}};
-    for (const Source& source : sources)
+TEST_F(Harness, EverySourceCompilesWithoutAWord) {
+    for (const std::string file : {"quillBuffers.cl", "quillUtils.cl", "neuralWarpGPUNode.cl"})
         for (const char* options : {"", "-D NW_WITHOUT_DOUBLES", "-cl-std=CL1.2"}) {
-            const kernels::Program program(*device(), source.file, source.withIncludes, options);
-            EXPECT_EQ(program.log(), "") << source.file << " with " << options;
-            for (const auto& [name, count] : source.kernels) {
-                cl_uint found = 0;
-                const auto kernel = program.kernel(name);
-                kernels::check(clGetKernelInfo(kernel.get(), CL_KERNEL_NUM_ARGS, sizeof found, &found, nullptr), name);
-                EXPECT_EQ(found, count) << name;
-            }
+            const kernels::Program program(*device(), file, file != "quillBuffers.cl", options);
+            EXPECT_EQ(program.log(), "") << file << " with " << options;
         }
 }
 

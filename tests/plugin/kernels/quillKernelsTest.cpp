@@ -11,10 +11,10 @@ using QuillKernels = KernelTest;
 
 TEST_F(QuillKernels, GatheringTakesTheMappedPointsOrAll) {
     const kernels::Program program(*device(), "quillBuffers.cl", false);
-    Numbers numbers(1);
+    Dice dice(1);
     for (const std::size_t n : oddSizes) {
-        const Points points = numbers.points(n + 7);
-        const Indices subset = numbers.choice(n, points.size());
+        const Points points = randomPoints(dice, n + 7);
+        const Indices subset = dice.chosen(n, points.size());
         for (const Indices* map : {static_cast<const Indices*>(nullptr), &subset}) {
             Points expected(n);
             for (std::size_t i = 0; i < n; ++i)
@@ -54,10 +54,10 @@ Points smoothOnDevice(const kernels::Program& program, const quill::VertexConnec
 
 TEST_F(QuillKernels, SmoothingGivesTheBitsOfTheProcessor) {
     const kernels::Program program(*device(), "quillUtils.cl", true);
-    Numbers numbers(2);
+    Dice dice(2);
     auto meshes = meshZoo();
     for (const std::size_t n : oddSizes)
-        meshes.push_back({"strip of " + std::to_string(n), strip(n), numbers.points(n)});
+        meshes.push_back({"strip of " + std::to_string(n), strip(n), randomPoints(dice, n)});
     for (const ZooMesh& mesh : meshes)
         for (const auto& [mapName, map] : indexMaps(mesh.vertexCount())) {
             const Points points = affectedPoints(mesh.points, map);
