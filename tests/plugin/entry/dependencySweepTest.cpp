@@ -126,34 +126,6 @@ TEST_F(DependencySweepTest, OnlyWhatIsNamedHasTheGeometryEvaluatedAgain) {
     EXPECT_GT(changes, 2U * 32U);
 }
 
-TEST_F(DependencySweepTest, OutputsCannotBeSet) {
-    makeScene();
-    for (const auto& [name, info] : attributes)
-        if (!info.writable) {
-            EXPECT_TRUE(plug(path("warp", name)).setHObject(HObject()).error()) << name;
-        }
-}
-
-// the two compounds that serve training follow the geometry, with all that is in them
-TEST_F(DependencySweepTest, GeometryThatComesInAsksForExportAndTrainingAgain) {
-    const struct {
-        const char* changed;
-        bool isDirty;
-    } rows[] = {{"inputGeometry", true}, {"envelope", false},         {"controlValues", false}, {"modelName", false},
-                {"modelRoot", false},    {"originalGeometry", false}, {"deltaMode", false},     {"epochs", false}};
-    for (const auto& row : rows) {
-        SCOPED_TRACE(row.changed);
-        makeScene();
-        EXPECT_EQ(text(plug("warp.export[0].smoothingIterations").setInt(7)), "");
-        EXPECT_EQ(text(OpenQuarn::evaluate(plug("warp.export"))), "");
-        const OpenQuarn::DirtyWatch dirty;
-        EXPECT_EQ(change(row.changed, false), "");
-        for (const char* name : {"warp.export", "warp.train"})
-            EXPECT_EQ(has(dirty, name), row.isDirty) << name;
-        EXPECT_EQ(plug("warp.export[0].smoothingIterations").asInt(), 7) << "what was set stays";
-    }
-}
-
 TEST_F(DependencySweepTest, AtItsDefaultsTheDeformerLeavesTheGeometryAsItIs) {
     makeScene();
     create("neuralWarp", "bare"); // without a rest shape, and nothing is set: that fails, and changes nothing either

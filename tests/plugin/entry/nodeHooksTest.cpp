@@ -1,8 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 // What the deformer does when the host asks it about folders: at its making, for archives, for moved files.
-#include "openquarn/HExternalContentInfoTable.h"
-#include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HPxNode.h"
 #include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Workspace.h"
 #include "plugin/entry/PluginTest.h"
@@ -30,14 +27,6 @@ protected:
         ASSERT_TRUE(OpenQuarn::sceneToText(scene));
         session.newScene();
         ASSERT_TRUE(OpenQuarn::sceneFromText(scene, "scene"));
-    }
-
-    static std::vector<std::string> filesOf(const char* node, bool shortName, bool unresolved, bool sequence) {
-        const HPxNode* user = HFnDependencyNode(plug(std::string(node) + ".message").node()).userNode();
-        std::vector<std::string> files;
-        for (const HString& file : user->getFilesToArchive(shortName, unresolved, sequence))
-            files.push_back(file.asStdString());
-        return files;
     }
 };
 
@@ -72,7 +61,7 @@ TEST_F(NodeHooksTest, ANodeThatIsReadFromAFileKeepsWhatIsStored) {
     const struct {
         const char* models;
         const char* training;
-    } rows[] = {{"here/models", "here/data"}, {"here/models", ""}, {"", "here/data"}, {"", ""}};
+    } rows[] = {{"here/models", ""}, {"", "here/data"}};
     for (const auto& row : rows) {
         SCOPED_TRACE(std::string(row.models) + " " + row.training);
         session.newScene();
@@ -93,30 +82,18 @@ TEST_F(NodeHooksTest, TheArchiveGetsTheModelRootAlone) {
     Workspace::setRootDirectory(root);
     create("neuralWarp", "warp");
     set("warp.trainingDataRoot", "training"); // a file name as well
-    const struct {
-        const char* modelRoot;
-        std::string resolved;
-    } rows[] = {{"", ""}, {"rel/models", root + "/rel/models"}, {"/abs/models", "/abs/models"}};
-    for (const auto& row : rows)
-        for (const bool shortName : {false, true})
-            for (const bool sequence : {false, true}) {
-                SCOPED_TRACE(std::string(row.modelRoot) + (shortName ? " short" : "") + (sequence ? " sequence" : ""));
-                set("warp.modelRoot", row.modelRoot);
-                const std::vector<std::string> resolved = filesOf("warp", shortName, false, sequence);
-                const std::vector<std::string> unresolved = filesOf("warp", shortName, true, sequence);
-                if (row.resolved.empty()) {
-                    EXPECT_THAT(resolved, IsEmpty());
-                    EXPECT_THAT(unresolved, IsEmpty());
-                } else {
-                    EXPECT_THAT(resolved, ElementsAre(row.resolved));
-                    EXPECT_THAT(unresolved, ElementsAre(row.modelRoot));
-                }
-                EXPECT_EQ(OpenQuarn::filesToArchive(false), resolved);
-                EXPECT_EQ(OpenQuarn::filesToArchive(true), unresolved);
-            }
+    for (const auto& [modelRoot, resolved] :
+         {std::pair("rel/models", root + "/rel/models"), {"/abs/models", "/abs/models"}}) {
+        set("warp.modelRoot", modelRoot);
+        EXPECT_THAT(OpenQuarn::filesToArchive(false), ElementsAre(resolved));
+        EXPECT_THAT(OpenQuarn::filesToArchive(true), ElementsAre(modelRoot));
+    }
     Faults::fail("HPlug::asString");
-    EXPECT_THAT(filesOf("warp", false, false, false), IsEmpty());
+    EXPECT_THAT(OpenQuarn::filesToArchive(false), IsEmpty());
     EXPECT_TRUE(Faults::fired("HPlug::asString"));
+    set("warp.modelRoot", "");
+    EXPECT_THAT(OpenQuarn::filesToArchive(false), IsEmpty());
+    EXPECT_THAT(OpenQuarn::filesToArchive(true), IsEmpty());
 }
 
 TEST_F(NodeHooksTest, TheModelRootIsExternalContentThatCanBeMoved) {
@@ -141,18 +118,6 @@ TEST_F(NodeHooksTest, TheModelRootIsExternalContentThatCanBeMoved) {
     EXPECT_TRUE(OpenQuarn::relocate({{"warp", "trainingDataRoot", "/elsewhere"}}));
     EXPECT_EQ(value("warp.trainingDataRoot"), training) << "it is none of the node's external content";
     EXPECT_THAT(takeMessages(), ElementsAre(::testing::HasSubstr("trainingDataRoot")));
-}
-
-TEST_F(NodeHooksTest, WhatTheHostCannotTellOfExternalContentIsLeftOut) {
-    create("neuralWarp", "warp");
-    set("warp.modelRoot", "here");
-    Faults::fail("HPxNode::addExternalContentForFileAttr");
-    EXPECT_THAT(OpenQuarn::externalContent(), IsEmpty());
-    EXPECT_TRUE(Faults::fired("HPxNode::addExternalContentForFileAttr"));
-    Faults::fail("HPxNode::setExternalContentForFileAttr");
-    OpenQuarn::relocate({{"warp", "modelRoot", "/elsewhere"}});
-    EXPECT_TRUE(Faults::fired("HPxNode::setExternalContentForFileAttr"));
-    EXPECT_EQ(value("warp.modelRoot"), "here");
 }
 
 } // namespace

@@ -68,35 +68,16 @@ TEST_F(Unloading, GoesCompletelyAndComesBackFiftyTimes) {
         ASSERT_TRUE(isMapped());
         ASSERT_NO_FATAL_FAILURE(deform(0.125 * round));
         session.newScene();
+        EXPECT_EQ(shown, "");
+        if (round <= 4) { // each time another step fails first; it can be tried again
+            OpenQuarn::Faults::fail("HFnPlugin::deregisterNode", round);
+            EXPECT_THROW(OpenQuarn::unloadPlugin("neuralWarp"), std::runtime_error);
+            EXPECT_EQ(std::exchange(shown, "").substr(0, 10), "deregister") << "its own line about the step";
+        }
         OpenQuarn::unloadPlugin("neuralWarp");
         ASSERT_FALSE(isMapped());
     }
     EXPECT_EQ(shown, "");
-    OpenQuarn::setMessageSink(previous);
-}
-
-TEST_F(Unloading, CanBeTriedAgainAfterEachStepThatFailed) {
-    const std::pair<const char*, int> steps[] = {
-        {"HFnPlugin::deregisterNode", 1},    {"HFnPlugin::deregisterNode", 2},
-        {"HFnPlugin::deregisterNode", 3},    {"HGPUDeformerRegistry::deregisterGPUDeformerCreator", 1},
-        {"HFnPlugin::deregisterNode", 4},    {"HFnPlugin::deregisterData", 1},
-        {"HFnPlugin::deregisterCommand", 1},
-    };
-    std::string shown;
-    const auto previous = OpenQuarn::setMessageSink([&](const OpenQuarn::Message& m) { shown += m.text + '\n'; });
-    OpenQuarn::Session session;
-    for (const auto& [operation, call] : steps) {
-        SCOPED_TRACE(operation + std::to_string(call));
-        OpenQuarn::loadPlugin(NW_PLUGIN);
-        OpenQuarn::Faults::fail(operation, call);
-        EXPECT_THROW(OpenQuarn::unloadPlugin("neuralWarp"), std::runtime_error);
-        EXPECT_EQ(std::exchange(shown, "").substr(0, 10), "deregister") << "its own line about the step";
-        OpenQuarn::unloadPlugin("neuralWarp");
-        EXPECT_EQ(shown, "");
-        EXPECT_FALSE(isMapped());
-    }
-    OpenQuarn::loadPlugin(NW_PLUGIN);
-    deform(0.5);
     OpenQuarn::setMessageSink(previous);
 }
 
