@@ -173,18 +173,14 @@ TEST_F(Command, AnswersByItsFlags) {
          {},
          {}},
         {"-dui -mi 2 warp1", success, "{}", {}, {}}, // nothing is known of it yet: left out in silence
-        {"-dui -mi 2147483647 warp1", failure, "", {}, {noData(2147483647)}},
         {"-dui -mi 2147483648 warp1", failure, "", {}, {noData(2147483648)}},
         {"-rm -mi 4 -mi 4294967295 warp1", failure, "", {}, {noData(4294967295)}},
         {"-mi 0 -mi 7 -mi 9 -dumpInfo -rm -exp on -vd POS warp1", failure, "", {}, {noData(7)}},
-        {"-mi 7 warp1", failure, "", {}, {noData(7)}},
 
         {"-reloadModel warp1", success, "", {}, {noData(2)}, "pml- none pml-"},
         {"-rm -mi 4 warp1", success, "", {}, {}, "---- none pml-"},
         {"-rm -mi 2 -mi 0 warp1", success, "", {}, {noData(2)}, "pml- none ----"},
         {"-rm -mi 0 -mi 2 warp1", failure, "", {}, {noData(2)}, "pml- none ----"},
-        {"-rm -mi 2 -mi 0 -mi 2 warp1", failure, "", {}, {noData(2), noData(2)}, "pml- none ----"},
-        {"-rm -vertexDeltas pos -mi 0 warp1", success, "", {}, {}, "pml- none ----"},
         {"-rm -vertexDeltas POS -mi 0 warp1", success, "", {}, {}, "pml- none ----"}, // not even looked at
         {"-rm -dumpInfo -mi 0 warp1", success, "{" + described(0) + "}", {}, {}, "pml- none ----"},
 
@@ -196,15 +192,12 @@ TEST_F(Command, AnswersByItsFlags) {
 
         {"-vertexDeltas dbp -mi 0 warp1", success, "", offsets(0), {}},
         {"-vd dbp -mi 4 -mi 0 warp1", success, "", joined(offsets(4), offsets(0)), {}},
-        {"-vd dbp -mi 4 -mi 4 warp1", success, "", joined(offsets(4), offsets(4)), {}},
         {"-vd dbp warp1", success, "", joined(offsets(0), offsets(4)), {noData(2)}},
         {"-vd dbp -mi 2 -mi 4 warp1", success, "", offsets(4), {noData(2)}},
         {"-vd dbp -mi 4 -mi 2 warp1", invalid, "", {}, {noData(2)}},
         {"-vd dbp -dumpInfo -mi 4 warp1", success, "", offsets(4), {}}, // the array takes the place of the text
         {"-vd dbp -exp on -mi 4 warp1", success, "", offsets(4), {}, "---- none ---x"},
         {"-vd DBS warp1", failure, "", {}, {badCode("DBS")}},
-        {"-vd dbss warp1", failure, "", {}, {badCode("dbss")}},
-        {"-vd \"\" warp1", failure, "", {}, {badCode("")}},
         {"-vd 'a \"b' -exp on -mi 0 warp1", failure, "", {}, {badCode("a \"b")}, "---x none ----"},
     });
 }
@@ -213,18 +206,11 @@ TEST_F(Command, IsRefusedByItsSyntax) {
     const std::vector<std::pair<std::string, std::string>> rows = {
         {"", "argument 1"},
         {"warp1 warp2", "warp2"},
-        {"-dumpInfo", "argument 1"},
-        {"-nothing warp1", "-nothing"},
         {"-query warp1", "-query"},
         {"-edit -rm warp1", "-edit"},
-        {"-mi warp1", "multiIndex"},
         {"-mi -1 warp1", "-1"},
-        {"-mi 0.5 warp1", "0.5"},
-        {"-mi 4294967296 warp1", "4294967296"},
         {"-exp maybe warp1", "maybe"},
         {"-exp on -exp off warp1", "exportActive"},
-        {"warp1 -vd", "vertexDeltas"},
-        {"-rm -rm warp1", "reloadModel"},
     };
     for (const auto& [arguments, wanted] : rows) {
         const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand("neuralWarp " + arguments);
@@ -242,9 +228,7 @@ TEST_F(Command, NamesWhatIsNoDeformer) {
         {"-dumpInfo -rm nothing", failure, "", {}, {notANode("nothing")}},
         {"-dumpInfo -mi 7 time1", failure, "", {}, {notANode("time1")}},
         {"-vd POS sum1", failure, "", {}, {notANode("sum1")}},
-        {"shape0", failure, "", {}, {notANode("shape0")}},
         {"'two words'", failure, "", {}, {notANode("two words")}},
-        {"''", failure, "", {}, {notANode("")}},
     });
 }
 
@@ -273,32 +257,6 @@ TEST_F(Command, ActsOnHostCallsThatFail) {
         {"-exp on -rm -mi 0 warp1", success, "", {}, {}, "pml- none ----", "HArgParser::getFlagArgument"},
         {"-vd dbp -mi 0 warp1", failure, "", {}, {}, untouched, "HArgParser::getFlagArgument"},
     });
-}
-
-TEST_F(Command, EachCodeSelectsItsDeltas) {
-    // the input lies beside the rest geometry, not turned, so that frames carry the target back by the same way
-    const HVector away(0, 0, 3);
-    rig.setInput(0, warpRig::withPoints(triangle, moved(triangle, away)));
-    ASSERT_EQ(rig.deform(0), HStatus::kSuccess);
-    const auto deltas = [](const std::string& code) { return run("neuralWarp -mi 0 -vd " + code + " warp1").numbers; };
-    const HPointArray rest = warpRig::pointsOf(triangle);
-    const HVector offset = targetOffset(0);
-    const Numbers dbs = deltas("dbs"), pos = deltas("pos"), dos = deltas("dos"), dbp = deltas("dbp"),
-                  dop = deltas("dop");
-    for (const Numbers* numbers : {&dbs, &pos, &dos, &dbp, &dop})
-        ASSERT_EQ(numbers->size(), 9U);
-    for (unsigned vertex = 0; vertex < 3; ++vertex)
-        for (unsigned axis = 0; axis < 3; ++axis) {
-            const unsigned i = 3 * vertex + axis;
-            EXPECT_NEAR(dbp[i], offset[axis] - away[axis], 1e-6);
-            EXPECT_NEAR(dop[i], offset[axis], 1e-6);
-            EXPECT_NEAR(dos[i], offset[axis] - away[axis], 1e-5);
-            EXPECT_NEAR(pos[i], rest[vertex][axis] + offset[axis] - away[axis], 1e-5);
-        }
-    // a frame has the vertex as its origin and three unit axes at right angles, so that lengths stay
-    for (unsigned i = 0; i < 9; i += 3)
-        EXPECT_NEAR(HVector(dbs[i], dbs[i + 1], dbs[i + 2]).length(), (offset - away).length(), 1e-5);
-    EXPECT_NE(dbs, dbp);
 }
 
 TEST_F(Command, DeltasThatCannotBeMeasuredNameTheirGeometry) {
@@ -335,8 +293,6 @@ TEST_F(Command, DeltasAreNotReadBeyondWhatThereIs) {
         std::function<void(State&)> spoil;
         const char* text;
     } rows[] = {{"dbp", fourVertices, "the input geometry has 0 points for 4 points of the target"},
-                {"dbs", fourVertices, "the input geometry has 0 points for 4 points of the target"},
-                {"dop", fourVertices, "the rest geometry has 0 points for 4 points of the target"},
                 {"pos", fourVertices, "the rest geometry has 0 points for 4 points of the target"},
                 {"dbs", smallRest, "the rest geometry has 0 points for 3 points of the target"}};
     for (const auto& row : rows) {

@@ -52,14 +52,6 @@ TEST_F(FourControls, AnEnvelopeOfZeroTouchesNothing) {
     EXPECT_TRUE(rig.state(0)->modelPathDirty && rig.state(0)->indexMapDirty);
 }
 
-TEST_F(FourControls, AMorphBelowWhatCountsIsNotLookedFor) {
-    rig.setControls({1, 2, 3, 4});
-    rig.plug("targetMorphEnabled").setBool(true);
-    rig.plug("targetMorphEnvelope").setDouble(0.9e-6); // and there is no target
-    EXPECT_EQ(rig.deform(0), HStatus::kSuccess);
-    EXPECT_TRUE(rig.state(0)->modelApplied);
-}
-
 /// What makes evaluations leave the controls unread.
 struct UnreadControls {
     const char* name;
@@ -76,7 +68,8 @@ TEST_F(Evaluation, ControlsThatWereNotReadCountAtTheirNextChange) {
     for (const UnreadControls& row :
          {UnreadControls{"export mode", nullptr},
           UnreadControls{"a model of another mesh", [](ModelSpec& spec) { spec.fullCount = 5; }},
-          UnreadControls{"a model that drives nothing", [](ModelSpec& spec) { spec.subsetState = "empty"; }}}) {
+          UnreadControls{"a model that drives nothing", [](ModelSpec& spec) { spec.subsetState = "empty"; }},
+          UnreadControls{"a model of who knows what", [](ModelSpec& spec) { spec.subsetState = "others"; }}}) {
         SCOPED_TRACE(row.name);
         session.newScene();
         warpRig::Rig rig;

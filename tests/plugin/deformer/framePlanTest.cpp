@@ -29,12 +29,4 @@ TEST(FramePlan, OfWhatIsOnAndHowFarTheMorphGoes) {
             << row.isActive << row.isMorphed << ' ' << row.morphWeight;
 }
 
-TEST(FramePlan, AModelIsAppliedWhenItWasAttemptedAndCanBe) {
-    for (const Attempt attempt : {Attempt::nothing, Attempt::withoutModel, Attempt::withModel})
-        for (const bool canApply : {false, true})
-            for (const bool drivesNothing : {false, true})
-                EXPECT_EQ(neuralWarp::isModelApplied(attempt, canApply, drivesNothing),
-                          attempt == Attempt::withModel && canApply && !drivesNothing);
-}
-
 } // namespace

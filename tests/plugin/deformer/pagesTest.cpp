@@ -6,6 +6,7 @@
 #include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Workspace.h"
 #include "plugin/deformer/support/WarpTest.h"
+#include "support/pageExamples.h"
 
 #include <fstream>
 #include <sstream>
@@ -68,55 +69,33 @@ public:
 
 protected:
     /// One line of an example. Behind it may stand "# gives RESULT", "# gives N numbers", "# shows MESSAGE", or, for a
-    /// command that fails, "# fails MESSAGE"; all else succeeds, and shows nothing. True when it promised something.
-    bool runLine(const std::string& line) {
+    /// command that fails, "# fails MESSAGE"; all else succeeds, and shows nothing. The result, as far as it is told.
+    OpenQuarn::CommandValue runLine(const std::string& line) {
         const auto hash = line.find(" # ");
         const std::string note = hash == std::string::npos ? "" : line.substr(hash + 3);
-        const auto promised = [&](const std::string& word) { return note.starts_with(word + ' '); };
-        const std::string promise = note.substr(std::min(note.size(), note.find(' ') + 1));
+        const bool fails = note.starts_with("fails ");
         const OpenQuarn::CommandOutcome outcome = OpenQuarn::runCommand(line);
-        EXPECT_EQ(outcome.ok, !promised("fails")) << line << '\n' << outcome.error;
-        if (promised("gives")) {
-            EXPECT_EQ(described(outcome.result, promise), promise) << line;
-        }
+        EXPECT_EQ(outcome.ok, !fails) << line << '\n' << outcome.error;
         std::vector<std::string> messages = takeMessages();
-        if (promised("shows") || promised("fails")) {
-            EXPECT_FALSE(messages.empty()) << line;
-            EXPECT_EQ(messages.empty() ? "" : messages.front(), promise) << line;
-        } else {
-            EXPECT_THAT(messages, ::testing::IsEmpty()) << line;
-        }
-        return promised("gives") || promised("shows") || promised("fails");
+        messages.resize(std::min<std::size_t>(messages.size(), 1));
+        const bool shows = fails || note.starts_with("shows ");
+        EXPECT_EQ(messages, shows ? std::vector{note.substr(6)} : std::vector<std::string>()) << line;
+        if (note.ends_with(" numbers"))
+            return std::to_string(std::get<std::vector<double>>(outcome.result).size()) + " numbers";
+        return outcome.result;
     }
-
     int runExamples(const fs::path& page) {
-        bool inExample = false;
-        int promises = 0;
-        for (const std::string& line : linesOf(page)) {
-            if (line.starts_with("```")) {
-                inExample = line == "```quarn";
-                OpenQuarn::runCommand("file -new");
-            } else if (inExample && runLine(line)) {
-                ++promises;
-            }
-        }
-        return promises;
+        std::ifstream file(page);
+        return comparePageExamples(file, [this](const std::string& line) { return runLine(line); });
     }
 
 private:
-    static std::string described(const OpenQuarn::CommandValue& result, const std::string& promise) {
-        const auto* numbers = std::get_if<std::vector<double>>(&result);
-        if (numbers && promise.ends_with(" numbers"))
-            return std::to_string(numbers->size()) + " numbers";
-        return OpenQuarn::printedValue(result);
-    }
-
     const fs::path before_ = fs::current_path();
 };
 
 TEST_F(Pages, TheExamplesDoWhatTheySay) {
-    EXPECT_GE(runExamples(sources / "docs" / "neuralWarp.md"), 7);
-    EXPECT_GE(runExamples(sources / "docs" / "neuralWarpCommand.md"), 9);
+    EXPECT_GE(runExamples(sources / "docs" / "neuralWarp.md"), 6);
+    EXPECT_GE(runExamples(sources / "docs" / "neuralWarpCommand.md"), 5);
 }
 
 TEST_F(Pages, TheTableOfAttributesIsThatOfTheNode) {

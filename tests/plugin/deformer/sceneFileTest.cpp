@@ -1,10 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // The node in a scene that is saved, opened, moved, edited, duplicated and closed.
 #include "openquarn_app/SceneFile.h"
+#include "frame/FrameSampler.h"
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Evaluation.h"
-#include "openquarn_app/Workspace.h"
 #include "plugin/deformer/support/WarpTest.h"
+#include "plugin/deformer/support/stateText.h"
 
 namespace {
 
@@ -38,16 +39,15 @@ protected:
             EXPECT_EQ(rig.deform(index), HStatus::kSuccess);
         return rig;
     }
-    static HPointArray evaluated(const std::string& node) {
-        const HPlug output = testNodes::plug(node + ".outputGeom[0]");
+    static HPointArray evaluated(const std::string& node, unsigned index = 0) {
+        const HPlug output = testNodes::plug(node + ".outputGeom[" + std::to_string(index) + "]");
         EXPECT_EQ(OpenQuarn::evaluate(output), HStatus::kSuccess);
         return warpRig::pointsOf(output.asHObject());
     }
-    static const neuralWarp::neuralWarpData* state(const std::string& node) {
-        const HFnPluginData data(testNodes::plug(node + ".deformerData[0]").asHObject());
-        return static_cast<const neuralWarp::neuralWarpData*>(data.data());
+    static neuralWarp::neuralWarpData* state(const std::string& node, unsigned index = 0) {
+        const HFnPluginData data(testNodes::plug(node + ".deformerData[" + std::to_string(index) + "]").asHObject());
+        return static_cast<neuralWarp::neuralWarpData*>(data.data());
     }
-    static std::string text(const std::string& plug) { return testNodes::plug(plug).asString().asStdString(); }
     static void run(const std::string& script) { EXPECT_EQ(OpenQuarn::runCommand(script).error, ""); }
 
     const HObject quad = warpRig::mesh(makeGrid(1, 1));
@@ -73,93 +73,6 @@ TEST_F(WarpScene, OpensToTheSameBits) {
     EXPECT_EQ(again, written);
 }
 
-TEST_F(WarpScene, AFolderThatMovesIsFoundAgain) {
-    const HPointArray before = evaluatedRig({0}).result(0);
-    const TemporaryFolder elsewhere;
-    fs::copy(folder.path(), elsewhere.path(), fs::copy_options::recursive);
-    const auto content = OpenQuarn::externalContent();
-    ASSERT_EQ(content.size(), 1U);
-    EXPECT_EQ(content[0].node, "warp1");
-    EXPECT_EQ(content[0].unresolved, folder.path().string());
-    fs::remove_all(modelDirectory());
-
-    ASSERT_TRUE(OpenQuarn::relocate({{"warp1", content[0].key, elsewhere.path().string()}}));
-    EXPECT_EQ(text("warp1.modelRoot"), elsewhere.path().string());
-    EXPECT_EQ(evaluated("warp1"), before);
-    EXPECT_EQ(state("warp1")->modelDirectory, elsewhere.path() / "model.nwrp");
-    EXPECT_THAT(OpenQuarn::filesToArchive(true), ::testing::ElementsAre(elsewhere.path().string()));
-
-    // and that what is there is read, not what was
-    writeModel(elsewhere.path() / "other" / "model.nwrp", quadModel(-1.0F));
-    ASSERT_TRUE(OpenQuarn::relocate({{"warp1", content[0].key, (elsewhere.path() / "other").string()}}));
-    EXPECT_NE(evaluated("warp1"), before);
-}
-
-TEST_F(WarpScene, ANodeOfAFileKeepsItsFolders) {
-    OpenQuarn::Workspace::setRootDirectory("/shows/arm");
-    run("createNode neuralWarp -name fresh; createNode neuralWarp -name kept; createNode neuralWarp -name bare;"
-        "setAttr kept.modelRoot \"/elsewhere/models\"; setAttr bare.modelRoot \"\"; setAttr bare.trainingDataRoot "
-        "\"\"");
-    EXPECT_EQ(text("fresh.modelRoot"), "/shows/armneuralWarp/models");
-    std::string scene;
-    ASSERT_TRUE(OpenQuarn::sceneToText(scene));
-    OpenQuarn::Workspace::setRootDirectory("/other/");
-    ASSERT_TRUE(OpenQuarn::sceneFromText(scene, "scene"));
-    EXPECT_EQ(text("fresh.modelRoot"), "/shows/armneuralWarp/models");
-    EXPECT_EQ(text("fresh.trainingDataRoot"), "/shows/armcache/neuralWarp/trainingData");
-    EXPECT_EQ(text("kept.modelRoot"), "/elsewhere/models");
-    EXPECT_EQ(text("bare.modelRoot"), "");
-    EXPECT_EQ(text("bare.trainingDataRoot"), "");
-    run("createNode neuralWarp -name late");
-    EXPECT_EQ(text("late.modelRoot"), "/other/neuralWarp/models");
-    OpenQuarn::Workspace::resetRootDirectory();
-}
-
-TEST_F(WarpScene, EditsOfTheModelsPlaceAskForAReload) {
-    struct Row {
-        const char* edit;
-        bool reloads;
-        bool dirties;
-    };
-    const std::vector<Row> rows = {
-        {"setAttr warp1.models[3].modelName other", true, true}, // of a geometry that is not there
-        {"setAttr warp1.models[3].modelName other", true, true}, // the same text again
-        {"setAttr warp1.models[0].modelName model", true, true},
-        {"setAttr warp1.mlrt nowhere", true, true},
-        {"setAttr warp1.models[0].modelActive Off", false, true},
-        {"setAttr warp1.models[0].modelActive On", false, true},
-        {"setAttr warp1.controlValues 0.1 0.2", false, true},
-        {"setAttr warp1.targetMorphEnvelope 0.5", false, true},
-        {"setAttr warp1.train[0].batchSize 64", false, false},
-        {"setAttr warp1.train[0].outputModelName other", false, false},
-        {"setAttr warp1.export[0].smoothingIterations 3", false, false},
-        {"setAttr warp1.trainingDataRoot nowhere", false, false},
-        {"setAttr -lock on warp1.models[0].modelName", false, false},
-        {"setAttr -lock off warp1.models[0].modelName", false, false},
-    };
-    const warpRig::Rig rig = evaluatedRig({0, 1, 2});
-    for (const Row& row : rows) {
-        for (const unsigned index : {0U, 1U, 2U})
-            rig.state(index)->modelPathDirty = rig.state(index)->metadataDirty = rig.state(index)->modelLoadPending =
-                false;
-        for (const unsigned index : {0U, 1U, 2U})
-            rig.output(index).asHObject(); // clean again
-        takeMessages();                    // of evaluations with the paths above
-        const OpenQuarn::DirtyWatch watch;
-        run(row.edit);
-        for (const unsigned index : {0U, 1U, 2U}) {
-            const neuralWarp::neuralWarpData& data = *rig.state(index);
-            EXPECT_EQ(data.modelPathDirty && data.metadataDirty && data.modelLoadPending, row.reloads)
-                << row.edit << ", " << index;
-            EXPECT_EQ(data.modelPathDirty || data.metadataDirty || data.modelLoadPending, row.reloads)
-                << row.edit << ", " << index;
-        }
-        const bool dirties = std::ranges::any_of(
-            watch.plugs(), [](const std::string& plug) { return plug.starts_with("warp1.outputGeom"); });
-        EXPECT_EQ(dirties, row.dirties) << row.edit;
-    }
-}
-
 TEST_F(WarpScene, AnEditReachesAsManyIndicesAsThereAreStates) {
     const warpRig::Rig rig = evaluatedRig({0, 2, 5}); // three states: 0 and 2 are below that, 5 is not
     run("setAttr warp1.models[5].modelName model");
@@ -170,27 +83,49 @@ TEST_F(WarpScene, AnEditReachesAsManyIndicesAsThereAreStates) {
     EXPECT_TRUE(rig.state(5)->modelPathDirty);
 }
 
+/// With all that a frame needs before it is evaluated, and whatever becomes of the original.
 TEST_F(WarpScene, ADuplicateHasAStateOfItsOwn) {
-    const warpRig::Rig rig = evaluatedRig({0});
-    const HPointArray result = rig.result(0);
-    rig.plug("export[0].smoothingIterations").setInt(4);
-    run("duplicate warp1 -name copy");
-    const neuralWarp::neuralWarpData* original = rig.state(0);
-    const neuralWarp::neuralWarpData* copied = state("copy");
-    ASSERT_NE(copied, nullptr);
-    ASSERT_NE(copied, original);
-    EXPECT_TRUE(copied->canApplyModel()); // loaded again from its file: the network is not shared
-    EXPECT_FALSE(copied->modelPathDirty);
+    ModelSpec part = quadModel(0.5F);
+    part.deltaMode = 0;
+    part.subsetState = "partial";
+    part.affectMap = {2, 0};
+    part.bias.resize(2);
+    part.weights.resize(4);
+    part.shapes = {{1, 2, 3, 4, 5, 6}, {0, 1, 0, 2, 0, 3}};
+    writeModel(modelDirectory(), part);
+    const warpRig::Rig rig = evaluatedRig({0, 1});
+    const HPointArray before = rig.result(1);
+    takeMessages(); // that the model is of other vertices
+    run("setAttr warp1.export[0].smoothingIterations 4; neuralWarp -exportActive on -multiIndex 0 warp1;"
+        "duplicate warp1 -name copy");
+    const auto placed = [](neuralWarp::neuralWarpData& data) {
+        neuralWarp::Points points = makeGrid(1, 1).points, result;
+        const std::vector<float> outputs = data.session.run(std::vector<float>{0.3F, 0.7F});
+        neuralWarp::FrameSampler(data.frameModel()).place(result, points, outputs);
+        return result;
+    };
+    ASSERT_NE(state("copy", 1), rig.state(1));
+    EXPECT_EQ(stateText::raised(*state("copy", 1)), "topology restFrames valid affectMap");
+    EXPECT_EQ(placed(*state("copy", 1)), placed(*rig.state(1)));
+    EXPECT_EQ(placed(*rig.state(1)).size(), 4U);
+    EXPECT_EQ(state("copy", 1)->slotCount(), 2U);
+    EXPECT_EQ(evaluated("copy"), warpRig::pointsOf(quad)) << "it is exported as well";
 
-    run("setAttr copy.models[0].modelName model");
-    EXPECT_TRUE(state("copy")->modelPathDirty);
-    EXPECT_FALSE(rig.state(0)->modelPathDirty);
-    EXPECT_EQ(text("copy.modelRoot"), folder.path().string());
-    EXPECT_EQ(evaluated("copy"), result);
-    EXPECT_EQ(testNodes::plug("copy.export[0].smoothingIterations").asInt(), 4);
+    // a directory that was written into since: the network need not be the one of the rest
+    writeFile(modelDirectory() / "principal_shapes.json", "{}");
+    run("duplicate warp1 -name late");
+    EXPECT_THAT(stateText::raised(*state("late", 1)), HasSubstr("load metadata path"));
+    EXPECT_FALSE(rig.state(1)->modelPathDirty);
+    fs::remove_all(modelDirectory());
+    run("duplicate warp1 -name without");
+    EXPECT_FALSE(state("without", 1)->canApplyModel());
 
-    run("deleteNode warp1; setAttr copy.models[0].modelName model; dgdirty copy");
-    EXPECT_EQ(evaluated("copy"), result);
+    run("deleteNode warp1");
+    writeModel(modelDirectory(), part);
+    run("setAttr copy.models[0].modelName model"); // which reaches both geometries
+    EXPECT_TRUE(state("copy", 1)->modelPathDirty);
+    EXPECT_EQ(evaluated("copy", 1), before);
+    EXPECT_THAT(takeMessages(), ::testing::ElementsAre(HasSubstr("multiIndex 1")));
 }
 
 TEST_F(WarpScene, ANodeThatGoesTakesItsCallbackAlong) {

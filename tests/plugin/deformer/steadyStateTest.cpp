@@ -2,7 +2,9 @@
 // What an evaluation does again, and what it keeps from the one before.
 #include "plugin/deformer/support/FailureTest.h"
 
+#include "openquarn_app/SceneFile.h"
 #include "openquarn_app/Usage.h"
+#include "plugin/deformer/sweep.h"
 
 #include <functional>
 
@@ -76,6 +78,13 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
         std::vector<std::uint32_t> advanced; ///< by how much each counter goes on
     };
     const std::vector<std::uint32_t> none(5);
+    const auto exportSmoothed = [](int passes) {
+        return [=](T& t) {
+            t.rig->plug("export[0].smoothingIterations").setInt(passes);
+            nodeOf(*t.rig).setExportActive(0, true);
+            nodeOf(*t.rig).setExportActive(0, false);
+        };
+    };
     const Row rows[] = {
         {"controls", [](T& t) { t.rig->setControls({0.25}); }, none},
         {"moved input", [](T& t) { t.rig->setInput(0, moved(1.0)); }, none},
@@ -92,6 +101,12 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
         {"export attributes", [](T& t) { t.rig->plug("export[0].deltaMode").setShort(0); }, none},
         {"the model's name", [](T& t) { t.rig->plug("models[0].modelName").setString("model"); }, {0, 0, 0, 1, 1}},
         {"another geometry's name", [](T& t) { t.rig->plug("models[3].modelName").setString("x"); }, {0, 0, 0, 1, 1}},
+        {"the folder of models",
+         [](T& t) {
+             EXPECT_TRUE(OpenQuarn::relocate({{"warp1", "modelRoot", t.folder.path().string()}}));
+         },
+         {0, 0, 0, 1, 1}},
+        {"a lock", [](T&) { script("setAttr -lock on warp1.modelRoot; setAttr -lock off warp1.modelRoot"); }, none},
         {"rest points", [](T& t) { t.rig->setRest(0, moved(2.0)); }, {1, 1, 1, 1, 1}},
         {"export with the same settings",
          [](T& t) {
@@ -104,20 +119,17 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
              nodeOf(*t.rig).setExportActive(0, false);
          },
          none},
-        {"export with other smoothing",
-         [](T& t) {
-             t.rig->plug("export[0].smoothingIterations").setInt(5);
-             nodeOf(*t.rig).setExportActive(0, true);
-             nodeOf(*t.rig).setExportActive(0, false);
-         },
-         {0, 0, 1, 0, 0}},
         {"export without frames",
          [](T& t) {
              t.rig->plug("export[0].deltaMode").setShort(0);
              nodeOf(*t.rig).setExportActive(0, true);
+             EXPECT_EQ(stateText::raised(*t.rig->state(0)), "topology restFrames applied export valid affectMap");
              nodeOf(*t.rig).setExportActive(0, false);
+             t.rig->plug("export[0].deltaMode").setShort(1);
          },
          {1, 0, 1, 0, 0}},
+        {"export with other smoothing", exportSmoothed(5), {0, 0, 1, 0, 0}},
+        {"export without smoothing", exportSmoothed(0), {0, 1, 1, 0, 0}},
     };
     expectEvaluation();
     expectEvaluation();
@@ -132,6 +144,15 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
         EXPECT_EQ(advanced, row.advanced);
     }
     takeMessages();
+}
+
+TEST(CacheVersions, NeverComeBackToNever) {
+    const std::pair<std::uint32_t, std::uint32_t> rows[] = {
+        {0xFFFFFFFF, 0}, {0, 1}, {0xFFFFFFFD, 0xFFFFFFFE}, {0xFFFFFFFE, 0}};
+    for (auto [version, next] : rows) {
+        neuralWarp::neuralWarpData::bumpVersion(version);
+        EXPECT_EQ(version, next);
+    }
 }
 
 } // namespace

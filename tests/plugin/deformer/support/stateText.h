@@ -45,6 +45,4 @@ inline void raise(State& state, const std::string& names) {
         state.*member = (" " + names + " ").find(" " + std::string(name) + " ") != std::string::npos;
 }
 
-inline constexpr std::uint32_t never = 0xFFFFFFFF; ///< a counter that was not advanced yet
-
 } // namespace stateText
