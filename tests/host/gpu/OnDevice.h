@@ -70,9 +70,8 @@ private:
     int time_ = 0;
 };
 
-// writes its index + 1; the second argument may be null
-inline const char* const countKernel = "__kernel void count(__global int* to, __global const int* add, uint n) {\n"
-                                       "    uint i = get_global_id(0);\n"
-                                       "    if (i < n)\n"
-                                       "        to[i] = (int)i + 1 + (add ? add[0] : 0);\n"
+// adds its index + 1, and what the second argument holds, which may be null
+inline const char* const countKernel = "__kernel void count(__global int* to, __global const int* add) {\n"
+                                       "    size_t i = get_global_id(0);\n"
+                                       "    to[i] += (int)i + 1 + (add ? add[0] : 0);\n"
                                        "}\n";

@@ -2,6 +2,7 @@
 #include "OnDevice.h"
 
 #include "gpu/deviceList.h"
+#include "openquarn_app/Session.h"
 
 #include <gmock/gmock.h>
 
@@ -48,6 +49,8 @@ TEST_F(GpuDevices, AreDescribedAndOpenedOnFirstUse) {
     closeDevice();
     EXPECT_FALSE(Gpu::currentDevice());
     EXPECT_NE(currentDevice(), opened);
+    { const Session session; }
+    EXPECT_FALSE(Gpu::currentDevice()) << "the end of a session closes it";
 }
 
 TEST_F(GpuDevices, AChoiceClosesTheDeviceAndARefusedOneDoesNot) {

@@ -3,10 +3,6 @@
 
 #include "gpu/activity.h"
 #include "gpu/transfer.h"
-#include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HSelectionList.h"
-#include "openquarn/gpu/HGPUDeformerData.h"
-#include "openquarn_app/Session.h"
 
 #include <gmock/gmock.h>
 
@@ -191,10 +187,8 @@ TEST_F(GpuCounting, NamesWhatHappenedAndMeasuresWhenAsked) {
         for (const std::size_t items : {2U, 0U, 1U}) {
             ASSERT_TRUE(kernel.loadOrUpdate(file, "count", items));
             cl_int status = CL_SUCCESS;
-            const auto count = static_cast<cl_uint>(items);
             kernel.setKernelArgBuffer(0, positions, status);
             kernel.setKernelArgBuffer(1, positions, status, false);
-            HOpenCLUtils::setKernelArg(kernel, 2, sizeof count, &count, status);
             ASSERT_EQ(status, CL_SUCCESS);
             ASSERT_EQ(kernel.enqueueKernel({}, nullptr), CL_SUCCESS);
         }
@@ -224,53 +218,6 @@ TEST_F(GpuCounting, NamesWhatHappenedAndMeasuresWhenAsked) {
     Gpu::resetCounts();
     EXPECT_TRUE(Gpu::counts().launches.empty());
     EXPECT_EQ(Gpu::counts().bytesUp, 0U);
-}
-
-TEST_F(GpuCounting, AKernelRunsForEachWorkItemAndForNoOther) {
-    const HString file = write("tally.cl", "__kernel void tally(__global int* to) { ++to[get_global_id(0)]; }\n");
-    for (const std::size_t items : {1U, 63U, 64U, 65U, 130U}) {
-        HOpenCLBuffer tallies;
-        ASSERT_EQ(upload(std::vector<int>(200), tallies), CL_SUCCESS);
-        HOpenCLKernelInfo kernel;
-        ASSERT_TRUE(kernel.loadOrUpdate(file, "tally", items));
-        cl_int status = CL_SUCCESS;
-        kernel.setKernelArgBuffer(0, tallies, status);
-        HOpenCLEvent done;
-        ASSERT_EQ(kernel.enqueueKernel({tallies.bufferReadyEvent()}, &done), CL_SUCCESS);
-        EXPECT_FALSE(done.isNull());
-        std::vector<int> expected(200);
-        std::fill_n(expected.begin(), items, 1);
-        EXPECT_EQ(contents<int>(tallies, 200), expected) << items;
-        EXPECT_THAT(Gpu::counts().launches, ElementsAre(Pair("tally", 1)));
-        Gpu::resetCounts();
-    }
-}
-
-TEST_F(GpuBuffers, AreFoundByPlugAndName) {
-    const Session session;
-    HSelectionList list;
-    ASSERT_TRUE(list.add("time1"));
-    HObject node;
-    ASSERT_TRUE(list.getDependNode(0, node));
-    const HFnDependencyNode time(node);
-    const HPlug message = time.findPlug("message");
-    const HPlug outTime = time.findPlug("outTime");
-    std::vector<HOpenCLBuffer> buffers(4);
-    for (HOpenCLBuffer& buffer : buffers)
-        ASSERT_EQ(buffer.ensureBufferSize(4), CL_SUCCESS);
-
-    HGPUDeformerData data;
-    EXPECT_TRUE(data.getBuffer(message, "positions").isNull());
-    data.setBuffer(message, "positions", buffers[0]);
-    data.setBuffer(outTime, "positions", buffers[1]);
-    data.setBuffer(message, "weights", buffers[2]);
-    data.setBuffer(outTime, "positions", buffers[3]);
-    EXPECT_EQ(data.getBuffer(message, "positions").get(), buffers[0].get());
-    EXPECT_EQ(data.getBuffer(message, "weights").get(), buffers[2].get());
-    EXPECT_EQ(data.getBuffer(outTime, "positions").get(), buffers[3].get());
-    EXPECT_TRUE(data.getBuffer(outTime, "weights").isNull());
-    data.clear();
-    EXPECT_TRUE(data.getBuffer(message, "positions").isNull());
 }
 
 } // namespace
