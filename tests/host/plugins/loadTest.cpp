@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 // Loading plug-ins from files, and unloading them: every step that can fail, and what is left behind.
-#include "host/plugins/TinyTypes.h"
 #include "support/TemporaryFolder.h"
 #include "support/failureOf.h"
 

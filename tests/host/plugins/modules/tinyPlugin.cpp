@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 // A plug-in with one node, one data type and one command. What each of its variants does wrong is defined when it is
 // compiled (see CMakeLists.txt beside the tests).
-#include "host/plugins/TinyTypes.h"
-
+#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HFnPlugin.h"
 #include "openquarn/HNodeMessage.h"
+#include "openquarn/HPxCommand.h"
+#include "openquarn/HPxData.h"
 #include "openquarn/HSelectionList.h"
 
 #include <stdexcept>
@@ -20,17 +21,35 @@
 #define REQUIRED "Any"
 #endif
 
-#ifndef NO_VERSION
-#ifdef VERSION
-extern "C" OPENQUARN_API const char HApiVersion[8];
-const char HApiVersion[8] = {VERSION};
-#else
-extern "C" OPENQUARN_API const char HApiVersion[8];
-const char HApiVersion[8] = OPENQUARN_API_VERSION;
+#ifndef VERSION
+#define VERSION OPENQUARN_API_VERSION
 #endif
+
+#ifndef NO_VERSION
+extern "C" OPENQUARN_API const char HApiVersion[8];
+const char HApiVersion[8] = VERSION;
 #endif
 
 namespace {
+
+class TinyNode : public HPxNode {};
+
+class TinyData : public HPxData {
+public:
+    void copy(const HPxData&) override {}
+    HTypeId typeId() const override { return HTypeId(DATA_ID); }
+    HString name() const override { return "tinyData"; }
+};
+
+class TinyCommand : public HPxCommand {
+public:
+    HStatus doIt(const HArgList&) override { return setResult("tiny"); }
+};
+
+template <class Base, class Tiny>
+Base* create() {
+    return new Tiny;
+}
 
 // what a plug-in keeps of its attributes, as most do: released when the library goes
 HObject value;
@@ -41,11 +60,11 @@ HStatus initialize() {
 }
 
 [[maybe_unused]] HStatus registerAll(HFnPlugin& set) {
-    HStatus status = set.registerNode(NODE_NAME, NODE_ID, createTinyNode, initialize);
+    HStatus status = set.registerNode(NODE_NAME, NODE_ID, create<HPxNode, TinyNode>, initialize);
     if (!status.error())
-        status = set.registerData(NODE_NAME "Data", DATA_ID, createTinyData);
+        status = set.registerData(NODE_NAME "Data", DATA_ID, create<HPxData, TinyData>);
     if (!status.error())
-        status = set.registerCommand(COMMAND_NAME, createTinyCommand);
+        status = set.registerCommand(COMMAND_NAME, create<HPxCommand, TinyCommand>);
     return status;
 }
 
