@@ -1,6 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
 // Which file a path stands for, on a disk made for it.
-#include "openquarn/HFileIO.h"
 #include "openquarn/HFileObject.h"
 #include "openquarn_app/Workspace.h"
 #include "support/TemporaryFolder.h"
@@ -11,7 +10,6 @@
 #include <filesystem>
 #include <fstream>
 #include <string>
-#include <vector>
 
 namespace {
 
@@ -129,11 +127,6 @@ TEST_F(FileObject, JoinsAWorkspaceRootWithAndWithoutASeparator) {
     EXPECT_EQ(fileObject("missing", 54).resolvedFullName(), "missing");
     Workspace::resetRootDirectory();
     EXPECT_EQ(Workspace::rootDirectory(), fs::current_path().string() + "/");
-}
-
-TEST_F(FileObject, NoSceneFileIsOpenOrBeingRead) {
-    EXPECT_EQ(HFileIO::currentlyReadingFileVersion(), -1);
-    EXPECT_TRUE(HFileIO::currentFile().isEmpty());
 }
 
 } // namespace

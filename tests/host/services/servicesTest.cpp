@@ -43,14 +43,6 @@ TEST(Displays, EachHasItsSeverity) {
 }
 
 TEST(AnimationState, IsWhatTheApplicationSets) {
-    EXPECT_FALSE(HAnimControl::isPlaying() || HAnimControl::isScrubbing());
-    Animation::setPlaying(true);
-    EXPECT_TRUE(HAnimControl::isPlaying() && !HAnimControl::isScrubbing());
-    Animation::setPlaying(false);
-    Animation::setScrubbing(true);
-    EXPECT_TRUE(!HAnimControl::isPlaying() && HAnimControl::isScrubbing());
-    Animation::setScrubbing(false);
-
     EXPECT_EQ(HAnimControl::currentTime(), HTime(0.0));
     OpenQuarn::Session session;
     session.setTime(12.25);
