@@ -24,7 +24,7 @@ protected:
 
 public:
     ~PipelineTest() override {
-        gpuDeformers::Hooks::reset();
+        gpuDeformers::hooks = {};
         OpenQuarn::Gpu::setEnabled(false);
         EXPECT_EQ(gpuDeformers::Seen::alive, 0) << "a deformer stayed behind when its geometry left the device";
     }

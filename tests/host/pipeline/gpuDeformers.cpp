@@ -48,15 +48,15 @@ public:
         prepareWeightsBuffer(node);
         if (initializeOutputPositions(event) != CL_SUCCESS)
             return kDeformerFailure;
-        const DeformerStatus made = Hooks::deform ? Hooks::deform(*this, inputData, block) : push(block, event);
+        const DeformerStatus made = hooks.deform ? hooks.deform(*this, inputData, block) : push(block, event);
         return made == kDeformerSuccess ? finishEvaluation(event, outputData) : made;
     }
     void terminate() override {
         ++Seen::terminations;
         kernel_.reset();
         HPxGPUStandardDeformer::terminate();
-        if (Hooks::terminate)
-            Hooks::terminate(*this);
+        if (hooks.terminate)
+            hooks.terminate(*this);
     }
 
 private:
@@ -83,26 +83,26 @@ private:
 
 class PushInfo final : public HGPUDeformerRegistrationInfo {
 public:
-    HPxGPUDeformer* createGPUDeformer() override { return Hooks::create ? Hooks::create() : makePush(); }
+    HPxGPUDeformer* createGPUDeformer() override { return hooks.create ? hooks.create() : makePush(); }
     bool validateNodeInGraph(HDataBlock&, const HObject&, const HPlug&, HStringArray* messages) override {
-        return !Hooks::validateGraph || Hooks::validateGraph(messages);
+        return !hooks.validateGraph || hooks.validateGraph(messages);
     }
     bool validateNodeValues(HDataBlock&, const HObject&, const HPlug&, HStringArray* messages) override {
-        return !Hooks::validateValues || Hooks::validateValues(messages);
+        return !hooks.validateValues || hooks.validateValues(messages);
     }
     HObject outputMeshAttribute(const HObject& node) const override {
-        return Hooks::outputMesh ? Hooks::outputMesh(node) : HGPUDeformerRegistrationInfo::outputMeshAttribute(node);
+        return hooks.outputMesh ? hooks.outputMesh(node) : HGPUDeformerRegistrationInfo::outputMeshAttribute(node);
     }
     void additionalInputMeshAttributes(const HObject& node, HObjectArray& attributes) const override {
-        if (Hooks::additional)
-            Hooks::additional(node, attributes);
+        if (hooks.additional)
+            hooks.additional(node, attributes);
     }
-    bool matchAncestorLogicalIndices() const override { return Hooks::matchesIndices; }
+    bool matchAncestorLogicalIndices() const override { return hooks.matchesIndices; }
     HObject passThroughInputMeshAttribute(const HObject& node) const override {
-        return Hooks::passThroughMesh ? Hooks::passThroughMesh(node)
-                                      : HGPUDeformerRegistrationInfo::passThroughInputMeshAttribute(node);
+        return hooks.passThroughMesh ? hooks.passThroughMesh(node)
+                                     : HGPUDeformerRegistrationInfo::passThroughInputMeshAttribute(node);
     }
-    bool isGeometryFilter() const override { return Hooks::isGeometryFilter; }
+    bool isGeometryFilter() const override { return hooks.isGeometryFilter; }
 };
 
 PushInfo& info() {
@@ -120,40 +120,12 @@ HStatus uninitializePlugin(HObject) {
 
 } // namespace
 
-std::atomic<int> Seen::alive = 0;
-std::atomic<int> Seen::evaluations = 0;
-std::atomic<int> Seen::terminations = 0;
-
-void Seen::reset() {
-    evaluations = 0;
-    terminations = 0;
-}
-
-std::function<HPxGPUDeformer*()> Hooks::create;
-std::function<Status(HPxGPUStandardDeformer&, const HGPUDeformerData&, HDataBlock&)> Hooks::deform;
-std::function<void(const HPxGPUDeformer&)> Hooks::terminate;
-std::function<bool(HStringArray*)> Hooks::validateGraph, Hooks::validateValues;
-std::function<HObject(const HObject&)> Hooks::outputMesh, Hooks::passThroughMesh;
-std::function<void(const HObject&, HObjectArray&)> Hooks::additional;
-bool Hooks::matchesIndices = true;
-bool Hooks::isGeometryFilter = true;
-
-void Hooks::reset() {
-    create = nullptr;
-    deform = nullptr;
-    terminate = nullptr;
-    validateGraph = validateValues = nullptr;
-    outputMesh = passThroughMesh = nullptr;
-    additional = nullptr;
-    matchesIndices = isGeometryFilter = true;
-}
-
 HPxGPUDeformer* makePush() {
     return new Push;
 }
 
 void registerPush(const std::string& folder) {
-    Hooks::reset();
+    hooks = {};
     Seen::reset();
     kernelFile = folder + "/push.cl";
     std::ofstream(kernelFile) << kernelSource;

@@ -17,26 +17,26 @@ void registerPush(const std::string& folder);
 
 /// What the deformers have done since reset(); they count side by side.
 struct Seen {
-    static std::atomic<int> alive;       ///< objects that exist
-    static std::atomic<int> evaluations; ///< of all variants
-    static std::atomic<int> terminations;
-    static void reset();
+    static inline std::atomic<int> alive = 0;       ///< objects that exist
+    static inline std::atomic<int> evaluations = 0; ///< of all variants
+    static inline std::atomic<int> terminations = 0;
+    static void reset() { evaluations = terminations = 0; }
 };
 
 using Status = HPxGPUDeformer::DeformerStatus;
 
 /// Replaces parts of the deformers and of the registration info; empty: the usual.
 struct Hooks {
-    static std::function<HPxGPUDeformer*()> create;
+    std::function<HPxGPUDeformer*()> create;
     /// Instead of the kernels, in between of what comes before and after.
-    static std::function<Status(HPxGPUStandardDeformer&, const HGPUDeformerData&, HDataBlock&)> deform;
-    static std::function<void(const HPxGPUDeformer&)> terminate; ///< beside what it does
-    static std::function<bool(HStringArray*)> validateGraph, validateValues;
-    static std::function<HObject(const HObject&)> outputMesh, passThroughMesh;
-    static std::function<void(const HObject&, HObjectArray&)> additional;
-    static bool matchesIndices, isGeometryFilter;
-    static void reset();
+    std::function<Status(HPxGPUStandardDeformer&, const HGPUDeformerData&, HDataBlock&)> deform;
+    std::function<void(const HPxGPUDeformer&)> terminate; ///< beside what it does
+    std::function<bool(HStringArray*)> validateGraph, validateValues;
+    std::function<HObject(const HObject&)> outputMesh, passThroughMesh;
+    std::function<void(const HObject&, HObjectArray&)> additional;
+    bool matchesIndices = true, isGeometryFilter = true;
 };
+inline Hooks hooks;
 
 /// The pushing kernel's standard deformer.
 HPxGPUDeformer* makePush();

@@ -5,8 +5,6 @@
 #include "openquarn/HFnMesh.h"
 #include "openquarn_app/Commands.h"
 
-#include <stdexcept>
-
 namespace {
 
 using namespace testNodes;
@@ -20,13 +18,6 @@ using ::testing::Each;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
-
-HUintArray indices(std::initializer_list<unsigned> list) {
-    HUintArray all;
-    for (const unsigned index : list)
-        all.append(index);
-    return all;
-}
 
 TEST_F(PipelineTest, TheDeviceTakesOverAfterOneEvaluationOnTheCpu) {
     const HObject mesh = grid(3, 2);
@@ -55,7 +46,7 @@ TEST_F(PipelineTest, TheDeviceTakesOverAfterOneEvaluationOnTheCpu) {
 }
 
 TEST_F(PipelineTest, WhatDoesNotComeAlongAConnectionIsEvaluatedOnTheCpuOnce) {
-    const HObject mesh = withTag(withTag(grid(3, 2), "some", indices({4, 1})), "others", indices({0}));
+    const HObject mesh = withTag(withTag(grid(3, 2), "some", {4, 1}), "others", {0});
     meshNode("m", mesh);
     meshNode("n", mesh);
     makePusher("d", "m.outMesh");
@@ -70,11 +61,11 @@ TEST_F(PipelineTest, WhatDoesNotComeAlongAConnectionIsEvaluatedOnTheCpuOnce) {
         {"a rest shape", [&] { set("d.originalGeometry[0]", grid(3, 2)); }},
         {"other polygons",
          [] {
-             set("m.inMesh", withTag(grid(2, 3), "some", indices({4, 1})));
+             set("m.inMesh", withTag(grid(2, 3), "some", {4, 1}));
          }},
         {"another list of vertices",
          [] {
-             set("m.inMesh", withTag(grid(2, 3), "some", indices({1, 4})));
+             set("m.inMesh", withTag(grid(2, 3), "some", {1, 4}));
          }},
         {"another connection", [] { disconnect("m.outMesh", input("d", 0)), connect("n.outMesh", input("d", 0)); }},
         {"a plug that somebody makes dirty", [] { OpenQuarn::makeDirty(plug(output("d", 0))); }},
@@ -115,7 +106,7 @@ TEST_F(PipelineTest, AnEditOfOneGeometryLeavesTheOthersOnTheDevice) {
 }
 
 TEST_F(PipelineTest, MapsAndWeightsAreUploadedWhenTheyChangeOnly) {
-    const HObject mesh = withTag(grid(3, 2), "some", indices({4, 1, 5}));
+    const HObject mesh = withTag(grid(3, 2), "some", {4, 1, 5});
     meshNode("m", mesh);
     makePusher("d", "m.outMesh");
     plug("d.input[0].componentTagExpression").setString("some");
@@ -145,8 +136,10 @@ TEST_F(PipelineTest, OtherContextsAndFailedEvaluationsStayOnTheCpu) {
         testDeformers::pushPoints(node, block, iterator, i);
         return HStatus(HStatus::kFailure, "broken");
     };
-    plug("d.weightList[0].weights[0]").setDouble(0.5);
-    EXPECT_THAT(evaluate(output("d", 0)), HasSubstr("broken"));
+    gpuDeformers::hooks.deform = [](auto&&...) { return HPxGPUDeformer::kDeformerFailure; };
+    animate("d", 3.5);
+    EXPECT_THAT(evaluate(output("d", 0)), HasSubstr("broken")) << "first there, then on the CPU";
+    gpuDeformers::hooks.deform = nullptr;
     animate("d", 4.0);
     EXPECT_THAT(evaluate(output("d", 0)), HasSubstr("broken")) << "on the CPU until it succeeds there";
     takeMessages();
