@@ -1,22 +1,16 @@
 // SPDX-License-Identifier: Apache-2.0
 // The host's commands on nodes, values and connections: what they do, and what
 // they say about what they cannot do.
+#include "host/files/fileNodes.h"
 #include "host/support/SceneTest.h"
 
 #include "openquarn/HArgDatabase.h"
-#include "openquarn/HFnAttribute.h"
-#include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HFnPlugin.h"
-#include "openquarn/HPxData.h"
+#include "openquarn/HFnMeshData.h"
 #include "openquarn/HSelectionList.h"
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Evaluation.h"
-#include "openquarn_app/Plugins.h"
 #include "openquarn_app/Workspace.h"
 #include "support/TemporaryFolder.h"
-
-#include <filesystem>
-#include <stdexcept>
 
 namespace {
 
@@ -98,6 +92,7 @@ TEST_F(GraphCommands, SetAndGetEveryKindOfValue) {
         {"getAttr -asString n.choice", "Five"},
         {"setAttr n.choice 0; getAttr -asString n.choice", "Zero"},
         {"setAttr -type string n.text \"-a b\"; getAttr n.text", "-a b"},
+        {"setAttr -type string n.text '-c'; getAttr n.text", "-c"}, // what is quoted is no flag
         {"setAttr n.text ''; getAttr n.text", ""},
         {"setAttr n.scale 1e6; getAttr n.scale", "100"}, // its limit
         {"setAttr n.values 1 -2 3; getAttr n.values", "1 -2 3"},
@@ -110,18 +105,13 @@ TEST_F(GraphCommands, SetAndGetEveryKindOfValue) {
 
 TEST_F(GraphCommands, RefuseValuesAndChangeNothing) {
     create("testSum", "n");
-    create("testSum", "up");
     create("testLists", "l");
-    print("connectAttr up.total n.kept; setAttr -lock on n.bare 3; setAttr "
-          "n.values 5 6; setAttr -lock on n.values[1]");
+    print("setAttr -lock on n.bare 3; setAttr n.values 5 6; setAttr -lock on n.values[1]");
     expectErrors({
-        {"setAttr nope.bare 1", "there is no node named 'nope'"},
         {"setAttr n 1", "'n' names no plug"},
         {"setAttr n.nope 1", "node type 'testSum' has no attribute 'nope'"},
-        {"setAttr n.bare[0] 1", "'bare' is not an array"},
         {"setAttr n.total 1", "'n.total' is an output and cannot be set"},
         {"setAttr n.bare 1", "'n.bare' is locked"},
-        {"setAttr n.kept 1", "'n.kept' is connected from 'up.total'"},
         {"setAttr n.scale x", "'n.scale' cannot be set: 'x' is not a finite number"},
         {"setAttr n.scale", "'n.scale' takes one value, not 0"},
         {"setAttr n.scale 1 2", "'n.scale' takes one value, not 2"},
@@ -274,76 +264,55 @@ TEST_F(GraphCommands, DuplicateTakesValuesAndNoConnections) {
     EXPECT_EQ(print("ls -type testSum"), "n\nup\nn1\ncopy");
 }
 
-constexpr HTypeId countedId{0x7e570101};
-constexpr HTypeId holderId{0x7e570102};
-
-/// Data that is copied by its own function, which refuses the value 13.
-class Counted : public HPxData {
-public:
-    void copy(const HPxData& source) override {
-        if (source.typeId() != countedId)
-            return;
-        value = static_cast<const Counted&>(source).value + 100;
-        if (value == 113)
-            throw std::runtime_error("not 13");
-    }
-    HTypeId typeId() const override { return countedId; }
-    HString name() const override { return "testCounted"; }
-    int value = 0;
-};
-
-HStatus initializeHolder() {
-    const HObject store = HFnTypedAttribute().create("store", "store", countedId);
-    HFnAttribute(store).setArray(true);
-    return HPxNode::addAttribute(store);
-}
-
-HStatus registerHolder(HObject object) { // NOLINT(performance-unnecessary-value-param): as the host calls it
-    HFnPlugin plugin(object);
-    const HStatus status = plugin.registerData("testCounted", countedId, []() -> HPxData* { return new Counted; });
-    return status.error() ? status
-                          : plugin.registerNode(
-                                "testHolder", holderId, []() -> HPxNode* { return new HPxNode; }, initializeHolder);
-}
-
-HStatus deregisterHolder(HObject object) { // NOLINT(performance-unnecessary-value-param): as the host calls it
-    HFnPlugin plugin(object);
-    const HStatus status = plugin.deregisterNode(holderId);
-    return status.error() ? status : plugin.deregisterData(countedId);
-}
-
-Counted& countedIn(const std::string& name) {
-    return static_cast<Counted&>(*HFnPluginData(plug(name).asHObject()).data());
-}
-
-void store(const std::string& name, int value) {
-    EXPECT_EQ(text(plug(name).setHObject(HFnPluginData().create(countedId))), "");
-    countedIn(name).value = value;
-}
-
 TEST_F(GraphCommands, DuplicateHasPluginsCopyTheirData) {
-    OpenQuarn::addPlugin("holders", registerHolder, deregisterHolder);
-    create("testHolder", "h");
-    store("h.store[2]", 1);
-    store("h.store[5]", 2);
+    fileNodes::registerTypes();
+    create("fileNode", "h");
+    const auto store = [](const char* name, const char* held) {
+        EXPECT_EQ(text(plug(name).setHObject(fileNodes::makeData(held))), "");
+    };
+    const auto held = [](const char* name) { return fileNodes::textOf(plug(name).asHObject()); };
+    store("h.datas[2]", "two");
+    store("h.datas[5]", "five");
     EXPECT_EQ(print("duplicate h -name g"), "g");
-    EXPECT_EQ(countedIn("g.store[2]").value, 101);
-    EXPECT_EQ(countedIn("g.store[5]").value, 102);
-    EXPECT_EQ(countedIn("h.store[2]").value, 1);
+    EXPECT_EQ(held("g.datas[2]"), "copy of two");
+    EXPECT_EQ(held("g.datas[5]"), "copy of five");
+    EXPECT_EQ(held("h.datas[2]"), "two");
 
-    store("h.store[5]", 13);
+    store("h.datas[5]", "unique");
     EXPECT_THAT(error("duplicate h"), HasSubstr("the data of 'h' cannot be copied"));
-    EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("not 13")));
-    EXPECT_EQ(print("ls -type testHolder"), "h\ng"); // nothing half-made stays
+    EXPECT_THAT(takeMessages(), ElementsAre(HasSubstr("there is but one")));
+    EXPECT_EQ(print("ls -type fileNode"), "h\ng"); // nothing half-made stays
 
-    EXPECT_THAT(print("loadPlugin -query"), HasSubstr("holders"));
-    EXPECT_THAT(error("unloadPlugin holders"), HasSubstr("unloadPlugin: "));
-    print("deleteNode h g; unloadPlugin holders");
+    EXPECT_THAT(print("loadPlugin -query"), HasSubstr("fileNodes"));
+    EXPECT_THAT(error("unloadPlugin fileNodes"), HasSubstr("unloadPlugin: "));
+    print("deleteNode h g; unloadPlugin fileNodes");
     expectErrors({
-        {"createNode testHolder", "there is no node type 'testHolder'"},
-        {"unloadPlugin holders", "holders"},
+        {"createNode fileNode", "there is no node type 'fileNode'"},
+        {"unloadPlugin fileNodes", "fileNodes"},
         {"loadPlugin /no/such/plugin.so", "/no/such/plugin.so"},
         {"loadPlugin", "argument 1 (text) is missing"},
+    });
+}
+
+TEST_F(GraphCommands, MeshInfoGivesSizeAndDistance) {
+    const auto makeMesh = [](const std::string& name, const HPointArray& points) {
+        HFnMeshData mesh;
+        mesh.create(points, HIntArray{3}, HIntArray{0, 1, 2});
+        create("mesh", name);
+        EXPECT_EQ(text(plug(name + ".inMesh").setHObject(mesh.object())), "");
+    };
+    makeMesh("a", {HPoint(0, 0, 0), HPoint(1, 0, 0), HPoint(0, -2, 0.5)});
+    makeMesh("b", {HPoint(0, 0, 0), HPoint(1, 3, 4), HPoint(0, -2, 1.5)});
+    makeMesh("larger", HPointArray(4));
+    create("mesh", "hollow");
+    expectPrints({
+        {"meshInfo a.outMesh", "3 vertices, 1 polygon, from 0 -2 0 to 1 0 0.5"},
+        {"meshInfo -to b.outMesh a.outMesh", "mean distance 2, largest 5 at vertex 1"},
+    });
+    expectErrors({
+        {"meshInfo -to larger.outMesh a.outMesh", "3 vertices"},
+        {"meshInfo hollow.outMesh", "'hollow.outMesh' holds no mesh"},
+        {"meshInfo time1.outTime", "'time1.outTime' holds no mesh"},
     });
 }
 

@@ -197,6 +197,9 @@ TEST(Script, FilesAreReadAndNamed) {
 
 TEST(Results, OfEachKindArePrintedAndRead) {
     using Made = std::function<HStatus()>;
+    const HIntArray integers{1, 2};
+    const HDoubleArray numbers{0.5, 1e30};
+    const HStringArray texts{"a b", "c"};
     const std::vector<std::tuple<Made, HCommandResult::Type, std::string>> cases{
         {[] { return HStatus(); }, HCommandResult::kInvalid, ""},
         {[] { return HPxCommand::setResult(-3); }, HCommandResult::kInt, "-3"},
@@ -204,18 +207,9 @@ TEST(Results, OfEachKindArePrintedAndRead) {
         {[] { return HPxCommand::setResult(true); }, HCommandResult::kBool, "true"},
         {[] { return HPxCommand::setResult(0.1); }, HCommandResult::kDouble, "0.1"},
         {[] { return HPxCommand::setResult("a b"); }, HCommandResult::kString, "a b"},
-        {[] {
-             return HPxCommand::setResult(HIntArray{1, 2});
-         },
-         HCommandResult::kIntArray, "1 2"},
-        {[] {
-             return HPxCommand::setResult(HDoubleArray{0.5, 1e30});
-         },
-         HCommandResult::kDoubleArray, "0.5 1e+30"},
-        {[] {
-             return HPxCommand::setResult(HStringArray{"a b", "c"});
-         },
-         HCommandResult::kStringArray, "a b\nc"},
+        {[&] { return HPxCommand::setResult(integers); }, HCommandResult::kIntArray, "1 2"},
+        {[&] { return HPxCommand::setResult(numbers); }, HCommandResult::kDoubleArray, "0.5 1e+30"},
+        {[&] { return HPxCommand::setResult(texts); }, HCommandResult::kStringArray, "a b\nc"},
     };
     for (const auto& [made, kind, printed] : cases) {
         HCommandResult::Type seen = HCommandResult::kInvalid;

@@ -2,32 +2,23 @@
 #pragma once
 
 #include "host/files/fileNodes.h"
+#include "host/support/SceneTest.h"
 
-#include "openquarn_app/Messages.h"
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/SceneFile.h"
-#include "openquarn_app/Session.h"
-
-#include <gmock/gmock.h>
-#include <gtest/gtest.h>
 
 /// A test with an open session, the types of scene file tests, and no message that it did not expect.
-class FileTest : public ::testing::Test {
+class FileTest : public SceneTest {
 protected:
-    FileTest() {
-        previous_ =
-            OpenQuarn::setMessageSink([this](const OpenQuarn::Message& message) { messages_.push_back(message.text); });
-        fileNodes::registerTypes();
-    }
+    FileTest() { fileNodes::registerTypes(); }
 
-public:
-    ~FileTest() override {
-        EXPECT_THAT(messages_, ::testing::IsEmpty());
-        OpenQuarn::setMessageSink(std::move(previous_));
+    /// What was shown since the last call, without its severity.
+    std::vector<std::string> takeMessages() {
+        std::vector<std::string> texts = SceneTest::takeMessages();
+        for (std::string& text : texts)
+            text.erase(0, text.find(": ") + 2);
+        return texts;
     }
-
-protected:
-    std::vector<std::string> takeMessages() { return std::exchange(messages_, {}); }
 
     std::string saved() {
         std::string text;
@@ -42,10 +33,4 @@ protected:
         EXPECT_EQ(takeMessages(), outcome.warnings) << "the sink gets the warnings; the error is the caller's to show";
         return outcome.ok ? outcome.warnings : std::vector<std::string>{outcome.error};
     }
-
-    OpenQuarn::Session session;
-
-private:
-    std::vector<std::string> messages_;
-    OpenQuarn::MessageSink previous_;
 };

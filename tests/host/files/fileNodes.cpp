@@ -1,18 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "host/files/fileNodes.h"
 
-#include "openquarn/HDGModifier.h"
+#include "host/support/attributes.h"
+
 #include "openquarn/HExternalContentInfoTable.h"
 #include "openquarn/HExternalContentLocationTable.h"
 #include "openquarn/HFileIO.h"
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnData.h"
 #include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HFnPlugin.h"
 #include "openquarn/HPxData.h"
-#include "openquarn/HPxNode.h"
-#include "openquarn/HSelectionList.h"
-#include "openquarn_app/Plugins.h"
+#include "openquarn_app/SceneFile.h"
 
 #include <limits>
 #include <ostream>
@@ -24,12 +21,13 @@ bool throwing = false;
 
 namespace {
 
+using namespace testAttributes;
+
 constexpr HTypeId nodeId{0x7e570011};
 constexpr HTypeId dataId{0x7e570012};
 
 class FileData : public HPxData {
 public:
-    static HPxData* creator() { return new FileData; }
     HStatus readASCII(const HString& written) override {
         text = written.asStdString();
         return text.rfind("bad", 0) == 0 ? HStatus(HStatus::kFailure, "the text is bad") : HStatus();
@@ -38,18 +36,16 @@ public:
         stream << text;
         return text.rfind("shy", 0) == 0 ? HStatus(HStatus::kFailure, "the data is shy") : HStatus();
     }
-    void copy(const HPxData&) override {}
+    void copy(const HPxData& source) override {
+        text = "copy of " + static_cast<const FileData&>(source).text;
+        if (text == "copy of unique")
+            throw std::runtime_error("there is but one");
+    }
     HTypeId typeId() const override { return dataId; }
     HString name() const override { return "fileData"; }
     std::string text;
 };
 
-HObject number(const char* name, HFnNumericData::Type kind, double value = 0.0) {
-    return HFnNumericAttribute().create(name, name, kind, value);
-}
-HObject real(const char* name, double value = 0.0) {
-    return number(name, HFnNumericData::kDouble, value);
-}
 HObject typed(const char* name, HFnData::Type kind, const HObject& value = {}) {
     return HFnTypedAttribute().create(name, name, kind, value);
 }
@@ -61,21 +57,6 @@ HObject messageAttribute(const char* name) {
 }
 HObject matrix(const char* name) {
     return HFnMatrixAttribute().create(name, name);
-}
-HObject arrayOf(const HObject& attribute) {
-    HFnAttribute(attribute).setArray(true);
-    return attribute;
-}
-HObject compound(const char* name, const std::vector<HObject>& children) {
-    HFnCompoundAttribute set;
-    HObject made = set.create(name, name);
-    for (const HObject& child : children)
-        set.addChild(child);
-    return made;
-}
-HObject output(const HObject& attribute) {
-    HFnAttribute(attribute).setWritable(false);
-    return attribute;
 }
 HObject unstored(const HObject& attribute) {
     HFnAttribute(attribute).setStorable(false);
@@ -91,8 +72,6 @@ HObject limited(const HObject& attribute, double min, double max) {
 
 class FileNode : public HPxNode {
 public:
-    static HPxNode* creator() { return new FileNode; }
-
     static HStatus initialize() {
         HFnEnumAttribute choice;
         choice.create("choice", "choice", 1);
@@ -159,7 +138,11 @@ public:
     void getExternalContent(HExternalContentInfoTable& table) const override {
         if (throwing)
             throw std::runtime_error("no content today");
-        addExternalContentForFileAttr(table, path);
+        const HString text = HPlug(thisHObject(), path).asString();
+        if (text.asStdString().find('*') != std::string::npos)
+            table.addUnresolvedEntry("path", text, name(), OpenQuarn::filePatternRole);
+        else
+            addExternalContentForFileAttr(table, path);
     }
     void setExternalContent(const HExternalContentLocationTable& table) override {
         setExternalContentForFileAttr(path, table);
@@ -171,8 +154,8 @@ private:
 
 HStatus initialize(HObject object) {
     HFnPlugin plugin(object);
-    const HStatus status = plugin.registerData("fileData", dataId, FileData::creator);
-    return status.error() ? status : plugin.registerNode("fileNode", nodeId, FileNode::creator, FileNode::initialize);
+    const HStatus status = plugin.registerData("fileData", dataId, []() -> HPxData* { return new FileData; });
+    return status.error() ? status : plugin.registerNode("fileNode", nodeId, newNode<FileNode>, FileNode::initialize);
 }
 
 HStatus uninitialize(HObject object) {
@@ -190,23 +173,6 @@ void registerTypes() {
 
 HObject create(const std::string& name) {
     return HFnDependencyNode().create("fileNode", name);
-}
-
-HPlug plug(const std::string& name) {
-    HSelectionList list;
-    HPlug found;
-    if (!list.add(HString(name)).error())
-        list.getPlug(0, found);
-    return found;
-}
-
-void connect(const std::string& source, const std::string& destination) {
-    HDGModifier modifier;
-    HStatus status = modifier.connect(plug(source), plug(destination));
-    if (!status.error())
-        status = modifier.doIt();
-    if (status.error())
-        throw std::runtime_error(status.errorString().asStdString());
 }
 
 HObject makeData(const std::string& text) {

@@ -23,6 +23,8 @@ using namespace fileNodes;
 using Random = std::mt19937;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
+using testNodes::connect;
+using testNodes::plug;
 
 std::string bits(double value) {
     std::ostringstream text;
@@ -306,23 +308,6 @@ TEST_F(RoundTrip, DataThatItsPluginCannotWriteIsReported) {
                                                                    "the data is shy")));
     EXPECT_EQ(takeMessages(), outcome.warnings);
     EXPECT_THAT(text, ::testing::Not(HasSubstr("\"data\"")));
-}
-
-TEST_F(RoundTrip, LongChainsAndWideArraysComeBack) {
-    constexpr int count = 2000;
-    for (int i = 0; i < count; ++i) {
-        create("n" + std::to_string(i));
-        if (i > 0)
-            connect("n" + std::to_string(i - 1) + ".out", "n" + std::to_string(i) + ".real");
-    }
-    for (unsigned i = 0; i < 20000; ++i)
-        plug("n0.weights[" + std::to_string(3 * i) + "]").setDouble(0.5);
-    const std::string end = "n" + std::to_string(count - 1) + ".out";
-    const double value = plug(end).asDouble();
-    const std::string text = saved();
-    ASSERT_THAT(read(text), IsEmpty());
-    EXPECT_EQ(bits(plug(end).asDouble()), bits(value));
-    EXPECT_EQ(saved(), text);
 }
 
 } // namespace

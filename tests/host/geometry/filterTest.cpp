@@ -4,7 +4,6 @@
 
 #include "openquarn/HDGModifier.h"
 #include "openquarn/HFnMesh.h"
-#include "openquarn/HNodeClass.h"
 
 #include <stdexcept>
 
@@ -19,16 +18,6 @@ using ::testing::ElementsAre;
 using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 using ::testing::SizeIs;
-
-TEST_F(FilterTest, AttributesAreThoseOfTheNodeClasses) {
-    EXPECT_EQ(HNodeClass("geometryFilter").attribute("inputGeometry"), HPxGeometryFilter::inputGeometry);
-    EXPECT_EQ(HNodeClass("geometryFilter").attribute("originalGeometry"), HPxGeometryFilter::originalGeometry);
-    EXPECT_EQ(HNodeClass("deformer").attribute("weightList"), HPxDeformerNode::weightList);
-    HStatus status;
-    EXPECT_TRUE(HFnDependencyNode().create("geometryFilter", "g", &status).isNull());
-    EXPECT_TRUE(status.error()) << "a base class is no node type by itself";
-    EXPECT_TRUE(create("testDeformer").hasFn(HFn::kGeometryFilter));
-}
 
 TEST_F(FilterTest, EnvelopeScalesAndReachesEveryGeometry) {
     create("testDeformer", "d");

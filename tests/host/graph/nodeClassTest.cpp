@@ -1,12 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 // What a node type refuses while it is put together, and that it is whole afterwards.
 #include "host/support/SceneTest.h"
+#include "host/support/attributes.h"
 
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HFnPlugin.h"
 #include "openquarn/HGlobal.h"
-#include "openquarn_app/Plugins.h"
 
 #include <cmath>
 #include <functional>
@@ -42,16 +40,8 @@ HStatus addWithClashes() {
     return HPxNode::attributeAffects(first, last);
 }
 
-HStatus registerClash(HObject plugin) {
-    return HFnPlugin(plugin).registerNode(
-        "clash", 0x7111, []() -> HPxNode* { return new HPxNode; }, addWithClashes);
-}
-HStatus deregisterClash(HObject plugin) {
-    return HFnPlugin(plugin).deregisterNode(0x7111);
-}
-
 TEST_F(NodeClassTest, ARefusedAttributeLeavesNothingBehind) {
-    OpenQuarn::addPlugin("clash", registerClash, deregisterClash);
+    testAttributes::addType<HPxNode, addWithClashes, 0x7111>("clash");
     HFnDependencyNode node;
     ASSERT_FALSE(node.create("clash").isNull());
     for (const char* name : {"group", "g", "inside", "other", "outer", "o", "inner", "deep"})
@@ -65,23 +55,16 @@ TEST_F(NodeClassTest, ARefusedAttributeLeavesNothingBehind) {
 // makes another node before its own, and deletes itself when it is told to
 class Nested : public HPxNode {
 public:
-    static HPxNode* creator() {
-        HFnDependencyNode().create("testSum", "inner");
-        return new Nested;
-    }
+    Nested() { HFnDependencyNode().create("testSum", "inner"); }
     void postConstructor() override {
         if (suicidal)
             HGlobal::executeCommand("deleteNode " + name());
     }
-    static bool suicidal;
+    static inline bool suicidal = false;
 };
-bool Nested::suicidal = false;
 
 TEST_F(NodeClassTest, CreatorsMayCreateAndConstructorsMayDelete) {
-    OpenQuarn::addPlugin(
-        "nested",
-        [](HObject plugin) { return HFnPlugin(plugin).registerNode("nested", 0x7112, Nested::creator, nullptr); },
-        [](HObject plugin) { return HFnPlugin(plugin).deregisterNode(0x7112); });
+    testAttributes::addType<Nested, nullptr, 0x7112>("nested");
     HFnDependencyNode node;
     node.create("nested", "outer");
     ASSERT_NE(node.userNode(), nullptr);
@@ -140,37 +123,29 @@ TEST_F(NodeClassTest, DefinitionsThatMakeNoSenseAreRefusedByName) {
 
 // a compound with a child, and what is declared: (affecting, affected), "tree" or a refusal
 HStatus declareDoubtfully() {
-    HFnCompoundAttribute pair;
     const HObject a = made("a", "a");
-    pair.create("pair", "p");
-    pair.addChild(a);
+    const HObject pair = testAttributes::compound("pair", {a});
     const HObject out = made("out", "o"), other = made("other", "ot"), third = made("third", "t");
-    for (const HObject& attribute : {pair.object(), out, other, third})
+    for (const HObject& attribute : {pair, out, other, third})
         EXPECT_EQ(testNodes::text(HPxNode::addAttribute(attribute)), "");
     EXPECT_THAT(testNodes::text(HPxNode::attributeAffects(out, out)),
                 ::testing::HasSubstr("attribute 'out' of node type 'doubtful' cannot affect itself"));
-    EXPECT_THAT(testNodes::text(HPxNode::attributeAffects(a, pair.object())),
+    EXPECT_THAT(testNodes::text(HPxNode::attributeAffects(a, pair)),
                 ::testing::HasSubstr("attribute 'a' of node type 'doubtful' cannot affect 'pair', with which it"));
-    EXPECT_TRUE(HPxNode::attributeAffects(pair.object(), a).error());
-    HPxNode::attributeAffects(pair.object(), out);
-    HPxNode::attributeAffects(pair.object(), other);
+    EXPECT_TRUE(HPxNode::attributeAffects(pair, a).error());
+    HPxNode::attributeAffects(pair, out);
+    HPxNode::attributeAffects(pair, other);
     HPxNode::attributeAffects(a, other);
-    return HPxNode::attributeAffects(pair.object(), third, true);
+    return HPxNode::attributeAffects(pair, third, true);
 }
 
 class Thrower : public HPxNode {
 public:
-    static HPxNode* creator() { return new Thrower; }
     void postConstructor() override { throw std::runtime_error("no luck"); }
 };
 
 TEST_F(NodeClassTest, DoubtfulTypesAreWarnedOfAndNodesThatThrowAreNotLeftBehind) {
-    OpenQuarn::addPlugin(
-        "doubtful",
-        [](HObject plugin) {
-            return HFnPlugin(plugin).registerNode("doubtful", 0x7113, Thrower::creator, declareDoubtfully);
-        },
-        [](HObject plugin) { return HFnPlugin(plugin).deregisterNode(0x7113); });
+    testAttributes::addType<Thrower, declareDoubtfully, 0x7113>("doubtful");
     EXPECT_THAT(takeMessages(),
                 ::testing::ElementsAre("warning: node type 'doubtful': a change of a child of 'pair' does "
                                        "not count for 'out': neither the children affect it nor the "

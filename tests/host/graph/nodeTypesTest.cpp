@@ -1,14 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 // What an application is told of node types is what their plug-in made.
 #include "host/support/SceneTest.h"
+#include "host/support/attributes.h"
 
-#include "openquarn/HFnAttribute.h"
-#include "openquarn/HFnPlugin.h"
 #include "openquarn/HPxDeformerNode.h"
 #include "openquarn_app/NodeTypes.h"
-#include "openquarn_app/Plugins.h"
 
-#include <functional>
 #include <stdexcept>
 
 namespace {
@@ -42,31 +39,19 @@ HStatus addEverything() {
     typed.setIndexMatters(false);
     typed.setUsesArrayDataBuilder(true);
     typed.setDisconnectBehavior(HFnAttribute::kReset);
-    HFnCompoundAttribute inner, outer;
-    inner.create("inner", "in");
-    inner.addChild(path);
-    inner.addChild(own);
-    outer.create("outer", "ou");
-    outer.addChild(inner.object());
-    outer.addChild(choice.object());
-    HPxNode::addAttribute(outer.object());
+    const HObject outer =
+        testAttributes::compound("outer", {testAttributes::compound("inner", {path, own}), choice.object()});
+    HPxNode::addAttribute(outer);
     HPxNode::addAttribute(ratio);
     HPxNode::attributeAffects(ratio, HPxGeometryFilter::outputGeom);
     HPxNode::attributeAffects(HPxGeometryFilter::inputGeometry, HPxGeometryFilter::outputGeom);
-    return HPxNode::attributeAffects(outer.object(), ratio, true);
+    return HPxNode::attributeAffects(outer, ratio, true);
 }
 
 class NodeTypesTest : public SceneTest {
 protected:
     NodeTypesTest() {
-        OpenQuarn::addPlugin(
-            "everything",
-            [](HObject plugin) {
-                return HFnPlugin(plugin).registerNode(
-                    "everything", 0x7190, []() -> HPxNode* { return new HPxDeformerNode; }, addEverything,
-                    HPxNode::kDeformerNode);
-            },
-            [](HObject plugin) { return HFnPlugin(plugin).deregisterNode(0x7190); });
+        testAttributes::addType<HPxDeformerNode, addEverything, 0x7190, HPxNode::kDeformerNode>("everything");
     }
 
     static OpenQuarn::AttributeInfo attribute(const std::string& name) {
@@ -77,13 +62,35 @@ protected:
     }
 };
 
-TEST_F(NodeTypesTest, AttributesComeInTheirOrderBehindTheInheritedOnes) {
+std::string flagsOf(const OpenQuarn::AttributeInfo& info) {
+    const std::pair<bool, const char*> flags[] = {
+        {info.array, " array"},
+        {info.usesArrayDataBuilder, " builder"},
+        {!info.indexMatters, " anyIndex"},
+        {!info.readable, " unread"},
+        {!info.writable, " unwritten"},
+        {!info.connectable, " unconnected"},
+        {!info.storable, " unstored"},
+        {info.keyable, " keyable"},
+        {info.hidden, " hidden"},
+        {info.usedAsFilename, " file"},
+        {info.disconnectBehavior == HFnAttribute::kReset, " reset"},
+    };
+    std::string text;
+    for (const auto& [isSet, name] : flags)
+        text += isSet ? name : "";
+    return text;
+}
+
+TEST_F(NodeTypesTest, AttributesComeInTheirOrderBehindTheInheritedOnesWithTheirFlags) {
     std::vector<std::string> all;
     for (const OpenQuarn::AttributeInfo& info : OpenQuarn::attributesOf("everything"))
-        all.push_back(info.parent + (info.inherited ? "<" : ".") + info.name);
+        all.push_back(info.parent + (info.inherited ? "<" + info.name : "." + info.name + flagsOf(info)));
     EXPECT_THAT(all, ElementsAre("<message", "<input", "input<inputGeometry", "input<componentTagExpression",
                                  "<originalGeometry", "<outputGeom", "<envelope", "<weightList", "weightList<weights",
-                                 ".outer", "outer.inner", "inner.path", "inner.own", "outer.choice", ".ratio"));
+                                 ".outer", "outer.inner", "inner.path file",
+                                 "inner.own array builder anyIndex unread unconnected unstored hidden reset",
+                                 "outer.choice keyable", ".ratio"));
 }
 
 TEST_F(NodeTypesTest, ValuesAreThoseOfTheDefinition) {
@@ -101,29 +108,6 @@ TEST_F(NodeTypesTest, ValuesAreThoseOfTheDefinition) {
     EXPECT_EQ(attribute("own").valueType, "pluginData");
     EXPECT_EQ(attribute("own").pluginDataType, HTypeId(0x7191));
     EXPECT_TRUE(attribute("own").defaultData.isNull());
-}
-
-// of each flag, the attributes that have it
-TEST_F(NodeTypesTest, FlagsAreThoseOfTheDefinition) {
-    using Info = OpenQuarn::AttributeInfo;
-    const auto with = [](bool Info::*flag) {
-        std::string names;
-        for (const char* name : {"outer", "inner", "path", "own", "choice", "ratio"})
-            names += attribute(name).*flag ? std::string(names.empty() ? "" : " ") + name : "";
-        return names;
-    };
-    EXPECT_EQ(with(&Info::array), "own");
-    EXPECT_EQ(with(&Info::readable), "outer inner path choice ratio");
-    EXPECT_EQ(with(&Info::writable), "outer inner path own choice ratio");
-    EXPECT_EQ(with(&Info::connectable), "outer inner path choice ratio");
-    EXPECT_EQ(with(&Info::storable), "outer inner path choice ratio");
-    EXPECT_EQ(with(&Info::keyable), "choice");
-    EXPECT_EQ(with(&Info::hidden), "own");
-    EXPECT_EQ(with(&Info::indexMatters), "outer inner path choice ratio");
-    EXPECT_EQ(with(&Info::usesArrayDataBuilder), "own");
-    EXPECT_EQ(with(&Info::usedAsFilename), "path");
-    EXPECT_EQ(attribute("own").disconnectBehavior, HFnAttribute::kReset);
-    EXPECT_EQ(attribute("path").disconnectBehavior, HFnAttribute::kNothing);
 }
 
 TEST_F(NodeTypesTest, DependenciesStandAsTheyWereDeclared) {

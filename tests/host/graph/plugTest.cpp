@@ -219,16 +219,10 @@ TEST_F(Plug, StaleHandlesAnswerWithAStatus) {
     EXPECT_EQ(set.userNode(), nullptr);
 }
 
-struct Event {
-    int mask;
-    std::string plug, other;
-    bool operator==(const Event& event) const {
-        return mask == event.mask && plug == event.plug && other == event.other;
-    }
-};
+using Event = std::pair<int, std::string>; // mask, and both plugs
 
 void record(int mask, HPlug& changed, HPlug& other, void* data) {
-    static_cast<std::vector<Event>*>(data)->push_back({mask, changed.name().asStdString(), other.name().asStdString()});
+    static_cast<std::vector<Event>*>(data)->emplace_back(mask, (changed.name() + " " + other.name()).asStdString());
 }
 
 TEST_F(Plug, ChangesAreTold) {
@@ -245,11 +239,11 @@ TEST_F(Plug, ChangesAreTold) {
     using M = HNodeMessage;
     EXPECT_THAT(
         events,
-        ElementsAre(Event{M::kAttributeArrayAdded, "n.values[3]", ""}, Event{M::kAttributeSet, "n.values[3]", ""},
-                    Event{M::kAttributeLocked, "n.bare", ""},
-                    Event{M::kConnectionMade | M::kIncomingDirection | M::kOtherPlugSet, "n.values[3]", "up.total"},
-                    Event{M::kConnectionBroken | M::kIncomingDirection | M::kOtherPlugSet, "n.values[3]", "up.total"},
-                    Event{M::kAttributeArrayRemoved, "n.values[3]", ""}));
+        ElementsAre(Event{M::kAttributeArrayAdded, "n.values[3] "}, Event{M::kAttributeSet, "n.values[3] "},
+                    Event{M::kAttributeLocked, "n.bare "},
+                    Event{M::kConnectionMade | M::kIncomingDirection | M::kOtherPlugSet, "n.values[3] up.total"},
+                    Event{M::kConnectionBroken | M::kIncomingDirection | M::kOtherPlugSet, "n.values[3] up.total"},
+                    Event{M::kAttributeArrayRemoved, "n.values[3] "}));
     events.clear();
     EXPECT_EQ(text(HMessage::removeCallback(id)), "");
     EXPECT_EQ(text(HMessage::removeCallback(id)),

@@ -21,28 +21,24 @@ using ::testing::HasSubstr;
 using Call = std::function<HStatus(HDataBlock&)>;
 using Place = HStatus (*)(const Call&);
 
-/// What the call answers inside of compute() of "n".
-HStatus inCompute(const Call& call) {
+/// What the call answers inside of compute() of "n", of several plugs beside the others.
+HStatus answerIn(const HPlugArray& plugs, const Call& call) {
     HStatus answer;
     Hooks::compute = [&](HPxNode& node, const HPlug& asked, HDataBlock& block) {
         if (node.name() == "n")
             answer = call(block);
         return block.outputValue(asked).set(1.0);
     };
-    EXPECT_EQ(text(OpenQuarn::evaluate(plug("n.out"))), "");
+    EXPECT_EQ(text(OpenQuarn::evaluate(plugs, plugs.size() > 1)), "");
     return answer;
 }
 
-/// The same while another node is computed beside it.
+HStatus inCompute(const Call& call) {
+    return answerIn({plug("n.out")}, call);
+}
+
 HStatus inParallel(const Call& call) {
-    HStatus answer;
-    Hooks::compute = [&](HPxNode& node, const HPlug& asked, HDataBlock& block) {
-        if (node.name() == "n")
-            answer = call(block);
-        return block.outputValue(asked).set(1.0);
-    };
-    EXPECT_EQ(text(OpenQuarn::evaluate({plug("other.out"), plug("n.out")}, true)), "");
-    return answer;
+    return answerIn({plug("other.out"), plug("n.out")}, call);
 }
 
 /// On a thread of the node's own, for which compute() waits.

@@ -1,13 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "host/support/testDeformers.h"
 
+#include "host/support/attributes.h"
 #include "host/support/testNodes.h"
 
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HFnMesh.h"
-#include "openquarn/HFnPlugin.h"
-#include "openquarn_app/Plugins.h"
 
 #include <gtest/gtest.h>
 
@@ -20,10 +18,8 @@ HObject pushAttribute;
 
 class TestDeformer : public HPxDeformerNode {
 public:
-    static HPxNode* creator() { return new TestDeformer; }
-
     static HStatus initialize() {
-        pushAttribute = HFnNumericAttribute().create("push", "psh", HFnNumericData::kDouble, 1.0);
+        pushAttribute = testAttributes::real("push", 1.0);
         addAttribute(pushAttribute);
         return attributeAffects(pushAttribute, outputGeom);
     }
@@ -36,31 +32,11 @@ public:
     }
 };
 
-constexpr unsigned deformerId = 0x7e570011;
-
-HStatus initializePlugin(HObject object) {
-    HFnPlugin plugin(object, "tests", "1", "Any");
-    return plugin.registerNode("testDeformer", deformerId, TestDeformer::creator, TestDeformer::initialize,
-                               HPxNode::kDeformerNode);
-}
-
-HStatus uninitializePlugin(HObject object) {
-    return HFnPlugin(object).deregisterNode(deformerId);
-}
-
 } // namespace
-
-std::function<HStatus(HPxDeformerNode&, HDataBlock&, unsigned, bool)> Hooks::initialize;
-std::function<HStatus(HPxDeformerNode&, HDataBlock&, HItGeometry&, unsigned)> Hooks::deform = pushPoints;
-
-void Hooks::reset() {
-    initialize = nullptr;
-    deform = pushPoints;
-}
 
 void registerTypes() {
     Hooks::reset();
-    OpenQuarn::addPlugin("testDeformers", initializePlugin, uninitializePlugin);
+    testAttributes::addType<TestDeformer, TestDeformer::initialize, 0x7e570011, HPxNode::kDeformerNode>("testDeformer");
 }
 
 HStatus pushPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {

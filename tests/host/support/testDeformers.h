@@ -15,16 +15,16 @@ namespace testDeformers {
 ///   push  double, default 1, affects outputGeom
 void registerTypes();
 
-struct Hooks {
-    /// initializeMultiIndex() of every test deformer; nothing by default.
-    static std::function<HStatus(HPxDeformerNode&, HDataBlock&, unsigned, bool)> initialize;
-    /// deform() of every test deformer; pushPoints() by default.
-    static std::function<HStatus(HPxDeformerNode&, HDataBlock&, HItGeometry&, unsigned)> deform;
-    static void reset();
-};
-
 /// Moves each affected vertex by push * envelope * weight along x; touches nothing when the envelope is 0.
 HStatus pushPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index);
+
+struct Hooks {
+    /// initializeMultiIndex() of every test deformer; nothing by default.
+    static inline std::function<HStatus(HPxDeformerNode&, HDataBlock&, unsigned, bool)> initialize;
+    /// deform() of every test deformer.
+    static inline std::function<HStatus(HPxDeformerNode&, HDataBlock&, HItGeometry&, unsigned)> deform = pushPoints;
+    static void reset() { initialize = nullptr, deform = pushPoints; }
+};
 
 /// `columns` x `rows` vertices one apart in the xy plane, row by row, in quads; z = `depth`.
 HObject grid(unsigned columns, unsigned rows, double depth = 0.0);

@@ -1,38 +1,19 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "host/support/testNodes.h"
 
+#include "host/support/attributes.h"
+
 #include "openquarn/HDGModifier.h"
-#include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnDependencyNode.h"
-#include "openquarn/HFnPlugin.h"
 #include "openquarn/HMatrix.h"
 #include "openquarn/HSelectionList.h"
-#include "openquarn_app/Plugins.h"
 
 #include <gtest/gtest.h>
 
 namespace testNodes {
 namespace {
 
-HObject makeNumber(const char* name, HFnNumericData::Type kind, double value = 0.0) {
-    return HFnNumericAttribute().create(name, name, kind, value);
-}
-
-HObject makeDouble(const char* name, double value = 0.0) {
-    return makeNumber(name, HFnNumericData::kDouble, value);
-}
-
-HObject makeOutput(const HObject& attribute) {
-    EXPECT_FALSE(HFnAttribute(attribute).setWritable(false).error());
-    return attribute;
-}
-
-HObject makeArray(const HObject& attribute, bool builder = false) {
-    HFnAttribute set(attribute);
-    EXPECT_FALSE(set.setArray(true).error());
-    EXPECT_FALSE(set.setUsesArrayDataBuilder(builder).error());
-    return attribute;
-}
+using namespace testAttributes;
 
 HObject onDisconnect(const HObject& attribute, HFnAttribute::DisconnectBehavior behavior) {
     EXPECT_FALSE(HFnAttribute(attribute).setDisconnectBehavior(behavior).error());
@@ -50,17 +31,15 @@ void affects(const HObject& from, const HObject& to, bool tree = false) {
 
 class SumNode : public HPxNode {
 public:
-    static HPxNode* creator() { return new SumNode; }
-
     static HStatus initialize() {
-        values = onDisconnect(makeArray(makeDouble("values")), HFnAttribute::kDelete);
-        scale = makeDouble("scale", 1.0);
+        values = onDisconnect(arrayOf(real("values")), HFnAttribute::kDelete);
+        scale = real("scale", 1.0);
         HFnNumericAttribute limits(scale);
         limits.setMin(-100.0);
         limits.setMax(100.0);
-        const HObject kept = makeDouble("kept");
-        const HObject reset = onDisconnect(makeDouble("reset", 7.0), HFnAttribute::kReset);
-        skip = makeNumber("skip", HFnNumericData::kBoolean);
+        const HObject kept = real("kept");
+        const HObject reset = onDisconnect(real("reset", 7.0), HFnAttribute::kReset);
+        skip = number("skip", HFnNumericData::kBoolean);
         const HObject textAttribute = HFnTypedAttribute().create("text", "text", HFnData::kString);
         const HObject matrix = HFnMatrixAttribute().create("matrix", "matrix");
         HFnEnumAttribute choice;
@@ -68,14 +47,15 @@ public:
         choice.addField("Zero", 0);
         choice.addField("One", 1);
         choice.addField("Five", 5);
-        total = makeOutput(makeDouble("total"));
-        rounded = makeOutput(makeNumber("rounded", HFnNumericData::kInt));
+        total = output(real("total"));
+        rounded = output(number("rounded", HFnNumericData::kInt));
         add({values, scale, kept, reset, skip, textAttribute, matrix, choice.object(),
-             makeNumber("short16", HFnNumericData::kShort), makeNumber("int32", HFnNumericData::kInt),
-             makeNumber("single", HFnNumericData::kFloat), makeDouble("bare"), total, rounded});
-        for (const HObject& input : {values, scale, skip})
-            for (const HObject& output : {total, rounded})
-                affects(input, output);
+             number("short16", HFnNumericData::kShort), number("int32", HFnNumericData::kInt),
+             number("single", HFnNumericData::kFloat), real("bare"), total, rounded});
+        for (const HObject& input : {values, scale, skip}) {
+            affects(input, total);
+            affects(input, rounded);
+        }
         return HStatus::kSuccess;
     }
 
@@ -104,23 +84,14 @@ private:
 
 class ListsNode : public HPxNode {
 public:
-    static HPxNode* creator() { return new ListsNode; }
-
     static HStatus initialize() {
-        items = onDisconnect(makeArray(makeDouble("items")), HFnAttribute::kDelete);
-        HFnCompoundAttribute compound;
-        lists = compound.create("lists", "lists");
-        compound.addChild(items);
-        compound.addChild(makeDouble("weight"));
-        makeArray(lists, true);
-        onDisconnect(lists, HFnAttribute::kDelete);
-        const HObject shallow = compound.create("shallow", "shallow");
-        compound.addChild(makeDouble("leaf"));
-        const HObject own = makeDouble("own");
-        compound.addChild(own);
-        const HObject shallowOut = makeOutput(makeDouble("shallowOut"));
-        flat = makeOutput(makeArray(makeDouble("flat"), true));
-        add({lists, makeDouble("note"), shallow, flat, shallowOut});
+        items = onDisconnect(arrayOf(real("items")), HFnAttribute::kDelete);
+        lists = onDisconnect(arrayOf(compound("lists", {items, real("weight")}), true), HFnAttribute::kDelete);
+        const HObject own = real("own");
+        const HObject shallow = compound("shallow", {real("leaf"), own});
+        const HObject shallowOut = output(real("shallowOut"));
+        flat = output(arrayOf(real("flat"), true));
+        add({lists, real("note"), shallow, flat, shallowOut});
         affects(lists, flat, true);
         affects(shallow, shallowOut);
         affects(own, shallowOut);
@@ -151,13 +122,11 @@ private:
 
 class CaseNode : public HPxNode {
 public:
-    static HPxNode* creator() { return new CaseNode; }
-
     static HStatus initialize() {
-        const HObject in = makeDouble("in");
-        const HObject ins = makeArray(makeDouble("ins"));
-        const HObject out = makeOutput(makeDouble("out"));
-        const HObject outs = makeOutput(makeArray(makeDouble("outs"), true));
+        const HObject in = real("in");
+        const HObject ins = arrayOf(real("ins"));
+        const HObject out = output(real("out"));
+        const HObject outs = output(arrayOf(real("outs"), true));
         add({in, ins, out, outs});
         for (const HObject& input : {in, ins})
             for (const HObject& output : {out, outs})
@@ -184,23 +153,16 @@ private:
     }
 };
 
-HStatus passOn(HPxNode& node, const HPlug& plug, HDataBlock& block) {
-    const HFnDependencyNode set(node.thisHObject());
-    if (plug != set.attribute("out"))
-        return HStatus::kUnknownParameter;
-    return block.outputValue(plug).set(block.inputValue(set.attribute("in")).asDouble());
-}
-
 HStatus initializePlugin(HObject object) {
-    HFnPlugin plugin(object, "tests", "1", "Any");
-    EXPECT_EQ(text(plugin.registerNode("testSum", 0x7e570001, SumNode::creator, SumNode::initialize)), "");
-    EXPECT_EQ(text(plugin.registerNode("testLists", 0x7e570002, ListsNode::creator, ListsNode::initialize)), "");
-    EXPECT_EQ(text(plugin.registerNode("testCase", 0x7e570003, CaseNode::creator, CaseNode::initialize)), "");
+    HFnPlugin plugin(object);
+    EXPECT_EQ(text(plugin.registerNode("testSum", 0x7e570001, newNode<SumNode>, SumNode::initialize)), "");
+    EXPECT_EQ(text(plugin.registerNode("testLists", 0x7e570002, newNode<ListsNode>, ListsNode::initialize)), "");
+    EXPECT_EQ(text(plugin.registerNode("testCase", 0x7e570003, newNode<CaseNode>, CaseNode::initialize)), "");
     return HStatus::kSuccess;
 }
 
 HStatus uninitializePlugin(HObject object) {
-    HFnPlugin plugin(object, "tests", "1", "Any");
+    HFnPlugin plugin(object);
     for (const unsigned id : {0x7e570001U, 0x7e570002U, 0x7e570003U})
         EXPECT_EQ(text(plugin.deregisterNode(id)), "");
     return HStatus::kSuccess;
@@ -208,14 +170,11 @@ HStatus uninitializePlugin(HObject object) {
 
 } // namespace
 
-std::function<HStatus(HPxNode&, const HPlug&, HDataBlock&)> Hooks::compute = passOn;
-std::function<void(const char*, const HPlug&, const HPlug&, bool)> Hooks::connection;
-std::function<HStatus(const HPlug&, HPlugArray&)> Hooks::dependents;
-
-void Hooks::reset() {
-    compute = passOn;
-    connection = nullptr;
-    dependents = nullptr;
+HStatus passOn(HPxNode& node, const HPlug& plug, HDataBlock& block) {
+    const HFnDependencyNode set(node.thisHObject());
+    if (plug != set.attribute("out"))
+        return HStatus::kUnknownParameter;
+    return block.outputValue(plug).set(block.inputValue(set.attribute("in")).asDouble());
 }
 
 void registerTypes() {

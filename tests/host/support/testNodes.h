@@ -28,13 +28,15 @@ void registerTypes();
 ///
 /// "testCase": runs Hooks::compute for its output.
 ///   in  double     ins  double array      out  double output     outs  double array output (in, ins affect both)
+HStatus passOn(HPxNode& node, const HPlug& plug, HDataBlock& block); ///< writes out = in
+
 struct Hooks {
-    /// compute() of every "testCase" node; the default writes out = in.
-    static std::function<HStatus(HPxNode&, const HPlug&, HDataBlock&)> compute;
+    /// compute() of every "testCase" node.
+    static inline std::function<HStatus(HPxNode&, const HPlug&, HDataBlock&)> compute = passOn;
     /// Called from connectionMade and connectionBroken of every "testCase" node, with "made" or "broken".
-    static std::function<void(const char*, const HPlug&, const HPlug&, bool)> connection;
-    static std::function<HStatus(const HPlug&, HPlugArray&)> dependents;
-    static void reset();
+    static inline std::function<void(const char*, const HPlug&, const HPlug&, bool)> connection;
+    static inline std::function<HStatus(const HPlug&, HPlugArray&)> dependents;
+    static void reset() { compute = passOn, connection = nullptr, dependents = nullptr; }
 };
 
 /// A node of that type, or of any other; fails the test when there is none.

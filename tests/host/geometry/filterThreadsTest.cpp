@@ -1,10 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The scene of record: what it is, and that several threads give the same bits as one.
+// Several threads give the same bits as one.
 #include "host/geometry/FilterTest.h"
-#include "host/support/recordScene.h"
-
-#include "openquarn/HFnMesh.h"
-#include "openquarn_app/SceneFile.h"
 
 #include <atomic>
 #include <cmath>
@@ -17,7 +13,7 @@ namespace {
 using namespace testNodes;
 using testDeformers::Hooks;
 
-class RecordTest : public FilterTest {
+class FilterThreads : public FilterTest {
 protected:
     /// Something that depends on order, weight and position, differently for each geometry.
     static HStatus twist(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
@@ -35,9 +31,33 @@ protected:
         return status.error() ? status : iterator.setAllPositions(points);
     }
 
-    static std::vector<std::vector<HPoint>> results(const recordScene::Scene& scene) {
+    /// Three geometries through two deformers, large enough for threads to matter: of the second, every other vertex is
+    /// affected, the last one first; the third has some weights.
+    void build() {
+        for (const char* name : {"first", "second"})
+            create("testDeformer", name);
+        for (const auto& [geometry, columns] : {std::pair{0U, 32U}, std::pair{1U, 142U}, std::pair{4U, side}}) {
+            HUintArray patch;
+            for (unsigned vertex = columns * columns; vertex > 0; vertex -= 2)
+                patch.append(vertex - 1);
+            const std::string mesh = "mesh" + std::to_string(geometry);
+            testDeformers::meshNode(mesh,
+                                    testDeformers::withTag(testDeformers::grid(columns, columns), "patch", patch));
+            connect(mesh + ".outMesh", input("first", geometry));
+            connect(output("first", geometry), input("second", geometry));
+            outputs.push_back(plug(output("second", geometry)));
+        }
+        for (const std::string deformer : {"first", "second"}) {
+            plug(deformer + ".input[1].componentTagExpression").setString("patch");
+            const HPlug weights = plug(deformer + ".weightList[4].weights");
+            for (unsigned vertex = 0; vertex < side * side; vertex += deformer == "first" ? 3U : 5U)
+                weights.elementByLogicalIndex(vertex).setDouble(0.25 + 0.5 * (vertex % 7) / 7.0);
+        }
+    }
+
+    std::vector<std::vector<HPoint>> results() const {
         std::vector<std::vector<HPoint>> all;
-        for (const HPlug& output : scene.outputs)
+        for (const HPlug& output : outputs)
             all.push_back(testDeformers::points(output));
         return all;
     }
@@ -46,78 +66,37 @@ protected:
         ASSERT_EQ(a.size(), b.size());
         EXPECT_EQ(std::memcmp(a.data(), b.data(), a.size() * sizeof(HPoint)), 0);
     }
+
+    static constexpr unsigned side = 316;
+    HPlugArray outputs;
 };
 
-TEST_F(RecordTest, IsAsItSays) {
-    const recordScene::Scene scene = recordScene::build("testDeformer", "testDeformer");
-    const std::vector<unsigned> sizes = {1024, 20022, 100172};
-    for (std::size_t i = 0; i < sizes.size(); ++i) {
-        const HFnMesh mesh(scene.meshes[i]);
-        EXPECT_EQ(static_cast<unsigned>(mesh.numVertices()), sizes[i]);
-        std::set<unsigned> corners;
-        std::vector<bool> used(sizes[i]);
-        HIntArray vertices;
-        for (int polygon = 0; polygon < mesh.numPolygons(); ++polygon) {
-            ASSERT_FALSE(mesh.getPolygonVertices(polygon, vertices).error());
-            corners.insert(vertices.length());
-            for (const int vertex : vertices)
-                used[static_cast<std::size_t>(vertex)] = true;
-        }
-        EXPECT_EQ(corners, (std::set<unsigned>{3, 4, 6, 8}));
-        EXPECT_NE(std::count(used.begin(), used.end(), false), 0) << "vertices in a hole";
-    }
-    EXPECT_EQ(deformer("firstDeformer").indexMapper(1).affectCount(), 8008U);
-    EXPECT_FALSE(deformer("secondDeformer").indexMapper(1).isIdentityMap());
-    EXPECT_TRUE(deformer("secondDeformer").indexMapper(4).isIdentityMap());
-}
-
-TEST_F(RecordTest, ComesBackFromItsFileWithTheSameBits) {
+TEST_F(FilterThreads, GiveTheSameBitsAsOne) {
     Hooks::deform = twist;
-    const recordScene::Scene scene = recordScene::build("testDeformer", "testDeformer");
-    plug("firstDeformer.envelope").setDouble(0.1);
-    EXPECT_EQ(text(OpenQuarn::evaluate(scene.outputs, true)), "");
-    const auto before = results(scene);
-    std::vector<std::string> names;
-    for (const HPlug& output : scene.outputs)
-        names.push_back(output.name().asStdString());
-
-    std::string saved, savedAgain;
-    ASSERT_EQ(OpenQuarn::sceneToText(saved).error, "");
-    session.newScene();
-    ASSERT_EQ(OpenQuarn::sceneFromText(saved, "record").error, "");
-    for (std::size_t i = 0; i < names.size(); ++i)
-        expectSameBits(testDeformers::points(plug(names[i])), before[i]);
-    ASSERT_EQ(OpenQuarn::sceneToText(savedAgain).error, "");
-    EXPECT_TRUE(saved == savedAgain);
-}
-
-TEST_F(RecordTest, ThreadsGiveTheSameBitsAsOne) {
-    Hooks::deform = twist;
-    const recordScene::Scene scene = recordScene::build("testDeformer", "testDeformer");
-    EXPECT_EQ(text(OpenQuarn::evaluate(scene.outputs, false)), "");
-    const auto first = results(scene);
-    plug("firstDeformer.envelope").setDouble(0.5);
-    EXPECT_EQ(text(OpenQuarn::evaluate(scene.outputs, false)), "");
-    const auto second = results(scene);
+    build();
+    EXPECT_EQ(text(OpenQuarn::evaluate(outputs, false)), "");
+    const auto first = results();
+    plug("first.envelope").setDouble(0.5);
+    EXPECT_EQ(text(OpenQuarn::evaluate(outputs, false)), "");
+    const auto second = results();
     EXPECT_NE(std::memcmp(first[2].data(), second[2].data(), first[2].size() * sizeof(HPoint)), 0);
     for (int round = 0; round < 6; ++round) {
-        plug("firstDeformer.envelope").setDouble(round % 2 == 0 ? 1.0 : 0.5);
-        HPlugArray plugs = scene.outputs;
-        plugs.push_back(plug("secondDeformer.outputGeom")); // everything, once more, at the same time
-        plugs.push_back(plug("firstDeformer.outputGeom"));
+        plug("first.envelope").setDouble(round % 2 == 0 ? 1.0 : 0.5);
+        HPlugArray plugs = outputs;
+        plugs.push_back(plug("second.outputGeom")); // everything, once more, at the same time
+        plugs.push_back(plug("first.outputGeom"));
         OpenQuarn::ComputeWatch computes;
         EXPECT_EQ(text(OpenQuarn::evaluate(plugs, true)), "");
         for (const std::string& computed : std::set<std::string>(computes.plugs().begin(), computes.plugs().end()))
             EXPECT_EQ(std::count(computes.plugs().begin(), computes.plugs().end(), computed), 1) << computed;
-        const auto now = results(scene);
+        const auto now = results();
         for (std::size_t i = 0; i < now.size(); ++i)
             expectSameBits(now[i], (round % 2 == 0 ? first : second)[i]);
     }
 }
 
-TEST_F(RecordTest, GeometriesOfOneNodeAreDeformedAtTheSameTime) {
+TEST_F(FilterThreads, GeometriesOfOneNodeAreDeformedAtTheSameTime) {
     create("testDeformer", "d");
-    HPlugArray outputs;
     for (unsigned index = 0; index < 2; ++index) {
         set(input("d", index), testDeformers::grid(4, 4));
         outputs.push_back(plug(output("d", index)));
