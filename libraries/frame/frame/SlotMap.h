@@ -39,7 +39,8 @@ struct DrivenVertices {
         , slots(&map) {}
 
     std::size_t vertex(std::size_t k) const { return vertices ? (*vertices)[k] : k; }
-    std::size_t slot(std::size_t k) const { return slots ? (*slots)[vertex(k)] : k; }
+    // without slots there are no vertices either: "k" is as right, and sums of shapes then take a third longer
+    std::size_t slot(std::size_t k) const { return slots ? (*slots)[vertex(k)] : vertex(k); }
     /// Vertex i is among them. False for an index that no vertex has, unless all are driven.
     bool contains(std::size_t i) const { return !slots || (i < slots->size() && (*slots)[i] != quill::missingIndex); }
 

@@ -33,16 +33,18 @@ template <class Point>
 void blendPositions(Point* positions, std::size_t count, const float* weights, const Blend& blend) {
     quill::parallelFor(count, [&](std::size_t i) {
         Point& p = positions[i];
-        const bool isDriven = blend.model && blend.driven.contains(i);
-        quill::val3<float> current =
-            isDriven ? (*blend.model)[i]
-                     : quill::val3<float>(static_cast<float>(p.x), static_cast<float>(p.y), static_cast<float>(p.z));
-        if (blend.target)
-            current = current + ((*blend.target)[i] - current) * blend.targetWeight;
         const auto f = static_cast<double>(weights ? weights[i] * blend.envelope : blend.envelope);
-        p.x += (static_cast<double>(current.x) - p.x) * f;
-        p.y += (static_cast<double>(current.y) - p.y) * f;
-        p.z += (static_cast<double>(current.z) - p.z) * f;
+        const auto moveTo = [&](quill::val3<float> c) {
+            if (blend.target)
+                c = c + ((*blend.target)[i] - c) * blend.targetWeight;
+            p.x += (static_cast<double>(c.x) - p.x) * f;
+            p.y += (static_cast<double>(c.y) - p.y) * f;
+            p.z += (static_cast<double>(c.z) - p.z) * f;
+        };
+        if (blend.model && blend.driven.contains(i))
+            moveTo((*blend.model)[i]);
+        else
+            moveTo({static_cast<float>(p.x), static_cast<float>(p.y), static_cast<float>(p.z)});
     });
 }
 
