@@ -58,6 +58,7 @@ TEST_F(GpuKernels, RunOnEveryIndexOnceWhateverTheirNumber) {
         ASSERT_FALSE(done.isNull());
         EXPECT_EQ(contents<int>(buffer, items + 300), expected);
     }
+    EXPECT_EQ(Gpu::counts().launches.at("count"), 6U) << "one each, and none without an index";
     kernel.reset();
     EXPECT_FALSE(kernel.isLoaded());
     EXPECT_EQ(kernel.enqueueKernel({}, nullptr), CL_INVALID_KERNEL);
