@@ -8,8 +8,8 @@ trap 'rm -rf "$work"' EXIT
 source "$(dirname "$0")/../../support/expect.sh"
 
 # a triangle that joint "bone" moves, below "root"
-sed 's/"name":"a","children"/"name":"root","children"/; s/{"name":"a"}/{"name":"bone"}/; s/{"mesh"/{"name":"skin","mesh"/
-  s/"animations".*"accessors"/"accessors"/' \
+sed 's/"name":"a","children"/"name":"root","children"/; s/{"name":"a"}/{"name":"bone"}/
+  s/{"mesh"/{"name":"skin","mesh"/; s/"animations".*"accessors"/"accessors"/' \
   "$(dirname "$0")/../../fuzz/corpus/fuzz_gltf/accepted_text" >"$work/bone.gltf"
 cd "$work"
 expect 0 'mesh skin: 3 vertices in the file, joined to 3; 1 polygons(.|\n)*scene .*/bone\.json\n$' '' import bone.gltf -o bone.json
