@@ -7,7 +7,7 @@
 // warnings.
 
 // A model may ask for any amount of memory. malloc then returns null, as it would without a sanitizer, well below the
-// fuzzer's own limit; and operator new throws (support/limitedNew.cpp).
+// fuzzer's own limit; and operator new throws (support/watchedNew.cpp).
 extern "C" const char* __asan_default_options() {
     return "allocator_may_return_null=1:max_allocation_size_mb=512";
 }

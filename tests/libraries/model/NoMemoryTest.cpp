@@ -8,7 +8,7 @@
 
 #include "nw_model/ModelSession.h"
 #include "support.h"
-#include "support/limitedNew.h"
+#include "support/watchedNew.h"
 
 using namespace neuralWarp;
 using testing::IsEmpty;
@@ -19,8 +19,11 @@ constexpr std::size_t count = 3000;
 
 /// Refuses arrays of `count` four-byte elements, and larger ones, while it lives.
 struct NoLargeArrays {
-    NoLargeArrays() { refusedAllocation = count * 4; }
-    ~NoLargeArrays() { refusedAllocation = SIZE_MAX; }
+    NoLargeArrays() {
+        watch.threshold = count * 4;
+        watch.refusesAll = true;
+    }
+    ~NoLargeArrays() { watch = {}; }
 };
 
 std::string numbers() {

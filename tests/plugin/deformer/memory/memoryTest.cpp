@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // The memory of an evaluation: how many arrays it takes, and what happens when there is none for one of them. A program
 // of its own, because it replaces operator new for the whole process.
-#include "plugin/deformer/memory/watchedNew.h"
 #include "plugin/deformer/support/FailureTest.h"
+#include "support/watchedNew.h"
 
 #include <algorithm>
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "plugin/deformer/memory/watchedNew.h"
+#include "watchedNew.h"
 
 #include <cstdlib>
 #include <new>
@@ -12,7 +12,7 @@ void* watchedAllocation(std::size_t size) {
     if (size >= watch.threshold) {
         if (watch.count < watch.sizes.size())
             watch.sizes[watch.count] = size;
-        if (++watch.count == watch.refused)
+        if (++watch.count == watch.refused || watch.refusesAll)
             return nullptr;
     }
     return std::malloc(size == 0 ? 1 : size);
