@@ -1,11 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
-// replay_cases DIR: replays reference cases through the real code; `usage` lists the options.
+// replay_cases DIR: replays reference cases through the real code; --help lists the options.
 #include "kinds.h"
 #include "replayOnDevice.h"
 
+#include <CLI/CLI.hpp>
+
 #include <algorithm>
 #include <cstdio>
-#include <cstring>
 #include <exception>
 #include <map>
 #include <string>
@@ -16,52 +17,13 @@ using replay::Case;
 using replay::Kind;
 using CasesByKind = std::map<std::string, std::vector<Case*>>;
 
-constexpr const char* usage =
-    "usage: replay_cases DIR [--exact | --evaluator gpu [--device DEVICE]] [--skip-if-absent]\n"
-    "  DIR               a folder of reference cases, one JSON file each\n"
-    "  --exact           compare with tolerance 0\n"
-    "  --evaluator gpu   replay the scenarios alone, and compare the positions that an OpenCL device gives\n"
-    "  --device DEVICE   which device: a number, or a part of its name; else the first\n"
-    "  --skip-if-absent  exit 77 instead of 2 when DIR, or a device, is not there\n"
-    "Exit status: 0 all passed, 1 a failure, 2 the cases or the arguments are unusable.\n";
-
 struct Options {
     std::string folder;
     bool exact = false;
     bool skipIfAbsent = false;
-    std::string evaluator = "cpu";
+    std::string evaluator;
     std::string device;
 };
-
-// Takes what is given to "--evaluator" and "--device"; null for every other argument, which has nothing.
-std::string* valueOf(const std::string& argument, Options& options) {
-    if (argument == "--evaluator")
-        return &options.evaluator;
-    return argument == "--device" ? &options.device : nullptr;
-}
-
-bool isConsistent(const Options& options) {
-    const bool isGpu = options.evaluator == "gpu";
-    return !options.folder.empty() && (isGpu || options.evaluator == "cpu") && (isGpu || options.device.empty()) &&
-           options.exact + isGpu <= 1;
-}
-
-bool parse(int argc, char** argv, Options& options) {
-    for (int i = 1; i < argc; ++i) {
-        const std::string argument = argv[i];
-        if (std::string* value = valueOf(argument, options); value && i + 1 < argc)
-            *value = argv[++i];
-        else if (argument == "--exact")
-            options.exact = true;
-        else if (argument == "--skip-if-absent")
-            options.skipIfAbsent = true;
-        else if (argument.starts_with("-") || !options.folder.empty())
-            return false;
-        else
-            options.folder = argument;
-    }
-    return isConsistent(options);
-}
 
 // Passes and failures so far.
 struct Tally {
@@ -163,12 +125,23 @@ int run(const Options& options) {
 
 int main(int argc, char** argv) {
     Options options;
-    if (!parse(argc, argv, options)) {
-        std::fputs(usage, stderr);
-        return 2;
-    }
+    CLI::App app("Replays reference cases through the real code.\n"
+                 "Exit status: 0 all passed, 1 a failure, 2 the cases or the arguments are unusable.");
+    app.add_option("DIR", options.folder, "a folder of reference cases, one JSON file each")->required();
+    auto* exact = app.add_flag("--exact", options.exact, "compare with tolerance 0");
+    auto* evaluator =
+        app.add_option("--evaluator", options.evaluator,
+                       "replay the scenarios alone, and compare the positions that an OpenCL device gives")
+            ->check(CLI::IsMember({"gpu"}))
+            ->excludes(exact);
+    app.add_option("--device", options.device, "which device: a number, or a part of its name; else the first")
+        ->needs(evaluator);
+    app.add_flag("--skip-if-absent", options.skipIfAbsent, "exit 77 instead of 2 when DIR, or a device, is not there");
     try {
+        app.parse(argc, argv);
         return run(options);
+    } catch (const CLI::ParseError& error) {
+        return app.exit(error) == 0 ? 0 : 2;
     } catch (const std::exception& error) {
         std::fprintf(stderr, "replay_cases: %s\n", error.what());
         return 2;

@@ -8,6 +8,7 @@
 
 #include <cstdint>
 #include <string>
+#include <type_traits>
 #include <vector>
 
 // Between the JSON of the cases and the library's types. The readers throw std::runtime_error on another type.
@@ -38,16 +39,8 @@ std::vector<quill::val3<T>> readVectors(const Json& list) {
     return vectors;
 }
 
-inline Json toJson(double value, JsonAllocator&) {
-    return Json(value);
-}
-inline Json toJson(float value, JsonAllocator&) {
-    return Json(static_cast<double>(value));
-}
-inline Json toJson(std::uint32_t value, JsonAllocator&) {
-    return Json(value);
-}
-inline Json toJson(bool value, JsonAllocator&) {
+template <typename T>
+requires std::is_arithmetic_v<T> Json toJson(T value, JsonAllocator&) {
     return Json(value);
 }
 Json toJson(const std::string& value, JsonAllocator& allocator);
