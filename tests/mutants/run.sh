@@ -67,7 +67,8 @@ for name in "${@##*/}"; do
     verdict "$name" "DOES NOT BUILD"
     escaped=1
   elif tests "$pattern" >"$log" 2>&1; then
-    verdict "$name" "GOT AWAY"
+    skipped=$(sed -n 's/.* Test *#[0-9]*: \([^ ]*\) .*\*\*\*Skipped.*/\1/p' "$log" | head -n 1)
+    verdict "$name" "GOT AWAY${skipped:+; skipped: $skipped}"
     escaped=1
   else
     verdict "$name" "caught by $(sed -n 's/^[[:space:]]*[0-9]* - \(.*\) (.*)$/\1/p' "$log" | head -n 1)"
