@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# tests/fresh.sh [COMMAND [ARGS]]: runs ./run COMMAND (default: test) on a Debian 12 machine that has nothing but Debian's
+# tests/fresh.sh [COMMAND [ARGS]]: runs ./run COMMAND (default: test) on a Debian 12 machine that has nothing but its
 # smallest base system, made for the occasion by debootstrap and removed afterwards. Needs root. Its mirror, proxies,
 # certificates and npm registry are those of this machine. FRESH_KEEP=1 keeps the system to look at.
 set -euo pipefail
@@ -15,7 +15,9 @@ clone=/project/neuralWarp
 clean_up() {
   local mount status=$?
   # whatever is still mounted below goes first, deepest first: nothing of this machine may be removed through it
-  while read -r mount; do umount -l "$mount" || true; done < <(cut -d ' ' -f 2 /proc/mounts | grep "^$system/" | sort -r)
+  while read -r mount; do umount -l "$mount" || true; done < <(
+    cut -d ' ' -f 2 /proc/mounts | grep "^$system/" | sort -r
+  )
   if grep -q " $system/" /proc/mounts; then
     printf 'fresh.sh: cannot unmount everything below %s: remove it by hand\n' "$system" >&2
   elif [[ ${FRESH_KEEP:-} ]]; then
@@ -40,7 +42,8 @@ make_system() {
   have debootstrap || {
     say "installing debootstrap"
     apt_get update || fail "apt-get update failed, and debootstrap is missing ($(apt_error))"
-    apt_get install -y --no-install-recommends debootstrap || fail "apt-get could not install debootstrap ($(apt_error))"
+    apt_get install -y --no-install-recommends debootstrap ||
+      fail "apt-get could not install debootstrap ($(apt_error))"
   }
   mirror=$(mirror_of_this_machine)
   [[ $mirror ]] || fail "this machine's apt knows no Debian 12 archive to make the system from"
@@ -62,7 +65,9 @@ hand_over_network() {
   if [[ -d /etc/apt/auth.conf.d ]]; then cp -r /etc/apt/auth.conf.d "$system/etc/apt/"; fi
   mkdir -p "$system/usr/local/share/ca-certificates"
   find /usr/local/share/ca-certificates -name '*.crt' -exec cp {} "$system/usr/local/share/ca-certificates/" \;
-  if [[ ${NODE_EXTRA_CA_CERTS:-} && -e $NODE_EXTRA_CA_CERTS ]]; then cp "$NODE_EXTRA_CA_CERTS" "$system/etc/extra-ca.crt"; fi
+  if [[ ${NODE_EXTRA_CA_CERTS:-} && -e $NODE_EXTRA_CA_CERTS ]]; then
+    cp "$NODE_EXTRA_CA_CERTS" "$system/etc/extra-ca.crt"
+  fi
 }
 
 # The tracked files as a clone of their own, and the shared cases beside it, where the tests look for them.

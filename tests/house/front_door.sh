@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
-# front_door.sh ROOT: what ./run answers by itself, in a copy of it where every program that installs, loads or builds only
-# notes that it was called.
+# front_door.sh ROOT: what ./run answers by itself, in a copy of it where every program that installs, loads or builds
+# only notes that it was called.
 set -euo pipefail
 root=$1
 work=$(mktemp -d)
@@ -20,8 +20,8 @@ printf '#!/bin/sh\nexec "$@"\n' >"$work/bin/sudo"
 chmod +x "$work"/bin/*
 
 failures=0
-# run_row STATUS PATTERN CALL ARGS...: ./run ARGS, its status, an extended pattern in what it says, and one in what it calls
-# ("nothing": it calls none of the programs)
+# run_row STATUS PATTERN CALL ARGS...: ./run ARGS, its status, an extended pattern in what it says, and one in what it
+# calls ("nothing": it calls none of the programs)
 run_row() {
   local status=$1 pattern=$2 call=$3 got=0 wrong=
   shift 3
@@ -70,7 +70,8 @@ run_row 2 "$work/file: no folder" nothing demo --output file # which is in the c
 
 # --- tests of one folder, of some, of all ---
 run_row 0 'testing libraries/geometry' '^cmake --build .* --target tests/libraries/geometry/all$' test geometry
-run_row 0 'testing plugin/gpu' '^ctest --test-dir build/release/tests/plugin/gpu .* -R one$' test tests/host/graph/ gpu -R one
+run_row 0 'testing plugin/gpu' '^ctest --test-dir build/release/tests/plugin/gpu .* -R one$' \
+  test tests/host/graph/ gpu -R one
 run_row 0 'testing release' '^ctest --preset release .* -R geometry$' test -R geometry
 
 # --- a demo says what is coming ---
@@ -89,14 +90,18 @@ logs=$1 made_in=$1
 until_shown() {
   for ((i = 0; i < 300; ++i)); do ! grep -q "$1" "$logs/terminal" || return 0; sleep 0.2; done
 }
-counts_lines() { printf 'began\n' && sleep 1.5 && printf 'epoch 10 of 30: loss 1\nepoch 20 of 30: loss 1\n' && until_shown ' 20 of 30'; }
+counts_lines() {
+  printf 'began\n' && sleep 1.5 && printf 'epoch 10 of 30: loss 1\nepoch 20 of 30: loss 1\n' && until_shown ' 20 of 30'
+}
 makes_files() { touch "$logs"/{a,b}.png && until_shown ' 2 of 7'; }
 step "lines" counts_lines
 made_of=7 step "files" makes_files
 step "fails" bash -c 'echo why; exit 3'
 STEPS
-(cd "$place" && script -qfec "bash '$work/steps.sh' '$work'" "$work/terminal" >/dev/null </dev/null) && failures=$((failures + 1))
-for said in 'lines .* 20 of 30' 'lines .* [0-9]+ s.?$' 'files .* 2 of 7' 'fails .*failed' '^why' 'fails: the command failed \(log: '; do
+(cd "$place" && script -qfec "bash '$work/steps.sh' '$work'" "$work/terminal" >/dev/null </dev/null) &&
+  failures=$((failures + 1))
+for said in 'lines .* 20 of 30' 'lines .* [0-9]+ s.?$' 'files .* 2 of 7' 'fails .*failed' '^why' \
+  'fails: the command failed \(log: '; do
   grep -qE "$said" "$work/terminal" || { echo "a step does not show '$said'" && failures=$((failures + 1)); }
 done
 

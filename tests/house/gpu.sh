@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # gpu.sh CMAKE BUILD: installs the build tree and moves the installation: its quarn plays the example scene on the
-# OpenCL device with the kernels that lie there, and on the CPU when one of them is gone. Exits with 77 without a device.
+# OpenCL device with the kernels that lie there, and on the CPU when one of them is gone. Status 77: no device.
 set -euo pipefail
 source tests/support/movingWave.sh
 cmake=$1 build=$2

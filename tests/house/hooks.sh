@@ -43,7 +43,8 @@ printf 'int b;\n' >libraries/geometry/bulk.cpp
 git add -A
 printf 'int  c ;\n' >libraries/geometry/bulk.cpp
 git commit -qm "what is staged" || wrong "what is not staged was looked at"
-[[ $(./run format) == *libraries/geometry/bulk.cpp*"1 of "*" files changed"* ]] || wrong "format does not say what it changed"
+[[ $(./run format) == *libraries/geometry/bulk.cpp*"1 of "*" files changed"* ]] ||
+  wrong "format does not say what it changed"
 [[ $(<libraries/geometry/bulk.cpp) == 'int c;' ]] || wrong "format did not format"
 
 git worktree add -q "$place/b"
@@ -55,5 +56,6 @@ try 0 '' 'int  e ;' # a branch that has no such script yet
 cd "$place/a"
 echo true >.git/hooks/pre-commit
 said=$(./run hooks 2>&1) && wrong "a hook of somebody else was replaced"
-[[ $said == *"not ours, and stays"* && $(<.git/hooks/pre-commit) == true ]] || wrong "of a hook of somebody else it says: $said"
+[[ $said == *"not ours, and stays"* && $(<.git/hooks/pre-commit) == true ]] ||
+  wrong "of a hook of somebody else it says: $said"
 exit $failed

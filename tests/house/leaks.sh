@@ -9,6 +9,7 @@ home='(^|[^[:alnum:]_./-])/([r]oot|[h]ome/[a-z]+|[w]ork|[U]sers/[A-Za-z]+)(/|\b)
 address='[a-z]+://[^[:space:]"<>]*([r]egistry|[m]irror|[a]rtifact|[p]roxy|deb\.[d]ebian|[n]pmjs|[p]ypi)'
 lock='"[r]esolved": *"'
 
-if grep -rnIE --exclude-dir={build,demo-out,tutorial,.git,.cache,.idea,.vscode} --exclude=.git "$home|$address|$lock" .; then
+skipped=(--exclude-dir={build,demo-out,tutorial,.git,.cache,.idea,.vscode} --exclude=.git)
+if grep -rnIE "${skipped[@]}" "$home|$address|$lock" .; then
   exit 1
 fi

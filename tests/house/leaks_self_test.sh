@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# Plants one line at a time and asks leaks.sh for its verdict. The lines are put together here so that this file has none.
+# Plants one line at a time and asks leaks.sh for its verdict. The lines are put together so that this file has none.
 . "$(dirname "$0")/self_test.sh"
 
 try() {

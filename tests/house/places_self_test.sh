@@ -1,5 +1,5 @@
 #!/usr/bin/env bash
-# places_self_test.sh ROOT: places.sh is content with the product, and finds each second place that is planted in a copy.
+# places_self_test.sh ROOT: places.sh is content with the product, and finds each second place planted in a copy.
 . "$(dirname "$0")/self_test.sh"
 root=$(cd "$1" && pwd)
 
