@@ -101,6 +101,15 @@ TEST_F(GpuTest, AnswersAndSaysWhatIsWrong) {
          }),
          failure,
          {}},
+        {"too few shapes on the device",
+         [](T& t) {
+             shapes(1, 9, 27)(t);
+             EXPECT_EQ(t.evaluate(), success);
+             OpenQuarn::Gpu::resetCounts();
+             shapes(2, 9, 54)(t); // without a word to who has the buffer
+         },
+         failure,
+         {}},
         {"no kernels", [](T&) { OpenQuarn::Resources::setPath("/nowhere"); }, failure, {}},
     };
     for (const Row& row : rows) {
