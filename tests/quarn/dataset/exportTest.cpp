@@ -235,11 +235,17 @@ TEST_F(ExportTest, ExportModeEndsAlsoAfterAFailure) {
         const auto failing = [&] { sampler.sample(2); };
         EXPECT_THAT(failing, ::testing::ThrowsMessage<std::runtime_error>(
                                  AllOf(StartsWith("frame 2: "), HasSubstr("has 5 vertices"), HasSubstr("has 12"))));
+    }
+    const auto expectMorph = [&] {
         writeTarget(2);
         session.host().setTime(1);
-    }
-    quarn::readPoints(geometry.output, points);
-    EXPECT_THAT(points, Pointwise(FloatNear(1e-6F), targetAt(0))) << "the morph is back";
+        quarn::readPoints(geometry.output, points);
+        EXPECT_THAT(points, Pointwise(FloatNear(1e-6F), targetAt(0)));
+    };
+    expectMorph();
+    writeTarget(2, [](std::size_t, std::vector<float>& xyz) { xyz[15] = std::numeric_limits<float>::quiet_NaN(); });
+    EXPECT_THAT(failureOf([&] { quarn::FrameSampler(session.host(), warp, geometry, 2); }), HasSubstr("vertex 5"));
+    expectMorph();
 }
 
 } // namespace

@@ -120,6 +120,10 @@ TEST_F(ResumeTest, NeverMixesTwoSetUps) {
     EXPECT_THAT(errorOf(flags), AllOf(HasSubstr("(frames 1-8, now 1-9)"), HasSubstr("--overwrite")));
     EXPECT_EQ(contentsOf(data()), expected_);
 
+    save(frames, "setAttr warp.export[0].smoothingIterations 3");
+    EXPECT_THAT(errorOf(options()), HasSubstr("(smoothing iterations "));
+    save(frames);
+
     writeTarget(frames, [](std::size_t frame, std::vector<float>& xyz) { xyz[0] = frame == 6 ? notANumber : 7; });
     EXPECT_THAT(errorOf(options()), HasSubstr("file strip.npy of strip_target.cacheFile"));
     flags.overwrite = true;
