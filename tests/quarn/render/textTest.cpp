@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/text.h"
+#include "quarn/render/layout.h"
 
 #include <gtest/gtest.h>
 
@@ -47,6 +48,28 @@ TEST(Text, WhatDoesNotFitIsCutOff) {
     EXPECT_LE(textWidth(cut, 10.0F), 100.0F);
     EXPECT_EQ(cut.substr(cut.size() - 2), "..");
     EXPECT_EQ(cut.substr(0, 6), "a very");
+}
+
+// rows of a picture that were drawn upon, from the top
+std::set<int> inkedRows(const Picture& picture) {
+    std::set<int> rows;
+    const std::size_t width = 3 * static_cast<std::size_t>(picture.width);
+    for (std::size_t i = 0; i < picture.rgb.size(); ++i)
+        if (picture.rgb[i] != 0)
+            rows.insert(static_cast<int>(i / width));
+    return rows;
+}
+
+TEST(Text, LabelsAndColourBarsStayInTheMargins) {
+    for (const int height : {60, 480, 1080}) {
+        Picture label(640, height), bar(640, height);
+        const Layout labelled{640, height, true, false}, barred{640, height, false, true};
+        drawLabel(label, labelled, 0, "Skin");
+        drawColourBar(bar, barred, 0, 20.0);
+        ASSERT_FALSE(inkedRows(label).empty() || inkedRows(bar).empty());
+        EXPECT_LT(*inkedRows(label).rbegin(), labelled.margins().top * height) << height;
+        EXPECT_GE(*inkedRows(bar).begin(), (1.0 - barred.margins().bottom) * height) << height;
+    }
 }
 
 } // namespace
