@@ -13,12 +13,14 @@
 #include "quarn/play/commands.h"
 #include "quarn/pose/commands.h"
 #include "quarn/render/commands.h"
+#include "quarn/run/commands.h"
 
 #include <CLI/CLI.hpp>
 
 #include <exception>
 #include <iostream>
 #include <string>
+#include <vector>
 
 namespace {
 
@@ -54,6 +56,8 @@ int fail(const std::string& why, int status, const char* advice = "") {
 }
 
 int run(int argc, char** argv) {
+    const int allWords = argc;
+    const std::vector<std::string> targetCommand = quarn::takeTargetCommand(argc, argv);
     CLI::App app("quarn: the host without a screen");
     app.set_version_flag("--version", "quarn " QUARN_VERSION);
     app.require_subcommand(1);
@@ -67,13 +71,14 @@ int run(int argc, char** argv) {
     quarn::addPoseCommand(app);
     quarn::addTargetCommand(app);
     quarn::addRenderCommand(app);
+    quarn::addRunCommand(app, targetCommand);
 
     quarn::LogOptions log;
     for (CLI::App* command : app.get_subcommands({}))
         quarn::addLogOptions(*command, log);
     app.parse_complete_callback([&] {
         if (log.verbose || !log.file.empty())
-            quarn::Log::begin(log.verbose, log.file, argc, argv);
+            quarn::Log::begin(log.verbose, log.file, allWords, argv);
     });
 
     requireCommand(app, argc, argv);

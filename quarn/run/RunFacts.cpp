@@ -1,0 +1,109 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/run/RunFacts.h"
+
+#include "storage/Json.h"
+
+#include <limits>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+using storage::JsonValue;
+
+const JsonValue& memberOf(const JsonValue& object, const char* name) {
+    if (!object.IsObject() || !object.HasMember(name))
+        throw std::runtime_error(std::string("has no ") + name);
+    return object[name];
+}
+
+std::string textOf(const JsonValue& object, const char* name) {
+    const JsonValue& value = memberOf(object, name);
+    if (!value.IsString())
+        throw std::runtime_error(std::string(name) + " is no text");
+    return std::string(storage::viewOf(value));
+}
+
+double numberOf(const JsonValue& object, const char* name) {
+    const JsonValue& value = memberOf(object, name);
+    if (!value.IsNumber())
+        throw std::runtime_error(std::string(name) + " is no number");
+    return value.GetDouble();
+}
+
+std::size_t countOf(const JsonValue& object, const char* name) {
+    const double number = numberOf(object, name);
+    if (!(number >= 0.0 && number <= std::numeric_limits<std::int32_t>::max()))
+        throw std::runtime_error(std::string(name) + " is no count");
+    return static_cast<std::size_t>(number);
+}
+
+int frameOf(const JsonValue& object, const char* name) {
+    const JsonValue& value = memberOf(object, name);
+    if (!value.IsInt())
+        throw std::runtime_error(std::string(name) + " is no frame");
+    return value.GetInt();
+}
+
+CharacterFacts characterIn(const JsonValue& answer) {
+    CharacterFacts facts{numberOf(answer, "metersPerUnit"), {}};
+    const JsonValue& meshes = memberOf(answer, "meshes");
+    if (!meshes.IsArray())
+        throw std::runtime_error("meshes is no list");
+    for (const JsonValue& mesh : meshes.GetArray())
+        if (const std::string skin = textOf(mesh, "skin"); !skin.empty())
+            facts.meshes.push_back(
+                {textOf(mesh, "node"), skin, countOf(mesh, "vertices"), countOf(mesh, "fileVertices")});
+    return facts;
+}
+
+FrameSpan framesIn(const JsonValue& answer) {
+    const FrameSpan span{frameOf(answer, "firstFrame"), frameOf(answer, "lastFrame")};
+    if (span.last < span.first)
+        throw std::runtime_error("lastFrame lies before firstFrame");
+    return span;
+}
+
+// what lies beside the scene, which is in the run's folder, is named from there: the folder can be moved
+fs::path besideScene(const fs::path& file, const fs::path& scene) {
+    const fs::path relative = file.lexically_relative(scene.parent_path());
+    return relative.empty() || *relative.begin() == ".." ? file : relative;
+}
+
+template <class Read>
+auto read(const fs::path& file, const Read& reading) -> std::optional<decltype(reading(JsonValue()))> {
+    try {
+        return reading(storage::readJson(file.string(), storage::jsonRules::ledger));
+    } catch (const std::exception&) {
+        return {}; // a step that is still to be done, or whose answer was spoiled
+    }
+}
+
+} // namespace
+
+fs::path answerFile(const std::string& step, const std::string& mesh) {
+    return fs::path("answers") / (step + (mesh.empty() ? "" : "-" + mesh) + ".json");
+}
+
+RunFacts readFacts(const fs::path& folder) {
+    RunFacts facts;
+    facts.character = read(folder / answerFile("import"), characterIn);
+    facts.poses = read(folder / answerFile("poses"), framesIn);
+    facts.motion = read(folder / answerFile("motion"), framesIn);
+    if (!facts.character)
+        return facts;
+    for (const MeshFacts& mesh : facts.character->meshes)
+        for (const char* step : {"target", "motion-target"}) {
+            const fs::path file = answerFile(step, mesh.name);
+            const auto target = read(folder / file, [](const JsonValue& answer) {
+                return TargetFacts{textOf(answer, "target"),
+                                   besideScene(textOf(answer, "cache"), textOf(answer, "scene"))};
+            });
+            if (target)
+                facts.targets[file.string()] = *target;
+        }
+    return facts;
+}
+
+} // namespace quarn

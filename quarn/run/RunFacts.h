@@ -1,0 +1,48 @@
+// SPDX-License-Identifier: Apache-2.0
+// What steps that are done have answered, and later ones are made of.
+#pragma once
+
+#include <filesystem>
+#include <map>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace quarn {
+
+/// A mesh that has a skin, in the order of the deformer's geometries.
+struct MeshFacts {
+    std::string name, skin;       ///< nodes
+    std::size_t vertices = 0;     ///< of the scene
+    std::size_t fileVertices = 0; ///< before they were joined
+};
+
+struct CharacterFacts {
+    double metersPerUnit = 1.0;
+    std::vector<MeshFacts> meshes;
+};
+
+struct FrameSpan {
+    int first = 0, last = 0;
+    int count() const { return last - first + 1; }
+};
+
+/// A target as it is connected: its node, and the cache that the scene plays.
+struct TargetFacts {
+    std::string node;
+    std::filesystem::path cache;
+};
+
+struct RunFacts {
+    std::optional<CharacterFacts> character;
+    std::optional<FrameSpan> poses, motion;
+    std::map<std::string, TargetFacts> targets; ///< by answerFile()
+};
+
+/// Where the answer of a step lies in the run's folder; `mesh` as in Step, or empty.
+std::filesystem::path answerFile(const std::string& step, const std::string& mesh = {});
+
+/// As far as answers are in the folder. One that cannot be read counts as none: its step is done again for that.
+RunFacts readFacts(const std::filesystem::path& folder);
+
+} // namespace quarn

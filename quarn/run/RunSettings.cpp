@@ -1,0 +1,105 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/run/RunSettings.h"
+
+#include "quarn/console/UsageError.h"
+#include "quarn/console/numberText.h"
+
+#include <cmath>
+#include <limits>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+bool isFile(const fs::path& path) {
+    std::error_code error;
+    return fs::is_regular_file(path, error);
+}
+
+// the part of a word that may name a file: behind "--flag=" or "MESH=", unless all of it names one
+std::size_t beginOfFile(const std::string& word, const fs::path& base) {
+    const std::size_t equals = word.find('=');
+    return equals == std::string::npos || isFile(base / word) ? 0 : equals + 1;
+}
+
+std::string wholeFile(const std::string& word, const fs::path& base) {
+    const std::size_t begin = beginOfFile(word, base);
+    return word.substr(0, begin) + (base / word.substr(begin)).lexically_normal().string();
+}
+
+// of targets each word names a file, whether it is there or not
+void makeWhole(Words& targets, const fs::path& base) {
+    for (std::string& word : targets)
+        word = wholeFile(word, base);
+}
+
+void requireRange(const char* name, const std::optional<std::int64_t>& value, std::int64_t least) {
+    constexpr std::int64_t most = 9'999'999;
+    if (value && (*value < least || *value > most))
+        throw UsageError(std::string(name) + " is " + std::to_string(*value) + ", not a whole number from " +
+                         std::to_string(least) + " to " + std::to_string(most));
+}
+
+void requireOneOf(const char* name, const std::string& value, std::initializer_list<const char*> choices) {
+    std::string names;
+    for (const char* choice : choices) {
+        if (value.empty() || value == choice)
+            return;
+        names += (names.empty() ? "" : ", ") + std::string(choice);
+    }
+    throw UsageError(std::string(name) + " is \"" + value + "\", not one of " + names);
+}
+
+} // namespace
+
+Words withWholePaths(const Words& words, const fs::path& base) {
+    Words whole;
+    whole.reserve(words.size());
+    for (const std::string& word : words) {
+        const std::string file = wholeFile(word, base);
+        whole.push_back(isFile(file.substr(beginOfFile(file, base))) ? file : word);
+    }
+    return whole;
+}
+
+void resolve(RunSettings& settings, const fs::path& base) {
+    for (fs::path* path : {&settings.character, &settings.parents, &settings.limits, &settings.motion})
+        if (!path->empty())
+            *path = (base / *path).lexically_normal();
+    makeWhole(settings.targets, base);
+    makeWhole(settings.motionTargets, base);
+    for (Words* words : {&settings.importOptions, &settings.poseOptions, &settings.targetOptions,
+                         &settings.exportOptions, &settings.trainOptions, &settings.targetCommand})
+        *words = withWholePaths(*words, base);
+}
+
+void check(const RunSettings& settings) {
+    if (settings.character.empty())
+        throw UsageError("CHARACTER is missing: the file of a rigged character, here or in a recipe");
+    requireRange("samples", settings.samples, 2);
+    requireRange("held-out", settings.heldOut, 3);
+    requireRange("seed", settings.seed, 0);
+    requireRange("epochs", settings.epochs, 1);
+    requireRange("target-timeout", settings.targetTimeout, 1);
+    requireRange("target-part", settings.targetPart, 1);
+    requireOneOf("from", settings.from, {"limits", "animation", "both"});
+    requireOneOf("order", settings.order, {"scene", "file"});
+    const double rate = settings.activationRate.value_or(0.0);
+    if (!std::isfinite(rate) || rate < 0.0 || rate > 1.0)
+        throw UsageError("activation-rate is " + numberText(rate) + ", not a number from 0 to 1");
+    if (settings.from == "animation" && (settings.samples || settings.activationRate))
+        throw UsageError("samples and activation-rate are for poses from limits: from is \"animation\"");
+    if (!settings.targets.empty() && !settings.targetCommand.empty())
+        throw UsageError("targets come from --targets or from --target-command, not from both");
+    if (!settings.motion.empty() && settings.heldOut)
+        throw UsageError("held-out poses or a motion: give --held-out or --motion, not both");
+    if (!settings.motionTargets.empty() && settings.motion.empty())
+        throw UsageError("--motion-targets are the shapes of a motion: give it with --motion");
+    if (!settings.motion.empty() && !settings.targets.empty() && settings.motionTargets.empty())
+        throw UsageError("--motion has to have targets as well: give them with --motion-targets");
+    if (settings.targetCommand.empty() && (settings.targetTimeout || settings.targetPart))
+        throw UsageError("--target-timeout and --target-part are for a --target-command");
+}
+
+} // namespace quarn

@@ -1,0 +1,438 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/run/plan.h"
+
+#include "quarn/run/characterFiles.h"
+#include "quarn/run/reportRows.h"
+
+#include <algorithm>
+#include <charconv>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+namespace fs = std::filesystem;
+
+constexpr std::int64_t leastHeldOut = 3; // a second difference is the least that can be said of a motion
+
+std::string decimal(double value) {
+    std::string digits(32, '\0');
+    const auto end = std::to_chars(digits.data(), digits.data() + digits.size(), value).ptr;
+    return {digits.data(), end};
+}
+
+std::string joined(const Words& words) {
+    std::string text;
+    for (const std::string& word : words)
+        text += (text.empty() ? "" : ", ") + word;
+    return text;
+}
+
+std::int64_t heldOutOf(const RunSettings& settings, std::int64_t all) {
+    return settings.motion.empty() ? settings.heldOut.value_or(std::max(leastHeldOut, all / 10)) : 0;
+}
+
+// of one mesh: whole paths by its name, or one without a name that is for the only mesh there is
+std::map<std::string, fs::path> filesByMesh(const Words& targets, const CharacterFacts& character) {
+    Words names;
+    for (const MeshFacts& mesh : character.meshes)
+        names.push_back(mesh.name);
+    std::map<std::string, fs::path> files;
+    for (const std::string& word : targets) {
+        const std::size_t equals = word.front() == '/' ? std::string::npos : word.find('=');
+        const std::string mesh = equals == std::string::npos ? names.front() : word.substr(0, equals);
+        if (equals == std::string::npos && names.size() > 1)
+            throw std::runtime_error("the character has several meshes, " + joined(names) + ": whose targets are in " +
+                                     word + "? Give them as MESH=FILE");
+        if (std::find(names.begin(), names.end(), mesh) == names.end())
+            throw std::runtime_error("there are targets of \"" + mesh + "\", and no mesh of that name that has a " +
+                                     "skin; there is " + joined(names));
+        if (!files.emplace(mesh, equals == std::string::npos ? word : word.substr(equals + 1)).second)
+            throw std::runtime_error("there are two files with targets of " + mesh);
+    }
+    return files;
+}
+
+/// Puts the steps together, one kind after the other.
+class Planner {
+public:
+    Planner(const RunSettings& settings, const RunFacts& facts)
+        : settings_(settings)
+        , facts_(facts) {}
+
+    Plan plan() {
+        import();
+        if (!facts_.character)
+            return plan_;
+        requireMeshes();
+        poses();
+        if (hasMotion())
+            motion();
+        each([&](const MeshFacts& mesh) { rest(mesh); });
+        skins("poses", facts_.poses);
+        if (hasMotion())
+            skins("motion", facts_.motion);
+        if (!settings_.hasTargets() || !facts_.poses || (hasMotion() && !facts_.motion))
+            return plan_;
+        targets();
+        models();
+        return plan_;
+    }
+
+private:
+    bool hasMotion() const { return !settings_.motion.empty(); }
+    std::string order() const { return settings_.order.empty() ? "scene" : settings_.order; }
+    std::string dataOf(const MeshFacts& mesh) const { return "data/" + mesh.name; }
+    std::string heldScene() const { return hasMotion() ? "motion" : "poses"; }
+    FrameSpan heldFrames() const { return hasMotion() ? *facts_.motion : heldOutFrames(settings_, *facts_.poses); }
+
+    template <class Do>
+    void each(const Do& action) {
+        for (const MeshFacts& mesh : facts_.character->meshes)
+            action(mesh);
+    }
+    template <class Do>
+    void eachChosen(const Do& action) {
+        const MeshChoice choice = chooseMeshes(settings_, *facts_.character);
+        each([&](const MeshFacts& mesh) {
+            if (std::find(choice.chosen.begin(), choice.chosen.end(), mesh.name) != choice.chosen.end())
+                action(mesh);
+        });
+    }
+
+    Step& add(const char* name, const MeshFacts* mesh, Words words, std::vector<fs::path> inputs,
+              std::vector<fs::path> outputs) {
+        Step step{name,
+                  mesh != nullptr && facts_.character->meshes.size() > 1 ? mesh->name : "",
+                  Program::quarn,
+                  std::move(words),
+                  std::move(inputs),
+                  std::move(outputs),
+                  {},
+                  {},
+                  {}};
+        plan_.push_back(std::move(step));
+        return plan_.back();
+    }
+    // its answer is kept as JSON, in the place that facts are read from
+    Step& addAnswering(const char* name, const MeshFacts* mesh, Words words, std::vector<fs::path> inputs,
+                       std::vector<fs::path> outputs) {
+        Step& step = add(name, mesh, std::move(words), std::move(inputs), std::move(outputs));
+        step.words.emplace_back("--json");
+        step.answer = answerFile(name, mesh != nullptr ? mesh->name : "");
+        step.outputs.push_back(step.answer);
+        return step;
+    }
+    static void append(Words& words, const Words& more) { words.insert(words.end(), more.begin(), more.end()); }
+    static void appendFile(Step& step, const char* flag, const fs::path& file) {
+        if (file.empty())
+            return;
+        append(step.words, {flag, file.string()});
+        step.inputs.push_back(file);
+    }
+
+    void import() {
+        Step& step = addAnswering("import", nullptr,
+                                  {"import", settings_.character.string(), "-o", "character.json", "--neural-warp"},
+                                  characterFiles(settings_.character), {"character.json"});
+        appendFile(step, "--parents", settings_.parents);
+        appendFile(step, "--limits", settings_.limits);
+        append(step.words, settings_.importOptions);
+    }
+
+    void requireMeshes() const {
+        if (facts_.character->meshes.empty())
+            throw std::runtime_error(settings_.character.string() +
+                                     " has no mesh with a skin: there is nothing to pose");
+        if (settings_.hasTargets())
+            static_cast<void>(chooseMeshes(settings_, *facts_.character));
+    }
+
+    void poses() {
+        Step& step = addAnswering("poses", nullptr, {"pose", "character.json", "-o", "poses.json"}, {"character.json"},
+                                  {"poses.json"});
+        if (!settings_.from.empty())
+            append(step.words, {"--from", settings_.from});
+        if (settings_.from != "animation") {
+            const std::int64_t samples = settings_.sampleCount();
+            append(step.words, {"--samples", std::to_string(samples + heldOutOf(settings_, samples))});
+        }
+        if (settings_.activationRate)
+            append(step.words, {"--activation-rate", decimal(*settings_.activationRate)});
+        if (settings_.seed)
+            append(step.words, {"--seed", std::to_string(*settings_.seed)});
+        append(step.words, settings_.poseOptions);
+    }
+
+    void motion() {
+        addAnswering("motion", nullptr,
+                     {"pose", "character.json", "--keys", settings_.motion.string(), "-o", "motion.json"},
+                     {"character.json", settings_.motion}, {"motion.json"});
+    }
+
+    // a mesh plug, in the order that targets have, frame by frame
+    Step& addPoints(const char* name, const MeshFacts& mesh, const std::string& scene, const std::string& plug,
+                    const FrameSpan& frames, const std::string& file, const std::string& vertexOrder) {
+        return add(name, &mesh,
+                   {"play", scene, "--plug", plug, "--geometry", mesh.name, "--no-model", "--frames",
+                    framesText(frames), "--order", vertexOrder, "-o", file},
+                   {scene}, {file});
+    }
+
+    void rest(const MeshFacts& mesh) {
+        addPoints("rest", mesh, "character.json", mesh.name + ".outMesh", {1, 1}, dataOf(mesh) + "/rest.npy", order());
+    }
+
+    void skins(const std::string& scene, const std::optional<FrameSpan>& frames) {
+        if (!frames)
+            return;
+        each([&](const MeshFacts& mesh) {
+            addPoints(scene == "poses" ? "skin" : "motion-skin", mesh, scene + ".json", mesh.skin + ".outputGeom[0]",
+                      *frames, skinFile(scene, mesh.name).string(), order());
+        });
+    }
+
+    // --- with targets ---
+
+    void targets() {
+        targetsOf("poses", settings_.targets, *facts_.poses);
+        if (hasMotion())
+            targetsOf("motion", settings_.motionTargets, *facts_.motion);
+    }
+
+    void targetsOf(const std::string& scene, const Words& given, const FrameSpan& frames) {
+        const bool isMotion = scene == "motion";
+        const std::map<std::string, fs::path> files = filesByMesh(given, *facts_.character);
+        std::map<std::string, fs::path> caches;
+        eachChosen([&](const MeshFacts& mesh) {
+            const auto file = files.find(mesh.name);
+            if (file == files.end() && settings_.targetCommand.empty())
+                throw std::runtime_error("there are targets of the poses of " + mesh.name + ", and none of its motion");
+            if (!settings_.targetCommand.empty())
+                askFor(isMotion ? "motion-targets" : "targets", mesh, scene, frames);
+            caches[mesh.name] =
+                settings_.targetCommand.empty() ? file->second : fs::path(dataOf(mesh) + "/" + scene + "_target.npy");
+        });
+        eachChosen([&](const MeshFacts& mesh) {
+            const fs::path& cache = caches.at(mesh.name);
+            const std::string output = scene + "." + mesh.name + ".json";
+            Step& step = addAnswering(isMotion ? "motion-target" : "target", &mesh,
+                                      {"target", scene + ".json", "--cache", cache.string(), "--geometry", mesh.name,
+                                       "--order", order(), "-o", output},
+                                      {scene + ".json", cache}, {output});
+            append(step.words, settings_.targetOptions);
+        });
+    }
+
+    void askFor(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames) {
+        const fs::path skin = skinFile(scene, mesh.name);
+        const std::string rest = dataOf(mesh) + "/rest.npy";
+        Step& step = add(name, &mesh, settings_.targetCommand, {settings_.character, scene + ".json", rest, skin},
+                         {dataOf(mesh) + "/" + scene + "_target.npy"});
+        step.program = Program::targetCommand;
+        TargetRequest& request = step.request.emplace();
+        request.mesh = mesh.name;
+        request.character = settings_.character;
+        request.scene = scene + ".json";
+        request.rest = rest;
+        request.skin = skin;
+        request.order = order();
+        request.vertices = order() == "file" ? mesh.fileVertices : mesh.vertices;
+        request.firstFrame = frames.first;
+        request.lastFrame = frames.last;
+        request.metersPerUnit = facts_.character->metersPerUnit;
+        request.part = settings_.targetPart.value_or(0);
+        request.timeout = settings_.targetTimeout.value_or(0);
+    }
+
+    // as the scene plays it: the file that was given, or what quarn target has made of it; none before that is done
+    const TargetFacts* targetOf(const std::string& scene, const MeshFacts& mesh) const {
+        const auto found = facts_.targets.find(answerFile(scene == "motion" ? "motion-target" : "target", mesh.name));
+        return found == facts_.targets.end() ? nullptr : &found->second;
+    }
+
+    void models() {
+        bool isKnown = true;
+        eachChosen([&](const MeshFacts& mesh) {
+            isKnown = isKnown && targetOf("poses", mesh) != nullptr && targetOf(heldScene(), mesh) != nullptr;
+        });
+        if (!isKnown)
+            return;
+        const FrameSpan held = heldFrames();
+        const FrameSpan trained{facts_.poses->first, hasMotion() ? facts_.poses->last : held.first - 1};
+        eachChosen([&](const MeshFacts& mesh) { exportFrames("export", mesh, "poses", trained, "set"); });
+        eachChosen([&](const MeshFacts& mesh) { exportFrames("held-out", mesh, heldScene(), held, "heldOut"); });
+        eachChosen([&](const MeshFacts& mesh) { train(mesh); });
+        eachChosen([&](const MeshFacts& mesh) { measure(mesh, held); });
+        eachChosen([&](const MeshFacts& mesh) { pictures(mesh, held); });
+        report(held);
+    }
+
+    static std::vector<fs::path> setFiles(const std::string& folder) {
+        return {folder + "/dataset.json", folder + "/controls.npy", folder + "/deltas.npy", folder + "/frames.npy"};
+    }
+
+    void exportFrames(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames,
+                      const char* set) {
+        const std::string file = scene + "." + mesh.name + ".json";
+        const std::string folder = dataOf(mesh) + "/" + set;
+        Step& step =
+            add(name, &mesh,
+                {"export", file, "--geometry", mesh.name, "--frames", framesText(frames), "-o", folder,
+                 "--overwrite"}, // the ledger knows whether it is to be made again; what was begun is gone on with
+                {file, targetOf(scene, mesh)->cache}, setFiles(folder));
+        append(step.words, settings_.exportOptions);
+    }
+
+    void train(const MeshFacts& mesh) {
+        const std::string set = dataOf(mesh) + "/set";
+        const std::string model = "models/" + mesh.name + ".nwrp";
+        const std::string training = dataOf(mesh) + "/training";
+        Step& step =
+            add("train", &mesh, {"train", set, "-o", model, "--report", training}, setFiles(set), {model, training});
+        step.program = Program::trainer;
+        if (settings_.seed)
+            append(step.words, {"--seed", std::to_string(*settings_.seed)});
+        if (settings_.epochs)
+            append(step.words, {"--epochs", std::to_string(*settings_.epochs)});
+        // what a node made by hand has not, and nearly every mesh is the better for
+        const auto& own = settings_.trainOptions;
+        if (std::find(own.begin(), own.end(), "--direct") == own.end())
+            step.words.emplace_back("--principal-shapes");
+        append(step.words, own);
+    }
+
+    void measure(const MeshFacts& mesh, const FrameSpan& held) {
+        const std::string scene = heldScene() + "." + mesh.name + ".json";
+        const std::string data = dataOf(mesh) + "/";
+        const TargetFacts& target = *targetOf(heldScene(), mesh);
+        addPoints("held-out-skin", mesh, scene, mesh.skin + ".outputGeom[0]", held, data + "heldOut_skin.npy", "scene");
+        addPoints("held-out-target", mesh, scene, target.node + ".outMesh", held, data + "heldOut_target.npy", "scene")
+            .inputs.push_back(target.cache);
+        for (const char* evaluator : {"cpu", "gpu"}) {
+            const std::string points = data + "heldOut_" + evaluator + ".npy";
+            addAnswering(std::string(evaluator) == "cpu" ? "play" : "play-gpu", &mesh,
+                         {"play", scene, "--geometry", mesh.name, "--model", mesh.name, "--against", "target",
+                          "--frames", framesText(held), "--repeat", "3", "--evaluator", evaluator, "-o", points},
+                         {scene, target.cache, "models/" + mesh.name + ".nwrp"}, {points});
+        }
+        const std::string set = dataOf(mesh) + "/heldOut";
+        const std::string model = "models/" + mesh.name + ".nwrp";
+        std::vector<fs::path> inputs = setFiles(set);
+        inputs.emplace_back(model);
+        addAnswering("evaluate", &mesh, {"evaluate", set, model}, inputs, {}).program = Program::trainer;
+    }
+
+    // --- what is looked at ---
+
+    void pictures(const MeshFacts& mesh, const FrameSpan& held) {
+        constexpr int stills = 5, moving = 60; // of a motion
+        draw("pictures", mesh, held, (held.count() + stills - 1) / stills, "480x480", "pictures/" + mesh.name);
+        if (hasMotion())
+            draw("moving-picture", mesh, held, (held.count() + moving - 1) / moving, "300x300",
+                 dataOf(mesh) + "/preview/frame");
+    }
+
+    void draw(const char* name, const MeshFacts& mesh, const FrameSpan& held, int step, const char* size,
+              const std::string& file) {
+        const std::string scene = heldScene() + "." + mesh.name + ".json";
+        const TargetFacts& facts = *targetOf(heldScene(), mesh);
+        const auto& meshes = facts_.character->meshes;
+        const auto index = std::find_if(meshes.begin(), meshes.end(),
+                                        [&](const MeshFacts& other) { return other.name == mesh.name; }) -
+                           meshes.begin();
+        const std::string result = "warp.outputGeom[" + std::to_string(index) + "]";
+        const std::string target = facts.node + ".outMesh";
+        add(name, &mesh, {"render",     scene,
+                          "--geometry", mesh.name,
+                          "--model",    mesh.name,
+                          "--frames",   framesText(held) + "x" + std::to_string(step),
+                          "--size",     size,
+                          "--panel",    "skin=" + mesh.skin + ".outputGeom[0]",
+                          "--panel",    "target=" + target,
+                          "--panel",    "neural=" + result,
+                          "--heat",     "error=" + result + ":" + target,
+                          "-o",         file + ".####.png"},
+            {scene, facts.cache, "models/" + mesh.name + ".nwrp"}, pictureFiles(file, held, step));
+    }
+
+    static std::vector<fs::path> pictureFiles(const std::string& file, const FrameSpan& frames, int step) {
+        std::vector<fs::path> files;
+        for (int frame = frames.first; frame <= frames.last; frame += step) {
+            std::string digits = std::to_string(frame);
+            digits.insert(0, digits.size() < 4 ? 4 - digits.size() : 0, '0');
+            files.emplace_back(file + "." + digits + ".png");
+        }
+        return files;
+    }
+
+    void report(const FrameSpan& held) {
+        ReportRows rows;
+        rows.title = settings_.character.stem().string();
+        rows.isMotion = hasMotion();
+        rows.frames = held;
+        eachChosen([&](const MeshFacts& mesh) { rows.meshes.push_back(mesh.name); });
+        std::vector<fs::path> inputs{"rows.json"};
+        for (const Step& step : plan_) {
+            const bool isShown = step.name == "pictures" || step.name == "moving-picture";
+            if (isShown)
+                (step.name == "pictures" ? rows.pictures : rows.preview)
+                    .insert(step.name == "pictures" ? rows.pictures.end() : rows.preview.end(), step.outputs.begin(),
+                            step.outputs.end());
+            if (isShown || step.name == "train" || step.name == "evaluate" || step.name.rfind("play", 0) == 0 ||
+                step.name.rfind("held-out", 0) == 0 || step.name == "export")
+                inputs.insert(inputs.end(), step.outputs.begin(), step.outputs.end());
+        }
+        Step& step = add("report", nullptr, {"report", "rows.json", "-o", "."}, std::move(inputs),
+                         {"report.json", "report.html", "table.txt"});
+        step.program = Program::trainer;
+        step.written["rows.json"] = textOf(rows);
+    }
+
+    const RunSettings& settings_;
+    const RunFacts& facts_;
+    Plan plan_;
+};
+
+} // namespace
+
+Plan planOf(const RunSettings& settings, const RunFacts& facts) {
+    return Planner(settings, facts).plan();
+}
+
+const Words& stepNames() {
+    static const Words names = {
+        "import",          "poses",          "motion",        "rest",     "skin",     "motion-skin",    "targets",
+        "target",          "motion-targets", "motion-target", "export",   "held-out", "train",          "held-out-skin",
+        "held-out-target", "play",           "play-gpu",      "evaluate", "pictures", "moving-picture", "report"};
+    return names;
+}
+
+MeshChoice chooseMeshes(const RunSettings& settings, const CharacterFacts& character) {
+    const std::map<std::string, fs::path> files = filesByMesh(settings.targets, character);
+    MeshChoice choice;
+    for (const MeshFacts& mesh : character.meshes)
+        (!settings.targetCommand.empty() || files.count(mesh.name) > 0 ? choice.chosen : choice.leftOut)
+            .push_back(mesh.name);
+    return choice;
+}
+
+FrameSpan heldOutFrames(const RunSettings& settings, const FrameSpan& poses) {
+    const std::int64_t all = settings.from == "animation" ? poses.count() : settings.sampleCount();
+    const std::int64_t held = heldOutOf(settings, all);
+    if (poses.count() - held < 2)
+        throw std::runtime_error(
+            "there are " + std::to_string(poses.count()) + " poses: when " + std::to_string(held) +
+            " are held out too few are left to train with; give more samples or a smaller held-out");
+    return {poses.last - static_cast<int>(held) + 1, poses.last};
+}
+
+std::string framesText(const FrameSpan& span) {
+    return std::to_string(span.first) + "-" + std::to_string(span.last);
+}
+
+fs::path skinFile(const std::string& scene, const std::string& mesh) {
+    return fs::path("data") / mesh / (scene + "_skin.npy");
+}
+
+} // namespace quarn

@@ -1,0 +1,21 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the report of a run is about: the file that `trainer report` reads.
+#pragma once
+
+#include "quarn/run/RunFacts.h"
+#include "quarn/run/RunSettings.h"
+
+namespace quarn {
+
+struct ReportRows {
+    std::string title;
+    bool isMotion = false; ///< what is held out is a motion; else poses that have nothing to do with each other
+    FrameSpan frames;      ///< of it
+    Words meshes;
+    std::vector<std::filesystem::path> pictures, preview; ///< stills; frames of the moving one
+};
+
+/// JSON, version 1; names of files count from the run's folder. docs/run.md describes it.
+std::string textOf(const ReportRows& rows);
+
+} // namespace quarn
