@@ -73,7 +73,7 @@ def read_report(path: Path) -> Report:
         alone = len(rows) == 1
         return Report(str(data["title"]), bool(data["isMotion"]), int(data["firstFrame"]),
                       [replace(row, mesh="") if alone else row for row in rows],
-                      [(place / name, caption(Path(name))) for name in data["pictures"]],
+                      [(place / picture["file"], str(picture["caption"])) for picture in data["pictures"]],
                       [place / name for name in data["preview"]])
     except (KeyError, TypeError, ValueError, AttributeError) as error:
         raise TrainerError(f"{path} does not say what a report is about ({type(error).__name__}: {error})") from error
@@ -86,12 +86,6 @@ def read_row(row: Json, place: Path) -> Row:
         raise KeyError("cpu")
     return Row(row["mesh"], place / row["set"], place / row["heldOut"], place / row["training"],
                place / row["evaluate"], place / row["skin"], place / row["target"], played["cpu"], played["gpu"])
-
-
-def caption(picture: Path) -> str:
-    """Of NAME.0020.png."""
-    name, _, frame = picture.stem.rpartition(".")
-    return f"{name}, frame {int(frame)}" if frame.isdecimal() else picture.stem
 
 
 # --- the figures ---

@@ -1,7 +1,7 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""target_command.py REQUEST.json: targets.py as a program for quarn run --target-command. The frames that are asked for,
-which may be any of the skin's, in the order in which they are asked for."""
+"""target_command.py REQUEST.json: targets.py as a program for quarn run --target-command. The frames that are asked
+for, which may be any of the skin's, in the order in which they are asked for."""
 
 import json
 import sys
@@ -16,8 +16,8 @@ def main() -> None:
     with open(sys.argv[1], encoding="utf-8") as file:
         request = json.load(file)
     if request["version"] != 1 or request["skin"]["order"] != "scene":
-        sys.exit(f"target_command.py: knows requests of version 1 in the scene's order, not version {request['version']} "
-                 f"in the {request['skin']['order']}'s")
+        sys.exit("target_command.py: knows requests of version 1 in the scene's order, not of version "
+                 f"{request['version']} in the {request['skin']['order']}'s")
     # the folder in which it is started is its own
     skin = np.load(request["skin"]["file"], mmap_mode="r", allow_pickle=False)
     np.save("skin.npy", skin[[frame - request["skin"]["firstFrame"] for frame in request["frames"]]])

@@ -69,8 +69,9 @@ void resolve(RunSettings& settings, const fs::path& base) {
             *path = (base / *path).lexically_normal();
     makeWhole(settings.targets, base);
     makeWhole(settings.motionTargets, base);
-    for (Words* words : {&settings.importOptions, &settings.poseOptions, &settings.targetOptions,
-                         &settings.exportOptions, &settings.trainOptions, &settings.targetCommand})
+    for (Words* words :
+         {&settings.importOptions, &settings.poseOptions, &settings.targetOptions, &settings.exportOptions,
+          &settings.trainOptions, &settings.renderOptions, &settings.targetCommand})
         *words = withWholePaths(*words, base);
 }
 

@@ -20,7 +20,8 @@ struct RunSettings {
     std::string from, order;
     Words targets, motionTargets; ///< FILE, or MESH=FILE
     Words targetCommand;
-    Words importOptions, poseOptions, targetOptions, exportOptions, trainOptions; ///< words for these commands
+    Words importOptions, poseOptions, targetOptions, exportOptions, trainOptions,
+        renderOptions; ///< words for these commands
 
     std::int64_t sampleCount() const { return samples.value_or(1000); }
     bool hasTargets() const { return !targets.empty() || !targetCommand.empty(); }
@@ -50,6 +51,7 @@ void visitSettings(const Visit& visit) {
     visit("target-option", &Settings::targetOptions, "WORD", "A word more for quarn target; may be repeated");
     visit("export-option", &Settings::exportOptions, "WORD", "A word more for quarn export; may be repeated");
     visit("train-option", &Settings::trainOptions, "WORD", "A word more for trainer train; may be repeated");
+    visit("render-option", &Settings::renderOptions, "WORD", "A word more for quarn render; may be repeated");
 }
 
 /// The same words, those that name a file, and those like --flag=FILE, with the whole path of it. `base` is the folder

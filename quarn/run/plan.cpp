@@ -265,7 +265,7 @@ private:
         eachChosen([&](const MeshFacts& mesh) { train(mesh); });
         eachChosen([&](const MeshFacts& mesh) { measure(mesh, held); });
         eachChosen([&](const MeshFacts& mesh) { pictures(mesh, held); });
-        report(held);
+        report();
     }
 
     static std::vector<fs::path> setFiles(const std::string& folder) {
@@ -327,10 +327,17 @@ private:
 
     void pictures(const MeshFacts& mesh, const FrameSpan& held) {
         constexpr int stills = 5, moving = 60; // of a motion
-        draw("pictures", mesh, held, (held.count() + stills - 1) / stills, "480x480", "pictures/" + mesh.name);
-        if (hasMotion())
-            draw("moving-picture", mesh, held, (held.count() + moving - 1) / moving, "300x300",
-                 dataOf(mesh) + "/preview/frame");
+        const std::string still = "pictures/" + mesh.name;
+        const int step = (held.count() + stills - 1) / stills;
+        draw("pictures", mesh, held, step, "480x480", still);
+        for (const int frame : drawnFrames(held, step))
+            rows_.pictures.push_back({pictureFile(still, frame), mesh.name + ", frame " + std::to_string(frame)});
+        if (!hasMotion())
+            return;
+        draw("moving-picture", mesh, held, (held.count() + moving - 1) / moving, "300x300",
+             dataOf(mesh) + "/preview/frame");
+        const std::vector<fs::path>& frames = plan_.back().outputs;
+        rows_.preview.insert(rows_.preview.end(), frames.begin(), frames.end());
     }
 
     void draw(const char* name, const MeshFacts& mesh, const FrameSpan& held, int step, const char* size,
@@ -338,60 +345,65 @@ private:
         const std::string scene = heldScene() + "." + mesh.name + ".json";
         const TargetFacts& facts = *targetOf(heldScene(), mesh);
         const auto& meshes = facts_.character->meshes;
-        const auto index = std::find_if(meshes.begin(), meshes.end(),
-                                        [&](const MeshFacts& other) { return other.name == mesh.name; }) -
-                           meshes.begin();
+        const auto isThis = [&](const MeshFacts& other) { return other.name == mesh.name; };
+        const auto index = std::find_if(meshes.begin(), meshes.end(), isThis) - meshes.begin();
         const std::string result = "warp.outputGeom[" + std::to_string(index) + "]";
         const std::string target = facts.node + ".outMesh";
-        add(name, &mesh, {"render",     scene,
-                          "--geometry", mesh.name,
-                          "--model",    mesh.name,
-                          "--frames",   framesText(held) + "x" + std::to_string(step),
-                          "--size",     size,
-                          "--panel",    "skin=" + mesh.skin + ".outputGeom[0]",
-                          "--panel",    "target=" + target,
-                          "--panel",    "neural=" + result,
-                          "--heat",     "error=" + result + ":" + target,
-                          "-o",         file + ".####.png"},
-            {scene, facts.cache, "models/" + mesh.name + ".nwrp"}, pictureFiles(file, held, step));
-    }
-
-    static std::vector<fs::path> pictureFiles(const std::string& file, const FrameSpan& frames, int step) {
         std::vector<fs::path> files;
-        for (int frame = frames.first; frame <= frames.last; frame += step) {
-            std::string digits = std::to_string(frame);
-            digits.insert(0, digits.size() < 4 ? 4 - digits.size() : 0, '0');
-            files.emplace_back(file + "." + digits + ".png");
-        }
-        return files;
+        for (const int frame : drawnFrames(held, step))
+            files.push_back(pictureFile(file, frame));
+        Step& drawing = add(name, &mesh, {"render",     scene,
+                                          "--geometry", mesh.name,
+                                          "--model",    mesh.name,
+                                          "--frames",   framesText(held) + "x" + std::to_string(step),
+                                          "--size",     size,
+                                          "--panel",    "skin=" + mesh.skin + ".outputGeom[0]",
+                                          "--panel",    "target=" + target,
+                                          "--panel",    "neural=" + result,
+                                          "--heat",     "error=" + result + ":" + target,
+                                          "-o",         file + ".####.png"},
+                            {scene, facts.cache, "models/" + mesh.name + ".nwrp"}, files);
+        append(drawing.words, settings_.renderOptions);
     }
 
-    void report(const FrameSpan& held) {
-        ReportRows rows;
-        rows.title = settings_.character.stem().string();
-        rows.isMotion = hasMotion();
-        rows.frames = held;
-        eachChosen([&](const MeshFacts& mesh) { rows.meshes.push_back(mesh.name); });
+    static std::vector<int> drawnFrames(const FrameSpan& frames, int step) {
+        std::vector<int> drawn;
+        for (int frame = frames.first; frame <= frames.last; frame += step)
+            drawn.push_back(frame);
+        return drawn;
+    }
+    static fs::path pictureFile(const std::string& file, int frame) {
+        std::string digits = std::to_string(frame);
+        digits.insert(0, digits.size() < 4 ? 4 - digits.size() : 0, '0');
+        return file + "." + digits + ".png";
+    }
+
+    // what the report is made of
+    bool isReported(const Step& step) const {
+        const auto& named = {"export", "held-out", "train",    "held-out-skin", "held-out-target",
+                             "play",   "play-gpu", "evaluate", "pictures",      "moving-picture"};
+        return std::find(named.begin(), named.end(), step.name) != named.end();
+    }
+
+    void report() {
+        rows_.title = settings_.character.stem().string();
+        rows_.isMotion = hasMotion();
+        rows_.firstFrame = heldFrames().first;
+        eachChosen([&](const MeshFacts& mesh) { rows_.meshes.push_back(mesh.name); });
         std::vector<fs::path> inputs{"rows.json"};
-        for (const Step& step : plan_) {
-            const bool isShown = step.name == "pictures" || step.name == "moving-picture";
-            if (isShown)
-                (step.name == "pictures" ? rows.pictures : rows.preview)
-                    .insert(step.name == "pictures" ? rows.pictures.end() : rows.preview.end(), step.outputs.begin(),
-                            step.outputs.end());
-            if (isShown || step.name == "train" || step.name == "evaluate" || step.name.rfind("play", 0) == 0 ||
-                step.name.rfind("held-out", 0) == 0 || step.name == "export")
+        for (const Step& step : plan_)
+            if (isReported(step))
                 inputs.insert(inputs.end(), step.outputs.begin(), step.outputs.end());
-        }
         Step& step = add("report", nullptr, {"report", "rows.json", "-o", "."}, std::move(inputs),
                          {"report.json", "report.html", "table.txt"});
         step.program = Program::trainer;
-        step.written["rows.json"] = textOf(rows);
+        step.written["rows.json"] = textOf(rows_);
     }
 
     const RunSettings& settings_;
     const RunFacts& facts_;
     Plan plan_;
+    ReportRows rows_; ///< as far as pictures are planned
 };
 
 } // namespace

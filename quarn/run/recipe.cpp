@@ -5,6 +5,7 @@
 #include "storage/Json.h"
 
 #include <set>
+#include <type_traits>
 
 namespace quarn {
 namespace {
@@ -57,6 +58,31 @@ private:
     const JsonValue& value_;
 };
 
+// Flags of the commands that load no code, start nothing and write nowhere else. Whoever has not written the recipe
+// knows then that it does not either; others need --allow-commands.
+const std::set<std::string> harmless = {
+    // clang-format off
+    "--activation", "--align", "--animation", "--anyway", "--axes", "--batch-size", "--controls", "--delta-mode",
+    "--direct", "--dropout", "--epochs", "--fps", "--frames", "--hidden-layers", "--learning-rate", "--meters-per-unit",
+    "--neurons", "--no-animation", "--no-preload", "--order", "--patience", "--preload", "--principal-accuracy",
+    "--principal-limit", "--principal-shapes", "--range", "--scale", "--seed", "--size", "--smoothing", "--start",
+    "--start-frame", "--threads", "--tolerance", "--up", "--validation-ratio", "--view", "--with-roots",
+    // clang-format on
+};
+
+// "-1.5" is none
+bool isFlag(const std::string& word) {
+    return word.size() > 1 && word.front() == '-' && word.find_first_of("0123456789.") != 1;
+}
+
+void requireHarmless(const fs::path& file, const std::string& name, const Words& words) {
+    for (const std::string& word : words)
+        if (isFlag(word) && harmless.count(word.substr(0, word.find('='))) == 0)
+            throw storage::FileError(file, "has \"" + word + "\" among its \"" + name +
+                                               "\", which might load code or " +
+                                               "write elsewhere: --allow-commands lets it");
+}
+
 class Recipe {
 public:
     explicit Recipe(const fs::path& file)
@@ -96,7 +122,12 @@ void readRecipe(const fs::path& file, RunSettings& settings, const std::function
     RunSettings own;
     recipe.take("character", own.character);
     recipe.take("target-command", own.targetCommand);
-    visitSettings([&](const char* name, auto member, auto...) { recipe.take(name, own.*member); });
+    visitSettings([&](const char* name, auto member, auto...) {
+        recipe.take(name, own.*member);
+        if constexpr (std::is_same_v<decltype(member), Words RunSettings::*>)
+            if (!allowCommands && std::string(name).find("-option") != std::string::npos)
+                requireHarmless(file, name, own.*member);
+    });
     recipe.requireAllKnown();
     resolve(own, file.parent_path());
     const auto adopt = [&](const char* name, auto member, auto...) {

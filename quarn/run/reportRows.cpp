@@ -26,10 +26,19 @@ void writeRow(JsonWriter& writer, const std::string& mesh) {
     writer.EndObject();
 }
 
-void writeFiles(JsonWriter& writer, const char* key, const std::vector<std::filesystem::path>& files) {
-    writer.Key(key);
+void writePictures(JsonWriter& writer, const ReportRows& rows) {
+    writer.Key("pictures");
     writer.StartArray();
-    for (const std::filesystem::path& file : files)
+    for (const ReportRows::Picture& picture : rows.pictures) {
+        writer.StartObject();
+        writeText(writer, "file", picture.file.string());
+        writeText(writer, "caption", picture.caption);
+        writer.EndObject();
+    }
+    writer.EndArray();
+    writer.Key("preview");
+    writer.StartArray();
+    for (const std::filesystem::path& file : rows.preview)
         writeText(writer, file.string());
     writer.EndArray();
 }
@@ -45,14 +54,13 @@ std::string textOf(const ReportRows& rows) {
     writeText(writer, "title", rows.title);
     writeBool(writer, "isMotion", rows.isMotion);
     writer.Key("firstFrame");
-    writer.Int(rows.frames.first);
+    writer.Int(rows.firstFrame);
     writer.Key("rows");
     writer.StartArray();
     for (const std::string& mesh : rows.meshes)
         writeRow(writer, mesh);
     writer.EndArray();
-    writeFiles(writer, "pictures", rows.pictures);
-    writeFiles(writer, "preview", rows.preview);
+    writePictures(writer, rows);
     writer.EndObject();
     return std::string(buffer.GetString()) + "\n";
 }

@@ -10,9 +10,15 @@ namespace quarn {
 struct ReportRows {
     std::string title;
     bool isMotion = false; ///< what is held out is a motion; else poses that have nothing to do with each other
-    FrameSpan frames;      ///< of it
+    int firstFrame = 0;    ///< of it
     Words meshes;
-    std::vector<std::filesystem::path> pictures, preview; ///< stills; frames of the moving one
+    /// A still, and what is said below it.
+    struct Picture {
+        std::filesystem::path file;
+        std::string caption;
+    };
+    std::vector<Picture> pictures;
+    std::vector<std::filesystem::path> preview; ///< frames of the moving one
 };
 
 /// JSON, version 1; names of files count from the run's folder. docs/run.md describes it.

@@ -156,6 +156,13 @@ void addOptions(CLI::App& command, Options& options) {
                    "                                     docs/run.md says what it is asked for.");
 }
 
+// whoever has put a flag there finds out before hours have passed
+void noteSwallowed(const CLI::App& command, const Words& targetCommand, const Console& console) {
+    for (const std::string& word : targetCommand)
+        if (word.rfind("--", 0) == 0 && command.get_option_no_throw(word) != nullptr)
+            console.note(word + " stands behind " + targetFlag + ", and is an argument of that program");
+}
+
 void takeSettings(const CLI::App& command, Options& options, const Words& targetCommand) {
     const fs::path here = fs::current_path();
     options.settings.targetCommand = targetCommand;
@@ -195,6 +202,7 @@ void addRunCommand(CLI::App& app, std::vector<std::string> targetCommand) {
     addConsoleOptions(*command, options->console, true);
     command->callback([options, command, targetCommand = std::move(targetCommand)] {
         takeSettings(*command, *options, targetCommand);
+        noteSwallowed(*command, targetCommand, options->console);
         execute(*options);
     });
 }

@@ -1,0 +1,218 @@
+// SPDX-License-Identifier: Apache-2.0
+// What the steps of a run have to do with each other, for all kinds of runs; and which runs there are none of.
+#include "quarn/run/plan.h"
+
+#include "quarn/run/recipe.h"
+#include "storage/WholeFile.h"
+#include "support/TemporaryFolder.h"
+#include "support/failureOf.h"
+
+#include <gmock/gmock.h>
+
+#include <algorithm>
+#include <set>
+
+namespace quarn {
+namespace {
+
+using testing::Contains;
+using testing::HasSubstr;
+
+RunFacts factsOf(const std::vector<std::string>& meshes) {
+    RunFacts facts;
+    facts.character.emplace();
+    for (const std::string& mesh : meshes) {
+        facts.character->meshes.push_back({mesh, mesh + "_skin", 10, 12});
+        for (const char* step : {"target", "motion-target"})
+            facts.targets[answerFile(step, mesh).string()] = {mesh + "_target", "/caches/" + mesh + ".npy"};
+    }
+    facts.poses = {1, 44};
+    facts.motion = {1, 120};
+    return facts;
+}
+
+RunSettings settingsWith(const std::function<void(RunSettings&)>& change) {
+    RunSettings settings;
+    settings.character = "/rigs/arm.glb";
+    settings.samples = 40;
+    change(settings);
+    return settings;
+}
+
+struct Kind {
+    const char* name;
+    std::vector<std::string> meshes;
+    std::function<void(RunSettings&)> change;
+};
+
+const std::vector<Kind>& kinds() {
+    static const std::vector<Kind> all = {
+        {"no targets", {"arm"}, [](RunSettings&) {}},
+        {"a cache", {"arm"}, [](RunSettings& s) { s.targets = {"/caches/arm.npy"}; }},
+        {"a command", {"arm", "eye"}, [](RunSettings& s) { s.targetCommand = {"make"}; }},
+        {"a motion by a command",
+         {"arm"},
+         [](RunSettings& s) {
+             s.motion = "/rigs/keys.json";
+             s.targetCommand = {"make"};
+         }},
+        {"caches of one of two", {"eye", "arm"}, [](RunSettings& s) {
+             s.motion = "/rigs/keys.json";
+             s.targets = {"arm=/caches/arm.npy"};
+             s.motionTargets = {"arm=/caches/arm.npy"};
+         }}};
+    return all;
+}
+
+TEST(Plan, EachStepHasWhatItNeedsFromThoseBefore) {
+    for (const Kind& kind : kinds()) {
+        const RunFacts all = factsOf(kind.meshes);
+        const RunSettings settings = settingsWith(kind.change);
+        check(settings);
+        std::set<std::string> labels;
+        std::set<std::filesystem::path> made;
+        for (const Step& step : planOf(settings, all)) {
+            EXPECT_TRUE(labels.insert(step.label()).second) << step.label();
+            EXPECT_THAT(stepNames(), Contains(step.name));
+            for (const auto& input : step.inputs)
+                EXPECT_TRUE(input.is_absolute() || made.count(input) > 0 || step.written.count(input.string()) > 0)
+                    << kind.name << ": " << step.label() << " needs " << input;
+            for (const auto& output : step.outputs)
+                EXPECT_TRUE(made.insert(output).second) << kind.name << ": " << output << " is made twice";
+        }
+        EXPECT_EQ(labels.count("report") > 0, settings.hasTargets()) << kind.name;
+    }
+}
+
+// a run plans again after each step: what it has done already is not to stand elsewhere then
+TEST(Plan, GrowsAtItsEndWithWhatIsKnown) {
+    const auto labelsOf = [](const RunSettings& settings, const RunFacts& facts) {
+        Words labels;
+        for (const Step& step : planOf(settings, facts))
+            labels.push_back(step.label());
+        return labels;
+    };
+    for (const Kind& kind : kinds()) {
+        const RunSettings settings = settingsWith(kind.change);
+        const RunFacts all = factsOf(kind.meshes);
+        RunFacts known;
+        Words before = labelsOf(settings, known);
+        EXPECT_EQ(before, Words{"import"});
+        for (const auto& learn : std::vector<std::function<void()>>{
+                 [&] { known.character = all.character; }, [&] { known.poses = all.poses; },
+                 [&] { known.motion = all.motion; }, [&] { known.targets = all.targets; }}) {
+            learn();
+            // what the poses or the motion have answered is known when their step is done, and the next follows
+            Words now = labelsOf(settings, known);
+            const auto done = static_cast<std::ptrdiff_t>(std::min<std::size_t>(before.size(), 2));
+            ASSERT_GE(now.size(), before.size()) << kind.name;
+            EXPECT_TRUE(std::equal(before.begin(), before.begin() + done, now.begin())) << kind.name;
+            before = now;
+        }
+    }
+}
+
+TEST(Plan, HoldsTheLastPosesOut) {
+    const auto framesOf = [](const Step& step) {
+        return *(std::find(step.words.begin(), step.words.end(), "--frames") + 1);
+    };
+    for (const auto& [change, set, held] :
+         {std::tuple<std::function<void(RunSettings&)>, const char*, const char*>{[](RunSettings&) {}, "1-40", "41-44"},
+          {[](RunSettings& s) { s.heldOut = 10; }, "1-34", "35-44"},
+          {[](RunSettings& s) { s.motion = "/keys.json"; }, "1-44", "1-120"}}) {
+        const RunSettings settings = settingsWith([&, &change = change](RunSettings& s) {
+            s.targetCommand = {"make"};
+            change(s);
+        });
+        for (const Step& step : planOf(settings, factsOf({"arm"}))) {
+            const bool isTrained = step.name == "export", isHeld = step.name == "held-out" || step.name == "play";
+            if (isTrained || isHeld) {
+                EXPECT_EQ(framesOf(step), isTrained ? set : held);
+            }
+        }
+    }
+}
+
+TEST(Plan, RefusesTargetsThatAreNobodys) {
+    struct Row {
+        std::vector<std::string> meshes;
+        Words targets;
+        const char* sentence;
+    };
+    for (const Row& row : {Row{{"arm", "eye"}, {"/a.npy"}, "several meshes, arm, eye: whose targets are in /a.npy"},
+                           Row{{"arm"}, {"leg=/a.npy"}, "targets of \"leg\", and no mesh of that name"},
+                           Row{{"arm"}, {"arm=/a.npy", "/b.npy"}, "two files with targets of arm"},
+                           Row{{}, {"/a.npy"}, "/rigs/arm.glb has no mesh with a skin"}}) {
+        const RunSettings settings = settingsWith([&](RunSettings& s) { s.targets = row.targets; });
+        EXPECT_THAT(failureOf([&] { planOf(settings, factsOf(row.meshes)); }), HasSubstr(row.sentence));
+    }
+    const RunSettings few = settingsWith([](RunSettings& s) {
+        s.targets = {"/a.npy"};
+        s.heldOut = 43;
+    });
+    EXPECT_THAT(failureOf([&] { planOf(few, factsOf({"arm"})); }), HasSubstr("when 43 are held out too few are left"));
+}
+
+// --- what is asked for ---
+
+TEST(Recipe, IsReadFromItsFolderAndFlagsComeBeforeIt) {
+    const TemporaryFolder folder;
+    const auto file = folder.path() / "recipe.json";
+    storage::writeWhole(folder.path() / "make.py", "");
+    storage::writeWhole(file, R"({"character": "arm.glb", "samples": 7, "epochs": 9, "activation-rate": 0.5,
+        "motion": "../keys.json", "motion-targets": ["arm=m.npy"], "train-option": ["--patience", "make.py"],
+        "target-command": ["python3", "make.py", "--deep"]})");
+    RunSettings settings;
+    settings.epochs = 3;
+    readRecipe(
+        file, settings, [](const std::string& name) { return name == "epochs"; }, true);
+    EXPECT_EQ(settings.character, folder.path() / "arm.glb");
+    EXPECT_EQ(settings.motion, folder.path().parent_path() / "keys.json");
+    EXPECT_EQ(settings.motionTargets, Words{"arm=" + (folder.path() / "m.npy").string()});
+    EXPECT_EQ(settings.targetCommand, (Words{"python3", (folder.path() / "make.py").string(), "--deep"}));
+    EXPECT_EQ(settings.trainOptions.back(), (folder.path() / "make.py").string());
+    EXPECT_EQ(settings.samples, 7);
+    EXPECT_EQ(settings.activationRate, 0.5);
+    EXPECT_EQ(settings.epochs, 3);
+}
+
+TEST(Recipe, RefusesWhatItDoesNotKnow) {
+    const TemporaryFolder folder;
+    const auto file = folder.path() / "recipe.json";
+    for (const auto& [text, sentence] :
+         {std::pair(R"(["arm.glb"])", "is no recipe"), std::pair(R"({"sample": 7})", "the key \"sample\""),
+          std::pair(R"({"samples": 7.5})", "\"samples\" that is not a whole number"),
+          std::pair(R"({"motion": 5})", "\"motion\" that is not a text"),
+          std::pair(R"({"targets": ["a", 5]})", "\"targets\" that is not a text"),
+          std::pair(R"({"targets": {}})", "\"targets\" that is not a text, or a list of texts"),
+          std::pair(R"({"target-command": ["rm"]})", "would start a program"),
+          std::pair(R"({"train-option": ["--epochs", "3", "--quarn=/x"]})",
+                    "\"--quarn=/x\" among its \"train-option\""),
+          std::pair(R"({"import-option": "-p/x.so"})", "--allow-commands lets it"), std::pair("{", "line 1")}) {
+        storage::writeWhole(file, text);
+        RunSettings settings;
+        const auto none = [](const std::string&) { return false; };
+        EXPECT_THAT(failureOf([&] { readRecipe(file, settings, none, false); }),
+                    testing::AllOf(HasSubstr(file.string()), HasSubstr(sentence)));
+    }
+}
+
+TEST(Settings, ThatNoRunCanHaveAreRefusedWithTheirValue) {
+    const std::vector<std::pair<std::function<void(RunSettings&)>, const char*>> rows = {
+        {[](RunSettings& s) { s.character.clear(); }, "CHARACTER is missing"},
+        {[](RunSettings& s) { s.samples = 1; }, "samples is 1, not a whole number from 2"},
+        {[](RunSettings& s) { s.heldOut = 2; }, "held-out is 2"},
+        {[](RunSettings& s) { s.activationRate = 1.5; }, "activation-rate is 1.5"},
+        {[](RunSettings& s) { s.order = "files"; }, "order is \"files\", not one of scene, file"},
+        {[](RunSettings& s) { s.from = "animation"; }, "are for poses from limits"},
+        {[](RunSettings& s) { s.targets = s.targetCommand = {"x"}; }, "not from both"},
+        {[](RunSettings& s) { s.motion = "/k", s.targets = {"/x"}; }, "--motion has to have targets as well"},
+        {[](RunSettings& s) { s.motion = "/k", s.heldOut = 9; }, "not both"},
+        {[](RunSettings& s) { s.motionTargets = {"/x"}; }, "give it with --motion"},
+        {[](RunSettings& s) { s.targetPart = 9; }, "are for a --target-command"}};
+    for (const auto& [change, sentence] : rows)
+        EXPECT_THAT(failureOf([&, &change = change] { check(settingsWith(change)); }), HasSubstr(sentence));
+}
+
+} // namespace
+} // namespace quarn

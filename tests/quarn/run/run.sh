@@ -1,0 +1,88 @@
+#!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
+# run.sh QUARN: quarn run on a triangle that a joint moves, as far as no trainer is needed: what it leaves for a tool,
+# that it goes on where it was, whatever ended it, and what it does not take.
+set -euo pipefail
+quarn=$(realpath "$1")
+work=$(mktemp -d)
+trap 'rm -rf "$work"' EXIT
+. "$(dirname "$0")/../../support/expect.sh"
+cp tests/fuzz/corpus/fuzz_gltf/accepted_text "$work/bone.gltf"
+cd "$work"
+options=(--import-option=--with-roots --samples 6 --held-out 3)
+# targets are the skin, 0.1 higher: frames are asked for in parts, and nothing says whether that is the first run
+cat >lift.sh <<'SCRIPT'
+set -e
+field() { sed -n "s/.*\"$1\": \"\(.*\)\".*/\1/p" "$request"; }
+request=$1
+echo "asked for $(tr -d ' \n' <"$request" | grep -o '"frames":[^]]*]')"
+[ ! -e "$(dirname "$0")/wait" ] || { echo waiting; sleep 1000; }
+[ -e "$(dirname "$0")/go" ] || { echo "not yet"; exit 5; }
+# the file of the skin is what is to be written, as long as all is asked for
+sed -n '/"skin"/,/}/s/.*"file": "\(.*\)",/\1/p' "$request" | xargs -I{} cp {} "$(field write)"
+SCRIPT
+with_targets=("${options[@]}" --target-command sh lift.sh)
+
+# --- to the poses, and no further ---
+expect 0 'then the same command goes on, with --targets FILE added' 'skin +\d+\.\d s\n$' run bone.gltf -o made "${options[@]}"
+expect 0 'targets are shaped alike' '^4 of 4 steps were done already\n$' run bone.gltf -o made "${options[@]}"
+[[ -s made/poses.json && -n $(find made/data -name poses_skin.npy) && ! -e made/lock ]] || fail "not what a tool needs"
+expect 0 'import: done\nposes: to do, as its arguments are others: --samples 11, was --samples 9\nrest: done\nskin: done, but' '' \
+  run bone.gltf -o made --import-option=--with-roots --samples 8 --held-out 3 --explain
+
+# --- a target command that fails, is killed, and works ---
+expect 1 '' 'targets ended with status 5\n  \| asked for "frames":\[1,.*,9\]\n  \| not yet\nall that it said is in .*/made/log/targets\.log' \
+  run bone.gltf -o made "${with_targets[@]}"
+# interrupt SIGNAL: while the command is at work; the status goes to $status
+interrupt() {
+  touch wait
+  rm -f made/log/targets.log
+  "$quarn" run bone.gltf -o made "${with_targets[@]}" >said.txt 2>errors.txt &
+  local process=$!
+  for ((i = 0; i < 1200; ++i)); do ! grep -qs waiting made/log/targets.log || break; sleep 0.05; done
+  expect 1 '' 'another quarn run is writing .*/made; wait' run bone.gltf -o made "${options[@]}"
+  kill "-$1" "$process"
+  status=0
+  wait "$process" || status=$?
+  rm wait
+}
+interrupt TERM
+[[ $status == 130 ]] && grep -q 'what was done before targets is kept .*: the same command goes on' errors.txt ||
+  { fail "interrupted: status $status"; cat errors.txt; }
+interrupt KILL
+touch go
+expect 0 '' 'targets +\d.*\ntarget .*\nexport .*\nheld-out .*\n4 of 8 steps were done' \
+  run bone.gltf -o made --until held-out "${with_targets[@]}"
+[[ ! -e made/scratch && -s $(find made/data -name dataset.json | head -n 1) ]] || fail "no data set, or a scratch folder"
+
+# --- nothing twice; what is spoiled, and what follows from a change, again ---
+expect 0 '' '^8 of 8 steps were done already\n$' run bone.gltf -o made --until held-out "${with_targets[@]}"
+skin=$(find made/data -name poses_skin.npy)
+cp "$skin" cache.npy
+echo spoiled >"$skin"
+expect 0 '"step": "skin",\s*"done": true,\s*"why": "its output .*poses_skin\.npy has changed"(.|\n)*"step": "targets",\s*"done": true,\s*"why": ""' \
+  '^skin .*\n7 of 8' run bone.gltf -o made --until held-out --json "${with_targets[@]}"
+echo '# changed' >>lift.sh
+expect 0 '' '^targets .*\n7 of 8' run bone.gltf -o made --until held-out "${with_targets[@]}"
+mv made moved
+expect 0 '' '^8 of 8 steps were done already\n$' run bone.gltf -o moved --until held-out "${with_targets[@]}"
+
+# --- targets in a file, from a recipe ---
+mkdir recipes
+cat >recipes/bone.json <<'RECIPE'
+{"character": "../bone.gltf", "import-option": "--with-roots", "samples": 6, "held-out": 3, "targets": "../cache.npy"}
+RECIPE
+expect 0 '' 'target .*\n(.|\n)*held-out .*s\n$' run --recipe recipes/bone.json -o file --until held-out
+sed 's|"targets": .*|"target-command": ["true"]}|' recipes/bone.json >recipes/command.json
+expect 1 '' 'command\.json would start a program .*: --allow-commands lets it' run --recipe recipes/command.json -o file
+expect 1 '' 'targets ended with status 0, and has not written the file' run --recipe recipes/command.json -o other --allow-commands
+
+# --- what is not taken ---
+touch mine
+expect 1 '' 'is not empty \(' run bone.gltf -o .
+expect 2 '' 'there is no step "trian"; steps are import, ' run bone.gltf -o made --until trian
+expect 2 '' '--target-command needs a program' run bone.gltf -o made --target-command
+expect 2 '' 'samples is 1, not a whole number' run bone.gltf -o made --samples 1
+expect 1 '' 'import ended with status 1\n  \| quarn: .*none\.glb|none\.glb, which import needs, is not there' run none.glb -o none
+[[ ! -e none/run.json ]] || fail "a run of nothing"
+exit $bad
