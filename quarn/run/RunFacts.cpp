@@ -58,17 +58,28 @@ CharacterFacts characterIn(const JsonValue& answer) {
     return facts;
 }
 
+// what lies beside the scene, which is in the run's folder, is named from there: the folder can be moved
+fs::path besideScene(const fs::path& file, const fs::path& scene) {
+    const fs::path relative = file.lexically_relative(scene.parent_path());
+    return relative.empty() || *relative.begin() == ".." ? file : relative;
+}
+
+std::optional<double> lengthIn(const JsonValue& answer, const char* name) {
+    const bool isThere = answer.HasMember("fit") && answer["fit"].IsObject() && answer["fit"].HasMember(name) &&
+                         answer["fit"][name].IsNumber();
+    return isThere ? std::optional(answer["fit"][name].GetDouble()) : std::nullopt;
+}
+
+TargetFacts targetIn(const JsonValue& answer) {
+    return {textOf(answer, "target"), besideScene(textOf(answer, "cache"), textOf(answer, "scene")),
+            lengthIn(answer, "meanMm"), lengthIn(answer, "largestMm")};
+}
+
 FrameSpan framesIn(const JsonValue& answer) {
     const FrameSpan span{frameOf(answer, "firstFrame"), frameOf(answer, "lastFrame")};
     if (span.last < span.first)
         throw std::runtime_error("lastFrame lies before firstFrame");
     return span;
-}
-
-// what lies beside the scene, which is in the run's folder, is named from there: the folder can be moved
-fs::path besideScene(const fs::path& file, const fs::path& scene) {
-    const fs::path relative = file.lexically_relative(scene.parent_path());
-    return relative.empty() || *relative.begin() == ".." ? file : relative;
 }
 
 template <class Read>
@@ -96,10 +107,7 @@ RunFacts readFacts(const fs::path& folder) {
     for (const MeshFacts& mesh : facts.character->meshes)
         for (const char* step : {"target", "motion-target"}) {
             const fs::path file = answerFile(step, mesh.name);
-            const auto target = read(folder / file, [](const JsonValue& answer) {
-                return TargetFacts{textOf(answer, "target"),
-                                   besideScene(textOf(answer, "cache"), textOf(answer, "scene"))};
-            });
+            const std::optional<TargetFacts> target = read(folder / file, targetIn);
             if (target)
                 facts.targets[file.string()] = *target;
         }

@@ -27,10 +27,11 @@ struct FrameSpan {
     int count() const { return last - first + 1; }
 };
 
-/// A target as it is connected: its node, and the cache that the scene plays.
+/// A target as it is connected: its node, the cache that the scene plays, and how far that is from the skin.
 struct TargetFacts {
     std::string node;
     std::filesystem::path cache;
+    std::optional<double> meanMm, largestMm; ///< where they were compared
 };
 
 struct RunFacts {

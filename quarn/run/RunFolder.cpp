@@ -3,6 +3,7 @@
 
 #include "quarn/console/Log.h"
 #include "quarn/console/interrupt.h"
+#include "quarn/console/numberText.h"
 #include "quarn/process/runProgram.h"
 #include "quarn/run/StepLine.h"
 #include "quarn/run/targetProgram.h"
@@ -15,6 +16,8 @@
 
 #include <algorithm>
 #include <set>
+#include <sstream>
+#include <string_view>
 
 namespace quarn {
 namespace {
@@ -151,6 +154,20 @@ void RunFolder::perform(const Step& step) {
     }
 }
 
+// what a user has to know of a step that went well: its warnings, and how far targets are from the skin
+void RunFolder::tellOf(const Step& step) const {
+    constexpr std::string_view mark = "warning: ";
+    std::istringstream said(storage::readWholeFile(logOf(step), mostOfAnAnswer));
+    for (std::string line; std::getline(said, line);)
+        if (line.rfind(mark, 0) == 0)
+            console_.warn(step.label() + ": " + line.substr(mark.size()));
+    const RunFacts all = facts();
+    const auto target = all.targets.find(step.answer.string());
+    if (target != all.targets.end() && target->second.meanMm && target->second.largestMm)
+        console_.note("  the targets are " + numberText(*target->second.meanMm) + " mm from the skin in the mean, " +
+                      numberText(*target->second.largestMm) + " mm at most");
+}
+
 double RunFolder::doStep(const Step& step, const std::string& why) {
     const auto begin = std::chrono::steady_clock::now();
     const Stage stage([&] { return step.label() + ", as " + why; });
@@ -159,6 +176,7 @@ double RunFolder::doStep(const Step& step, const std::string& why) {
     ledger_.finish(step);
     const std::chrono::duration<double> taken = std::chrono::steady_clock::now() - begin;
     StepLine::finish(console_, step.label(), taken.count());
+    tellOf(step);
     return taken.count();
 }
 

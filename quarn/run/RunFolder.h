@@ -43,6 +43,7 @@ private:
     void start(const Step& step);
     void perform(const Step& step);
     [[noreturn]] void fail(const Step& step, const std::string& why) const;
+    void tellOf(const Step& step) const;
     double doStep(const Step& step, const std::string& why);
 
     const RunSettings& settings_;

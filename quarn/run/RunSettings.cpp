@@ -85,7 +85,9 @@ void check(const RunSettings& settings) {
     requireRange("target-timeout", settings.targetTimeout, 1);
     requireRange("target-part", settings.targetPart, 1);
     requireOneOf("from", settings.from, {"limits", "animation", "both"});
-    requireOneOf("order", settings.order, {"scene", "file"});
+    requireOneOf("order", settings.order, {"scene", "file", "rest"});
+    if (settings.scale && !(std::isfinite(*settings.scale) && *settings.scale > 0.0))
+        throw UsageError("scale is " + numberText(*settings.scale) + ", not a number above 0");
     const double rate = settings.activationRate.value_or(0.0);
     if (!std::isfinite(rate) || rate < 0.0 || rate > 1.0)
         throw UsageError("activation-rate is " + numberText(rate) + ", not a number from 0 to 1");
@@ -99,6 +101,10 @@ void check(const RunSettings& settings) {
         throw UsageError("--motion-targets are the shapes of a motion: give it with --motion");
     if (!settings.motion.empty() && !settings.targets.empty() && settings.motionTargets.empty())
         throw UsageError("--motion has to have targets as well: give them with --motion-targets");
+    const bool isOther = settings.scale || !settings.axes.empty() || settings.order == "rest";
+    if (!settings.targetCommand.empty() && isOther)
+        throw UsageError(
+            "--axes, --scale and --order rest are for --targets: a target command writes what it is given");
     if (settings.targetCommand.empty() && (settings.targetTimeout || settings.targetPart))
         throw UsageError("--target-timeout and --target-part are for a --target-command");
 }

@@ -16,8 +16,9 @@ struct RunSettings {
     std::filesystem::path character;
     std::filesystem::path parents, limits, motion;
     std::optional<std::int64_t> samples, heldOut, seed, epochs, targetTimeout, targetPart;
-    std::optional<double> activationRate;
-    std::string from, order;
+    std::optional<double> activationRate, scale;
+    std::string from, order, axes;
+    bool align = false, anyway = false;
     Words targets, motionTargets; ///< FILE, or MESH=FILE
     Words targetCommand;
     Words importOptions, poseOptions, targetOptions, exportOptions, trainOptions,
@@ -44,7 +45,11 @@ void visitSettings(const Visit& visit) {
     visit("motion-targets", &Settings::motionTargets, "[MESH=]FILE", "The shapes of the motion, likewise");
     visit("target-timeout", &Settings::targetTimeout, "SECONDS", "How long a target command may take [without end]");
     visit("target-part", &Settings::targetPart, "N", "Frames that a target command is asked for at once [all]");
-    visit("order", &Settings::order, "scene|file", "Whose vertices skins and targets have [scene]");
+    visit("order", &Settings::order, "scene|file|rest", "Whose vertices targets, and the skins for them, have [scene]");
+    visit("axes", &Settings::axes, "AXES", "The axes of targets, as for quarn target");
+    visit("scale", &Settings::scale, "FACTOR", "Units of the scene in a unit of targets, likewise");
+    visit("align", &Settings::align, "", "Mend targets that do not fit the skin, likewise");
+    visit("anyway", &Settings::anyway, "", "Take targets that do not fit the skin");
     visit("epochs", &Settings::epochs, "N", "Of the training [the node's]");
     visit("import-option", &Settings::importOptions, "WORD", "A word more for quarn import; may be repeated");
     visit("pose-option", &Settings::poseOptions, "WORD", "A word more for quarn pose; may be repeated");

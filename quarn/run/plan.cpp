@@ -81,7 +81,8 @@ public:
 
 private:
     bool hasMotion() const { return !settings_.motion.empty(); }
-    std::string order() const { return settings_.order.empty() ? "scene" : settings_.order; }
+    // of skins; targets in the order of the rest pose are made to fit those of the scene
+    std::string order() const { return settings_.order == "file" ? "file" : "scene"; }
     std::string dataOf(const MeshFacts& mesh) const { return "data/" + mesh.name; }
     std::string heldScene() const { return hasMotion() ? "motion" : "poses"; }
     FrameSpan heldFrames() const { return hasMotion() ? *facts_.motion : heldOutFrames(settings_, *facts_.poses); }
@@ -218,8 +219,16 @@ private:
             const std::string output = scene + "." + mesh.name + ".json";
             Step& step = addAnswering(isMotion ? "motion-target" : "target", &mesh,
                                       {"target", scene + ".json", "--cache", cache.string(), "--geometry", mesh.name,
-                                       "--order", order(), "-o", output},
+                                       "--order", settings_.order.empty() ? "scene" : settings_.order, "-o", output},
                                       {scene + ".json", cache}, {output});
+            if (!settings_.axes.empty())
+                append(step.words, {"--axes", settings_.axes});
+            if (settings_.scale)
+                append(step.words, {"--scale", decimal(*settings_.scale)});
+            if (settings_.align)
+                step.words.emplace_back("--align");
+            if (settings_.anyway)
+                step.words.emplace_back("--anyway");
             append(step.words, settings_.targetOptions);
         });
     }
@@ -281,6 +290,8 @@ private:
                 {"export", file, "--geometry", mesh.name, "--frames", framesText(frames), "-o", folder,
                  "--overwrite"}, // the ledger knows whether it is to be made again; what was begun is gone on with
                 {file, targetOf(scene, mesh)->cache}, setFiles(folder));
+        if (settings_.anyway)
+            step.words.emplace_back("--anyway");
         append(step.words, settings_.exportOptions);
     }
 

@@ -31,6 +31,11 @@ public:
             fail("a number");
         number = value_.GetDouble();
     }
+    void read(bool& flag) const {
+        if (!value_.IsBool())
+            fail("true or false");
+        flag = value_.GetBool();
+    }
     void read(std::string& text) const { text = textOf(value_); }
     void read(fs::path& path) const { path = textOf(value_); }
     void read(Words& words) const {

@@ -13,6 +13,7 @@
 
 #include <algorithm>
 #include <iostream>
+#include <type_traits>
 
 namespace quarn {
 namespace {
@@ -145,8 +146,11 @@ void addOptions(CLI::App& command, Options& options) {
         ->type_name("FOLDER");
     command.add_option("--recipe", options.recipe, "JSON: what flags say, under their names")->type_name("FILE");
     visitSettings([&](const char* name, auto member, const char* type, const char* help) {
-        CLI::Option* option = command.add_option(std::string("--") + name, options.settings.*member, help);
-        option->type_name(type)->allow_extra_args(false);
+        const std::string flag = std::string("--") + name;
+        if constexpr (std::is_same_v<decltype(member), bool RunSettings::*>)
+            command.add_flag(flag, options.settings.*member, help);
+        else
+            command.add_option(flag, options.settings.*member, help)->type_name(type)->allow_extra_args(false);
     });
     command.add_flag("--allow-commands", options.allowCommands, "Let a recipe start the program that it names");
     command.add_option("--until", options.until, "Stop behind this step")->type_name("STEP");

@@ -24,7 +24,7 @@ RunFacts factsOf(const std::vector<std::string>& meshes) {
     for (const std::string& mesh : meshes) {
         facts.character->meshes.push_back({mesh, mesh + "_skin", 10, 12});
         for (const char* step : {"target", "motion-target"})
-            facts.targets[answerFile(step, mesh).string()] = {mesh + "_target", "/caches/" + mesh + ".npy"};
+            facts.targets[answerFile(step, mesh).string()] = {mesh + "_target", "/caches/" + mesh + ".npy", {}, {}};
     }
     facts.poses = {1, 44};
     facts.motion = {1, 120};
@@ -183,6 +183,7 @@ TEST(Recipe, RefusesWhatItDoesNotKnow) {
          {std::pair(R"(["arm.glb"])", "is no recipe"), std::pair(R"({"sample": 7})", "the key \"sample\""),
           std::pair(R"({"samples": 7.5})", "\"samples\" that is not a whole number"),
           std::pair(R"({"motion": 5})", "\"motion\" that is not a text"),
+          std::pair(R"({"align": 1})", "\"align\" that is not true or false"),
           std::pair(R"({"targets": ["a", 5]})", "\"targets\" that is not a text"),
           std::pair(R"({"targets": {}})", "\"targets\" that is not a text, or a list of texts"),
           std::pair(R"({"target-command": ["rm"]})", "would start a program"),
@@ -203,7 +204,9 @@ TEST(Settings, ThatNoRunCanHaveAreRefusedWithTheirValue) {
         {[](RunSettings& s) { s.samples = 1; }, "samples is 1, not a whole number from 2"},
         {[](RunSettings& s) { s.heldOut = 2; }, "held-out is 2"},
         {[](RunSettings& s) { s.activationRate = 1.5; }, "activation-rate is 1.5"},
-        {[](RunSettings& s) { s.order = "files"; }, "order is \"files\", not one of scene, file"},
+        {[](RunSettings& s) { s.order = "files"; }, "order is \"files\", not one of scene, file, rest"},
+        {[](RunSettings& s) { s.scale = 0.0; }, "scale is 0, not a number above 0"},
+        {[](RunSettings& s) { s.order = "rest", s.targetCommand = {"x"}; }, "are for --targets"},
         {[](RunSettings& s) { s.from = "animation"; }, "are for poses from limits"},
         {[](RunSettings& s) { s.targets = s.targetCommand = {"x"}; }, "not from both"},
         {[](RunSettings& s) { s.motion = "/k", s.targets = {"/x"}; }, "--motion has to have targets as well"},
