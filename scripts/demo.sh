@@ -1,15 +1,17 @@
 # shellcheck shell=bash
 # ./run demo: from a rigged hand to a neural deformation and its report. Sourced by ./run.
 #
-# Every step is a command that docs/tutorial.md explains; what it prints goes to a file in the log folder. The rows of the
-# report are two delta modes, with --all by two kinds of model; each network of a demo without it is in a picture.
+# A row of the report is a quarn run (docs/run.md), whose steps are the commands that docs/tutorial.md explains; what a step
+# prints goes to a file in its log folder. Rows are two delta modes, with --all by two kinds of model; each network of a
+# demo without it is in a picture.
 
 demo_usage() {
   cat <<'TEXT'
 usage: ./run demo [--all] [--output FOLDER] [--samples N] [--epochs N]
 
   --all             also two networks that learn the deltas themselves, without principal shapes; no picture shows them
-  --output FOLDER   where the results go (default: demo-out); results of an earlier demo there are replaced
+  --output FOLDER   where the results go (default: demo-out); those of an earlier demo there are replaced, but for
+                    steps that would come out the same
   --samples N       training poses, 10 or more (default 3000)
   --epochs N        passes over them (default 250)
 TEXT
@@ -151,133 +153,87 @@ demo_install() {
   export QUARN=$PWD/build/release/quarn/quarn
 }
 
-# only what a demo makes goes: a folder of the user's keeps whatever else is in it
+# What an earlier demo has made of the same poses and settings is kept: quarn run knows. Pictures and report are made anew;
+# a folder of the user's keeps whatever else is in it.
 demo_folders() {
   data=$demo_out/data logs=$demo_out/log
-  rm -rf "$data" "$demo_out/pictures" "$logs"
+  rm -rf "$data/preview" "$demo_out/pictures" "$logs"
   rm -f "$demo_out"/report.{html,json} "$demo_out"/{table.txt,preview.webp}
-  mkdir -p "$data"/{models,results,preview} "$demo_out/pictures" "$logs"
+  mkdir -p "$data/preview" "$demo_out/pictures" "$logs"
 }
 
-# the rig, its controls and the deformer, from the file as it was published
-demo_import() {
-  step "importing the rigged hand" \
-    "$QUARN" import build/deps/hand/left.glb -o "$data/hand.json" --neural-warp --model-root models \
-    --parents examples/hand/parents.json --limits examples/hand/limits.json --smoothing "$surface_smoothing"
+# demo_row ROW STEP ARGS...: the row's quarn run, up to the step, in the folder data/ROW
+demo_row() {
+  local row=$1 last=$2 smoothing=0 kind=(--train-option=--principal-limit --train-option=100
+    --train-option=--principal-accuracy --train-option=0.999)
+  shift 2
+  [[ $row != surface_* ]] || smoothing=$surface_smoothing
+  [[ $row != *_direct ]] || kind=(--train-option=--direct)
+  NW_PYTHON=$python "$QUARN" run build/deps/hand/left.glb -o "$data/$row" --until "$last" \
+    --parents examples/hand/parents.json --limits examples/hand/limits.json \
+    --import-option=--delta-mode --import-option="${row%_*}" --import-option=--smoothing --import-option="$smoothing" \
+    --samples "$demo_samples" --activation-rate "$activation_rate" --seed 1 --motion examples/hand/motion.json \
+    --epochs "$demo_epochs" --train-option=--learning-rate --train-option=0.001 "${kind[@]}" "$@"
 }
 
-# set_mode SCENE surface|offset: the same scene with the other settings of its deltas
-set_mode() {
-  local scene=$1 mode=$2 smoothing=0 label=Offset
-  if [[ $mode == surface ]]; then smoothing=$surface_smoothing label=Surface; fi
-  printf 'file -open "%s"\nsetAttr warp.export[0].deltaMode %s\nsetAttr warp.export[0].smoothingIterations %s\nfile -saveAs "%s"\n' \
-    "$scene" "$label" "$smoothing" "${scene%.json}_$mode.json" | "$QUARN" exec -
-}
-
-# targets and data sets of both modes for a posed scene: data/NAME.json
-demo_targets_and_sets() {
-  local name=$1 mode
-  step "$name: linear skinning, every frame" \
-    "$QUARN" bake "$data/$name.json" "$skin_plug" -o "$data/${name}_skin.npy"
-  step "$name: target shapes" \
-    "$python" examples/hand/targets.py "$data/$name.json" "$data/${name}_skin.npy" -o "$data/${name}_target.npy" \
-    --jobs "$(job_count)"
-  step "$name: connecting the targets" \
-    "$QUARN" target "$data/$name.json" --cache "$data/${name}_target.npy" -o "$data/$name.json"
-  for mode in surface offset; do
-    step "$name: $mode settings" set_mode "$data/$name.json" "$mode"
-    step "$name: $mode deltas" "$QUARN" export "$data/${name}_$mode.json" -o "$data/sets/${name}_$mode"
-  done
-}
-
-demo_poses() {
-  step "sampling $demo_samples poses" \
-    "$QUARN" pose "$data/hand.json" --samples "$demo_samples" --activation-rate "$activation_rate" --seed 1 \
-    -o "$data/poses.json"
-  demo_targets_and_sets poses
-  step "the held-out motion" "$QUARN" pose "$data/hand.json" --keys examples/hand/motion.json -o "$data/motion.json"
-  demo_targets_and_sets motion
-}
-
-# kind_flags ROW: how the trainer is told the kind of model
-kind_flags() {
-  if [[ $1 == *_principal ]]; then
-    printf '%s\n' --principal-shapes --principal-limit 100 --principal-accuracy 0.999
+# demo_row_with_targets ROW STEP ARGS...: the first row has them made, the others take them from there
+demo_row_with_targets() {
+  local made=$data/surface_principal/data/$mesh
+  if [[ $1 == surface_principal ]]; then
+    demo_row "$@" --target-command "$python" examples/hand/target_command.py
   else
-    printf '%s\n' --direct
+    demo_row "$@" --targets "$made/poses_target.npy" --motion-targets "$made/motion_target.npy"
   fi
 }
 
-# train_row ROW
-train_row() {
-  local row=$1 flags
-  mapfile -t flags < <(kind_flags "$row")
-  "$python" -m trainer train "$data/sets/poses_${row%_*}" -o "$data/models/$row.nwrp" --seed 1 \
-    --epochs "$demo_epochs" --learning-rate 0.001 "${flags[@]}" --report "$data/results/$row"
-}
-
-# a training uses one core: two go side by side
-train_both_modes() {
-  local kind=$1 failed=0 surface
-  train_row "surface_$kind" &
-  surface=$!
-  train_row "offset_$kind" || failed=1
-  wait "$surface" || failed=1
-  return "$failed"
-}
-
-# the motion through the plug-in against the target, on the CPU and on the OpenCL device, and what the trainer says of
-# the same frames
-measure_row() {
-  local row=$1 evaluator
-  for evaluator in cpu gpu; do
-    "$QUARN" play "$data/motion_${row%_*}.json" --model "$row" --against target --repeat 3 --evaluator "$evaluator" \
-      -o "$data/motion_${row}_$evaluator.npy" --json >"$data/results/$row/play_$evaluator.json" || return
-  done
-  "$python" -m trainer evaluate "$data/sets/motion_${row%_*}" "$data/models/$row.nwrp" --json \
-    >"$data/results/$row/evaluate.json"
-}
-
-demo_models() {
-  local kind row
+# Targets take all cores, a training one: the rows of both modes go side by side, and one of them in silence.
+demo_rows() {
+  local kind beside log
+  say "rig, poses and targets"
+  demo_row_with_targets surface_principal motion-target
   for kind in "${demo_kinds[@]}"; do
-    step "training: both modes, $kind" train_both_modes "$kind"
-    for row in "surface_$kind" "offset_$kind"; do
-      step "the motion with the model ${row/_/, }" measure_row "$row"
-    done
+    say "deltas, training and figures: both modes, $kind"
+    log=$logs/offset_$kind.log
+    demo_row_with_targets "offset_$kind" evaluate --quiet >"$log" 2>&1 &
+    beside=$!
+    demo_row_with_targets "surface_$kind" evaluate
+    wait "$beside" || {
+      cat "$log" >&2
+      fail "the row of offsets, $kind, failed"
+    }
   done
 }
 
 demo_pictures() {
+  local scene=motion.$mesh.json
   local panels=(--panel "skin=$skin_plug" --panel "target=$target_plug" --panel "neural=warp.outputGeom[0]"
     --heat "error=warp.outputGeom[0]:$target_plug" --range 2 --view 90,20)
   step "pictures" \
-    "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --model surface_principal --size 480x480 --frames 20-100x20 \
+    "$QUARN" render "$data/surface_principal/$scene" "${panels[@]}" --model "$mesh" --size 480x480 --frames 20-100x20 \
     -o "$demo_out/pictures/motion.####.png"
   step "a picture of the network of offsets" \
-    "$QUARN" render "$data/motion_offset.json" "${panels[@]}" --model offset_principal --size 480x480 --frames 60 \
+    "$QUARN" render "$data/offset_principal/$scene" "${panels[@]}" --model "$mesh" --size 480x480 --frames 60 \
     -o "$demo_out/pictures/offset.####.png"
   made_in=$data/preview made_of=60 step "the moving picture" \
-    "$QUARN" render "$data/motion_surface.json" "${panels[@]}" --model surface_principal --size 300x300 --frames 1-120x2 \
+    "$QUARN" render "$data/surface_principal/$scene" "${panels[@]}" --model "$mesh" --size 300x300 --frames 1-120x2 \
     -o "$data/preview/frame.####.png"
 }
 
 command_demo() {
   local data logs python demo_out demo_samples demo_epochs demo_kinds
-  local surface_smoothing=5 activation_rate=0.8 skin_plug target_plug start=$SECONDS judge=()
+  local surface_smoothing=5 activation_rate=0.8 mesh=l_handMeshNode skin_plug target_plug start=$SECONDS judge=()
   demo_options "$@"
   demo_announce
   demo_install
   demo_folders
   watch_for_interrupt
-  say "what each step prints goes to $logs"
-  demo_import
-  skin_plug=l_handMeshNode_skin.outputGeom[0] target_plug=l_handMeshNode_target.outMesh
-  demo_poses
-  demo_models
+  say "what each step prints goes to $data/ROW/log and $logs"
+  skin_plug=${mesh}_skin.outputGeom[0] target_plug=${mesh}_target.outMesh
+  demo_rows
   demo_pictures
   # fewer poses or passes than these are for trying the commands: they cannot keep the limits
   ((demo_samples >= 3000 && demo_epochs >= 250)) && judge=(--judge)
-  "$python" examples/hand/report.py "$demo_out" "${judge[@]}"
+  local rows=("${demo_kinds[@]/#/surface_}" "${demo_kinds[@]/#/offset_}")
+  "$python" examples/hand/report.py "$demo_out" "${rows[@]}" "${judge[@]}"
   say "done after $((SECONDS - start)) s: open $demo_out/report.html"
 }

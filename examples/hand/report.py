@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""report.py FOLDER: the report of a demo, from what its commands have written below FOLDER.
+"""report.py FOLDER ROW...: the report of a demo, from what quarn run has written into the folders FOLDER/data/ROW.
 
 Writes report.json (the numbers), report.html (one file that shows them with the pictures, to be sent as it is),
 preview.webp (the moving picture) and table.txt. Ends with status 1 when the numbers do not agree with each other, or,
@@ -16,26 +16,24 @@ from trainer import page  # noqa: E402
 from trainer.errors import TrainerError  # noqa: E402
 from trainer.rows import Played, Report, Row, figures  # noqa: E402
 
-MODES, KINDS = ("surface", "offset"), ("principal", "direct")
+MESH = "l_handMeshNode"
 # what a model has to achieve on the held-out motion, against the better of the skin and the deformer without deltas
 MEAN_LIMIT, MAX_LIMIT = 1 / 5, 1 / 2
 
 
-def row_of(data: Path, mode: str, kind: str) -> Row:
-    results, motion = data / "results" / f"{mode}_{kind}", f"motion_{mode}_{kind}"
-    cpu, gpu = (Played(results / f"play_{where}.json", data / f"{motion}_{where}.npy") for where in ("cpu", "gpu"))
-    return Row("", data / "sets" / f"poses_{mode}", data / "sets" / f"motion_{mode}", results,
-               results / "evaluate.json", data / "motion_skin.npy", data / "motion_target.npy", cpu, gpu)
+def row_of(run: Path) -> Row:
+    """Of the folder of a quarn run."""
+    data, answers = run / "data" / MESH, run / "answers"
+    cpu, gpu = (Played(answers / f"{step}-{MESH}.json", data / f"heldOut_{where}.npy")
+                for step, where in (("play", "cpu"), ("play-gpu", "gpu")))
+    return Row("", data / "set", data / "heldOut", data / "training", answers / f"evaluate-{MESH}.json",
+               data / "heldOut_skin.npy", data / "heldOut_target.npy", cpu, gpu)
 
 
-def report_of(folder: Path) -> Report:
-    data = folder / "data"
-    # a demo that was not asked for --all has no direct models
-    rows = [row_of(data, mode, kind) for mode in MODES for kind in KINDS
-            if (data / "results" / f"{mode}_{kind}").is_dir()]
-    return Report("A hand that keeps its volume", True, 1, rows,
+def report_of(folder: Path, rows: list[str]) -> Report:
+    return Report("A hand that keeps its volume", True, 1, [row_of(folder / "data" / name) for name in rows],
                   [(path, caption(path)) for path in sorted((folder / "pictures").glob("*.png"))],
-                  sorted((data / "preview").glob("*.png")))
+                  sorted((folder / "data" / "preview").glob("*.png")))
 
 
 def caption(path: Path) -> str:
@@ -47,10 +45,11 @@ def caption(path: Path) -> str:
 def main() -> None:
     parser = argparse.ArgumentParser(description="The report of a demo.")
     parser.add_argument("folder", type=Path, help="what ./run demo calls its output folder")
+    parser.add_argument("rows", nargs="+", metavar="ROW", help="folders of quarn run below FOLDER/data")
     parser.add_argument("--judge", action="store_true", help="end with status 1 when the limits are not kept")
     arguments = parser.parse_args()
     try:
-        report = report_of(arguments.folder)
+        report = report_of(arguments.folder, arguments.rows)
         rows = [figures(row, report.is_motion, report.first_frame) for row in report.rows]
         kept = all(row["ratio"]["mean"] <= MEAN_LIMIT and row["ratio"]["max"] <= MAX_LIMIT for row in rows)
         page.write(report, rows, arguments.folder,

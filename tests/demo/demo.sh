@@ -28,8 +28,9 @@ done
 
 # zero_errors MODE FIGURE: what a model of zeros leaves
 for mode in surface offset; do
-  "$python" -m trainer zero "$work/demo/data/sets/motion_$mode" -o "$work/demo/data/models/zero.nwrp"
-  "$quarn" play "$work/demo/data/motion_$mode.json" --model zero --against target --json >"$work/zero.json"
+  run=$work/demo/data/${mode}_principal
+  "$python" -m trainer zero "$run/data/l_handMeshNode/heldOut" -o "$run/models/zero.nwrp"
+  "$quarn" play "$run/motion.l_handMeshNode.json" --model zero --against target --json >"$work/zero.json"
   "$python" - "$work/zero.json" "$work/demo/report.json" "$mode" <<'PYTHON'
 import json, sys
 zero = json.load(open(sys.argv[1]))["distance"]["mm"]

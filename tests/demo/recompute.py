@@ -11,20 +11,18 @@ import numpy as np
 
 folder = Path(sys.argv[1])
 report = json.loads((folder / "report.json").read_text())
-files = json.loads((folder / "rows.json").read_text())["rows"] if (folder / "rows.json").exists() else None
+rows_file = folder / "rows.json"
+meshes = [row["mesh"] for row in json.loads(rows_file.read_text())["rows"]] if rows_file.exists() else None
 
 
 def files_of(number: int, row: dict[str, Any]) -> dict[str, Path]:
-    """The held-out set, the model, and the points of skin, target, CPU and GPU."""
-    if files is not None:
-        of_row = files[number]
-        return {"set": folder / of_row["heldOut"], "model": folder / "models" / f"{of_row['mesh']}.nwrp",
-                **{what: folder / of_row[what] for what in ("skin", "target")},
-                **{what: folder / of_row[what]["points"] for what in ("cpu", "gpu")}}
-    name, data = f"{row['mode']}_{row['kind']}", folder / "data"
-    return {"set": data / "sets" / f"motion_{row['mode']}", "model": data / "models" / f"{name}.nwrp",
-            **{what: data / f"motion_{what}.npy" for what in ("skin", "target")},
-            **{what: data / f"motion_{name}_{what}.npy" for what in ("cpu", "gpu")}}
+    """The held-out set, the model, and the points of skin, target, CPU and GPU: in the folder of a quarn run, or in one
+    that a demo has for each of its rows."""
+    run = folder if meshes else folder / "data" / f"{row['mode']}_{row['kind']}"
+    mesh = meshes[number] if meshes else "l_handMeshNode"
+    data = run / "data" / mesh
+    return {"set": data / "heldOut", "model": run / "models" / f"{mesh}.nwrp",
+            **{what: data / f"heldOut_{what}.npy" for what in ("skin", "target", "cpu", "gpu")}}
 
 
 compared = 0
