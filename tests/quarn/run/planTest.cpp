@@ -133,6 +133,15 @@ TEST(Plan, HoldsTheLastPosesOut) {
     }
 }
 
+TEST(Plan, NamesAMeshByItsPlaceInTheDeformer) {
+    const Kind& kind = kinds().back(); // arm, behind eye
+    Words words;
+    for (const Step& step : planOf(settingsWith(kind.change), factsOf(kind.meshes)))
+        words.insert(words.end(), step.words.begin(), step.words.end());
+    EXPECT_THAT(words, Contains("neural=warp.outputGeom[1]"));
+    EXPECT_THAT(words, testing::Not(Contains("eye_target.outMesh")));
+}
+
 TEST(Plan, RefusesTargetsThatAreNobodys) {
     struct Row {
         std::vector<std::string> meshes;

@@ -77,6 +77,15 @@ sed 's|"targets": .*|"target-command": ["true"]}|' recipes/bone.json >recipes/co
 expect 1 '' 'command\.json would start a program .*: --allow-commands lets it' run --recipe recipes/command.json -o file
 expect 1 '' 'targets ended with status 0, and has not written the file' run --recipe recipes/command.json -o other --allow-commands
 
+# --- two meshes: a model each, for those that have targets ---
+sed 's/"nodes":\[0,2\]/"nodes":[0,2,3]/; s/{"mesh":0,"skin":0}/&,{"name":"other","mesh":0,"skin":0}/' bone.gltf >two.gltf
+expect 0 '' 'targets mesh +\d(.|\n)*targets other(.|\n)*held-out mesh .*\nheld-out other' \
+  run two.gltf -o two --until held-out "${with_targets[@]}"
+expect 0 '' 'target other .*\nexport other .*\nheld-out other .*\nmesh has no targets, and gets no model\n$' \
+  run two.gltf -o one --until held-out "${options[@]}" --targets other=cache.npy
+expect 1 '' 'several meshes, mesh, other: whose targets are in .*cache\.npy\? Give them as MESH=FILE' \
+  run two.gltf -o one "${options[@]}" --targets cache.npy
+
 # --- what is not taken ---
 touch mine
 expect 1 '' 'is not empty \(' run bone.gltf -o .
