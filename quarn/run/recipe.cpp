@@ -100,8 +100,8 @@ public:
     template <class Member>
     void take(const char* name, Member& member) {
         known_.insert(name);
-        if (const auto found = document_.FindMember(name); found != document_.MemberEnd())
-            Entry(file_, name, found->value).read(member);
+        if (has(name))
+            Entry(file_, name, document_[name]).read(member);
     }
     bool has(const char* name) const { return document_.HasMember(name); }
     void requireAllKnown() const {
