@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/FrameSampler.h"
 
-#include "quarn/dataset/controlNames.h"
+#include "quarn/dataset/strictly.h"
 #include "quarn/scene/FrameLog.h"
 #include "quarn/scene/HostErrors.h"
 #include "quarn/scene/meshes.h"
@@ -22,23 +22,6 @@ namespace {
 
 [[noreturn]] void fail(const std::string& why) {
     throw std::runtime_error(why);
-}
-
-// does the work; whatever the host says against it becomes the error of the frame
-template <class Work>
-void strictly(int frame, Work work) {
-    const HostErrors errors;
-    std::string error;
-    try {
-        work();
-    } catch (const std::runtime_error& thrown) {
-        error = thrown.what();
-    }
-    // what the host says is nearer to the cause
-    if (const std::string said = errors.text(); !said.empty())
-        error = said;
-    if (!error.empty())
-        fail("frame " + std::to_string(frame) + ": " + error);
 }
 
 void evaluate(const HPlug& plug) {
@@ -68,19 +51,13 @@ void makeElement(const Warp& warp, const WarpGeometry& geometry, const char* arr
         setNumber(plug, numberOf(plug));
 }
 
-float narrowed(double value, const std::string& what) {
-    const auto number = static_cast<float>(value);
-    if (!std::isfinite(number))
-        fail(what + " is " + std::to_string(value) + ", which is no number to train with");
-    return number;
-}
-
 } // namespace
 
 FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, int firstFrame)
     : host_(host)
     , warp_(warp)
-    , geometry_(geometry) {
+    , geometry_(geometry)
+    , controls_(warp) {
     if (geometry.target.isNull())
         fail(elementName(warp, "targetGeometry", geometry) +
              " has no target; quarn target SCENE --cache FILE.npy connects one");
@@ -95,9 +72,7 @@ FrameSampler::FrameSampler(OpenQuarn::Session& host, const Warp& warp, const War
         OpenQuarn::evaluate(geometry.output);
     }
     strictly(firstFrame, [&] {
-        names_ = controlNames(warp);
-        if (names_.empty())
-            fail(warp.name + ".controlValues has no values; connect the controls into it");
+        controls_.readNames();
         readMap();
         startExport();
     });
@@ -134,7 +109,7 @@ void FrameSampler::evaluateInputs() {
     evaluate(geometry_.target);
     if (geometry_.target.asHObject().isNull())
         fail("the target " + std::string(geometry_.target.name().asChar()) + " holds no mesh");
-    takeControls();
+    controls_.read();
 }
 
 void FrameSampler::readMap() {
@@ -155,22 +130,6 @@ void FrameSampler::sample(int frame) {
         evaluate(geometry_.output);
         takeDeltas();
     });
-}
-
-void FrameSampler::takeControls() {
-    const HPlug values = warp_.plug("controlValues");
-    evaluate(values); // elements that come along a connection are there afterwards
-    const std::vector<unsigned> indices = indicesOf(values);
-    if (!names_.empty() && indices.size() != names_.size())
-        fail(warp_.name + ".controlValues has " + std::to_string(indices.size()) + " values, and had " +
-             std::to_string(names_.size()) + " in the first frame");
-    controls_.clear();
-    controls_.reserve(indices.size());
-    for (std::size_t i = 0; i < indices.size(); ++i) {
-        const HPlug value = values.elementByLogicalIndex(indices[i]);
-        const std::string name = value.name().asChar();
-        controls_.push_back(narrowed(numberOf(value), names_.empty() ? name : name + " (" + names_[i] + ")"));
-    }
 }
 
 void FrameSampler::takeDeltas() {

@@ -2,6 +2,7 @@
 // The deformer in export mode, and what it gives frame by frame.
 #pragma once
 
+#include "quarn/dataset/ControlReader.h"
 #include "quarn/scene/Warp.h"
 
 #include "openquarn/HIndexMapper.h"
@@ -36,11 +37,11 @@ public:
 
     const DeltaKind& kind() const { return kind_; }
     const HIndexMapper& map() const { return map_; }
-    const std::vector<std::string>& names() const { return names_; }
+    const std::vector<std::string>& names() const { return controls_.names(); }
 
     /// Afterwards controls() and deltas() are those of the frame; all of them are numbers.
     void sample(int frame);
-    const std::vector<float>& controls() const { return controls_; } ///< as many as names()
+    const std::vector<float>& controls() const { return controls_.values(); } ///< as many as names()
     const std::vector<float>& deltas() const { return deltas_; } ///< x, y, z of each affected vertex, in their order
 
 private:
@@ -48,7 +49,6 @@ private:
     void endExport();
     void evaluateInputs();
     void readMap();
-    void takeControls();
     void takeDeltas();
     void requirePlausible(unsigned affected) const;
     std::string targetSizes() const;
@@ -60,8 +60,7 @@ private:
     DeltaKind kind_;
     double longestDelta_ = 0.0; ///< that is taken for one, in units of the scene
     HIndexMapper map_;
-    std::vector<std::string> names_;
-    std::vector<float> controls_;
+    ControlReader controls_;
     std::vector<float> deltas_;
 };
 

@@ -3,6 +3,7 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/dataset/commands.h"
+#include "quarn/dataset/exportControls.h"
 #include "quarn/dataset/exportDatasets.h"
 
 #include <CLI/CLI.hpp>
@@ -39,8 +40,29 @@ void printText(const std::vector<ExportAnswer>& answers) {
                   << '\n';
 }
 
-void execute(const ExportOptions& options) {
+struct Options : ExportOptions {
+    bool controlsOnly = false;
+};
+
+void printControls(const ControlsAnswer& answer, bool asJson) {
+    if (!asJson) {
+        std::cout << answer.rows << " rows of " << answer.controls << " controls in " << answer.folder.string() << '\n';
+        return;
+    }
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeText(writer, "folder", answer.folder.string());
+    writeCount(writer, "rows", answer.rows);
+    writeCount(writer, "controls", answer.controls);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+void execute(const Options& options) {
     watchForInterrupt();
+    if (options.controlsOnly)
+        return printControls(exportControls(options), options.console.json);
     const std::vector<ExportAnswer> answers = exportDatasets(options);
     if (options.console.json)
         printJson(answers);
@@ -51,7 +73,7 @@ void execute(const ExportOptions& options) {
 } // namespace
 
 void addExportCommand(CLI::App& app) {
-    const auto options = std::make_shared<ExportOptions>();
+    const auto options = std::make_shared<Options>();
     CLI::App* command = app.add_subcommand("export", "Write training data: control values and deltas, frame by frame");
     addSceneOptions(*command, options->scene);
     command
@@ -63,6 +85,9 @@ void addExportCommand(CLI::App& app) {
     command->add_option("--geometry", options->geometry, "One of its geometries [all]")->type_name("INDEX|NAME");
     command->add_option("--frames", options->frames, "[exportStartFrame to exportEndFrame of the deformer]")
         ->type_name("A-B[xS]");
+    command->add_flag("--controls-only", options->controlsOnly,
+                      "No deltas: controls.npy, frames.npy and the names, before there are targets "
+                      "[trainingDataRoot/DEFORMER.controls]");
     command->add_flag("--overwrite", options->overwrite, "Replace another data set, or give up a begun one");
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { execute(*options); });

@@ -4,6 +4,7 @@
 #include "quarn/console/Log.h"
 #include "quarn/dataset/DatasetFolder.h"
 #include "quarn/dataset/description.h"
+#include "quarn/dataset/exportFrames.h"
 #include "quarn/dataset/sceneSetup.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
@@ -18,17 +19,6 @@ namespace quarn {
 namespace {
 
 namespace fs = std::filesystem;
-
-FrameRange framesOf(const Warp& warp, const ExportOptions& options) {
-    if (!options.frames.empty())
-        return frameRange(options.frames);
-    const int first = wholeNumberOf(warp.plug("exportStartFrame"));
-    const int last = wholeNumberOf(warp.plug("exportEndFrame"));
-    if (last < first)
-        throw std::runtime_error(warp.name + ".exportStartFrame is " + std::to_string(first) +
-                                 ", after exportEndFrame " + std::to_string(last) + "; set them, or give --frames");
-    return frameRange(std::to_string(first) + "-" + std::to_string(last));
-}
 
 std::vector<WarpGeometry> chosenGeometries(const Warp& warp, const std::string& choice) {
     if (choice.empty() && warp.geometries.size() > 1)
@@ -96,7 +86,7 @@ public:
         , options_(options)
         , warp_(warp)
         , geometry_(geometry)
-        , frames_(framesOf(warp, options))
+        , frames_(exportFrames(warp, options.frames))
         , sceneFile_(absolutePath(options.scene.scene))
         , folder_(folder, options.overwrite)
         , sampler_(session.host(), warp, geometry, frames_.first)

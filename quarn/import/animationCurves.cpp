@@ -20,6 +20,15 @@ bool differs(double a, double b) {
     return std::abs(a - b) > rounding * std::max(1.0, std::abs(b));
 }
 
+// files have seconds in single precision: what cannot be told from a whole frame is that frame
+double frameNear(double seconds, double framesPerSecond) {
+    constexpr double rounding = 4e-7; // of seconds, by the file and by the importer's milliseconds
+    constexpr double most = 0.1;      // frames, however long the animation
+    const double frame = frameOf(seconds, framesPerSecond);
+    const double whole = std::round(frame);
+    return std::abs(frame - whole) <= std::min(most, rounding * std::abs(frame)) ? whole : frame;
+}
+
 // times of keys in frames, each above the one before: of keys at one time, a jump, the first is a hair earlier, and all
 // but the first and the last go
 template <class Value>
@@ -28,7 +37,7 @@ std::vector<Key<Value>> framesOf(const Track<Value>& track, double framesPerSeco
     std::vector<Key<Value>> keys;
     keys.reserve(track.keys.size());
     for (const Key<Value>& key : track.keys) {
-        const double frame = frameOf(key.seconds, framesPerSecond);
+        const double frame = frameNear(key.seconds, framesPerSecond);
         if (!keys.empty() && frame <= keys.back().seconds) {
             const bool hasRoom = keys.size() < 2 || keys[keys.size() - 2].seconds < frame - hair;
             if (hasRoom)
@@ -105,8 +114,7 @@ std::size_t addRotation(const Track<HQuaternion>& track, const JointRest& rest, 
 } // namespace
 
 int lastFrameOf(double seconds, double framesPerSecond) {
-    constexpr double hair = 1e-6; // a length that comes from single precision must not miss its last frame
-    const double last = std::floor(frameOf(seconds, framesPerSecond) + hair);
+    const double last = std::floor(frameNear(seconds, framesPerSecond));
     return static_cast<int>(std::clamp(last, 1.0, static_cast<double>(std::numeric_limits<int>::max())));
 }
 

@@ -40,6 +40,13 @@ const Animation* chosenAnimation(const Character& character, const ImportOptions
     throw std::runtime_error(options.file.string() + " has no animation \"" + options.animation + "\"" + names);
 }
 
+std::vector<const Animation*> allAnimations(const Character& character) {
+    std::vector<const Animation*> animations;
+    for (const Animation& animation : character.animations)
+        animations.push_back(&animation);
+    return animations;
+}
+
 // where vertex maps go. `{mesh}` in the name of the scene's attribute stands for the mesh, where there are several
 fs::path mapFile(const fs::path& scene, const std::string& mesh, std::size_t meshCount) {
     const std::string middle = meshCount > 1 ? "." + mesh : "";
@@ -53,6 +60,12 @@ void checkOutput(const ImportOptions& options) {
     if (fs::is_directory(options.output))
         throw std::runtime_error(options.output.string() + " is a folder; name a file for the scene");
     storage::WholeFile::requirePossible(options.output, storage::WholeFile::Writes::anywhere); // with files beside it
+    if (options.writtenLimits.empty())
+        return;
+    if (fs::exists(options.writtenLimits, none))
+        throw std::runtime_error(options.writtenLimits.string() + " is there already, and somebody may have edited it: "
+                                                                  "name another file for the limits, or remove it");
+    storage::WholeFile::requirePossible(options.writtenLimits);
 }
 
 class Import {
@@ -75,6 +88,7 @@ public:
         if (options_.neuralWarp)
             connectWarp(nodes, settings(animation), posed.joints, scene);
         tellWhatThereIs(scene, posed, options_.noAnimation ? nullptr : animation);
+        writeLimits(posed);
         writeFiles(session, scene);
         return std::move(report_);
     }
@@ -133,8 +147,12 @@ private:
 
     PosedJoints choose(const std::vector<JointRest>& rests, const Animation* animation) {
         const LimitMap* limits = options_.limits.empty() ? nullptr : &limits_;
-        PosedJoints posed =
-            choosePosedJoints(character_, rests, {limits, animation, options_.framesPerSecond, options_.withRoots});
+        PoseChoice choice{limits, {}, options_.framesPerSecond, options_.withRoots, options_.limitsMargin};
+        if (animation != nullptr)
+            choice.animations = {animation};
+        if (options_.limitsFromAll)
+            choice.animations = allAnimations(character_);
+        PosedJoints posed = choosePosedJoints(character_, rests, choice);
         report_.notes = posed.notes;
         for (const PosedJoint& joint : posed.joints)
             report_.poseInputs += static_cast<std::size_t>(std::count_if(
@@ -164,6 +182,15 @@ private:
         if (made.skin.isNull() && options_.neuralWarp)
             report_.notes.push_back("the mesh \"" + mesh.name +
                                     "\" follows no joint and is no geometry of the deformer");
+    }
+
+    void writeLimits(const PosedJoints& posed) const {
+        if (options_.writtenLimits.empty())
+            return;
+        std::vector<std::pair<std::string, JointLimits>> joints;
+        for (const PosedJoint& joint : posed.joints)
+            joints.emplace_back(character_.joints[joint.joint].name, joint.limits);
+        storage::writeWhole(options_.writtenLimits, limitsText(joints));
     }
 
     void writeFiles(SceneSession& session, const CharacterScene& scene) {
@@ -200,7 +227,7 @@ private:
 
 ImportReport importCharacter(const ImportOptions& given) {
     ImportOptions options = given;
-    for (fs::path* path : {&options.file, &options.output, &options.parents, &options.limits})
+    for (fs::path* path : {&options.file, &options.output, &options.parents, &options.limits, &options.writtenLimits})
         *path = absolutePath(*path);
     checkOutput(options);
     return Import(options).run();

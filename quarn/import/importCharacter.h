@@ -23,7 +23,10 @@ struct ImportOptions {
     std::optional<double> metersPerUnit;
     bool neuralWarp = false;
     WarpSettings warp;
-    std::filesystem::path limits; ///< see readLimits(); empty for none
+    std::filesystem::path limits;        ///< see readLimits(); empty for none
+    bool limitsFromAll = false;          ///< without those: of all animations of the file, not of the one that is taken
+    double limitsMargin = 0.0;           ///< of these, see PoseChoice::margin
+    std::filesystem::path writtenLimits; ///< where the limits go, to be edited; empty for nowhere
     bool withRoots = false;
     std::vector<std::string> plugins;
 };

@@ -14,6 +14,7 @@ namespace quarn {
 namespace {
 
 struct Options : ImportOptions {
+    std::string limitsFrom = "animation";
     Console console;
 };
 
@@ -44,6 +45,16 @@ void addWarpFlags(CLI::App& command, Options& options) {
         ->check(CLI::IsMember({"double-axis", "ortho", "quaternion", "euler"}));
     add("--limits", options.limits, "JSON: {\"joint\": {\"rotateX\": [least, largest], ...}}, in degrees")
         ->type_name("FILE");
+
+    add("--limits-from", options.limitsFrom,
+        "Without --limits: those of the animation that is taken (default), or of all")
+        ->check(CLI::IsMember({"animation", "all"}))
+        ->excludes("--limits");
+    add("--limits-margin", options.limitsMargin, "More on both sides of what animations do, in parts of the range")
+        ->check(CLI::Range(0.0, 10.0))
+        ->excludes("--limits");
+    add("--write-limits", options.writtenLimits, "Write the limits as a file for --limits, to be edited")
+        ->type_name("FILE");
     flags.add_flag("--with-roots", options.withRoots, "Controls also of the joints that place the character")
         ->needs(warp);
     add("--samples", options.warp.samples, "Poses to sample")->check(CLI::Range(1, std::numeric_limits<int>::max()));
@@ -62,7 +73,8 @@ void requireAbove0(const char* flag, double value) {
         throw UsageError(std::string(flag) + " must be a number above 0");
 }
 
-void execute(const Options& options) {
+void execute(Options& options) {
+    options.limitsFromAll = options.limitsFrom == "all";
     requireAbove0("--fps", options.framesPerSecond);
     requireAbove0("--meters-per-unit", options.metersPerUnit.value_or(1.0));
     const ImportReport report = importCharacter(options);

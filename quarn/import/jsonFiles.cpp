@@ -1,9 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/import/jsonFiles.h"
 
+#include "quarn/console/json.h"
 #include "storage/Json.h"
 
 #include <algorithm>
+#include <cmath>
 #include <stdexcept>
 
 namespace quarn {
@@ -49,7 +51,38 @@ std::pair<double, double> readRange(const storage::JsonValue& range, const std::
     return {least * radiansPerDegree, largest * radiansPerDegree};
 }
 
+// away from what lies between; a hair less than a digit is the rounding of radians
+double outwards(double radians, double direction) {
+    constexpr double digits = 1e4;
+    constexpr double hair = 1e-6;
+    const double degrees = radians / radiansPerDegree;
+    return direction * std::ceil(direction * degrees * digits - hair) / digits + 0.0; // no -0
+}
+
 } // namespace
+
+std::string limitsText(const std::vector<std::pair<std::string, JointLimits>>& joints) {
+    rapidjson::StringBuffer buffer;
+    JsonWriter json(buffer);
+    json.SetFormatOptions(rapidjson::kFormatSingleLineArray);
+    json.StartObject();
+    for (const auto& [name, limits] : joints) {
+        writeText(json, name);
+        json.StartObject();
+        for (std::size_t axis = 0; axis < limits.size(); ++axis) {
+            if (!limits.at(axis))
+                continue;
+            json.Key(axisNames.at(axis));
+            json.StartArray();
+            json.Double(outwards(limits.at(axis)->first, -1.0));
+            json.Double(outwards(limits.at(axis)->second, 1.0));
+            json.EndArray();
+        }
+        json.EndObject();
+    }
+    json.EndObject();
+    return std::string(buffer.GetString()) + "\n";
+}
 
 ParentMap readParents(const fs::path& file) {
     return readMembers<ParentMap>(file, [](const storage::JsonValue& value, auto fail) {

@@ -9,6 +9,8 @@
 #include <map>
 #include <optional>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace quarn {
 
@@ -25,5 +27,9 @@ ParentMap readParents(const std::filesystem::path& file);
 /// {"joint": {"rotateX": [least, largest], ...}, ...} in degrees. Throws as readParents() does, and for an axis that is
 /// not one of the three, or a range of no width.
 LimitMap readLimits(const std::filesystem::path& file);
+
+/// The same file of limits, joints in this order: to be edited, and read by readLimits(). Degrees with four digits
+/// behind the point, rounded so that no range gets smaller.
+std::string limitsText(const std::vector<std::pair<std::string, JointLimits>>& joints);
 
 } // namespace quarn

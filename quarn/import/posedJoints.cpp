@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/import/posedJoints.h"
 
+#include "quarn/console/numberText.h"
 #include "quarn/import/animatedPose.h"
 #include "quarn/import/animationCurves.h"
 
@@ -48,35 +49,56 @@ double unwrapped(double angle, double before) {
     return angle + 2.0 * pi * std::round((before - angle) / (2.0 * pi));
 }
 
-JointLimits rangeOf(const Track<HQuaternion>& rotation, const JointRest& rest, const std::vector<double>& times) {
+// what angles an axis has gone through; 0, the rest pose, is among them
+using Ranges = std::array<std::pair<double, double>, 3>;
+
+void widen(Ranges& ranges, const Track<HQuaternion>& rotation, const JointRest& rest,
+           const std::vector<double>& times) {
     HVector before;
-    HVector least;
-    HVector largest;
     for (const double seconds : times) {
         const HEulerRotation angles = rotateOf(valueAt(rotation, seconds), rest).asEulerRotation();
         for (unsigned axis = 0; axis < 3; ++axis) {
             before[axis] = unwrapped(angles[axis], before[axis]);
-            least[axis] = std::min(least[axis], before[axis]);
-            largest[axis] = std::max(largest[axis], before[axis]);
+            ranges.at(axis).first = std::min(ranges.at(axis).first, before[axis]);
+            ranges.at(axis).second = std::max(ranges.at(axis).second, before[axis]);
         }
     }
+}
+
+JointLimits limitsOf(const Ranges& ranges, double margin) {
     JointLimits limits;
-    for (unsigned axis = 0; axis < 3; ++axis)
-        if (largest[axis] - least[axis] > leastRange)
-            limits.at(axis) = {least[axis], largest[axis]};
+    for (std::size_t axis = 0; axis < ranges.size(); ++axis) {
+        const auto& [least, largest] = ranges.at(axis);
+        const double more = margin * (largest - least);
+        if (largest - least > leastRange)
+            limits.at(axis) = {least - more, largest + more};
+    }
     return limits;
 }
 
 std::vector<JointLimits> animatedLimits(const Character& character, const std::vector<JointRest>& rests,
                                         const PoseChoice& choice) {
-    std::vector<JointLimits> limits(character.joints.size());
-    if (choice.animation == nullptr)
-        return limits;
-    const std::vector<double> times = sampleTimes(*choice.animation, choice.framesPerSecond);
-    for (const JointChannel& channel : choice.animation->channels)
-        if (!channel.rotation.keys.empty())
-            limits[channel.joint] = rangeOf(channel.rotation, rests[channel.joint], times);
+    std::vector<Ranges> ranges(character.joints.size(), Ranges{});
+    for (const Animation* animation : choice.animations) {
+        const std::vector<double> times = sampleTimes(*animation, choice.framesPerSecond);
+        for (const JointChannel& channel : animation->channels)
+            if (!channel.rotation.keys.empty())
+                widen(ranges[channel.joint], channel.rotation, rests[channel.joint], times);
+    }
+    std::vector<JointLimits> limits;
+    limits.reserve(ranges.size());
+    for (const Ranges& range : ranges)
+        limits.push_back(limitsOf(range, choice.margin));
     return limits;
+}
+
+std::string animatedNote(const PoseChoice& choice) {
+    const std::string which = choice.animations.size() == 1
+                                  ? "the animation \"" + choice.animations.front()->name + "\""
+                                  : "all " + std::to_string(choice.animations.size()) + " animations";
+    const std::string more =
+        choice.margin > 0.0 ? ", and " + numberText(choice.margin) + " of it more on both sides" : "";
+    return "limits of the poses: the range of " + which + more;
 }
 
 std::vector<JointLimits> limitsOf(const Character& character, const std::vector<JointRest>& rests,
@@ -89,7 +111,7 @@ std::vector<JointLimits> limitsOf(const Character& character, const std::vector<
     }
     limits = animatedLimits(character, rests, choice);
     if (std::any_of(limits.begin(), limits.end(), isAny)) {
-        notes.push_back("limits of the poses: the range of the animation \"" + choice.animation->name + "\"");
+        notes.push_back(animatedNote(choice));
         return limits;
     }
     notes.emplace_back("limits of the poses: 30 degrees to both sides of every axis");

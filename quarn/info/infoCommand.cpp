@@ -10,6 +10,7 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/console/printable.h"
+#include "quarn/info/JointReport.h"
 #include "quarn/info/LineList.h"
 #include "quarn/info/ModelReport.h"
 #include "quarn/info/SceneReport.h"
@@ -133,7 +134,7 @@ std::string summaryText(const SceneSummary& summary, const OpenedScene& opened) 
 struct Options {
     fs::path path, scene, controls, outputs;
     std::string deformer, geometry;
-    bool json = false, devices = false;
+    bool json = false, devices = false, joints = false;
 };
 
 void showDevices(bool asJson) {
@@ -166,8 +167,31 @@ void showDevices(bool asJson) {
         std::cout << "no OpenCL device: deformers run on the CPU\n";
 }
 
+void showJoints(const Options& options) {
+    std::vector<JointReport> joints;
+    {
+        const Silence silence;
+        const StdoutAside aside;
+        SceneSession session;
+        session.open(options.path);
+        joints = describeJoints();
+    }
+    if (!options.json) {
+        std::cout << printable(jointsText(joints));
+        return;
+    }
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeJoints(writer, joints);
+    writer.EndObject();
+    std::cout << printable(buffer.GetString()) << '\n';
+}
+
 void showScene(const Options& options) {
     requireNoCharacter(options.path);
+    if (options.joints)
+        return showJoints(options);
     const Stage stage([&] { return "looking into scene " + options.path.string(); });
     const SceneSummary summary = OpenQuarn::readSummary(absolutePath(options.path));
     if (!summary.outcome)
@@ -216,6 +240,8 @@ void showInfo(const Options& options) {
         return showDevices(options.json);
     if (options.path.empty())
         throw UsageError("quarn info needs the path of a scene file or a model directory, or --devices");
+    if (fs::is_directory(options.path) && options.joints)
+        throw UsageError(options.path.string() + " is a model directory, and --joints is for a scene");
     if (fs::is_directory(options.path))
         return showModel(options);
     if (!options.scene.empty() || !options.controls.empty())
@@ -230,6 +256,9 @@ void addInfoCommand(CLI::App& app) {
     CLI::App* info = app.add_subcommand("info", "Show what is in a scene file or a model directory");
     info->add_option("PATH", options->path, "The scene file, or the directory NAME.nwrp of a model");
     info->add_flag("--devices", options->devices, "List the OpenCL devices that quarn play --evaluator gpu can use");
+    info->add_flag("--joints", options->joints,
+                   "Of a scene: each joint, its parent, what is posed and how far, and "
+                   "how many vertices it moves");
     info->add_option("--scene", options->scene, "Tell whether the model fits the deformer of this scene");
     info->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     info->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");

@@ -1,10 +1,10 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/animationPoses.h"
 
-#include "openquarn/HDataBlock.h"
 #include "openquarn/HFnData.h"
 #include "openquarn_app/Evaluation.h"
 #include "quarn/pose/poseKeys.h"
+#include "quarn/pose/valueAt.h"
 #include "quarn/scene/plugs.h"
 
 #include <algorithm>
@@ -20,17 +20,6 @@ constexpr double largestFrame = 1e8;
 // a key may miss its frame by a hair, having been seconds
 constexpr double hair = 1e-6;
 
-double valueAt(OpenQuarn::EvaluationContext& context, const PoseControl& control, int frame) {
-    HStatus status;
-    const double value = context.evaluateAt(control.plug, &status).asDouble();
-    const std::string where = writtenName(control.plug) + " at frame " + std::to_string(frame);
-    if (status.error())
-        throw std::runtime_error(where + " could not be evaluated: " + status.errorString().asChar());
-    if (!std::isfinite(value))
-        throw std::runtime_error(where + " is no finite number");
-    return value;
-}
-
 bool isOutside(double value, const ValueLimits& limits) {
     const double slack = 1e-9 * (limits.most - limits.least);
     return value < limits.least - slack || value > limits.most + slack;
@@ -40,16 +29,16 @@ bool isOutside(double value, const ValueLimits& limits) {
 
 void requireOwnAnimation(const std::vector<PoseControl>& controls) {
     for (const PoseControl& control : controls)
-        if (const HPlug source = control.plug.source(); !source.isNull() && isPoseCurve(source.node()))
+        if (const HPlug source = control.plug.source(); !source.isNull() && isSampledCurve(source.node()))
             throw std::runtime_error(writtenName(control.plug) +
-                                     " has the keys of an earlier quarn pose, which took the animation off; sample "
+                                     " has the poses of an earlier quarn pose, which took the animation off; sample "
                                      "the animation from the scene before that");
 }
 
-FrameRange animationExtent() {
+FrameRange extentOf(const std::vector<HObject>& curves) {
     double first = std::numeric_limits<double>::infinity();
     double last = -first;
-    for (const HObject& curve : animationCurves()) {
+    for (const HObject& curve : curves) {
         const std::vector<double> times = HFnDoubleArrayData(plugOf(curve, "keyTimes").asHObject()).values();
         if (times.empty())
             continue;
@@ -75,7 +64,7 @@ AnimationPoses addAnimationPoses(PoseSet& poses, const std::vector<PoseControl>&
         context.setTime(frames.frame(number));
         bool outside = false;
         for (std::size_t i = 0; i < controls.size(); ++i) {
-            pose[i] = valueAt(context, controls[i], frames.frame(number));
+            pose[i] = valueAt(context, controls[i].plug, frames.frame(number));
             outside = outside || isOutside(pose[i], controls[i].limits);
             if (outside && result.firstOutside.empty())
                 result.firstOutside = writtenName(controls[i].plug);

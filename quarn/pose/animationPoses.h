@@ -9,13 +9,12 @@
 
 namespace quarn {
 
-/// Throws std::runtime_error, naming the plug, when one has keys of an earlier sampling: then its animation is gone.
+/// Throws std::runtime_error, naming the plug, when one has poses of an earlier sampling: then its animation is gone.
 /// Thread: main.
 void requireOwnAnimation(const std::vector<PoseControl>& controls);
 
-/// From the first to the last key of all curves of the scene that drive something, but for those of an earlier
-/// sampling. Throws std::runtime_error when there are none. Thread: main.
-FrameRange animationExtent();
+/// From the first to the last key of the curves. Throws std::runtime_error when there are none. Thread: main.
+FrameRange extentOf(const std::vector<HObject>& curves);
 
 /// What became of the frames.
 struct AnimationPoses {

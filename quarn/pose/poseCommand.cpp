@@ -8,6 +8,7 @@
 #include "quarn/console/json.h"
 #include "quarn/pose/keyPoses.h"
 #include "quarn/pose/samplePoses.h"
+#include "quarn/pose/writePoses.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/plugs.h"
 
@@ -28,6 +29,7 @@ struct Options {
     std::string from = "limits";
     std::filesystem::path keys;
     std::string others = "rest";
+    PosesFileOptions written;
     Console console;
 };
 
@@ -42,11 +44,24 @@ std::string frames(int first, int last) {
     return "frames " + std::to_string(first) + "-" + std::to_string(last);
 }
 
-void printJson(const SampleReport& report, const Options& options) {
-    rapidjson::StringBuffer buffer;
-    JsonWriter writer(buffer);
+// "written": what a file of poses holds, where one was written
+void writeFile(JsonWriter& writer, const std::optional<PosesFileReport>& file) {
+    if (!file)
+        return;
+    writer.Key("written");
     writer.StartObject();
-    writeText(writer, "scene", options.output.string());
+    writeText(writer, "file", file->file.string());
+    writeCount(writer, "frames", file->frames);
+    writeCount(writer, "joints", file->joints);
+    writeCount(writer, "plugs", file->plugs);
+    writeCount(writer, "meshes", file->meshes);
+    writer.Key("sceneFirstFrame");
+    writer.Int(file->sceneFirst);
+    writeText(writer, "liesAt", file->place);
+    writer.EndObject();
+}
+
+void writeReport(JsonWriter& writer, const SampleReport& report, const Options& options) {
     writeText(writer, "collector", report.collector);
     writeCount(writer, "poses", report.poses);
     writeCount(writer, "values", report.values);
@@ -58,8 +73,6 @@ void printJson(const SampleReport& report, const Options& options) {
     writer.Key("seed");
     writer.Uint64(options.sampling.seed);
     writeFrames(writer, report.firstFrame, report.lastFrame);
-    writer.EndObject();
-    std::cout << buffer.GetString() << '\n';
 }
 
 void printText(const SampleReport& report) {
@@ -70,17 +83,11 @@ void printText(const SampleReport& report) {
               << " frames left out, being near another\n";
 }
 
-void printJson(const KeysReport& report, const Options& options) {
-    rapidjson::StringBuffer buffer;
-    JsonWriter writer(buffer);
-    writer.StartObject();
-    writeText(writer, "scene", options.output.string());
+void writeReport(JsonWriter& writer, const KeysReport& report, const Options&) {
     writeCount(writer, "plugs", report.plugs);
     writeCount(writer, "keys", report.keys);
     writeCount(writer, "held", report.held);
     writeFrames(writer, report.firstFrame, report.lastFrame);
-    writer.EndObject();
-    std::cout << buffer.GetString() << '\n';
 }
 
 void printText(const KeysReport& report) {
@@ -89,12 +96,50 @@ void printText(const KeysReport& report) {
               << " other controls held at their defaults\n";
 }
 
+// of a scene that was only looked at
+struct NoReport {};
+void writeReport(JsonWriter&, const NoReport&, const Options&) {}
+void printText(const NoReport&) {}
+
+void printText(const PosesFileReport& file) {
+    std::cout << file.file.string() << ": " << file.frames << (file.frames == 1 ? " frame" : " frames") << ", "
+              << file.joints << " joints, " << file.plugs << " plugs, " << file.meshes << " meshes; frame "
+              << file.sceneFirst << " of the scene is at " << file.place << '\n';
+}
+
 template <class Report>
-void print(const Report& report, const Options& options) {
-    if (options.console.json)
-        printJson(report, options);
-    else
+void print(const Report& report, const std::optional<PosesFileReport>& file, const Options& options) {
+    if (!options.console.json) {
         printText(report);
+        if (file)
+            printText(*file);
+        return;
+    }
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeText(writer, "scene", (options.output.empty() ? options.scene.scene : options.output).string());
+    writeReport(writer, report, options);
+    writeFile(writer, file);
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
+
+// the scene with its new poses, and the file of them, where one is asked for
+template <class Report>
+void deliver(SceneSession& session, const std::optional<Warp>& warp, const Report& report, const Options& options) {
+    std::optional<PosesFileReport> file;
+    if (!options.written.file.empty())
+        requirePlace(options.written, report.firstFrame);
+    session.save(options.output);
+    if (!options.written.file.empty())
+        file = writePoses(options.written, warp, {report.firstFrame, report.lastFrame, 1}, options.console);
+    print(report, file, options);
+}
+
+std::optional<Warp> warpOf(const Options& options) {
+    const bool hasWarp = !options.deformer.empty() || !nodesOfType("neuralWarp").empty();
+    return hasWarp ? std::optional(Warp::find(options.deformer)) : std::nullopt;
 }
 
 void sample(SceneSession& session, Options& options) {
@@ -106,32 +151,45 @@ void sample(SceneSession& session, Options& options) {
         throw UsageError("--samples and --activation-rate are for poses from limits: use --from both");
     if (!std::isfinite(options.sampling.tolerance) || options.sampling.tolerance < 0.0)
         throw UsageError("--tolerance is a finite number from 0 on");
-    const SampleReport report = samplePoses(Warp::find(options.deformer), options.sampling, options.console);
-    session.save(options.output);
-    print(report, options);
+    const Warp warp = Warp::find(options.deformer);
+    const SampleReport report = samplePoses(warp, options.sampling, options.console);
+    deliver(session, warp, report, options);
 }
 
 void key(SceneSession& session, const Options& options) {
-    const bool hasWarp = !options.deformer.empty() || !nodesOfType("neuralWarp").empty();
-    const std::optional<Warp> warp = hasWarp ? std::optional(Warp::find(options.deformer)) : std::nullopt;
+    const std::optional<Warp> warp = warpOf(options);
     const Stage stage([&] { return "putting the keys of " + options.keys.string() + " on the rig"; });
     const KeysReport report = keyPoses(warp, readKeys(options.keys), options.others == "rest");
-    session.save(options.output);
-    print(report, options);
+    deliver(session, warp, report, options);
+}
+
+// the poses that the scene has
+void writeOnly(const Options& options) {
+    const std::optional<Warp> warp = warpOf(options);
+    const FrameRange frames =
+        options.sampling.frames.empty() ? framesOfScene(warp) : frameRange(options.sampling.frames);
+    print(NoReport(), writePoses(options.written, warp, frames, options.console), options);
 }
 
 void pose(Options& options) {
     watchForInterrupt();
     options.output = absolutePath(options.output);
     options.keys = absolutePath(options.keys);
+    options.written.file = absolutePath(options.written.file);
+    if (options.output.empty() && options.written.file.empty())
+        throw UsageError("--output is required: the scene to write; or --write FILE for the poses that there are");
+    if (!options.written.file.empty())
+        requirePosesFile(options.written, {absolutePath(options.scene.scene), options.output});
     SceneSession session(options.scene);
-    if (options.keys.empty())
+    if (options.output.empty())
+        writeOnly(options);
+    else if (options.keys.empty())
         sample(session, options);
     else
         key(session, options);
 }
 
-void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& keys) {
+void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& output, CLI::Option& keys) {
     SampleOptions& sampling = options.sampling;
     const std::initializer_list<CLI::Option*> added = {
         command.add_option("--samples", sampling.samples, "Poses to draw; the collector's samples when not given"),
@@ -143,13 +201,30 @@ void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& keys) 
         command.add_option("--from", options.from, "Where poses come from: limits, animation or both")
             ->check(CLI::IsMember({"limits", "animation", "both"}))
             ->capture_default_str(),
-        command.add_option("--frames", sampling.frames, "Frames of the animation, as 1-100 or 1-100x5; all by default"),
         command
             .add_option("--tolerance", sampling.tolerance,
                         "Poses that differ by less, in parts of the range of each value, count as one")
             ->capture_default_str()};
     for (CLI::Option* option : added)
-        option->excludes(&keys);
+        option->excludes(&keys)->needs(&output);
+    command.add_option("--frames", sampling.frames, "Frames of the animation, as 1-100 or 1-100x5; all by default")
+        ->excludes(&keys);
+}
+
+void addWriteOptions(CLI::App& command, Options& options) {
+    CLI::Option* write =
+        command
+            .add_option("--write", options.written.file,
+                        "Write the poses, too: .glb (skeleton, meshes, keys), .json (as --keys reads it) or .csv; "
+                        "without -o those that the scene has")
+            ->type_name("FILE");
+    command
+        .add_option("--frame-offset", options.written.frameOffset,
+                    "Added to the frames in the file. Frame 1 is at second 0 where a file counts seconds; -1 is for "
+                    "tools whose first frame is 0")
+        ->check(CLI::Range(-100'000'000, 100'000'000))
+        ->needs(write)
+        ->capture_default_str();
 }
 
 } // namespace
@@ -158,14 +233,16 @@ void addPoseCommand(CLI::App& app) {
     const auto options = std::make_shared<Options>();
     CLI::App* command = app.add_subcommand("pose", "Sample poses of a rig, or put poses made by hand on it");
     addSceneOptions(*command, options->scene);
-    command->add_option("-o,--output", options->output, "The scene to write")->required();
+    CLI::Option* output = command->add_option("-o,--output", options->output, "The scene to write");
     command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
-    CLI::Option* keys = command->add_option("--keys", options->keys, "Poses made by hand: a JSON file with keys");
+    CLI::Option* keys =
+        command->add_option("--keys", options->keys, "Poses made by hand: a JSON file with keys")->needs(output);
     command->add_option("--others", options->others, "With --keys, controls without keys: rest or keep")
         ->check(CLI::IsMember({"rest", "keep"}))
         ->needs(keys)
         ->capture_default_str();
-    addSamplingOptions(*command, *options, *keys);
+    addSamplingOptions(*command, *options, *output, *keys);
+    addWriteOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { pose(*options); });
 }

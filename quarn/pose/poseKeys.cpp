@@ -12,18 +12,22 @@
 #include <algorithm>
 #include <cctype>
 #include <cmath>
+#include <initializer_list>
 #include <stdexcept>
 
 namespace quarn {
 namespace {
 
-// the next `quarn pose` knows its curves by this name (decision 0074)
-std::string curveName(const HPlug& plug) {
+constexpr const char* sampledEnding = "_pose";
+constexpr const char* motionEnding = "_keys";
+
+// the next `quarn pose` knows its curves by this name (decisions 0074 and 0171)
+std::string curveName(const HPlug& plug, const char* ending) {
     std::string name = writtenName(plug);
     for (char& letter : name)
         if (std::isalnum(static_cast<unsigned char>(letter)) == 0)
             letter = '_';
-    return name + "_pose";
+    return name + ending;
 }
 
 HPlugArray destinationsOf(const HPlug& plug) {
@@ -52,6 +56,19 @@ void deleteNode(const HObject& node) {
         status = change.doIt();
     if (status.error())
         throw std::runtime_error(name + " could not be deleted: " + status.errorString().asChar());
+}
+
+bool isCurveOf(const HObject& node, std::initializer_list<const char*> endings) {
+    if (nodeType(node) != "animCurve")
+        return false;
+    const HPlugArray driven = destinationsOf(plugOf(node, "output"));
+    if (driven.size() != 1)
+        return false;
+    // a name that was taken has a number behind it
+    const std::string name = nodeName(node);
+    const std::string taken = name.substr(0, name.find_last_not_of("0123456789") + 1);
+    return std::any_of(endings.begin(), endings.end(),
+                       [&](const char* ending) { return taken == curveName(driven.front(), ending); });
 }
 
 void removeCurve(const HObject& curve, const HPlug& driven) {
@@ -116,15 +133,11 @@ void release(const HPlug& plug) {
 } // namespace
 
 bool isPoseCurve(const HObject& node) {
-    if (nodeType(node) != "animCurve")
-        return false;
-    const HPlugArray driven = destinationsOf(plugOf(node, "output"));
-    if (driven.size() != 1)
-        return false;
-    // a name that was taken has a number behind it
-    const std::string name = nodeName(node);
-    const std::size_t digits = name.find_last_not_of("0123456789") + 1;
-    return name.substr(0, digits) == curveName(driven.front());
+    return isCurveOf(node, {sampledEnding, motionEnding});
+}
+
+bool isSampledCurve(const HObject& node) {
+    return isCurveOf(node, {sampledEnding});
 }
 
 void holdAt(const HPlug& plug, double value) {
@@ -134,7 +147,7 @@ void holdAt(const HPlug& plug, double value) {
 
 void putPoseKeys(const HPlug& plug, const PoseKeys& keys) {
     holdAt(plug, keys.values.front());
-    const HObject curve = createNode("animCurve", curveName(plug));
+    const HObject curve = createNode("animCurve", curveName(plug, keys.isMotion ? motionEnding : sampledEnding));
     setList(plugOf(curve, "keyTimes"), keys.times);
     setList(plugOf(curve, "keyValues"), keys.values);
     if (keys.kind == PoseKeys::Kind::spline) {
@@ -152,13 +165,19 @@ void removePoseKeys() {
             removeCurve(curve, destinationsOf(plugOf(curve, "output")).front());
 }
 
-std::vector<HObject> animationCurves() {
+std::vector<HObject> drivingCurves() {
     std::vector<HObject> found;
     for (const char* type : {"animCurve", "animCurveQuaternion"})
         for (const HObject& curve : nodesOfType(type))
-            if (drivesSomething(curve) && !isPoseCurve(curve))
+            if (drivesSomething(curve))
                 found.push_back(curve);
     return found;
+}
+
+std::vector<HObject> animationCurves() {
+    std::vector<HObject> curves = drivingCurves();
+    curves.erase(std::remove_if(curves.begin(), curves.end(), isSampledCurve), curves.end());
+    return curves;
 }
 
 } // namespace quarn

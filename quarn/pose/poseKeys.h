@@ -14,6 +14,7 @@ struct PoseKeys {
     std::vector<double> values;                                 ///< one for each time
     std::vector<double> slopes;                                 ///< for spline: in and out of each key, per frame
     Kind kind = Kind::step;
+    bool isMotion = false; ///< somebody's motion, which poses can be taken from; else sampled poses
 };
 
 /// All throw std::runtime_error, naming the plug. Thread: main.
@@ -30,11 +31,15 @@ void holdAt(const HPlug& plug, double value);
 /// Deletes all keys that putPoseKeys() put on and their curves; the plugs get the value of their first key.
 void removePoseKeys();
 
-/// Whether the node is a curve of putPoseKeys(): an animCurve of the name NODE_ATTRIBUTE_pose that drives that plug
-/// and nothing else.
+/// Whether the node is a curve of putPoseKeys(): an animCurve of the name NODE_ATTRIBUTE_pose, or of
+/// NODE_ATTRIBUTE_keys for a motion, that drives that plug and nothing else.
 bool isPoseCurve(const HObject& node);
+/// The same for sampled poses alone.
+bool isSampledCurve(const HObject& node);
 
-/// Curves of the scene's own that drive something.
+/// Curves that drive something, but for those of sampled poses: the scene's own, and motions of putPoseKeys().
 std::vector<HObject> animationCurves();
+/// All curves that drive something.
+std::vector<HObject> drivingCurves();
 
 } // namespace quarn

@@ -96,6 +96,7 @@ private:
         for (const storage::JsonValue& key : list.GetArray())
             addKey(name, key, unit, made.keys);
         made.keys.kind = kind_;
+        made.keys.isMotion = true;
         if (kind_ == PoseKeys::Kind::spline)
             made.keys.slopes = smoothSlopes(made.keys.times, made.keys.values);
         for (const double slope : made.keys.slopes)

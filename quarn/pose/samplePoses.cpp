@@ -83,7 +83,7 @@ void draw(PoseSet& poses, const HObject& collector, const SampleOptions& options
 void takeFromAnimation(PoseSet& poses, const std::vector<PoseControl>& controls, const SampleOptions& options,
                        const Console& console, SampleReport& report) {
     requireOwnAnimation(controls);
-    const FrameRange frames = options.frames.empty() ? animationExtent() : frameRange(options.frames);
+    const FrameRange frames = options.frames.empty() ? extentOf(animationCurves()) : frameRange(options.frames);
     requireRoom(poses.count() + frames.count(), controls.size());
     Progress progress(console, "taking poses from the animation", frames.count());
     const AnimationPoses taken =

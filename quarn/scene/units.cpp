@@ -10,4 +10,12 @@ double metersPerUnit() {
     return characters.empty() ? 1.0 : numberOf(plugOf(characters.front(), "metersPerUnit"));
 }
 
+std::optional<double> framesPerSecond() {
+    const std::vector<HObject> characters = nodesOfType("character");
+    if (characters.empty())
+        return std::nullopt;
+    const double rate = numberOf(plugOf(characters.front(), "framesPerSecond"));
+    return rate > 0.0 ? std::optional(rate) : std::nullopt;
+}
+
 } // namespace quarn

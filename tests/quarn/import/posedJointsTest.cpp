@@ -62,19 +62,22 @@ std::vector<std::string> chosen(const PoseChoice& choice) {
 
 TEST(PosedJoints, ThoseThatTellTheDeformerSomething) {
     EXPECT_THAT(chosen({}), ElementsAre("hip x-30..30 y-30..30 z-30..30", "knee x-30..30 y-30..30 z-30..30"));
-    EXPECT_THAT(chosen({nullptr, nullptr, 24.0, true}).front(), HasSubstr("root x-30..30"));
+    EXPECT_THAT(chosen({nullptr, {}, 24.0, true}).front(), HasSubstr("root x-30..30"));
 
     const Animation animation = bending();
-    EXPECT_THAT(chosen({nullptr, &animation, 24.0, false}), ElementsAre("hip z0..260", "knee x0..40"));
+    EXPECT_THAT(chosen({nullptr, {&animation}, 24.0, false}), ElementsAre("hip z0..260", "knee x0..40"));
+    Animation other = bending();
+    other.channels[0].rotation.keys = {{0.0, HQuaternion(-20 * degree, {0, 0, 1})}};
+    EXPECT_THAT(chosen({nullptr, {&animation, &other}, 24.0, false, 0.5}), ElementsAre("hip z-160..400", "knee x-20..60"));
 
     JointLimits limits;
     limits[1] = {-1.0 * degree, 20.0 * degree};
     const LimitMap map{{"root", limits}, {"knee", limits}, {"toe", limits}};
-    EXPECT_THAT(chosen({&map, &animation, 24.0, false}), ElementsAre("root y-1..20", "knee y-1..20"));
+    EXPECT_THAT(chosen({&map, {&animation}, 24.0, false}), ElementsAre("root y-1..20", "knee y-1..20"));
     const LimitMap unknown{{"kneee", limits}};
-    EXPECT_THAT(failureOf([&] { chosen({&unknown, nullptr, 24.0, false}); }), HasSubstr("no joint \"kneee\""));
+    EXPECT_THAT(failureOf([&] { chosen({&unknown, {}, 24.0, false}); }), HasSubstr("no joint \"kneee\""));
     const LimitMap still{{"toe", limits}};
-    EXPECT_THAT(failureOf([&] { chosen({&still, nullptr, 24.0, false}); }), HasSubstr("no joint is left"));
+    EXPECT_THAT(failureOf([&] { chosen({&still, {}, 24.0, false}); }), HasSubstr("no joint is left"));
 }
 
 TEST(PosedJoints, ThoseLeftOutAreTold) {
@@ -84,7 +87,7 @@ TEST(PosedJoints, ThoseLeftOutAreTold) {
                 ElementsAre(HasSubstr("30 degrees"), "no controls of joints that move no vertex: toe",
                             HasSubstr("--with-roots keeps them): root"),
                             "no controls of joints with a scale of 0 at rest: prop"));
-    EXPECT_THAT(choosePosedJoints(character, splitRests(character, nullptr), {nullptr, &animation, 24.0, true}).notes,
+    EXPECT_THAT(choosePosedJoints(character, splitRests(character, nullptr), {nullptr, {&animation}, 24.0, true}).notes,
                 testing::IsSupersetOf({"limits of the poses: the range of the animation \"bend\"",
                                        "no controls of joints that the animation does not turn: root, prop"}));
 }

@@ -1,0 +1,120 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/pose/skinnedGltf.h"
+
+#include "quarn/scene/meshes.h"
+
+#include <algorithm>
+#include <limits>
+#include <map>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+constexpr std::size_t setSize = 4;
+using Shape = GltfNumbers::Shape;
+using Use = GltfNumbers::Use;
+
+std::vector<std::uint32_t> trianglesOf(const MeshPolygons& polygons) {
+    std::vector<std::uint32_t> triangles;
+    triangles.reserve(3 * polygons.sizes.size());
+    const std::uint32_t* corner = polygons.corners.data();
+    for (const std::uint32_t size : polygons.sizes) {
+        for (std::uint32_t i = 2; i < size; ++i)
+            triangles.insert(triangles.end(), {corner[0], corner[i - 1], corner[i]});
+        corner += size;
+    }
+    return triangles;
+}
+
+// of a vertex: weights by joint, none of them 0, with the sum 1
+std::map<std::size_t, double> influencesOf(const SceneSkin& skin, std::size_t vertex) {
+    std::map<std::size_t, double> weights;
+    double sum = 0.0;
+    for (std::size_t i = skin.weights.first[vertex]; i < skin.weights.first[vertex + 1]; ++i) {
+        const rig::Influence& influence = skin.weights.influences[i];
+        weights[*skin.influences[influence.joint].joint] += influence.weight;
+        sum += influence.weight;
+    }
+    for (auto& [joint, weight] : weights)
+        weight = sum != 0.0 ? weight / sum : 0.0;
+    return weights;
+}
+
+// influences of all vertices, four in each of the sets
+struct InfluenceSets {
+    std::vector<std::vector<std::uint16_t>> joints;
+    std::vector<std::vector<float>> weights;
+};
+
+InfluenceSets setsOf(const SceneSkin& skin) {
+    const std::size_t vertices = skin.weights.vertexCount();
+    InfluenceSets sets;
+    for (std::size_t vertex = 0; vertex < vertices; ++vertex) {
+        std::size_t place = 0;
+        for (const auto& [joint, weight] : influencesOf(skin, vertex)) {
+            const std::size_t set = place / setSize;
+            if (set == sets.joints.size()) {
+                sets.joints.emplace_back(setSize * vertices, std::uint16_t{0});
+                sets.weights.emplace_back(setSize * vertices, 0.0F);
+            }
+            sets.joints[set][setSize * vertex + place % setSize] = static_cast<std::uint16_t>(joint);
+            sets.weights[set][setSize * vertex + place % setSize] = static_cast<float>(weight);
+            ++place;
+        }
+    }
+    return sets;
+}
+
+std::vector<float> inverseBindsOf(const SceneSkin& skin, const std::vector<HMatrix>& restWorlds) {
+    std::vector<HMatrix> matrices;
+    matrices.reserve(restWorlds.size());
+    for (const HMatrix& world : restWorlds)
+        matrices.push_back(world.inverse()); // the identity of a singular one: it moves nothing
+    for (const SceneSkin::Influence& influence : skin.influences)
+        matrices[*influence.joint] = influence.inverseBind;
+    // column by column for column vectors is row by row for row vectors
+    std::vector<float> numbers;
+    numbers.reserve(16 * matrices.size());
+    for (const HMatrix& matrix : matrices)
+        for (unsigned row = 0; row < 4; ++row)
+            for (unsigned column = 0; column < 4; ++column)
+                numbers.push_back(static_cast<float>(matrix(row, column)));
+    return numbers;
+}
+
+} // namespace
+
+std::string whyNotInGltf(const SceneSkin& skin) {
+    constexpr std::size_t mostJoints = std::numeric_limits<std::uint16_t>::max();
+    for (std::size_t k = 0; k < skin.influences.size(); ++k) {
+        const std::string matrix = skin.node + ".matrix[" + std::to_string(skin.weights.joints[k]) + "]";
+        if (!skin.influences[k].joint)
+            return "is moved by " + matrix + ", which comes from no joint";
+        if (*skin.influences[k].joint > mostJoints)
+            return "is moved by more joints than a glTF file can number";
+    }
+    return {};
+}
+
+SkinnedGltf addSkinned(const SceneSkin& skin, const std::vector<HMatrix>& restWorlds, GltfNumbers& numbers) {
+    std::vector<float> points;
+    readPoints(skin.input, points);
+    const std::vector<std::uint32_t> triangles = trianglesOf(polygonsOf(skin.input));
+    if (points.size() != 3 * skin.weights.vertexCount() || triangles.empty())
+        throw std::runtime_error("the mesh " + skin.mesh + " has " + std::to_string(points.size() / 3) +
+                                 " vertices and " + std::to_string(triangles.size() / 3) + " triangles, and its skin " +
+                                 skin.node + " has " + std::to_string(skin.weights.vertexCount()) + " vertices");
+    SkinnedGltf made;
+    made.name = skin.mesh;
+    made.positions = numbers.add(points, {Shape::vec3, Use::vertices, true});
+    made.indices = numbers.add(triangles, {Shape::scalar, Use::indices});
+    const InfluenceSets sets = setsOf(skin);
+    for (std::size_t set = 0; set < sets.joints.size(); ++set)
+        made.jointsAndWeights.emplace_back(numbers.add(sets.joints[set], {Shape::vec4, Use::vertices}),
+                                           numbers.add(sets.weights[set], {Shape::vec4, Use::vertices}));
+    made.inverseBinds = numbers.add(inverseBindsOf(skin, restWorlds), {Shape::mat4});
+    return made;
+}
+
+} // namespace quarn

@@ -1,0 +1,27 @@
+// SPDX-License-Identifier: Apache-2.0
+// The meshes of a scene with their skins, as glTF has them.
+#pragma once
+
+#include "quarn/scene/GltfNumbers.h"
+#include "quarn/scene/skins.h"
+
+namespace quarn {
+
+/// A mesh and its skin, by the accessors of their numbers.
+struct SkinnedGltf {
+    std::string name;
+    std::size_t positions = 0;
+    std::size_t indices = 0;                                           ///< of triangles
+    std::vector<std::pair<std::size_t, std::size_t>> jointsAndWeights; ///< sets of four influences a vertex
+    std::size_t inverseBinds = 0;                                      ///< of all joints of the scene
+};
+
+/// Whether glTF can hold it: empty, or why not, as in "is moved by a_matrix, which is no joint".
+std::string whyNotInGltf(const SceneSkin& skin);
+
+/// Adds the numbers of a skin that glTF can hold; every joint of the scene is one of the skin's, by its index.
+/// `restWorlds` [joints] where they are at rest: those that move nothing are bound there. Polygons become fans of
+/// triangles, weights are brought to a sum of 1. Throws std::runtime_error. Thread: main.
+SkinnedGltf addSkinned(const SceneSkin& skin, const std::vector<HMatrix>& restWorlds, GltfNumbers& numbers);
+
+} // namespace quarn
