@@ -214,9 +214,10 @@ void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& output
 void addWriteOptions(CLI::App& command, Options& options) {
     CLI::Option* write =
         command
-            .add_option("--write", options.written.file,
-                        "Write the poses, too: .glb (skeleton, meshes, keys), .json (as --keys reads it) or .csv; "
-                        "without -o those that the scene has")
+            .add_option(
+                "--write", options.written.file,
+                "Write the poses, too: .glb (skeleton, meshes, keys), .json (as --keys reads it), .csv or .bvh; "
+                "without -o those that the scene has")
             ->type_name("FILE");
     command
         .add_option("--frame-offset", options.written.frameOffset,

@@ -7,6 +7,7 @@
 #include "quarn/console/numberText.h"
 #include "quarn/pose/Motion.h"
 #include "quarn/pose/animationPoses.h"
+#include "quarn/pose/bvhPoses.h"
 #include "quarn/pose/gltfPoses.h"
 #include "quarn/pose/poseKeys.h"
 #include "quarn/pose/textPoses.h"
@@ -40,8 +41,10 @@ FilePlaces placesOf(const PosesFileOptions& options) {
     return places;
 }
 
-std::string placeText(const FilePlaces& places, int frame, bool inSeconds) {
-    if (!inSeconds)
+std::string placeText(const FilePlaces& places, int frame, const std::string& ending) {
+    if (ending == ".bvh")
+        return "its first line of motion";
+    if (!countsSeconds(ending))
         return "frame " + std::to_string(places.frame(frame));
     return "second " + numberText(places.seconds(frame)) + ", at " + numberText(places.perSecond) + " frames a second";
 }
@@ -70,6 +73,12 @@ void writeTo(std::ostream& out, const std::string& ending, const Motion& motion,
         writeKeys(out, motion, places);
         return noteLockedPlugs(motion, console);
     }
+    if (ending == ".bvh") {
+        writeBvhPoses(out, motion, places);
+        console.note("a .bvh holds no mesh, no names of frames and no rotations of the rest pose: its skeleton stands "
+                     "with all joints unturned, and only the motion is the scene's");
+        return noteWhatHasNoJoint(motion, console);
+    }
     const GltfPosesAnswer answer = writeGltfPoses(out, motion, places);
     report.meshes = answer.meshes;
     for (const std::string& note : answer.notes)
@@ -81,8 +90,10 @@ void writeTo(std::ostream& out, const std::string& ending, const Motion& motion,
 
 void requirePosesFile(const PosesFileOptions& options, const std::vector<std::filesystem::path>& scenes) {
     const std::string ending = lowerEnding(options.file);
-    if (ending != ".glb" && ending != ".json" && ending != ".csv")
-        throw UsageError("--write " + options.file.string() + ": poses are written as .glb, .json or .csv");
+    if (ending != ".glb" && ending != ".json" && ending != ".csv" && ending != ".bvh")
+        throw UsageError("--write " + options.file.string() + ": poses are written as .glb, .json, .csv or .bvh");
+    if (ending == ".bvh" && options.frameOffset != 0)
+        throw UsageError("--frame-offset: frames have no numbers in " + options.file.string());
     for (const std::filesystem::path& scene : scenes) {
         std::error_code none;
         if (!scene.empty() && (scene.lexically_normal() == options.file.lexically_normal() ||
@@ -125,7 +136,7 @@ PosesFileReport writePoses(const PosesFileOptions& options, const std::optional<
                            motion.tracks.size(),
                            0,
                            frames.first,
-                           placeText(places, frames.first, countsSeconds(ending))};
+                           placeText(places, frames.first, ending)};
     storage::WholeFile file(options.file);
     try {
         writeTo(file.stream(), ending, motion, places, report, console);

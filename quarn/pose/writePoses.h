@@ -26,7 +26,7 @@ struct PosesFileReport {
     std::size_t plugs = 0;  ///< that move, or are sampled
     std::size_t meshes = 0; ///< of a .glb
     int sceneFirst = 1;     ///< frame of the scene that comes first
-    std::string place;      ///< where it lies in the file: "frame 1", or "second 0, at 24 frames a second"
+    std::string place;      ///< where it lies in the file: "frame 1", "second 0, at 24 frames a second" and the like
 };
 
 /// To be asked before anything is computed. Throws UsageError for an ending that is none of .glb, .json and .csv, and

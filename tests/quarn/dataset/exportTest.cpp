@@ -3,6 +3,7 @@
 #include "quarn/dataset/ExportScene.h"
 
 #include "quarn/dataset/FrameSampler.h"
+#include "quarn/dataset/exportControls.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
 
@@ -246,6 +247,24 @@ TEST_F(ExportTest, ExportModeEndsAlsoAfterAFailure) {
     writeTarget(2, [](std::size_t, std::vector<float>& xyz) { xyz[15] = std::numeric_limits<float>::quiet_NaN(); });
     EXPECT_THAT(failureOf([&] { quarn::FrameSampler(session.host(), warp, geometry, 2); }), HasSubstr("vertex 5"));
     expectMorph();
+}
+
+// what a model would get is known before there is a target
+TEST_F(ExportTest, ControlsAloneAreThoseOfTheDataSet) {
+    writeTarget(4);
+    save(4);
+    quarn::exportDatasets(options());
+    save(4, "disconnectAttr strip_target.outMesh warp.targetGeometry[0]");
+    quarn::ExportOptions controls = options();
+    controls.output = folder.path() / "controls";
+    EXPECT_EQ(quarn::exportControls(controls).rows, 4U);
+    for (const char* file : {"controls.npy", "frames.npy"})
+        EXPECT_EQ(contentOf(controls.output / file), contentOf(data() / file)) << file;
+    EXPECT_THAT(contentOf(controls.output / "controls.json"), HasSubstr("\"arm.relativeMatrix:0\""));
+    EXPECT_THAT(failureOf([&] { quarn::exportControls(controls); }), HasSubstr("--overwrite replaces them"));
+    controls.output = data();
+    controls.overwrite = true;
+    EXPECT_THAT(failureOf([&] { quarn::exportControls(controls); }), HasSubstr("holds a data set"));
 }
 
 } // namespace

@@ -68,7 +68,8 @@ TEST(PosedJoints, ThoseThatTellTheDeformerSomething) {
     EXPECT_THAT(chosen({nullptr, {&animation}, 24.0, false}), ElementsAre("hip z0..260", "knee x0..40"));
     Animation other = bending();
     other.channels[0].rotation.keys = {{0.0, HQuaternion(-20 * degree, {0, 0, 1})}};
-    EXPECT_THAT(chosen({nullptr, {&animation, &other}, 24.0, false, 0.5}), ElementsAre("hip z-160..400", "knee x-20..60"));
+    EXPECT_THAT(chosen({nullptr, {&animation, &other}, 24.0, false, 0.5}),
+                ElementsAre("hip z-160..400", "knee x-20..60"));
 
     JointLimits limits;
     limits[1] = {-1.0 * degree, 20.0 * degree};
