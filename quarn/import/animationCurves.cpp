@@ -22,11 +22,11 @@ bool differs(double a, double b) {
 
 // files have seconds in single precision: what cannot be told from a whole frame is that frame
 double frameNear(double seconds, double framesPerSecond) {
-    constexpr double rounding = 4e-7; // of seconds, by the file and by the importer's milliseconds
-    constexpr double most = 0.1;      // frames, however long the animation
+    constexpr double hair = 4e-7; // of seconds, by the file and by the importer's milliseconds
+    constexpr double most = 0.1;  // frames, however long the animation
     const double frame = frameOf(seconds, framesPerSecond);
     const double whole = std::round(frame);
-    return std::abs(frame - whole) <= std::min(most, rounding * std::abs(frame)) ? whole : frame;
+    return std::abs(frame - whole) <= std::min(most, hair * std::abs(frame)) ? whole : frame;
 }
 
 // times of keys in frames, each above the one before: of keys at one time, a jump, the first is a hair earlier, and all

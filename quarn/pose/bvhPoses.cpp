@@ -10,6 +10,7 @@
 #include <cmath>
 #include <ostream>
 #include <stdexcept>
+#include <utility>
 
 namespace quarn {
 namespace {
