@@ -3,8 +3,8 @@
 #include "PoseTest.h"
 
 #include "quarn/import/importCharacter.h"
-#include "quarn/scene/joints.h"
 #include "quarn/scene/meshes.h"
+#include "quarn/scene/skins.h"
 
 #include <assimp/Importer.hpp>
 #include <assimp/postprocess.h>
@@ -122,6 +122,11 @@ TEST_F(WritePosesTest, AnotherReaderFindsTheSameSkeleton) {
     EXPECT_EQ(file->mMeshes[0]->mNumVertices, stripScene::vertexCount);
     EXPECT_EQ(file->mMeshes[0]->mNumBones, 3U);
     EXPECT_STREQ(file->mRootNode->FindNode("tip")->mParent->mName.C_Str(), "middle");
+    {
+        const auto session = open();
+        const std::vector<quarn::SceneJoint> joints = quarn::sceneJoints();
+        EXPECT_THAT(quarn::movedVertices(quarn::sceneSkins(joints), 3), testing::ElementsAre(8, 4, 6));
+    }
     const Recording written = record("posed.json", 1, 25);
     std::size_t channels = 0;
     for (unsigned c = 0; c < file->mAnimations[0]->mNumChannels; ++c) {
@@ -235,7 +240,8 @@ TEST_F(WritePosesTest, PosesAreTakenFromAMotionMadeByHand) {
     pose({"--keys", write("k.json", R"({"keys": {"tip.rotateZ": [[1, 0.5], [11, 1.5]]}})")});
     std::filesystem::rename(path("posed.json"), scene());
     EXPECT_THAT(pose({"--from", "both", "--samples", "6", "--json"}), HasSubstr("\"fromAnimation\": 10,"));
-    EXPECT_NEAR(at(*open(), 16, "tip.rotateZ"), 1.5, 1e-12);
+    const auto session = open();
+    EXPECT_NEAR(at(*session, 16, "tip.rotateZ"), 1.5, 1e-12);
     EXPECT_EQ(quarn::findPlug("tip.rotateZ").source().name(), "tip_rotateZ_pose.output");
 }
 
