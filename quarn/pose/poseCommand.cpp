@@ -101,10 +101,16 @@ struct NoReport {};
 void writeReport(JsonWriter&, const NoReport&, const Options&) {}
 void printText(const NoReport&) {}
 
+std::string counted(std::size_t count, const char* one, const char* many) {
+    return std::to_string(count) + ' ' + (count == 1 ? one : many);
+}
+
 void printText(const PosesFileReport& file) {
-    std::cout << file.file.string() << ": " << file.frames << (file.frames == 1 ? " frame" : " frames") << ", "
-              << file.joints << " joints, " << file.plugs << " plugs, " << file.meshes << " meshes; frame "
-              << file.sceneFirst << " of the scene is at " << file.place << '\n';
+    std::cout << file.file.string() << ": " << counted(file.frames, "frame", "frames") << " of "
+              << counted(file.joints, "joint", "joints") << ", " << counted(file.plugs, "plug", "plugs");
+    if (file.meshes > 0)
+        std::cout << ", " << counted(file.meshes, "mesh", "meshes");
+    std::cout << "; frame " << file.sceneFirst << " of the scene is at " << file.place << '\n';
 }
 
 template <class Report>

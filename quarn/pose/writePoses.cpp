@@ -75,8 +75,9 @@ void writeTo(std::ostream& out, const std::string& ending, const Motion& motion,
     }
     if (ending == ".bvh") {
         writeBvhPoses(out, motion, places);
-        console.note("a .bvh holds no mesh, no names of frames and no rotations of the rest pose: its skeleton stands "
-                     "with all joints unturned, and only the motion is the scene's");
+        console.note(
+            "a .bvh holds no mesh, no numbers of frames and no rotations of the rest pose: its skeleton stands "
+            "with all joints unturned, and only the motion is the scene's");
         return noteWhatHasNoJoint(motion, console);
     }
     const GltfPosesAnswer answer = writeGltfPoses(out, motion, places);
