@@ -3,6 +3,7 @@
 
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/sliders.h"
 
 #include <algorithm>
 #include <set>
@@ -10,8 +11,10 @@
 namespace quarn {
 namespace {
 
-// without the compounds on the way, which a plug can be found without: "arm.rotateZ"
+// a slider by its own name; else without the compounds on the way, which a plug can be found without: "arm.rotateZ"
 std::string nameOf(const HPlug& plug) {
+    if (const HPlug slider = sliderBehind(plug); !slider.isNull())
+        return sliderName(slider);
     const std::string path = plug.partialName().asChar();
     const bool isPlain = path.find('[') == std::string::npos;
     return nodeName(plug.node()) + "." + (isPlain ? path.substr(path.rfind('.') + 1) : path);

@@ -6,7 +6,9 @@
 #include "openquarn_app/NodeTypes.h"
 #include "quarn/console/numberText.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/sliders.h"
 
+#include <algorithm>
 #include <cmath>
 #include <map>
 #include <stdexcept>
@@ -47,16 +49,26 @@ std::string whatIsWrong(const ValueLimits& limits) {
     return std::isfinite(limits.most - limits.least) ? "" : "are too far apart";
 }
 
-ValueLimits limitsOf(const HObject& collector, unsigned list, unsigned value, Complaints& complaints) {
-    const std::string path = element(element("limitsList", list) + ".limits", value);
+// of a plug with the children minValue, maxValue and defaultValue
+ValueLimits limitsOf(const std::string& plug, Complaints& complaints) {
     ValueLimits limits;
-    limits.least = numberOf(plugOf(collector, path + ".minValue"));
-    limits.most = numberOf(plugOf(collector, path + ".maxValue"));
-    limits.rest = numberOf(plugOf(collector, path + ".defaultValue"));
+    limits.least = numberOf(findPlug(plug + ".minValue"));
+    limits.most = numberOf(findPlug(plug + ".maxValue"));
+    limits.rest = numberOf(findPlug(plug + ".defaultValue"));
     if (const std::string wrong = whatIsWrong(limits); !wrong.empty())
-        complaints.add(nodeName(collector) + "." + path + " " + wrong + ": " + numberText(limits.least) + " to " +
-                       numberText(limits.most) + ", default " + numberText(limits.rest));
+        complaints.add(plug + " " + wrong + ": " + numberText(limits.least) + " to " + numberText(limits.most) +
+                       ", default " + numberText(limits.rest));
     return limits;
+}
+
+bool hasElement(const HPlug& array, unsigned index) {
+    const std::vector<unsigned> indices = indicesOf(array);
+    return std::find(indices.begin(), indices.end(), index) != indices.end();
+}
+
+bool hasLimits(const HObject& collector, unsigned list, unsigned value) {
+    return hasElement(plugOf(collector, "limitsList"), list) &&
+           hasElement(plugOf(collector, element("limitsList", list) + ".limits"), value);
 }
 
 void checkSource(const PoseControl& control, std::map<std::string, std::string>& inputBySource, Complaints& problems) {
@@ -69,6 +81,16 @@ void checkSource(const PoseControl& control, std::map<std::string, std::string>&
         problems.add(source + " (into " + control.input + ") " + why);
     if (const auto [known, isNew] = inputBySource.emplace(source, control.input); !isNew)
         problems.add(source + " is the source of both " + known->second + " and " + control.input);
+}
+
+// nobody could tell them apart in a data set, nor in a file of keys
+void checkNames(const std::vector<PoseControl>& sliders, Complaints& problems) {
+    std::map<std::string, std::string> plugByName;
+    for (const PoseControl& slider : sliders) {
+        const std::string plug = writtenName(slider.plug);
+        if (const auto [known, isNew] = plugByName.emplace(slider.input, plug); !isNew)
+            problems.add(slider.input + " is the name of both " + known->second + " and " + plug);
+    }
 }
 
 // some outputs can be set, but what their node computes is written over that
@@ -84,8 +106,45 @@ bool isComputed(const HPlug& plug) {
 }
 
 HObject collectorAt(const HPlug& source) {
-    const bool fits = !source.isNull() && nodeType(source.node()) == collectorType;
-    return fits ? source.node() : HObject();
+    const std::string type = source.isNull() ? "" : nodeType(source.node());
+    return type == collectorType || type == slidersType ? source.node() : HObject();
+}
+
+PoseControl collectedControl(const HObject& collector, unsigned list, unsigned value, Complaints& complaints) {
+    const HPlug input = plugOf(collector, element(element("inputList", list) + ".input", value));
+    PoseControl control{input.name().asChar(), input.source(), {}};
+    std::string limits = nodeName(collector) + "." + element(element("limitsList", list) + ".limits", value);
+    if (const HPlug slider = sliderBehind(control.plug); !slider.isNull()) {
+        control.plug = valueOf(slider);
+        if (!hasLimits(collector, list, value))
+            limits = slider.name().asChar();
+    }
+    control.limits = limitsOf(limits, complaints);
+    return control;
+}
+
+std::vector<PoseControl> collectedControls(const HObject& collector, Complaints& complaints) {
+    // what a connection of a whole list brings is there once it has been evaluated
+    if (const HStatus status = OpenQuarn::evaluate(plugOf(collector, "output")); status.error())
+        throw std::runtime_error(nodeName(collector) + ": " + status.errorString().asChar());
+    std::vector<PoseControl> controls;
+    for (const unsigned list : indicesOf(plugOf(collector, "inputList")))
+        for (const unsigned value : indicesOf(plugOf(collector, element("inputList", list) + ".input")))
+            controls.push_back(collectedControl(collector, list, value, complaints));
+    if (controls.empty())
+        throw std::runtime_error(nodeName(collector) + " collects nothing: connect the plugs to sample into " +
+                                 nodeName(collector) + ".inputList[0].input[0] and so on");
+    return controls;
+}
+
+std::vector<PoseControl> sliderControls(const HObject& node, Complaints& complaints) {
+    std::vector<PoseControl> controls;
+    for (const HPlug& slider : slidersOf(node))
+        controls.push_back({sliderName(slider), valueOf(slider), limitsOf(slider.name().asChar(), complaints)});
+    if (controls.empty())
+        throw std::runtime_error(nodeName(node) + " has no sliders: set " + nodeName(node) +
+                                 ".slider[0].sliderName and so on");
+    return controls;
 }
 
 } // namespace
@@ -105,7 +164,7 @@ HObject poseCollector(const Warp& warp) {
             collector = collectorAt(values.elementByLogicalIndex(index).source());
     if (collector.isNull())
         throw std::runtime_error(warp.name + " has no controls to sample: connect the message of a " + collectorType +
-                                 " into " + warp.name + ".poseGenerator");
+                                 " or of " + slidersType + " into " + warp.name + ".poseGenerator");
     return collector;
 }
 
@@ -135,23 +194,17 @@ std::string whyNotKeyable(const HPlug& plug) {
 }
 
 std::vector<PoseControl> poseControls(const HObject& collector) {
-    // what a connection of a whole list brings is there once it has been evaluated
-    if (const HStatus status = OpenQuarn::evaluate(plugOf(collector, "output")); status.error())
-        throw std::runtime_error(nodeName(collector) + ": " + status.errorString().asChar());
-    std::vector<PoseControl> controls;
-    std::map<std::string, std::string> inputBySource;
     Complaints sources;
     Complaints limits;
-    for (const unsigned list : indicesOf(plugOf(collector, "inputList")))
-        for (const unsigned value : indicesOf(plugOf(collector, element("inputList", list) + ".input"))) {
-            const HPlug input = plugOf(collector, element(element("inputList", list) + ".input", value));
-            controls.push_back({input.name().asChar(), input.source(), limitsOf(collector, list, value, limits)});
-            checkSource(controls.back(), inputBySource, sources);
-        }
+    const bool hasSliders = nodeType(collector) == slidersType;
+    std::vector<PoseControl> controls =
+        hasSliders ? sliderControls(collector, limits) : collectedControls(collector, limits);
+    std::map<std::string, std::string> inputBySource;
+    for (const PoseControl& control : controls)
+        checkSource(control, inputBySource, sources);
+    if (hasSliders)
+        checkNames(controls, sources);
     const std::string name = nodeName(collector);
-    if (controls.empty())
-        throw std::runtime_error(name + " collects nothing: connect the plugs to sample into " + name +
-                                 ".inputList[0].input[0] and so on");
     sources.throwIfAny("the controls of " + name + " cannot be sampled");
     limits.throwIfAny("the limits of " + name + " cannot be used");
     return controls;

@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The values of a rig that are sampled: what a controlCollector collects, with the plugs that they come from.
+// The values of a rig that are sampled: the sliders of a node, or what a controlCollector collects, with the plugs that
+// they come from.
 #pragma once
 
 #include "quarn/pose/PoseSet.h"
@@ -9,20 +10,21 @@
 
 namespace quarn {
 
-/// One value of a collector.
+/// One value of a collector, which may be a node of sliders.
 struct PoseControl {
-    std::string input; ///< name of the collector's plug
-    HPlug plug;        ///< connected into it: set or keyed
+    std::string input; ///< name of the collector's plug; of a slider
+    HPlug plug;        ///< connected into it, or the slider's value: set or keyed
     ValueLimits limits;
 };
 
-/// The collector that is connected into the deformer's poseGenerator, or else the one that feeds its controlValues.
-/// Throws std::runtime_error, with what to connect, when there is none. Thread: main.
+/// The controlCollector, or node of sliders, that is connected into the deformer's poseGenerator, or else the one that
+/// feeds its controlValues. Throws std::runtime_error, with what to connect, when there is none. Thread: main.
 HObject poseCollector(const Warp& warp);
 
-/// All values of the collector in its order. Throws std::runtime_error, naming the plugs, when there are none; when one
-/// has no source, or one that keys cannot be put on; when a source is there twice; and for limits that are in the wrong
-/// order or not finite. Thread: main.
+/// All values of the collector in its order. A slider that a controlCollector collects is sampled itself, between its
+/// own limits where the collector has none for it. Throws std::runtime_error, naming the plugs, when there are none;
+/// when one has no source, or one that keys cannot be put on; when a source or the name of a slider is there twice; and
+/// for limits that are in the wrong order or not finite. Thread: main.
 std::vector<PoseControl> poseControls(const HObject& collector);
 
 /// What the plug is a part of: its array or its compound; null when it is neither an element nor a child.

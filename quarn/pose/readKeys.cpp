@@ -5,6 +5,7 @@
 #include "quarn/pose/PoseControls.h"
 #include "quarn/pose/smoothSlopes.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/sliders.h"
 #include "storage/Json.h"
 #include "storage/readWholeFile.h"
 
@@ -121,9 +122,9 @@ private:
     HPlug usablePlug(const std::string& name) {
         HPlug plug;
         try {
-            plug = findPlug(name);
+            plug = findControl(name);
         } catch (const std::runtime_error& error) {
-            fail("names a plug that is not in the scene: " + std::string(error.what()));
+            fail("names a plug that cannot be found: " + std::string(error.what()));
         }
         const std::string fullName = writtenName(plug);
         if (const std::string why = whyNotKeyable(plug); !why.empty())

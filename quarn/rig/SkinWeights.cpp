@@ -1,46 +1,22 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/SkinWeights.h"
 
+#include "rig/listChecks.h"
 #include "rig/texts.h"
 
 #include <algorithm>
 #include <cmath>
-#include <limits>
 #include <string>
 
 namespace rig {
 namespace {
-
-constexpr double largest = std::numeric_limits<std::uint32_t>::max();
-
-bool isWhole(double value) {
-    return value >= 0.0 && value <= largest && value == std::floor(value);
-}
-
-HStatus wrong(const std::string& what) {
-    return {HStatus::kFailure, what};
-}
-
-HStatus checkWhole(const char* list, const std::vector<double>& values) {
-    for (std::size_t i = 0; i < values.size(); ++i)
-        if (!isWhole(values[i]))
-            return wrong(element(list, i) + " is " + text(values[i]) + ", not a whole number from 0 to 4294967295");
-    return HStatus::kSuccess;
-}
-
-HStatus checkFinite(const char* list, const std::vector<double>& values) {
-    for (std::size_t i = 0; i < values.size(); ++i)
-        if (!std::isfinite(values[i]))
-            return wrong(element(list, i) + " is " + text(values[i]));
-    return HStatus::kSuccess;
-}
 
 // counts below 2^32, fewer than 2^32 of them: the sum is exact up to where it is too large anyway
 HStatus checkLengths(const SkinLists& lists) {
     double sum = 0.0;
     for (const double count : lists.counts)
         sum += count;
-    if (sum > largest || lists.counts.size() > static_cast<std::size_t>(largest) - 1)
+    if (sum > largestIndex || lists.counts.size() > static_cast<std::size_t>(largestIndex) - 1)
         return wrong("influenceCounts add up to " + text(sum) + ", more than there can be");
     const auto expected = static_cast<std::size_t>(sum);
     for (const auto& [name, values] :
@@ -53,11 +29,11 @@ HStatus checkLengths(const SkinLists& lists) {
 }
 
 HStatus check(const SkinLists& lists) {
-    HStatus status = checkWhole("influenceCounts", lists.counts);
+    HStatus status = checkIndices("influenceCounts", lists.counts);
     if (!status.error())
         status = checkLengths(lists);
     if (!status.error())
-        status = checkWhole("influences", lists.influences);
+        status = checkIndices("influences", lists.influences);
     return status.error() ? status : checkFinite("skinWeights", lists.weights);
 }
 

@@ -3,10 +3,13 @@
 
 #include "rig/animCurveNode.h"
 #include "rig/animCurveQuaternionNode.h"
+#include "rig/blendShapeNode.h"
 #include "rig/characterNode.h"
 #include "rig/jointNode.h"
 #include "rig/pointCacheNode.h"
+#include "rig/polyGridNode.h"
 #include "rig/skinClusterNode.h"
+#include "rig/slidersNode.h"
 
 #include "openquarn/HFnPlugin.h"
 
@@ -34,6 +37,11 @@ const std::vector<NodeType>& nodeTypes() {
         {animCurveQuaternionNode::typeName, animCurveQuaternionNode::id, animCurveQuaternionNode::create,
          animCurveQuaternionNode::initialize, HPxNode::kDependNode},
         {pointCacheNode::typeName, pointCacheNode::id, pointCacheNode::create, pointCacheNode::initialize,
+         HPxNode::kDependNode},
+        {slidersNode::typeName, slidersNode::id, slidersNode::create, slidersNode::initialize, HPxNode::kDependNode},
+        {blendShapeNode::typeName, blendShapeNode::id, blendShapeNode::create, blendShapeNode::initialize,
+         HPxNode::kDeformerNode},
+        {polyGridNode::typeName, polyGridNode::id, polyGridNode::create, polyGridNode::initialize,
          HPxNode::kDependNode},
         {characterNode::typeName, characterNode::id, characterNode::create, characterNode::initialize,
          HPxNode::kDependNode},

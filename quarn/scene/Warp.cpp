@@ -17,7 +17,7 @@ std::string nameOfSource(const HPlug& from, unsigned index) {
     HPlug plug = from;
     for (int steps = 0; steps < 1000 && !plug.isNull(); ++steps) {
         const HObject node = plug.node();
-        if (nodeType(node) == "mesh")
+        if (nodeType(node) == "mesh" || nodeType(node) == "polyGrid")
             return nodeName(node);
         if (!plug.isElement())
             break;

@@ -13,5 +13,5 @@ TEST(QuarnSeeds, AreAcceptedOrRefusedAsTheirNamesSay) {
     EXPECT_GE(runSeedCorpus("fuzz_npy_table", fuzzNpyTable), 3);
     EXPECT_GE(runSeedCorpus("fuzz_side_json", fuzzSideJson), 4);
     EXPECT_GE(runSeedCorpus("fuzz_words", fuzzWords), 2);
-    EXPECT_GE(runSeedCorpus("fuzz_scene", fuzzRigScene), 4);
+    EXPECT_GE(runSeedCorpus("fuzz_scene", fuzzRigScene), 5);
 }

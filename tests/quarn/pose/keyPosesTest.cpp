@@ -35,16 +35,20 @@ TEST_F(KeyPosesTest, KeysPlayAndTheOtherControlsRest) {
 }
 
 TEST_F(KeyPosesTest, OthersMayKeepTheirAnimation) {
-    stripScene::write(scene(), animation);
-    pose({"--others", "keep", "--keys", write("k.json", R"({"keys": {"tip.rotateZ": [[1, 0], [5, 1]]}})")});
+    stripScene::write(scene(), std::string(animation) + "\ncreateNode sliders -name face; "
+                                                        "setAttr face.slider[3].sliderName \"left.blink\"");
+    pose({"--others", "keep", "--keys",
+          write("k.json", R"({"keys": {"tip.rotateZ": [[1, 0], [5, 1]], "face.left.blink": [[1, 0], [5, 2]]}})")});
     const auto session = open();
     EXPECT_EQ(at(*session, 5, "middle.rotateY"), 0.5);
     EXPECT_EQ(at(*session, 4, "tip.rotateZ"), 0.75);
+    EXPECT_EQ(at(*session, 3, "face.output[3]"), 1.0); // by the slider's name
 }
 
 // each row: a file, and what the failure says
 TEST_F(KeyPosesTest, DamagedFilesAreRefusedByName) {
-    stripScene::write(scene(), "setAttr -lock on root.rotate");
+    stripScene::write(scene(), "setAttr -lock on root.rotate; createNode sliders -name face; "
+                               "setAttr face.slider[0].sliderName a; setAttr face.slider[1].sliderName a");
     const auto keys = [](const std::string& list) { return R"({"keys": {"tip.rotateZ": )" + list + "}}"; };
     const std::pair<std::string, const char*> rows[] = {
         {"{\n \"keys\": [,", "line 2, column 11"},
@@ -60,6 +64,8 @@ TEST_F(KeyPosesTest, DamagedFilesAreRefusedByName) {
         {R"({"keys": {"thumb.rotateX": [[1, 0]]}})", "thumb.rotateX"},
         {R"({"keys": {"tip.twist": [[1, 0]]}})", "tip.twist"},
         {R"({"keys": {"tip": [[1, 0]]}})", "tip"},
+        {R"({"keys": {"face.a": [[1, 0]]}})", "face.a is the name of both face.slider[0] and face.slider[1]"},
+        {R"({"keys": {"face.b": [[1, 0]]}})", "face.b"},
         {R"({"keys": {"": [[1, 0]]}})", "no plug"},
         {R"({"keys": {"tip.rotate": [[1, 0]]}})", "tip.rotate, which is no number"},
         {R"({"keys": {"tip.matrix": [[1, 0]]}})", "tip.matrix, which is no number"},

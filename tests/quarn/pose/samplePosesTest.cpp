@@ -6,11 +6,19 @@
 
 #include <rapidjson/document.h>
 
+#include <algorithm>
+
 namespace {
 
 using stripScene::sampled;
 using ::testing::AllOf;
+using ::testing::Contains;
+using ::testing::Each;
+using ::testing::Ge;
+using ::testing::Gt;
 using ::testing::HasSubstr;
+using ::testing::Le;
+using ::testing::Lt;
 
 class SamplePosesTest : public PoseTest {};
 
@@ -68,6 +76,41 @@ TEST_F(SamplePosesTest, FewerPosesThanAskedAreKept) {
     EXPECT_EQ(at(*session, 50.0, "tip.rotateZ"), 0.5);
 }
 
+const char* const face = R"(
+createNode sliders -name face
+setAttr face.slider[1].sliderName browUp; setAttr face.slider[1].minValue -0.5; setAttr face.slider[1].value 0.1
+setAttr face.slider[4].sliderName jawOpen; setAttr face.slider[4].maxValue 3; setAttr face.slider[4].defaultValue 2
+)";
+
+TEST_F(SamplePosesTest, SlidersAreSampledBetweenTheirRanges) {
+    // as the collector themselves, and beside joints in one that has limits for one of them
+    const char* const ways[] = {
+        "connectAttr -force face.message warp.poseGenerator",
+        "disconnectAttr poses.message warp.poseGenerator; connectAttr -force face.output warp.controlValues",
+        "connectAttr face.output[1] poses.inputList[3].input[0]; "
+        "connectAttr face.slider[4].value poses.inputList[3].input[1]; setAttr poses.limitsList[3].limits[1].minValue "
+        "1; "
+        "setAttr poses.limitsList[3].limits[1].maxValue 3; setAttr poses.limitsList[3].limits[1].defaultValue 2"};
+    for (const std::string way : ways) {
+        SCOPED_TRACE(way);
+        const bool isCollected = way.find("limitsList") != std::string::npos;
+        stripScene::write(scene(), face + way);
+        EXPECT_THAT(pose({"--samples=40", "--activation-rate=0.5", "--json"}),
+                    HasSubstr(isCollected ? "\"values\": 6," : "\"values\": 2,"));
+        const auto session = open();
+        EXPECT_EQ(quarn::numberOf(quarn::findPlug(isCollected ? "poses.samples" : "face.samples")), 40);
+        const auto brow = list("face_slider_1__value_pose.keyValues");
+        const auto jaw = list("face_slider_4__value_pose.keyValues");
+        ASSERT_EQ(brow.size(), 40U);
+        EXPECT_EQ(brow.front(), 0.0); // the default, not what the slider was left at
+        EXPECT_EQ(jaw.front(), 2.0);
+        EXPECT_THAT(brow, AllOf(Each(AllOf(Ge(-0.5), Le(1.0))), Contains(Lt(0.0)), Contains(Gt(0.0))));
+        EXPECT_THAT(jaw, AllOf(Each(AllOf(Ge(isCollected ? 1.0 : 0.0), Le(3.0))), Contains(Gt(2.0))));
+        EXPECT_EQ(*std::min_element(jaw.begin(), jaw.end()) < 1.0, !isCollected);
+        EXPECT_EQ(at(*session, 7.5, "face.output[4]"), jaw[6]);
+    }
+}
+
 // a quaternion curve on the whole rotation of "middle", and a curve on "tip" from frame 3 to 13
 const char* const animation = R"(
 setAttr middle.jointOrientZ 0.25
@@ -119,6 +162,7 @@ TEST_F(SamplePosesTest, FramesOfTheAnimationFollowDrawnPoses) {
 // each row: what is done to the scene, flags, and what the failure says
 TEST_F(SamplePosesTest, WhatCannotBeSampledIsRefusedByName) {
     const std::string limit = "setAttr poses.limitsList[0].limits[1].";
+    const std::string sliders = face + std::string("connectAttr -force face.message warp.poseGenerator; ");
     const struct {
         std::string script;
         std::vector<std::string> flags;
@@ -138,6 +182,14 @@ TEST_F(SamplePosesTest, WhatCannotBeSampledIsRefusedByName) {
          {},
          {"axes.message"}},
         {"deleteNode poses controls", {}, {"warp.poseGenerator"}},
+        {sliders + "setAttr face.slider[4].sliderName browUp",
+         {},
+         {"face.browUp is the name of both face.slider[1].value and face.slider[4].value"}},
+        {sliders + "setAttr face.slider[4].minValue 4", {}, {"face.slider[4] are in the wrong order: 4 to 3"}},
+        {sliders + "setAttr -lock on face.slider[4].value", {}, {"face.slider[4].value", "is locked"}},
+        {"createNode sliders -name none; connectAttr -force none.message warp.poseGenerator",
+         {},
+         {"none has no sliders", "none.slider[0].sliderName"}},
         {"deleteNode warp", {}, {"no neuralWarp"}},
         {"", {"--from", "animation"}, {"no animation"}},
         {"", {"--from", "animation", "--frames", "9-1"}, {"9-1"}},

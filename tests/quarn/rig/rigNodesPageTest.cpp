@@ -5,6 +5,7 @@
 #include "support/pageExamples.h"
 
 #include <fstream>
+#include <map>
 #include <sstream>
 
 namespace {
@@ -21,7 +22,13 @@ protected:
 };
 
 TEST_F(RigNodesPage, NamesEveryAttribute) {
-    for (const std::string type : {"joint", "skinCluster", "animCurve", "animCurveQuaternion", "character"}) {
+    const std::map<std::string, std::string> arrayBefore = {{"skin", "skin."},
+                                                            {"slider", "slider."},
+                                                            {"combination", "combination."},
+                                                            {"shapes", "shapes."},
+                                                            {"shape", "shapes.shape."}};
+    for (const std::string type : {"joint", "skinCluster", "sliders", "blendShape", "polyGrid", "animCurve",
+                                   "animCurveQuaternion", "character"}) {
         const std::string text = page.str();
         const std::size_t from = text.find("\n## " + type + '\n');
         ASSERT_NE(from, std::string::npos) << type;
@@ -29,7 +36,8 @@ TEST_F(RigNodesPage, NamesEveryAttribute) {
         for (const OpenQuarn::AttributeInfo& attribute : OpenQuarn::attributesOf(type)) {
             if (attribute.inherited)
                 continue;
-            const std::string name = (attribute.parent == "skin" ? "skin." : "") + attribute.name;
+            const auto before = arrayBefore.find(attribute.parent);
+            const std::string name = (before == arrayBefore.end() ? "" : before->second) + attribute.name;
             EXPECT_NE(section.find('`' + name + '`'), std::string::npos) << type << ' ' << name;
             EXPECT_NE(section.find('`' + attribute.shortName + '`'), std::string::npos) << type << ' ' << name;
         }
@@ -37,7 +45,7 @@ TEST_F(RigNodesPage, NamesEveryAttribute) {
 }
 
 TEST_F(RigNodesPage, ExamplesGiveWhatItSays) {
-    EXPECT_GE(comparePageExamples(page, [&](const std::string& line) { return run(line); }), 7);
+    EXPECT_GE(comparePageExamples(page, [&](const std::string& line) { return run(line); }), 12);
 }
 
 } // namespace
