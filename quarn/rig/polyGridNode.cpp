@@ -59,7 +59,7 @@ struct Grid {
 
 // what is connected in has not been brought between the limits
 HStatus check(const Grid& grid) {
-    constexpr std::int64_t mostVertices = std::int64_t{1} << 24U;
+    constexpr std::int64_t mostVertices = std::int64_t{1} << 20U;
     for (const auto& [name, size] : {std::pair<const char*, double>{"width", grid.width}, {"depth", grid.depth}})
         if (!std::isfinite(size) || size < 0.0)
             return wrong(std::string(name) + " is " + text(size) + ", not a finite number from 0 on");

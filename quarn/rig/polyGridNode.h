@@ -21,7 +21,7 @@ public:
     ~polyGridNode() override;
 
     /// Fails, naming attribute and value, for a size that is negative or not finite, for subdivisions below 1, and for
-    /// more than 16 777 216 vertices. [eval]
+    /// more than 1 048 576 vertices. [eval]
     HStatus compute(const HPlug& plug, HDataBlock& block) override;
 
     static HObject width;

@@ -56,8 +56,10 @@ TEST_F(BlendShape, FollowsItsListsAndElements) {
     setShape("0", "0", "1", "0 0 5"); // lists that were kept are let go
     setShape("0", "2", "0", "9 9 9"); // and those behind a new element move on
     EXPECT_EQ(deformed(), (std::vector<HPoint>{{0, 0, 0}, {1, 0, 5}, {0, 1, 0}, {1, 1, 8}}));
+    run("setAttr b.shapes[0].shape[4].deltas 0 0 3; setAttr b.shapes[0].shape[0].vertices 2"); // one of the two
+    EXPECT_EQ(deformed(), (std::vector<HPoint>{{0, 0, 0}, {1, 0, 0}, {0, 1, 5}, {1, 1, 3}}));
     run("setAttr b.weight[2] 1; setAttr b.weight[4] 0");
-    EXPECT_EQ(deformed(), (std::vector<HPoint>{{9, 9, 9}, {1, 0, 5}, {0, 1, 0}, {1, 1, 0}}));
+    EXPECT_EQ(deformed(), (std::vector<HPoint>{{9, 9, 9}, {1, 0, 0}, {0, 1, 5}, {1, 1, 0}}));
 }
 
 TEST_F(BlendShape, AffectsTheVerticesOfItsTag) {

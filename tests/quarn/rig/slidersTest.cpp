@@ -40,9 +40,9 @@ TEST_F(Sliders, AGridIsRowsOfVerticesThatFaceUp) {
         {"setAttr j.translateX -1", "width is -1, not a finite number from 0 on"},
         {"setAttr j.translateX 1; setAttr j.translateY 0", "subdivisionsDepth is 0, not 1 or more"},
         {"setAttr j.translateY 2147483647", "subdivisionsWidth 2 and subdivisionsDepth 2147483647 make more than "
-                                            "16777216 vertices"},
-        {"setAttr j.translateY 4095; setAttr g.subdivisionsWidth 4096",
-         "subdivisionsWidth 4096 and subdivisionsDepth 4095 make more than 16777216 vertices"},
+                                            "1048576 vertices"},
+        {"setAttr j.translateY 1023; setAttr g.subdivisionsWidth 1024",
+         "subdivisionsWidth 1024 and subdivisionsDepth 1023 make more than 1048576 vertices"},
     };
     for (const auto& row : rows) {
         run(row.script);
