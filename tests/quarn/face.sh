@@ -9,7 +9,8 @@ examples=$PWD/examples/face
 cd "$work"
 
 expect 0 'face\.json\n$' '' exec "$examples/face.txt"
-expect 0 '"collector": "face",(.|\n)*"poses": 60,\n *"values": 3,' '' pose face.json -o posed.json --samples 60 --json --quiet
+expect 0 '"collector": "face",(.|\n)*"poses": 60,\n *"values": 3,' '' \
+  pose face.json -o posed.json --samples 60 --json --quiet
 expect 0 'sculpted\.json\n$' '' exec "$examples/sculpt.txt"
 expect 0 '' 'wrote 60 frames of 45 vertices' bake sculpted.json 'shapes.outputGeom[0]' --frames 1-60 -o sculpted.npy
 expect 0 'skin_target plays 60 frames' '' target posed.json --cache sculpted.npy --quiet

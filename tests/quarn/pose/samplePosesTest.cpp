@@ -20,7 +20,13 @@ using ::testing::HasSubstr;
 using ::testing::Le;
 using ::testing::Lt;
 
-class SamplePosesTest : public PoseTest {};
+class SamplePosesTest : public PoseTest {
+protected:
+    static std::vector<double> keysOf(const std::string& plug) {
+        const HObject curve = quarn::findPlug(plug).source().node();
+        return HFnDoubleArrayData(quarn::plugOf(curve, "keyValues").asHObject()).values();
+    }
+};
 
 TEST_F(SamplePosesTest, TheSameSeedGivesTheSameSceneAndPosingAgainReplaces) {
     stripScene::write(scene());
@@ -54,8 +60,7 @@ TEST_F(SamplePosesTest, PosesPlayBackWithinTheLimitsAfterTheDefaultOne) {
     for (const auto& [plug, value] : settings)
         EXPECT_EQ(quarn::numberOf(quarn::findPlug(plug)), value) << plug;
     for (const auto& [plug, place, least, most, rest] : sampled) {
-        const HObject curve = quarn::findPlug(plug).source().node();
-        const std::vector<double> keys = HFnDoubleArrayData(quarn::plugOf(curve, "keyValues").asHObject()).values();
+        const std::vector<double> keys = keysOf(plug);
         ASSERT_EQ(keys.size(), 40U);
         EXPECT_EQ(keys.front(), rest);
         for (std::size_t frame = 0; frame < keys.size(); ++frame) {
@@ -99,8 +104,8 @@ TEST_F(SamplePosesTest, SlidersAreSampledBetweenTheirRanges) {
                     HasSubstr(isCollected ? "\"values\": 6," : "\"values\": 2,"));
         const auto session = open();
         EXPECT_EQ(quarn::numberOf(quarn::findPlug(isCollected ? "poses.samples" : "face.samples")), 40);
-        const auto brow = list("face_slider_1__value_pose.keyValues");
-        const auto jaw = list("face_slider_4__value_pose.keyValues");
+        const auto brow = keysOf("face.slider[1].value");
+        const auto jaw = keysOf("face.slider[4].value");
         ASSERT_EQ(brow.size(), 40U);
         EXPECT_EQ(brow.front(), 0.0); // the default, not what the slider was left at
         EXPECT_EQ(jaw.front(), 2.0);

@@ -8,6 +8,7 @@
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Evaluation.h"
 #include "openquarn_app/Plugins.h"
+#include "openquarn_app/SceneFile.h"
 #include "rig/registration.h"
 
 #include <string>
@@ -31,5 +32,10 @@ protected:
     void expectFailure(const std::string& plug, const std::string& problem) {
         EXPECT_TRUE(OpenQuarn::evaluate(testNodes::plug(plug)).error()) << problem;
         EXPECT_THAT(takeMessages(), ::testing::ElementsAre("report: '" + plug + "' could not be computed: " + problem));
+    }
+    static void saveAndOpen() {
+        std::string text;
+        EXPECT_TRUE(OpenQuarn::sceneToText(text));
+        EXPECT_TRUE(OpenQuarn::sceneFromText(text, "saved"));
     }
 };

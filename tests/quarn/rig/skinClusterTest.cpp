@@ -2,8 +2,6 @@
 #include "host/support/testDeformers.h"
 #include "quarn/rig/RigTest.h"
 
-#include "openquarn_app/SceneFile.h"
-
 namespace {
 
 /// Two grids of four vertices. The joint at x = 1, index 5, turns; the one at index 2 stays.
@@ -125,9 +123,7 @@ TEST_F(SkinCluster, IsTheSameInParallelAndFromAFile) {
         ASSERT_EQ(deformed("0"), first);
         ASSERT_EQ(deformed("3"), second);
     }
-    std::string saved;
-    EXPECT_TRUE(OpenQuarn::sceneToText(saved));
-    EXPECT_TRUE(OpenQuarn::sceneFromText(saved, "saved"));
+    saveAndOpen();
     EXPECT_EQ(deformed("0"), first);
     EXPECT_EQ(deformed("3"), second);
 }
