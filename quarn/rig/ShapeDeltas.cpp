@@ -57,7 +57,7 @@ ShapeDeltas ofAllVertices(const std::vector<double>& deltas) {
 } // namespace
 
 HStatus makeShapeDeltas(const std::vector<double>& vertices, const std::vector<double>& deltas, ShapeDeltas& shape) {
-    const HStatus status = check(vertices, deltas);
+    HStatus status = check(vertices, deltas);
     if (status.error())
         return status;
     ShapeDeltas made = vertices.empty() ? ofAllVertices(deltas) : sorted(vertices, deltas);

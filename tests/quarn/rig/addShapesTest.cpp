@@ -61,8 +61,9 @@ TEST_F(AddShapes, IsThePlainSumOnAnyNumberOfThreadsAndForAnyPoints) {
         HPointArray before, wanted;
         for (unsigned i = 0; i < (map.isEmpty() ? vertexCount : map.length()); ++i) {
             const unsigned v = map.isEmpty() ? i : map[i];
+            const double* sum = plainSums.data() + std::size_t{3} * v;
             before.append(start[v]);
-            wanted.append(start[v] + HVector(plainSums[3 * v], plainSums[3 * v + 1], plainSums[3 * v + 2]) *
+            wanted.append(start[v] + HVector(sum[0], sum[1], sum[2]) *
                                          (weights ? envelope * static_cast<double>(weights[i]) : envelope));
         }
         for (const unsigned threads : {1U, 2U, 7U}) {
