@@ -36,7 +36,7 @@ public:
         }
         if (plug.isArray() || !plug.attribute().hasFn(HFn::kNumericAttribute))
             return;
-        std::string name = writtenName(plug);
+        std::string name = controlName(plug);
         if (names_.insert(name).second)
             tracks_.push_back({plug, std::move(name), {}, whyNotKeyable(plug).empty()});
     }

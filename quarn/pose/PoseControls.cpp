@@ -179,6 +179,16 @@ std::string writtenName(const HPlug& plug) {
     return nodeName(plug.node()) + "." + HFnAttribute(plug.attribute()).name().asChar();
 }
 
+std::string controlName(const HPlug& plug) {
+    const HPlug slider = sliderBehind(plug);
+    if (slider.isNull() || plug != valueOf(slider))
+        return writtenName(plug);
+    std::string name = sliderName(slider);
+    const std::vector<HPlug> all = slidersOf(plug.node());
+    const auto hasName = [&](const HPlug& other) { return sliderName(other) == name; };
+    return std::count_if(all.begin(), all.end(), hasName) == 1 ? name : writtenName(plug);
+}
+
 std::string whyNotKeyable(const HPlug& plug) {
     const HFnAttribute attribute(plug.attribute());
     if (plug.isArray() || !plug.attribute().hasFn(HFn::kNumericAttribute))

@@ -33,6 +33,10 @@ HPlug wholeOf(const HPlug& plug);
 /// The plug as users write it: "joint.rotateX", without the compounds on the way where no array is among them.
 std::string writtenName(const HPlug& plug);
 
+/// What findControl() finds the plug by: "face.browUp" for the value of a slider whose name no other one of its node
+/// has, and writtenName() for every other plug. Thread: main.
+std::string controlName(const HPlug& plug);
+
 /// Why no keys can be put on the plug, as in "is locked"; empty when they can. Thread: main.
 std::string whyNotKeyable(const HPlug& plug);
 

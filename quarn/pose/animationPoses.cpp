@@ -67,7 +67,7 @@ AnimationPoses addAnimationPoses(PoseSet& poses, const std::vector<PoseControl>&
             pose[i] = valueAt(context, controls[i].plug, frames.frame(number));
             outside = outside || isOutside(pose[i], controls[i].limits);
             if (outside && result.firstOutside.empty())
-                result.firstOutside = writtenName(controls[i].plug);
+                result.firstOutside = controlName(controls[i].plug);
         }
         result.outside += outside ? 1U : 0U;
         result.dropped += poses.add(pose) ? 0U : 1U;

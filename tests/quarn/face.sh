@@ -11,6 +11,9 @@ cd "$work"
 expect 0 'face\.json\n$' '' exec "$examples/face.txt"
 expect 0 '"collector": "face",(.|\n)*"poses": 60,\n *"values": 3,' '' \
   pose face.json -o posed.json --samples 60 --json --quiet
+expect 0 '60 frames of 0 joints, 3 plugs' '' pose posed.json --write poses.json --quiet
+expect 0 '180 keys on 3 plugs' '' pose face.json -o again.json --keys poses.json
+grep -q '^"face\.smile": \[\[1, 0\]' poses.json || fail "a slider is not written by its name"
 expect 0 'sculpted\.json\n$' '' exec "$examples/sculpt.txt"
 expect 0 '' 'wrote 60 frames of 45 vertices' bake sculpted.json 'shapes.outputGeom[0]' --frames 1-60 -o sculpted.npy
 expect 0 'skin_target plays 60 frames' '' target posed.json --cache sculpted.npy --quiet
