@@ -191,7 +191,9 @@ std::vector<StepState> RunFolder::run(const std::string& until) {
         throwIfInterrupted();
         const Step& step = plan[states.size()];
         StepState state{step.label(), true, ledger_.whyToDo(step, versionOf(step)), 0.0, false};
-        if (!state.why.empty())
+        if (state.why.empty())
+            log([&] { return step.label() + " was done already"; });
+        else
             state.seconds = doStep(step, state.why);
         states.push_back(std::move(state));
     }

@@ -24,7 +24,7 @@ says() {
   local -a command=() patterns=("$plugin")
   while [[ $1 != -- ]]; do command+=("$1") && shift; done
   shift
-  [[ ${command[0]} == info && ${command[1]} != *.json ]] && patterns=()
+  [[ (${command[0]} == info && ${command[1]} != *.json) || ${command[0]} == run ]] && patterns=()
   patterns+=("${@/#/$stamps}" "$stamps"'done$')
   rm -f log
   "$quarn" "${command[@]}" >plain 2>err || fail "quarn ${command[*]}: failed"
@@ -52,6 +52,7 @@ says info moving.json --json -- 'looking into scene moving\.json: ' "$(opens mov
 says info models/wave.nwrp -- 'reading model .*/wave\.nwrp in a process apart: 0 problems, [\d.]+ ms$'
 says info --devices --json -- '\d+ OpenCL devices$'
 says listAttr neuralWarp -- 'neuralWarp has \d+ attributes$'
+says run bone.gltf -o ran --import-option=--with-roots --samples 3 --held-out 3 -- 'skin was done already$'
 says exec script.txt -- 'running script\.txt: [\d.]+ ms$'
 
 # what fell back, and why
