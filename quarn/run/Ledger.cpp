@@ -214,9 +214,9 @@ std::string Ledger::whyToDo(const Step& step, const std::string& version) {
         return "its program is " + now.version + ", was " + before.version;
     if (now.words != before.words)
         return "its arguments are others: " + differenceOf(now.words, before.words);
-    if (const std::string difference = differenceOf(now.inputs, before.inputs, "its input"); !difference.empty())
+    if (std::string difference = differenceOf(now.inputs, before.inputs, "its input"); !difference.empty())
         return difference;
-    if (const std::string difference = differenceOf(now.written, before.written, "its input"); !difference.empty())
+    if (std::string difference = differenceOf(now.written, before.written, "its input"); !difference.empty())
         return difference;
     Sums outputs;
     for (const fs::path& output : step.outputs)

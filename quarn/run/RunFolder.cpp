@@ -44,7 +44,7 @@ void requireOwn(const fs::path& folder) {
 // the last lines of a text, indented, as an error shows them
 std::string endOf(const std::string& text) {
     constexpr int lines = 15;
-    std::size_t from = text.find_last_not_of("\n");
+    std::size_t from = text.find_last_not_of('\n');
     const std::size_t end = from == std::string::npos ? 0 : from + 1;
     for (int line = 0; line < lines && from != std::string::npos && from > 0; ++line)
         from = text.rfind('\n', from - 1);

@@ -4,7 +4,9 @@
 #include "quarn/console/Log.h"
 #include "storage/Descriptor.h"
 
+#include <algorithm>
 #include <array>
+#include <cmath>
 #include <iostream>
 #include <regex>
 
@@ -62,7 +64,7 @@ void StepLine::draw() {
 }
 
 void StepLine::finish(const Console& console, const std::string& label, double seconds) {
-    std::string number = std::to_string(static_cast<long long>(seconds * 10.0 + 0.5));
+    std::string number = std::to_string(std::llround(seconds * 10.0));
     number.insert(0, number.size() < 2 ? 2 - number.size() : 0, '0');
     number.insert(number.size() - 1, ".");
     console.note(padded(label) + number + " s");
