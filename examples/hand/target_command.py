@@ -21,7 +21,7 @@ def main() -> None:
     # the folder in which it is started is its own
     skin = np.load(request["skin"]["file"], mmap_mode="r", allow_pickle=False)
     np.save("skin.npy", skin[[frame - request["skin"]["firstFrame"] for frame in request["frames"]]])
-    sys.argv[1:] = [request["skeleton"]["file"], "skin.npy", "-o", request["write"], "--mesh", request["mesh"]]
+    sys.argv[1:] = [request["scene"], "skin.npy", "-o", request["write"], "--mesh", request["mesh"]]
     targets.main()
 
 

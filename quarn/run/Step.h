@@ -16,7 +16,7 @@ namespace quarn {
 /// What a program is asked for that makes the shapes of poses; see docs/run.md. Paths count from the run's folder.
 struct TargetRequest {
     std::string mesh;
-    std::filesystem::path character, scene, rest, skin;
+    std::filesystem::path character, skeleton, scene, rest, skin;
     std::string order; ///< of vertices
     std::size_t vertices = 0;
     int firstFrame = 0, lastFrame = 0;

@@ -138,6 +138,10 @@ private:
                                   characterFiles(settings_.character), {"character.json"});
         appendFile(step, "--parents", settings_.parents);
         appendFile(step, "--limits", settings_.limits);
+        if (settings_.limits.empty()) { // to be edited, and given the next time
+            append(step.words, {"--write-limits", "limits.json"});
+            step.outputs.emplace_back("limits.json");
+        }
         append(step.words, settings_.importOptions);
     }
 
@@ -150,8 +154,9 @@ private:
     }
 
     void poses() {
-        Step& step = addAnswering("poses", nullptr, {"pose", "character.json", "-o", "poses.json"}, {"character.json"},
-                                  {"poses.json"});
+        Step& step =
+            addAnswering("poses", nullptr, {"pose", "character.json", "-o", "poses.json", "--write", "poses.glb"},
+                         {"character.json"}, {"poses.json", "poses.glb"});
         if (!settings_.from.empty())
             append(step.words, {"--from", settings_.from});
         if (settings_.from != "animation") {
@@ -167,8 +172,9 @@ private:
 
     void motion() {
         addAnswering("motion", nullptr,
-                     {"pose", "character.json", "--keys", settings_.motion.string(), "-o", "motion.json"},
-                     {"character.json", settings_.motion}, {"motion.json"});
+                     {"pose", "character.json", "--keys", settings_.motion.string(), "-o", "motion.json", "--write",
+                      "motion.glb"},
+                     {"character.json", settings_.motion}, {"motion.json", "motion.glb"});
     }
 
     // a mesh plug, in the order that targets have, frame by frame
@@ -236,12 +242,14 @@ private:
     void askFor(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames) {
         const fs::path skin = skinFile(scene, mesh.name);
         const std::string rest = dataOf(mesh) + "/rest.npy";
-        Step& step = add(name, &mesh, settings_.targetCommand, {settings_.character, scene + ".json", rest, skin},
+        Step& step = add(name, &mesh, settings_.targetCommand,
+                         {settings_.character, scene + ".glb", scene + ".json", rest, skin},
                          {dataOf(mesh) + "/" + scene + "_target.npy"});
         step.program = Program::targetCommand;
         TargetRequest& request = step.request.emplace();
         request.mesh = mesh.name;
         request.character = settings_.character;
+        request.skeleton = scene + ".glb";
         request.scene = scene + ".json";
         request.rest = rest;
         request.skin = skin;

@@ -77,8 +77,8 @@ std::string needed(const RunFolder& run, const RunSettings& settings) {
     const RunFacts facts = run.facts();
     std::string text = "the poses are there; what shapes the meshes should have in them is to be made:\n";
     const auto add = [&](const std::string& scene, const FrameSpan& frames) {
-        text += "  " + (run.path() / (scene + ".json")).string() + ": the skeleton and its keys, frames " +
-                framesText(frames) + "\n";
+        text += "  " + (run.path() / (scene + ".glb")).string() + ": the skeleton and its keys, frames " +
+                framesText(frames) + "; the scene is " + scene + ".json\n";
         for (const MeshFacts& mesh : facts.character->meshes)
             text += "  " + (run.path() / skinFile(scene, mesh.name)).string() + ": the skin of " + mesh.name +
                     ", <f4 [" + std::to_string(frames.count()) + ", " +

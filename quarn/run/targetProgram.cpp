@@ -195,9 +195,10 @@ std::string textOf(const TargetRequest& request, const fs::path& folder, int fir
     writeText(writer, "character", request.character.string());
     writer.Key("skeleton");
     writer.StartObject();
-    writeText(writer, "file", (folder / request.scene).string());
-    writeText(writer, "format", "scene");
+    writeText(writer, "file", (folder / request.skeleton).string());
+    writeText(writer, "format", "glb");
     writer.EndObject();
+    writeText(writer, "scene", (folder / request.scene).string());
     writeSkin(writer, request, folder);
     writer.Key("frames");
     writer.StartArray();

@@ -26,7 +26,7 @@ with_targets=("${options[@]}" --target-command sh lift.sh)
 # --- to the poses, and no further ---
 expect 0 'then the same command goes on, with --targets FILE added' 'skin +\d+\.\d s\n$' run bone.gltf -o made "${options[@]}"
 expect 0 'targets are shaped alike' '^4 of 4 steps were done already\n$' run bone.gltf -o made "${options[@]}"
-[[ -s made/poses.json && -n $(find made/data -name poses_skin.npy) && ! -e made/lock ]] || fail "not what a tool needs"
+[[ -s made/poses.glb && -s made/limits.json && -n $(find made/data -name poses_skin.npy) && ! -e made/lock ]] || fail "not what a tool needs"
 expect 0 'import: done\nposes: to do, as its arguments are others: --samples 11, was --samples 9\nrest: done\nskin: done, but' '' \
   run bone.gltf -o made --import-option=--with-roots --samples 8 --held-out 3 --explain
 

@@ -38,6 +38,8 @@ protected:
         request.lastFrame = firstFrame + static_cast<int>(frames) - 1;
         request.order = "scene";
         request.skin = "skin.npy";
+        request.skeleton = "poses.glb";
+        request.scene = "poses.json";
         fs::create_directories(folder.path() / "out");
         cache("all", firstFrame, frames);
         cache("other", firstFrame, frames, 3);
@@ -135,9 +137,10 @@ TEST_F(TargetProgramTest, IsToldWhatThereIs) {
     "mesh": "arm",
     "character": "",
     "skeleton": {
-        "file": "/run/",
-        "format": "scene"
+        "file": "/run/poses.glb",
+        "format": "glb"
     },
+    "scene": "/run/poses.json",
     "skin": {
         "file": "/run/skin.npy",
         "format": "npy <f4",
