@@ -4,8 +4,8 @@
 #include "quarn/scene/plugs.h"
 
 #include "openquarn_app/SceneFile.h"
+#include "storage/FileIdentity.h"
 #include "storage/Fnv64.h"
-#include "storage/NpyFile.h"
 
 #include <fstream>
 #include <stdexcept>

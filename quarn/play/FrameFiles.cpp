@@ -3,7 +3,8 @@
 
 #include "quarn/console/UsageError.h"
 #include "quarn/play/meshFiles.h"
-#include "storage/NpyWriter.h"
+#include "storage/CacheFormat.h"
+#include "storage/PointCacheWriter.h"
 #include "storage/WholeFile.h"
 
 #include <cstdlib>
@@ -13,7 +14,7 @@ namespace quarn {
 namespace {
 
 bool isCache(const std::filesystem::path& path) {
-    return path.extension() == ".npy";
+    return storage::cacheFormatOf(path).has_value();
 }
 
 } // namespace
@@ -36,7 +37,8 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
         return WholeFile::requirePossible(pattern, WholeFile::Writes::anywhere);
     if (!isMeshFile(pattern))
         throw UsageError("\"" + pattern.string() +
-                         "\" is no file that is written here: its name ends in .npy, .obj, .ply, .gltf or .glb");
+                         "\" is no file that is written here: its name ends in .npy, .npz, .pc2, .mdd, .obj, .ply, "
+                         ".gltf or .glb");
     if (frames.count() > 1 && pattern.filename().string().find('#') == std::string::npos)
         throw UsageError("\"" + pattern.string() + "\" would be written for each of " + std::to_string(frames.count()) +
                          " frames: put #### where the number of the frame goes, as in \"" + pattern.stem().string() +
@@ -44,23 +46,36 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
     WholeFile::requirePossible(frameFile(pattern, frames.first));
 }
 
-FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, VertexOrder order)
+FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, FrameWriting writing)
     : pattern_(std::move(pattern))
-    , order_(std::move(order)) {
+    , writing_(std::move(writing)) {
+    if (!isCache(pattern_)) {
+        polygons_ = writing_.order.polygons(polygons);
+        return;
+    }
     const std::vector<float> any(3 * polygons.vertexCount);
-    if (isCache(pattern_))
-        cache_ = std::make_unique<storage::NpyWriter>(pattern_.string(), order_.points(any).size() / 3);
-    else
-        polygons_ = order_.polygons(polygons);
+    const FrameRange& frames = writing_.frames;
+    const storage::CacheTiming timing{frames.count(), static_cast<double>(frames.first),
+                                      static_cast<double>(frames.step), writing_.framesPerSecond};
+    cache_ = storage::createPointCache(pattern_.string(), writing_.order.points(any).size() / 3, timing);
 }
 
 FrameFiles::~FrameFiles() = default;
 
+std::span<const float> FrameFiles::written(std::span<const float> xyz) {
+    const std::span<const float> ordered = writing_.order.points(xyz);
+    if (writing_.space.isTheScenes())
+        return ordered;
+    moved_.assign(ordered.begin(), ordered.end());
+    writing_.space.toCache(moved_);
+    return moved_;
+}
+
 void FrameFiles::add(int frame, std::span<const float> xyz) {
     if (cache_)
-        cache_->append(order_.points(xyz));
+        cache_->append(written(xyz));
     else
-        writeMeshFile(frameFile(pattern_, frame), order_.points(xyz), polygons_);
+        writeMeshFile(frameFile(pattern_, frame), written(xyz), polygons_);
 }
 
 void FrameFiles::finish() {

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "quarn/play/VertexOrder.h"
+#include "quarn/scene/CacheSpace.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/meshes.h"
 
@@ -10,9 +11,10 @@
 #include <memory>
 #include <span>
 #include <string>
+#include <vector>
 
 namespace storage {
-class NpyWriter;
+class PointCacheWriter;
 }
 
 namespace quarn {
@@ -25,24 +27,35 @@ std::filesystem::path frameFile(const std::filesystem::path& pattern, int frame)
 /// several frames. Before anything is played.
 void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& frames);
 
+/// How frames are written.
+struct FrameWriting {
+    VertexOrder order;
+    CacheSpace space;
+    FrameRange frames;             ///< all that are going to be added
+    double framesPerSecond = 24.0; ///< above 0
+};
+
 /// Every file is there as a whole or not at all; of a point cache nothing is left without finish(). Thread: main.
 class FrameFiles {
 public:
     /// `polygons` of the scene's mesh.
-    FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, VertexOrder order);
+    FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, FrameWriting writing);
     ~FrameFiles();
     FrameFiles(const FrameFiles&) = delete;
     FrameFiles& operator=(const FrameFiles&) = delete;
 
-    /// `xyz` in the scene's order. Throws std::runtime_error that names the file.
+    /// `xyz` in the scene's order, space and unit. Throws std::runtime_error that names the file.
     void add(int frame, std::span<const float> xyz);
     void finish();
 
 private:
+    std::span<const float> written(std::span<const float> xyz);
+
     std::filesystem::path pattern_;
-    VertexOrder order_;
+    FrameWriting writing_;
     MeshPolygons polygons_; ///< only for mesh files
-    std::unique_ptr<storage::NpyWriter> cache_;
+    std::unique_ptr<storage::PointCacheWriter> cache_;
+    std::vector<float> moved_;
 };
 
 } // namespace quarn

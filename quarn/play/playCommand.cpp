@@ -16,6 +16,7 @@
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
+#include "storage/CacheFormat.h"
 
 #include <CLI/CLI.hpp>
 
@@ -33,6 +34,7 @@ struct Options {
     ModelOption model;
     std::string deformer, geometry, plug, frames, against;
     std::string order = "scene", evaluator = "cpu", device;
+    CacheSpace space;
     fs::path output, trace;
     int repeats = 1;
 };
@@ -83,6 +85,7 @@ PlayPlan planFor(const Options& options) {
     plan.frames = framesToPlay(options.frames, warp ? &*warp : nullptr);
     plan.repeats = options.repeats;
     plan.output = options.output;
+    plan.space = options.space;
     plan.trace = options.trace;
     plan.isOnGpu = options.evaluator == "gpu";
     plan.model = geometry != nullptr && options.model.isGiven() ? chooseModel(*warp, *geometry, options.model)
@@ -111,9 +114,9 @@ void play(Options& options) {
 void bake(Options& options) {
     watchForInterrupt();
     options.output = absolutePath(options.output);
-    if (options.output.extension() != ".npy")
-        throw UsageError("\"" + options.output.string() +
-                         "\" is no point cache: its name ends in .npy. quarn play writes meshes");
+    if (!storage::cacheFormatOf(options.output))
+        throw UsageError("\"" + options.output.string() + "\" is no point cache: its name ends in " +
+                         storage::cacheEndings + ". quarn play writes meshes");
     const StdoutAside aside;
     SceneSession session(options.scene);
     const PlayPlan plan = planFor(options);
@@ -129,6 +132,7 @@ void addFrameOptions(CLI::App& command, Options& options) {
     command.add_option("--order", options.order, "Order of written vertices: scene, or file as they were imported")
         ->check(CLI::IsMember({"scene", "file"}))
         ->capture_default_str();
+    addCacheSpaceOptions(command, options.space);
 }
 
 void addMeasureOptions(CLI::App& command, Options& options) {
@@ -158,7 +162,9 @@ void addPlayCommand(CLI::App& app) {
     command->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");
     command->add_option("--plug", options->plug, "Play this mesh plug instead of what the deformer gives out");
     addModelOptions(*command, options->model);
-    command->add_option("-o,--output", options->output, "FILE.npy, or FILE.####.obj, .ply, .gltf or .glb")
+    command
+        ->add_option("-o,--output", options->output,
+                     "FILE.npy, .npz, .pc2 or .mdd, or FILE.####.obj, .ply, .gltf or .glb")
         ->type_name("FILE");
     addFrameOptions(*command, *options);
     addMeasureOptions(*command, *options);
@@ -171,7 +177,9 @@ void addBakeCommand(CLI::App& app) {
     CLI::App* command = app.add_subcommand("bake", "Write a mesh plug, frame by frame, to a point cache");
     addSceneOptions(*command, options->scene);
     command->add_option("PLUG", options->plug, "The mesh, as skin.outputGeom[0]")->required();
-    command->add_option("-o,--output", options->output, "The point cache to write")->type_name("FILE.npy")->required();
+    command->add_option("-o,--output", options->output, "The point cache to write: .npy, .npz, .pc2 or .mdd")
+        ->type_name("FILE")
+        ->required();
     addModelOptions(*command, options->model);
     addFrameOptions(*command, *options);
     addConsoleOptions(*command, options->console, false);

@@ -11,6 +11,7 @@
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/units.h"
 #include "storage/WholeFile.h"
 
 #include <memory>
@@ -96,7 +97,9 @@ private:
 
     void write(int frame) {
         if (!files_)
-            files_ = std::make_unique<FrameFiles>(plan_.output, polygonsOf(plan_.mesh), plan_.order);
+            files_ = std::make_unique<FrameFiles>(
+                plan_.output, polygonsOf(plan_.mesh),
+                FrameWriting{plan_.order, plan_.space, plan_.frames, framesPerSecond().value_or(24.0)});
         files_->add(frame, points_);
     }
 

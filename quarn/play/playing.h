@@ -7,6 +7,7 @@
 #include "quarn/play/FrameTimes.h"
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/evaluator.h"
+#include "quarn/scene/CacheSpace.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/useModel.h"
 
@@ -29,6 +30,7 @@ struct PlayPlan {
     int repeats = 1;                        ///< above 0; the first is not timed where there are several
     std::filesystem::path output;           ///< pattern as for FrameFiles; empty: nothing is written
     VertexOrder order;                      ///< of what is written
+    CacheSpace space;                       ///< the same
     bool isOnGpu = false;                   ///< chooseEvaluator() was told so
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none

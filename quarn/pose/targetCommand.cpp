@@ -10,12 +10,11 @@
 #include "quarn/console/numberText.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/pose/targetCache.h"
+#include "quarn/pose/targetFrames.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/training.h"
-#include "quarn/scene/vertexMap.h"
-#include "storage/NpyFile.h"
 
 #include <CLI/CLI.hpp>
 
@@ -32,11 +31,10 @@ namespace fs = std::filesystem;
 struct Options {
     SceneOptions scene;
     fs::path output;
-    fs::path cache;
+    TargetFile file;
     std::string deformer;
     std::string geometry;
     std::optional<double> startFrame;
-    std::string order = "scene";
     Console console;
 };
 
@@ -52,38 +50,28 @@ fs::path pathOfConverted(const Options& options, const WarpGeometry& geometry) {
     fs::path path = options.output;
     path.replace_filename(options.output.stem().string() + "." + geometry.name + "_target.npy");
     std::error_code missing;
-    if (path == options.cache || fs::equivalent(path, options.cache, missing))
-        throw std::runtime_error(path.string() + " would be overwritten by its own conversion: give the cache in the " +
-                                 "file's order another name");
+    if (path == options.file.cache || fs::equivalent(path, options.file.cache, missing))
+        throw std::runtime_error(path.string() + " would be overwritten by its own conversion: give the cache " +
+                                 "another name");
     return path;
 }
 
-Cache inSceneOrder(const storage::NpyFile& file, const Options& options, const WarpGeometry& geometry,
-                   std::size_t vertices) {
-    const std::vector<std::int32_t> map = readVertexMap(geometry.name);
-    requireFit(map, file.vertexCount(), vertices);
-    Cache cache{pathOfConverted(options, geometry), file.frameCount(), true};
-    const double apart = writeInSceneOrder(options.cache, cache.path, map, vertices, options.console);
+void warnOfJoined(const SceneFrames& frames, const Options& options, const WarpGeometry& geometry) {
     constexpr double agrees = 1e-5; // of the mesh's size: what single precision and a solver's noise give
-    if (apart > agrees * diagonalOf(restMesh(geometry)))
+    if (frames.largestDistance() > agrees * diagonalOf(restMesh(geometry)))
         options.console.warn("vertices of the cache that are one vertex of " + geometry.name + " are up to " +
-                             numberText(apart) + " apart; the first of each was taken");
-    return cache;
+                             numberText(frames.largestDistance()) + " apart; the first of each was taken");
 }
 
 Cache fittingCache(const Options& options, const WarpGeometry& geometry) {
-    const Stage stage([&] { return "reading point cache " + options.cache.string() + " for " + geometry.name; });
-    const storage::NpyFile file(options.cache.string());
-    const std::size_t vertices = polygonsOf(restMesh(geometry)).vertexCount;
-    if (file.frameCount() == 0)
-        throw std::runtime_error(options.cache.string() + " has no frames");
-    if (options.order == "file")
-        return inSceneOrder(file, options, geometry, vertices);
-    if (file.vertexCount() != vertices)
-        throw std::runtime_error(options.cache.string() + " has " + std::to_string(file.vertexCount()) +
-                                 " vertices, and " + geometry.name + " has " + std::to_string(vertices) +
-                                 "; --order file takes a cache with the vertices of the character's file");
-    return {options.cache, file.frameCount(), false};
+    const Stage stage([&] { return "reading point cache " + options.file.cache.string() + " for " + geometry.name; });
+    SceneFrames frames = openTargetFrames(options.file, geometry, options.console);
+    if (frames.areTheFiles())
+        return {options.file.cache, frames.frameCount(), false};
+    const fs::path converted = pathOfConverted(options, geometry);
+    writeSceneFrames(frames, converted, options.console);
+    warnOfJoined(frames, options, geometry);
+    return {converted, frames.frameCount(), true};
 }
 
 // while nobody has said which frames to export: those that the cache has
@@ -130,13 +118,16 @@ void printJson(const TargetReport& report, const Cache& cache, const Options& op
 
 void target(Options& options) {
     watchForInterrupt();
-    options.cache = absolutePath(options.cache);
+    options.file.cache = absolutePath(options.file.cache);
     options.output = absolutePath(options.output.empty() ? options.scene.scene : options.output);
     if (options.startFrame && !std::isfinite(*options.startFrame))
         throw UsageError("--start-frame is a finite number");
+    if (options.file.restFrame && options.file.order != "rest")
+        throw UsageError("--rest-frame goes with --order rest");
     SceneSession session(options.scene);
     const Warp warp = Warp::find(options.deformer);
     const WarpGeometry& geometry = warp.geometry(options.geometry);
+    options.file.startFrame = options.startFrame.value_or(numberOf(warp.plug("exportStartFrame")));
     const Cache cache = fittingCache(options, geometry);
     session.moveTo(options.output.parent_path()); // before the cache is named: its path counts from there
     const std::string named = OpenQuarn::pathForScene(cache.path, options.output.parent_path());
@@ -159,15 +150,22 @@ void addTargetCommand(CLI::App& app) {
     const auto options = std::make_shared<Options>();
     CLI::App* command = app.add_subcommand("target", "Make a point cache the target of a deformer");
     addSceneOptions(*command, options->scene);
-    command->add_option("--cache", options->cache, "The points: an .npy of [frames, vertices, 3]")->required();
+    command->add_option("--cache", options->file.cache, "The points, frame by frame: .npy, .npz, .pc2 or .mdd")
+        ->required();
     command->add_option("-o,--output", options->output, "The scene to write; SCENE itself when not given");
     command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     command->add_option("--geometry", options->geometry, "Index or mesh of the geometry, where there are several");
     command->add_option("--start-frame", options->startFrame,
                         "Time of the cache's first frame; the deformer's exportStartFrame when not given");
-    command->add_option("--order", options->order, "Whose vertices the cache has: of the scene's mesh, or of the file")
-        ->check(CLI::IsMember({"scene", "file"}))
+    command
+        ->add_option(
+            "--order", options->file.order,
+            "Whose vertices the cache has: of the scene's mesh, of the file, or those that lie nearest at rest")
+        ->check(CLI::IsMember({"scene", "file", "rest"}))
         ->capture_default_str();
+    command->add_option("--rest-frame", options->file.restFrame,
+                        "Frame of the scene at which the cache is at rest, for --order rest; its first when not given");
+    addCacheSpaceOptions(*command, options->file.space);
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { target(*options); });
 }

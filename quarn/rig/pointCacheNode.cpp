@@ -4,7 +4,7 @@
 #include "openquarn/HFileObject.h"
 #include "openquarn/HFnMesh.h"
 #include "openquarn_helpers/AttributeMaker.h"
-#include "storage/NpyFile.h"
+#include "storage/PointCache.h"
 
 #include <algorithm>
 #include <cmath>
@@ -73,7 +73,7 @@ Place placeAt(double offset, std::size_t frames, bool interpolate) {
 }
 
 /// The points of the file at a place, read in pieces that stay in the cache of the processor.
-HPointArray pointsAt(const storage::NpyFile& file, const Place& place) {
+HPointArray pointsAt(const storage::PointCache& file, const Place& place) {
     constexpr std::size_t pieceSize = 1024;
     std::vector<double> lower(3 * std::min(pieceSize, file.vertexCount()));
     std::vector<double> upper(place.fraction > 0.0 ? lower.size() : 0);
@@ -105,7 +105,7 @@ HDataHandle inputOf(HDataBlock& block, const HObject& attribute) {
 }
 
 /// Throws when the file has no points for the mesh.
-void requireFit(const storage::NpyFile& file, const HObject& mesh) {
+void requireFit(const storage::PointCache& file, const HObject& mesh) {
     if (mesh.isNull())
         throw std::runtime_error("inMesh holds no mesh for '" + file.path() + "', which has points only");
     const auto vertices = static_cast<std::size_t>(HFnMesh(mesh).numVertices());
@@ -162,7 +162,7 @@ void pointCacheNode::openFile(const HString& rawPath) {
     if (file_ && file_->path() == path && storage::identityOf(path) == file_->identity())
         return;
     file_.reset();
-    file_ = std::make_unique<storage::NpyFile>(path);
+    file_ = storage::openPointCache(path);
 }
 
 void pointCacheNode::getExternalContent(HExternalContentInfoTable& table) const {

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The point cache: a mesh with the points of a NumPy file, frame by frame.
+// The point cache: a mesh with the points of a file, frame by frame.
 #pragma once
 
 #include "openquarn/HPxNode.h"
@@ -7,7 +7,7 @@
 #include <memory>
 
 namespace storage {
-class NpyFile;
+class PointCache;
 }
 
 namespace rig {
@@ -46,7 +46,7 @@ private:
     HStatus moveToCache(HDataBlock& block, HObject& mesh);
     void openFile(const HString& rawPath);
 
-    std::unique_ptr<storage::NpyFile> file_; ///< as of the last compute; null before it, and after a failure to open it
+    std::unique_ptr<storage::PointCache> file_; ///< as of the last compute; null before it, and after a failure to open it
 };
 
 } // namespace rig

@@ -1,0 +1,18 @@
+// SPDX-License-Identifier: Apache-2.0
+#pragma once
+
+#include "storage/Descriptor.h"
+#include "storage/zipArchive.h"
+
+#include <cstdint>
+
+namespace storage {
+
+/// A member that says it is larger is refused: a deflated byte can be a thousand.
+inline constexpr std::uint64_t unpackedLimit = std::uint64_t{1} << 32;
+
+/// A file without a name, in the folder for temporary files, with the bytes of a deflated member; member.size of them.
+/// Throws std::runtime_error, with the reason alone, when they are more or fewer, or their sum is another. [any]
+Descriptor unpack(const ZipMember& member);
+
+} // namespace storage

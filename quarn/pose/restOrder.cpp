@@ -1,0 +1,52 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/pose/restOrder.h"
+
+#include "quarn/pose/NearestPoint.h"
+
+#include <algorithm>
+#include <cmath>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+double distance(std::span<const double> a, std::span<const double> b) {
+    return std::hypot(a[0] - b[0], a[1] - b[1], a[2] - b[2]);
+}
+
+[[noreturn]] void refuseTwo(std::size_t first, std::size_t second, std::size_t scene, const std::string& meshName) {
+    throw std::runtime_error("vertices " + std::to_string(first) + " and " + std::to_string(second) +
+                             " of the cache are both nearest to vertex " + std::to_string(scene) + " of " + meshName +
+                             " in its rest pose: the cache is not at rest in that frame, in another space or unit, or "
+                             "vertices of the mesh are in one place");
+}
+
+} // namespace
+
+RestMatch matchByRest(std::span<const double> cache, std::span<const double> rest, const std::string& meshName) {
+    if (cache.size() != rest.size())
+        throw std::runtime_error("the cache has " + std::to_string(cache.size() / 3) + " vertices, and " + meshName +
+                                 " has " + std::to_string(rest.size() / 3));
+    RestMatch match;
+    if (rest.empty())
+        return match;
+    if (const auto bad = std::find_if_not(cache.begin(), cache.end(), [](double x) { return std::isfinite(x); });
+        bad != cache.end())
+        throw std::runtime_error("vertex " + std::to_string((bad - cache.begin()) / 3) +
+                                 " of the cache has a coordinate that is no finite number where it is to be at rest");
+    constexpr std::size_t none = static_cast<std::size_t>(-1);
+    const NearestPoint points(rest);
+    std::vector<std::size_t> cacheVertexOf(rest.size() / 3, none);
+    for (std::size_t vertex = 0; 3 * vertex < cache.size(); ++vertex) {
+        const std::span<const double> point = cache.subspan(3 * vertex, 3);
+        const std::size_t scene = points.nearest(point);
+        if (cacheVertexOf[scene] != none)
+            refuseTwo(cacheVertexOf[scene], vertex, scene, meshName);
+        cacheVertexOf[scene] = vertex;
+        match.sceneVertexOf.push_back(static_cast<std::int32_t>(scene));
+        match.largestDistance = std::max(match.largestDistance, distance(point, rest.subspan(3 * scene, 3)));
+    }
+    return match;
+}
+
+} // namespace quarn
