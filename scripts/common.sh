@@ -32,7 +32,7 @@ declare -A probe_of=(
   [libgmock-dev]=gmock/gmock.h
   [libeigen3-dev]=eigen3/Eigen/Core
   [libassimp-dev]=assimp/Importer.hpp
-  [zlib1g-dev]=/usr/include/zlib.h # what Assimp's own configuration links
+  [zlib1g-dev]=/usr/include/zlib.h # for compressed NumPy arrays; and Assimp's own configuration links it
   [libembree-dev]=embree3/rtcore.h
   [libstb-dev]=stb/stb_image_write.h
   [ocl-icd-opencl-dev]=CL/cl.h
@@ -51,6 +51,7 @@ declare -A probe_of=(
   [python3-matplotlib]=/usr/lib/python3/dist-packages/matplotlib/__init__.py
   [python3-pil]=/usr/lib/python3/dist-packages/PIL/__init__.py
   [libopenblas0-pthread]=/usr/lib/*/openblas-pthread/libblas.so.3 # ten times as fast as the reference one
+  [blender]=blender
   [python3-setuptools]=/usr/lib/python3/dist-packages/setuptools/__init__.py
   [python3-wheel]=/usr/lib/python3/dist-packages/wheel/__init__.py
   [python3-venv]=/usr/lib/python3*/ensurepip/__init__.py
@@ -72,6 +73,8 @@ python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-
 # what a wheel of the trainer is made with, and installed in a place of its own
 wheel_packages=(python3-setuptools python3-wheel python3-venv)
 package_packages=(dpkg-dev file)
+# tools that tests go to and come back from; what misses them is skipped, except in continuous integration
+client_packages=(blender python3-numpy)
 check_packages=(git clang-format-14 clang-tidy-14 mypy flake8)
 clang_packages=(clang-14 libclang-rt-14-dev llvm-14)
 

@@ -4,6 +4,7 @@
 #include "MemoryFile.h"
 #include "require.h"
 #include "storage/NpyFile.h"
+#include "storage/npyHeader.h"
 
 #include <optional>
 #include <stdexcept>

@@ -9,10 +9,8 @@
 #include "storage/finite.h"
 #include "storage/npyArray.h"
 
-#include <bit>
 #include <cfloat>
 #include <cmath>
-#include <random>
 
 namespace {
 
@@ -136,33 +134,6 @@ TEST_F(NpyFiles, AFileThatIsCutWhileItIsOpenIsAnError) {
     EXPECT_THROW(file.read(2, 0, std::span(two).first(3)), std::out_of_range);
     EXPECT_THROW(file.read(0, 0, two), std::out_of_range);
     EXPECT_THROW(file.read(0, 2, {}), std::out_of_range);
-}
-
-TEST_F(NpyFiles, WhatIsWrittenIsReadBackToTheBit) {
-    std::mt19937 random(20);
-    const auto anyFloat = [&] { return std::bit_cast<float>(static_cast<std::uint32_t>(random()) & 0xFF7FFFFFU); };
-    for (const std::size_t frames : {0U, 1U, 3U})
-        for (const std::size_t vertices : {0U, 1U, 5U, 4096U, 4097U, 10000U}) {
-            SCOPED_TRACE(std::to_string(frames) + " frames, " + std::to_string(vertices) + " vertices");
-            std::vector<std::vector<float>> given(frames, std::vector<float>(3 * vertices));
-            NpyWriter writer(path(), vertices);
-            for (std::vector<float>& frame : given) {
-                std::generate(frame.begin(), frame.end(), anyFloat);
-                writer.append(frame);
-            }
-            writer.finish();
-            const NpyFile file(path());
-            ASSERT_EQ(file.frameCount(), frames);
-            ASSERT_EQ(file.vertexCount(), vertices);
-            for (std::size_t frame = 0; frame < frames; ++frame)
-                EXPECT_EQ(frameOf(file, frame), std::vector<double>(given[frame].begin(), given[frame].end()));
-            if (frames > 1 && vertices > 4) { // a part of a frame that is not the first
-                double part[6];
-                file.read(1, 2, part);
-                EXPECT_TRUE(std::equal(std::begin(part), std::end(part), given[1].begin() + 6));
-            }
-        }
-    EXPECT_EQ(names().size(), 1U);
 }
 
 TEST_F(NpyFiles, NobodySeesAPartOfAFile) {

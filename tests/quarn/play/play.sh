@@ -50,7 +50,7 @@ expect 1 '' 'no OpenCL device "no such thing": ' play "$scene" --evaluator gpu -
 expect 2 '' '--device 0 goes with --evaluator gpu' play "$scene" --device 0
 OCL_ICD_VENDORS=$work/none expect 0 'no OpenCL device' '' info --devices
 expect 2 '' 'put #### where' play "$scene" --frames 1-3 -o "$work/a.obj"
-expect 2 '' '\.npy, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
+expect 2 '' '\.mdd, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
 expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
 expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
 expect 1 '' 'no node of type character' bake "$scene" strip.outMesh --frames 1 --order file -o "$work/lost.npy"

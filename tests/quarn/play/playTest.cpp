@@ -4,6 +4,7 @@
 #include "quarn/play/FrameFiles.h"
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/meshFiles.h"
+#include "storage/PointCache.h"
 #include "support/TemporaryFolder.h"
 #include "support/failureOf.h"
 
@@ -135,6 +136,31 @@ TEST(FrameFiles, AreNamedByTheFrame) {
     EXPECT_EQ(frameFile("a#/b.##.obj", 123), "a#/b.123.obj");
     EXPECT_EQ(frameFile("b#.obj", -7), "b-7.obj");
     EXPECT_EQ(frameFile("b.obj", 7), "b.obj");
+}
+
+// y of the scene is z of the file, and its unit a hundredth
+TEST(FrameFiles, AreWrittenInTheSpaceThatIsAskedFor) {
+    const TemporaryFolder folder;
+    const FrameWriting writing{VertexOrder({1, 0}, 2), {"z", 0.01}, {3, 7, 4}, 25.0};
+    const std::vector<float> xyz{1, 2, 3, 4, 5, 6};
+    for (const char* name : {"cache.npy", "cache.npz", "cache.pc2", "cache.mdd"}) {
+        SCOPED_TRACE(name);
+        const std::string path = folder.path() / name;
+        FrameFiles files(path, {2, {2}, {0, 1}}, writing);
+        files.add(3, xyz);
+        files.add(7, std::vector<float>(6));
+        files.finish();
+        const auto cache = storage::openPointCache(path);
+        ASSERT_EQ(cache->frameCount(), 2U);
+        std::vector<double> read(6);
+        cache->read(0, 0, read);
+        EXPECT_THAT(read, ElementsAre(400, -600, 500, 100, -300, 200));
+        EXPECT_EQ(cache->firstFrame().value_or(3.0), 3.0);
+        EXPECT_EQ(cache->frameStep().value_or(4.0), 4.0);
+        EXPECT_NEAR(cache->secondsOf(1).value_or(0.28), 0.28, 1e-6);
+    }
+    FrameFiles files(folder.path() / "#.obj", {2, {2}, {0, 1}}, {{}, {"y", 1e-39}, {1, 1, 1}});
+    EXPECT_THAT(failureOf([&] { files.add(1, xyz); }), HasSubstr("vertex 0 is too far away"));
 }
 
 } // namespace

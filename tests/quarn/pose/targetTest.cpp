@@ -2,6 +2,7 @@
 // quarn target: caches that fit, caches that do not, and vertices that a scene has joined.
 #include "PoseTest.h"
 
+#include "quarn/pose/SceneFrames.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/vertexMap.h"
@@ -124,8 +125,13 @@ TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
     points[3 * vertices] = 0.125F; // joined with vertex 0, at a distance
     points[3 * vertices + 1] = points[3 * vertices + 2] = 0.0F;
     writeRawCache(path("file.npy"), {points});
-    const std::vector<std::int32_t> map = reversedMap();
-    EXPECT_EQ(quarn::writeInSceneOrder(path("file.npy"), path("scene.npy"), map, vertices, {true, false}), 0.125);
+    const auto apart = [&] {
+        quarn::SceneFrames frames(storage::openPointCache(path("file.npy")), {});
+        frames.reorder(reversedMap(), vertices);
+        quarn::writeSceneFrames(frames, path("scene.npy"), {true, false});
+        return frames.largestDistance();
+    };
+    EXPECT_EQ(apart(), 0.125);
     const storage::NpyFile converted(path("scene.npy"));
     ASSERT_EQ(converted.vertexCount(), vertices);
     std::vector<double> xyz(3 * vertices);
@@ -137,8 +143,7 @@ TEST_F(TargetTest, CachesInTheFilesOrderAreBroughtIntoTheScenes) {
 
     points[3 * vertices] = std::nanf("");
     writeRawCache(path("file.npy"), {points});
-    EXPECT_TRUE(
-        std::isinf(quarn::writeInSceneOrder(path("file.npy"), path("scene.npy"), map, vertices, {true, false})));
+    EXPECT_TRUE(std::isinf(apart()));
 }
 
 TEST_F(TargetTest, TheCommandFindsTheMapOfTheCharacter) {

@@ -102,6 +102,17 @@ TEST_F(PointCache, FollowsTheSceneAndKeepsPolygonsAndTags) {
     EXPECT_EQ(points().front(), HPoint(1, 0, 0));
 }
 
+TEST_F(PointCache, PlaysEveryFormat) {
+    for (const char* name : {"cache.npz", "cache.pc2", "cache.mdd"}) {
+        const auto writer = storage::createPointCache(path(name), 4, {.frameCount = 2});
+        writer->append(std::vector<float>(12, 3.0F));
+        writer->append(std::vector<float>(12, 4.0F));
+        writer->finish();
+        plug("cache.cacheFile").setString(path(name));
+        EXPECT_EQ(pointAt(1.5), HPoint(3.5, 3.5, 3.5)) << name;
+    }
+}
+
 TEST_F(PointCache, ReadsInPiecesWhatIsLarge) {
     constexpr unsigned columns = 3, rows = 1001;
     plug("base.inMesh").setHObject(testDeformers::grid(columns, rows));
