@@ -75,7 +75,7 @@ TEST_F(ForeignCacheTest, OfAnyFormatIsBroughtIntoTheScene) {
                                        "0.01", "--order", "rest", "--start-frame", "5", "--rest-frame", "6", "--json",
                                        "-o", path("posed.json")}),
                     HasSubstr("\"converted\": true"));
-        const auto session = open();
+        auto session = open();
         const std::pair<double, std::size_t> shown[] = {{5, 2}, {6, 0}, {7, 1}};
         for (const auto& [time, frame] : shown) {
             const Frame got = pointsIn(*session, time, "strip_target.outMesh"), wanted = sceneFrame(frame);
@@ -83,6 +83,7 @@ TEST_F(ForeignCacheTest, OfAnyFormatIsBroughtIntoTheScene) {
             for (std::size_t i = 0; i < got.size(); ++i)
                 EXPECT_NEAR(got[i], wanted[i], 1e-6) << time << ", " << i;
         }
+        session.reset(); // one at a time
         // what is the scene's already is played as it is, in every format
         const std::string own = cache(std::string("own") + name, {sceneFrame(0), sceneFrame(1)});
         EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", own, "--order", "rest", "--axes", "y", "--json",
@@ -108,7 +109,7 @@ TEST_F(ForeignCacheTest, ThatCannotBeMatchedIsRefused) {
         {{"--cache", one, "--rest-frame", "1"}, {"--rest-frame goes with --order rest"}},
         {{"--cache", one, "--scale", "0"}, {"--scale", "above 0", "'0'"}},
         {{"--cache", one, "--scale", "inf"}, {"--scale", "'inf'"}},
-        {{"--cache", one, "--scale", "1e300"}, {"vertex 0 of its frame 0", "finite"}},
+        {{"--cache", one, "--scale", "1e300"}, {"of its frame 0", "finite"}},
         {{"--cache", one, "--axes", "x"}, {"--axes"}},
     };
     for (const auto& row : rows) {
