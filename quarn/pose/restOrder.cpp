@@ -34,7 +34,7 @@ RestMatch matchByRest(std::span<const double> cache, std::span<const double> res
         bad != cache.end())
         throw std::runtime_error("vertex " + std::to_string((bad - cache.begin()) / 3) +
                                  " of the cache has a coordinate that is no finite number where it is to be at rest");
-    constexpr std::size_t none = static_cast<std::size_t>(-1);
+    constexpr auto none = static_cast<std::size_t>(-1);
     const NearestPoint points(rest);
     std::vector<std::size_t> cacheVertexOf(rest.size() / 3, none);
     for (std::size_t vertex = 0; 3 * vertex < cache.size(); ++vertex) {

@@ -44,7 +44,7 @@ protected:
     /// Why the bytes are refused as a file of that ending.
     std::string refusal(const std::string& bytes, const std::string& ending) const {
         put("cache" + ending, bytes);
-        const std::string why = errorOf([&] { openPointCache(path("cache" + ending)); });
+        const std::string why = failureOf([&] { openPointCache(path("cache" + ending)); });
         EXPECT_THAT(why, HasSubstr("point cache '" + path("cache" + ending) + "' cannot be read: "));
         return why;
     }
@@ -135,7 +135,7 @@ TEST_F(PointCaches, ThatAreNotWhatTheySayAreRefused) {
     EXPECT_THAT(refusal("", ".abc"), HasSubstr(".npy, .npz, .pc2 or .mdd"));
     put("cache.mdd", with(mdd, 12, std::string("\x7f\xc0\0\0", 4)));
     const auto cache = openPointCache(path("cache.mdd"));
-    EXPECT_THAT(errorOf([&] { static_cast<void>(cache->secondsOf(1)); }),
+    EXPECT_THAT(failureOf([&] { static_cast<void>(cache->secondsOf(1)); }),
                 HasSubstr("time of its frame 1 is no finite number"));
 }
 
@@ -178,11 +178,12 @@ TEST_F(PointCaches, ThatCannotBeWrittenLeaveNothing) {
     const CacheTiming timing{.frameCount = 2};
     const auto writer = storage::createPointCache(path("short.mdd"), 1, timing);
     writer->append(std::vector<float>{1, 2, 3});
-    EXPECT_THAT(errorOf([&] { writer->finish(); }), AllOf(HasSubstr("2 frames"), HasSubstr("has got 1")));
+    EXPECT_THAT(failureOf([&] { writer->finish(); }), AllOf(HasSubstr("2 frames"), HasSubstr("has got 1")));
     for (const char* ending : {".pc2", ".mdd"})
-        EXPECT_THAT(errorOf([&] { storage::createPointCache(path(std::string("large") + ending), 1U << 31U, timing); }),
-                    AllOf(HasSubstr("large"), HasSubstr("2147483648 vertices"), HasSubstr("2147483647")));
-    EXPECT_THAT(errorOf([&] { storage::createPointCache(path("cache.abc"), 1, timing); }),
+        EXPECT_THAT(
+            failureOf([&] { storage::createPointCache(path(std::string("large") + ending), 1U << 31U, timing); }),
+            AllOf(HasSubstr("large"), HasSubstr("2147483648 vertices"), HasSubstr("2147483647")));
+    EXPECT_THAT(failureOf([&] { storage::createPointCache(path("cache.abc"), 1, timing); }),
                 AllOf(HasSubstr("cache.abc"), HasSubstr(".npy, .npz, .pc2 or .mdd")));
     EXPECT_FALSE(std::filesystem::exists(path("short.mdd")));
 }
