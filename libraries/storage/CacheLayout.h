@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 // Where in a file the points of a cache lie, as its head says it. A format a function, which gets the open file and
 // throws std::runtime_error, with the reason alone, when the file is none of the kind or its size is not what its head
-// says: whoever has a layout can read every point of it. Nothing is sized by a number of the file before that.
+// says: whoever has a layout can read every point of it. Nothing is sized by a number of the file before that
+// (decision 0167).
 #pragma once
 
 #include "storage/Descriptor.h"

@@ -4,7 +4,9 @@
 #include "quarn/pose/NearestPoint.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
+#include <numeric>
 #include <stdexcept>
 
 namespace quarn {
@@ -17,8 +19,24 @@ double distance(std::span<const double> a, std::span<const double> b) {
 [[noreturn]] void refuseTwo(std::size_t first, std::size_t second, std::size_t scene, const std::string& meshName) {
     throw std::runtime_error("vertices " + std::to_string(first) + " and " + std::to_string(second) +
                              " of the cache are both nearest to vertex " + std::to_string(scene) + " of " + meshName +
-                             " in its rest pose: the cache is not at rest in that frame, in another space or unit, or "
-                             "vertices of the mesh are in one place");
+                             " in its rest pose: the cache is not at rest in that frame, or in another space or unit");
+}
+
+constexpr auto none = static_cast<std::size_t>(-1);
+
+/// Of each vertex, the next one that is in exactly its place; none for the last one there.
+std::vector<std::size_t> nextInPlace(std::span<const double> xyz) {
+    std::vector<std::size_t> order(xyz.size() / 3);
+    std::iota(order.begin(), order.end(), std::size_t{0});
+    const auto place = [&](std::size_t vertex) {
+        return std::array{xyz[3 * vertex], xyz[3 * vertex + 1], xyz[3 * vertex + 2]};
+    };
+    std::stable_sort(order.begin(), order.end(), [&](std::size_t a, std::size_t b) { return place(a) < place(b); });
+    std::vector<std::size_t> next(order.size(), none);
+    for (std::size_t i = 1; i < order.size(); ++i)
+        if (place(order[i - 1]) == place(order[i]))
+            next[order[i - 1]] = order[i];
+    return next;
 }
 
 } // namespace
@@ -34,14 +52,19 @@ RestMatch matchByRest(std::span<const double> cache, std::span<const double> res
         bad != cache.end())
         throw std::runtime_error("vertex " + std::to_string((bad - cache.begin()) / 3) +
                                  " of the cache has a coordinate that is no finite number where it is to be at rest");
-    constexpr auto none = static_cast<std::size_t>(-1);
     const NearestPoint points(rest);
+    const std::vector<std::size_t> next = nextInPlace(rest);
     std::vector<std::size_t> cacheVertexOf(rest.size() / 3, none);
     for (std::size_t vertex = 0; 3 * vertex < cache.size(); ++vertex) {
         const std::span<const double> point = cache.subspan(3 * vertex, 3);
-        const std::size_t scene = points.nearest(point);
-        if (cacheVertexOf[scene] != none)
-            refuseTwo(cacheVertexOf[scene], vertex, scene, meshName);
+        const std::size_t nearest = points.nearest(point);
+        std::size_t scene = nearest; // the first in its place
+        while (scene != none && cacheVertexOf[scene] != none)
+            scene = next[scene];
+        if (scene == none)
+            refuseTwo(cacheVertexOf[nearest], vertex, nearest, meshName);
+        if (scene != nearest && !match.guessed)
+            match.guessed = {nearest, scene};
         cacheVertexOf[scene] = vertex;
         match.sceneVertexOf.push_back(static_cast<std::int32_t>(scene));
         match.largestDistance = std::max(match.largestDistance, distance(point, rest.subspan(3 * scene, 3)));

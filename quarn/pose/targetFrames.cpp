@@ -42,6 +42,11 @@ void orderByRest(SceneFrames& frames, const TargetFile& file, const WarpGeometry
     RestMatch match = matchByRest(atRest, rest, geometry.name);
     console.note("matched " + std::to_string(match.sceneVertexOf.size()) + " vertices of the cache with those of " +
                  geometry.name + " at rest, at most " + numberText(match.largestDistance) + " apart");
+    if (match.guessed)
+        console.warn("vertices " + std::to_string(match.guessed->first) + " and " +
+                     std::to_string(match.guessed->second) + " of " + geometry.name +
+                     " are in one place at rest, and others may be: which of the cache's is which is a guess, by their "
+                     "order there");
     frames.reorder(std::move(match.sceneVertexOf), rest.size() / 3);
 }
 
@@ -59,14 +64,14 @@ SceneFrames openTargetFrames(const TargetFile& file, const WarpGeometry& geometr
     SceneFrames frames(storage::openPointCache(file.cache.string()), file.space);
     if (frames.frameCount() == 0)
         throw std::runtime_error(file.cache.string() + " has no frames");
-    for (const std::string& sentence : cacheTimesNotes(frames.cache(), file.startFrame, framesPerSecond()))
-        console.note(sentence);
     const std::size_t vertices = polygonsOf(restMesh(geometry)).vertexCount;
     if (file.order == "file")
         orderAsFile(frames, geometry, vertices);
     else if (file.order == "rest")
         orderByRest(frames, file, geometry, console);
     requireSameVertices(frames, file, geometry, vertices);
+    for (const std::string& sentence : cacheTimesNotes(frames.cache(), file.startFrame, framesPerSecond()))
+        console.note(sentence);
     return frames;
 }
 

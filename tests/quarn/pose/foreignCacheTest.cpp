@@ -4,6 +4,7 @@
 
 #include "quarn/pose/NearestPoint.h"
 #include "quarn/pose/cacheTimes.h"
+#include "quarn/pose/restOrder.h"
 #include "quarn/scene/meshes.h"
 #include "storage/PointCacheWriter.h"
 #include "storage/mddHead.h"
@@ -117,6 +118,14 @@ TEST_F(ForeignCacheTest, ThatCannotBeMatchedIsRefused) {
         for (const char* part : row.says)
             EXPECT_THAT(said, HasSubstr(part));
     }
+}
+
+TEST(MatchByRest, TakesVerticesInOnePlaceInTheirOrder) {
+    const Frame rest{0, 0, 0, 5, 0, 0, 5, 0, 0, 0, 7, 0}, cache{5, 0, 0, 0, 7.25, 0, 5, 0, 0, 0, 0, 0};
+    const quarn::RestMatch match = quarn::matchByRest(cache, rest, "strip");
+    EXPECT_THAT(match.sceneVertexOf, ElementsAre(1, 3, 2, 0));
+    EXPECT_EQ(match.largestDistance, 0.25);
+    EXPECT_EQ(match.guessed, std::pair(std::size_t{1}, std::size_t{2}));
 }
 
 TEST(NearestPoint, IsWhatLookingAtAllFinds) {
