@@ -75,6 +75,16 @@ TEST_F(PointCaches, OfOtherProgramsAreRead) {
     }
 }
 
+// nobody here looks at the sum of a stored array, and NumPy does
+TEST_F(PointCaches, OfNumPyHaveItsSum) {
+    const auto writer = storage::createPointCache(path("own.npz"), 2, {.frameCount = 2});
+    writer->append(std::vector<float>{1, 2.5, -3, 0.1F, 5, 6});
+    writer->append(std::vector<float>{4, 5, 0.1F, 7, 8, -9});
+    writer->finish();
+    const auto sum = [](const std::string& bytes) { return storage::littleAt<std::uint32_t>(bytes, 14); };
+    EXPECT_EQ(sum(content("own.npz")), sum(foreign("accepted_npz_stored")));
+}
+
 // nowhere is a byte missing or too many without a word
 TEST_F(PointCaches, CutShortOrLongerAreRefused) {
     for (const auto& [seed, ending] : foreignFiles) {
