@@ -40,15 +40,15 @@ public:
                                 bool isFallback) = 0;
 
     /// The one that is on; null for none. Thread: any.
-    static GeometryDevice* current() noexcept { return current_.load(std::memory_order_relaxed); }
+    static GeometryDevice* current() noexcept { return inUse.load(std::memory_order_relaxed); }
     /// `device` null, or one that lasts as long as the process. Thread: main, outside of evaluations.
-    static void setCurrent(GeometryDevice* device) noexcept { current_ = device; }
+    static void setCurrent(GeometryDevice* device) noexcept { inUse = device; }
 
 protected:
     ~GeometryDevice() = default;
 
 private:
-    static inline std::atomic<GeometryDevice*> current_{nullptr};
+    static inline std::atomic<GeometryDevice*> inUse{nullptr};
 };
 
 } // namespace OpenQuarn

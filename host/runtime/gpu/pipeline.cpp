@@ -96,7 +96,7 @@ bool isAccepted(GpuGeometry& gpu, const NodeData& data, HDataBlock& block, const
     return isAccepted && gpu.traits.output == HPxGeometryFilter::outputGeom;
 }
 
-class Pipeline final : public GeometryDevice {
+class Pipeline final : public GeometryDevice { // NOLINT(cppcoreguidelines-virtual-class-destructor): final
 public:
     std::shared_ptr<MeshData> evaluate(NodeData& data, unsigned index, bool& failed) override;
     void evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index, const HStatus& status,
