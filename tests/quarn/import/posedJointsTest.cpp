@@ -93,5 +93,15 @@ TEST(PosedJoints, ThoseLeftOutAreTold) {
                                        "no controls of joints that the animation does not turn: root, prop"}));
 }
 
+// 0.3 radians are 17.18873 degrees: what is written takes in what was meant
+TEST(PosedJoints, LimitsAreWrittenWithoutGettingSmaller) {
+    JointLimits limits;
+    limits[0] = {-0.3, 0.3};
+    limits[2] = {-30.0 * degree, 0.0};
+    std::string text = limitsText({{"a \"b\"", limits}});
+    text.erase(std::remove_if(text.begin(), text.end(), [](char c) { return c == ' ' || c == '\n'; }), text.end());
+    EXPECT_EQ(text, R"({"a\"b\"":{"rotateX":[-17.1888,17.1888],"rotateZ":[-30.0,0.0]}})");
+}
+
 } // namespace
 } // namespace quarn
