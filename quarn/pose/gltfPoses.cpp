@@ -2,7 +2,6 @@
 #include "quarn/pose/gltfPoses.h"
 
 #include "quarn/pose/GltfSkeleton.h"
-#include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 
 #include <cmath>
@@ -99,9 +98,9 @@ private:
                 notes_.push_back("the mesh " + skin.mesh + " " + why + ", and is left out");
                 continue;
             }
-            if (nodeType(skin.input.source().node()) != "mesh")
-                notes_.push_back(std::string(skin.input.source().name().asChar()) +
-                                 " is in the file as it is now: what moves it before its skin is left out");
+            if (skin.isMoved)
+                notes_.push_back("the mesh " + skin.mesh + " is in the file as it comes into " + skin.node +
+                                 " now: what moves it before is left out");
             skeleton_.meshes.push_back(addSkinned(skin, restWorlds_, skeleton_.numbers));
         }
         if (skeleton_.meshes.empty())

@@ -12,20 +12,6 @@ std::string element(const std::string& array, unsigned index) {
     return array + "[" + std::to_string(index) + "]";
 }
 
-// the mesh node that a chain of deformers begins with: upwards by the geometry that each one gets
-std::string nameOfSource(const HPlug& from, unsigned index) {
-    HPlug plug = from;
-    for (int steps = 0; steps < 1000 && !plug.isNull(); ++steps) {
-        const HObject node = plug.node();
-        if (nodeType(node) == "mesh" || nodeType(node) == "polyGrid")
-            return nodeName(node);
-        if (!plug.isElement())
-            break;
-        plug = sourceOf(node, element("input", plug.logicalIndex()) + ".inputGeometry");
-    }
-    return "geometry" + std::to_string(index);
-}
-
 WarpGeometry geometryOf(const HObject& node, unsigned index) {
     WarpGeometry geometry;
     geometry.index = index;
@@ -35,7 +21,8 @@ WarpGeometry geometryOf(const HObject& node, unsigned index) {
     geometry.original = plugOf(node, element("originalGeometry", index));
     geometry.output = plugOf(node, element("outputGeom", index));
     geometry.target = sourceOf(node, element("targetGeometry", index));
-    geometry.name = nameOfSource(geometry.input, index);
+    const HObject mesh = meshBehind(geometry.input);
+    geometry.name = mesh.isNull() ? "geometry" + std::to_string(index) : nodeName(mesh);
     return geometry;
 }
 
@@ -61,6 +48,19 @@ HObject chosenDeformer(const std::string& name) {
 }
 
 } // namespace
+
+HObject meshBehind(const HPlug& geometry) {
+    HPlug plug = geometry;
+    for (int steps = 0; steps < 1000 && !plug.isNull(); ++steps) {
+        HObject node = plug.node();
+        if (nodeType(node) == "mesh" || nodeType(node) == "polyGrid")
+            return node;
+        if (!plug.isElement())
+            break;
+        plug = sourceOf(node, element("input", plug.logicalIndex()) + ".inputGeometry");
+    }
+    return {};
+}
 
 Warp Warp::find(const std::string& name) {
     Warp warp;

@@ -39,4 +39,8 @@ struct Warp {
     HPlug plug(const std::string& array, const WarpGeometry& geometry, const std::string& child) const;
 };
 
+/// The mesh node that a chain of deformers begins with, which gives out this plug: upwards by the geometry that each
+/// one gets. Null when there is none. Thread: main.
+HObject meshBehind(const HPlug& geometry);
+
 } // namespace quarn

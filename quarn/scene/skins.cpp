@@ -3,6 +3,7 @@
 
 #include "openquarn/HFnAttribute.h"
 #include "openquarn/HFnData.h"
+#include "quarn/scene/Warp.h"
 #include "quarn/scene/plugs.h"
 
 #include <stdexcept>
@@ -51,7 +52,9 @@ void addSkin(const HObject& node, unsigned geometry, const std::vector<SceneJoin
     if (source.isNull() || skin.weights.vertexCount() == 0)
         return;
     skin.node = nodeName(node);
-    skin.mesh = nodeName(source.node());
+    const HObject mesh = meshBehind(source);
+    skin.isMoved = mesh != source.node();
+    skin.mesh = nodeName(mesh.isNull() ? source.node() : mesh);
     for (const std::uint32_t index : skin.weights.joints)
         skin.influences.push_back(influenceOf(node, index, joints));
     skins.push_back(std::move(skin));

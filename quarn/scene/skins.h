@@ -10,9 +10,10 @@ namespace quarn {
 
 /// A geometry of a skinCluster.
 struct SceneSkin {
-    std::string node; ///< the skinCluster
-    std::string mesh; ///< name of the node that the geometry comes from
-    HPlug input;      ///< the mesh as it comes into the skin, in the space of the world
+    std::string node;     ///< the skinCluster
+    std::string mesh;     ///< name of the mesh node that the geometry comes from, or of the node that gives it out
+    bool isMoved = false; ///< something deforms it before the skin does
+    HPlug input;          ///< the mesh as it comes into the skin, in the space of the world
     rig::SkinWeights weights;
     /// What moves the vertices, by position in weights.joints; see below for one that is no joint.
     struct Influence {

@@ -148,7 +148,9 @@ TEST_F(WritePosesTest, AnotherReaderFindsTheSameSkeleton) {
 
 TEST_F(WritePosesTest, FramesKeepTheirNumbersUnlessTheyAreMoved) {
     stripScene::write(scene(), "createNode animCurve -name wag; setAttr wag.keyTimes 1 9; setAttr wag.keyValues 0 1\n"
-                               "connectAttr time1.outTime wag.time; connectAttr wag.output root.translateY\n");
+                               "connectAttr time1.outTime wag.time; connectAttr wag.output root.translateY\n"
+                               "createNode sliders -name face; setAttr face.slider[2].sliderName jaw\n"
+                               "connectAttr wag.output face.slider[2].value\n");
     EXPECT_THAT(poseFailure({"--samples", "3", "--start", "-4", "--write", path("p.glb")}),
                 HasSubstr("frame -4 would lie at second -0.208333"));
     EXPECT_FALSE(std::filesystem::exists(path("posed.json")));
@@ -158,12 +160,15 @@ TEST_F(WritePosesTest, FramesKeepTheirNumbersUnlessTheyAreMoved) {
     const std::string before = bytes(scene());
     stripScene::quarn({"pose", scene(), "--write", path("p.csv"), "--frame-offset", "-1", "--frames", "2-8x3"});
     EXPECT_EQ(bytes(scene()), before);
-    EXPECT_THAT(bytes(path("p.csv")),
-                StartsWith("frame,root.translateX,root.translateY,root.translateZ,middle.rotateX,middle.rotateY,"
-                           "middle.rotateZ,tip.rotateZ\n1,0,0.125,0,0,0,0,0\n4,0,0.5,0,"));
+    EXPECT_THAT(
+        bytes(path("p.csv")),
+        StartsWith("frame,root.translateX,root.translateY,root.translateZ,face.jaw,middle.rotateX,middle.rotateY,"
+                   "middle.rotateZ,tip.rotateZ\n1,0,0.125,0,0.125,0,0,0,0\n4,0,0.5,0,0.5,"));
     stripScene::quarn({"pose", scene(), "--write", path("p.json")}); // from the first key to the last
     EXPECT_THAT(bytes(path("p.json")), HasSubstr("\"root.translateY\": [[1, 0], [2, 0.125], "));
     EXPECT_THAT(bytes(path("p.json")), HasSubstr("\"tip.rotateZ\": [[1, 0], [9, 0]]"));
+    stripScene::quarn({"pose", scene(), "-o", path("keyed.json"), "--keys", path("p.json")});
+    EXPECT_EQ(at(*open("keyed.json"), 5, "face.slider[2].value"), 0.5); // by its name
 }
 
 // the plain formula: positions and Rz * Rx * Ry of every joint, down the hierarchy as it stands in the file
