@@ -5,10 +5,23 @@
 #include <rapidjson/memorystream.h>
 
 #include <algorithm>
+#include <array>
 #include <cstdint>
 
 namespace storage {
 namespace {
+
+constexpr std::string_view letters = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+constexpr unsigned char noDigit = 64;
+
+// of every byte what it stands for as a letter
+std::array<unsigned char, 256> digitsOf() {
+    std::array<unsigned char, 256> digits{};
+    digits.fill(noDigit);
+    for (std::size_t i = 0; i < letters.size(); ++i)
+        digits.at(static_cast<unsigned char>(letters[i])) = static_cast<unsigned char>(i);
+    return digits;
+}
 
 struct NoOutput {
     void Put(char) {}
@@ -29,7 +42,6 @@ bool isUtf8(std::string_view text) {
 }
 
 std::string base64(std::string_view bytes) {
-    constexpr std::string_view letters = "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
     std::string text;
     text.reserve((bytes.size() + 2) / 3 * 4);
     for (std::size_t at = 0; at < bytes.size(); at += 3) {
@@ -41,6 +53,30 @@ std::string base64(std::string_view bytes) {
             text += i <= there ? letters[(group >> (18U - 6U * i)) & 63U] : '=';
     }
     return text;
+}
+
+std::optional<std::string> fromBase64(std::string_view text) {
+    static const std::array<unsigned char, 256> digits = digitsOf();
+    for (int padding = 0; padding < 2 && text.size() % 4 == 0 && text.ends_with('='); ++padding)
+        text.remove_suffix(1);
+    if (text.size() % 4 == 1)
+        return std::nullopt;
+    std::string bytes;
+    bytes.reserve(text.size() / 4 * 3 + 2);
+    std::uint32_t group = 0;
+    unsigned bits = 0;
+    for (const char letter : text) {
+        const unsigned char digit = digits.at(static_cast<unsigned char>(letter));
+        if (digit == noDigit)
+            return std::nullopt;
+        group = group << 6U | digit;
+        bits += 6;
+        if (bits >= 8) {
+            bits -= 8;
+            bytes += static_cast<char>(group >> bits & 0xFFU);
+        }
+    }
+    return bytes;
 }
 
 } // namespace storage

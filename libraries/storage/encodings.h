@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstddef>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -14,5 +15,7 @@ bool isUtf8(std::string_view text);
 
 /// The bytes in base 64, padded with "=" (RFC 4648, section 4). Thread: any.
 std::string base64(std::string_view bytes);
+/// The bytes of such a text; with or without its "=". Nothing when it is no such text. Thread: any.
+std::optional<std::string> fromBase64(std::string_view text);
 
 } // namespace storage

@@ -37,6 +37,14 @@ struct Binding {
     HMatrix inverseBind;     ///< from the mesh's space to that of the joint, at the time of binding
 };
 
+/// A shape that is added to the points of a mesh before the skin moves them: weight * delta.
+struct MorphTarget {
+    std::string name;                    ///< not empty, unique among the targets of the mesh
+    double restWeight = 0.0;             ///< finite
+    std::vector<std::uint32_t> vertices; ///< those that it moves: rising indices into the mesh's `points`
+    std::vector<HVector> deltas;         ///< [vertices.size()], in the mesh's space; finite
+};
+
 /// All that hangs on one node of the file: the parts that a format splits by material are one mesh.
 struct CharacterMesh {
     std::string name;                        ///< not empty, unique among the meshes
@@ -47,6 +55,8 @@ struct CharacterMesh {
     /// skin.
     std::vector<std::vector<Influence>> influences;
     std::vector<Binding> bindings; ///< by rising joint; every joint of an influence has one. Empty: no skin
+    std::vector<MorphTarget>
+        morphTargets; ///< in the file's order; `points` are without them, whatever they weigh at rest
     /// For every vertex of the file, part by part, its index in `points`; see joinVertices().
     std::vector<std::uint32_t> joinedOf;
     /// From the mesh's space to the world's, at rest. It places a mesh without skin; a skin does without it.
@@ -80,10 +90,18 @@ struct JointChannel {
     Track<HVector> scale;
 };
 
+/// The weight of a morph target over time.
+struct MorphChannel {
+    std::uint32_t mesh = 0;   ///< index into Character::meshes
+    std::uint32_t target = 0; ///< index into its morphTargets
+    Track<double> weight;
+};
+
 struct Animation {
     std::string name;     ///< not empty, unique among the animations
     double seconds = 0.0; ///< the time of the last key, 0 or above
     std::vector<JointChannel> channels;
+    std::vector<MorphChannel> morphs;
 };
 
 struct Character {

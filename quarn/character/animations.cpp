@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/animations.h"
 
+#include "quarn/character/morphTargets.h"
 #include "quarn/character/uniqueNames.h"
 
 #include <algorithm>
@@ -54,8 +55,9 @@ double lastKey(const Track<Value>& track) {
 
 class AnimationReader {
 public:
-    AnimationReader(const Skeleton& skeleton, const SourceHints& hints, Character& character)
+    AnimationReader(const Skeleton& skeleton, const MeshIndices& meshes, const SourceHints& hints, Character& character)
         : skeleton_(skeleton)
+        , meshes_(meshes)
         , hints_(hints)
         , character_(character) {}
 
@@ -64,7 +66,10 @@ public:
         animation.name = names_.take(imported.mName.C_Str(), "animation");
         for (unsigned c = 0; c < imported.mNumChannels; ++c)
             readChannel(*imported.mChannels[c], imported.mTicksPerSecond, index, animation);
-        if (animation.channels.empty()) {
+        for (const SourceMorphTrack& track : hints_.morphTracks)
+            if (track.animation == index)
+                readMorphs(track, animation);
+        if (animation.channels.empty() && animation.morphs.empty()) {
             character_.warnings.push_back("the animation \"" + animation.name + "\" moves no joint and is left out");
             return;
         }
@@ -100,7 +105,22 @@ private:
         animation.channels.push_back(std::move(channel));
     }
 
+    void readMorphs(const SourceMorphTrack& track, Animation& animation) {
+        const auto mesh = meshes_.find(track.node);
+        if (mesh == meshes_.end())
+            return; // of a mesh that is left out
+        const std::vector<MorphTarget>& targets = character_.meshes[mesh->second].morphTargets;
+        for (MorphChannel& channel :
+             morphChannels(track, mesh->second, targets.size(),
+                           "the animation \"" + animation.name + "\" of the morph targets of \"" +
+                               character_.meshes[mesh->second].name + "\"")) {
+            animation.seconds = std::max(animation.seconds, lastKey(channel.weight));
+            animation.morphs.push_back(std::move(channel));
+        }
+    }
+
     const Skeleton& skeleton_;
+    const MeshIndices& meshes_;
     const SourceHints& hints_;
     Character& character_;
     UniqueNames names_;
@@ -108,8 +128,9 @@ private:
 
 } // namespace
 
-void readAnimations(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, Character& character) {
-    AnimationReader reader(skeleton, hints, character);
+void readAnimations(const aiScene& scene, const Skeleton& skeleton, const MeshIndices& meshes, const SourceHints& hints,
+                    Character& character) {
+    AnimationReader reader(skeleton, meshes, hints, character);
     for (unsigned a = 0; a < scene.mNumAnimations; ++a)
         reader.read(*scene.mAnimations[a], a);
 }

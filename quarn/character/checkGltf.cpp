@@ -1,12 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/checkGltf.h"
 
+#include "quarn/character/gltfTypes.h"
+
 #include <algorithm>
-#include <array>
 #include <initializer_list>
 #include <limits>
-#include <string_view>
-#include <utility>
 #include <vector>
 
 namespace quarn {
@@ -14,32 +13,6 @@ namespace {
 
 [[noreturn]] void refuse(const std::string& what) {
     throw std::runtime_error(what);
-}
-
-std::uint64_t componentBytes(const JsonValue& accessor, const std::string& owner) {
-    switch (sizeOf(accessor, "componentType", 0, owner)) {
-    case 5120:
-    case 5121:
-        return 1;
-    case 5122:
-    case 5123:
-        return 2;
-    case 5125:
-    case 5126:
-        return 4;
-    default:
-        refuse(owner + ": \"componentType\" is none of glTF's");
-    }
-}
-
-std::uint64_t componentCount(const JsonValue& accessor, const std::string& owner) {
-    static constexpr std::array<std::pair<std::string_view, unsigned>, 7> types{
-        {{"SCALAR", 1}, {"VEC2", 2}, {"VEC3", 3}, {"VEC4", 4}, {"MAT2", 4}, {"MAT3", 9}, {"MAT4", 16}}};
-    const std::string type = textOf(accessor, "type");
-    for (const auto& [name, count] : types)
-        if (type == name)
-            return count;
-    refuse(owner + ": \"type\" is \"" + type + "\", which is none of glTF's");
 }
 
 void checkView(const JsonValue& document, std::size_t index) {
@@ -73,30 +46,73 @@ void checkExtent(const JsonValue& document, const JsonValue& from, std::uint64_t
         refuse(owner + ": " + std::to_string(count) + " elements leave " + element("bufferViews", *index));
 }
 
+// one of the two lists of a sparse accessor: they have a view, and no stride
+void checkSparsePart(const JsonValue& document, const JsonValue& sparse, const char* part, std::uint64_t count,
+                     std::uint64_t size, const std::string& owner) {
+    const JsonValue* from = member(sparse, part);
+    const JsonValue& views = listOf(document, "bufferViews");
+    const auto index =
+        indexOf(from == nullptr ? nullptr : member(*from, "bufferView"), views.Size(), "bufferViews", owner);
+    if (!index)
+        refuse(owner + " is sparse, without \"" + part + "\" in a view");
+    if (member(views[static_cast<rapidjson::SizeType>(*index)], "byteStride") != nullptr)
+        refuse(owner + " is sparse, with a stride");
+    checkExtent(document, *from, count, size, owner);
+}
+
+void checkSparse(const JsonValue& document, const JsonValue& accessor, std::uint64_t size, const std::string& owner) {
+    const JsonValue* sparse = member(accessor, "sparse");
+    if (sparse == nullptr)
+        return;
+    const std::uint64_t changes = sizeOf(*sparse, "count", 0, owner);
+    if (changes > sizeOf(accessor, "count", 0, owner))
+        refuse(owner + " changes more elements than it has");
+    if (changes == 0)
+        return;
+    const JsonValue* indices = member(*sparse, "indices");
+    const std::uint64_t type = indices == nullptr ? 0 : sizeOf(*indices, "componentType", 0, owner);
+    if (type != gltfComponent::unsignedByte && type != gltfComponent::unsignedShort &&
+        type != gltfComponent::unsignedInt)
+        refuse(owner + " is sparse, with indices that are no unsigned whole numbers");
+    checkSparsePart(document, *sparse, "indices", changes, componentBytes(type, owner), owner);
+    checkSparsePart(document, *sparse, "values", changes, size, owner);
+}
+
 void checkAccessor(const JsonValue& document, std::size_t index) {
     constexpr std::uint64_t mostWithoutData = std::uint64_t{1} << 24U;
     const std::string owner = element("accessors", index);
     const JsonValue& accessor = listOf(document, "accessors")[static_cast<rapidjson::SizeType>(index)];
     const std::uint64_t count = sizeOf(accessor, "count", 0, owner);
-    checkExtent(document, accessor, count, componentBytes(accessor, owner) * componentCount(accessor, owner), owner);
+    const std::uint64_t size =
+        componentBytes(sizeOf(accessor, "componentType", 0, owner), owner) * componentCount(accessor, owner);
+    checkExtent(document, accessor, count, size, owner);
     if (member(accessor, "bufferView") == nullptr && count > mostWithoutData)
         refuse(owner + ": " + std::to_string(count) + " elements without data");
+    checkSparse(document, accessor, size, owner);
 }
+
+using namespace gltfComponent;
 
 // what the values of an accessor have to be
 struct Form {
     const char* type;
     std::initializer_list<std::uint64_t> componentTypes;
     const char* text;
+    bool isNumber = true; ///< floats, or whole numbers that stand for -1 ... 1: these have to say so
 };
 
-const Form positionForm{"VEC3", {5126}, "floats by threes"};
-const Form jointForm{"VEC4", {5121, 5123}, "unsigned bytes or shorts by fours"};
-const Form weightForm{"VEC4", {5126}, "floats by fours"};
-const Form cornerForm{"SCALAR", {5121, 5123, 5125}, "unsigned whole numbers"};
-const Form matrixForm{"MAT4", {5126}, "matrices of floats"};
-const Form timeForm{"SCALAR", {5126}, "floats"};
-const Form turnForm{"VEC4", {5126}, "floats by fours"};
+// KHR_mesh_quantization: positions may be whole numbers, which stand for -1 ... 1 or for themselves
+const Form positionForm{"VEC3", {single, signedByte, unsignedByte, signedShort, unsignedShort}, "positions", false};
+const Form jointForm{"VEC4", {unsignedByte, unsignedShort}, "unsigned bytes or shorts by fours", false};
+const Form weightForm{"VEC4", {single, unsignedByte, unsignedShort}, "weights by fours"};
+const Form cornerForm{"SCALAR", {unsignedByte, unsignedShort, unsignedInt}, "unsigned whole numbers", false};
+const Form matrixForm{"MAT4", {single}, "matrices of floats"};
+const Form timeForm{"SCALAR", {single}, "floats"};
+const Form moveForm{"VEC3", {single}, "floats by threes"};
+const Form turnForm{"VEC4", {single, signedByte, unsignedByte, signedShort, unsignedShort}, "rotations by fours"};
+const Form morphForm{"SCALAR", {single, signedByte, unsignedByte, signedShort, unsignedShort}, "weights"};
+// Draco decodes into what the accessor says, and nobody comes after it
+const Form dracoWeightForm{"VEC4", {single}, "floats by fours"};
 
 class Accessors {
 public:
@@ -110,12 +126,12 @@ public:
             return std::nullopt;
         const JsonValue& accessor = accessors_[static_cast<rapidjson::SizeType>(*found)];
         const std::string name = owner + " uses " + element("accessors", *found) + ", which ";
-        if (member(accessor, "sparse") != nullptr)
-            refuse(name + "is sparse: this is not supported");
         const std::uint64_t component = sizeOf(accessor, "componentType", 0, owner);
         if (textOf(accessor, "type") != form.type ||
             std::find(form.componentTypes.begin(), form.componentTypes.end(), component) == form.componentTypes.end())
             refuse(name + "does not hold " + form.text);
+        if (form.isNumber && component != single && !isNormalized(accessor))
+            refuse(name + "has whole numbers that are not normalized");
         return sizeOf(accessor, "count", 0, owner);
     }
 
@@ -131,14 +147,41 @@ void checkAttribute(const Accessors& accessors, const JsonValue& attributes, con
                " positions");
 }
 
-void checkPrimitive(const Accessors& accessors, const JsonValue& primitive, const std::string& owner) {
+void checkTargets(const Accessors& accessors, const JsonValue& primitive, std::uint64_t points,
+                  const std::string& owner) {
+    std::size_t index = 0;
+    for (const JsonValue& target : listOf(primitive, "targets").GetArray())
+        checkAttribute(accessors, target, "POSITION", positionForm, points, owner + "." + element("targets", index++));
+}
+
+// whatever the importer makes of Draco's data it makes at a safe distance, but it has to find them
+bool checkDraco(const JsonValue& document, const JsonValue& primitive, const std::string& owner) {
+    const JsonValue* draco = extensionOf(primitive, dracoExtension);
+    if (draco == nullptr)
+        return false;
+    const auto view =
+        indexOf(member(*draco, "bufferView"), listOf(document, "bufferViews").Size(), "bufferViews", owner);
+    const JsonValue* attributes = member(*draco, "attributes");
+    if (!view || attributes == nullptr || !attributes->IsObject())
+        refuse(owner + " is compressed by Draco, without a view or attributes");
+    for (const auto& attribute : attributes->GetObject())
+        if (!attribute.value.IsUint())
+            refuse(owner + " is compressed by Draco, and its attribute " + attribute.name.GetString() +
+                   " is no number");
+    return true;
+}
+
+void checkPrimitive(const Accessors& accessors, const JsonValue& document, const JsonValue& primitive,
+                    const std::string& owner) {
     const JsonValue* attributes = member(primitive, "attributes");
     if (attributes == nullptr || !attributes->IsObject())
         refuse(owner + " has no attributes");
-    const auto points = accessors.count(member(*attributes, "POSITION"), positionForm, owner);
+    const bool isDraco = checkDraco(document, primitive, owner);
+    const auto points = accessors.count(member(*attributes, "POSITION"), isDraco ? moveForm : positionForm, owner);
     if (!points)
         refuse(owner + " has no positions");
     accessors.count(member(primitive, "indices"), cornerForm, owner);
+    checkTargets(accessors, primitive, *points, owner);
     for (unsigned set = 0;; ++set) {
         const std::string joints = "JOINTS_" + std::to_string(set);
         const std::string weights = "WEIGHTS_" + std::to_string(set);
@@ -148,18 +191,28 @@ void checkPrimitive(const Accessors& accessors, const JsonValue& primitive, cons
         if (!hasJoints)
             return;
         checkAttribute(accessors, *attributes, joints, jointForm, *points, owner);
-        checkAttribute(accessors, *attributes, weights, weightForm, *points, owner);
+        checkAttribute(accessors, *attributes, weights, isDraco ? dracoWeightForm : weightForm, *points, owner);
+    }
+}
+
+// how many targets a mesh has: as many in each of its parts
+void checkMesh(const Accessors& accessors, const JsonValue& document, const JsonValue& mesh, const std::string& owner) {
+    std::size_t part = 0;
+    const JsonValue& primitives = listOf(mesh, "primitives");
+    for (const JsonValue& primitive : primitives.GetArray()) {
+        const std::string name = owner + "." + element("primitives", part++);
+        checkPrimitive(accessors, document, primitive, name);
+        if (listOf(primitive, "targets").Size() != listOf(primitives[0], "targets").Size())
+            refuse(name + " has " + std::to_string(listOf(primitive, "targets").Size()) +
+                   " morph targets, but another part of the mesh " +
+                   std::to_string(listOf(primitives[0], "targets").Size()));
     }
 }
 
 void checkMeshes(const JsonValue& document, const Accessors& accessors) {
     std::size_t index = 0;
-    for (const JsonValue& mesh : listOf(document, "meshes").GetArray()) {
-        std::size_t part = 0;
-        for (const JsonValue& primitive : listOf(mesh, "primitives").GetArray())
-            checkPrimitive(accessors, primitive, element("meshes", index) + "." + element("primitives", part++));
-        ++index;
-    }
+    for (const JsonValue& mesh : listOf(document, "meshes").GetArray())
+        checkMesh(accessors, document, mesh, element("meshes", index++));
 }
 
 void checkSkins(const JsonValue& document, const Accessors& accessors) {
@@ -181,29 +234,48 @@ void checkSkins(const JsonValue& document, const Accessors& accessors) {
     }
 }
 
-void checkSampler(const Accessors& accessors, const JsonValue& sampler, const Form& form, const std::string& owner) {
+void checkSampler(const Accessors& accessors, const JsonValue& sampler, const Form& form, std::uint64_t valuesOfTime,
+                  const std::string& owner) {
     const auto times = accessors.count(member(sampler, "input"), timeForm, owner);
     const auto values = accessors.count(member(sampler, "output"), form, owner);
     if (!times || !values)
         refuse(owner + " has a sampler without input or output");
     const bool cubic = textOf(sampler, "interpolation") == "CUBICSPLINE";
-    if (*values != *times * (cubic ? 3 : 1))
+    // a count is at most 2^53, and the targets of a mesh are a list of the file
+    if (*values / (cubic ? 3 : 1) / valuesOfTime != *times || *values % (valuesOfTime * (cubic ? 3 : 1)) != 0)
         refuse(owner + " has a sampler of " + std::to_string(*times) + " times and " + std::to_string(*values) +
                " values");
+}
+
+// of the mesh at a node
+std::uint64_t targetCount(const JsonValue& document, std::size_t node) {
+    const JsonValue& meshes = listOf(document, "meshes");
+    const JsonValue& shows = listOf(document, "nodes")[static_cast<rapidjson::SizeType>(node)];
+    const auto mesh = indexOf(member(shows, "mesh"), meshes.Size(), "meshes", element("nodes", node));
+    if (!mesh)
+        return 0;
+    const JsonValue& parts = listOf(meshes[static_cast<rapidjson::SizeType>(*mesh)], "primitives");
+    return parts.Empty() ? 0 : listOf(parts[0], "targets").Size();
 }
 
 void checkChannel(const Accessors& accessors, const JsonValue& document, const JsonValue& animation,
                   const JsonValue& channel, const std::string& owner) {
     const JsonValue& samplers = listOf(animation, "samplers");
-    const auto sampler = indexOf(member(channel, "sampler"), samplers.Size(), "samplers", owner);
+    const auto index = indexOf(member(channel, "sampler"), samplers.Size(), "samplers", owner);
     const JsonValue* target = member(channel, "target");
-    if (!sampler || target == nullptr)
+    if (!index || target == nullptr)
         refuse(owner + " has a channel without sampler or target");
-    indexOf(member(*target, "node"), listOf(document, "nodes").Size(), "nodes", owner);
+    const auto node = indexOf(member(*target, "node"), listOf(document, "nodes").Size(), "nodes", owner);
     const std::string path = textOf(*target, "path");
-    if (path == "translation" || path == "rotation" || path == "scale")
-        checkSampler(accessors, samplers[static_cast<rapidjson::SizeType>(*sampler)],
-                     path == "rotation" ? turnForm : positionForm, owner);
+    const JsonValue& sampler = samplers[static_cast<rapidjson::SizeType>(*index)];
+    if (path == "translation" || path == "scale")
+        checkSampler(accessors, sampler, moveForm, 1, owner);
+    if (path == "rotation")
+        checkSampler(accessors, sampler, turnForm, 1, owner);
+    if (path != "weights" || !node)
+        return;
+    if (const std::uint64_t targets = targetCount(document, *node); targets > 0)
+        checkSampler(accessors, sampler, morphForm, targets, owner);
 }
 
 void checkAnimations(const JsonValue& document, const Accessors& accessors) {
@@ -264,14 +336,14 @@ void checkNodes(const JsonValue& document) {
     checkHierarchy(nodes);
 }
 
-// what only looks do not need is left out; all else that a file cannot do without is beyond us
+// what is read, and what only looks do not need; all else that a file cannot do without is beyond us
 void checkExtensions(const JsonValue& document) {
     for (const JsonValue& extension : listOf(document, "extensionsRequired").GetArray()) {
         const std::string name = extension.IsString() ? extension.GetString() : "";
-        bool looks = false;
+        bool isFine = name == quantizationExtension || name == meshoptExtension || name == dracoExtension;
         for (const char* kind : {"KHR_materials_", "KHR_texture_", "KHR_lights_", "EXT_texture_", "MSFT_texture_"})
-            looks = looks || name.rfind(kind, 0) == 0;
-        if (!looks)
+            isFine = isFine || name.rfind(kind, 0) == 0;
+        if (!isFine)
             refuse("the file needs the glTF extension \"" + name + "\", which is not supported");
     }
 }

@@ -39,6 +39,10 @@ inline std::string textOf(const JsonValue& object, const char* key) {
                                                : std::string();
 }
 
+inline std::string textOf(const JsonValue& text) {
+    return {text.GetString(), text.GetStringLength()};
+}
+
 /// A count, size or offset; `absent` when the member is not there. Throws when it is no whole number from 0 to 2^53.
 inline std::uint64_t sizeOf(const JsonValue& object, const char* key, std::uint64_t absent, const std::string& owner) {
     const JsonValue* value = member(object, key);
@@ -60,6 +64,18 @@ inline std::optional<std::size_t> indexOf(const JsonValue* value, std::size_t co
         throw std::runtime_error(owner + " refers to " + things + "[" + std::to_string(value->GetUint64()) +
                                  "], but there are " + std::to_string(count));
     return static_cast<std::size_t>(value->GetUint64());
+}
+
+/// The array that is a member of an object; a new one when there is none. What is there must be an array.
+inline JsonValue& arrayMember(JsonValue& object, const char* key, storage::JsonDocument& document) {
+    if (member(object, key) == nullptr)
+        object.AddMember(rapidjson::StringRef(key), JsonValue(rapidjson::kArrayType), document.GetAllocator());
+    return object[key];
+}
+
+/// The name that a node has for the importer.
+inline std::string nodeId(std::size_t index) {
+    return "n" + std::to_string(index);
 }
 
 inline std::string element(const char* things, std::size_t index) {

@@ -30,7 +30,18 @@ std::string percentDecoded(const std::string& uri) {
     return decoded;
 }
 
+// the folder of a path, with its separator
+std::string folderOf(const std::string& path) {
+    return path.substr(0, path.size() - std::filesystem::path(path).filename().string().size());
+}
+
 } // namespace
+
+std::string fileOfUri(const std::string& path, const std::string& uri) {
+    const std::string folder = folderOf(path);
+    std::string decoded = folder + percentDecoded(uri);
+    return uri.find('%') != std::string::npos && isFile(decoded) ? decoded : folder + uri;
+}
 
 ImportedFile::ImportedFile(std::string path, const std::string& bytes)
     : path_(std::move(path))
@@ -38,11 +49,8 @@ ImportedFile::ImportedFile(std::string path, const std::string& bytes)
 
 // the importer takes a URI for a path: behind its own folder, which is one, characters may be written by their codes
 std::string ImportedFile::onDisk(const std::string& file) const {
-    const std::string folder = path_.substr(0, path_.size() - std::filesystem::path(path_).filename().string().size());
-    if (!file.starts_with(folder) || file.find('%', folder.size()) == std::string::npos)
-        return file;
-    std::string decoded = folder + percentDecoded(file.substr(folder.size()));
-    return isFile(decoded) ? decoded : file;
+    const std::string folder = folderOf(path_);
+    return file.starts_with(folder) ? fileOfUri(path_, file.substr(folder.size())) : file;
 }
 
 bool ImportedFile::Exists(const char* file) const {

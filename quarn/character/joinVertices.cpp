@@ -27,26 +27,83 @@ int compare(const std::vector<Influence>& a, const std::vector<Influence>& b) {
     return 0;
 }
 
-int compareVertices(const CharacterMesh& mesh, std::uint32_t a, std::uint32_t b) {
-    const int byPosition = compare(mesh.points[a], mesh.points[b]);
-    return byPosition != 0 ? byPosition : compare(mesh.influences[a], mesh.influences[b]);
+struct Morph {
+    std::size_t target;
+    HVector delta;
+};
+
+// of every vertex the targets that move it; nothing in a mesh without targets
+std::vector<std::vector<Morph>> morphsOf(const CharacterMesh& mesh) {
+    std::vector<std::vector<Morph>> morphs(mesh.morphTargets.empty() ? 0 : mesh.points.size());
+    for (std::size_t t = 0; t < mesh.morphTargets.size(); ++t)
+        for (std::size_t i = 0; i < mesh.morphTargets[t].vertices.size(); ++i)
+            morphs[mesh.morphTargets[t].vertices[i]].push_back({t, mesh.morphTargets[t].deltas[i]});
+    return morphs;
 }
+
+int compare(const std::vector<Morph>& a, const std::vector<Morph>& b) {
+    if (a.size() != b.size())
+        return a.size() < b.size() ? -1 : 1;
+    for (std::size_t i = 0; i < a.size(); ++i) {
+        const auto left = std::tie(a[i].target, a[i].delta.x, a[i].delta.y, a[i].delta.z);
+        const auto right = std::tie(b[i].target, b[i].delta.x, b[i].delta.y, b[i].delta.z);
+        if (left != right)
+            return left < right ? -1 : 1;
+    }
+    return 0;
+}
+
+class VertexOrder {
+public:
+    explicit VertexOrder(const CharacterMesh& mesh)
+        : mesh_(mesh)
+        , morphs_(morphsOf(mesh)) {}
+
+    int compareVertices(std::uint32_t a, std::uint32_t b) const {
+        if (const int byPosition = compare(mesh_.points[a], mesh_.points[b]); byPosition != 0)
+            return byPosition;
+        if (const int byInfluence = compare(mesh_.influences[a], mesh_.influences[b]); byInfluence != 0)
+            return byInfluence;
+        return morphs_.empty() ? 0 : compare(morphs_[a], morphs_[b]);
+    }
+
+private:
+    const CharacterMesh& mesh_;
+    std::vector<std::vector<Morph>> morphs_;
+};
 
 // for every vertex the first one of the file that it equals, bit by bit (decision 0068)
 std::vector<std::uint32_t> firstEquals(const CharacterMesh& mesh) {
+    const VertexOrder vertices(mesh);
     std::vector<std::uint32_t> order(mesh.points.size());
     std::iota(order.begin(), order.end(), 0U);
     std::sort(order.begin(), order.end(), [&](std::uint32_t a, std::uint32_t b) {
-        const int result = compareVertices(mesh, a, b);
+        const int result = vertices.compareVertices(a, b);
         return result != 0 ? result < 0 : a < b;
     });
 
     std::vector<std::uint32_t> first(order.size());
     for (std::size_t i = 0; i < order.size(); ++i) {
-        const bool again = i > 0 && compareVertices(mesh, order[i - 1], order[i]) == 0;
+        const bool again = i > 0 && vertices.compareVertices(order[i - 1], order[i]) == 0;
         first[order[i]] = again ? first[order[i - 1]] : order[i];
     }
     return first;
+}
+
+// of vertices that became one the first one's delta stands for all
+void keepFirstDeltas(CharacterMesh& mesh, const std::vector<std::uint32_t>& first) {
+    for (MorphTarget& target : mesh.morphTargets) {
+        std::size_t count = 0;
+        for (std::size_t i = 0; i < target.vertices.size(); ++i) {
+            const std::uint32_t vertex = target.vertices[i];
+            if (first[vertex] != vertex)
+                continue;
+            target.vertices[count] = mesh.joinedOf[vertex];
+            target.deltas[count++] = target.deltas[i];
+        }
+        target.vertices.resize(count);
+        target.deltas.resize(count);
+    }
 }
 
 void keepFirstVertices(CharacterMesh& mesh) {
@@ -66,6 +123,7 @@ void keepFirstVertices(CharacterMesh& mesh) {
     }
     mesh.points.resize(count);
     mesh.influences.resize(count);
+    keepFirstDeltas(mesh, first);
 }
 
 // appends the polygon without corners that repeat; false when too little is left

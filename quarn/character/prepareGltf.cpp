@@ -1,8 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/prepareGltf.h"
 
+#include "quarn/character/GltfBytes.h"
+#include "quarn/character/PlainAccessors.h"
 #include "quarn/character/checkGltf.h"
-#include "storage/encodings.h"
+#include "quarn/character/gltfMorphs.h"
+#include "quarn/character/gltfTypes.h"
 
 #include <rapidjson/stringbuffer.h>
 #include <rapidjson/writer.h>
@@ -33,11 +36,12 @@ void appendNumber(std::string& bytes, std::size_t value) {
 struct Parts {
     std::string_view json;
     std::string_view chunks; ///< what follows the JSON chunk of the binary form
+    std::string_view binary; ///< the data of the first of them
 };
 
 Parts partsOf(std::string_view bytes) {
     if (bytes.substr(0, glbMagic.size()) != glbMagic)
-        return {bytes, {}};
+        return {bytes, {}, {}};
     if (bytes.size() < glbHeader + chunkHeader || numberAt(bytes, 16) != numberAt("JSON", 0))
         throw std::runtime_error("the binary glTF file does not begin with its JSON text");
     if (numberAt(bytes, 4) != 2)
@@ -50,7 +54,8 @@ Parts partsOf(std::string_view bytes) {
         throw std::runtime_error("the binary glTF file ends in its binary data");
     std::string_view json = bytes.substr(glbHeader + chunkHeader, length);
     json.remove_suffix(json.size() - (json.find_last_not_of('\0') + 1)); // some writers fill it up so
-    return {json, chunks};
+    const bool hasData = !chunks.empty() && numberAt(chunks, 4) == numberAt(std::string_view("BIN\0", 4), 0);
+    return {json, chunks, hasData ? chunks.substr(chunkHeader, numberAt(chunks, 0)) : std::string_view()};
 }
 
 std::string joined(std::string json, std::string_view chunks) {
@@ -77,10 +82,6 @@ storage::JsonDocument parse(std::string_view json) {
     return document;
 }
 
-std::string nodeId(std::size_t index) {
-    return "n" + std::to_string(index);
-}
-
 void renameNodes(storage::JsonDocument& document, SourceHints& hints) {
     const auto nodes = document.FindMember("nodes");
     if (nodes == document.MemberEnd())
@@ -92,12 +93,6 @@ void renameNodes(storage::JsonDocument& document, SourceHints& hints) {
         JsonValue id(nodeId(index++).c_str(), document.GetAllocator());
         node.AddMember("name", id, document.GetAllocator());
     }
-}
-
-JsonValue& arrayMember(JsonValue& object, const char* key, storage::JsonDocument& document) {
-    if (member(object, key) == nullptr)
-        object.AddMember(rapidjson::StringRef(key), JsonValue(rapidjson::kArrayType), document.GetAllocator());
-    return object[key];
 }
 
 // only what is read, and JOINTS_0 before JOINTS_1: the importer counts them as they come
@@ -117,28 +112,41 @@ void keepReadAttributes(JsonValue& primitive, storage::JsonDocument& document) {
     attributes = kept;
 }
 
+// Draco is the importer's to decode
+bool keepDraco(JsonValue& primitive, storage::JsonDocument& document) {
+    JsonValue extensions(rapidjson::kObjectType);
+    const bool isDraco = extensionOf(primitive, dracoExtension) != nullptr;
+    if (isDraco)
+        extensions.AddMember(rapidjson::StringRef(dracoExtension), primitive["extensions"][dracoExtension],
+                             document.GetAllocator());
+    primitive.RemoveMember("extensions");
+    if (isDraco)
+        primitive.AddMember("extensions", extensions, document.GetAllocator());
+    return isDraco;
+}
+
 // what is not read had better not be there: the importer would follow its indices
-void removeUnread(storage::JsonDocument& document, SourceHints& hints) {
+void removeUnread(storage::JsonDocument& document) {
     for (const char* key : {"materials", "textures", "images", "samplers", "cameras", "extensions", "extensionsUsed",
                             "extensionsRequired"})
         document.RemoveMember(key);
     for (JsonValue& node : arrayMember(document, "nodes", document).GetArray())
         for (const char* key : {"camera", "extensions", "weights"})
             node.RemoveMember(key);
-    std::size_t index = 0;
+    bool hasDraco = false;
     for (JsonValue& mesh : arrayMember(document, "meshes", document).GetArray()) {
-        bool morphs = false;
         mesh.RemoveMember("weights");
         for (JsonValue& primitive : arrayMember(mesh, "primitives", document).GetArray()) {
-            morphs = primitive.RemoveMember("targets") || morphs;
+            primitive.RemoveMember("targets");
             primitive.RemoveMember("material");
-            primitive.RemoveMember("extensions");
             keepReadAttributes(primitive, document);
+            hasDraco = keepDraco(primitive, document) || hasDraco;
         }
-        if (morphs)
-            hints.warnings.push_back(element("meshes", index) + " has morph targets, which are not read");
-        ++index;
     }
+    if (hasDraco)
+        for (const char* key : {"extensionsUsed", "extensionsRequired"})
+            arrayMember(document, key, document)
+                .PushBack(rapidjson::StringRef(dracoExtension), document.GetAllocator());
 }
 
 std::string identities(std::size_t count) {
@@ -148,38 +156,44 @@ std::string identities(std::size_t count) {
     return bytes;
 }
 
-// the index of a new accessor of `count` identity matrices, in a buffer of its own
-rapidjson::SizeType addIdentities(storage::JsonDocument& document, std::size_t count) {
-    auto& memory = document.GetAllocator();
-    const std::string bytes = identities(count);
-    const std::string uri = "data:application/octet-stream;base64," + storage::base64(bytes);
-    const auto add = [&](const char* key, JsonValue& value) {
-        JsonValue& values = arrayMember(document, key, document);
-        values.PushBack(value, memory);
-        return values.Size() - 1;
-    };
-    JsonValue buffer(rapidjson::kObjectType);
-    buffer.AddMember("byteLength", std::uint64_t{bytes.size()}, memory);
-    buffer.AddMember("uri", JsonValue(uri.c_str(), memory), memory);
-    JsonValue view(rapidjson::kObjectType);
-    view.AddMember("buffer", add("buffers", buffer), memory);
-    view.AddMember("byteLength", std::uint64_t{bytes.size()}, memory);
-    JsonValue accessor(rapidjson::kObjectType);
-    accessor.AddMember("bufferView", add("bufferViews", view), memory);
-    accessor.AddMember("componentType", 5126, memory);
-    accessor.AddMember("type", "MAT4", memory);
-    accessor.AddMember("count", std::uint64_t{count}, memory);
-    return add("accessors", accessor);
-}
-
 // a skin without bind matrices has identities, which the importer does not know
-void addBindMatrices(storage::JsonDocument& document) {
+void addBindMatrices(storage::JsonDocument& document, PlainAccessors& accessors) {
     for (JsonValue& skin : arrayMember(document, "skins", document).GetArray()) {
         if (member(skin, "inverseBindMatrices") != nullptr)
             continue;
-        const rapidjson::SizeType accessor = addIdentities(document, listOf(skin, "joints").Size());
-        skin.AddMember("inverseBindMatrices", accessor, document.GetAllocator());
+        const std::size_t count = listOf(skin, "joints").Size();
+        skin.AddMember("inverseBindMatrices", accessors.add("MAT4", gltfComponent::single, count, identities(count)),
+                       document.GetAllocator());
     }
+}
+
+void makePlain(storage::JsonDocument& document, PlainAccessors& accessors) {
+    for (JsonValue& mesh : arrayMember(document, "meshes", document).GetArray())
+        for (JsonValue& primitive : arrayMember(mesh, "primitives", document).GetArray()) {
+            if (extensionOf(primitive, dracoExtension) != nullptr)
+                continue;
+            for (auto& attribute : primitive["attributes"].GetObject())
+                accessors.makePlain(attribute.value, textOf(attribute.name).starts_with("JOINTS_"));
+            if (member(primitive, "indices") != nullptr)
+                accessors.makePlain(primitive["indices"], true);
+        }
+    for (JsonValue& skin : arrayMember(document, "skins", document).GetArray())
+        if (member(skin, "inverseBindMatrices") != nullptr)
+            accessors.makePlain(skin["inverseBindMatrices"], false);
+}
+
+// with a sampler of its own for each channel: the importer would follow those that no channel has
+void makePlain(JsonValue& animation, storage::JsonDocument& document, PlainAccessors& accessors) {
+    const JsonValue& samplers = arrayMember(animation, "samplers", document);
+    JsonValue kept(rapidjson::kArrayType);
+    for (JsonValue& channel : arrayMember(animation, "channels", document).GetArray()) {
+        JsonValue sampler(samplers[channel["sampler"].GetUint()], document.GetAllocator());
+        accessors.makePlain(sampler["input"], false);
+        accessors.makePlain(sampler["output"], false);
+        channel["sampler"].SetUint(kept.Size());
+        kept.PushBack(sampler, document.GetAllocator());
+    }
+    animation["samplers"] = kept;
 }
 
 std::optional<TrackKind> trackKind(const std::string& path) {
@@ -220,20 +234,26 @@ void noteInterpolations(const JsonValue& animation, std::size_t index, SourceHin
 
 } // namespace
 
-std::string prepareGltf(const std::string& bytes, SourceHints& hints) {
+std::string prepareGltf(const std::string& bytes, SourceHints& hints, const ReadUri& readUri) {
     const Parts parts = partsOf(bytes);
     storage::JsonDocument document = parse(parts.json);
     for (const char* things : {"nodes", "meshes", "animations", "accessors", "bufferViews", "buffers", "skins"})
         checkObjects(listOf(document, things), things);
     checkGltf(document);
     renameNodes(document, hints);
-    removeUnread(document, hints);
-    addBindMatrices(document);
+    GltfBytes data(document, parts.binary, readUri);
+    readMorphs(document, data, hints);
+    removeUnread(document);
+    PlainAccessors accessors(document, data);
+    makePlain(document, accessors);
     std::size_t index = 0;
     for (JsonValue& animation : arrayMember(document, "animations", document).GetArray()) {
         removeOtherChannels(arrayMember(animation, "channels", document));
         noteInterpolations(animation, index++, hints);
+        makePlain(animation, document, accessors);
     }
+    addBindMatrices(document, accessors);
+    accessors.finish();
 
     rapidjson::StringBuffer buffer;
     rapidjson::Writer<rapidjson::StringBuffer> writer(buffer);

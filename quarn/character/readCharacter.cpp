@@ -94,14 +94,25 @@ Character convert(const aiScene& scene, const SourceHints& hints, const std::str
     character.warnings = hints.warnings;
     character.metersPerUnit = metersPerUnit(scene, ending);
     const Skeleton skeleton = readSkeleton(scene, hints, character);
-    readMeshes(scene, skeleton, hints, character);
+    const MeshIndices meshes = readMeshes(scene, skeleton, hints, character);
     if (character.meshes.empty())
         throw std::runtime_error("the file has no mesh");
-    readAnimations(scene, skeleton, hints, character);
+    readAnimations(scene, skeleton, meshes, hints, character);
     return character;
 }
 
-Character importFile(const std::string& path, const std::string& ending, const std::string& bytes, SourceHints hints) {
+std::string readUri(const std::string& path, const std::string& uri) {
+    try {
+        return storage::readWholeFile(fileOfUri(path, uri), std::uint64_t{1} << 32U);
+    } catch (const storage::FileError& error) {
+        throw std::runtime_error("its buffer \"" + uri + "\" " + error.predicate());
+    }
+}
+
+Character importFile(const std::string& path, const std::string& ending, std::string bytes) {
+    SourceHints hints;
+    if (isGltf(ending))
+        bytes = prepareGltf(bytes, hints, [&](const std::string& uri) { return readUri(path, uri); });
     const ImporterLog log(hints.warnings);
     Assimp::Importer importer;
     keepImporterOf(importer, ending);
@@ -130,11 +141,8 @@ Character readFile(const std::string& path) {
     const std::string ending = lowerEnding(path);
     if (!isGltf(ending) && ending != ".fbx" && ending != ".dae")
         throw std::runtime_error("\"" + ending + "\" is not one of the endings .gltf, .glb, .fbx and .dae");
-    std::string bytes = readBytes(path);
-    SourceHints hints;
-    if (isGltf(ending))
-        bytes = prepareGltf(bytes, hints);
-    return unpackCharacter(importApart([&] { return packCharacter(importFile(path, ending, bytes, hints)); }));
+    const std::string bytes = readBytes(path);
+    return unpackCharacter(importApart([&] { return packCharacter(importFile(path, ending, bytes)); }));
 }
 
 } // namespace
@@ -156,7 +164,9 @@ std::string describeCharacter(const Character& character) {
     for (const CharacterMesh& mesh : character.meshes)
         text << "mesh " << mesh.name << ": " << mesh.joinedOf.size() << " vertices in the file, joined to "
              << mesh.points.size() << "; " << mesh.polygonSizes.size() << " polygons, " << mesh.bindings.size()
-             << " joints\n";
+             << " joints"
+             << (mesh.morphTargets.empty() ? "" : ", " + std::to_string(mesh.morphTargets.size()) + " morph targets")
+             << '\n';
     text << "joints: " << character.joints.size() << '\n';
     for (const Animation& animation : character.animations)
         text << "animation " << animation.name << ": " << animation.seconds << " s, " << animation.channels.size()

@@ -2,6 +2,7 @@
 #include "quarn/character/skinnedMeshes.h"
 
 #include "quarn/character/joinVertices.h"
+#include "quarn/character/morphTargets.h"
 #include "quarn/character/uniqueNames.h"
 
 #include <algorithm>
@@ -137,14 +138,22 @@ public:
         mesh.worldTransform = shown.worldTransform;
         mesh.parentJoint = shown.parentJoint;
         std::size_t skipped = 0;
-        for (unsigned i = 0; i < shown.node->mNumMeshes; ++i)
+        std::vector<std::uint32_t> partSizes;
+        for (unsigned i = 0; i < shown.node->mNumMeshes; ++i) {
+            const std::size_t before = mesh.points.size();
             skipped += append(shown.node->mMeshes[i], mesh);
+            partSizes.push_back(static_cast<std::uint32_t>(mesh.points.size() - before));
+        }
+        const std::string node = shown.node->mName.C_Str();
+        addMorphTargets(hints_, node, partSizes, mesh, character_.warnings);
         for (auto& influences : mesh.influences)
             tidy(influences);
         std::sort(mesh.bindings.begin(), mesh.bindings.end(),
                   [](const Binding& a, const Binding& b) { return a.joint < b.joint; });
-        finish(std::move(mesh), skipped);
+        if (finish(std::move(mesh), skipped))
+            meshOf_.emplace(node, static_cast<std::uint32_t>(character_.meshes.size() - 1));
     }
+    MeshIndices take() { return std::move(meshOf_); }
 
 private:
     std::size_t append(unsigned index, CharacterMesh& mesh) {
@@ -160,7 +169,8 @@ private:
         return appendPolygons(part, firstPoint, mesh);
     }
 
-    void finish(CharacterMesh mesh, std::size_t skipped) {
+    // false when nothing is left of the mesh
+    bool finish(CharacterMesh mesh, std::size_t skipped) {
         const std::string name = "the mesh \"" + mesh.name + "\" ";
         const std::size_t collapsed = joinVertices(mesh);
         if (skipped > 0)
@@ -171,10 +181,11 @@ private:
                                           " polygons with less than three different corners, which are left out");
         if (mesh.polygonSizes.empty()) {
             character_.warnings.push_back(name + "has no polygons and is left out");
-            return;
+            return false;
         }
         warnOfSkin(mesh, character_.warnings);
         character_.meshes.push_back(std::move(mesh));
+        return true;
     }
 
     const aiScene& scene_;
@@ -182,6 +193,7 @@ private:
     const SourceHints& hints_;
     Character& character_;
     UniqueNames names_;
+    MeshIndices meshOf_;
 };
 
 // where a joint was when the meshes were bound should not depend on the mesh
@@ -199,11 +211,12 @@ void warnOfSkins(Character& character) {
 
 } // namespace
 
-void readMeshes(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, Character& character) {
+MeshIndices readMeshes(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, Character& character) {
     MeshReader reader(scene, skeleton, hints, character);
     for (const ShownNode& shown : skeleton.shown)
         reader.read(shown);
     warnOfSkins(character);
+    return reader.take();
 }
 
 } // namespace quarn

@@ -27,6 +27,14 @@ void transfer(Archive& archive, Item& joint) {
     archive(joint.restTransform);
 }
 template <class Archive, class Item>
+requires std::is_same_v<std::remove_const_t<Item>, MorphTarget>
+void transfer(Archive& archive, Item& target) {
+    archive(target.name);
+    archive(target.restWeight);
+    archive(target.vertices);
+    archive(target.deltas);
+}
+template <class Archive, class Item>
 requires std::is_same_v<std::remove_const_t<Item>, CharacterMesh>
 void transfer(Archive& archive, Item& mesh) {
     archive(mesh.name);
@@ -35,6 +43,7 @@ void transfer(Archive& archive, Item& mesh) {
     archive(mesh.corners);
     archive(mesh.influences);
     archive(mesh.bindings);
+    archive(mesh.morphTargets);
     archive(mesh.joinedOf);
     archive(mesh.worldTransform);
     archive(mesh.parentJoint);
@@ -52,11 +61,20 @@ void transfer(Archive& archive, Item& channel) {
     track(channel.scale);
 }
 template <class Archive, class Item>
+requires std::is_same_v<std::remove_const_t<Item>, MorphChannel>
+void transfer(Archive& archive, Item& channel) {
+    archive(channel.mesh);
+    archive(channel.target);
+    archive(channel.weight.interpolation);
+    archive(channel.weight.keys);
+}
+template <class Archive, class Item>
 requires std::is_same_v<std::remove_const_t<Item>, Animation>
 void transfer(Archive& archive, Item& animation) {
     archive(animation.name);
     archive(animation.seconds);
     archive(animation.channels);
+    archive(animation.morphs);
 }
 template <class Archive, class Item>
 requires std::is_same_v<std::remove_const_t<Item>, Character>
@@ -96,6 +114,8 @@ void checkMesh(const CharacterMesh& mesh, std::size_t joints) {
     for (const std::vector<Influence>& influences : mesh.influences)
         for (const Influence& influence : influences)
             require(influence.joint < joints && isBound[influence.joint]);
+    for (const MorphTarget& target : mesh.morphTargets)
+        require(target.vertices.size() == target.deltas.size() && allBelow(target.vertices, mesh.points.size()));
     require(mesh.parentJoint >= -1 && mesh.parentJoint < static_cast<int>(joints));
 }
 
@@ -104,18 +124,27 @@ void checkTrack(const Track<Value>& track) {
     require(track.interpolation == Interpolation::Linear || track.interpolation == Interpolation::Step);
 }
 
+void checkAnimation(const Character& character, const Animation& animation) {
+    for (const JointChannel& channel : animation.channels) {
+        require(channel.joint < character.joints.size());
+        checkTrack(channel.translation);
+        checkTrack(channel.rotation);
+        checkTrack(channel.scale);
+    }
+    for (const MorphChannel& channel : animation.morphs) {
+        require(channel.mesh < character.meshes.size() &&
+                channel.target < character.meshes[channel.mesh].morphTargets.size());
+        checkTrack(channel.weight);
+    }
+}
+
 void checkIndices(const Character& character) {
     for (std::size_t joint = 0; joint < character.joints.size(); ++joint)
         require(character.joints[joint].parent >= -1 && character.joints[joint].parent < static_cast<int>(joint));
     for (const CharacterMesh& mesh : character.meshes)
         checkMesh(mesh, character.joints.size());
     for (const Animation& animation : character.animations)
-        for (const JointChannel& channel : animation.channels) {
-            require(channel.joint < character.joints.size());
-            checkTrack(channel.translation);
-            checkTrack(channel.rotation);
-            checkTrack(channel.scale);
-        }
+        checkAnimation(character, animation);
 }
 
 } // namespace

@@ -53,6 +53,10 @@ void requireInRange(const Character& character) {
     }
 }
 
+std::string noOtherFile(const std::string& uri) {
+    throw std::runtime_error("no file " + uri);
+}
+
 } // namespace
 
 bool fuzzGltf(const std::uint8_t* data, std::size_t size) {
@@ -60,12 +64,12 @@ bool fuzzGltf(const std::uint8_t* data, std::size_t size) {
     SourceHints hints;
     std::string prepared;
     try {
-        prepared = prepareGltf(bytes, hints);
+        prepared = prepareGltf(bytes, hints, noOtherFile);
     } catch (const std::runtime_error&) {
         return false;
     }
     SourceHints again;
-    prepareGltf(prepared, again);
+    prepareGltf(prepared, again, noOtherFile);
     require(again.nodeNames.size() == hints.nodeNames.size());
     for (const auto& [imported, name] : again.nodeNames)
         require(name == imported && hints.nodeNames.count(imported) == 1);

@@ -49,25 +49,38 @@ void GltfWriter::replace(const std::string& name, std::size_t accessor) {
 }
 
 std::size_t GltfWriter::add(const std::string& type, int componentType, std::size_t count, const void* data,
-                            std::size_t size) {
+                            std::size_t size, const std::string& more) {
     static const std::map<std::string, std::size_t> widths{
         {"SCALAR", 1}, {"VEC2", 2}, {"VEC3", 3}, {"VEC4", 4}, {"MAT4", 16}};
-    views_.push_back(R"({"buffer":0,"byteOffset":)" + std::to_string(bytes_.size()) +
-                     ",\"byteLength\":" + std::to_string(size) + "}");
-    accessors_.push_back("{\"bufferView\":" + std::to_string(accessors_.size()) +
-                         ",\"componentType\":" + std::to_string(componentType) +
-                         ",\"count\":" + std::to_string(count / widths.at(type)) + R"(,"type":")" + type + "\"}");
-    bytes_.append(static_cast<const char*>(data), size);
+    const std::size_t from = view({static_cast<const char*>(data), size});
+    return accessor("\"bufferView\":" + std::to_string(from) + ",\"componentType\":" + std::to_string(componentType) +
+                    ",\"count\":" + std::to_string(count / widths.at(type)) + R"(,"type":")" + type + "\"" + more);
+}
+
+std::size_t GltfWriter::view(const std::string& bytes, const std::string& more) {
+    return viewLike("{BYTES" + more + "}", bytes);
+}
+
+std::size_t GltfWriter::viewLike(std::string members, const std::string& bytes) {
+    const std::string place = R"("buffer":0,"byteOffset":)" + std::to_string(bytes_.size()) +
+                              ",\"byteLength\":" + std::to_string(bytes.size());
+    views_.push_back(members.replace(members.find("BYTES"), 5, place));
+    bytes_ += bytes;
     bytes_.resize((bytes_.size() + 3) / 4 * 4);
+    return views_.size() - 1;
+}
+
+std::size_t GltfWriter::accessor(const std::string& members) {
+    accessors_.push_back("{" + members + "}");
     return accessors_.size() - 1;
 }
 
 std::string GltfWriter::json(const std::string& buffer) const {
-    return R"({"asset":{"version":"2.0"},"scene":0,"scenes":[{"nodes":[)" + roots + "]}],\n\"nodes\":" + joined(nodes) +
-           ",\n\"meshes\":" + joined(meshes) + ",\n\"skins\":" + joined(skins) +
+    return R"({"asset":{"version":"2.0"})" + more + R"(,"scene":0,"scenes":[{"nodes":[)" + roots +
+           "]}],\n\"nodes\":" + joined(nodes) + ",\n\"meshes\":" + joined(meshes) + ",\n\"skins\":" + joined(skins) +
            ",\n\"animations\":" + joined(animations) + ",\n\"accessors\":" + joined(accessors_) +
            ",\n\"bufferViews\":" + joined(views_) + ",\n\"buffers\":[{\"byteLength\":" + std::to_string(bytes_.size()) +
-           buffer + "}]}";
+           buffer + "}" + buffers + "]}";
 }
 
 std::string GltfWriter::text() const {

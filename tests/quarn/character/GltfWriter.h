@@ -13,6 +13,17 @@ public:
     /// Add an accessor, with a buffer view of its own, and give its index. `type` "SCALAR", "VEC3", ...
     std::size_t floats(const std::string& type, const std::vector<float>& values);
     std::size_t shorts(const std::string& type, const std::vector<std::uint16_t>& values);
+    /// Of any type; `more` are further members as JSON, with a comma before each.
+    template <class Value>
+    std::size_t values(const std::string& type, int componentType, const std::vector<Value>& values,
+                       const std::string& more = "") {
+        return add(type, componentType, values.size(), values.data(), values.size() * sizeof(Value), more);
+    }
+    /// A view of these bytes, and an accessor of `members`: their indices.
+    std::size_t view(const std::string& bytes, const std::string& more = "");
+    std::size_t accessor(const std::string& members);
+    /// A view that is described by JSON, with "BYTES" for the members that say where in the buffer the bytes are.
+    std::size_t viewLike(std::string members, const std::string& bytes);
     /// Lets the first mesh have another accessor as its "POSITION", "indices" and so on.
     void replace(const std::string& name, std::size_t accessor);
 
@@ -22,12 +33,15 @@ public:
     std::vector<std::string> skins;
     std::vector<std::string> animations;
     std::string roots = "0"; ///< of the scene
+    std::string more;        ///< members of the file, with a comma before each
+    std::string buffers;     ///< behind the one that there is, the same way
 
     std::string text() const;   ///< with the buffer in it
     std::string binary() const; ///< the same as .glb
 
 private:
-    std::size_t add(const std::string& type, int componentType, std::size_t count, const void* data, std::size_t size);
+    std::size_t add(const std::string& type, int componentType, std::size_t count, const void* data, std::size_t size,
+                    const std::string& more = "");
     std::string json(const std::string& buffer) const;
 
     std::string bytes_;

@@ -71,11 +71,6 @@ TEST(CharacterWarnings, EachIsOneSentence) {
              file.skins.emplace_back(R"({"joints":[0,1]})");
              addMesh(file, R"(,"JOINTS_0":2,"WEIGHTS_0":3)");
          }},
-        {"meshes[0] has morph targets, which are not read",
-         [](GltfWriter& file) {
-             std::string& mesh = file.meshes[0];
-             mesh.insert(mesh.find("\"indices\""), R"("targets":[{"POSITION":0}],)");
-         }},
         {"the mesh \"arm\" has 1 polygons with less than three different corners, which are left out",
          [](GltfWriter& file) {
              auto triangles = stripTriangles();

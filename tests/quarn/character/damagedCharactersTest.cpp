@@ -63,7 +63,7 @@ TEST(DamagedCharacters, TextsAreRefusedWithTheReason) {
         {"skins[0] has nodes[1] twice", "\"joints\":[0,1]", "\"joints\":[1,1]"},
         {"skins[0] has 3 joints, but 2 inverse bind matrices", "\"joints\":[0,1]", "\"joints\":[0,1,2]"},
         {"has no positions", "\"POSITION\"", "\"POSITIO\""},
-        {"uses accessors[1], which does not hold floats by fours", "\"WEIGHTS_0\":3", "\"WEIGHTS_0\":1"},
+        {"uses accessors[1], which does not hold weights by fours", "\"WEIGHTS_0\":3", "\"WEIGHTS_0\":1"},
         {"accessors[0]: 9 elements leave bufferViews[0]", "\"count\":8,\"type\":\"VEC3\"",
          "\"count\":9,\"type\":\"VEC3\""},
         {"accessors[0]: 4000000000 elements leave", "\"count\":8,\"type\":\"VEC3\"",

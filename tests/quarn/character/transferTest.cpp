@@ -15,7 +15,8 @@ Character moving() {
     channel.joint = 1;
     channel.rotation.interpolation = Interpolation::Step;
     channel.rotation.keys = {{0.5, HQuaternion(1.0, {0, 0, 1})}};
-    character.animations.push_back({"wave", 0.5, {channel}});
+    character.meshes[0].morphTargets = {{"smile", 0.25, {1, 5}, {HVector(0, 0, 1), HVector(0, 2, 0)}}};
+    character.animations.push_back({"wave", 0.5, {channel}, {{0, 0, {Interpolation::Linear, {{0.5, 1.0}}}}}});
     character.warnings.emplace_back("something is odd");
     return character;
 }
@@ -29,6 +30,8 @@ TEST(Transfer, ACharacterComesOverAsItIs) {
     EXPECT_EQ(after.joints.at(1).restTransform, before.joints[1].restTransform);
     EXPECT_EQ(after.animations.at(0).channels.at(0).rotation.keys.at(0).value,
               before.animations[0].channels[0].rotation.keys[0].value);
+    EXPECT_EQ(after.meshes[0].morphTargets.at(0).deltas, before.meshes[0].morphTargets[0].deltas);
+    EXPECT_EQ(after.animations[0].morphs.at(0).weight.keys.at(0).value, 1.0);
     EXPECT_EQ(after.warnings, before.warnings);
 }
 
