@@ -101,7 +101,7 @@ struct Animation {
     std::string name;     ///< not empty, unique among the animations
     double seconds = 0.0; ///< the time of the last key, 0 or above
     std::vector<JointChannel> channels;
-    std::vector<MorphChannel> morphs;
+    std::vector<MorphChannel> morphs = {};
 };
 
 struct Character {

@@ -111,6 +111,28 @@ std::size_t addRotation(const Track<HQuaternion>& track, const JointRest& rest, 
     return 1;
 }
 
+std::size_t addWeight(const Track<double>& track, double rest, const std::string& target, double framesPerSecond,
+                      const HObject& sliders, std::uint32_t index) {
+    const std::vector<Key<double>> keys = framesOf(track, framesPerSecond);
+    std::vector<double> values;
+    bool moves = false;
+    for (const Key<double>& key : keys) {
+        moves = moves || differs(key.value, rest);
+        values.push_back(key.value);
+    }
+    if (!moves)
+        return 0;
+    const HObject curve =
+        makeCurve("animCurve", nodeName(sliders) + "_" + target, track.interpolation, timesOf(keys), values);
+    const std::string slider = "slider[" + std::to_string(index) + "].";
+    connect(plugOf(curve, "output"), plugOf(sliders, slider + "value"));
+    // what the file does is in the range
+    const auto [least, largest] = std::minmax_element(values.begin(), values.end());
+    setNumber(plugOf(sliders, slider + "minValue"), std::min({0.0, rest, *least}));
+    setNumber(plugOf(sliders, slider + "maxValue"), std::max({1.0, rest, *largest}));
+    return 1;
+}
+
 } // namespace
 
 int lastFrameOf(double seconds, double framesPerSecond) {
@@ -122,8 +144,8 @@ HQuaternion rotateOf(const HQuaternion& rotation, const JointRest& rest) {
     return rotation * rest.orient.conjugate();
 }
 
-std::size_t addAnimation(const Animation& animation, const std::vector<JointRest>& rests, double framesPerSecond,
-                         const CharacterScene& scene) {
+std::size_t addAnimation(const Character& character, const Animation& animation, const std::vector<JointRest>& rests,
+                         double framesPerSecond, const CharacterScene& scene) {
     if (!std::isfinite(frameOf(animation.seconds, framesPerSecond)))
         throw std::runtime_error("the animation \"" + animation.name + "\" has no last frame at this frame rate");
     std::size_t made = 0;
@@ -133,6 +155,11 @@ std::size_t addAnimation(const Animation& animation, const std::vector<JointRest
         made += addVector(channel.translation, rest.translate, "translate", framesPerSecond, joint);
         made += addRotation(channel.rotation, rest, framesPerSecond, joint);
         made += addVector(channel.scale, rest.scale, "scale", framesPerSecond, joint);
+    }
+    for (const MorphChannel& channel : animation.morphs) {
+        const MorphTarget& target = character.meshes[channel.mesh].morphTargets[channel.target];
+        made += addWeight(channel.weight, target.restWeight, target.name, framesPerSecond,
+                          scene.meshes[channel.mesh].morphs.sliders, channel.target);
     }
     return made;
 }

@@ -75,9 +75,11 @@ HObject makeMesh(const CharacterMesh& mesh, const HMatrix& toScene) {
     return node;
 }
 
-HObject makeSkin(const SkinBinding& binding, const HObject& mesh, const CharacterScene& scene) {
-    HObject skin = createNode("skinCluster", nodeName(mesh) + "_skin");
-    connect(plugOf(mesh, "outMesh"), plugOf(skin, "input[0].inputGeometry"));
+HObject makeSkin(const SkinBinding& binding, const SceneMesh& made, const CharacterScene& scene) {
+    HObject skin = createNode("skinCluster", nodeName(made.mesh) + "_skin");
+    const bool morphs = !made.morphs.shapes.isNull();
+    connect(morphs ? plugOf(made.morphs.shapes, "outputGeom[0]") : plugOf(made.mesh, "outMesh"),
+            plugOf(skin, "input[0].inputGeometry"));
     for (std::size_t k = 0; k < binding.joints.size(); ++k) {
         const std::string element = "[" + std::to_string(k) + "]";
         connect(plugOf(scene.joints[binding.joints[k].joint], "worldMatrix"), plugOf(skin, "matrix" + element));
@@ -100,9 +102,10 @@ CharacterScene buildScene(const Character& character, const std::vector<JointRes
     scene.meshes.reserve(character.meshes.size());
     for (const CharacterMesh& mesh : character.meshes) {
         const SkinBinding binding = bindMesh(mesh, worlds);
-        SceneMesh made{makeMesh(mesh, binding.toScene), {}};
+        SceneMesh made{makeMesh(mesh, binding.toScene), {}, {}};
+        made.morphs = makeMorphs(mesh, made.mesh, binding.toScene);
         if (!binding.joints.empty())
-            made.skin = makeSkin(binding, made.mesh, scene);
+            made.skin = makeSkin(binding, made, scene);
         if (binding.movedAtRest >= 0)
             scene.notes.push_back("the mesh \"" + mesh.name +
                                   "\" was bound in another pose than the rest pose of the file (joint \"" +

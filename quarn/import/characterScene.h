@@ -3,6 +3,7 @@
 #pragma once
 
 #include "quarn/character/Character.h"
+#include "quarn/import/morphShapes.h"
 #include "quarn/import/restPose.h"
 
 #include "openquarn/HObject.h"
@@ -14,7 +15,8 @@ namespace quarn {
 
 struct SceneMesh {
     HObject mesh;
-    HObject skin; ///< null for a mesh that nothing moves
+    MorphNodes morphs; ///< between mesh and skin
+    HObject skin;      ///< null for a mesh that no joint moves
 };
 
 struct CharacterScene {

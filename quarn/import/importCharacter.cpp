@@ -6,6 +6,7 @@
 #include "quarn/character/rootsWarning.h"
 #include "quarn/console/Log.h"
 #include "quarn/import/animationCurves.h"
+#include "quarn/import/clips.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/import/posedJoints.h"
 #include "quarn/import/reparent.h"
@@ -28,16 +29,31 @@ void append(std::vector<std::string>& texts, std::vector<std::string>&& more) {
     texts.insert(texts.end(), std::make_move_iterator(more.begin()), std::make_move_iterator(more.end()));
 }
 
-const Animation* chosenAnimation(const Character& character, const ImportOptions& options) {
-    if (options.animation.empty() && character.animations.empty())
-        return nullptr;
+const Animation* animationNamed(const Character& character, const std::string& name, const std::string& file) {
     std::string names;
     for (const Animation& animation : character.animations) {
-        if (options.animation.empty() || animation.name == options.animation)
+        if (animation.name == name)
             return &animation;
         names += (names.empty() ? "; it has " : ", ") + animation.name;
     }
-    throw std::runtime_error(options.file.string() + " has no animation \"" + options.animation + "\"" + names);
+    throw std::runtime_error(file + " has no animation \"" + name + "\"" + names);
+}
+
+std::vector<const Animation*> chosenAnimations(const Character& character, const ImportOptions& options) {
+    std::vector<const Animation*> chosen;
+    const bool all = options.animations == std::vector<std::string>{"all"};
+    for (const Animation& animation : character.animations)
+        if (all || (options.animations.empty() && chosen.empty()))
+            chosen.push_back(&animation);
+    if (all || options.animations.empty())
+        return chosen;
+    for (const std::string& name : options.animations) {
+        const Animation* animation = animationNamed(character, name, options.file.string());
+        if (std::find(chosen.begin(), chosen.end(), animation) != chosen.end())
+            throw std::runtime_error("--animation " + name + " is given twice");
+        chosen.push_back(animation);
+    }
+    return chosen;
 }
 
 std::vector<const Animation*> allAnimations(const Character& character) {
@@ -75,7 +91,7 @@ public:
 
     ImportReport run() {
         readInput();
-        const Animation* animation = chosenAnimation(character_, options_);
+        const Animation* animation = layAnimations();
         const std::vector<JointRest> rests = splitRests(character_, animation);
         const PosedJoints posed = options_.neuralWarp ? choose(rests, animation) : PosedJoints();
 
@@ -84,10 +100,10 @@ public:
         CharacterScene scene = buildScene(character_, rests);
         append(report_.warnings, std::move(scene.notes));
         if (animation != nullptr && !options_.noAnimation)
-            report_.curves = addAnimation(*animation, rests, options_.framesPerSecond, scene);
+            report_.curves = addAnimation(character_, *animation, rests, options_.framesPerSecond, scene);
         if (options_.neuralWarp)
             connectWarp(nodes, settings(animation), posed.joints, scene);
-        tellWhatThereIs(scene, posed, options_.noAnimation ? nullptr : animation);
+        tellWhatThereIs(scene, posed);
         writeLimits(posed);
         writeFiles(session, scene);
         return std::move(report_);
@@ -110,6 +126,14 @@ private:
             limits_ = readLimits(options_.limits);
         if (options_.neuralWarp)
             requireSkin();
+    }
+
+    const Animation* layAnimations() {
+        const std::vector<const Animation*> chosen = chosenAnimations(character_, options_);
+        if (chosen.empty())
+            return nullptr;
+        clips_ = layClips(character_, chosen, options_.framesPerSecond);
+        return &clips_.animation;
     }
 
     // a file of plain meshes, say: what it has, and what is missing
@@ -160,7 +184,7 @@ private:
         return posed;
     }
 
-    void tellWhatThereIs(const CharacterScene& scene, const PosedJoints& posed, const Animation* used) {
+    void tellWhatThereIs(const CharacterScene& scene, const PosedJoints& posed) {
         report_.scene = options_.output.string();
         report_.metersPerUnit = character_.metersPerUnit;
         for (std::size_t i = 0; i < character_.meshes.size(); ++i)
@@ -170,7 +194,15 @@ private:
         for (const PosedJoint& joint : posed.joints)
             report_.joints[joint.joint].posed = true;
         for (const Animation& animation : character_.animations)
-            report_.animations.push_back({animation.name, animation.seconds, &animation == used});
+            tellAnimation(animation);
+    }
+
+    void tellAnimation(const Animation& animation) {
+        ImportReport::Animation told{animation.name, animation.seconds, false, 0, 0};
+        for (const ClipRange& range : clips_.ranges)
+            if (range.name == animation.name && !options_.noAnimation)
+                told = {animation.name, animation.seconds, true, range.firstFrame, range.lastFrame};
+        report_.animations.push_back(told);
     }
 
     void tellMesh(const CharacterMesh& mesh, const SceneMesh& made) {
@@ -178,7 +210,7 @@ private:
         const fs::path map = mapFile(options_.output, node, character_.meshes.size());
         report_.meshes.push_back({mesh.name, node, made.skin.isNull() ? "" : nodeName(made.skin), mesh.joinedOf.size(),
                                   mesh.points.size(), mesh.polygonSizes.size(), mesh.bindings.size(),
-                                  map.filename().string()});
+                                  mesh.morphTargets.size(), map.filename().string()});
         if (made.skin.isNull() && options_.neuralWarp)
             report_.notes.push_back("the mesh \"" + mesh.name +
                                     "\" follows no joint and is no geometry of the deformer");
@@ -203,6 +235,8 @@ private:
         set("vertexMapFile",
             OpenQuarn::pathForScene(mapFile(options_.output, "{mesh}", character_.meshes.size()), folder));
         setNumber(plugOf(scene.character, "framesPerSecond"), options_.framesPerSecond);
+        if (!clips_.ranges.empty() && !options_.noAnimation)
+            set("clips", clipsText(clips_.ranges));
         // maps before the scene, which knows them by their digests: a scene never goes with the maps of another
         // (decision 0132)
         std::string digests;
@@ -219,6 +253,7 @@ private:
 
     const ImportOptions& options_;
     Character character_;
+    Clips clips_;
     LimitMap limits_;
     ImportReport report_;
 };

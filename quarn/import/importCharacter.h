@@ -17,9 +17,9 @@ struct ImportOptions {
     std::filesystem::path file;
     std::filesystem::path output;
     double framesPerSecond = 24.0;
-    std::string animation;         ///< by name; empty for the first
-    bool noAnimation = false;      ///< no curves; limits of poses still come from `animation`
-    std::filesystem::path parents; ///< see readParents(); empty for none
+    std::vector<std::string> animations; ///< by name, laid one after another; "all" for all; empty for the first
+    bool noAnimation = false;            ///< no curves; limits of poses still come from `animations`
+    std::filesystem::path parents;       ///< see readParents(); empty for none
     std::optional<double> metersPerUnit;
     bool neuralWarp = false;
     WarpSettings warp;
@@ -41,6 +41,7 @@ struct ImportReport {
         std::size_t vertices = 0; ///< after joining
         std::size_t polygons = 0;
         std::size_t joints = 0;
+        std::size_t morphTargets = 0;
         std::string vertexMap; ///< the file, as the scene names it
     };
     struct Joint {
@@ -52,6 +53,8 @@ struct ImportReport {
         std::string name;
         double seconds = 0.0;
         bool used = false;
+        int firstFrame = 0; ///< where it lies in the scene, if it is used
+        int lastFrame = 0;
     };
     std::string scene;
     std::vector<Mesh> meshes;

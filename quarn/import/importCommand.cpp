@@ -30,7 +30,11 @@ void addFiles(CLI::App& command, Options& options) {
 
 void addAnimationFlags(CLI::App& command, Options& options) {
     command.add_option("--fps", options.framesPerSecond, "Frames of a second")->capture_default_str();
-    command.add_option("--animation", options.animation, "The animation to take; default the first")->type_name("NAME");
+    command
+        .add_option("--animation", options.animations,
+                    "The animation to take, or all; may be repeated: they lie one after another. Default the first")
+        ->type_name("NAME")
+        ->allow_extra_args(false);
     command.add_flag("--no-animation", options.noAnimation, "No curves; limits of poses still come from the animation");
 }
 

@@ -30,6 +30,7 @@ void writeMesh(JsonWriter& writer, const ImportReport::Mesh& mesh) {
     writeCount(writer, "vertices", mesh.vertices);
     writeCount(writer, "polygons", mesh.polygons);
     writeCount(writer, "joints", mesh.joints);
+    writeCount(writer, "morphTargets", mesh.morphTargets);
     writeText(writer, "vertexMap", mesh.vertexMap);
     writer.EndObject();
 }
@@ -47,7 +48,15 @@ void writeAnimation(JsonWriter& writer, const ImportReport::Animation& animation
     writeText(writer, "name", animation.name);
     writeNumber(writer, "seconds", animation.seconds);
     writeBool(writer, "used", animation.used);
+    if (animation.used) {
+        writeCount(writer, "firstFrame", static_cast<std::uint64_t>(animation.firstFrame));
+        writeCount(writer, "lastFrame", static_cast<std::uint64_t>(animation.lastFrame));
+    }
     writer.EndObject();
+}
+
+std::string morphText(const ImportReport::Mesh& mesh) {
+    return mesh.morphTargets == 0 ? "" : ", " + std::to_string(mesh.morphTargets) + " morph targets";
 }
 
 } // namespace
@@ -57,14 +66,17 @@ std::string reportText(const ImportReport& report) {
     text.imbue(std::locale::classic());
     for (const ImportReport::Mesh& mesh : report.meshes)
         text << "mesh " << mesh.node << ": " << mesh.fileVertices << " vertices in the file, joined to "
-             << mesh.vertices << "; " << mesh.polygons << " polygons, " << mesh.joints << " joints\n";
+             << mesh.vertices << "; " << mesh.polygons << " polygons, " << mesh.joints << " joints" << morphText(mesh)
+             << '\n';
     text << "joints: " << report.joints.size() << '\n';
     for (const ImportReport::Animation& animation : report.animations) {
         text << "animation " << animation.name << ": " << animation.seconds << " s";
         if (animation.used)
-            text << ", " << report.curves << " curves";
+            text << ", frames " << animation.firstFrame << " to " << animation.lastFrame;
         text << '\n';
     }
+    if (report.curves > 0)
+        text << "curves: " << report.curves << '\n';
     if (report.poseInputs > 0)
         text << "deformer warp: " << report.poseInputs << " angles to pose\n";
     text << "scene " << report.scene << '\n';

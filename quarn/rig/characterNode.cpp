@@ -22,6 +22,7 @@ HObject characterNode::framesPerSecond;
 HObject characterNode::sourceFile;
 HObject characterNode::vertexMapFile;
 HObject characterNode::vertexMapDigests;
+HObject characterNode::clips;
 
 characterNode::characterNode() = default;
 characterNode::~characterNode() = default;
@@ -37,7 +38,8 @@ HStatus characterNode::initialize() {
     sourceFile = make.data("sourceFile", "sf", HFnData::kString, {.filename = true});
     vertexMapFile = make.data("vertexMapFile", "vmf", HFnData::kString, {.filename = true});
     vertexMapDigests = make.data("vertexMapDigests", "vmd", HFnData::kString);
-    make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile, vertexMapDigests});
+    clips = make.data("clips", "clp", HFnData::kString);
+    make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile, vertexMapDigests, clips});
     return make.status();
 }
 

@@ -49,16 +49,16 @@ void GltfWriter::replace(const std::string& name, std::size_t accessor) {
 }
 
 std::size_t GltfWriter::add(const std::string& type, int componentType, std::size_t count, const void* data,
-                            std::size_t size, const std::string& more) {
+                            std::size_t size, const std::string& members) {
     static const std::map<std::string, std::size_t> widths{
         {"SCALAR", 1}, {"VEC2", 2}, {"VEC3", 3}, {"VEC4", 4}, {"MAT4", 16}};
     const std::size_t from = view({static_cast<const char*>(data), size});
     return accessor("\"bufferView\":" + std::to_string(from) + ",\"componentType\":" + std::to_string(componentType) +
-                    ",\"count\":" + std::to_string(count / widths.at(type)) + R"(,"type":")" + type + "\"" + more);
+                    ",\"count\":" + std::to_string(count / widths.at(type)) + R"(,"type":")" + type + "\"" + members);
 }
 
-std::size_t GltfWriter::view(const std::string& bytes, const std::string& more) {
-    return viewLike("{BYTES" + more + "}", bytes);
+std::size_t GltfWriter::view(const std::string& bytes, const std::string& members) {
+    return viewLike("{BYTES" + members + "}", bytes);
 }
 
 std::size_t GltfWriter::viewLike(std::string members, const std::string& bytes) {

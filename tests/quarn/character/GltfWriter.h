@@ -13,15 +13,15 @@ public:
     /// Add an accessor, with a buffer view of its own, and give its index. `type` "SCALAR", "VEC3", ...
     std::size_t floats(const std::string& type, const std::vector<float>& values);
     std::size_t shorts(const std::string& type, const std::vector<std::uint16_t>& values);
-    /// Of any type; `more` are further members as JSON, with a comma before each.
+    /// Of any type; `members` are further ones as JSON, with a comma before each.
     template <class Value>
     std::size_t values(const std::string& type, int componentType, const std::vector<Value>& values,
-                       const std::string& more = "") {
-        return add(type, componentType, values.size(), values.data(), values.size() * sizeof(Value), more);
+                       const std::string& members = "") {
+        return add(type, componentType, values.size(), values.data(), values.size() * sizeof(Value), members);
     }
-    /// A view of these bytes, and an accessor of `members`: their indices.
-    std::size_t view(const std::string& bytes, const std::string& more = "");
-    std::size_t accessor(const std::string& members);
+    /// A view of these bytes, and an accessor of the members `object`: their indices.
+    std::size_t view(const std::string& bytes, const std::string& members = "");
+    std::size_t accessor(const std::string& object);
     /// A view that is described by JSON, with "BYTES" for the members that say where in the buffer the bytes are.
     std::size_t viewLike(std::string members, const std::string& bytes);
     /// Lets the first mesh have another accessor as its "POSITION", "indices" and so on.
@@ -41,7 +41,7 @@ public:
 
 private:
     std::size_t add(const std::string& type, int componentType, std::size_t count, const void* data, std::size_t size,
-                    const std::string& more = "");
+                    const std::string& members = "");
     std::string json(const std::string& buffer) const;
 
     std::string bytes_;

@@ -190,9 +190,11 @@ GltfWriter movingStrip(const Storage& storage) {
     Floats up(24, 0.0F), apart(24, 0.0F);
     up[5] = up[14] = 0.75F; // the two halves of a seam's end
     apart[8] = 0.5F;        // one half of the other end
+    const std::size_t first = storage.deltas(file, up);
+    const std::size_t second = storage.deltas(file, apart);
     std::string& mesh = file.meshes[0];
-    mesh.insert(mesh.find("\"indices\""), R"("targets":[{"POSITION":)" + text(storage.deltas(file, up)) +
-                                              R"(},{"POSITION":)" + text(storage.deltas(file, apart)) + "}],");
+    mesh.insert(mesh.find("\"indices\""),
+                R"("targets":[{"POSITION":)" + text(first) + R"(},{"POSITION":)" + text(second) + "}],");
     mesh.insert(1, R"("extras":{"targetNames":["up","up"]},)");
     const std::size_t times = file.floats("SCALAR", {0, 1});
     const std::size_t turns = storage.fours(file, {0, 0, 0.6F, 0.8F, 0, 0, -1, 0});
@@ -265,6 +267,45 @@ TEST(StoredValues, MorphTargetsAreReadWithTheirWeights) {
     EXPECT_EQ(character.animations[0].channels.size(), 1U);
 }
 
+// points (by 14 bits), joints and weights of the strip as Draco's encoder writes them, with the ids 0, 1 and 2
+const std::string dracoStrip =
+    "RFJBQ08CAgEAAAAECAEAAQIAAgMEBQYEBgcBAwAJAwAABAQEAAEECQQAAgIBAAABAQAPAwEILwE4AwBQhfj/AQAAAAD4/wGA"
+    "/x8AAAD+//8fAPD/AQAAAAD4/wGA/h8AAAAAAAAAAP8/AAAAAQEBAQIBPgECAwC/kwAAAAABAAAAAACAPwAAAAAAAAAAAAAA"
+    "AAAAAD8AAAA/AAAAAAAAAAAAAAA/AAAAPwAAAAAAAAAAAACAPwAAAAAAAAAAAAAAAAAAAD8AAAA/AAAAAAAAAAAAAAAAAACA"
+    "PwAAAAAAAAAAAAAAAAAAgD8AAAAAAAAAAAAAAD8AAAA/AAAAAAAAAAAAAAAAAAAAAAAAAAAAAABADg==";
+
+TEST(StoredValues, DracoIsLeftToTheImporter) {
+    const auto dracoFile = [](int weightType) {
+        GltfWriter file = Strip().write();
+        file.buffers = R"(,{"byteLength":274,"uri":"data:application/octet-stream;base64,)" + dracoStrip + "\"}";
+        file.more = R"(,"extensionsUsed":["KHR_draco_mesh_compression"])"
+                    R"(,"extensionsRequired":["KHR_draco_mesh_compression"])";
+        const std::size_t view = file.viewLike(R"({"buffer":1,"byteLength":274,"extras":{BYTES}})", "");
+        const auto values = [&](const char* type, int component, int count) {
+            return file.accessor("\"type\":\"" + std::string(type) + "\",\"componentType\":" +
+                                 std::to_string(component) + ",\"count\":" + std::to_string(count));
+        };
+        file.replace("POSITION", values("VEC3", 5126, 8));
+        file.replace("JOINTS_0", values("VEC4", 5123, 8));
+        file.replace("WEIGHTS_0", values("VEC4", weightType, 8));
+        file.replace("indices", values("SCALAR", 5123, 12));
+        std::string& mesh = file.meshes[0];
+        mesh.insert(mesh.find("\"attributes\""), R"("extensions":{"KHR_draco_mesh_compression":{"bufferView":)" +
+                                                     std::to_string(view) +
+                                                     R"(,"attributes":{"POSITION":0,"JOINTS_0":1,"WEIGHTS_0":2}}},)");
+        return file;
+    };
+    const Character plain = read(Strip().write());
+    const Character character = read(dracoFile(5126));
+    ASSERT_EQ(character.meshes.at(0).joinedOf.size(), 8U);
+    EXPECT_EQ(character.meshes[0].polygonSizes, plain.meshes.at(0).polygonSizes);
+    const std::vector<HMatrix> worlds = plainWorlds(plain, -1.0);
+    for (std::size_t v = 0; v < 6; ++v)
+        EXPECT_TRUE(plainPoint(character.meshes[0], worlds, v).isEquivalent(plain.meshes[0].points[v], 2.0 / 16383));
+    EXPECT_EQ(character.meshes[0].influences.at(1).at(1).weight, 0.5);
+    EXPECT_THAT(failureOf([&] { read(dracoFile(5121)); }), HasSubstr("does not hold floats by fours"));
+}
+
 // one replacement in the text of a sound file
 TEST(StoredValues, DamagedOnesAreRefusedWithTheReason) {
     const Meshopt meshopt;
@@ -278,7 +319,7 @@ TEST(StoredValues, DamagedOnesAreRefusedWithTheReason) {
         {meshopt, "\"mode\":\"ATTRIBUTES\"", "\"mode\":\"x\"", "the mode \"x\", which is not known"},
         {meshopt, "\"filter\":\"NONE\"", "\"filter\":\"QUATERNION\"", "has a stride of 12 bytes"},
         {meshopt, "\"byteStride\":12,\"count\":8", "\"byteStride\":12,\"count\":7", "and its compressed data 84"},
-        {meshopt, "\"byteStride\":12,\"count\":8", "\"byteStride\":12,\"count\":9", "meshopt compression is damaged"},
+        {meshopt, "\"byteStride\":12,\"count\":8", "\"byteStride\":12,\"count\":80", "meshopt compression is damaged"},
         {meshopt, "\"byteStride\":12,\"count\":8", "\"byteStride\":12,\"count\":4000000000",
          "more than 1073741824 bytes"},
         {meshopt, "\"EXT_meshopt_compression\":{\"buffer\":0", "\"EXT_meshopt_compression\":{\"buffer\":2",
@@ -292,7 +333,7 @@ TEST(StoredValues, DamagedOnesAreRefusedWithTheReason) {
         {sparse, "\"values\":{", "\"value\":{", "without \"values\" in a view"},
         {plain, "\"weights\":[0.5,0]", "\"weights\":[0.5]", "nodes[2] has other weights than its 2 morph targets"},
         {plain, "\"weights\":[0.5,0]", "\"weights\":[0.5,[]]", "a weight that is no number"},
-        {plain, "\"targets\":[{\"POSITION\":9", "\"targets\":[{\"POSITION\":1", "targets[0] uses accessors[1]"},
+        {plain, "\"targets\":[{\"POSITION\":10", "\"targets\":[{\"POSITION\":1", "targets[0] uses accessors[1]"},
         {plain, "\"targets\":[{", "\"targets\":[{},{", "a sampler of 2 times and 4 values"},
         {plain, "\"count\":4,\"type\":\"SCALAR\"", "\"count\":3,\"type\":\"SCALAR\"", "2 times and 3 values"},
         {plain, "base64,", "base64,!", ""},

@@ -43,7 +43,7 @@ public:
         , rests_((findDeformer(), splitRests(character, animation)))
         , scene_(buildScene(character, rests_)) {
         if (animation != nullptr)
-            addAnimation(*animation, rests_, testFrameRate, scene_);
+            addAnimation(character, *animation, rests_, testFrameRate, scene_);
     }
 
     /// Every skinned vertex is where the plain formula has it, at rest (seconds below 0) or in the animation.

@@ -180,6 +180,67 @@ TEST_F(ImportCharacter, ParentsMendASkeletonInPieces) {
     EXPECT_STREQ(findPlug("lower.parentMatrix").source().name().asChar(), "upper.worldMatrix");
 }
 
+// "lower" turns, then jumps up; one end of the strip rises in the second only, which is not a whole number of frames
+// long
+void turnAndRise(GltfWriter& file) {
+    turnLower(file);
+    const std::size_t times = file.floats("SCALAR", {0, 0.55F});
+    const std::size_t moves = file.floats("VEC3", {1, 0, 0, 1, 4, 0});
+    const std::size_t weights = file.floats("SCALAR", {0.5F, 1.5F});
+    file.animations.push_back(R"({"name":"rise","samplers":[{"interpolation":"STEP","input":)" + std::to_string(times) +
+                              ",\"output\":" + std::to_string(moves) + "},{\"input\":" + std::to_string(times) +
+                              ",\"output\":" + std::to_string(weights) +
+                              R"(}],"channels":[{"sampler":0,"target":{"node":1,"path":"translation"}},)"
+                              R"({"sampler":1,"target":{"node":2,"path":"weights"}}]})");
+    std::vector<float> deltas(24, 0.0F);
+    deltas[2] = 1.0F;
+    std::string& mesh = file.meshes[0];
+    mesh.insert(mesh.find("\"indices\""),
+                R"("targets":[{"POSITION":)" + std::to_string(file.floats("VEC3", deltas)) + "}],");
+    mesh.insert(1, R"("weights":[0.25],"extras":{"targetNames":["high"]},)");
+}
+
+TEST_F(ImportCharacter, ClipsLieOneAfterAnotherAndShapesBeforeTheSkin) {
+    Strip strip;
+    strip.more = turnAndRise;
+    options_.file = write("clips.gltf", strip.write().text());
+    options_.framesPerSecond = 10.0;
+    options_.neuralWarp = true;
+    options_.withRoots = true;
+    options_.animations = {"all"};
+    const ImportReport report = importCharacter(options_);
+    EXPECT_EQ(report.curves, 3U);
+    EXPECT_EQ(report.meshes.at(0).morphTargets, 1U);
+    EXPECT_EQ(report.animations.at(1).firstFrame, 13);
+    EXPECT_EQ(report.animations.at(1).lastFrame, 18);
+
+    SceneSession session(SceneOptions{options_.output, {}, 0});
+    EXPECT_EQ(textOf(findPlug("character.clips")),
+              R"([{"name":"wave","first":1,"last":11},{"name":"rise","first":13,"last":18}])");
+    EXPECT_EQ(numberOf(findPlug("warp.exportEndFrame")), 18.0);
+    const struct {
+        double frame, angle, height, weight;
+    } wanted[] = {
+        {1, 0, 0, 0.25},
+        {6, 0.25, 0, 0.25},
+        {11, 0.5, 0, 0.25},
+        {12, 0.5, 0, 0.25},
+        {13, 0, 0, 0.5},
+        {18, 0, 0, 0.5 + 10.0 / 11},
+        {18.4, 0, 0, 0.5 + 10.8 / 11},
+        {19, 0, 4, 1.5},
+    };
+    for (const auto& at : wanted) {
+        SCOPED_TRACE(at.frame);
+        session.host().setTime(at.frame);
+        EXPECT_NEAR(numberOf(findPlug("lower.rotateZ")), at.angle * 3.14159265, 1e-5);
+        EXPECT_NEAR(numberOf(findPlug("lower.translateY")), at.height, 1e-5);
+        EXPECT_NEAR(numberOf(findPlug("arm_sliders.output[0]")), at.weight, 1e-5);
+        EXPECT_NEAR(pointsOf(findPlug("arm_skin.outputGeom[0]"))[2], at.weight, 1e-5);
+    }
+    EXPECT_NEAR(numberOf(findPlug("arm_sliders.slider[0].maxValue")), 1.5, 1e-6);
+}
+
 TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
     const auto refused = [&](const std::string& why, const std::function<void(ImportOptions&)>& change) {
         ImportOptions options = options_;
@@ -187,7 +248,13 @@ TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
         EXPECT_THAT(failureOf([&] { importCharacter(options); }), HasSubstr(why));
         EXPECT_FALSE(fs::exists(path("scene.json")));
     };
-    refused("strip.gltf has no animation \"run\"", [](ImportOptions& options) { options.animation = "run"; });
+    refused("strip.gltf has no animation \"run\"", [](ImportOptions& options) { options.animations = {"run"}; });
+    refused("--animation wave is given twice", [&](ImportOptions& options) {
+        Strip strip;
+        strip.more = turnLower;
+        options.file = write("wave.gltf", strip.write().text());
+        options.animations = {"wave", "wave"};
+    });
     refused("does not exist", [&](ImportOptions& options) { options.file = path("none.glb"); });
     refused("is the character itself", [&](ImportOptions& options) { options.output = options.file; });
     refused("is a folder", [&](ImportOptions& options) { options.output = path("."); });
