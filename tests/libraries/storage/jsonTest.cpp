@@ -49,6 +49,13 @@ TEST(Json, EachKindAcceptsWhatItsRulesSay) {
 TEST(Texts, AreTakenForWhatTheyAre) {
     EXPECT_EQ(storage::base64("") + storage::base64("f") + storage::base64("fo") + storage::base64("\xff\xfe\xfd"),
               "Zg==Zm8=//79");
+    for (const std::string bytes : {"", "f", "fo", "\xff\xfe\xfd", "four", "fifth"}) {
+        const std::string text = storage::base64(bytes);
+        EXPECT_EQ(storage::fromBase64(text), bytes);
+        EXPECT_EQ(storage::fromBase64(text.substr(0, text.find('='))), bytes);
+    }
+    for (const char* damaged : {"Z", "Zm9vZ", "Zm8-", "Z===", "Zg=a", "Zm9v Zm9v"})
+        EXPECT_FALSE(storage::fromBase64(damaged)) << damaged;
     const std::pair<const char*, std::size_t> rows[] = {
         {"", 0},     {"a\xff", 1},    {"\xc3\xa9", 2},     {"\xe2\x82\xac", 3},     {"\xf0\x9f\x98\x80", 4},
         {"\xc3", 0}, {"\xc0\x80", 0}, {"\xed\xa0\x80", 0}, {"\xf5\x80\x80\x80", 0}, {"\xa9", 0}};
