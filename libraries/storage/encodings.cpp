@@ -57,8 +57,9 @@ std::string base64(std::string_view bytes) {
 
 std::optional<std::string> fromBase64(std::string_view text) {
     static const std::array<unsigned char, 256> digits = digitsOf();
-    for (int padding = 0; padding < 2 && text.size() % 4 == 0 && text.ends_with('='); ++padding)
-        text.remove_suffix(1);
+    if (text.size() % 4 == 0)
+        for (int padding = 0; padding < 2 && text.ends_with('='); ++padding)
+            text.remove_suffix(1);
     if (text.size() % 4 == 1)
         return std::nullopt;
     std::string bytes;
