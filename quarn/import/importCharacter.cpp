@@ -13,8 +13,10 @@
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/vertexMap.h"
+#include "storage/Json.h"
 #include "storage/WholeFile.h"
 #include "storage/npyArray.h"
+#include "storage/readWholeFile.h"
 
 #include <algorithm>
 #include <stdexcept>
@@ -76,12 +78,16 @@ void checkOutput(const ImportOptions& options) {
     if (fs::is_directory(options.output))
         throw std::runtime_error(options.output.string() + " is a folder; name a file for the scene");
     storage::WholeFile::requirePossible(options.output, storage::WholeFile::Writes::anywhere); // with files beside it
-    if (options.writtenLimits.empty())
-        return;
-    if (fs::exists(options.writtenLimits, none))
-        throw std::runtime_error(options.writtenLimits.string() + " is there already, and somebody may have edited it: "
-                                                                  "name another file for the limits, or remove it");
-    storage::WholeFile::requirePossible(options.writtenLimits);
+    if (!options.writtenLimits.empty())
+        storage::WholeFile::requirePossible(options.writtenLimits);
+}
+
+// somebody may have edited what an earlier import wrote
+void requireUnedited(const fs::path& limits, const std::string& text) {
+    std::error_code none;
+    if (fs::exists(limits, none) && storage::readWholeFile(limits, storage::jsonRules::joints.mostBytes) != text)
+        throw std::runtime_error(limits.string() + " is there already with other limits, which somebody may have " +
+                                 "edited: give it to --limits, name another file for --write-limits, or remove it");
 }
 
 class Import {
@@ -222,7 +228,9 @@ private:
         std::vector<std::pair<std::string, JointLimits>> joints;
         for (const PosedJoint& joint : posed.joints)
             joints.emplace_back(character_.joints[joint.joint].name, joint.limits);
-        storage::writeWhole(options_.writtenLimits, limitsText(joints));
+        const std::string text = limitsText(joints);
+        requireUnedited(options_.writtenLimits, text);
+        storage::writeWhole(options_.writtenLimits, text);
     }
 
     void writeFiles(SceneSession& session, const CharacterScene& scene) {
