@@ -24,9 +24,11 @@ expect 2 '' '--controls' import bone.gltf -o bone.json --neural-warp --controls 
 expect 0 '6 angles' '' import bone.gltf -o bone.json --neural-warp --with-roots --write-limits limits.json -q
 expect 0 '6 angles' '' import bone.gltf -o bone.json --neural-warp --with-roots --write-limits limits.json -q
 sed -i 's/-30\.0/-12.5/' limits.json
-expect 1 '' 'limits\.json is there already with other' import bone.gltf -o bone.json --neural-warp --write-limits limits.json
+expect 1 '' 'limits\.json is there already with other' \
+  import bone.gltf -o bone.json --neural-warp --write-limits limits.json
 expect 0 '6 angles' '' import bone.gltf -o bone.json --neural-warp --limits limits.json -q
-expect 0 '^2 joints\nroot: 3 vertices; rotateX -12\.5 to 30 degrees; .*\n  bone: 3 vertices; ' '' info bone.json --joints
+expect 0 '^2 joints\nroot: 3 vertices; rotateX -12\.5 to 30 degrees; .*\n  bone: 3 vertices; ' '' \
+  info bone.json --joints
 expect 0 '"parent": "root"(.|\n)*"vertices": 3(.|\n)*"least": -12\.5' '' info bone.json --joints --json
 expect 2 '' 'excludes' import bone.gltf -o bone.json --neural-warp --limits limits.json --limits-margin 0.1
 rm limits.json
