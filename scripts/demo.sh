@@ -1,9 +1,9 @@
 # shellcheck shell=bash
 # ./run demo: from a rigged hand to a neural deformation and its report. Sourced by ./run.
 #
-# A row of the report is a quarn run (docs/run.md), whose steps are the commands that docs/tutorial.md explains; what a step
-# prints goes to a file in its log folder. Rows are two delta modes, with --all by two kinds of model; each network of a
-# demo without it is in a picture.
+# A row of the report is a quarn run (docs/run.md), whose steps are the commands that docs/tutorial.md explains; what a
+# step prints goes to a file in its log folder. Rows are two delta modes, with --all by two kinds of model; each network of
+# a demo without it is in a picture.
 
 demo_usage() {
   cat <<'TEXT'
@@ -153,8 +153,8 @@ demo_install() {
   export QUARN=$PWD/build/release/quarn/quarn
 }
 
-# What an earlier demo has made of the same poses and settings is kept: quarn run knows. Pictures and report are made anew;
-# a folder of the user's keeps whatever else is in it.
+# What an earlier demo has made of the same poses and settings is kept: quarn run knows. Pictures and report are made
+# anew; a folder of the user's keeps whatever else is in it.
 demo_folders() {
   data=$demo_out/data logs=$demo_out/log
   rm -rf "$data/preview" "$demo_out/pictures" "$logs"

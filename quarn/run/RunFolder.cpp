@@ -108,7 +108,7 @@ void RunFolder::start(const Step& step) {
     StepLine line(console_, step.label(), logOf(step));
     if (step.request)
         return runTargetProgram(step, {folder_, log.number(), ledger_.digestOf(step, versionOf(step)),
-                                       std::chrono::seconds(10), [&](std::size_t) { line.draw(); }});
+                                       std::chrono::seconds(10), [&] { line.draw(); }});
     const fs::path said = logOf(step).string() + ".answer";
     std::error_code error;
     fs::remove(said, error);

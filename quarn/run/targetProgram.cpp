@@ -101,12 +101,9 @@ public:
     void run() {
         removeOthers();
         storage::makeFolders(folder_, folder_);
-        for (std::size_t first = 0; first < request_.frames(); first += size_) {
+        for (std::size_t first = 0; first < request_.frames(); first += size_)
             if (!isThere(first))
                 ask(first);
-            if (place_.told)
-                place_.told(first + count(first));
-        }
         join();
         fs::remove_all(folder_);
     }
@@ -149,7 +146,7 @@ private:
         call.grace = place_.grace;
         if (request_.timeout > 0)
             call.timeout = std::chrono::seconds(request_.timeout);
-        if (const ProgramEnd end = runProgram(call); !end.isGood())
+        if (const ProgramEnd end = runProgram(call, place_.meanwhile); !end.isGood())
             throw std::runtime_error(end.text());
         take(answer, first);
     }

@@ -14,7 +14,7 @@ struct TargetPlace {
     int log = -1;                 ///< an open file, for what it says
     std::string digest;           ///< of the step: frames that an earlier run of another one was given do not count
     std::chrono::milliseconds grace{10'000};
-    std::function<void(std::size_t done)> told; ///< of frames that are there, meanwhile
+    std::function<void()> meanwhile; ///< as of runProgram()
 };
 
 /// The file that the program is told the path of: what there is, and what is asked for. `frames` of them, from `first`

@@ -21,7 +21,10 @@ for file in report.html pictures/l_handMeshNode.0041.png models/l_handMeshNode.n
   [[ -s $work/hand/$file ]] || { echo "the run made no $file"; exit 1; }
 done
 # pictures and the loss curve are in the page
-[[ $(grep -o 'data:image/png;base64,' "$work/hand/report.html" | wc -l) == 5 ]] || { echo "the page lacks pictures"; exit 1; }
+[[ $(grep -o 'data:image/png;base64,' "$work/hand/report.html" | wc -l) == 5 ]] || {
+  echo "the page lacks pictures"
+  exit 1
+}
 "$python" tests/demo/recompute.py "$work/hand"
 NW_PYTHON=$python "${run[@]}" 2>"$work/again" >/dev/null
 grep -qx '16 of 16 steps were done already' "$work/again" || { cat "$work/again"; exit 1; }

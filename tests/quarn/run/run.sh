@@ -24,14 +24,18 @@ SCRIPT
 with_targets=("${options[@]}" --target-command sh lift.sh)
 
 # --- to the poses, and no further ---
-expect 0 'then the same command goes on, with --targets FILE added' 'skin +\d+\.\d s\n$' run bone.gltf -o made "${options[@]}"
+expect 0 'then the same command goes on, with --targets FILE added' 'skin +\d+\.\d s\n$' \
+  run bone.gltf -o made "${options[@]}"
 expect 0 'targets are shaped alike' '^4 of 4 steps were done already\n$' run bone.gltf -o made "${options[@]}"
-[[ -s made/poses.glb && -s made/limits.json && -n $(find made/data -name poses_skin.npy) && ! -e made/lock ]] || fail "not what a tool needs"
-expect 0 'import: done\nposes: to do, as its arguments are others: --samples 11, was --samples 9\nrest: done\nskin: done, but' '' \
+[[ -s made/poses.glb && -s made/limits.json && -n $(find made/data -name poses_skin.npy) && ! -e made/lock ]] ||
+  fail "not what a tool needs"
+others='its arguments are others: --samples 11, was --samples 9'
+expect 0 "import: done\nposes: to do, as $others\nrest: done\nskin: done, but" '' \
   run bone.gltf -o made --import-option=--with-roots --samples 8 --held-out 3 --explain
 
 # --- a target command that fails, is killed, and works ---
-expect 1 '' 'targets ended with status 5\n  \| asked for "frames":\[1,.*,9\]\n  \| not yet\nall that it said is in .*/made/log/targets\.log' \
+said='  \| asked for "frames":\[1,.*,9\]\n  \| not yet\n'
+expect 1 '' "targets ended with status 5\n${said}all that it said is in .*/made/log/targets\.log" \
   run bone.gltf -o made "${with_targets[@]}"
 # interrupt SIGNAL: while the command is at work; the status goes to $status
 interrupt() {
@@ -53,14 +57,25 @@ interrupt KILL
 touch go
 expect 0 '' 'targets +\d.*\ntarget .*\n(  the targets are 0 mm .*\n)?export .*\nheld-out .*\n4 of 8 steps were done' \
   run bone.gltf -o made --until held-out "${with_targets[@]}"
-[[ ! -e made/scratch && -s $(find made/data -name dataset.json | head -n 1) ]] || fail "no data set, or a scratch folder"
+[[ ! -e made/scratch && -s $(find made/data -name dataset.json | head -n 1) ]] ||
+  fail "no data set, or a scratch folder"
+
+# --- on a terminal the line of a step counts: what its log says last ---
+cat >count.sh <<SCRIPT
+printf '10 of 30\n20 of 30\n'
+for i in \$(seq 300); do ! grep -q '20 of 30' "$work/terminal" || exit 7; sleep 0.1; done
+SCRIPT
+counted="'$quarn' run bone.gltf -o counted ${options[*]} --target-command sh count.sh"
+! script -qfec "$counted" terminal >/dev/null </dev/null || fail "a target command that fails is taken"
+grep -q 'targets ended with status 7' terminal || fail "the line does not count: $(cat terminal)"
 
 # --- nothing twice; what is spoiled, and what follows from a change, again ---
 expect 0 '' '^8 of 8 steps were done already\n$' run bone.gltf -o made --until held-out "${with_targets[@]}"
 skin=$(find made/data -name poses_skin.npy)
 cp "$skin" cache.npy
 echo spoiled >"$skin"
-expect 0 '"step": "skin",\s*"done": true,\s*"why": "its output .*poses_skin\.npy has changed"(.|\n)*"step": "targets",\s*"done": true,\s*"why": ""' \
+why='\s*"done": true,\s*"why":'
+expect 0 '"skin",'"$why"' "its output .*_skin\.npy has changed"(.|\n)*"targets",'"$why"' ""' \
   '^skin .*\n7 of 8' run bone.gltf -o made --until held-out --json "${with_targets[@]}"
 echo '# changed' >>lift.sh
 expect 0 '' '^targets .*\n7 of 8' run bone.gltf -o made --until held-out "${with_targets[@]}"
@@ -75,13 +90,15 @@ RECIPE
 expect 0 '' 'target .*\n(.|\n)*held-out .*s\n$' run --recipe recipes/bone.json -o file --until held-out
 sed 's|"targets": .*|"target-command": ["true"]}|' recipes/bone.json >recipes/command.json
 expect 1 '' 'command\.json would start a program .*: --allow-commands lets it' run --recipe recipes/command.json -o file
-expect 1 '' 'targets ended with status 0, and has not written the file' run --recipe recipes/command.json -o other --allow-commands
+expect 1 '' 'targets ended with status 0, and has not written the file' \
+  run --recipe recipes/command.json -o other --allow-commands
 
 # --- two meshes: a model each, for those that have targets ---
-sed 's/"nodes":\[0,2\]/"nodes":[0,2,3]/; s/{"mesh":0,"skin":0}/&,{"name":"other","mesh":0,"skin":0}/' bone.gltf >two.gltf
+sed -e 's/"nodes":\[0,2\]/"nodes":[0,2,3]/' -e 's/{"mesh":0,"skin":0}/&,{"name":"other","mesh":0,"skin":0}/' \
+  bone.gltf >two.gltf
 expect 0 '' 'targets mesh +\d(.|\n)*targets other(.|\n)*held-out mesh .*\nheld-out other' \
   run two.gltf -o two --until held-out "${with_targets[@]}"
-expect 0 '' 'target other .*\n(  the targets are 0 mm .*\n)?export other .*\nheld-out other .*\nmesh has no targets, and gets no model\n$' \
+expect 0 '' 'target other .*\n(  .*\n)?export other .*\nheld-out other .*\nmesh has no targets, and gets no model\n$' \
   run two.gltf -o one --until held-out "${options[@]}" --targets other=cache.npy
 expect 1 '' 'several meshes, mesh, other: whose targets are in .*cache\.npy\? Give them as MESH=FILE' \
   run two.gltf -o one "${options[@]}" --targets cache.npy
@@ -92,6 +109,6 @@ expect 1 '' 'is not empty \(' run bone.gltf -o .
 expect 2 '' 'there is no step "trian"; steps are import, ' run bone.gltf -o made --until trian
 expect 2 '' '--target-command needs a program' run bone.gltf -o made --target-command
 expect 2 '' 'samples is 1, not a whole number' run bone.gltf -o made --samples 1
-expect 1 '' 'import ended with status 1\n  \| quarn: .*none\.glb|none\.glb, which import needs, is not there' run none.glb -o none
+expect 1 '' 'none\.glb, which import needs, is not there' run none.glb -o none
 [[ ! -e none/run.json ]] || fail "a run of nothing"
 exit $bad
