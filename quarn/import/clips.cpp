@@ -18,9 +18,6 @@ struct Span {
     double held;
 };
 
-template <class Value>
-const Track<Value> noTrack{};
-
 // a step is a jump between straight lines: two keys at one time
 template <class Value>
 Track<Value> straight(const Track<Value>& track) {
