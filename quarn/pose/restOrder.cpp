@@ -19,7 +19,8 @@ double distance(std::span<const double> a, std::span<const double> b) {
 [[noreturn]] void refuseTwo(std::size_t first, std::size_t second, std::size_t scene, const std::string& meshName) {
     throw std::runtime_error("vertices " + std::to_string(first) + " and " + std::to_string(second) +
                              " of the cache are both nearest to vertex " + std::to_string(scene) + " of " + meshName +
-                             " in its rest pose: the cache is not at rest in that frame, or in another space or unit");
+                             " in its rest pose: the cache is not at rest in that frame, or in "
+                             "another space or unit (--rest-frame, --axes, --scale)");
 }
 
 constexpr auto none = static_cast<std::size_t>(-1);
