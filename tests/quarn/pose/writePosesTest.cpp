@@ -75,6 +75,8 @@ setAttr tip.scaleY -1.5; setAttr tip.scaleX 0.5
 setAttr root.parentMatrix 0 1 0 0 -1 0 0 0 0 0 1 0 3 4 5 1
 createNode animCurve -name slide; setAttr slide.keyTimes 1 40; setAttr slide.keyValues 0 3
 connectAttr time1.outTime slide.time; connectAttr slide.output root.translateZ; connectAttr slide.output tip.scaleZ
+createNode blendShape -name shapes; connectAttr strip.outMesh shapes.input[0].inputGeometry
+connectAttr -force shapes.outputGeom[0] strip_skin.input[0].inputGeometry
 )";
 const char* const inCentimetres = "createNode character -name character; setAttr character.metersPerUnit 0.01\n"
                                   "setAttr character.framesPerSecond 30\n";
@@ -95,7 +97,9 @@ TEST_F(WritePosesTest, WhatIsReadBackMovesAsTheSceneDoes) {
         options.file = path("poses.glb");
         options.output = path("back.json");
         options.framesPerSecond = row.rate;
-        EXPECT_EQ(quarn::importCharacter(options).joints.size(), row.unit == 1.0 && *row.script == '\0' ? 3U : 4U);
+        const quarn::ImportReport report = quarn::importCharacter(options);
+        EXPECT_EQ(report.joints.size(), row.unit == 1.0 && *row.script == '\0' ? 3U : 4U);
+        EXPECT_EQ(report.meshes.front().name, "strip"); // whatever moves it before its skin
         expectSame(record("back.json", 1, 40), written, row.unit, 1e-6);
 
         stripScene::quarn({"pose", scene(), "-o", path("keyed.json"), "--keys", path("poses.json")});
