@@ -10,7 +10,7 @@ import numpy as np
 import torch
 from torch import nn
 
-from . import evaluator, export, files, memory, progress, report
+from . import evaluator, export, files, memory, plausible, progress, report
 from .dataset import Dataset
 from .errors import TrainerError
 from .measure import measure
@@ -61,6 +61,8 @@ def train(job: Job) -> dict[str, Any]:
     check_size(settings, dataset.control_count, 1 if settings.principalShapesEnabled else 3 * dataset.delta_count)
     make_deterministic(job.seed, job.threads)
     memory.warn_of_slow_blas(job.say)
+    for doubt in plausible.doubts(dataset):
+        job.say(doubt)
     split = split_rows(dataset.frame_count, settings.validationRatio, job.seed)
     # the inner one is published first: a report without its model would be a lie
     with files.whole_folder(job.report, report.NAMES) as report_part:

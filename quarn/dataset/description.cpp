@@ -141,6 +141,24 @@ void writeControls(JsonWriter& writer, const std::vector<std::string>& names, co
     writer.EndArray();
 }
 
+// lengths in units of the scene
+void writeFit(JsonWriter& writer, const TargetFit& fit) {
+    writer.Key("targetFit");
+    writer.StartObject();
+    writer.Key("meanDistance");
+    writeNumber(writer, fit.asItIs.mean);
+    writer.Key("largestDistance");
+    writeNumber(writer, fit.asItIs.largest);
+    writer.Key("motion");
+    writeNumber(writer, fit.motion.size);
+    writer.Key("follows");
+    if (fit.motion.following == Following::untold)
+        writer.Null();
+    else
+        writer.Bool(fit.motion.following == Following::yes);
+    writer.EndObject();
+}
+
 void writeFiles(JsonWriter& writer) {
     writer.Key("files");
     writer.StartObject();
@@ -179,6 +197,8 @@ std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, cons
     writeNumber(writer, metersPerUnit());
     writer.Key("boundingBoxDiagonal");
     writeNumber(writer, facts.diagonal);
+    if (facts.fit && std::isfinite(facts.fit->asItIs.mean))
+        writeFit(writer, *facts.fit);
     writeTrain(writer, warp, geometry);
     writeFiles(writer);
     writer.EndObject();

@@ -4,8 +4,10 @@
 
 #include "quarn/dataset/DatasetWriter.h"
 #include "quarn/dataset/FrameSampler.h"
+#include "quarn/fit/targetFit.h"
 
 #include <filesystem>
+#include <optional>
 #include <string>
 
 namespace quarn {
@@ -14,6 +16,7 @@ struct DatasetFacts {
     std::string scene;   ///< name of its file
     double diagonal = 0; ///< of the rest mesh's bounding box, in units of the scene
     DatasetShape shape;
+    std::optional<TargetFit> fit; ///< none where the target was not compared with the skin
 };
 
 /// The text of dataset.json; docs/dataset.md lists what is in it. `controls` the complete controls.npy, whose ranges it

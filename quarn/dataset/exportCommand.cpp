@@ -5,6 +5,7 @@
 #include "quarn/dataset/commands.h"
 #include "quarn/dataset/exportControls.h"
 #include "quarn/dataset/exportDatasets.h"
+#include "quarn/scene/targetCheck.h"
 
 #include <CLI/CLI.hpp>
 
@@ -27,6 +28,9 @@ void printJson(const std::vector<ExportAnswer>& answers) {
         writeCount(writer, "controls", answer.controls);
         writeCount(writer, "vertices", answer.vertices);
         writeCount(writer, "bytes", answer.bytes);
+        FitContext context;
+        context.metersPerUnit = answer.metersPerUnit;
+        writeFit(writer, answer.fit, context, false);
         writer.EndObject();
     }
     writer.EndArray();
@@ -34,10 +38,14 @@ void printJson(const std::vector<ExportAnswer>& answers) {
 }
 
 void printText(const std::vector<ExportAnswer>& answers) {
-    for (const ExportAnswer& answer : answers)
+    for (const ExportAnswer& answer : answers) {
         std::cout << answer.geometry << ": " << answer.rows << " rows of " << answer.controls << " controls and "
                   << answer.vertices << " vertices, " << answer.bytes << " bytes, in " << answer.folder.string()
                   << '\n';
+        if (answer.fit)
+            std::cout << "its target is "
+                      << distanceText(answer.fit->asItIs, answer.fit->diagonal, answer.metersPerUnit) << '\n';
+    }
 }
 
 struct Options : ExportOptions {
@@ -88,6 +96,7 @@ void addExportCommand(CLI::App& app) {
     command->add_flag("--controls-only", options->controlsOnly,
                       "No deltas: controls.npy, frames.npy and the names, before there are targets "
                       "[trainingDataRoot/DEFORMER.controls]");
+    command->add_flag("--anyway", options->anyway, "Export a target that does not fit the skin as well");
     command->add_flag("--overwrite", options->overwrite, "Replace another data set, or give up a begun one");
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { execute(*options); });

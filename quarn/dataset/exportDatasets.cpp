@@ -8,6 +8,8 @@
 #include "quarn/dataset/sceneSetup.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/targetCheck.h"
+#include "quarn/scene/units.h"
 #include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
 
@@ -104,6 +106,7 @@ public:
         storage::FolderLock lock(folder_.part(), anotherExport);
         if (folder_.isDone(setup_)) // by now, by another process
             return alreadyDone();
+        compare();
         const std::size_t before = write();
         folder_.publish(lock);
         warnOfRepeats();
@@ -120,8 +123,33 @@ private:
 
     ExportAnswer answer(std::size_t before) const {
         const DatasetShape& shape = facts_.shape;
-        return {geometry_.name, folder_.path(), shape.rows,   before,
-                repeats_.count, shape.controls, shape.deltas, bytesOfDataset(folder_.path())};
+        return {geometry_.name,  folder_.path(), shape.rows,     before,       facts_.fit,
+                metersPerUnit(), repeats_.count, shape.controls, shape.deltas, bytesOfDataset(folder_.path())};
+    }
+
+    // while a mistake costs seconds, and not a training
+    void compare() {
+        const HIndexMapper& map = sampler_.map();
+        TargetFrames frames;
+        frames.count = frames_.count();
+        frames.last = frames.count - 1;
+        frames.reach = 3; // each is an evaluation of whatever makes the target
+        frames.time = [this](std::size_t frame) { return frames_.frame(frame); };
+        frames.read = [this](std::size_t frame, std::vector<double>& xyz) {
+            session_.host().setTime(frames_.frame(frame));
+            readPoints(geometry_.target, xyz);
+        };
+        if (!map.isIdentityMap())
+            for (const unsigned vertex : map.affectMap())
+                frames.vertices.push_back(vertex);
+        if (map.affectCount() > 0)
+            facts_.fit = compareWithSkin(session_.host(), geometry_, geometry_.original, frames, options_.console);
+        if (!facts_.fit)
+            return;
+        FitContext context;
+        context.what = "the target of " + geometry_.name;
+        context.metersPerUnit = metersPerUnit();
+        tell(verdictOf(*facts_.fit, context, false), options_.anyway, options_.console);
     }
 
     // answers how many rows there were

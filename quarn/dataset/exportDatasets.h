@@ -3,11 +3,13 @@
 #pragma once
 
 #include "quarn/console/Console.h"
+#include "quarn/fit/targetFit.h"
 #include "quarn/scene/SceneSession.h"
 
 #include <cstddef>
 #include <cstdint>
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -21,6 +23,7 @@ struct ExportOptions {
     std::string geometry;         ///< index or name; empty: all of them
     std::string frames;           ///< as frameRange() reads them; empty: exportStartFrame to exportEndFrame
     bool overwrite = false;
+    bool anyway = false; ///< a target that does not fit the skin is exported as well
     Console console;
 };
 
@@ -30,6 +33,8 @@ struct ExportAnswer {
     std::filesystem::path folder;
     std::size_t rows = 0;
     std::size_t rowsBefore = 0;   ///< of these, rows that an earlier run had made; all of them when it was complete
+    std::optional<TargetFit> fit; ///< how far the target is from the skin; none where it was not compared now
+    double metersPerUnit = 1.0;
     std::size_t rowsRepeated = 0; ///< of those that this run has made, as many as are equal to the row before
     std::size_t controls = 0;
     std::size_t vertices = 0;

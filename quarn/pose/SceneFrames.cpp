@@ -34,6 +34,17 @@ std::size_t SceneFrames::vertexCount() const {
 }
 
 void SceneFrames::read(std::size_t frame, std::vector<double>& xyz) {
+    readUnchanged(frame, xyz);
+    if (change_.isInPlace() && change_.order.empty())
+        return;
+    const std::vector<double> unchanged = xyz;
+    for (std::size_t vertex = 0; 3 * vertex < xyz.size(); ++vertex) {
+        const FitPoint point = change_.of(unchanged, vertex);
+        std::copy(point.begin(), point.end(), xyz.begin() + static_cast<std::ptrdiff_t>(3 * vertex));
+    }
+}
+
+void SceneFrames::readUnchanged(std::size_t frame, std::vector<double>& xyz) {
     std::vector<double>& points = sceneVertexOf_.empty() ? xyz : filePoints_;
     points.resize(3 * cache_->vertexCount());
     cache_->read(frame, 0, points);

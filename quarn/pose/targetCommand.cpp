@@ -9,6 +9,7 @@
 #include "quarn/console/json.h"
 #include "quarn/console/numberText.h"
 #include "quarn/pose/sceneOrder.h"
+#include "quarn/pose/targetAim.h"
 #include "quarn/pose/targetCache.h"
 #include "quarn/pose/targetFrames.h"
 #include "quarn/scene/SceneSession.h"
@@ -35,6 +36,7 @@ struct Options {
     std::string deformer;
     std::string geometry;
     std::optional<double> startFrame;
+    AimOptions aim;
     Console console;
 };
 
@@ -43,6 +45,7 @@ struct Cache {
     fs::path path;
     std::size_t frames = 0;
     bool converted = false;
+    TargetAim aim;
 };
 
 // beside the output, named after both, so that caches of two meshes or scenes do not meet
@@ -63,15 +66,16 @@ void warnOfJoined(const SceneFrames& frames, const Options& options, const WarpG
                              numberText(frames.largestDistance()) + " apart; the first of each was taken");
 }
 
-Cache fittingCache(const Options& options, const WarpGeometry& geometry) {
+Cache fittingCache(SceneSession& session, const Options& options, const Warp& warp, const WarpGeometry& geometry) {
     const Stage stage([&] { return "reading point cache " + options.file.cache.string() + " for " + geometry.name; });
     SceneFrames frames = openTargetFrames(options.file, geometry, options.console);
+    TargetAim aim = aimTarget(session.host(), warp, geometry, frames, options.file, options.aim, options.console);
     if (frames.areTheFiles())
-        return {options.file.cache, frames.frameCount(), false};
+        return {options.file.cache, frames.frameCount(), false, std::move(aim)};
     const fs::path converted = pathOfConverted(options, geometry);
     writeSceneFrames(frames, converted, options.console);
     warnOfJoined(frames, options, geometry);
-    return {converted, frames.frameCount(), true};
+    return {converted, frames.frameCount(), true, std::move(aim)};
 }
 
 // while nobody has said which frames to export: those that the cache has
@@ -112,6 +116,7 @@ void printJson(const TargetReport& report, const Cache& cache, const Options& op
     writer.Uint64(cache.frames);
     writer.Key("startFrame");
     writer.Double(report.startFrame);
+    writeFit(writer, cache.aim.fit, cache.aim.context, cache.aim.isAligned);
     writer.EndObject();
     std::cout << buffer.GetString() << '\n';
 }
@@ -128,10 +133,10 @@ void target(Options& options) {
     const Warp warp = Warp::find(options.deformer);
     const WarpGeometry& geometry = warp.geometry(options.geometry);
     options.file.startFrame = options.startFrame.value_or(numberOf(warp.plug("exportStartFrame")));
-    const Cache cache = fittingCache(options, geometry);
+    const Cache cache = fittingCache(session, options, warp, geometry);
     session.moveTo(options.output.parent_path()); // before the cache is named: its path counts from there
     const std::string named = OpenQuarn::pathForScene(cache.path, options.output.parent_path());
-    const TargetReport report = connectTarget(warp, geometry, named, options.startFrame);
+    const TargetReport report = connectTarget(warp, geometry, named, cache.aim.startFrame);
     setGoodTraining(warp.plug("train[" + std::to_string(geometry.index) + "]"));
     exportFramesOf(warp, report.startFrame, cache.frames);
     session.save(options.output);
@@ -141,7 +146,7 @@ void target(Options& options) {
     else
         std::cout << report.node << " plays " << cache.frames << " frames of " << cache.path.string() << " from frame "
                   << numberText(report.startFrame) << " on as the target of " << geometry.name
-                  << (report.replaced ? ", instead of an earlier target\n" : "\n");
+                  << (report.replaced ? ", instead of an earlier target\n" : "\n") << aimText(cache.aim);
 }
 
 } // namespace
@@ -166,6 +171,10 @@ void addTargetCommand(CLI::App& app) {
     command->add_option("--rest-frame", options->file.restFrame,
                         "Frame of the scene at which the cache is at rest, for --order rest; its first when not given");
     addCacheSpaceOptions(*command, options->file.space);
+    command->add_flag(
+        "--align", options->aim.align,
+        "Mend what a cache looks like that does not fit the skin: frames early or late, axes, unit, order");
+    command->add_flag("--anyway", options->aim.anyway, "Take a cache that does not fit the skin as it is");
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { target(*options); });
 }

@@ -3,8 +3,8 @@
 
 #include "quarn/console/Console.h"
 #include "quarn/console/numberText.h"
+#include "quarn/fit/restOrder.h"
 #include "quarn/pose/cacheTimes.h"
-#include "quarn/pose/restOrder.h"
 #include "quarn/pose/sceneOrder.h"
 #include "quarn/pose/targetCache.h"
 #include "quarn/scene/meshes.h"

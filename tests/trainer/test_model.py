@@ -18,6 +18,7 @@ from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory, NumpyModel
 from trainer.measure import Distances, advice
 from trainer.network import check_size
+from trainer.plausible import doubts
 from trainer.settings import ACTIVATIONS, Settings
 
 
@@ -104,6 +105,21 @@ class ModelTest(unittest.TestCase):
         np.save(still / "deltas.npy", np.zeros((160, 48, 3), "<f4"))
         with self.assertRaisesRegex(TrainerError, "every delta .* is 0"):
             self.train(still)
+
+    def test_deltas_that_look_like_no_corrections_are_said(self) -> None:
+        # of the set as it is, the mean is a few hundredths of the diagonal
+        for number, (changes, wanted) in enumerate((
+                ({}, ""), ({"boundingBoxDiagonal": 0.5}, "of the character's diagonal"),
+                ({"boundingBoxDiagonal": 0}, ""), ({"targetFit": {"follows": True, "motion": 0.01}}, ""),
+                ({"targetFit": {"follows": False, "motion": 9.0}}, "do not go with the poses"),
+                ({"targetFit": {"follows": None, "motion": 0.01}}, "larger than what the skin moves"),
+                ({"targetFit": {"follows": None, "motion": 0}}, ""),
+                ({"targetFit": {"follows": None, "motion": 9}}, ""), ({"targetFit": [{"motion": "x"}]}, ""))):
+            said = " ".join(doubts(load_dataset(synthetic.make(self.place / f"{number}", frames=9, **changes))))
+            self.assertIn(wanted, said)
+            self.assertEqual(bool(wanted), bool(said), (changes, said))
+        self.train(self.place / "1", epochs=1)
+        self.assertIn("of the character's diagonal", self.said[0])
 
     def test_training_ends_early_and_keeps_the_best(self) -> None:
         data = synthetic.make(self.place / "data", frames=30)

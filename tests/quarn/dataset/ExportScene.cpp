@@ -62,8 +62,20 @@ std::vector<float> ExportScene::restPoints() {
     return xyz;
 }
 
+std::vector<float> ExportScene::turned(const std::vector<float>& xyz, std::size_t frame) {
+    const double angle = turn * static_cast<double>(frame);
+    std::vector<float> result = xyz;
+    for (std::size_t i = 0; i < xyz.size(); i += 3) {
+        const auto x = static_cast<double>(xyz[i]);
+        const auto y = static_cast<double>(xyz[i + 1]);
+        result[i] = static_cast<float>(x * std::cos(angle) - y * std::sin(angle));
+        result[i + 1] = static_cast<float>(x * std::sin(angle) + y * std::cos(angle));
+    }
+    return result;
+}
+
 std::vector<float> ExportScene::targetAt(std::size_t frame) {
-    std::vector<float> xyz = restPoints();
+    std::vector<float> xyz = turned(restPoints(), frame);
     for (std::size_t i = 0; i < xyz.size(); ++i)
         xyz[i] += 0.1F * std::sin(static_cast<float>(i * 7 + frame * 3));
     return xyz;

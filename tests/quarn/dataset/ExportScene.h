@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A strip of quads that a joint turns as a whole, with a target that moves beside it: a scene file to export from.
+// A strip of quads that a joint turns as a whole, with a target that goes with it: a scene file to export from.
 #pragma once
 
 #include "quarn/dataset/exportDatasets.h"
@@ -39,6 +39,8 @@ protected:
     /// x, y, z of the strip at rest, and of the target in a frame that counts from 0.
     static std::vector<float> restPoints();
     static std::vector<float> targetAt(std::size_t frame);
+    /// The points as the joint has them in a frame that counts from 0.
+    static std::vector<float> turned(const std::vector<float>& xyz, std::size_t frame);
 
     /// Builds the scene in the session that is open, or in one of its own to save it; `more` is run at its end.
     static void build(std::size_t frames, const std::string& more = "");

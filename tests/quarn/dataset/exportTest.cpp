@@ -40,19 +40,6 @@ protected:
         return buffer.GetString();
     }
 
-    /// The points as the joint has them in a frame that counts from 0.
-    static std::vector<float> turned(const std::vector<float>& xyz, std::size_t frame) {
-        const double angle = turn * static_cast<double>(frame);
-        std::vector<float> result = xyz;
-        for (std::size_t i = 0; i < xyz.size(); i += 3) {
-            const auto x = static_cast<double>(xyz[i]);
-            const auto y = static_cast<double>(xyz[i + 1]);
-            result[i] = static_cast<float>(x * std::cos(angle) - y * std::sin(angle));
-            result[i + 1] = static_cast<float>(x * std::sin(angle) + y * std::cos(angle));
-        }
-        return result;
-    }
-
     static std::vector<float> sum(const std::vector<float>& a, std::span<const float> b) {
         std::vector<float> result = a;
         for (std::size_t i = 0; i < a.size(); ++i)
@@ -133,8 +120,30 @@ TEST_F(ExportTest, SaysWhatIsInIt) {
         EXPECT_EQ(described(data(), place), text) << place;
 }
 
+// a target that does not go with the joint is told of before anything is written, and again by what was written anyway
+TEST_F(ExportTest, TargetsAreComparedWithTheSkin) {
+    constexpr std::size_t frames = 40;
+    writeTarget(frames);
+    save(frames);
+    const std::optional<quarn::TargetFit> fit = quarn::exportDatasets(options()).at(0).fit;
+    ASSERT_TRUE(fit);
+    EXPECT_NEAR(fit->asItIs.mean, 0.12, 0.02);
+    EXPECT_EQ(described(data(), "/targetFit/follows"), "true");
+    const std::string before = contentOf(data() / "deltas.npy");
+
+    writeTarget(frames, [](std::size_t, std::vector<float>& xyz) { xyz = restPoints(); });
+    quarn::ExportOptions flags = options();
+    flags.overwrite = true;
+    EXPECT_THAT(errorOf(flags), AllOf(HasSubstr("the target of strip"), HasSubstr("do not belong to these poses"),
+                                      HasSubstr("--anyway")));
+    EXPECT_EQ(contentOf(data() / "deltas.npy"), before);
+    flags.anyway = true;
+    EXPECT_EQ(quarn::exportDatasets(flags).at(0).rows, frames);
+    EXPECT_EQ(described(data(), "/targetFit/follows"), "false");
+}
+
 TEST_F(ExportTest, DeformedVerticesKeepTheirOrder) {
-    writeTarget(2);
+    writeTarget(2, [](std::size_t, std::vector<float>& xyz) { xyz[0] = 1000.0F; }); // of none that is deformed
     {
         quarn::SceneSession session;
         build(2, "setAttr warp.input[0].componentTagExpression tip; setAttr warp.export[0].deltaMode Offset");
@@ -216,7 +225,7 @@ TEST_F(ExportTest, ErrorsNameTheFrameAndTheThing) {
     writeTarget(3);
     save(3, "setAttr swing.keyTimes 1 2 3; setAttr swing.keyValues 0 0 1e300");
     quarn::ExportOptions flags = options();
-    flags.overwrite = true;
+    flags.overwrite = flags.anyway = true;
     EXPECT_THAT(errorOf(flags), AllOf(StartsWith("frame 3: "), HasSubstr("controlValues[6] (arm.rotateZ) is ")));
 }
 

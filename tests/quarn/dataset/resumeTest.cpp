@@ -124,7 +124,7 @@ TEST_F(ResumeTest, NeverMixesTwoSetUps) {
     EXPECT_THAT(errorOf(options()), HasSubstr("(smoothing iterations "));
     save(frames);
 
-    writeTarget(frames, [](std::size_t frame, std::vector<float>& xyz) { xyz[0] = frame == 6 ? notANumber : 7; });
+    writeTarget(frames, [](std::size_t frame, std::vector<float>& xyz) { xyz[0] = frame == 6 ? notANumber : 0.1F; });
     EXPECT_THAT(errorOf(options()), HasSubstr("file strip.npy of strip_target.cacheFile"));
     flags.overwrite = true;
     EXPECT_THAT(errorOf(flags), HasSubstr("frame 7"));

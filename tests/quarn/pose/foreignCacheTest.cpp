@@ -2,9 +2,9 @@
 // quarn target with caches of other tools: another format, another space, another order, times of their own.
 #include "PoseTest.h"
 
-#include "quarn/pose/NearestPoint.h"
+#include "quarn/fit/NearestPoint.h"
+#include "quarn/fit/restOrder.h"
 #include "quarn/pose/cacheTimes.h"
-#include "quarn/pose/restOrder.h"
 #include "quarn/scene/meshes.h"
 #include "storage/PointCacheWriter.h"
 #include "storage/mddHead.h"
@@ -41,7 +41,7 @@ protected:
     Frame sceneFrame(std::size_t frame) const {
         Frame xyz = rest_;
         for (std::size_t i = 0; i < xyz.size(); ++i)
-            xyz[i] += static_cast<double>(frame) * 0.125 * static_cast<double>(i % 3 + 1);
+            xyz[i] += static_cast<double>(frame) * 0.015625 * static_cast<double>(i % 3 + 1);
         return xyz;
     }
     std::string cache(const std::string& name, const std::vector<Frame>& frames) const {

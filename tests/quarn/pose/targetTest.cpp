@@ -44,7 +44,7 @@ TEST_F(TargetTest, TargetsPlayFromTheFirstExportedFrameAndAreReplaced) {
     stripScene::write(scene(), "setAttr warp.exportStartFrame 5; setAttr warp.exportEndFrame 7");
     std::filesystem::create_directory(path("caches"));
     const std::string one = cache("caches/one.npy", 3, vertices, 10.0F);
-    stripScene::quarn({"target", scene(), "--cache", one});
+    stripScene::quarn({"target", scene(), "--anyway", "--cache", one});
     {
         const auto session = open("scene.json");
         const HObject node = quarn::sourceOf(quarn::findNode("warp"), "targetGeometry[0]").node();
@@ -55,11 +55,11 @@ TEST_F(TargetTest, TargetsPlayFromTheFirstExportedFrameAndAreReplaced) {
         EXPECT_EQ(first(*session, 7, "strip_target.outMesh"), 12.0);
     }
     const std::string two = cache("two.npy", 3, vertices, 20.0F);
-    EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", two, "--geometry", "strip", "--start-frame", "6", "-o",
-                                   path("caches/other.json"), "--json"}),
+    EXPECT_THAT(stripScene::quarn({"target", scene(), "--anyway", "--cache", two, "--geometry", "strip",
+                                   "--start-frame", "6", "-o", path("caches/other.json"), "--json"}),
                 HasSubstr("\"replaced\": true"));
     // what a scene names by a path from its folder is found from the folder that it is saved in
-    stripScene::quarn({"target", scene(), "--cache", one});
+    stripScene::quarn({"target", scene(), "--anyway", "--cache", one});
     std::filesystem::create_directory(path("elsewhere"));
     stripScene::quarn({"pose", scene(), "-o", path("elsewhere/posed.json"), "--samples", "3", "--start", "5"});
     EXPECT_EQ(first(*open("elsewhere/posed.json"), 6, "strip_target.outMesh"), 11.0);
@@ -75,7 +75,7 @@ TEST_F(TargetTest, TargetsPlayFromTheFirstExportedFrameAndAreReplaced) {
 
 TEST_F(TargetTest, OtherTargetsAreTakenOffAndStay) {
     stripScene::write(scene(), "connectAttr strip.outMesh warp.targetGeometry[0]");
-    stripScene::quarn({"target", scene(), "--cache", cache("one.npy", 1, vertices, 1.0F)});
+    stripScene::quarn({"target", scene(), "--anyway", "--cache", cache("one.npy", 1, vertices, 1.0F)});
     const auto session = open("scene.json");
     EXPECT_EQ(first(*session, 1, "strip.outMesh"), 0.0);
     EXPECT_EQ(first(*session, 1, "strip_target.outMesh"), 1.0);
@@ -100,7 +100,7 @@ TEST_F(TargetTest, CachesThatDoNotFitAreRefusedAndTheSceneStays) {
         {{"--cache", path("fits.npy"), "--order", "file"}, {"character", "vertexMapFile"}},
     };
     for (const auto& row : rows) {
-        std::vector<std::string> arguments{"target", scene()};
+        std::vector<std::string> arguments{"target", scene(), "--anyway"};
         arguments.insert(arguments.end(), row.arguments.begin(), row.arguments.end());
         const std::string failure = failureOf([&] { stripScene::quarn(arguments); });
         for (const char* part : row.says)
@@ -152,7 +152,7 @@ TEST_F(TargetTest, TheCommandFindsTheMapOfTheCharacter) {
                                "setAttr character1.vertexMapDigests 'another " +
                                    quarn::vertexMapDigest(reversedMap()) + "'");
     const std::string file = cache("file.npy", 2, vertices + 1, 3.0F);
-    EXPECT_THAT(stripScene::quarn({"target", scene(), "--cache", file, "--order", "file", "--json"}),
+    EXPECT_THAT(stripScene::quarn({"target", scene(), "--anyway", "--cache", file, "--order", "file", "--json"}),
                 AllOf(HasSubstr("scene.strip_target.npy"), HasSubstr("\"converted\": true")));
     EXPECT_EQ(first(*open("scene.json"), 2, "strip_target.outMesh"), 4.0);
 
@@ -161,7 +161,7 @@ TEST_F(TargetTest, TheCommandFindsTheMapOfTheCharacter) {
     std::swap(other[0], other[1]);
     storage::writeIntegers(path("map.npy"), other);
     EXPECT_THAT(failureOf([&] {
-                    stripScene::quarn({"target", scene(), "--cache", file, "--order", "file"});
+                    stripScene::quarn({"target", scene(), "--anyway", "--cache", file, "--order", "file"});
                 }),
                 AllOf(HasSubstr("map.npy"), HasSubstr("another vertex map")));
 }
@@ -182,7 +182,8 @@ TEST_F(TargetTest, WhatNobodyHasSetFollowsFromTheCache) {
         SCOPED_TRACE(row.change);
         stripScene::write(scene(), std::string("setAttr warp.exportStartFrame 1; setAttr warp.exportEndFrame 1000;") +
                                        row.change);
-        std::vector<std::string> arguments{"target", scene(), "--cache", cache("one.npy", 4, vertices, 1.0F)};
+        std::vector<std::string> arguments{"target", scene(), "--anyway", "--cache",
+                                           cache("one.npy", 4, vertices, 1.0F)};
         arguments.insert(arguments.end(), row.flags.begin(), row.flags.end());
         stripScene::quarn(arguments);
         const auto session = open("scene.json");

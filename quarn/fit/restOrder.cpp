@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/pose/restOrder.h"
+#include "quarn/fit/restOrder.h"
 
-#include "quarn/pose/NearestPoint.h"
+#include "quarn/fit/NearestPoint.h"
 
 #include <algorithm>
 #include <array>

@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Source: J. L. Bentley, "Multidimensional binary search trees used for associative searching", 1975.
-#include "quarn/pose/NearestPoint.h"
+#include "quarn/fit/NearestPoint.h"
 
 #include <algorithm>
 #include <limits>
