@@ -64,6 +64,7 @@ CacheChange offsetOf(const FitPairs& pairs) {
 std::vector<CacheChange> allPlaces(const FitPairs& pairs, double nearEnough) {
     const std::vector<AxisTurn> turns = allTurns();
     std::vector<CacheChange> places;
+    places.reserve(turns.size() * (factors.size() + 1));
     for (const double factor : factors)
         places.push_back(changeBy({}, factor));
     for (const AxisTurn& turn : turns)
@@ -111,9 +112,8 @@ Finding findPlace(const SkinFrames& skin, const CacheChange& base) {
     const double same = std::max(0.1 * *best, skin.nothing());
     bool isChosen = false;
     for (std::size_t i = 0; i < places.size(); ++i) {
-        if (means[i] > alike * *best + skin.nothing()) {
-            finding.rival = std::min(finding.rival, means[i]);
-        } else if (distanceBetween(moved(pairs, places[i]), bestPairs) > same) {
+        const bool isNear = means[i] <= alike * *best + skin.nothing();
+        if (!isNear || distanceBetween(moved(pairs, places[i]), bestPairs) > same) {
             finding.rival = std::min(finding.rival, means[i]);
         } else if (!isChosen) {
             finding.change = base;

@@ -142,7 +142,7 @@ TEST(TargetFit, NamesEveryMistake) {
         const char* says;
     };
     const auto by = [](std::ptrdiff_t frame) { return [=](const Frame& right) { return late(right, frame); }; };
-    const auto at = [](std::function<quarn::FitPoint(double, double, double)> change) {
+    const auto at = [](const std::function<quarn::FitPoint(double, double, double)>& change) {
         return [=](const Frame& right) { return changed(right, change); };
     };
     const auto scaled = [&](double factor) {
@@ -236,7 +236,7 @@ TEST(TargetFit, RaisesNoFalseAlarm) {
                 };
                 const auto lifted = [&](double x, double y, double z) { return quarn::FitPoint{x, y + size, z}; };
                 const Frame right = bulging(move, 0.0);
-                const Frame lazy = [&](std::size_t frame) { // goes less far than the skin
+                const Frame lazy = [&move = move, size](std::size_t frame) { // goes less far than the skin
                     return limb((1.0 - 5.0 * size) * move.bend[frame], move.twist[frame], 0.0);
                 };
                 for (const Frame& cache : {bulging(move, size), lazy, changed(right, noisy), changed(right, lifted)}) {

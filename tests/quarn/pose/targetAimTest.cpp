@@ -15,7 +15,6 @@ namespace {
 
 using ::testing::AllOf;
 using ::testing::HasSubstr;
-using ::testing::Not;
 using Frame = std::vector<float>;
 using Frames = std::vector<Frame>;
 
