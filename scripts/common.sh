@@ -39,6 +39,7 @@ declare -A probe_of=(
   [ocl-icd-opencl-dev]=CL/cl.h
   [pocl-opencl-icd]=/etc/OpenCL/vendors/pocl.icd
   [npm]=npm
+  [nodejs]=node
   [clang-14]=clang++-14
   [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/*/include/sanitizer/asan_interface.h
   [llvm-14]=llvm-symbolizer-14
@@ -75,7 +76,7 @@ python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-
 wheel_packages=(python3-setuptools python3-wheel python3-venv)
 package_packages=(dpkg-dev file)
 # tools that tests go to and come back from; what misses them is skipped, except in continuous integration
-client_packages=(blender python3-numpy)
+client_packages=(blender python3-numpy nodejs)
 check_packages=(git clang-format-14 clang-tidy-14 mypy flake8)
 clang_packages=(clang-14 libclang-rt-14-dev llvm-14)
 

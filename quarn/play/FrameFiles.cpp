@@ -17,6 +17,17 @@ bool isCache(const std::filesystem::path& path) {
     return storage::cacheFormatOf(path).has_value();
 }
 
+// Alembic, and USD's binary forms, are asked for by users who have a way through other files
+std::string adviceFor(const std::string& ending) {
+    const bool isNear = ending == ".abc" || ending == ".usd" || ending == ".usdc" || ending == ".usdz";
+    return isNear ? ". What reads " + ending + " reads .usda or .pc2, which are" : "";
+}
+
+Motion motionOf(const FrameWriting& writing) {
+    return {writing.meshName, writing.frames, writing.framesPerSecond, writing.metersPerUnit * writing.space.scale,
+            writing.space.axes == "z"};
+}
+
 } // namespace
 
 std::filesystem::path frameFile(const std::filesystem::path& pattern, int frame) {
@@ -35,10 +46,13 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
     using storage::WholeFile;
     if (isCache(pattern))
         return WholeFile::requirePossible(pattern, WholeFile::Writes::anywhere);
+    if (isAnimatedFile(pattern, frames.count()))
+        return WholeFile::requirePossible(pattern);
     if (!isMeshFile(pattern))
         throw UsageError("\"" + pattern.string() +
                          "\" is no file that is written here: its name ends in .npy, .npz, .pc2, .mdd, .obj, .ply, "
-                         ".gltf or .glb");
+                         ".gltf, .glb or .usda" +
+                         adviceFor(pattern.extension().string()));
     if (frames.count() > 1 && pattern.filename().string().find('#') == std::string::npos)
         throw UsageError("\"" + pattern.string() + "\" would be written for each of " + std::to_string(frames.count()) +
                          " frames: put #### where the number of the frame goes, as in \"" + pattern.stem().string() +
@@ -49,12 +63,16 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
 FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, FrameWriting writing)
     : pattern_(std::move(pattern))
     , writing_(std::move(writing)) {
+    const FrameRange& frames = writing_.frames;
+    if (isAnimatedFile(pattern_, frames.count())) {
+        animated_ = createAnimatedFile(pattern_, writing_.order.polygons(polygons), motionOf(writing_));
+        return;
+    }
     if (!isCache(pattern_)) {
         polygons_ = writing_.order.polygons(polygons);
         return;
     }
     const std::vector<float> any(3 * polygons.vertexCount);
-    const FrameRange& frames = writing_.frames;
     const storage::CacheTiming timing{frames.count(), static_cast<double>(frames.first),
                                       static_cast<double>(frames.step), writing_.framesPerSecond};
     cache_ = storage::createPointCache(pattern_.string(), writing_.order.points(any).size() / 3, timing);
@@ -74,6 +92,8 @@ std::span<const float> FrameFiles::written(std::span<const float> xyz) {
 void FrameFiles::add(int frame, std::span<const float> xyz) {
     if (cache_)
         cache_->append(written(xyz));
+    else if (animated_)
+        animated_->add(frame, written(xyz));
     else
         writeMeshFile(frameFile(pattern_, frame), written(xyz), polygons_);
 }
@@ -81,6 +101,8 @@ void FrameFiles::add(int frame, std::span<const float> xyz) {
 void FrameFiles::finish() {
     if (cache_)
         cache_->finish();
+    if (animated_)
+        animated_->finish();
 }
 
 } // namespace quarn

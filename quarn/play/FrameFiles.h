@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
-// Played frames on the disk: a point cache of all of them, or a mesh file of each.
+// Played frames on the disk: a point cache or an animated file of all of them, or a mesh file of each.
 #pragma once
 
+#include "quarn/play/AnimatedFile.h"
 #include "quarn/play/VertexOrder.h"
 #include "quarn/scene/CacheSpace.h"
 #include "quarn/scene/frames.h"
@@ -33,9 +34,12 @@ struct FrameWriting {
     CacheSpace space;
     FrameRange frames;             ///< all that are going to be added
     double framesPerSecond = 24.0; ///< above 0
+    std::string meshName = {};     ///< as animated files call it
+    double metersPerUnit = 1.0;    ///< of the scene
 };
 
-/// Every file is there as a whole or not at all; of a point cache nothing is left without finish(). Thread: main.
+/// Every file is there as a whole or not at all; of those of all frames nothing is left without finish(). Thread:
+/// main.
 class FrameFiles {
 public:
     /// `polygons` of the scene's mesh.
@@ -44,6 +48,8 @@ public:
     FrameFiles(const FrameFiles&) = delete;
     FrameFiles& operator=(const FrameFiles&) = delete;
 
+    /// Of a file that is larger than its numbers, before its frames; 0 for others.
+    std::uint64_t expectedBytes() const { return animated_ ? animated_->expectedBytes() : 0; }
     /// `xyz` in the scene's order, space and unit. Throws std::runtime_error that names the file.
     void add(int frame, std::span<const float> xyz);
     void finish();
@@ -55,6 +61,7 @@ private:
     FrameWriting writing_;
     MeshPolygons polygons_; ///< only for mesh files
     std::unique_ptr<storage::PointCacheWriter> cache_;
+    std::unique_ptr<AnimatedFile> animated_;
     std::vector<float> moved_;
 };
 

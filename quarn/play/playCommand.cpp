@@ -37,6 +37,7 @@ struct Options {
     CacheSpace space;
     fs::path output, trace;
     int repeats = 1;
+    bool isAnySizeWritten = false;
 };
 
 // with --plug alone a scene needs no deformer
@@ -70,9 +71,9 @@ void addComparison(PlayPlan& plan, const Options& options, const Warp* warp, con
         readPoints(geometry->original, plan.rest.emplace());
 }
 
-void addOrder(PlayPlan& plan, const std::string& order, const std::string& meshName) {
+void addOrder(PlayPlan& plan, const std::string& order) {
     if (order == "file")
-        plan.order = VertexOrder::ofFile(meshName, polygonsOf(plan.mesh).vertexCount);
+        plan.order = VertexOrder::ofFile(plan.meshName, polygonsOf(plan.mesh).vertexCount);
 }
 
 PlayPlan planFor(const Options& options) {
@@ -86,12 +87,14 @@ PlayPlan planFor(const Options& options) {
     plan.repeats = options.repeats;
     plan.output = options.output;
     plan.space = options.space;
+    plan.meshName = geometry != nullptr ? geometry->name : nodeName(plan.mesh.node());
+    plan.isAnySizeWritten = options.isAnySizeWritten;
     plan.trace = options.trace;
     plan.isOnGpu = options.evaluator == "gpu";
     plan.model = geometry != nullptr && options.model.isGiven() ? chooseModel(*warp, *geometry, options.model)
                                                                 : chooseModel(plan.mesh, options.model);
     addComparison(plan, options, warp ? &*warp : nullptr, geometry);
-    addOrder(plan, options.order, geometry != nullptr ? geometry->name : nodeName(plan.mesh.node()));
+    addOrder(plan, options.order);
     return plan;
 }
 
@@ -164,8 +167,9 @@ void addPlayCommand(CLI::App& app) {
     addModelOptions(*command, options->model);
     command
         ->add_option("-o,--output", options->output,
-                     "FILE.npy, .npz, .pc2 or .mdd, or FILE.####.obj, .ply, .gltf or .glb")
+                     "FILE.npy, .npz, .pc2, .mdd, .usda or .glb for all frames; FILE.####.obj, .ply, .gltf or .glb")
         ->type_name("FILE");
+    command->add_flag("--anyway", options->isAnySizeWritten, "Write also a .usda or .glb of more than 2 GB");
     addFrameOptions(*command, *options);
     addMeasureOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);

@@ -25,10 +25,24 @@ struct RecordingEnd {
     ~RecordingEnd() { OpenQuarn::Profiling::stop(); }
 };
 
+constexpr std::uint64_t megabyte = 1'000'000;
+constexpr std::uint64_t largestUnasked = 2'000 * megabyte;
+
+// what the file is going to have; a large one has to be asked for
+std::string sizeSentence(const std::filesystem::path& path, std::uint64_t bytes, bool isAnySizeWritten) {
+    const std::string size = std::to_string((bytes + megabyte - 1) / megabyte) + " MB";
+    if (bytes > largestUnasked && !isAnySizeWritten)
+        throw std::runtime_error(path.string() + " would have about " + size +
+                                 ": give --anyway, fewer frames, or a point cache (.pc2), which has 12 bytes a vertex "
+                                 "and frame");
+    return path.string() + " will have about " + size;
+}
+
 class Playing {
 public:
     Playing(SceneSession& session, PlayPlan plan, const Console& console)
-        : plan_(std::move(plan))
+        : console_(console)
+        , plan_(std::move(plan))
         , player_(session, plan_.mesh)
         , models_({plan_.mesh, plan_.against})
         , progress_(console, "playing", plan_.frames.count() * static_cast<std::size_t>(plan_.repeats)) {
@@ -97,10 +111,17 @@ private:
 
     void write(int frame) {
         if (!files_)
-            files_ = std::make_unique<FrameFiles>(
-                plan_.output, polygonsOf(plan_.mesh),
-                FrameWriting{plan_.order, plan_.space, plan_.frames, framesPerSecond().value_or(24.0)});
+            openFiles();
         files_->add(frame, points_);
+    }
+
+    void openFiles() {
+        files_ = std::make_unique<FrameFiles>(plan_.output, polygonsOf(plan_.mesh),
+                                              FrameWriting{plan_.order, plan_.space, plan_.frames,
+                                                           framesPerSecond().value_or(24.0), plan_.meshName,
+                                                           metersPerUnit()});
+        if (const std::uint64_t bytes = files_->expectedBytes(); bytes != 0)
+            console_.note(sizeSentence(plan_.output, bytes, plan_.isAnySizeWritten));
     }
 
     void compare(int frame) {
@@ -131,6 +152,7 @@ private:
         comparison->jitter.add(xyz);
     }
 
+    const Console& console_;
     PlayPlan plan_;
     FramePlayer player_;
     AppliedModels models_;

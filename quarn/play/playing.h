@@ -31,6 +31,8 @@ struct PlayPlan {
     std::filesystem::path output;           ///< pattern as for FrameFiles; empty: nothing is written
     VertexOrder order;                      ///< of what is written
     CacheSpace space;                       ///< the same
+    std::string meshName;                   ///< in animated files
+    bool isAnySizeWritten = false;          ///< also what is far larger than the motion is worth
     bool isOnGpu = false;                   ///< chooseEvaluator() was told so
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none

@@ -51,6 +51,9 @@ expect 2 '' '--device 0 goes with --evaluator gpu' play "$scene" --device 0
 OCL_ICD_VENDORS=$work/none expect 0 'no OpenCL device' '' info --devices
 expect 2 '' 'put #### where' play "$scene" --frames 1-3 -o "$work/a.obj"
 expect 2 '' '\.mdd, \.obj' play "$scene" --frames 1 -o "$work/a.stl"
+expect 2 '' 'What reads \.abc reads \.usda or \.pc2' play "$scene" --frames 1 -o "$work/a.abc"
+expect 1 '' 'lost\.usda would have about 3248 MB: give --anyway' play "$scene" --frames 1-200000 -o "$work/lost.usda"
+expect 0 'played' 'clip\.glb will have about 1 MB' play "$scene" --frames 1-11 -o "$work/clip.glb"
 expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
 expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
 expect 1 '' 'no node of type character' bake "$scene" strip.outMesh --frames 1 --order file -o "$work/lost.npy"
@@ -73,7 +76,7 @@ expect 0 '' 'wrote 3 frames' bake "$scene" strip.outMesh --frames 1-3 -o "$work/
 expect 1 '' 'deltaMode 7' render "$scene" -o "$work/lost.png" --size 40x30
 rm -r "$work/models/wave.nwrp"
 mv "$work/kept" "$work/models/wave.nwrp"
-[[ ! -e $work/lost.png && ! -e $work/lost.obj && ! -e $work/lost.npy ]] || fail "a file of a play that failed"
+[[ ! -e $work/lost.png && ! -e $work/lost.obj && ! -e $work/lost.npy && ! -e $work/lost.usda ]] || fail "a file of a play that failed"
 
 # the model in memory goes on while its directory is replaced under it, and Ctrl-C leaves nothing
 cp -r "$work/models/wave.nwrp" "$work/next"

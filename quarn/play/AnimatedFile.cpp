@@ -1,0 +1,21 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/play/AnimatedFile.h"
+
+#include "quarn/play/ClipFile.h"
+#include "quarn/play/UsdFile.h"
+
+namespace quarn {
+
+bool isAnimatedFile(const std::filesystem::path& path, std::size_t frameCount) {
+    const bool isOneFile = path.filename().string().find('#') == std::string::npos;
+    return path.extension() == ".usda" || (path.extension() == ".glb" && isOneFile && frameCount > 1);
+}
+
+std::unique_ptr<AnimatedFile> createAnimatedFile(const std::filesystem::path& path, MeshPolygons polygons,
+                                                 Motion motion) {
+    if (path.extension() == ".usda")
+        return std::make_unique<UsdFile>(path, polygons, std::move(motion));
+    return std::make_unique<ClipFile>(path, std::move(polygons), std::move(motion));
+}
+
+} // namespace quarn

@@ -1,0 +1,59 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "quarn/play/ClipFile.h"
+
+#include "quarn/play/gltfParts.h"
+#include "quarn/scene/vertexNormals.h"
+
+#include <algorithm>
+#include <limits>
+#include <stdexcept>
+
+namespace quarn {
+namespace {
+
+constexpr std::uint64_t bytesPerVertex = 2 * 3 * sizeof(float); // position and normal
+
+std::string inGigabytes(std::uint64_t bytes) {
+    return std::to_string(bytes / 1'000'000'000) + "." + std::to_string(bytes / 100'000'000 % 10) + " GB";
+}
+
+} // namespace
+
+ClipFile::ClipFile(const std::filesystem::path& path, MeshPolygons polygons, Motion motion)
+    : path_(path)
+    , file_(path)
+    , polygons_(std::move(polygons))
+    , triangles_(gltfTriangles(polygons_))
+    , motion_(std::move(motion)) {
+    if (triangles_.empty())
+        throw std::runtime_error(path.string() + ": glTF has no meshes without triangles: write .usda or .pc2");
+    if (const std::uint64_t bytes = expectedBytes(); bytes > std::numeric_limits<std::uint32_t>::max())
+        throw std::runtime_error(path.string() + " would have " + inGigabytes(bytes) +
+                                 ", and a .glb has room for 4: write .usda or .pc2, or fewer frames");
+}
+
+std::uint64_t ClipFile::expectedBytes() const {
+    const std::uint64_t frames = motion_.frames.count();
+    return frames * (bytesPerVertex * polygons_.vertexCount + frames * sizeof(float)) +
+           triangles_.size() * sizeof(triangles_[0]);
+}
+
+void ClipFile::add(int frame, std::span<const float> xyz) {
+    numbers_.push_back(frame);
+    frames_.push_back({{xyz.begin(), xyz.end()}, vertexNormals(xyz, polygons_)});
+}
+
+void ClipFile::finish() {
+    const int zero = std::min(motion_.frames.first, 1);
+    std::vector<float> seconds;
+    for (const int number : numbers_)
+        seconds.push_back(static_cast<float>((number - zero) / motion_.framesPerSecond));
+    try {
+        writeClip(file_.stream(), clipOfFrames(std::move(frames_), numbers_), triangles_, seconds, motion_);
+    } catch (const std::runtime_error& error) {
+        throw std::runtime_error(path_.string() + " could not be written: " + error.what());
+    }
+    file_.finish();
+}
+
+} // namespace quarn

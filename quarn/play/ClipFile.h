@@ -1,0 +1,39 @@
+// SPDX-License-Identifier: Apache-2.0
+// A moving mesh as one binary glTF 2.0 file: a mesh with morph targets, and an animation of their weights.
+#pragma once
+
+#include "quarn/play/AnimatedFile.h"
+#include "quarn/play/MorphClip.h"
+#include "storage/WholeFile.h"
+
+#include <vector>
+
+namespace quarn {
+
+/// Frames are kept until finish(): 24 bytes a vertex and frame. Between two frames every point goes on a straight line.
+/// Frame 1 is at 0 seconds, or the first one where that is before it. The node has the scale that makes metres of the
+/// mesh's unit; polygons are triangles.
+class ClipFile : public AnimatedFile {
+public:
+    ClipFile(const std::filesystem::path& path, MeshPolygons polygons, Motion motion);
+
+    std::uint64_t expectedBytes() const override;
+    void add(int frame, std::span<const float> xyz) override;
+    void finish() override;
+
+private:
+    std::filesystem::path path_;
+    storage::WholeFile file_;
+    MeshPolygons polygons_;
+    std::vector<std::uint32_t> triangles_;
+    Motion motion_;
+    std::vector<int> numbers_;
+    std::vector<MorphShape> frames_;
+};
+
+/// The file's content. `seconds` of each frame, rising from 0 or more; `triangles` not empty. The stream must be in the
+/// classic locale. Throws std::runtime_error where all of it is more than 4 GB.
+void writeClip(std::ostream& out, const MorphClip& clip, const std::vector<std::uint32_t>& triangles,
+               const std::vector<float>& seconds, const Motion& motion);
+
+} // namespace quarn
