@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <filesystem>
 #include <memory>
+#include <optional>
 #include <span>
 #include <string>
 
@@ -20,6 +21,14 @@ struct Motion {
     double framesPerSecond = 24.0;
     double metersPerUnit = 1.0; ///< of the positions as they are added
     bool isZUp = false;         ///< else y is up
+    std::optional<double> allowedError =
+        {}; ///< in millimetres, above 0: as few shapes as it allows, where there are any
+};
+
+/// How many shapes stand for a motion, and how far from it that is at most, in millimetres.
+struct ShapesOfMotion {
+    std::size_t count = 0;
+    double error = 0.0;
 };
 
 /// There as a whole or not at all: nothing is left without finish(). Thread: one at a time.
@@ -32,6 +41,8 @@ public:
     virtual void add(int frame, std::span<const float> xyz) = 0;
     /// Called once, after the last frame. Throws storage::FileError, and std::runtime_error that names the file.
     virtual void finish() = 0;
+    /// After finish(); none where the file has no shapes that were fitted.
+    virtual std::optional<ShapesOfMotion> shapes() const { return std::nullopt; }
 };
 
 /// Whether a file of this name holds all frames of a play: ".usda", and ".glb" without "#" where there are several.

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/play/ClipFile.h"
 
+#include "quarn/console/numberText.h"
+#include "quarn/play/fitClip.h"
 #include "quarn/play/gltfParts.h"
 #include "quarn/scene/vertexNormals.h"
 
@@ -12,6 +14,8 @@ namespace quarn {
 namespace {
 
 constexpr std::uint64_t bytesPerVertex = 2 * 3 * sizeof(float); // position and normal
+
+constexpr double millimetresPerMeter = 1000.0;
 
 std::string inGigabytes(std::uint64_t bytes) {
     return std::to_string(bytes / 1'000'000'000) + "." + std::to_string(bytes / 100'000'000 % 10) + " GB";
@@ -43,13 +47,26 @@ void ClipFile::add(int frame, std::span<const float> xyz) {
     frames_.push_back({{xyz.begin(), xyz.end()}, vertexNormals(xyz, polygons_)});
 }
 
+MorphClip ClipFile::clip() {
+    if (!motion_.allowedError)
+        return clipOfFrames(std::move(frames_), numbers_);
+    const double millimetres = millimetresPerMeter * motion_.metersPerUnit;
+    FittedClip fitted = fitClip(frames_, *motion_.allowedError / millimetres);
+    shapes_ = {fitted.clip.targets.size(), fitted.error * millimetres};
+    if (shapes_->error > *motion_.allowedError)
+        throw std::runtime_error("all " + std::to_string(shapes_->count) + " shapes of the motion are up to " +
+                                 numberText(shapes_->error) + " mm from it, by rounding alone, and --error is " +
+                                 numberText(*motion_.allowedError) + ": take --targets frames");
+    return std::move(fitted.clip);
+}
+
 void ClipFile::finish() {
     const int zero = std::min(motion_.frames.first, 1);
     std::vector<float> seconds;
     for (const int number : numbers_)
         seconds.push_back(static_cast<float>((number - zero) / motion_.framesPerSecond));
     try {
-        writeClip(file_.stream(), clipOfFrames(std::move(frames_), numbers_), triangles_, seconds, motion_);
+        writeClip(file_.stream(), clip(), triangles_, seconds, motion_);
     } catch (const std::runtime_error& error) {
         throw std::runtime_error(path_.string() + " could not be written: " + error.what());
     }

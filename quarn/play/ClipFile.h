@@ -20,8 +20,11 @@ public:
     std::uint64_t expectedBytes() const override;
     void add(int frame, std::span<const float> xyz) override;
     void finish() override;
+    std::optional<ShapesOfMotion> shapes() const override { return shapes_; }
 
 private:
+    MorphClip clip();
+
     std::filesystem::path path_;
     storage::WholeFile file_;
     MeshPolygons polygons_;
@@ -29,6 +32,7 @@ private:
     Motion motion_;
     std::vector<int> numbers_;
     std::vector<MorphShape> frames_;
+    std::optional<ShapesOfMotion> shapes_;
 };
 
 /// The file's content. `seconds` of each frame, rising from 0 or more; `triangles` not empty. The stream must be in the

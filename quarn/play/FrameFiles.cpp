@@ -24,8 +24,9 @@ std::string adviceFor(const std::string& ending) {
 }
 
 Motion motionOf(const FrameWriting& writing) {
-    return {writing.meshName, writing.frames, writing.framesPerSecond, writing.metersPerUnit * writing.space.scale,
-            writing.space.axes == "z"};
+    return {writing.meshName,          writing.frames,
+            writing.framesPerSecond,   writing.metersPerUnit * writing.space.scale,
+            writing.space.axes == "z", writing.allowedError};
 }
 
 } // namespace

@@ -32,10 +32,11 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
 struct FrameWriting {
     VertexOrder order;
     CacheSpace space;
-    FrameRange frames;             ///< all that are going to be added
-    double framesPerSecond = 24.0; ///< above 0
-    std::string meshName = {};     ///< as animated files call it
-    double metersPerUnit = 1.0;    ///< of the scene
+    FrameRange frames;                       ///< all that are going to be added
+    double framesPerSecond = 24.0;           ///< above 0
+    std::string meshName = {};               ///< as animated files call it
+    double metersPerUnit = 1.0;              ///< of the scene
+    std::optional<double> allowedError = {}; ///< as of a Motion
 };
 
 /// Every file is there as a whole or not at all; of those of all frames nothing is left without finish(). Thread:
@@ -53,6 +54,8 @@ public:
     /// `xyz` in the scene's order, space and unit. Throws std::runtime_error that names the file.
     void add(int frame, std::span<const float> xyz);
     void finish();
+    /// As of an AnimatedFile.
+    std::optional<ShapesOfMotion> shapes() const { return animated_ ? animated_->shapes() : std::nullopt; }
 
 private:
     std::span<const float> written(std::span<const float> xyz);

@@ -38,6 +38,8 @@ struct Options {
     fs::path output, trace;
     int repeats = 1;
     bool isAnySizeWritten = false;
+    std::string targets = "frames";
+    std::optional<double> allowedError;
 };
 
 // with --plug alone a scene needs no deformer
@@ -76,6 +78,17 @@ void addOrder(PlayPlan& plan, const std::string& order) {
         plan.order = VertexOrder::ofFile(plan.meshName, polygonsOf(plan.mesh).vertexCount);
 }
 
+// none for a target a frame
+std::optional<double> allowedErrorOf(const Options& options, const FrameRange& frames) {
+    constexpr double usual = 0.05;
+    const bool isFitted = options.targets == "fit";
+    if (isFitted && (options.output.extension() != ".glb" || !isAnimatedFile(options.output, frames.count())))
+        throw UsageError("--targets fit goes with -o FILE.glb and several frames");
+    if (!isFitted && options.allowedError)
+        throw UsageError("--error goes with --targets fit");
+    return isFitted ? std::optional(options.allowedError.value_or(usual)) : std::nullopt;
+}
+
 PlayPlan planFor(const Options& options) {
     chooseEvaluator(options.evaluator, options.device);
     const std::optional<Warp> warp = warpFor(options);
@@ -88,6 +101,7 @@ PlayPlan planFor(const Options& options) {
     plan.output = options.output;
     plan.space = options.space;
     plan.meshName = geometry != nullptr ? geometry->name : nodeName(plan.mesh.node());
+    plan.allowedError = allowedErrorOf(options, plan.frames);
     plan.isAnySizeWritten = options.isAnySizeWritten;
     plan.trace = options.trace;
     plan.isOnGpu = options.evaluator == "gpu";
@@ -138,6 +152,20 @@ void addFrameOptions(CLI::App& command, Options& options) {
     addCacheSpaceOptions(command, options.space);
 }
 
+void addClipOptions(CLI::App& command, Options& options) {
+    command.add_flag("--anyway", options.isAnySizeWritten, "Write also a .usda or .glb of more than 2 GB");
+    command
+        .add_option("--targets", options.targets,
+                    "Morph targets of a .glb of all frames: one for each frame, or as few as --error allows")
+        ->check(CLI::IsMember({"frames", "fit"}))
+        ->capture_default_str();
+    command
+        .add_option("--error", options.allowedError,
+                    "Millimetres that a vertex may be off with --targets fit: 0.05 by default")
+        ->check(CLI::PositiveNumber)
+        ->type_name("MM");
+}
+
 void addMeasureOptions(CLI::App& command, Options& options) {
     command.add_option("--against", options.against, "Compare with this mesh plug, or with the deformer's target")
         ->type_name("PLUG|target");
@@ -169,7 +197,7 @@ void addPlayCommand(CLI::App& app) {
         ->add_option("-o,--output", options->output,
                      "FILE.npy, .npz, .pc2, .mdd, .usda or .glb for all frames; FILE.####.obj, .ply, .gltf or .glb")
         ->type_name("FILE");
-    command->add_flag("--anyway", options->isAnySizeWritten, "Write also a .usda or .glb of more than 2 GB");
+    addClipOptions(*command, *options);
     addFrameOptions(*command, *options);
     addMeasureOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);

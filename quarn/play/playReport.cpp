@@ -91,6 +91,16 @@ void writeGpu(JsonWriter& json, const std::optional<GpuUse>& gpu) {
     json.EndObject();
 }
 
+void writeShapes(JsonWriter& json, const std::optional<ShapesOfMotion>& shapes) {
+    json.Key("shapes");
+    if (!shapes)
+        return static_cast<void>(json.Null());
+    json.StartObject();
+    whole(json, "count", static_cast<std::int64_t>(shapes->count));
+    number(json, "errorMm", shapes->error);
+    json.EndObject();
+}
+
 void writeComparison(JsonWriter& json, const char* key, const std::optional<Comparison>& comparison,
                      const Scale& scale) {
     json.Key(key);
@@ -128,6 +138,9 @@ std::string playText(const PlayResult& result, const PlayPlan& plan, double mete
         printGpu(out, *result.gpu);
     for (const auto& [name, seconds] : result.phases)
         out << "  " << name << ": median " << percentileOf(seconds, 0.5) * inMilliseconds << " ms\n";
+    if (result.shapes)
+        out << "written with " << result.shapes->count << " shapes, at most " << result.shapes->error
+            << " mm from any frame\n";
     if (!result.mesh)
         return out.str();
     const Scale scale = scaleOf(result, metersPerUnit);
@@ -155,6 +168,7 @@ std::string playJson(const PlayResult& result, const PlayPlan& plan, double mete
     whole(json, "framesTimed", static_cast<std::int64_t>(result.times.count()));
     writeTimes(json, result);
     writeGpu(json, result.gpu);
+    writeShapes(json, result.shapes);
     writeComparison(json, "distance", result.mesh, scale);
     writeComparison(json, "before", result.before, scale);
     if (result.mesh) {

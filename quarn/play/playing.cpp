@@ -64,8 +64,10 @@ public:
             for (std::size_t i = 0; i < plan_.frames.count(); ++i)
                 playOne(plan_.frames.frame(i), isTimed, repeat == 0);
         }
-        if (files_)
+        if (files_) {
             files_->finish();
+            result_.shapes = files_->shapes();
+        }
         if (!plan_.trace.empty())
             result_.phases = writeTraceAndReadPhases(plan_.trace);
         if (plan_.isOnGpu)
@@ -119,7 +121,7 @@ private:
         files_ = std::make_unique<FrameFiles>(plan_.output, polygonsOf(plan_.mesh),
                                               FrameWriting{plan_.order, plan_.space, plan_.frames,
                                                            framesPerSecond().value_or(24.0), plan_.meshName,
-                                                           metersPerUnit()});
+                                                           metersPerUnit(), plan_.allowedError});
         if (const std::uint64_t bytes = files_->expectedBytes(); bytes != 0)
             console_.note(sizeSentence(plan_.output, bytes, plan_.isAnySizeWritten));
     }

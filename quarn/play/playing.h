@@ -3,6 +3,7 @@
 #pragma once
 
 #include "openquarn/HPlug.h"
+#include "quarn/play/AnimatedFile.h"
 #include "quarn/play/Distances.h"
 #include "quarn/play/FrameTimes.h"
 #include "quarn/play/VertexOrder.h"
@@ -33,6 +34,7 @@ struct PlayPlan {
     CacheSpace space;                       ///< the same
     std::string meshName;                   ///< in animated files
     bool isAnySizeWritten = false;          ///< also what is far larger than the motion is worth
+    std::optional<double> allowedError;     ///< as of a Motion
     bool isOnGpu = false;                   ///< chooseEvaluator() was told so
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none
@@ -54,7 +56,8 @@ struct PlayResult {
     std::optional<GpuUse> gpu;                         ///< none: the GPU was not asked for
     std::optional<Comparison> mesh, before;
     Jitter targetJitter;
-    double boxDiagonal = 0.0; ///< 0 without a comparison
+    double boxDiagonal = 0.0;             ///< 0 without a comparison
+    std::optional<ShapesOfMotion> shapes; ///< none: nothing was written that has fitted ones
 };
 
 /// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. Thread: main.

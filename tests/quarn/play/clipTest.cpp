@@ -10,6 +10,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <random>
 
@@ -88,6 +89,74 @@ TEST(Clip, IsEveryFrameToAnotherProgram) {
     ASSERT_NE(node, nullptr);
     node->mTransformation.Decompose(scale, turn, place);
     EXPECT_THAT((std::vector{scale.x, scale.y, scale.z}), Pointwise(FloatNear(1e-8F), {0.01F, 0.01F, 0.01F}));
+}
+
+// what is read of a motion of so many frames that was fitted, in millimetres; and the weights
+struct Fitted {
+    std::size_t shapes = 0;
+    double told = 0.0, error = 0.0;
+    std::vector<double> weights;
+};
+
+Fitted fitted(const std::vector<std::vector<float>>& motion, double allowed) {
+    const TemporaryFolder folder;
+    const std::string path = folder.path() / "clip.glb";
+    FrameFiles files(
+        path, polygons,
+        {.frames = {1, static_cast<int>(motion.size()), 1}, .metersPerUnit = 0.1, .allowedError = allowed});
+    for (std::size_t i = 0; i < motion.size(); ++i)
+        files.add(static_cast<int>(i) + 1, motion[i]);
+    files.finish();
+    Assimp::Importer importer;
+    const aiScene* scene = importer.ReadFile(path, 0);
+    const aiMeshMorphAnim& channel = *scene->mAnimations[0]->mMorphMeshChannels[0];
+    Fitted result{scene->mMeshes[0]->mNumAnimMeshes, files.shapes()->error, 0.0, {}};
+    EXPECT_EQ(files.shapes()->count, result.shapes);
+    for (std::size_t i = 0; i < motion.size(); ++i) {
+        const aiMeshMorphKey& key = channel.mKeys[i];
+        result.weights.insert(result.weights.end(), key.mWeights, key.mWeights + key.mNumValuesAndWeights);
+        const auto xyz = shown(*scene->mMeshes[0], key, &aiMesh::mVertices, &aiAnimMesh::mVertices);
+        for (std::size_t v = 0; v < xyz.size(); v += 3)
+            result.error =
+                std::max(result.error, 100.0 * std::hypot(xyz[v] - motion[i][v], xyz[v + 1] - motion[i][v + 1],
+                                                          xyz[v + 2] - motion[i][v + 2]));
+    }
+    return result;
+}
+
+TEST(Clip, HasAsFewShapesAsTheErrorAllows) {
+    std::mt19937 random(5);
+    std::normal_distribution<float> any;
+    const auto direction = [&] {
+        std::vector<float> xyz(3 * polygons.vertexCount);
+        std::generate(xyz.begin(), xyz.end(), [&] { return any(random); });
+        return xyz;
+    };
+    const std::vector<float> rest = direction(), swing = direction(), slide = direction();
+    std::vector<std::vector<float>> motion;
+    for (int frame = 0; frame < 30; ++frame) {
+        const auto time = static_cast<float>(frame);
+        motion.push_back(direction()); // a tremble
+        for (std::size_t i = 0; i < rest.size(); ++i)
+            motion.back()[i] = rest[i] + std::sin(time) * swing[i] + 0.1F * time * slide[i] + 1e-4F * motion.back()[i];
+    }
+    const Fitted two = fitted(motion, 0.2);
+    EXPECT_EQ(two.shapes, 2U);
+    EXPECT_NEAR(two.told, two.error, 1e-4);
+    EXPECT_LE(two.error, 0.2);
+    for (std::size_t shape = 0; shape < 2; ++shape) {
+        std::vector<double> weights;
+        for (std::size_t i = shape; i < two.weights.size(); i += 2)
+            weights.push_back(two.weights[i]);
+        EXPECT_EQ(*std::min_element(weights.begin(), weights.end()), 0.0);
+        EXPECT_EQ(*std::max_element(weights.begin(), weights.end()), 1.0);
+    }
+    const Fitted more = fitted(motion, 0.01);
+    EXPECT_GT(more.shapes, 2U);
+    EXPECT_LE(more.error, 0.01);
+    EXPECT_THAT(failureOf([&] { fitted(motion, 1e-9); }), HasSubstr("by rounding alone, and --error is 1e-09"));
+    EXPECT_EQ(fitted({3, rest}, 0.01).shapes, 1U)
+        << "what stands still, as glTF has no mesh with an empty list of them";
 }
 
 TEST(Clip, IsWrittenForSeveralFramesWithoutANumber) {
