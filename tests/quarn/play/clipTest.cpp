@@ -51,19 +51,19 @@ std::vector<float> shown(const aiMesh& mesh, const aiMeshMorphKey& key, aiVector
     return xyz;
 }
 
-void writeFrames(const std::filesystem::path& path, const std::vector<std::vector<float>>& motion,
-                 FrameWriting writing) {
-    FrameFiles files(path, polygons, std::move(writing));
-    for (std::size_t i = 0; i < motion.size(); ++i)
-        files.add(frames.frame(i), motion[i]);
-    files.finish();
-}
-
 TEST(Clip, IsEveryFrameToAnotherProgram) {
     const TemporaryFolder folder;
     const std::string path = folder.path() / "clip.glb";
     const auto motion = anyMotion();
-    writeFrames(path, motion, {.frames = frames, .framesPerSecond = 25.0, .meshName = "hand", .metersPerUnit = 0.01});
+    FrameWriting writing;
+    writing.frames = frames;
+    writing.framesPerSecond = 25.0;
+    writing.meshName = "hand";
+    writing.metersPerUnit = 0.01;
+    FrameFiles files(path, polygons, writing);
+    for (std::size_t i = 0; i < motion.size(); ++i)
+        files.add(frames.frame(i), motion[i]);
+    files.finish();
     Assimp::Importer importer;
     const aiScene* scene = importer.ReadFile(path, 0);
     ASSERT_NE(scene, nullptr) << importer.GetErrorString();
@@ -101,9 +101,11 @@ struct Fitted {
 Fitted fitted(const std::vector<std::vector<float>>& motion, double allowed) {
     const TemporaryFolder folder;
     const std::string path = folder.path() / "clip.glb";
-    FrameFiles files(
-        path, polygons,
-        {.frames = {1, static_cast<int>(motion.size()), 1}, .metersPerUnit = 0.1, .allowedError = allowed});
+    FrameWriting writing;
+    writing.frames.last = static_cast<int>(motion.size());
+    writing.metersPerUnit = 0.1;
+    writing.allowedError = allowed;
+    FrameFiles files(path, polygons, writing);
     for (std::size_t i = 0; i < motion.size(); ++i)
         files.add(static_cast<int>(i) + 1, motion[i]);
     files.finish();
@@ -166,14 +168,13 @@ TEST(Clip, IsWrittenForSeveralFramesWithoutANumber) {
     EXPECT_TRUE(isAnimatedFile("a.usda", 1));
     EXPECT_FALSE(isAnimatedFile("a.gltf", 2));
     const TemporaryFolder folder;
-    EXPECT_THAT(failureOf([&] {
-                    FrameFiles(folder.path() / "a.glb", {3, {2}, {0, 1}}, {.frames = {1, 2, 1}});
-                }),
-                HasSubstr("a.glb: glTF has no meshes without triangles"));
-    EXPECT_THAT(failureOf([&] {
-                    FrameFiles(folder.path() / "a.glb", {6, {3}, {0, 1, 2}}, {.frames = {1, 40000, 1}});
-                }),
-                HasSubstr("a.glb would have 6.4 GB, and a .glb has room for 4"));
+    const auto refusal = [&](const MeshPolygons& mesh, int last) {
+        FrameWriting writing;
+        writing.frames.last = last;
+        return failureOf([&] { FrameFiles(folder.path() / "a.glb", mesh, writing); });
+    };
+    EXPECT_THAT(refusal({3, {2}, {0, 1}}, 2), HasSubstr("a.glb: glTF has no meshes without triangles"));
+    EXPECT_THAT(refusal({6, {3}, {0, 1, 2}}, 40000), HasSubstr("a.glb would have 6.4 GB, and a .glb has room for 4"));
     EXPECT_TRUE(std::filesystem::is_empty(folder.path()));
 }
 
