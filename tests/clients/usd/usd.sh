@@ -38,6 +38,7 @@ check "$work/any.usda" "$work/any.npy" 'metersPerUnit = 0.01' 'upAxis = "Y"' 'ti
   'startTimeCode = -1' 'endTimeCode = 3' 'defaultPrim = "any"' 'subdivisionScheme = "none"'
 # every other frame, in metres with z up, beside the same as a cache
 written --frames -1-3x2 --axes z --scale 100 -o "$work/any.usda"
-expect 0 'frames' '' play "$work/any.json" --plug any.outMesh --frames -1-3x2 --axes z --scale 100 -o "$work/z.npy" --json --quiet
+expect 0 'frames' '' play "$work/any.json" --plug any.outMesh --frames -1-3x2 --axes z --scale 100 \
+  -o "$work/z.npy" --json --quiet
 check "$work/any.usda" "$work/z.npy" 'metersPerUnit = 1' 'upAxis = "Z"' 'endTimeCode = 3'
 exit $bad
