@@ -192,8 +192,13 @@ void turnAndRise(GltfWriter& file) {
                               ",\"output\":" + std::to_string(weights) +
                               R"(}],"channels":[{"sampler":0,"target":{"node":1,"path":"translation"}},)"
                               R"({"sampler":1,"target":{"node":2,"path":"weights"}}]})");
+    // the skin makes the mesh twice as high, and with it what rises
+    file.skins[0] = R"({"joints":[0,1],"inverseBindMatrices":)" +
+                    std::to_string(file.floats("MAT4", {1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 2, 0, 0,  0, 0, 1, //
+                                                        1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 2, 0, -1, 0, 0, 1})) +
+                    "}";
     std::vector<float> deltas(24, 0.0F);
-    deltas[2] = 1.0F;
+    deltas[2] = 0.5F;
     std::string& mesh = file.meshes[0];
     mesh.insert(mesh.find("\"indices\""),
                 R"("targets":[{"POSITION":)" + std::to_string(file.floats("VEC3", deltas)) + "}],");
