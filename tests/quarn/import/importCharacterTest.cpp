@@ -246,6 +246,24 @@ TEST_F(ImportCharacter, ClipsLieOneAfterAnotherAndShapesBeforeTheSkin) {
     EXPECT_NEAR(numberOf(findPlug("arm_sliders.slider[0].maxValue")), 1.5, 1e-6);
 }
 
+// in the order in which they are named; what the second does not know of goes back to rest
+TEST_F(ImportCharacter, ClipsEndAtAWholeFrame) {
+    Strip strip;
+    strip.more = turnAndRise;
+    options_.file = write("clips.gltf", strip.write().text());
+    options_.framesPerSecond = 10.0;
+    options_.animations = {"rise", "wave"};
+    importCharacter(options_);
+    SceneSession session(SceneOptions{options_.output, {}, 0});
+    EXPECT_EQ(textOf(findPlug("character.clips")),
+              R"([{"name":"rise","first":1,"last":6},{"name":"wave","first":9,"last":19}])");
+    const std::pair<double, double> weights[] = {{6.5, 1.5}, {8, 1.5}, {9, 0.25}, {19, 0.25}};
+    for (const auto& [frame, weight] : weights) {
+        session.host().setTime(frame);
+        EXPECT_NEAR(numberOf(findPlug("arm_sliders.output[0]")), weight, 1e-5) << frame;
+    }
+}
+
 TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
     const auto refused = [&](const std::string& why, const std::function<void(ImportOptions&)>& change) {
         ImportOptions options = options_;
