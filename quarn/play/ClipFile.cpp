@@ -3,7 +3,7 @@
 
 #include "quarn/console/numberText.h"
 #include "quarn/play/fitClip.h"
-#include "quarn/play/gltfParts.h"
+#include "quarn/scene/gltfParts.h"
 #include "quarn/scene/vertexNormals.h"
 
 #include <algorithm>

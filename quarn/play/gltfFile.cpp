@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // Source: the glTF 2.0 specification of the Khronos Group: the JSON object.
-#include "quarn/play/gltfParts.h"
+#include "quarn/scene/gltfParts.h"
 #include "quarn/play/meshFiles.h"
 #include "storage/encodings.h"
 

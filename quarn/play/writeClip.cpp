@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Source: the glTF 2.0 specification of the Khronos Group: morph targets, animations.
 #include "quarn/play/ClipFile.h"
-#include "quarn/play/gltfParts.h"
+#include "quarn/scene/gltfParts.h"
 
 #include <ostream>
 

@@ -2,6 +2,9 @@
 // Source: the glTF 2.0 specification of the Khronos Group: nodes, skins and animations.
 #include "quarn/pose/GltfSkeleton.h"
 
+#include "quarn/scene/gltfParts.h"
+
+#include <array>
 #include <ostream>
 
 namespace quarn {
@@ -41,11 +44,7 @@ public:
         JsonWriter json(buffer);
         json.SetFormatOptions(rapidjson::kFormatSingleLineArray);
         json.StartObject();
-        json.Key("asset");
-        json.StartObject();
-        writeText(json, "version", "2.0");
-        writeText(json, "generator", "quarn " QUARN_VERSION);
-        json.EndObject();
+        writeGltfAsset(json);
         writeCount(json, "scene", 0);
         writeScenes(json);
         writeNodes(json);
@@ -53,7 +52,7 @@ public:
         writeAnimation(json);
         skeleton_.numbers.write(json);
         json.EndObject();
-        writeGlb(out, buffer.GetString(), skeleton_.numbers.bytes());
+        writeGlb(out, buffer.GetString(), std::array{skeleton_.numbers.bytes()});
     }
 
 private:

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/skinnedGltf.h"
 
+#include "quarn/scene/gltfParts.h"
 #include "quarn/scene/meshes.h"
 
 #include <algorithm>
@@ -14,18 +15,6 @@ namespace {
 constexpr std::size_t setSize = 4;
 using Shape = GltfNumbers::Shape;
 using Use = GltfNumbers::Use;
-
-std::vector<std::uint32_t> trianglesOf(const MeshPolygons& polygons) {
-    std::vector<std::uint32_t> triangles;
-    triangles.reserve(3 * polygons.sizes.size());
-    const std::uint32_t* corner = polygons.corners.data();
-    for (const std::uint32_t size : polygons.sizes) {
-        for (std::uint32_t i = 2; i < size; ++i)
-            triangles.insert(triangles.end(), {corner[0], corner[i - 1], corner[i]});
-        corner += size;
-    }
-    return triangles;
-}
 
 // of a vertex: weights by joint, none of them 0, with the sum 1
 std::map<std::size_t, double> influencesOf(const SceneSkin& skin, std::size_t vertex) {
@@ -100,7 +89,7 @@ std::string whyNotInGltf(const SceneSkin& skin) {
 SkinnedGltf addSkinned(const SceneSkin& skin, const std::vector<HMatrix>& restWorlds, GltfNumbers& numbers) {
     std::vector<float> points;
     readPoints(skin.input, points);
-    const std::vector<std::uint32_t> triangles = trianglesOf(polygonsOf(skin.input));
+    const std::vector<std::uint32_t> triangles = gltfTriangles(polygonsOf(skin.input));
     if (points.size() != 3 * skin.weights.vertexCount() || triangles.empty())
         throw std::runtime_error("the mesh " + skin.mesh + " has " + std::to_string(points.size() / 3) +
                                  " vertices and " + std::to_string(triangles.size() / 3) + " triangles, and its skin " +

@@ -1,10 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/GltfNumbers.h"
 
+#include "quarn/scene/gltfParts.h"
+
 #include <algorithm>
 #include <array>
 #include <limits>
-#include <ostream>
 #include <stdexcept>
 
 namespace quarn {
@@ -20,11 +21,6 @@ ShapeText textOf(GltfNumbers::Shape shape) {
     return texts.at(static_cast<std::size_t>(shape));
 }
 
-template <class Number>
-std::string_view bytesOf(std::span<const Number> numbers) {
-    return {reinterpret_cast<const char*>(numbers.data()), numbers.size_bytes()};
-}
-
 void writeNumbers(JsonWriter& json, const char* key, const std::vector<float>& numbers) {
     if (numbers.empty())
         return;
@@ -33,11 +29,6 @@ void writeNumbers(JsonWriter& json, const char* key, const std::vector<float>& n
     for (const float number : numbers)
         json.Double(static_cast<double>(number));
     json.EndArray();
-}
-
-void putNumber(std::ostream& out, std::size_t number) {
-    const auto value = static_cast<std::uint32_t>(number);
-    out.write(reinterpret_cast<const char*>(&value), sizeof value);
 }
 
 } // namespace
@@ -60,8 +51,7 @@ std::size_t GltfNumbers::append(std::string_view bytes, std::size_t numberBytes,
 }
 
 std::size_t GltfNumbers::add(std::span<const float> numbers, const Kind& kind) {
-    constexpr unsigned single = 5126;
-    const std::size_t index = append(bytesOf(numbers), sizeof(float), single, kind);
+    const std::size_t index = append(bytesOf(numbers), sizeof(float), gltfFloat, kind);
     if (!kind.bounded || numbers.empty())
         return index;
     Accessor& accessor = accessors_[index];
@@ -76,8 +66,7 @@ std::size_t GltfNumbers::add(std::span<const float> numbers, const Kind& kind) {
 }
 
 std::size_t GltfNumbers::add(std::span<const std::uint32_t> numbers, const Kind& kind) {
-    constexpr unsigned unsignedInt = 5125;
-    return append(bytesOf(numbers), sizeof(std::uint32_t), unsignedInt, kind);
+    return append(bytesOf(numbers), sizeof(std::uint32_t), gltfUnsigned, kind);
 }
 
 std::size_t GltfNumbers::add(std::span<const std::uint16_t> numbers, const Kind& kind) {
@@ -102,14 +91,12 @@ void GltfNumbers::write(JsonWriter& json, const std::string& uri) const {
     json.Key("bufferViews");
     json.StartArray();
     for (const Accessor& accessor : accessors_) {
-        constexpr unsigned vertexBuffer = 34962;
-        constexpr unsigned indexBuffer = 34963;
         json.StartObject();
         writeCount(json, "buffer", 0);
         writeCount(json, "byteOffset", accessor.offset);
         writeCount(json, "byteLength", accessor.length);
         if (accessor.kind.use != Use::plain)
-            writeCount(json, "target", accessor.kind.use == Use::vertices ? vertexBuffer : indexBuffer);
+            writeCount(json, "target", accessor.kind.use == Use::vertices ? gltfVertexBuffer : gltfIndexBuffer);
         json.EndObject();
     }
     json.EndArray();
@@ -121,17 +108,6 @@ void GltfNumbers::write(JsonWriter& json, const std::string& uri) const {
         writeText(json, "uri", uri);
     json.EndObject();
     json.EndArray();
-}
-
-void writeGlb(std::ostream& out, std::string json, std::string_view bytes) {
-    json.resize((json.size() + 3) / 4 * 4, ' ');
-    out << "glTF";
-    putNumber(out, 2);
-    putNumber(out, 12 + 8 + json.size() + 8 + bytes.size());
-    putNumber(out, json.size());
-    out << "JSON" << json;
-    putNumber(out, bytes.size());
-    out.write("BIN\0", 4) << bytes;
 }
 
 } // namespace quarn

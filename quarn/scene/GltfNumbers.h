@@ -1,15 +1,13 @@
 // SPDX-License-Identifier: Apache-2.0
-// The binary part of a glTF file, and the container of a .glb.
+// The binary part of a glTF file.
 //
-// Source: the glTF 2.0 specification of the Khronos Group: accessors, buffer views, and the GLB container (a header of
-// 12 bytes, then a JSON and a binary chunk, each padded to a multiple of 4).
+// Source: the glTF 2.0 specification of the Khronos Group: accessors and buffer views.
 #pragma once
 
 #include "quarn/console/json.h"
 
 #include <cstddef>
 #include <cstdint>
-#include <iosfwd>
 #include <span>
 #include <string>
 #include <string_view>
@@ -52,9 +50,5 @@ private:
     std::string bytes_;
     std::vector<Accessor> accessors_;
 };
-
-/// The container with its two chunks. `json` a document whose first buffer is `bytes`, with a length that is a multiple
-/// of 4.
-void writeGlb(std::ostream& out, std::string json, std::string_view bytes);
 
 } // namespace quarn

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Source: the glTF 2.0 specification of the Khronos Group: accessors, and the GLB container (a header of 12 bytes, then
 // a JSON and a binary chunk, each padded to a multiple of 4).
-#include "quarn/play/gltfParts.h"
+#include "quarn/scene/gltfParts.h"
 
 #include <algorithm>
 #include <limits>
