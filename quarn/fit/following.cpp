@@ -106,9 +106,9 @@ Following followingOf(const SkinFrames& skin, const std::vector<FitPairs>& frame
 
 } // namespace
 
-Motion motionOf(const SkinFrames& skin, const CacheChange& change) {
+CacheMotion motionOf(const SkinFrames& skin, const CacheChange& change) {
     const Frames frames = posedFrames(skin, change);
-    Motion motion;
+    CacheMotion motion;
     motion.posedFrames = frames.size();
     motion.size = motionBetween(skin, frames);
     motion.ofAStep = motionOfAStep(skin);

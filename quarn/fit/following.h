@@ -12,7 +12,7 @@ enum class Following {
     untold ///< the skin moves too little beside the correction, or in too few frames
 };
 
-struct Motion {
+struct CacheMotion {
     std::size_t posedFrames = 0; ///< that were looked at, and in which the skin is not at rest
     double size = 0.0;           ///< mean distance of two of them
     /// Mean distance of two neighbouring frames; none where no two of those looked at are neighbours.
@@ -21,6 +21,6 @@ struct Motion {
 };
 
 /// A cache that belongs to the skin moves as it does, and something beside that has little to do with it.
-Motion motionOf(const SkinFrames& skin, const CacheChange& change);
+CacheMotion motionOf(const SkinFrames& skin, const CacheChange& change);
 
 } // namespace quarn

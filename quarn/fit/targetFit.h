@@ -19,7 +19,7 @@ struct TargetFit {
     FitDistance mended;                           ///< with the change; `asItIs` without one
     std::ptrdiff_t leastShift = 0, mostShift = 0; ///< between which shifts are alike
     std::optional<std::size_t> restFrame;         ///< of the cache, that tells the order of its vertices
-    Motion motion;                                ///< with the change
+    CacheMotion motion;                           ///< with the change
     /// Too little for a cause, but more than nothing: a shift that brings the mean to `nearerMean`; 0 for none.
     std::ptrdiff_t nearerShift = 0;
     double nearerMean = 0.0;

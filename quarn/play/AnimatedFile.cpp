@@ -12,7 +12,7 @@ bool isAnimatedFile(const std::filesystem::path& path, std::size_t frameCount) {
 }
 
 std::unique_ptr<AnimatedFile> createAnimatedFile(const std::filesystem::path& path, MeshPolygons polygons,
-                                                 Motion motion) {
+                                                 ClipMotion motion) {
     if (path.extension() == ".usda")
         return std::make_unique<UsdFile>(path, polygons, std::move(motion));
     return std::make_unique<ClipFile>(path, std::move(polygons), std::move(motion));

@@ -15,7 +15,7 @@
 namespace quarn {
 
 /// What is known of a motion before its first frame.
-struct Motion {
+struct ClipMotion {
     std::string meshName;
     FrameRange frames; ///< all that are going to be added
     double framesPerSecond = 24.0;
@@ -50,6 +50,6 @@ bool isAnimatedFile(const std::filesystem::path& path, std::size_t frameCount);
 /// Throws storage::FileError where the file cannot be put into its place, and std::runtime_error, naming the path,
 /// where its format cannot hold the motion.
 std::unique_ptr<AnimatedFile> createAnimatedFile(const std::filesystem::path& path, MeshPolygons polygons,
-                                                 Motion motion);
+                                                 ClipMotion motion);
 
 } // namespace quarn

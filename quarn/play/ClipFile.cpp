@@ -23,7 +23,7 @@ std::string inGigabytes(std::uint64_t bytes) {
 
 } // namespace
 
-ClipFile::ClipFile(const std::filesystem::path& path, MeshPolygons polygons, Motion motion)
+ClipFile::ClipFile(const std::filesystem::path& path, MeshPolygons polygons, ClipMotion motion)
     : path_(path)
     , file_(path)
     , polygons_(std::move(polygons))

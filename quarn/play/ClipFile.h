@@ -15,7 +15,7 @@ namespace quarn {
 /// mesh's unit; polygons are triangles.
 class ClipFile : public AnimatedFile {
 public:
-    ClipFile(const std::filesystem::path& path, MeshPolygons polygons, Motion motion);
+    ClipFile(const std::filesystem::path& path, MeshPolygons polygons, ClipMotion motion);
 
     std::uint64_t expectedBytes() const override;
     void add(int frame, std::span<const float> xyz) override;
@@ -29,15 +29,15 @@ private:
     storage::WholeFile file_;
     MeshPolygons polygons_;
     std::vector<std::uint32_t> triangles_;
-    Motion motion_;
+    ClipMotion motion_;
     std::vector<int> numbers_;
-    std::vector<MorphShape> frames_;
+    std::vector<ClipShape> frames_;
     std::optional<ShapesOfMotion> shapes_;
 };
 
 /// The file's content. `seconds` of each frame, rising from 0 or more; `triangles` not empty. The stream must be in the
 /// classic locale. Throws std::runtime_error where all of it is more than 4 GB.
 void writeClip(std::ostream& out, const MorphClip& clip, const std::vector<std::uint32_t>& triangles,
-               const std::vector<float>& seconds, const Motion& motion);
+               const std::vector<float>& seconds, const ClipMotion& motion);
 
 } // namespace quarn

@@ -23,7 +23,7 @@ std::string adviceFor(const std::string& ending) {
     return isNear ? ". What reads " + ending + " reads .usda or .pc2, which are" : "";
 }
 
-Motion motionOf(const FrameWriting& writing) {
+ClipMotion motionOf(const FrameWriting& writing) {
     return {writing.meshName,          writing.frames,
             writing.framesPerSecond,   writing.metersPerUnit * writing.space.scale,
             writing.space.axes == "z", writing.allowedError};

@@ -36,7 +36,7 @@ struct FrameWriting {
     double framesPerSecond = 24.0;           ///< above 0
     std::string meshName = {};               ///< as animated files call it
     double metersPerUnit = 1.0;              ///< of the scene
-    std::optional<double> allowedError = {}; ///< as of a Motion
+    std::optional<double> allowedError = {}; ///< as of a ClipMotion
 };
 
 /// Every file is there as a whole or not at all; of those of all frames nothing is left without finish(). Thread:

@@ -55,7 +55,7 @@ std::string primName(const std::string& text) {
     return name.empty() || !isLetter(name.front()) ? "_" + name : name;
 }
 
-UsdFile::UsdFile(const std::filesystem::path& path, const MeshPolygons& polygons, Motion motion)
+UsdFile::UsdFile(const std::filesystem::path& path, const MeshPolygons& polygons, ClipMotion motion)
     : file_(path)
     , motion_(std::move(motion))
     , vertexCount_(polygons.vertexCount) {

@@ -15,7 +15,7 @@ namespace quarn {
 class UsdFile : public AnimatedFile {
 public:
     /// `polygons` are only read here.
-    UsdFile(const std::filesystem::path& path, const MeshPolygons& polygons, Motion motion);
+    UsdFile(const std::filesystem::path& path, const MeshPolygons& polygons, ClipMotion motion);
 
     std::uint64_t expectedBytes() const override;
     void add(int frame, std::span<const float> xyz) override;
@@ -27,7 +27,7 @@ private:
     void writeHead(const MeshPolygons& polygons);
 
     storage::WholeFile file_;
-    Motion motion_;
+    ClipMotion motion_;
     std::size_t vertexCount_;
     std::vector<int> frames_;
     std::vector<Box> boxes_; ///< of each frame

@@ -15,7 +15,7 @@ namespace {
 using Rows = Eigen::Matrix<double, Eigen::Dynamic, Eigen::Dynamic, Eigen::RowMajor>; ///< a row for each frame
 using Row = Eigen::RowVectorXd;
 
-Rows rowsOf(const std::vector<MorphShape>& frames, std::vector<float> MorphShape::*part) {
+Rows rowsOf(const std::vector<ClipShape>& frames, std::vector<float> ClipShape::*part) {
     Rows rows(static_cast<Eigen::Index>(frames.size()), static_cast<Eigen::Index>((frames[0].*part).size()));
     for (Eigen::Index frame = 0; frame < rows.rows(); ++frame) {
         const std::vector<float>& numbers = frames[static_cast<std::size_t>(frame)].*part;
@@ -65,11 +65,11 @@ Range rangeOf(const Eigen::MatrixXd& courses) {
     return range;
 }
 
-MorphClip clipOf(const Eigen::MatrixXd& courses, const std::vector<MorphShape>& frames) {
+MorphClip clipOf(const Eigen::MatrixXd& courses, const std::vector<ClipShape>& frames) {
     MorphClip clip;
     const Range range = rangeOf(courses);
     clip.targets.resize(static_cast<std::size_t>(courses.cols()));
-    for (std::vector<float> MorphShape::*part : {&MorphShape::points, &MorphShape::normals}) {
+    for (std::vector<float> ClipShape::*part : {&ClipShape::points, &ClipShape::normals}) {
         Rows rows = rowsOf(frames, part);
         const Row mean = rows.colwise().mean();
         rows.rowwise() -= mean;
@@ -91,8 +91,8 @@ MorphClip clipOf(const Eigen::MatrixXd& courses, const std::vector<MorphShape>& 
 }
 
 // of what is written, in single precision
-double errorOf(const MorphClip& clip, const std::vector<MorphShape>& frames) {
-    Rows rest = rowsOf(frames, &MorphShape::points);
+double errorOf(const MorphClip& clip, const std::vector<ClipShape>& frames) {
+    Rows rest = rowsOf(frames, &ClipShape::points);
     const auto part = [&](const std::vector<float>& numbers) {
         return Row(Eigen::Map<const Eigen::RowVectorXf>(numbers.data(), rest.cols()).cast<double>());
     };
@@ -109,8 +109,8 @@ double errorOf(const MorphClip& clip, const std::vector<MorphShape>& frames) {
 
 } // namespace
 
-FittedClip fitClip(const std::vector<MorphShape>& frames, double allowed) {
-    Rows differences = rowsOf(frames, &MorphShape::points);
+FittedClip fitClip(const std::vector<ClipShape>& frames, double allowed) {
+    Rows differences = rowsOf(frames, &ClipShape::points);
     const Row mean = differences.colwise().mean();
     differences.rowwise() -= mean;
     const Eigen::MatrixXd courses = principalCourses(differences);

@@ -16,6 +16,6 @@ struct FittedClip {
 /// The fewest principal shapes of the motion whose `error` is at most `allowed`, above 0; their normals are those that
 /// fit best. The base and the shapes are such that each weight goes from 0 to 1. `frames` at least 2, of as many
 /// vertices each. With all shapes and a larger error, where single precision is too coarse.
-FittedClip fitClip(const std::vector<MorphShape>& frames, double allowed);
+FittedClip fitClip(const std::vector<ClipShape>& frames, double allowed);
 
 } // namespace quarn

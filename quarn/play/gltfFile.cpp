@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Source: the glTF 2.0 specification of the Khronos Group: the JSON object.
-#include "quarn/scene/gltfParts.h"
 #include "quarn/play/meshFiles.h"
+#include "quarn/scene/gltfParts.h"
 #include "storage/encodings.h"
 
 #include <array>

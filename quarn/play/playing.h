@@ -34,7 +34,7 @@ struct PlayPlan {
     CacheSpace space;                       ///< the same
     std::string meshName;                   ///< in animated files
     bool isAnySizeWritten = false;          ///< also what is far larger than the motion is worth
-    std::optional<double> allowedError;     ///< as of a Motion
+    std::optional<double> allowedError;     ///< as of a ClipMotion
     bool isOnGpu = false;                   ///< chooseEvaluator() was told so
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none

@@ -23,7 +23,7 @@ struct Numbers {
     std::size_t vectorBytes = 0, indexBytes = 0, secondBytes = 0, weightBytes = 0;
 };
 
-void addShape(Numbers& numbers, const MorphShape& shape) {
+void addShape(Numbers& numbers, const ClipShape& shape) {
     for (const std::vector<float>* part : {&shape.points, &shape.normals}) {
         numbers.parts.push_back(bytesOf(*part));
         numbers.vectorBytes += numbers.parts.back().size();
@@ -32,7 +32,7 @@ void addShape(Numbers& numbers, const MorphShape& shape) {
 
 class ClipDocument {
 public:
-    ClipDocument(const MorphClip& clip, const Motion& motion)
+    ClipDocument(const MorphClip& clip, const ClipMotion& motion)
         : clip_(clip)
         , motion_(motion)
         , accessors_(clip.targets.size()) {}
@@ -103,7 +103,7 @@ private:
         json_.Key("extras"); // where readers look for the names of targets
         json_.StartObject();
         beginList("targetNames");
-        for (const MorphTarget& target : clip_.targets)
+        for (const ClipTarget& target : clip_.targets)
             writeText(json_, target.name);
         json_.EndArray();
         json_.EndObject();
@@ -136,7 +136,7 @@ private:
         writeCount(json_, "count", count);
     }
 
-    void writeVectors(const MorphShape& shape, std::size_t& offset) {
+    void writeVectors(const ClipShape& shape, std::size_t& offset) {
         const std::size_t count = shape.points.size() / 3;
         beginAccessor(0, offset, gltfFloat, "VEC3", count);
         writeGltfBox(json_, shape.points, 3);
@@ -150,7 +150,7 @@ private:
         beginList("accessors");
         std::size_t offset = 0;
         writeVectors(clip_.base, offset);
-        for (const MorphTarget& target : clip_.targets)
+        for (const ClipTarget& target : clip_.targets)
             writeVectors(target.shape, offset);
         beginAccessor(1, 0, gltfUnsigned, "SCALAR", triangles.size());
         json_.EndObject();
@@ -191,7 +191,7 @@ private:
     }
 
     const MorphClip& clip_;
-    const Motion& motion_;
+    const ClipMotion& motion_;
     Accessors accessors_;
     rapidjson::StringBuffer buffer_;
     JsonWriter json_{buffer_};
@@ -200,10 +200,10 @@ private:
 } // namespace
 
 void writeClip(std::ostream& out, const MorphClip& clip, const std::vector<std::uint32_t>& triangles,
-               const std::vector<float>& seconds, const Motion& motion) {
+               const std::vector<float>& seconds, const ClipMotion& motion) {
     Numbers numbers;
     addShape(numbers, clip.base);
-    for (const MorphTarget& target : clip.targets)
+    for (const ClipTarget& target : clip.targets)
         addShape(numbers, target.shape);
     numbers.parts.insert(numbers.parts.end(), {bytesOf(triangles), bytesOf(seconds), bytesOf(clip.weights)});
     numbers.indexBytes = bytesOf(triangles).size();

@@ -25,6 +25,11 @@ libraries/storage/WholeFile.cpp|::rename(name_.c_str(), target.c_str());
 plugin/entry/registration.cpp|std::filesystem::rename(from, to);
 quarn/main.cpp|constexpr auto digits = "uvwxyz0123456789+/";
 END
+printf 'struct Character {\n};\n' >>"$tree/quarn/play/playing.h"
+ask "$here/places.sh" "$tree"
+[[ $status == 1 && $said == *"quarn::Character: quarn/character/Character.h quarn/play/playing.h"* ]] ||
+  wrong "a second type of one name to be found"
+copy
 # and that a place has lost what belongs there
 sed -i '/::rename(/d' "$tree/libraries/storage/TemporaryFile.cpp"
 ask "$here/places.sh" "$tree"
