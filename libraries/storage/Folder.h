@@ -19,8 +19,8 @@ void syncToDisk(const std::filesystem::path& path);
 /// cannot has the names all the same.
 void flushNames(const std::filesystem::path& folder);
 
-/// Gives a folder another name, which no folder has that is not empty. A file too, one that another program has made; it
-/// takes the place of a file that is there. Throws FileError. Thread: any.
+/// Gives a folder another name, which no folder has that is not empty. A file too, one that another program has made;
+/// it takes the place of a file that is there. Throws FileError. Thread: any.
 void moveFolder(const std::filesystem::path& from, const std::filesystem::path& to);
 
 /// Puts `next` in the place of `folder`, and what was there in the place of `next`, in one step: `folder` is there at

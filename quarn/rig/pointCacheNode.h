@@ -46,7 +46,8 @@ private:
     HStatus moveToCache(HDataBlock& block, HObject& mesh);
     void openFile(const HString& rawPath);
 
-    std::unique_ptr<storage::PointCache> file_; ///< as of the last compute; null before it, and after a failure to open it
+    std::unique_ptr<storage::PointCache>
+        file_; ///< as of the last compute; null before it, and after a failure to open it
 };
 
 } // namespace rig

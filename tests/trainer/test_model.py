@@ -108,13 +108,14 @@ class ModelTest(unittest.TestCase):
 
     def test_deltas_that_look_like_no_corrections_are_said(self) -> None:
         # of the set as it is, the mean is a few hundredths of the diagonal
-        for number, (changes, wanted) in enumerate((
-                ({}, ""), ({"boundingBoxDiagonal": 0.5}, "of the character's diagonal"),
-                ({"boundingBoxDiagonal": 0}, ""), ({"targetFit": {"follows": True, "motion": 0.01}}, ""),
-                ({"targetFit": {"follows": False, "motion": 9.0}}, "do not go with the poses"),
-                ({"targetFit": {"follows": None, "motion": 0.01}}, "larger than what the skin moves"),
-                ({"targetFit": {"follows": None, "motion": 0}}, ""),
-                ({"targetFit": {"follows": None, "motion": 9}}, ""), ({"targetFit": [{"motion": "x"}]}, ""))):
+        cases: list[tuple[dict[str, Any], str]] = [
+            ({}, ""), ({"boundingBoxDiagonal": 0.5}, "of the character's diagonal"),
+            ({"boundingBoxDiagonal": 0}, ""), ({"targetFit": {"follows": True, "motion": 0.01}}, ""),
+            ({"targetFit": {"follows": False, "motion": 9.0}}, "do not go with the poses"),
+            ({"targetFit": {"follows": None, "motion": 0.01}}, "larger than what the skin moves"),
+            ({"targetFit": {"follows": None, "motion": 0}}, ""),
+            ({"targetFit": {"follows": None, "motion": 9}}, ""), ({"targetFit": [{"motion": "x"}]}, "")]
+        for number, (changes, wanted) in enumerate(cases):
             said = " ".join(doubts(load_dataset(synthetic.make(self.place / f"{number}", frames=9, **changes))))
             self.assertIn(wanted, said)
             self.assertEqual(bool(wanted), bool(said), (changes, said))
