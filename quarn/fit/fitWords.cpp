@@ -38,7 +38,7 @@ std::string shiftText(const TargetFit& fit) {
                        (by == 1 ? std::string("one frame") : std::to_string(by) + " frames") +
                        (fit.change.shift > 0 ? " late" : " early");
     if (isBlurred) {
-        const auto [least, most] = std::minmax(std::abs(fit.leastShift), std::abs(fit.mostShift));
+        const auto [least, most] = std::minmax({std::abs(fit.leastShift), std::abs(fit.mostShift)});
         text += " (" + std::to_string(least) + " to " + std::to_string(most) +
                 " fit alike: the motion is too slow to tell them apart)";
     }

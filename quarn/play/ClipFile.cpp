@@ -13,7 +13,7 @@
 namespace quarn {
 namespace {
 
-constexpr std::uint64_t bytesPerVertex = 2 * 3 * sizeof(float); // position and normal
+constexpr std::uint64_t bytesPerVertex = 6 * sizeof(float); // position and normal
 
 constexpr double millimetresPerMeter = 1000.0;
 
