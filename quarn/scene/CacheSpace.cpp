@@ -24,8 +24,9 @@ std::string problemOfScale(const std::string& text) {
 void CacheSpace::toScene(std::span<double> xyz) const {
     if (isTheScenes())
         return;
+    const bool isZUp = axes == "z";
     for (std::size_t i = 0; i + 2 < xyz.size(); i += 3) {
-        if (axes == "z") {
+        if (isZUp) {
             const double y = xyz[i + 1];
             xyz[i + 1] = xyz[i + 2];
             xyz[i + 2] = -y;
@@ -38,8 +39,9 @@ void CacheSpace::toScene(std::span<double> xyz) const {
 void CacheSpace::toCache(std::span<float> xyz) const {
     if (isTheScenes())
         return;
+    const bool isZUp = axes == "z";
     for (std::size_t i = 0; i + 2 < xyz.size(); i += 3) {
-        if (axes == "z") {
+        if (isZUp) {
             const float y = xyz[i + 1];
             xyz[i + 1] = -xyz[i + 2];
             xyz[i + 2] = y;
