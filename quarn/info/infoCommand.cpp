@@ -43,10 +43,11 @@ void writeTexts(JsonWriter& writer, const char* key, const std::vector<std::stri
 struct OpenedScene {
     std::optional<SceneReport> report;
     std::vector<std::string> missingTypes;
-    std::string whyNot; ///< without a report
+    std::vector<std::string> warnings; ///< of the file: what the host did not understand in it
+    std::string whyNot;                ///< without a report
 };
 
-// what the host has to say while it opens a scene is in the report already
+// what the host has to say while it opens a scene is in what is printed already
 class Silence {
 public:
     Silence()
@@ -68,7 +69,7 @@ OpenedScene openedScene(const fs::path& path) {
     try {
         SceneSession session;
         opened.missingTypes = OpenQuarn::readSummary(absolutePath(path)).missingTypes;
-        session.open(path);
+        opened.warnings = session.open(path);
         opened.report = describeScene();
     } catch (const std::runtime_error& error) {
         opened.whyNot = error.what();
@@ -100,6 +101,7 @@ void printJson(const SceneSummary& summary, const OpenedScene& opened) {
     writer.EndObject();
     writeTexts(writer, "plugins", summary.plugins);
     writeTexts(writer, "missingTypes", opened.missingTypes);
+    writeTexts(writer, "warnings", opened.warnings);
     writeBool(writer, "described", opened.report.has_value());
     if (opened.report)
         writeScene(writer, *opened.report);
@@ -123,7 +125,10 @@ std::string summaryText(const SceneSummary& summary, const OpenedScene& opened) 
     LineList missing("unknown types");
     for (const std::string& type : opened.missingTypes)
         missing.add("node type " + (type.empty() ? "without a name" : type) + " is in no loaded plug-in");
-    text << types.text() << plugins.text() << missing.text();
+    LineList warnings("warnings");
+    for (const std::string& warning : opened.warnings)
+        warnings.add("warning: " + warning);
+    text << types.text() << plugins.text() << missing.text() << warnings.text();
     if (opened.report)
         text << sceneText(*opened.report);
     else

@@ -3,11 +3,12 @@
 
 #include "quarn/play/ClipFile.h"
 #include "quarn/play/UsdFile.h"
+#include "storage/framePattern.h"
 
 namespace quarn {
 
 bool isAnimatedFile(const std::filesystem::path& path, std::size_t frameCount) {
-    const bool isOneFile = path.filename().string().find('#') == std::string::npos;
+    const bool isOneFile = !storage::isFramePattern(path);
     return path.extension() == ".usda" || (path.extension() == ".glb" && isOneFile && frameCount > 1);
 }
 

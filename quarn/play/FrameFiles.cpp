@@ -6,8 +6,8 @@
 #include "storage/CacheFormat.h"
 #include "storage/PointCacheWriter.h"
 #include "storage/WholeFile.h"
+#include "storage/framePattern.h"
 
-#include <cstdlib>
 #include <stdexcept>
 
 namespace quarn {
@@ -31,18 +31,6 @@ ClipMotion motionOf(const FrameWriting& writing) {
 
 } // namespace
 
-std::filesystem::path frameFile(const std::filesystem::path& pattern, int frame) {
-    std::string name = pattern.filename().string();
-    const std::size_t begin = name.find('#');
-    if (begin == std::string::npos)
-        return pattern;
-    const std::size_t end = std::min(name.find_first_not_of('#', begin), name.size());
-    std::string digits = std::to_string(std::abs(frame));
-    if (digits.size() < end - begin)
-        digits.insert(0, end - begin - digits.size(), '0');
-    return pattern.parent_path() / name.replace(begin, end - begin, (frame < 0 ? "-" : "") + digits);
-}
-
 void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& frames) {
     using storage::WholeFile;
     if (isCache(pattern))
@@ -54,11 +42,11 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
                          "\" is no file that is written here: its name ends in .npy, .npz, .pc2, .mdd, .obj, .ply, "
                          ".gltf, .glb or .usda" +
                          adviceFor(pattern.extension().string()));
-    if (frames.count() > 1 && pattern.filename().string().find('#') == std::string::npos)
+    if (frames.count() > 1 && !storage::isFramePattern(pattern))
         throw UsageError("\"" + pattern.string() + "\" would be written for each of " + std::to_string(frames.count()) +
                          " frames: put #### where the number of the frame goes, as in \"" + pattern.stem().string() +
                          ".####" + pattern.extension().string() + "\"");
-    WholeFile::requirePossible(frameFile(pattern, frames.first));
+    WholeFile::requirePossible(storage::frameFile(pattern, frames.first));
 }
 
 FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, FrameWriting writing)
@@ -96,7 +84,7 @@ void FrameFiles::add(int frame, std::span<const float> xyz) {
     else if (animated_)
         animated_->add(frame, written(xyz));
     else
-        writeMeshFile(frameFile(pattern_, frame), written(xyz), polygons_);
+        writeMeshFile(storage::frameFile(pattern_, frame), written(xyz), polygons_);
 }
 
 void FrameFiles::finish() {

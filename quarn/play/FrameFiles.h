@@ -20,10 +20,6 @@ class PointCacheWriter;
 
 namespace quarn {
 
-/// The file name of a frame: the run of "#" in the last part of `pattern` becomes the number, padded with zeros to as
-/// many digits ("-0012" for -12). A pattern without "#" comes back as it is.
-std::filesystem::path frameFile(const std::filesystem::path& pattern, int frame);
-
 /// Throws std::runtime_error when the ending is none that is written, and for a mesh file without "#" where there are
 /// several frames. Before anything is played.
 void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& frames);

@@ -3,9 +3,9 @@
 
 #include "quarn/console/UsageError.h"
 #include "storage/WholeFile.h"
+#include "storage/framePattern.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <stdexcept>
 #include <string>
 
@@ -14,28 +14,15 @@ namespace {
 
 namespace fs = std::filesystem;
 
-// -7 in 4 digits is -0007
-std::string padded(int frame, std::size_t digits) {
-    std::string text = std::to_string(std::abs(frame));
-    text.insert(0, digits - std::min(digits, text.size()), '0');
-    return (frame < 0 ? "-" : "") + text;
-}
-
 } // namespace
 
 fs::path pictureName(const fs::path& pattern, int frame, bool several) {
-    std::string name = pattern.filename().string();
-    const std::size_t last = name.rfind('#');
-    if (last != std::string::npos) {
-        const std::size_t before = name.find_last_not_of('#', last);
-        const std::size_t first = before == std::string::npos ? 0 : before + 1;
-        name.replace(first, last - first + 1, padded(frame, last - first + 1));
-    } else if (several && storage::isWrittenThrough(pattern)) {
+    if (!several || storage::isFramePattern(pattern))
+        return storage::frameFile(pattern, frame);
+    if (storage::isWrittenThrough(pattern))
         throw std::runtime_error(pattern.string() + " takes one picture, and more than one frame is to be drawn");
-    } else if (several) {
-        name = pattern.stem().string() + "." + padded(frame, 4) + pattern.extension().string();
-    }
-    return pattern.parent_path() / name;
+    const std::string numbered = pattern.stem().string() + ".####" + pattern.extension().string();
+    return storage::frameFile(pattern.parent_path() / numbered, frame);
 }
 
 void checkPictureName(const fs::path& pattern) {

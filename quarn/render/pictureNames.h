@@ -6,8 +6,8 @@
 
 namespace quarn {
 
-/// The file of a frame. The last run of "#" in the file's name becomes the frame with at least as many digits; without
-/// one, and where there are `several` frames, the frame with 4 digits goes before the ending: "pic.0007.png".
+/// The file of a frame, as storage::frameFile() names it. Without a "#", and where there are `several` frames, the
+/// frame with 4 digits goes before the ending: "pic.0007.png".
 std::filesystem::path pictureName(const std::filesystem::path& pattern, int frame, bool several);
 
 /// Throws std::runtime_error, naming it, for a name that does not end in .png and a folder that does not exist.

@@ -139,11 +139,13 @@ void requireNoCharacter(const fs::path& scene) {
                                      " -o " + scene.stem().string() + ".json makes a scene of it");
 }
 
-void SceneSession::open(const fs::path& scene) {
+std::vector<std::string> SceneSession::open(const fs::path& scene) {
     requireNoCharacter(scene);
     Stage stage([&] { return "opening scene " + absolutePath(scene).string(); });
-    must(OpenQuarn::openScene(absolutePath(scene)));
+    OpenQuarn::FileOutcome outcome = OpenQuarn::openScene(absolutePath(scene));
+    must(outcome);
     stage.result([&] { return std::to_string(session_.nodeCount()) + " nodes"; });
+    return std::move(outcome.warnings);
 }
 
 void SceneSession::moveTo(const fs::path& folder) {

@@ -60,8 +60,9 @@ public:
     SceneSession(const SceneSession&) = delete;
     SceneSession& operator=(const SceneSession&) = delete;
 
-    /// `scene` counts from the caller's folder.
-    void open(const std::filesystem::path& scene);
+    /// `scene` counts from the caller's folder. Answers with what the host warned of meanwhile, each beginning with the
+    /// file's name; its message sink has got them too.
+    std::vector<std::string> open(const std::filesystem::path& scene);
     /// Moves the scene to the folder of that path first.
     void save(const std::filesystem::path& scene);
     /// For a scene that is to be saved in another folder, and gets names of files before: from now on they count from

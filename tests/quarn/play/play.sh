@@ -122,6 +122,11 @@ sed -i 's/"fullCount": 4/"fullCount": 369/' "$work/models/"*/metadata.json
 rm -r "$work/models/two.nwrp"
 
 expect 0 'Off, not there: training makes nowhere/wave\.nwrp\n$' '' info "$work/untrained.json"
+sed 's/modelName/modelNmae/; s/"openquarnScene"/"openQuarnScene": 1, &/' "$scene" >"$work/misspelt.json"
+misspelt=('the key .?openQuarnScene.? is not known' 'modelNmae')
+expect 0 "warning: .*misspelt\.json: .*${misspelt[0]}.*\n(.|\n)*warning: .*${misspelt[1]}" '' info "$work/misspelt.json"
+expect 0 "\"warnings\": \[\s+\".*${misspelt[0]}.*\"(.|\n)*${misspelt[1]}" '' info "$work/misspelt.json" --json
+expect 0 '"warnings": \[\],' '' info "$scene" --json
 expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\nfits\n' '' \
   info "$work/models/wave.nwrp" --scene "$scene"
 

@@ -131,13 +131,6 @@ TEST(VertexOrder, WritesEveryVertexOfTheFile) {
                 HasSubstr("vertex 2 of the scene"));
 }
 
-TEST(FrameFiles, AreNamedByTheFrame) {
-    EXPECT_EQ(frameFile("a/b.####.obj", 12), "a/b.0012.obj");
-    EXPECT_EQ(frameFile("a#/b.##.obj", 123), "a#/b.123.obj");
-    EXPECT_EQ(frameFile("b#.obj", -7), "b-7.obj");
-    EXPECT_EQ(frameFile("b.obj", 7), "b.obj");
-}
-
 // y of the scene is z of the file, and its unit a hundredth
 TEST(FrameFiles, AreWrittenInTheSpaceThatIsAskedFor) {
     const TemporaryFolder folder;

@@ -92,7 +92,6 @@ TEST(PictureName, FramesInNames) {
     EXPECT_EQ(name("/a/pic.png", 7, false), "/a/pic.png");
     EXPECT_EQ(name("/a/pic.png", 7, true), "/a/pic.0007.png");
     EXPECT_EQ(name("/a#/pic.png", -7, true), "/a#/pic.-0007.png");
-    EXPECT_EQ(name("/a/###_#.png", 12345, false), "/a/###_12345.png");
     EXPECT_EQ(name("##.png", 3, true), "03.png");
     EXPECT_THAT([] { checkPictureName("/pic.jpg"); }, ThrowsMessage<std::runtime_error>(HasSubstr("end in .png")));
     EXPECT_NO_THROW(checkPictureName(std::filesystem::temp_directory_path() / "pic.PNG"));
