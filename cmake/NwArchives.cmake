@@ -6,7 +6,8 @@ file(GLOB _trainer_sources CONFIGURE_DEPENDS trainer/*.py)
 install(FILES ${_trainer_sources} DESTINATION "${_nw_data_dir}/trainer")
 install(FILES pyproject.toml VERSION LICENSE DESTINATION "${_nw_data_dir}")
 install(PROGRAMS scripts/neuralwarp-train DESTINATION "${CMAKE_INSTALL_BINDIR}")
-install(DIRECTORY examples/hand examples/blender DESTINATION "${_nw_data_dir}/examples" PATTERN __pycache__ EXCLUDE)
+install(DIRECTORY examples/hand examples/arm examples/blender DESTINATION "${_nw_data_dir}/examples"
+  PATTERN __pycache__ EXCLUDE)
 install(DIRECTORY docs/ DESTINATION "${CMAKE_INSTALL_DOCDIR}")
 install(FILES docs/installed.md DESTINATION "${CMAKE_INSTALL_DOCDIR}" RENAME README.md)
 

@@ -1,5 +1,5 @@
 # shellcheck shell=bash
-# ./run demo: from a rigged hand to a neural deformation and its report. Sourced by ./run.
+# ./run demo: from a rigged hand, and from an arm, to a neural deformation and its report. Sourced by ./run.
 #
 # A row of the report is a quarn run (docs/run.md), whose steps are the commands that docs/tutorial.md explains; what a
 # step prints goes to a file in its log folder. Rows are two delta modes, with --all by two kinds of model; each network of
@@ -12,8 +12,12 @@ usage: ./run demo [--all] [--output FOLDER] [--samples N] [--epochs N]
   --all             also two networks that learn the deltas themselves, without principal shapes; no picture shows them
   --output FOLDER   where the results go (default: demo-out); those of an earlier demo there are replaced, but for
                     steps that would come out the same
-  --samples N       training poses, 10 or more (default 3000)
+  --samples N       training poses of the hand, 10 or more (default 3000); the arm, which has fewer joints, gets a fifth
+                    of them, 40 at least
   --epochs N        passes over them (default 250)
+
+The hand's report is report.html. The arm's is arm/report.html, and its picture, of which skin, target and result are to
+be told apart, is arm.png.
 TEXT
 }
 
@@ -55,11 +59,11 @@ demo_place() {
 # --- what is coming ---
 
 # Seconds of one core, measured: a target shape 0.04, a pose in an epoch of a network of shapes 0.0001, of a direct one
-# 0.0005; the rest of a demo 50. Targets are shared between the cores, and trainings go two side by side.
+# 0.0005; the rest of a demo 50, and the arm 25. Targets are shared between the cores, and trainings go two side by side.
 demo_seconds() {
   local cores kind seconds
   cores=$(job_count)
-  seconds=$((50 + (demo_samples + 120) * 40 / (1000 * cores)))
+  seconds=$((75 + (demo_samples + 120) * 40 / (1000 * cores) + $(arm_samples) * demo_epochs / 10000))
   for kind in "${demo_kinds[@]}"; do
     local cost=1
     if [[ $kind == direct ]]; then cost=5; fi
@@ -82,7 +86,7 @@ demo_announce() {
   seconds=$(demo_seconds)
   loads=$(demo_loads | paste -s -d ';' | sed 's/;/, /g')
   [[ -x build/release/quarn/quarn ]] || build=", and a few more to build it first (5 on two cores)"
-  say "the demo: a hand is rigged, posed $demo_samples times, learned and played; its results go to $demo_out"
+  say "the demo: a hand is rigged, posed $demo_samples times, learned and played, then an arm; its results go to $demo_out"
   say "it takes about $(((seconds + 59) / 60)) min on $(job_count) free cores$build"
   say "to be loaded: ${loads:-nothing, all of it is there}"
 }
@@ -158,7 +162,7 @@ demo_install() {
 demo_folders() {
   data=$demo_out/data logs=$demo_out/log
   rm -rf "$data/preview" "$demo_out/pictures" "$logs"
-  rm -f "$demo_out"/report.{html,json} "$demo_out"/{table.txt,preview.webp}
+  rm -f "$demo_out"/report.{html,json} "$demo_out"/{table.txt,preview.webp,arm.png}
   mkdir -p "$data/preview" "$demo_out/pictures" "$logs"
 }
 
@@ -219,6 +223,24 @@ demo_pictures() {
     -o "$data/preview/frame.####.png"
 }
 
+# The arm is a character of our own, and goes all the way in one quarn run.
+arm_samples() { printf '%s' "$((demo_samples > 200 ? demo_samples / 5 : 40))"; }
+
+demo_arm() {
+  say "an arm, all the way"
+  "$python" examples/arm/write_arm.py "$demo_out/arm.glb"
+  NW_PYTHON=$python "$QUARN" run "$demo_out/arm.glb" -o "$demo_out/arm" --limits examples/arm/limits.json \
+    --samples "$(arm_samples)" --activation-rate 0.8 --seed 1 --motion examples/arm/motion.json \
+    --epochs "$demo_epochs" --train-option=--learning-rate --train-option=0.001 \
+    --train-option=--principal-accuracy --train-option=0.999 --render-option=--view --render-option=15,15 \
+    --target-command "$python" examples/arm/arm_targets.py >"$logs/arm.log"
+  local skin=arm_skin.outputGeom[0] target=arm_target.outMesh neural=warp.outputGeom[0]
+  step "the arm's picture" \
+    "$QUARN" render "$demo_out/arm/motion.arm.json" --panel "skin=$skin" --panel "target=$target" \
+    --panel "neural=$neural" --heat "before=$skin:$target" --heat "after=$neural:$target" --range 30 --view 15,15 \
+    --model arm --size 400x400 --frames 46 -o "$demo_out/arm.png"
+}
+
 command_demo() {
   local data logs python demo_out demo_samples demo_epochs demo_kinds
   local surface_smoothing=5 activation_rate=0.8 mesh=l_handMeshNode skin_plug target_plug start=$SECONDS judge=()
@@ -231,9 +253,13 @@ command_demo() {
   skin_plug=${mesh}_skin.outputGeom[0] target_plug=${mesh}_target.outMesh
   demo_rows
   demo_pictures
+  demo_arm
   # fewer poses or passes than these are for trying the commands: they cannot keep the limits
   ((demo_samples >= 3000 && demo_epochs >= 250)) && judge=(--judge)
   local rows=("${demo_kinds[@]/#/surface_}" "${demo_kinds[@]/#/offset_}")
+  say "the hand"
   "$python" examples/hand/report.py "$demo_out" "${rows[@]}" "${judge[@]}"
-  say "done after $((SECONDS - start)) s: open $demo_out/report.html"
+  say "the arm"
+  cat "$demo_out/arm/table.txt"
+  say "done after $((SECONDS - start)) s: open $demo_out/report.html, $demo_out/arm/report.html and $demo_out/arm.png"
 }

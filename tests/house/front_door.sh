@@ -76,7 +76,7 @@ run_row 0 'testing release' '^ctest --preset release .* -R geometry$' test -R ge
 
 # --- a demo says what is coming ---
 run_row 1 'posed 40 times.*its results go to .*/here' 'npm pack' demo --output here --samples 40 --epochs 3
-for said in 'about 1 min .*to build it first' 'to be loaded: .*the hand \(94 MB\)'; do
+for said in 'about 2 min .*to build it first' 'to be loaded: .*the hand \(94 MB\)'; do
   grep -qE "$said" "$work/said" || { echo "the demo does not say '$said'" && failures=$((failures + 1)); }
 done
 
