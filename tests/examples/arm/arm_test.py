@@ -13,9 +13,9 @@ import numpy as np
 EXAMPLE = Path(__file__).resolve().parents[3] / "examples/arm"
 sys.path.insert(0, str(EXAMPLE))
 
-from arm_shape import JOINTS, arm_points, arm_triangles, arm_weights, volume  # noqa: E402
+from arm_shape import AROUND, JOINTS, arm_points, arm_triangles, arm_weights, volume  # noqa: E402
 from muscles import Arm  # noqa: E402
-from write_arm import with_seam  # noqa: E402
+from write_arm import texture_coordinates, with_seam  # noqa: E402
 
 REST, TRIANGLES = arm_points(), arm_triangles()
 LOSS = 0.0264  # of the volume, that the skin has at 90 degrees
@@ -88,6 +88,14 @@ class ArmTest(unittest.TestCase):
         turn, place = rotation(30.0, 70.0), [0.3, -0.2, 0.1]
         bent = skinned(100, 40, 20)
         self.assertLess(np.abs(self.arm.pose(bent @ turn + place) - (self.arm.pose(bent) @ turn + place)).max(), 1e-9)
+
+    def test_the_seam(self) -> None:
+        """The file's triangles are the arm's, and none of them goes back through the whole texture."""
+        of_vertex, corners = with_seam()
+        self.assertTrue((of_vertex[corners] == TRIANGLES).all())
+        around = texture_coordinates(of_vertex)[corners[AROUND:-AROUND], 1]
+        self.assertLess(np.ptp(around, axis=1).max(), 1.5 / AROUND)
+        self.assertEqual(np.bincount(corners.ravel()).min(), 2)
 
     def test_the_program(self) -> None:
         """Any frames, in any order, of vertices in any order, of which some are there twice; or a sentence."""
