@@ -238,7 +238,7 @@ demo_arm() {
   step "the arm's picture" \
     "$QUARN" render "$demo_out/arm/motion.arm.json" --panel "skin=$skin" --panel "target=$target" \
     --panel "neural=$neural" --heat "before=$skin:$target" --heat "after=$neural:$target" --range 30 --view 15,15 \
-    --model arm --size 400x400 --frames 46 -o "$demo_out/arm.png"
+    --model arm --size 400x400 --frames 34 -o "$demo_out/arm.png"
 }
 
 command_demo() {

@@ -21,7 +21,8 @@ python=$(scripts/find_python.sh) || {
   exit 77
 }
 command_demo --all --output "$work/demo" --samples 40 --epochs 3
-for file in report.html preview.webp table.txt pictures/motion.0060.png pictures/offset.0060.png; do
+for file in report.html preview.webp table.txt pictures/motion.0060.png pictures/offset.0060.png arm.png \
+  arm/report.html; do
   [[ -s $work/demo/$file ]] || fail "the demo made no $file"
 done
 "$python" tests/demo/recompute.py "$work/demo"
