@@ -16,8 +16,8 @@ usage: ./run demo [--all] [--output FOLDER] [--samples N] [--epochs N]
                     of them, 40 at least
   --epochs N        passes over them (default 250)
 
-The hand's report is report.html. The arm's is arm/report.html, and its picture, of which skin, target and result are to
-be told apart, is arm.png.
+The hand's report is report.html. The arm takes less than a minute of the demo; its report is arm/report.html, and its
+picture, in which one sees what was learned, arm.png.
 TEXT
 }
 

@@ -16,7 +16,7 @@ OLECRANON = 0.008  # and the point of the elbow
 # upper arm and forearm keep GAP off the plane between them, and give way from SOFT on; both grow from nothing at the
 # elbow, where the two are one, and are whole at a distance of some NEAR
 GAP, SOFT, NEAR = 0.002, 0.012, 0.04
-VOLUME_STEPS = 4  # each leaves a tenth of the error
+VOLUME_STEPS = 2  # each leaves a hundredth of the error
 
 
 class Arm:
