@@ -59,7 +59,8 @@ demo_place() {
 # --- what is coming ---
 
 # Seconds of one core, measured: a target shape 0.04, a pose in an epoch of a network of shapes 0.0001, of a direct one
-# 0.0005; the rest of a demo 50, and the arm 25. Targets are shared between the cores, and trainings go two side by side.
+# 0.0005; the rest of a demo 50, and the arm 25. Targets are shared between the cores, and trainings go two side by
+# side.
 demo_seconds() {
   local cores kind seconds
   cores=$(job_count)
