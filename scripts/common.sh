@@ -33,6 +33,7 @@ declare -A probe_of=(
   [libeigen3-dev]=eigen3/Eigen/Core
   [libassimp-dev]=assimp/Importer.hpp
   [libmeshoptimizer-dev]=/usr/include/meshoptimizer.h
+  [libpugixml-dev]=/usr/include/pugixml.hpp
   [zlib1g-dev]=/usr/include/zlib.h # for compressed NumPy arrays; and Assimp's own configuration links it
   [libembree-dev]=embree3/rtcore.h
   [libstb-dev]=stb/stb_image_write.h
@@ -69,7 +70,8 @@ declare -A probe_of=(
 # The same by what they are for; scripts that source this file install them.
 # shellcheck disable=SC2034
 build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-dev libgtest-dev libgmock-dev libeigen3-dev
-  libassimp-dev libmeshoptimizer-dev zlib1g-dev libembree-dev libstb-dev ocl-icd-opencl-dev pocl-opencl-icd)
+  libassimp-dev libmeshoptimizer-dev libpugixml-dev zlib1g-dev libembree-dev libstb-dev ocl-icd-opencl-dev
+  pocl-opencl-icd)
 python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
   python3-pil libopenblas0-pthread)
 # what a wheel of the trainer is made with, and installed in a place of its own

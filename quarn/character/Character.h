@@ -45,6 +45,16 @@ struct MorphTarget {
     std::vector<HVector> deltas;         ///< [vertices.size()], in the mesh's space; finite
 };
 
+/// What the vertices of a mesh are in its file.
+enum class FileOrder : std::uint8_t {
+    vertices,      ///< those that the file has: glTF splits them along seams
+    controlPoints, ///< those of the modelling tool, in its order
+    corners        ///< one for each corner of a polygon, in the importer's order: the control points are not known
+};
+
+/// "vertices", "control points" or "corners".
+const char* nameOf(FileOrder order);
+
 /// All that hangs on one node of the file: the parts that a format splits by material are one mesh.
 struct CharacterMesh {
     std::string name;                        ///< not empty, unique among the meshes
@@ -59,6 +69,7 @@ struct CharacterMesh {
         morphTargets; ///< in the file's order; `points` are without them, whatever they weigh at rest
     /// For every vertex of the file, part by part, its index in `points`; see joinVertices().
     std::vector<std::uint32_t> joinedOf;
+    FileOrder fileOrder = FileOrder::vertices; ///< what these vertices of the file are
     /// From the mesh's space to the world's, at rest. It places a mesh without skin; a skin does without it.
     HMatrix worldTransform;
     int parentJoint = -1; ///< the nearest joint at or above the mesh's node, or -1. A mesh without skin follows it

@@ -2,6 +2,7 @@
 #include "quarn/character/readCharacter.h"
 
 #include "quarn/character/animations.h"
+#include "quarn/character/controlPoints.h"
 #include "quarn/character/importedFile.h"
 #include "quarn/character/importerLog.h"
 #include "quarn/character/prepareGltf.h"
@@ -89,12 +90,13 @@ double metersPerUnit(const aiScene& scene, const std::string& ending) {
     return centimeters * 0.01;
 }
 
-Character convert(const aiScene& scene, const SourceHints& hints, const std::string& ending) {
+Character convert(const aiScene& scene, const SourceHints& hints, const std::string& ending, const std::string& bytes) {
     Character character;
     character.warnings = hints.warnings;
     character.metersPerUnit = metersPerUnit(scene, ending);
     const Skeleton skeleton = readSkeleton(scene, hints, character);
-    const MeshIndices meshes = readMeshes(scene, skeleton, hints, character);
+    ControlPoints control = isGltf(ending) ? ControlPoints() : ControlPoints(bytes, ending);
+    const MeshIndices meshes = readMeshes(scene, skeleton, hints, control, character);
     if (character.meshes.empty())
         throw std::runtime_error("the file has no mesh");
     readAnimations(scene, skeleton, meshes, hints, character);
@@ -123,7 +125,7 @@ Character importFile(const std::string& path, const std::string& ending, std::st
         throw std::runtime_error(importer.GetErrorString());
     if (scene->mRootNode == nullptr)
         throw std::runtime_error("the file has no scene");
-    return convert(*scene, hints, ending);
+    return convert(*scene, hints, ending, bytes);
 }
 
 // the importer does not check all that it is given: it works at a safe distance, and only its result comes here
@@ -159,12 +161,17 @@ Character readCharacter(const std::string& path) {
     }
 }
 
+const char* nameOf(FileOrder order) {
+    constexpr const char* names[] = {"vertices", "control points", "corners"};
+    return names[static_cast<std::size_t>(order)];
+}
+
 std::string describeCharacter(const Character& character) {
     std::ostringstream text;
     for (const CharacterMesh& mesh : character.meshes)
-        text << "mesh " << mesh.name << ": " << mesh.joinedOf.size() << " vertices in the file, joined to "
-             << mesh.points.size() << "; " << mesh.polygonSizes.size() << " polygons, " << mesh.bindings.size()
-             << " joints"
+        text << "mesh " << mesh.name << ": " << mesh.joinedOf.size() << ' ' << nameOf(mesh.fileOrder)
+             << " in the file, joined to " << mesh.points.size() << "; " << mesh.polygonSizes.size() << " polygons, "
+             << mesh.bindings.size() << " joints"
              << (mesh.morphTargets.empty() ? "" : ", " + std::to_string(mesh.morphTargets.size()) + " morph targets")
              << '\n';
     text << "joints: " << character.joints.size() << '\n';

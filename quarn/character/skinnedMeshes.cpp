@@ -126,10 +126,12 @@ void warnOfSkin(const CharacterMesh& mesh, std::vector<std::string>& warnings) {
 
 class MeshReader {
 public:
-    MeshReader(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, Character& character)
+    MeshReader(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, ControlPoints& control,
+               Character& character)
         : scene_(scene)
         , skeleton_(skeleton)
         , hints_(hints)
+        , control_(control)
         , character_(character) {}
 
     void read(const ShownNode& shown) {
@@ -139,9 +141,11 @@ public:
         mesh.parentJoint = shown.parentJoint;
         std::size_t skipped = 0;
         std::vector<std::uint32_t> partSizes;
+        std::vector<ImportedPart> parts;
         for (unsigned i = 0; i < shown.node->mNumMeshes; ++i) {
             const std::size_t before = mesh.points.size();
             skipped += append(shown.node->mMeshes[i], mesh);
+            parts.push_back({scene_.mMeshes[shown.node->mMeshes[i]], static_cast<std::uint32_t>(before)});
             partSizes.push_back(static_cast<std::uint32_t>(mesh.points.size() - before));
         }
         const std::string node = shown.node->mName.C_Str();
@@ -150,7 +154,7 @@ public:
             tidy(influences);
         std::sort(mesh.bindings.begin(), mesh.bindings.end(),
                   [](const Binding& a, const Binding& b) { return a.joint < b.joint; });
-        if (finish(std::move(mesh), skipped))
+        if (finish(std::move(mesh), parts, skipped))
             meshOf_.emplace(node, static_cast<std::uint32_t>(character_.meshes.size() - 1));
     }
     MeshIndices take() { return std::move(meshOf_); }
@@ -170,7 +174,7 @@ private:
     }
 
     // false when nothing is left of the mesh
-    bool finish(CharacterMesh mesh, std::size_t skipped) {
+    bool finish(CharacterMesh mesh, const std::vector<ImportedPart>& parts, std::size_t skipped) {
         const std::string name = "the mesh \"" + mesh.name + "\" ";
         const std::size_t collapsed = joinVertices(mesh);
         if (skipped > 0)
@@ -184,13 +188,26 @@ private:
             return false;
         }
         warnOfSkin(mesh, character_.warnings);
+        if (control_.areCounted())
+            countControlPoints(parts, mesh);
         character_.meshes.push_back(std::move(mesh));
         return true;
+    }
+
+    void countControlPoints(const std::vector<ImportedPart>& parts, CharacterMesh& mesh) {
+        ControlPointMap map = control_.mapOf(parts, mesh.joinedOf);
+        mesh.fileOrder = map.problem.empty() ? FileOrder::controlPoints : FileOrder::corners;
+        if (map.problem.empty())
+            mesh.joinedOf = std::move(map.vertexOf);
+        else
+            character_.warnings.push_back("the mesh \"" + mesh.name + "\" " + map.problem +
+                                          ": its file order is that of the importer's corners");
     }
 
     const aiScene& scene_;
     const Skeleton& skeleton_;
     const SourceHints& hints_;
+    ControlPoints& control_;
     Character& character_;
     UniqueNames names_;
     MeshIndices meshOf_;
@@ -211,8 +228,9 @@ void warnOfSkins(Character& character) {
 
 } // namespace
 
-MeshIndices readMeshes(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, Character& character) {
-    MeshReader reader(scene, skeleton, hints, character);
+MeshIndices readMeshes(const aiScene& scene, const Skeleton& skeleton, const SourceHints& hints, ControlPoints& control,
+                       Character& character) {
+    MeshReader reader(scene, skeleton, hints, control, character);
     for (const ShownNode& shown : skeleton.shown)
         reader.read(shown);
     warnOfSkins(character);

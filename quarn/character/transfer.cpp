@@ -45,6 +45,7 @@ void transfer(Archive& archive, Item& mesh) {
     archive(mesh.bindings);
     archive(mesh.morphTargets);
     archive(mesh.joinedOf);
+    archive(mesh.fileOrder);
     archive(mesh.worldTransform);
     archive(mesh.parentJoint);
 }
@@ -106,6 +107,7 @@ void checkMesh(const CharacterMesh& mesh, std::size_t joints) {
     require(corners == mesh.corners.size());
     require(allBelow(mesh.corners, mesh.points.size()) && allBelow(mesh.joinedOf, mesh.points.size()));
     require(mesh.influences.size() == mesh.points.size());
+    require(mesh.fileOrder <= FileOrder::corners);
     std::vector<bool> isBound(joints, false);
     for (const Binding& binding : mesh.bindings) {
         require(binding.joint < joints);

@@ -215,8 +215,8 @@ private:
         const std::string node = nodeName(made.mesh);
         const fs::path map = mapFile(options_.output, node, character_.meshes.size());
         report_.meshes.push_back({mesh.name, node, made.skin.isNull() ? "" : nodeName(made.skin), mesh.joinedOf.size(),
-                                  mesh.points.size(), mesh.polygonSizes.size(), mesh.bindings.size(),
-                                  mesh.morphTargets.size(), map.filename().string()});
+                                  nameOf(mesh.fileOrder), mesh.points.size(), mesh.polygonSizes.size(),
+                                  mesh.bindings.size(), mesh.morphTargets.size(), map.filename().string()});
         if (made.skin.isNull() && options_.neuralWarp)
             report_.notes.push_back("the mesh \"" + mesh.name +
                                     "\" follows no joint and is no geometry of the deformer");
@@ -247,15 +247,18 @@ private:
             set("clips", clipsText(clips_.ranges));
         // maps before the scene, which knows them by their digests: a scene never goes with the maps of another
         // (decision 0132)
-        std::string digests;
+        std::string digests, orders;
         for (std::size_t i = 0; i < report_.meshes.size(); ++i) {
             const std::vector<std::uint32_t>& sceneVertexOf = character_.meshes[i].joinedOf;
             const std::vector<std::int32_t> map(sceneVertexOf.begin(), sceneVertexOf.end());
             log([&] { return "writing " + (folder / report_.meshes[i].vertexMap).string(); });
             storage::writeIntegers(folder / report_.meshes[i].vertexMap, map);
             digests += (i > 0 ? " " : "") + vertexMapDigest(map);
+            orders += (i > 0 ? ", " : "") + report_.meshes[i].node + ": " + std::to_string(map.size()) + ' ' +
+                      report_.meshes[i].fileOrder;
         }
         set("vertexMapDigests", digests);
+        set("fileOrder", orders);
         session.save(options_.output);
     }
 

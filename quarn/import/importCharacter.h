@@ -38,6 +38,7 @@ struct ImportReport {
         std::string node;
         std::string skin; ///< empty for a mesh that nothing moves
         std::size_t fileVertices = 0;
+        std::string fileOrder;    ///< what these are: nameOf(FileOrder)
         std::size_t vertices = 0; ///< after joining
         std::size_t polygons = 0;
         std::size_t joints = 0;

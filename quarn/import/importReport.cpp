@@ -27,6 +27,7 @@ void writeMesh(JsonWriter& writer, const ImportReport::Mesh& mesh) {
     writeText(writer, "node", mesh.node);
     writeText(writer, "skin", mesh.skin);
     writeCount(writer, "fileVertices", mesh.fileVertices);
+    writeText(writer, "fileOrder", mesh.fileOrder);
     writeCount(writer, "vertices", mesh.vertices);
     writeCount(writer, "polygons", mesh.polygons);
     writeCount(writer, "joints", mesh.joints);
@@ -65,7 +66,7 @@ std::string reportText(const ImportReport& report) {
     std::ostringstream text;
     text.imbue(std::locale::classic());
     for (const ImportReport::Mesh& mesh : report.meshes)
-        text << "mesh " << mesh.node << ": " << mesh.fileVertices << " vertices in the file, joined to "
+        text << "mesh " << mesh.node << ": " << mesh.fileVertices << ' ' << mesh.fileOrder << " in the file, joined to "
              << mesh.vertices << "; " << mesh.polygons << " polygons, " << mesh.joints << " joints" << morphText(mesh)
              << '\n';
     text << "joints: " << report.joints.size() << '\n';

@@ -132,8 +132,10 @@ GeometryFacts factsOf(const Warp& warp, const WarpGeometry& geometry) {
 
 SceneReport describeScene() {
     SceneReport report;
-    if (const std::vector<HObject> characters = nodesOfType("character"); !characters.empty())
+    if (const std::vector<HObject> characters = nodesOfType("character"); !characters.empty()) {
         report.character = nodeName(characters.front());
+        report.fileOrder = textOf(plugOf(characters.front(), "fileOrder"));
+    }
     report.metersPerUnit = metersPerUnit();
     for (const HObject& node : nodesOfType("neuralWarp"))
         report.deformers.push_back(describe(Warp::find(nodeName(node))));
@@ -143,6 +145,7 @@ SceneReport describeScene() {
 
 void writeScene(JsonWriter& json, const SceneReport& scene) {
     writeText(json, "character", scene.character);
+    writeText(json, "fileOrder", scene.fileOrder);
     json.Key("metersPerUnit");
     json.Double(scene.metersPerUnit);
     json.Key("deformers");
@@ -171,6 +174,10 @@ std::string sceneText(const SceneReport& scene) {
     std::string text;
     if (!scene.character.empty())
         text += "character " + scene.character + ", " + numberText(scene.metersPerUnit, false) + " metres a unit\n";
+    LineList orders("file orders");
+    if (!scene.fileOrder.empty())
+        orders.add("order of its file: " + scene.fileOrder);
+    text += orders.text();
     LineList deformers("deformers and geometries");
     for (const DeformerReport& deformer : scene.deformers) {
         deformers.add("deformer " + deformer.name + ", frames " + std::to_string(deformer.firstFrame) + " to " +

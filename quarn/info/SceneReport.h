@@ -30,6 +30,7 @@ struct DeformerReport {
 
 struct SceneReport {
     std::string character; ///< the name of its node; empty without one
+    std::string fileOrder; ///< of this: what the vertices of its file are, mesh by mesh; may be empty
     double metersPerUnit = 1.0;
     std::vector<DeformerReport> deformers;
     std::vector<std::string> missingFiles; ///< "NODE: PATH"

@@ -22,6 +22,7 @@ HObject characterNode::framesPerSecond;
 HObject characterNode::sourceFile;
 HObject characterNode::vertexMapFile;
 HObject characterNode::vertexMapDigests;
+HObject characterNode::fileOrder;
 HObject characterNode::clips;
 
 characterNode::characterNode() = default;
@@ -38,8 +39,9 @@ HStatus characterNode::initialize() {
     sourceFile = make.data("sourceFile", "sf", HFnData::kString, {.filename = true});
     vertexMapFile = make.data("vertexMapFile", "vmf", HFnData::kString, {.filename = true});
     vertexMapDigests = make.data("vertexMapDigests", "vmd", HFnData::kString);
+    fileOrder = make.data("fileOrder", "fo", HFnData::kString);
     clips = make.data("clips", "clp", HFnData::kString);
-    make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile, vertexMapDigests, clips});
+    make.add({metersPerUnit, framesPerSecond, sourceFile, vertexMapFile, vertexMapDigests, fileOrder, clips});
     return make.status();
 }
 

@@ -32,6 +32,7 @@ public:
     static HObject sourceFile;
     static HObject vertexMapFile;
     static HObject vertexMapDigests;
+    static HObject fileOrder;
     static HObject clips;
 };
 

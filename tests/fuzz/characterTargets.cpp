@@ -1,11 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "characterTargets.h"
 
+#include "quarn/character/colladaMeshes.h"
+#include "quarn/character/fbxMeshes.h"
 #include "quarn/character/prepareGltf.h"
 #include "quarn/character/transfer.h"
 #include "require.h"
 
 #include <algorithm>
+#include <numeric>
 #include <stdexcept>
 #include <string>
 
@@ -53,6 +56,16 @@ void requireInRange(const Character& character) {
     }
 }
 
+bool haveSoundPolygons(const std::vector<ControlMesh>& meshes) {
+    for (const ControlMesh& mesh : meshes) {
+        for (const std::uint32_t corner : mesh.corners)
+            require(3 * std::size_t{corner} + 2 < mesh.points.size());
+        require(std::accumulate(mesh.polygonSizes.begin(), mesh.polygonSizes.end(), std::size_t{0}) ==
+                mesh.corners.size());
+    }
+    return !meshes.empty();
+}
+
 std::string noOtherFile(const std::string& uri) {
     throw std::runtime_error("no file " + uri);
 }
@@ -74,6 +87,19 @@ bool fuzzGltf(const std::uint8_t* data, std::size_t size) {
     for (const auto& [imported, name] : again.nodeNames)
         require(name == imported && hints.nodeNames.count(imported) == 1);
     return true;
+}
+
+bool fuzzControlMeshes(const std::uint8_t* data, std::size_t size) {
+    const std::string bytes(reinterpret_cast<const char*>(data), size); // of exact size, for the sanitizer
+    bool hasSome = false;
+    for (const auto& read : {readFbxMeshes, readColladaMeshes}) {
+        try {
+            hasSome = haveSoundPolygons(read(bytes)) || hasSome;
+        } catch (const std::runtime_error&) {
+            continue; // not of this format, or damaged
+        }
+    }
+    return hasSome;
 }
 
 bool fuzzCharacterAnswer(const std::uint8_t* data, std::size_t size) {

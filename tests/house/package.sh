@@ -79,7 +79,7 @@ pack DEB
 deb=("$work"/packages/*.deb)
 dpkg-deb --extract "${deb[0]}" "$work/root"
 needs=$(dpkg-deb --field "${deb[0]}" Depends)
-for package in libtbb12 libassimp5 libmeshoptimizer2d ocl-icd-libopencl1 python3-torch python3-onnx; do
+for package in libtbb12 libassimp5 libmeshoptimizer2d libpugixml1v5 ocl-icd-libopencl1 python3-torch python3-onnx; do
   [[ $needs == *"$package"* ]] || fail "the Debian package does not need $package: $needs"
 done
 [[ $(dpkg-deb --field "${deb[0]}" Version) == "$(<VERSION)"* ]] || fail "the Debian package has another version"

@@ -10,6 +10,7 @@
 TEST(QuarnSeeds, AreAcceptedOrRefusedAsTheirNamesSay) {
     EXPECT_GE(runSeedCorpus("fuzz_gltf", fuzzGltf), 3);
     EXPECT_GE(runSeedCorpus("fuzz_character_answer", fuzzCharacterAnswer), 1);
+    EXPECT_GE(runSeedCorpus("fuzz_control_meshes", fuzzControlMeshes), 3);
     EXPECT_GE(runSeedCorpus("fuzz_npy_table", fuzzNpyTable), 3);
     EXPECT_GE(runSeedCorpus("fuzz_side_json", fuzzSideJson), 4);
     EXPECT_GE(runSeedCorpus("fuzz_words", fuzzWords), 2);
