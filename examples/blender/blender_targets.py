@@ -6,7 +6,8 @@ quarn run hand.glb -o hand --target-command blender -b --factory-startup --pytho
 
 The character that quarn has posed is opened, and a Corrective Smooth modifier works behind its armature. With --blend,
 a file of the user's is opened instead; its armature follows the posed one, bone by bone of the same name, without what
-else moves these; and the mesh (the object of the mesh's name, or NAME) is evaluated with all modifiers that it has there.
+else moves these; and the mesh (the object of the mesh's name, or NAME) is evaluated with all modifiers that it has
+there.
 
 First, Blender's skin alone is compared with quarn's: vertices that are in another order are matched, and a character
 that is not the same is refused. Tried with Blender 3.4.

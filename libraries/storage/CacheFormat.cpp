@@ -11,8 +11,11 @@ std::optional<CacheFormat> cacheFormatOf(const std::filesystem::path& path) {
     for (char& letter : ending)
         if (letter >= 'A' && letter <= 'Z') // whatever the user's locale
             letter = static_cast<char>(letter - 'A' + 'a');
-    constexpr std::pair<const char*, CacheFormat> rows[] = {
-        {".npy", CacheFormat::npy}, {".npz", CacheFormat::npz}, {".pc2", CacheFormat::pc2}, {".mdd", CacheFormat::mdd}};
+    constexpr std::pair<const char*, CacheFormat> rows[] = {{".npy", CacheFormat::npy},
+                                                            {".npz", CacheFormat::npz},
+                                                            {".pc2", CacheFormat::pc2},
+                                                            {".mdd", CacheFormat::mdd},
+                                                            {".obj", CacheFormat::obj}};
     for (const auto& [known, format] : rows)
         if (ending == known)
             return format;

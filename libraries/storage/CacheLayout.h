@@ -10,6 +10,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <filesystem>
 #include <optional>
 
 namespace storage {
@@ -22,9 +23,9 @@ struct CacheLayout {
     bool isBigEndian = false;
     FileBytes points;                ///< exactly the numbers
     FileBytes times;                 ///< seconds, a single number a frame, big-endian; empty where there are none
-    std::optional<float> firstFrame; ///< of the first sample, as PC2 says it
+    std::optional<float> firstFrame; ///< of the first sample, as PC2 or the names say it
     std::optional<float> frameStep;  ///< frames from one sample to the next; the same
-    Descriptor unpacked;             ///< what `points` lie in where the file itself is compressed
+    Descriptor unpacked;             ///< what `points` lie in where the file itself is compressed or in text
 };
 
 CacheLayout npyLayout(const FileBytes& file);
@@ -33,6 +34,11 @@ CacheLayout npyLayout(const FileBytes& file);
 CacheLayout npzLayout(const FileBytes& file);
 CacheLayout pc2Layout(const FileBytes& file);
 CacheLayout mddLayout(const FileBytes& file);
+/// Of the vertices of meshes in OBJ files, one a frame (a path with "#", framePattern.h), or of a single one: the lines
+/// "v x y z" and nothing else, as singles in a file as for a compressed archive. `firstFrame` and `frameStep` are those
+/// of the names; a single file has none. Throws too when there is no such file, one is missing between two others, one
+/// has another number of vertices than the first, and when all together are larger than unpackedLimit.
+CacheLayout objLayout(const std::filesystem::path& path);
 
 /// The rest of `file` from byte `from` on, which may lie beyond its end. Throws unless it is exactly what the numbers
 /// of the layout take; the reason has the shape.

@@ -25,6 +25,7 @@ CacheLayout layoutOf(CacheFormat format, const FileBytes& file) {
     case CacheFormat::mdd:
         return mddLayout(file);
     case CacheFormat::npy:
+    case CacheFormat::obj: // is no file with a layout
         break;
     }
     return npyLayout(file);
@@ -36,10 +37,15 @@ CacheLayout layoutOf(CacheFormat format, const FileBytes& file) {
 PointCache::PointCache(const std::string& path, CacheFormat format)
     : path_(path)
     , format_(format)
-    , file_(::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
-    if (!file_.isOpen())
+    , file_(format == CacheFormat::obj ? -1 : ::open(path.c_str(), O_RDONLY | O_NONBLOCK | O_CLOEXEC)) {
+    if (!file_.isOpen() && format != CacheFormat::obj)
         fail(textOfErrno(errno));
     try {
+        if (format == CacheFormat::obj) {
+            identity_ = identityOf(path).value_or(FileIdentity()); // before it is read: what comes later is a change
+            layout_ = objLayout(path);
+            return;
+        }
         identity_ = identityOf(file_.number());
         layout_ = layoutOf(format, {file_.number(), 0, identity_.size});
     } catch (const std::runtime_error& error) {

@@ -28,6 +28,7 @@ public:
 
     const std::string& path() const { return path_; }
     CacheFormat format() const { return format_; }
+    /// Of the file as it was opened; that of no file for a sequence of files.
     const FileIdentity& identity() const { return identity_; }
     std::size_t frameCount() const { return layout_.frames; }    ///< may be 0
     std::size_t vertexCount() const { return layout_.vertices; } ///< of each frame; may be 0
@@ -35,8 +36,8 @@ public:
     /// When a frame is, in seconds; none where the format has no times: only MDD has. Throws as read() does, and when
     /// the time is no finite number.
     std::optional<double> secondsOf(std::size_t frame) const;
-    /// The number of the first frame, and the frames from one to the next, as the head says them; both finite. None
-    /// where the format has none: only PC2 has.
+    /// The number of the first frame, and the frames from one to the next, as the head or the names of the files say
+    /// them; both finite. None where the format has none: only PC2 and a sequence of OBJ files have.
     std::optional<double> firstFrame() const { return layout_.firstFrame; }
     std::optional<double> frameStep() const { return layout_.frameStep; }
 

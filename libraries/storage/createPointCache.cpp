@@ -101,9 +101,10 @@ void requireAtMost(std::uint64_t most, const std::string& path, std::uint64_t co
 std::unique_ptr<PointCacheWriter> createPointCache(const std::string& path, std::size_t vertexCount,
                                                    const CacheTiming& timing) {
     const std::optional<CacheFormat> format = cacheFormatOf(path);
-    if (!format)
-        throw std::runtime_error("point cache '" + path + "' cannot be written: the name of a point cache ends in " +
-                                 cacheEndings);
+    if (!format || *format == CacheFormat::obj)
+        throw std::runtime_error("point cache '" + path +
+                                 "' cannot be written: the name of a point cache in one file ends in .npy, .npz, .pc2 "
+                                 "or .mdd");
     if (*format == CacheFormat::npy)
         return std::make_unique<NpyWriter>(path, vertexCount);
     if (*format == CacheFormat::npz)

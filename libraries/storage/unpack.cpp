@@ -21,14 +21,6 @@ namespace {
 
 constexpr const char* damaged = "it is damaged: its array cannot be unpacked";
 
-Descriptor temporaryFile() {
-    std::string name = (std::filesystem::temp_directory_path() / "pointCacheXXXXXX").string();
-    Descriptor file(::mkostemp(name.data(), O_CLOEXEC));
-    if (!file.isOpen() || ::unlink(name.c_str()) != 0)
-        throw std::runtime_error("its array cannot be unpacked to " + name + ": " + textOfErrno(errno));
-    return file;
-}
-
 /// The bytes of a member, piece by piece.
 class Unpacking {
 public:
@@ -83,11 +75,19 @@ void put(const Descriptor& file, std::span<const std::byte> bytes) {
 
 } // namespace
 
+Descriptor unnamedFile() {
+    std::string name = (std::filesystem::temp_directory_path() / "pointCacheXXXXXX").string();
+    Descriptor file(::mkostemp(name.data(), O_CLOEXEC));
+    if (!file.isOpen() || ::unlink(name.c_str()) != 0)
+        throw std::runtime_error("it cannot be unpacked to " + name + ": " + textOfErrno(errno));
+    return file;
+}
+
 Descriptor unpack(const ZipMember& member) {
     if (member.size > unpackedLimit)
         throw std::runtime_error("its array takes " + std::to_string(member.size) + " bytes unpacked: at most " +
                                  std::to_string(unpackedLimit) + " are; numpy.savez and numpy.save pack nothing");
-    Descriptor file = temporaryFile();
+    Descriptor file = unnamedFile();
     Unpacking unpacking(member.bytes);
     std::uint64_t written = 0;
     uLong sum = crc32(0, nullptr, 0);

@@ -14,7 +14,8 @@ namespace quarn {
 namespace {
 
 bool isCache(const std::filesystem::path& path) {
-    return storage::cacheFormatOf(path).has_value();
+    const auto format = storage::cacheFormatOf(path);
+    return format && *format != storage::CacheFormat::obj; // these are written one by one
 }
 
 // Alembic, and USD's binary forms, are asked for by users who have a way through other files

@@ -209,7 +209,9 @@ void addBakeCommand(CLI::App& app) {
     CLI::App* command = app.add_subcommand("bake", "Write a mesh plug, frame by frame, to a point cache");
     addSceneOptions(*command, options->scene);
     command->add_option("PLUG", options->plug, "The mesh, as skin.outputGeom[0]")->required();
-    command->add_option("-o,--output", options->output, "The point cache to write: .npy, .npz, .pc2 or .mdd")
+    command
+        ->add_option("-o,--output", options->output,
+                     "The point cache to write: .npy, .npz, .pc2, .mdd or FILE.####.obj")
         ->type_name("FILE")
         ->required();
     addModelOptions(*command, options->model);

@@ -31,9 +31,10 @@ public:
     const storage::PointCache& cache() const { return *cache_; }
     std::size_t frameCount() const { return cache_->frameCount(); }
     std::size_t vertexCount() const; ///< of a frame that is read
-    /// Whether what is read is what the file has.
+    /// Whether what is read is what the file has, and a scene can play that: it plays no texts.
     bool areTheFiles() const {
-        return sceneVertexOf_.empty() && space_.isTheScenes() && change_.isInPlace() && change_.order.empty();
+        return cache_->format() != storage::CacheFormat::obj && sceneVertexOf_.empty() && space_.isTheScenes() &&
+               change_.isInPlace() && change_.order.empty();
     }
     const CacheSpace& space() const { return space_; }
 

@@ -155,7 +155,9 @@ void addTargetCommand(CLI::App& app) {
     const auto options = std::make_shared<Options>();
     CLI::App* command = app.add_subcommand("target", "Make a point cache the target of a deformer");
     addSceneOptions(*command, options->scene);
-    command->add_option("--cache", options->file.cache, "The points, frame by frame: .npy, .npz, .pc2 or .mdd")
+    command
+        ->add_option("--cache", options->file.cache,
+                     "The points, frame by frame: .npy, .npz, .pc2, .mdd or FILE.####.obj")
         ->required();
     command->add_option("-o,--output", options->output, "The scene to write; SCENE itself when not given");
     command->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");

@@ -5,6 +5,7 @@
 #include "openquarn/HFnMesh.h"
 #include "openquarn_helpers/AttributeMaker.h"
 #include "storage/PointCache.h"
+#include "storage/framePattern.h"
 
 #include <algorithm>
 #include <cmath>
@@ -162,6 +163,10 @@ void pointCacheNode::openFile(const HString& rawPath) {
     if (file_ && file_->path() == path && storage::identityOf(path) == file_->identity())
         return;
     file_.reset();
+    // would be read as a whole in every frame
+    if (storage::isFramePattern(path) && storage::cacheFormatOf(path) == storage::CacheFormat::obj &&
+        !storage::identityOf(path))
+        throw std::runtime_error("'" + path + "' is a sequence of files: quarn target --cache makes one cache of it");
     file_ = storage::openPointCache(path);
 }
 

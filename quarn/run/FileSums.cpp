@@ -4,6 +4,7 @@
 #include "storage/Descriptor.h"
 #include "storage/FileError.h"
 #include "storage/Fnv64.h"
+#include "storage/framePattern.h"
 
 #include <cerrno>
 #include <set>
@@ -43,15 +44,24 @@ std::string sumOf(const fs::path& file) {
 std::string FileSums::of(const fs::path& path) {
     const fs::path whole = folder_ / path;
     std::error_code error;
-    if (!fs::is_directory(whole, error))
-        return ofFile(path);
     std::set<fs::path> files; // in order
-    for (const fs::directory_entry& entry : fs::recursive_directory_iterator(whole))
-        if (!entry.is_directory())
-            files.insert(entry.path().lexically_relative(whole));
+    fs::path folder = path;
+    if (fs::is_directory(whole, error)) {
+        for (const fs::directory_entry& entry : fs::recursive_directory_iterator(whole))
+            if (!entry.is_directory())
+                files.insert(entry.path().lexically_relative(whole));
+    } else if (storage::isFramePattern(path) && !fs::exists(whole, error)) {
+        folder = path.parent_path();
+        for (const int frame : storage::framesOf(whole))
+            files.insert(storage::frameFile(path.filename(), frame));
+        if (files.empty())
+            return {};
+    } else {
+        return ofFile(path);
+    }
     std::string text;
     for (const fs::path& file : files)
-        text += file.string() + '\0' + ofFile(path / file) + '\0';
+        text += file.string() + '\0' + ofFile(folder / file) + '\0';
     storage::Fnv64 sum;
     sum.add(std::as_bytes(std::span(text)));
     return sum.text();

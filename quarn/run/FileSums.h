@@ -23,7 +23,7 @@ public:
     explicit FileSums(std::filesystem::path folder)
         : folder_(std::move(folder)) {}
 
-    /// Of a file, or of the names and files of a folder. Empty when there is nothing
+    /// Of a file, or of the names and files of a folder or of a pattern ("#"). Empty when there is nothing
     /// at the path. Throws storage::FileError for what cannot be read.
     std::string of(const std::filesystem::path& path);
 

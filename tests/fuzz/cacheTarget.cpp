@@ -19,6 +19,8 @@ std::optional<storage::CacheFormat> formatOf(std::uint8_t letter) {
         return storage::CacheFormat::mdd;
     case 'z':
         return storage::CacheFormat::npz;
+    case 'o':
+        return storage::CacheFormat::obj;
     default:
         return std::nullopt;
     }

@@ -11,6 +11,7 @@
 
 #include <bit>
 #include <cmath>
+#include <limits>
 #include <random>
 
 namespace {
@@ -73,6 +74,44 @@ TEST_F(PointCaches, OfOtherProgramsAreRead) {
         EXPECT_EQ(cache->frameStep(), isPc2 ? std::optional(0.5) : std::nullopt);
         EXPECT_EQ(cache->secondsOf(1), isMdd ? std::optional<double>(1.0F / 24.0F) : std::nullopt);
     }
+}
+
+// as modellers write them: with normals, colours, a fourth coordinate, returns and marks
+TEST_F(PointCaches, InTextAreReadByVertex) {
+    put("a_#.08.obj", "# made\r\nmtllib v.mtl\r\nv 1 2.5 -3\r\nvn 9 9 9\r\n\tv\t+0.1 5e0 6 1.0\r\nf 1 2 1");
+    put("a_#.10.obj", "v 4 5 0.1 0.5 0.5 0.5\nvt 0 0\nv 7 8 -9");
+    put("a_#.12.obj", "v -0 1e-45 3.4028235e38\nv 0 0 1e-60\n");
+    put("a_#.9.obj", "not of two digits");
+    put("a_1.08.obj", "of another name");
+    const auto cache = openPointCache(path("a_#.##.obj"));
+    EXPECT_EQ(cache->vertexCount(), 2U);
+    ASSERT_EQ(cache->frameCount(), 3U);
+    EXPECT_EQ(cache->firstFrame(), 8.0);
+    EXPECT_EQ(cache->frameStep(), 2.0);
+    EXPECT_THAT(frameOf(*cache, 0), ElementsAre(1, 2.5, -3, 0.1F, 5, 6));
+    EXPECT_THAT(frameOf(*cache, 1), ElementsAre(4, 5, 0.1F, 7, 8, -9));
+    EXPECT_THAT(frameOf(*cache, 2),
+                ElementsAre(0, std::numeric_limits<float>::denorm_min(), std::numeric_limits<float>::max(), 0, 0, 0));
+    EXPECT_TRUE(std::signbit(frameOf(*cache, 2)[0]));
+    EXPECT_EQ(openPointCache(path("a_#.10.obj"))->frameCount(), 1U) << "a file that has such a name";
+
+    put("b.1.obj", "v 1 2 3");
+    put("b.2.obj", "v 1 2 3");
+    put("b.5.obj", "v 1 2 3");
+    put("b.9.obj", "v 1 2 3");
+    put("c.-1.obj", "v 1 2 3");
+    put("c.0.obj", "v 1 2 3\nv 4 5 6");
+    put("d.1.obj", "v 1 2 3");
+    put("d.2.obj", "v 1 2 3\nv 1 2,5 3");
+    const std::pair<const char*, const char*> rows[] = {
+        {"none.###.obj", "no file of such a name with a number in place of #, as none.001.obj"},
+        {"b.#.obj", "of its frames 1-9 there are no files of 3-4, 6-8"},
+        {"c.#.obj", "c.0.obj has 2 vertices, and the first file has 1"},
+        {"d.#.obj", "d.2.obj: its line 2 is no vertex: \"v 1 2,5 3\""},
+        {"none.obj", "none.obj"}};
+    for (const auto& [name, why] : rows)
+        EXPECT_THAT(failureOf([&] { openPointCache(path(name)); }),
+                    AllOf(HasSubstr("point cache '" + path(name) + "' cannot be read: "), HasSubstr(why)));
 }
 
 // nobody here looks at the sum of a stored array, and NumPy does
@@ -139,10 +178,15 @@ TEST_F(PointCaches, ThatAreNotWhatTheySayAreRefused) {
         {with(deflated, deflatedEntry + 24, "\1"), ".npz", "cannot be unpacked"},
         {with(deflated, deflatedEntry + 16, zeros), ".npz", "cannot be unpacked"},
         {foreign("refused_npz_damaged"), ".npz", "cannot be unpacked"},
+        {"v 1 2", ".obj", "line 1 is no vertex"},
+        {"v 1 2 x", ".obj", "line 1 is no vertex"},
+        {"v 1 2 3x", ".obj", "line 1 is no vertex"},
+        {"v 1 1e999 3", ".obj", "line 1 is no vertex"},
+        {"vn 1 2 3\nf 1 1 1", ".obj", "it has no vertices"},
     };
     for (const auto& row : rows)
         EXPECT_THAT(refusal(row.bytes, row.ending), HasSubstr(row.why));
-    EXPECT_THAT(refusal("", ".abc"), HasSubstr(".npy, .npz, .pc2 or .mdd"));
+    EXPECT_THAT(refusal("", ".abc"), HasSubstr(".npy, .npz, .pc2, .mdd or .obj"));
     put("cache.mdd", with(mdd, 12, std::string("\x7f\xc0\0\0", 4)));
     const auto cache = openPointCache(path("cache.mdd"));
     EXPECT_THAT(failureOf([&] { static_cast<void>(cache->secondsOf(1)); }),
@@ -199,7 +243,7 @@ TEST_F(PointCaches, ThatCannotBeWrittenLeaveNothing) {
 }
 
 TEST(CacheSeeds, AreAcceptedOrRefusedAsTheirNamesSay) {
-    EXPECT_EQ(runSeedCorpus("fuzz_cache", fuzzCache), 4);
+    EXPECT_EQ(runSeedCorpus("fuzz_cache", fuzzCache), 5);
 }
 
 } // namespace

@@ -4,6 +4,7 @@
 #include "host/support/testDeformers.h"
 
 #include "openquarn_app/Commands.h"
+#include "quarn/play/commands.h"
 #include "quarn/pose/commands.h"
 #include "quarn/scene/SceneSession.h"
 #include "support/StdoutCapture.h"
@@ -76,6 +77,8 @@ std::string quarn(const std::vector<std::string>& arguments) {
     CLI::App app("quarn");
     ::quarn::addPoseCommand(app);
     ::quarn::addTargetCommand(app);
+    ::quarn::addPlayCommand(app);
+    ::quarn::addBakeCommand(app);
     std::vector<std::string> reversed(arguments.rbegin(), arguments.rend());
     reversed.insert(reversed.end() - 1, "--quiet");
     StdoutCapture capture;

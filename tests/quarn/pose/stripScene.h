@@ -25,7 +25,7 @@ inline constexpr Sampled sampled[] = {{"middle.rotateX", "limitsList[0].limits[0
 /// collectors "poses" and "controls". `further` host commands that run before it is saved.
 void write(const std::filesystem::path& scene, const std::string& further = {});
 
-/// Runs `quarn ARGUMENTS` in this process. Gives what it printed; throws what it failed with.
+/// Runs `quarn pose|target|play|bake ARGUMENTS` in this process. Gives what it printed; throws what it failed with.
 std::string quarn(const std::vector<std::string>& arguments);
 
 } // namespace stripScene

@@ -93,6 +93,16 @@ expect 1 '' 'command\.json would start a program .*: --allow-commands lets it' r
 expect 1 '' 'targets ended with status 0, and has not written the file' \
   run --recipe recipes/command.json -o other --allow-commands
 
+# --- targets in a file a frame: each of them counts ---
+expect 0 '' 'wrote 9 frames' bake moved/poses.mesh.json mesh_target.outMesh --frames 1-9 -o 'seq.##.obj'
+sequence=(run bone.gltf -o sequence "${options[@]}" --targets 'seq.##.obj' --until target)
+expect 0 '' 'target .*s\n(.|\n)*' "${sequence[@]}"
+expect 0 '' '^5 of 5 steps were done already\n$' "${sequence[@]}"
+sed -i '0,/^v /s/^v .*/v 0 0 0.25/' seq.05.obj
+expect 0 'target: to do, as its input .*seq\.##\.obj' '' "${sequence[@]}" --explain
+mv seq.05.obj away.obj
+expect 1 '' 'of its frames 1-9 there are no files of 5\n' "${sequence[@]}"
+
 # --- two meshes: a model each, for those that have targets ---
 sed -e 's/"nodes":\[0,2\]/"nodes":[0,2,3]/' -e 's/{"mesh":0,"skin":0}/&,{"name":"other","mesh":0,"skin":0}/' \
   bone.gltf >two.gltf
