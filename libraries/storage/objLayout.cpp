@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Source of the format: the specification of Wavefront's object files, version 3.0, "Vertex data".
+// Source of the format: the description of OBJ files, version 3.0, "Vertex data".
 #include "storage/CacheLayout.h"
 #include "storage/FileError.h"
 #include "storage/FileIdentity.h"
