@@ -2,7 +2,6 @@
 #include "quarn/render/Framing.h"
 
 #include <algorithm>
-#include <limits>
 #include <numbers>
 
 namespace quarn {
@@ -30,47 +29,43 @@ Framing::Framing(const View& view, int width, int height, const Margins& margins
     tangentY_ = tangent * height / shorter;
     tangents_ = {tangentX_ * (1.0 - 2.0 * margins.sides), tangentY_ * (1.0 - 2.0 * margins.top),
                  tangentY_ * (1.0 - 2.0 * margins.bottom)};
-    reach_.fill(-std::numeric_limits<double>::infinity());
-    nearest_ = -std::numeric_limits<double>::infinity();
-    farthest_ = std::numeric_limits<double>::infinity();
 }
 
-void Framing::include(std::span<const double> xyz) {
+void Framing::Reach::include(const Reach& other) {
+    for (std::size_t side = 0; side < sides.size(); ++side)
+        sides.at(side) = std::max(sides.at(side), other.sides.at(side));
+    nearest = std::max(nearest, other.nearest);
+    farthest = std::min(farthest, other.farthest);
+}
+
+Framing::Reach Framing::reachOf(const HVector& point) const {
     const auto [side, top, bottom] = tangents_;
-    for (std::size_t at = 0; at + 2 < xyz.size(); at += 3) {
-        const HVector point(xyz[at], xyz[at + 1], xyz[at + 2]);
-        const double x = point * view_.right;
-        const double y = point * view_.up;
-        const double z = point * view_.viewer;
-        reach_[0] = std::max(reach_[0], x + z * side);
-        reach_[1] = std::max(reach_[1], -x + z * side);
-        reach_[2] = std::max(reach_[2], y + z * top);
-        reach_[3] = std::max(reach_[3], -y + z * bottom);
-        nearest_ = std::max(nearest_, z);
-        farthest_ = std::min(farthest_, z);
-        empty_ = false;
-    }
+    const double x = point * view_.right;
+    const double y = point * view_.up;
+    const double z = point * view_.viewer;
+    return {{x + z * side, -x + z * side, y + z * top, -y + z * bottom}, z, z};
 }
 
-Camera Framing::camera() const {
+Camera Framing::camera(const Reach& reach) const {
     Camera camera;
     camera.view = view_;
     camera.tangentX = static_cast<float>(tangentX_);
     camera.tangentY = static_cast<float>(tangentY_);
-    if (empty_) {
+    if (reach.isEmpty()) {
         camera.position = view_.viewer;
         return camera;
     }
     // at (x, y, z) everything is seen where x + z side >= reach right, -x + z side >= reach left, and the same for y
     const auto [side, top, bottom] = tangents_;
-    const double middle = (nearest_ + farthest_) / 2.0;
-    double z = std::max((reach_[0] + reach_[1]) / (2.0 * side), (reach_[2] + reach_[3]) / (top + bottom));
+    const auto [right, left, up, down] = reach.sides;
+    const double middle = (reach.nearest + reach.farthest) / 2.0;
+    double z = std::max((right + left) / (2.0 * side), (up + down) / (top + bottom));
     // no point is nearer than a hundredth of the way; one point alone is seen from one unit away
-    z = std::max(z, nearest_ + (nearest_ - farthest_) / 100.0);
+    z = std::max(z, reach.nearest + (reach.nearest - reach.farthest) / 100.0);
     if (z - middle <= std::abs(middle) * 1e-12)
         z = middle + 1.0;
-    const double x = (reach_[0] - reach_[1]) / 2.0;
-    const double y = (reach_[2] - z * top + z * bottom - reach_[3]) / 2.0;
+    const double x = (right - left) / 2.0;
+    const double y = (up - z * top + z * bottom - down) / 2.0;
     camera.unit = z - middle;
     camera.position = view_.right * x + view_.up * y + view_.viewer * z;
     return camera;

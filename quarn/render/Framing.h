@@ -9,6 +9,7 @@
 #include "quarn/render/View.h"
 
 #include <array>
+#include <limits>
 #include <span>
 #include <vector>
 
@@ -33,27 +34,34 @@ struct Margins {
     double bottom = 0.05;
 };
 
-/// Finds the nearest camera of a view that sees all points it was shown, within the margins. The sides of what a camera
-/// sees have directions that do not depend on where it stands; so it is enough to know how far the points reach in
-/// those four, and nothing else is kept of them.
+/// Finds the nearest camera of a view that sees some points, within the margins. The sides of what a camera sees have
+/// directions that do not depend on where it stands; so it is enough to know how far the points reach in those four.
 class Framing {
 public:
+    /// How far points reach to the sides of the picture, and along the view.
+    struct Reach {
+        std::array<double, 4> sides{-infinity, -infinity, -infinity, -infinity}; ///< right, left, top, bottom
+        double nearest = -infinity;                                              ///< along the view's `viewer`
+        double farthest = infinity;
+
+        void include(const Reach& other);
+        bool isEmpty() const { return nearest < farthest; }
+    };
+
     /// `width`, `height` of the picture, above 0; the shorter one spans 35 degrees.
     Framing(const View& view, int width, int height, const Margins& margins);
-    /// x, y, z of each vertex, finite.
-    void include(std::span<const double> xyz);
-    /// Without any extent, a camera that stands one unit away.
-    Camera camera() const;
+    /// Of one point, finite, in object space.
+    Reach reachOf(const HVector& point) const;
+    /// Where to stand to see it all. Without any extent, a camera that stands one unit away.
+    Camera camera(const Reach& reach) const;
 
 private:
+    static constexpr double infinity = std::numeric_limits<double>::infinity();
+
     View view_;
     double tangentX_;
     double tangentY_;
     std::array<double, 3> tangents_{}; ///< of the free parts: to both sides, to the top, to the bottom
-    std::array<double, 4> reach_{};    ///< right, left, top, bottom
-    double nearest_ = 0.0;             ///< along view_.viewer
-    double farthest_ = 0.0;
-    bool empty_ = true;
 };
 
 } // namespace quarn

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// A panel: a mesh of the scene, plain or coloured by its distance from another, and its points at a frame.
+// A panel: meshes of the scene, plain or coloured by their distance from others, and their points at a frame.
 #pragma once
 
 #include "openquarn/HPlug.h"
@@ -11,23 +11,31 @@
 
 namespace quarn {
 
+struct PanelMesh {
+    HPlug mesh;
+    HPlug reference; ///< what the distance is to; null where none is shown
+};
+
 struct Panel {
     std::string label; ///< empty for none
-    HPlug mesh;
-    HPlug reference; ///< what the distance is to; null for plain clay
+    std::vector<PanelMesh> meshes;
 
-    bool isHeat() const { return !reference.isNull(); }
+    /// Shows a distance, of one of its meshes at least; else plain clay.
+    bool isHeat() const;
 };
 
-/// What a panel shows at a frame, in object space.
-struct PanelFrame {
+/// What a panel shows of a mesh at a frame, in object space.
+struct MeshFrame {
     MeshPolygons polygons;
     std::vector<double> points;    ///< x, y, z of each vertex; finite
-    std::vector<double> distances; ///< of each vertex from the reference; empty for plain clay
+    std::vector<double> distances; ///< of each vertex from the reference; empty without one
 };
+/// Of each mesh of a panel.
+using PanelFrame = std::vector<MeshFrame>;
 
-/// "LABEL=PLUG" and "LABEL=PLUG:PLUG". Labels may hold a "=": the last one counts. Throws std::runtime_error, quoting
-/// the text, when it is none or the plugs do not exist. Thread: main.
+/// "LABEL=PLUG+PLUG..." and "LABEL=PLUG:PLUG+PLUG...", where one at least has a reference. Labels may hold a "=": the
+/// last one counts. Throws std::runtime_error, quoting the text, when it is none or the plugs do not exist.
+/// Thread: main.
 Panel panelFrom(const std::string& text);
 Panel heatPanelFrom(const std::string& text);
 

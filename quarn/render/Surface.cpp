@@ -15,30 +15,29 @@ Vec3 areaVector(std::span<const std::uint32_t> corners, const std::vector<Vec3>&
     return sum;
 }
 
-void addPolygon(Surface& surface, std::span<const std::uint32_t> corners) {
+// `first` the surface's point that is the mesh's first vertex
+void addPolygon(Surface& surface, std::uint32_t first, std::span<const std::uint32_t> corners,
+                const std::vector<Vec3>& points) {
     for (std::size_t corner = 2; corner < corners.size(); ++corner)
-        surface.triangles.push_back({corners[0], corners[corner - 1], corners[corner]});
-    const Vec3 area = areaVector(corners, surface.points);
+        surface.triangles.push_back({first + corners[0], first + corners[corner - 1], first + corners[corner]});
+    const Vec3 area = areaVector(corners, points);
     for (const std::uint32_t vertex : corners)
-        surface.normals[vertex] += area;
+        surface.normals[first + vertex] += area;
 }
 
 } // namespace
 
-Surface makeSurface(const MeshPolygons& polygons, std::vector<Vec3> points) {
-    Surface surface;
-    surface.points = std::move(points);
+void addMesh(Surface& surface, const MeshPolygons& polygons, const std::vector<Vec3>& points) {
+    const std::size_t first = surface.points.size();
+    surface.points.insert(surface.points.end(), points.begin(), points.end());
     surface.normals.resize(surface.points.size());
-    surface.triangles.reserve(polygons.corners.size());
-    const std::span<const std::uint32_t> corners = polygons.corners;
-    std::size_t begin = 0;
+    std::span<const std::uint32_t> corners = polygons.corners;
     for (const std::uint32_t size : polygons.sizes) {
-        addPolygon(surface, corners.subspan(begin, size));
-        begin += size;
+        addPolygon(surface, static_cast<std::uint32_t>(first), corners.first(size), points);
+        corners = corners.subspan(size);
     }
-    for (Vec3& normal : surface.normals)
-        normal = normalized(normal);
-    return surface;
+    for (std::size_t point = first; point < surface.points.size(); ++point)
+        surface.normals[point] = normalized(surface.normals[point]);
 }
 
 } // namespace quarn

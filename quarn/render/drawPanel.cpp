@@ -3,17 +3,38 @@
 
 #include "quarn/render/shade.h"
 
+#include <algorithm>
+
 namespace quarn {
+
+namespace {
+
+void addHeat(Surface& surface, const MeshFrame& mesh, double range) {
+    if (mesh.distances.empty())
+        surface.heat.resize(surface.points.size(), unmeasured);
+    for (const double distance : mesh.distances)
+        surface.heat.push_back(static_cast<float>(distance / range));
+}
+
+} // namespace
 
 void drawPanel(Picture& picture, const Layout& layout, int left, const Camera& camera, const Panel& panel,
                const PanelFrame& frame, const HeatScale& scale) {
-    Surface surface = makeSurface(frame.polygons, camera.toCamera(frame.points));
-    surface.heat.reserve(frame.distances.size());
-    for (const double distance : frame.distances)
-        surface.heat.push_back(static_cast<float>(distance / scale.range));
+    const bool isHeat =
+        std::any_of(frame.begin(), frame.end(), [](const MeshFrame& mesh) { return !mesh.distances.empty(); });
+    Surface surface;
+    for (const MeshFrame& mesh : frame) {
+        addMesh(surface, mesh.polygons, camera.toCamera(mesh.points));
+        if (isHeat)
+            addHeat(surface, mesh, scale.range);
+    }
     PanelSight sight = gather(surface, camera, layout.width, layout.height);
-    smoothLight(sight);
-    shade(sight, picture, left);
+    if (isHeat) {
+        shadeFlat(sight, picture, left);
+    } else {
+        smoothLight(sight);
+        shade(sight, picture, left);
+    }
     if (!panel.label.empty())
         drawLabel(picture, layout, left, panel.label);
     if (panel.isHeat())

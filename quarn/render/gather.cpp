@@ -131,7 +131,11 @@ PixelSight Tracer::pixel(int x, int y) const {
         sight.cover += 1.0F;
         sight.position += place.position;
         sight.normal += place.normal;
-        sight.albedo += surface_.heat.empty() ? lights::clay : decoded(heatColour(place.heat));
+        if (!surface_.heat.empty()) {
+            sight.albedo += decoded(place.heat == unmeasured ? unmeasuredColour : heatColour(place.heat));
+            continue;
+        }
+        sight.albedo += lights::clay;
         addLight(sight, place, patternOf(x, y) * raysPerPixel + ray);
     }
     if (sight.cover == 0.0F)
@@ -156,20 +160,6 @@ void forEachRow(int height, const std::function<void(int)>& work) {
                               });
 }
 
-std::size_t indexOf(const PanelSight& sight, int x, int y) {
-    return static_cast<std::size_t>(y) * static_cast<std::size_t>(sight.width) + static_cast<std::size_t>(x);
-}
-
-// how much two pixels belong to one smooth piece of surface: normals alike, and each near the other's plane
-float kinship(const PixelSight& a, const PixelSight& b) {
-    const float alike = dot(a.normal, b.normal);
-    if (alike <= 0.0F)
-        return 0.0F;
-    const float gap = std::abs(dot(a.normal, b.position - a.position));
-    const float squared = alike * alike;
-    return b.cover * squared * squared * std::max(0.0F, 1.0F - gap / 0.01F);
-}
-
 // a box of 4 x 4 pixels, which holds each pattern once, around the middle of the pixel
 void smoothPixel(const PanelSight& from, PixelSight& pixel, int x, int y) {
     float weights = 0.0F;
@@ -177,11 +167,11 @@ void smoothPixel(const PanelSight& from, PixelSight& pixel, int x, int y) {
     float sky = 0.0F;
     for (int row = std::max(0, y - 2); row <= std::min(from.height - 1, y + 2); ++row)
         for (int column = std::max(0, x - 2); column <= std::min(from.width - 1, x + 2); ++column) {
-            const PixelSight& other = from.pixels[indexOf(from, column, row)];
+            const PixelSight& other = from.at(column, row);
             if (other.cover == 0.0F)
                 continue;
             const float edge = (std::abs(row - y) == 2 ? 0.5F : 1.0F) * (std::abs(column - x) == 2 ? 0.5F : 1.0F);
-            const float weight = edge * kinship(pixel, other);
+            const float weight = edge * other.cover * pixel.kinship(other);
             weights += weight;
             key += weight * other.keyOpen;
             sky += weight * other.skyOpen;
@@ -194,13 +184,23 @@ void smoothPixel(const PanelSight& from, PixelSight& pixel, int x, int y) {
 
 } // namespace
 
+float PixelSight::kinship(const PixelSight& other) const {
+    const float alike = dot(normal, other.normal);
+    if (alike <= 0.0F)
+        return 0.0F;
+    const float gap = std::abs(dot(normal, other.position - position));
+    const float squared = alike * alike;
+    return squared * squared * std::max(0.0F, 1.0F - gap / 0.01F);
+}
+
 PanelSight gather(const Surface& surface, const Camera& camera, int width, int height) {
-    PanelSight sight{width, height, {}, !surface.heat.empty()};
+    PanelSight sight{width, height, {}};
     sight.pixels.resize(static_cast<std::size_t>(width) * static_cast<std::size_t>(height));
     const Tracer tracer(surface, camera, width, height);
     forEachRow(height, [&](int y) {
+        std::size_t at = static_cast<std::size_t>(y) * static_cast<std::size_t>(width);
         for (int x = 0; x < width; ++x)
-            sight.pixels[indexOf(sight, x, y)] = tracer.pixel(x, y);
+            sight.pixels[at++] = tracer.pixel(x, y);
     });
     return sight;
 }
@@ -208,8 +208,9 @@ PanelSight gather(const Surface& surface, const Camera& camera, int width, int h
 void smoothLight(PanelSight& sight) {
     const PanelSight from = sight;
     forEachRow(sight.height, [&](int y) {
+        std::size_t at = static_cast<std::size_t>(y) * static_cast<std::size_t>(sight.width);
         for (int x = 0; x < sight.width; ++x)
-            if (PixelSight& pixel = sight.pixels[indexOf(sight, x, y)]; pixel.cover > 0.0F)
+            if (PixelSight& pixel = sight.pixels[at++]; pixel.cover > 0.0F)
                 smoothPixel(from, pixel, x, y);
     });
 }

@@ -18,6 +18,9 @@ struct PixelSight {
     float keyLight = 0.0F; ///< cosine of the angle to the key light, where that is above the horizon
     float keyOpen = 0.0F;  ///< 0 in the shadow of the key light, 1 in its full light
     float skyOpen = 0.0F;  ///< the part of the sky that is not hidden by what is near
+
+    /// 1 where another pixel lies on the same smooth piece of surface, down to 0 across a crease or a step.
+    float kinship(const PixelSight& other) const;
 };
 
 /// A panel, row by row from the top.
@@ -25,11 +28,14 @@ struct PanelSight {
     int width = 0;
     int height = 0;
     std::vector<PixelSight> pixels;
-    bool isHeat = false; ///< shows a colour scale
+
+    const PixelSight& at(int x, int y) const {
+        return pixels[static_cast<std::size_t>(y) * static_cast<std::size_t>(width) + static_cast<std::size_t>(x)];
+    }
 };
 
-/// Traces a panel, on all threads that oneTBB has; the result does not depend on their number. Throws
-/// std::runtime_error when the memory is not enough, and Interrupted.
+/// Traces a panel, of one that shows heat the colours alone and no light, on all threads that oneTBB has; the result
+/// does not depend on their number. Throws std::runtime_error when the memory is not enough, and Interrupted.
 PanelSight gather(const Surface& surface, const Camera& camera, int width, int height);
 
 /// Takes the grain out of keyOpen and skyOpen: each pixel gets the mean of its neighbours on the same smooth piece of

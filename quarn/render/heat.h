@@ -18,4 +18,7 @@ double roundedUp(double value);
 /// sRGB, for 0 to 1; what is outside of it, and is not a number, has the colour of the nearer end.
 Vec3 heatColour(float heat);
 
+/// sRGB, of what has no distance: none of the scale.
+constexpr Vec3 unmeasuredColour{0.74F, 0.79F, 0.86F};
+
 } // namespace quarn

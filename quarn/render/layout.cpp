@@ -3,6 +3,7 @@
 
 #include "quarn/console/numberText.h"
 #include "quarn/render/heat.h"
+#include "quarn/render/shade.h"
 #include "quarn/render/text.h"
 
 #include <algorithm>
@@ -11,6 +12,8 @@ namespace quarn {
 namespace {
 
 constexpr Vec3 ink{0.20F, 0.22F, 0.25F};
+
+constexpr double around = 0.06; // of a close-up, on every side
 
 // all sizes follow the panel's shorter side
 float labelHeight(const Layout& layout) {
@@ -25,6 +28,16 @@ void drawCentred(Picture& picture, const std::string& text, float middle, float 
     drawText(picture, text, middle - textWidth(text, height) / 2.0F, top, height, ink);
 }
 
+// veils what a close-up shows behind words; on the background it cannot be seen
+void drawPlate(Picture& picture, const Layout& layout, int left, int top, int bottom) {
+    if (!layout.isCloseUp)
+        return;
+    for (int y = top; y < bottom; ++y)
+        for (int x = 0; x < layout.width; ++x)
+            picture.paint(left + x, y,
+                          backgroundColour((static_cast<float>(y) + 0.5F) / static_cast<float>(layout.height)), 0.75F);
+}
+
 } // namespace
 
 Margins Layout::margins() const {
@@ -34,12 +47,18 @@ Margins Layout::margins() const {
         margins.top = std::max(margins.top, 2.8 * label);
     if (hasColourBar)
         margins.bottom = std::max(margins.bottom, 4.0 * label);
+    if (isCloseUp) {
+        margins.sides += around;
+        margins.top += around;
+        margins.bottom += around;
+    }
     return margins;
 }
 
 void drawLabel(Picture& picture, const Layout& layout, int left, const std::string& label) {
     const float height = labelHeight(layout);
     const auto width = static_cast<float>(layout.width);
+    drawPlate(picture, layout, left, 0, static_cast<int>(2.8F * height));
     drawCentred(picture, fittingText(label, height, 0.94F * width), static_cast<float>(left) + width / 2.0F,
                 0.9F * height, height);
 }
@@ -50,6 +69,7 @@ void drawColourBar(Picture& picture, const Layout& layout, int left, double rang
     const int first = left + (layout.width - length) / 2;
     const int top = layout.height - static_cast<int>(3.0F * unit);
     const int bottom = top + std::max(3, static_cast<int>(0.65F * unit));
+    drawPlate(picture, layout, left, layout.height - static_cast<int>(4.0F * unit), layout.height);
     for (int x = 0; x < length; ++x)
         for (int y = top; y < bottom; ++y)
             picture.paint(first + x, y, heatColour((static_cast<float>(x) + 0.5F) / static_cast<float>(length)));

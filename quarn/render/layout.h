@@ -15,6 +15,7 @@ struct Layout {
     int height = 480;
     bool hasLabels = false;
     bool hasColourBar = false; ///< in any panel
+    bool isCloseUp = false;    ///< of a part of what is there: something of what is around it is shown
 
     /// The room that the surface has to leave free, in every panel, so that all show it in the same place.
     Margins margins() const;

@@ -20,9 +20,6 @@ constexpr float skyReach = 0.35F; ///< what is farther away hides none of it; in
 constexpr Vec3 rim{0.16F, 0.17F, 0.19F};
 constexpr float sheen = 0.10F; ///< of the highlight of the key light
 
-/// Of surfaces that show a colour scale: this much of the light is the same everywhere, so that colours can be read.
-constexpr float evenLight = 0.85F;
-
 constexpr Vec3 clay{0.68F, 0.435F, 0.32F};
 
 } // namespace quarn::lights

@@ -8,6 +8,7 @@
 #include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
+#include "quarn/render/Subject.h"
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
@@ -58,12 +59,13 @@ struct Options {
     std::string size = "480x480";
     std::string view = "25,10";
     std::string up = "y";
+    std::string frameOn = "all";
 };
 
 // what all pictures have in common
 struct Shot {
     std::vector<Panel> panels;
-    std::vector<ModelInUse> models; // of each panel's mesh
+    std::vector<std::vector<ModelInUse>> models; // of each panel's meshes
     FrameRange frames;
     Layout layout;
     Camera camera;
@@ -111,9 +113,9 @@ std::vector<Panel> panelsOf(const Options& options) {
     for (const PanelText& panel : options.panels)
         panels.push_back(panel.isHeat ? heatPanelFrom(panel.text) : panelFrom(panel.text));
     if (!options.plug.empty())
-        panels.insert(panels.begin(), {"", findPlug(options.plug), HPlug()});
+        panels.insert(panels.begin(), panelFrom("=" + options.plug));
     if (panels.empty())
-        panels.push_back({"", Warp::find(options.deformer).geometry(options.geometry).output, HPlug()});
+        panels.push_back({"", {{Warp::find(options.deformer).geometry(options.geometry).output, HPlug()}}});
     return panels;
 }
 
@@ -128,9 +130,12 @@ void chooseModels(Shot& shot, const Options& options) {
     }
     const auto modelOf = [&](const HPlug& mesh) { return mesh == meant ? given : chooseModel(mesh, {}); };
     for (const Panel& panel : shot.panels) {
-        if (panel.isHeat())
-            modelOf(panel.reference);
-        shot.models.push_back(modelOf(panel.mesh));
+        std::vector<ModelInUse>& models = shot.models.emplace_back();
+        for (const PanelMesh& mesh : panel.meshes) {
+            if (!mesh.reference.isNull())
+                modelOf(mesh.reference);
+            models.push_back(modelOf(mesh.mesh));
+        }
     }
 }
 
@@ -153,6 +158,7 @@ Shot plan(const Options& options, SceneSession& session) {
     shot.layout.hasLabels =
         std::any_of(shot.panels.begin(), shot.panels.end(), [](const Panel& panel) { return !panel.label.empty(); });
     shot.layout.hasColourBar = hasHeat(shot.panels);
+    shot.layout.isCloseUp = frameOnFrom(options.frameOn) != FrameOn::all;
     setSize(shot.layout, options.size, shot.panels.size());
     return shot;
 }
@@ -162,16 +168,22 @@ void throwIfAny(const HostErrors& errors, int frame) {
         throw std::runtime_error(text + " (at frame " + std::to_string(frame) + ")");
 }
 
+double largestOf(const std::vector<double>& distances) {
+    return distances.empty() ? 0.0 : *std::max_element(distances.begin(), distances.end());
+}
+
 AppliedModels modelsOf(const std::vector<Panel>& panels) {
     std::vector<HPlug> meshes;
     for (const Panel& panel : panels)
-        meshes.insert(meshes.end(), {panel.mesh, panel.reference});
+        for (const PanelMesh& mesh : panel.meshes)
+            meshes.insert(meshes.end(), {mesh.mesh, mesh.reference});
     return AppliedModels(meshes);
 }
 
 // looks at the frames before any is drawn: where the camera has to stand, and how far the colours have to reach
 void look(Shot& shot, const View& view, const Options& options, SceneSession& session) {
-    Framing framing(view, shot.layout.width, shot.layout.height, shot.layout.margins());
+    Subject subject(frameOnFrom(options.frameOn),
+                    Framing(view, shot.layout.width, shot.layout.height, shot.layout.margins()));
     double largest = 0.0;
     const std::size_t count = shot.frames.count();
     const std::size_t looks = std::min(count, mostFramesLookedAt);
@@ -185,18 +197,24 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
         const FrameLog log(frame);
         session.host().setTime(frame);
         models.blame([&] {
-            for (const Panel& panel : shot.panels) {
-                const PanelFrame shown = evaluatePanel(panel, frame);
-                framing.include(shown.points);
-                for (const double distance : shown.distances)
-                    largest = std::max(largest, distance);
-            }
+            std::vector<PanelFrame> shown;
+            for (const Panel& panel : shot.panels)
+                shown.push_back(evaluatePanel(panel, frame));
+            subject.include(shown);
+            for (const PanelFrame& panel : shown)
+                for (const MeshFrame& mesh : panel)
+                    largest = std::max(largest, largestOf(mesh.distances));
             throwIfAny(errors, frame);
         });
         models.requireSound();
         progress.advance();
     }
-    shot.camera = framing.camera();
+    shot.camera = subject.camera();
+    if (!subject.isFound())
+        options.console.note(
+            options.frameOn == "moving"
+                ? "nothing moves from frame to frame: the camera is on all there is"
+                : "no panel differs from another, nor a mesh from its reference: the camera is on all there is");
     const double millimetresPerUnit = 1000.0 * metersPerUnit();
     shot.scale.millimetres = options.range > 0.0 ? options.range : roundedUp(largest * millimetresPerUnit);
     shot.scale.range = shot.scale.millimetres / millimetresPerUnit;
@@ -204,8 +222,10 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
 
 void warnOfEmptyPanels(const Shot& shot, const Console& console) {
     for (const Panel& panel : shot.panels)
-        if (polygonsOf(panel.mesh).sizes.empty())
-            console.warn(std::string(panel.mesh.name().asChar()) + " has no polygons: there is nothing to see of it");
+        for (const PanelMesh& mesh : panel.meshes)
+            if (polygonsOf(mesh.mesh).sizes.empty())
+                console.warn(std::string(mesh.mesh.name().asChar()) +
+                             " has no polygons: there is nothing to see of it");
 }
 
 void drawPictures(const Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
@@ -223,7 +243,8 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
         int left = 0;
         for (std::size_t panel = 0; panel < shot.panels.size(); ++panel) {
             const PanelFrame shown = evaluatePanel(shot.panels[panel], frame);
-            answer.measures[panel].add(shown.distances);
+            for (const MeshFrame& mesh : shown)
+                answer.measures[panel].add(mesh.distances);
             drawPanel(picture, shot.layout, left, shot.camera, shot.panels[panel], shown, shot.scale);
             left += shot.layout.width;
         }
@@ -237,6 +258,20 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
     }
 }
 
+void writeMeshes(JsonWriter& writer, const Panel& panel, const std::vector<ModelInUse>& models) {
+    writer.Key("meshes");
+    writer.StartArray();
+    for (std::size_t mesh = 0; mesh < panel.meshes.size(); ++mesh) {
+        writer.StartObject();
+        writeText(writer, "plug", panel.meshes[mesh].mesh.name().asChar());
+        if (const HPlug& reference = panel.meshes[mesh].reference; !reference.isNull())
+            writeText(writer, "reference", reference.name().asChar());
+        writeModel(writer, models[mesh]);
+        writer.EndObject();
+    }
+    writer.EndArray();
+}
+
 void writePanels(JsonWriter& writer, const Shot& shot, const Answer& answer) {
     const double millimetres = shot.scale.millimetres / shot.scale.range;
     writer.Key("panels");
@@ -244,10 +279,8 @@ void writePanels(JsonWriter& writer, const Shot& shot, const Answer& answer) {
     for (std::size_t panel = 0; panel < shot.panels.size(); ++panel) {
         writer.StartObject();
         writeText(writer, "label", shot.panels[panel].label);
-        writeText(writer, "plug", shot.panels[panel].mesh.name().asChar());
-        writeModel(writer, shot.models[panel]);
+        writeMeshes(writer, shot.panels[panel], shot.models[panel]);
         if (shot.panels[panel].isHeat()) {
-            writeText(writer, "reference", shot.panels[panel].reference.name().asChar());
             writer.Key("rangeMillimetres");
             writer.Double(shot.scale.millimetres);
             writer.Key("meanMillimetres");
@@ -283,9 +316,10 @@ void tell(const Shot& shot, const Answer& answer, const Console& console) {
         console.note("the camera and the range of colours are those of " + std::to_string(mostFramesLookedAt) +
                      " of the " + std::to_string(shot.frames.count()) + " frames");
     std::set<std::string> notes; // several panels may show the same mesh
-    for (const ModelInUse& model : shot.models)
-        if (!model.note.empty() && notes.insert(model.note).second)
-            console.note(model.note);
+    for (const std::vector<ModelInUse>& models : shot.models)
+        for (const ModelInUse& model : models)
+            if (!model.note.empty() && notes.insert(model.note).second)
+                console.note(model.note);
     const std::string last = answer.pictures.back().string();
     console.note(answer.pictures.size() == 1 ? "drew " + last
                                              : "drew " + std::to_string(answer.pictures.size()) + " pictures, " +
@@ -359,6 +393,11 @@ void addRenderCommand(CLI::App& app) {
         ->capture_default_str();
     command
         ->add_option("--view", options->view, "front, back, left, right, top, bottom, or AZIMUTH,ELEVATION in degrees")
+        ->capture_default_str();
+    command
+        ->add_option("--frame-on", options->frameOn,
+                     "What the camera is on: all, what is moving from frame to frame, or what is differing from panel "
+                     "to panel")
         ->capture_default_str();
     command->add_option("--up", options->up, "The axis that points up: x, y or z")->capture_default_str();
     addConsoleOptions(*command, options->console, true);

@@ -17,9 +17,9 @@ double lightness(const Vec3& srgb) {
     return 0.2126 * linear.x + 0.7152 * linear.y + 0.0722 * linear.z;
 }
 
-TEST(Heat, ColoursGetLighterAllTheWayAndEndsHold) {
+TEST(Heat, ColoursGetDarkerAllTheWayAndEndsHold) {
     for (int i = 0; i < 200; ++i)
-        EXPECT_LT(lightness(heatColour(static_cast<float>(i) / 200.0F)),
+        EXPECT_GT(lightness(heatColour(static_cast<float>(i) / 200.0F)),
                   lightness(heatColour(static_cast<float>(i + 1) / 200.0F)))
             << i;
     const float infinity = std::numeric_limits<float>::infinity();

@@ -33,13 +33,18 @@ TEST_F(PanelTest, LabelsAndPlugsAreTakenApart) {
     EXPECT_FALSE(plain.isHeat());
     const Panel heat = heatPanelFrom("a: to b=a.outMesh:b.outMesh");
     EXPECT_EQ(heat.label, "a: to b");
-    EXPECT_EQ(evaluatePanel(heat, 1).distances, (std::vector<double>{5.0, 0.0, 0.25}));
+    EXPECT_EQ(evaluatePanel(heat, 1).at(0).distances, (std::vector<double>{5.0, 0.0, 0.25}));
+    EXPECT_EQ(evaluatePanel(panelFrom("x=b.outMesh+a.outMesh"), 1).at(1).points[6], -1e9);
+    const PanelFrame part = evaluatePanel(heatPanelFrom("x=a.outMesh:b.outMesh+b.outMesh"), 1);
+    EXPECT_EQ(part.at(0).distances.size(), 3U);
+    EXPECT_TRUE(part.at(1).distances.empty());
     for (const char* text : {"a.outMesh", "label=", ""})
         EXPECT_THAT([&] { panelFrom(text); }, ThrowsMessage<std::runtime_error>(HasSubstr("write LABEL=PLUG")));
-    for (const char* text : {"x=a.outMesh", "x=a.outMesh:", "x=:a.outMesh"})
+    for (const char* text :
+         {"x=a.outMesh", "x=a.outMesh:", "x=:a.outMesh", "x=a.outMesh:b.outMesh:a.outMesh", "x=a.outMesh+b.outMesh"})
         EXPECT_THAT([&] { heatPanelFrom(text); },
                     ThrowsMessage<std::runtime_error>(HasSubstr("write LABEL=PLUG:PLUG")));
-    EXPECT_THAT([] { panelFrom("x=c.outMesh"); },
+    EXPECT_THAT([] { panelFrom("x=a.outMesh+c.outMesh"); },
                 ThrowsMessage<std::runtime_error>(HasSubstr("there is no plug c.outMesh")));
 }
 

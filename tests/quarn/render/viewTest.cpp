@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/View.h"
 #include "quarn/render/Framing.h"
+#include "quarn/render/Subject.h"
 #include "quarn/render/pictureNames.h"
 
 #include <gmock/gmock.h>
@@ -61,10 +62,12 @@ TEST(Framing, SeesAllPointsWithinTheMarginsAndTouchesThem) {
             std::generate(first.begin(), first.end(), [&] { return scale * (5.0 + number(random)); });
             std::vector<double> second(30);
             std::generate(second.begin(), second.end(), [&] { return scale * (4.0 + number(random)); });
-            Framing framing(view, width, height, margins);
-            framing.include(first);
-            framing.include(second);
-            const Camera camera = framing.camera();
+            const Framing framing(view, width, height, margins);
+            Framing::Reach reach;
+            for (const std::vector<double>& points : {first, second})
+                for (std::size_t at = 0; at < points.size(); at += 3)
+                    reach.include(framing.reachOf({points[at], points[at + 1], points[at + 2]}));
+            const Camera camera = framing.camera(reach);
             first.insert(first.end(), second.begin(), second.end());
             double fullest = 0.0;
             for (const Vec3& point : camera.toCamera(first)) {
@@ -79,10 +82,38 @@ TEST(Framing, SeesAllPointsWithinTheMarginsAndTouchesThem) {
 }
 
 TEST(Framing, NothingAndASinglePointHaveACamera) {
-    Framing framing(viewFrom("front", "y"), 100, 100, {});
-    expectNear(framing.camera().position, {0, 0, 1}, "nothing");
-    framing.include(std::vector<double>{1000.0, 2000.0, 3000.0});
-    expectNear(framing.camera().position, {1000, 2000, 3001}, "a point");
+    const Framing framing(viewFrom("front", "y"), 100, 100, {});
+    expectNear(framing.camera({}).position, {0, 0, 1}, "nothing");
+    expectNear(framing.camera(framing.reachOf({1000, 2000, 3000})).position, {1000, 2000, 3001}, "a point");
+}
+
+// three triangles: one stands still, one moves in both panels, one differs between them by less than the other moves
+TEST(Subject, TheCameraIsOnWhatMovesOrDiffers) {
+    const auto panelAt = [](double moved, double apart) {
+        MeshFrame mesh;
+        mesh.polygons = {10, {3, 3, 3}, {0, 1, 2, 3, 4, 5, 6, 7, 8}};
+        mesh.points = {0, 0, 0, 1, 0, 0, 0, 1, 0, 10, moved, 0, 11, moved, 0, 10, moved + 1, 0};
+        mesh.points.insert(mesh.points.end(), {20, apart, 0, 21, apart, 0, 20, 1 + apart, 0, 1e3, moved, 0});
+        return PanelFrame{mesh};
+    };
+    struct Case {
+        const char* text;
+        double moved;
+        double apart;
+        double left, right; // of what the camera is on
+    };
+    const Case cases[] = {{"all", 3, 0.5, 0, 21},        {"moving", 3, 0.5, 10, 11}, {"differing", 3, 0.5, 20, 21},
+                          {"moving", 0, 0.5, 0, 21},     {"differing", 3, 0, 0, 21}, {"moving", 1e-9, 0.5, 10, 11},
+                          {"differing", 3, 1e-9, 20, 21}};
+    for (const Case& c : cases) {
+        Subject subject(frameOnFrom(c.text), Framing(viewFrom("front", "y"), 300, 100, {}));
+        subject.include({panelAt(0, 0), panelAt(0, c.apart)});
+        subject.include({panelAt(c.moved, 0), panelAt(c.moved, 0)});
+        const bool isAll = std::string(c.text) == "all";
+        EXPECT_EQ(subject.isFound(), isAll || c.right - c.left < 20) << c.text;
+        EXPECT_NEAR(subject.camera().position.x, (c.left + c.right) / 2, 1e-9) << c.text << ' ' << c.moved;
+    }
+    EXPECT_THAT([] { frameOnFrom("most"); }, ThrowsMessage<std::runtime_error>(HasSubstr("\"most\" is nothing")));
 }
 
 TEST(PictureName, FramesInNames) {
