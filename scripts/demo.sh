@@ -212,7 +212,7 @@ demo_rows() {
 demo_pictures() {
   local scene=motion.$mesh.json
   local panels=(--panel "skin=$skin_plug" --panel "target=$target_plug" --panel "neural=warp.outputGeom[0]"
-    --heat "error=warp.outputGeom[0]:$target_plug" --range 2 --view 90,20)
+    --heat "before=$skin_plug:$target_plug" --heat "after=warp.outputGeom[0]:$target_plug" --range 5 --view 90,20)
   step "pictures" \
     "$QUARN" render "$data/surface_principal/$scene" "${panels[@]}" --model "$mesh" --size 480x480 --frames 20-100x20 \
     -o "$demo_out/pictures/motion.####.png"

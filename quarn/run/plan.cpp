@@ -367,6 +367,7 @@ private:
         const auto isThis = [&](const MeshFacts& other) { return other.name == mesh.name; };
         const auto index = std::find_if(meshes.begin(), meshes.end(), isThis) - meshes.begin();
         const std::string result = "warp.outputGeom[" + std::to_string(index) + "]";
+        const std::string skin = mesh.skin + ".outputGeom[0]";
         const std::string target = facts.node + ".outMesh";
         std::vector<fs::path> files;
         for (const int frame : drawnFrames(held, step))
@@ -376,10 +377,11 @@ private:
                                           "--model",    mesh.name,
                                           "--frames",   framesText(held) + "x" + std::to_string(step),
                                           "--size",     size,
-                                          "--panel",    "skin=" + mesh.skin + ".outputGeom[0]",
+                                          "--panel",    "skin=" + skin,
                                           "--panel",    "target=" + target,
                                           "--panel",    "neural=" + result,
-                                          "--heat",     "error=" + result + ":" + target,
+                                          "--heat",     "before=" + skin + ":" + target,
+                                          "--heat",     "after=" + result + ":" + target,
                                           "-o",         file + ".####.png"},
                             {scene, facts.cache, "models/" + mesh.name + ".nwrp"}, files);
         append(drawing.words, settings_.renderOptions);
