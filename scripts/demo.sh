@@ -16,7 +16,7 @@ usage: ./run demo [--all] [--output FOLDER] [--samples N] [--epochs N]
                     of them, 40 at least
   --epochs N        passes over them (default 250)
 
-The hand's report is report.html. The arm takes less than a minute of the demo; its report is arm/report.html, and its
+The hand's report is report.html. The arm takes about a minute of the demo; its report is arm/report.html, and its
 picture, in which one sees what was learned, arm.png.
 TEXT
 }
@@ -59,12 +59,12 @@ demo_place() {
 # --- what is coming ---
 
 # Seconds of one core, measured: a target shape 0.04, a pose in an epoch of a network of shapes 0.0001, of a direct one
-# 0.0005; the rest of a demo 50, and the arm 25. Targets are shared between the cores, and trainings go two side by
+# 0.0005; the rest of a demo 50, and the arm 40. Targets are shared between the cores, and trainings go two side by
 # side.
 demo_seconds() {
   local cores kind seconds
   cores=$(job_count)
-  seconds=$((75 + (demo_samples + 120) * 40 / (1000 * cores) + $(arm_samples) * demo_epochs / 10000))
+  seconds=$((90 + (demo_samples + 120) * 40 / (1000 * cores) + $(arm_samples) * demo_epochs / 10000))
   for kind in "${demo_kinds[@]}"; do
     local cost=1
     if [[ $kind == direct ]]; then cost=5; fi
@@ -233,7 +233,8 @@ demo_arm() {
   NW_PYTHON=$python "$QUARN" run "$demo_out/arm.glb" -o "$demo_out/arm" --limits examples/arm/limits.json \
     --samples "$(arm_samples)" --activation-rate 0.8 --seed 1 --motion examples/arm/motion.json \
     --epochs "$demo_epochs" --train-option=--learning-rate --train-option=0.001 \
-    --train-option=--principal-accuracy --train-option=0.999 --render-option=--view --render-option=15,15 \
+    --train-option=--principal-accuracy --train-option=0.999 \
+    --render-option=--view --render-option=15,15 --render-option=--range --render-option=30 \
     --target-command "$python" examples/arm/arm_targets.py >"$logs/arm.log"
   local skin=arm_skin.outputGeom[0] target=arm_target.outMesh neural=warp.outputGeom[0]
   step "the arm's picture" \
