@@ -8,12 +8,13 @@ import signal
 import sys
 from pathlib import Path
 from types import FrameType
-from typing import TYPE_CHECKING, Callable, NoReturn, Optional, Union
+from typing import TYPE_CHECKING, Any, Callable, NoReturn, Optional, Union
 
 from . import __version__
 from .errors import Terminated, TrainerError, UsageError
 
 if TYPE_CHECKING:  # what needs NumPy is imported by the commands, behind what sets its threads
+    from .folders import Work
     from .settings import Settings
 
 # Debian's packages by module, for whoever has to install them
@@ -66,13 +67,16 @@ def add_quarn(command: argparse.ArgumentParser) -> None:
 
 
 def add_train(commands: "argparse._SubParsersAction[Parser]") -> None:
-    train = commands.add_parser("train", help="train a model", allow_abbrev=False)
-    add_dataset(train)
+    train = commands.add_parser("train", help="train a model, or several", allow_abbrev=False)
+    train.add_argument("dataset", metavar="DATASET", help="folder that 'quarn export' wrote, or one of such folders: "
+                       "each becomes a model")
     train.add_argument("-o", "--output", metavar="MODEL.nwrp",
-                       help="model directory; if not given: models/NAME.nwrp with the data set's outputModelName")
+                       help="model directory; if not given: models/NAME.nwrp with the data set's outputModelName. Of "
+                       "several data sets the folder of these, models if not given")
     train.add_argument("--seed", type=int, default=1, help="of everything that is drawn at random (default 1)")
     train.add_argument("--threads", type=int, default=1, help="of the arithmetic; the model depends on it (default 1)")
-    train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model")
+    train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model; of several "
+                       "the folder of these")
     add_quarn(train)
     train.add_argument("--quiet", action="store_true", help="only errors")
     train.add_argument("--json", action="store_true", help="write the report to standard output as well")
@@ -118,6 +122,20 @@ def command_train(options: argparse.Namespace) -> int:
     if not 0 <= options.seed < 2**32:
         raise TrainerError(f"--seed is {options.seed}, not a whole number from 0 to {2**32 - 1}")
     pin_threads(options.threads)
+    from . import folders
+
+    below = folders.sets_below(options.dataset)
+    if below:
+        return train_all(options, folders.works_of(options.dataset, below))
+    result = train_one(options, options.dataset, lambda settings: output_path(options, settings), options.report)
+    if options.json:
+        print(json.dumps(result, indent=1))
+    return INTERRUPTED if result["interrupted"] else 0
+
+
+def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: Callable[["Settings"], Path],
+              wanted_report: Optional[str]) -> dict[str, Any]:
+    """Trains the model of a data set. Returns its report."""
     from . import evaluator, pipeline
     from .dataset import load_dataset
     from .measure import advice, as_lines
@@ -125,19 +143,64 @@ def command_train(options: argparse.Namespace) -> int:
 
     say = speaker(options)
     quarn = evaluator.find_quarn(options.quarn)
-    dataset = load_dataset(options.dataset)
+    dataset = load_dataset(folder)
     changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
     settings = override(dataset.settings, changes, lambda name: SETTING_FLAGS.get(name, name))
-    model = output_path(options, settings)
-    report = Path(options.report) if options.report else model.with_suffix(".report")
+    model = model_of(settings)
+    report = Path(wanted_report) if wanted_report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
                                          not options.quiet))
     for line in [*as_lines(result["errors"]), *advice(result["errors"], result["explained"], settings)]:
         say(line)
     say(f"wrote {model} and {report}")
+    return result
+
+
+def train_all(options: argparse.Namespace, works: "list[Work]") -> int:
+    """Trains a model of each; what fails does not keep the others from it, and is an error at the end."""
+    from . import evaluator, folders
+
+    evaluator.find_quarn(options.quarn)  # where there is none of that name, it is missing for all
+    place = Path(options.output or "models")
+    if place.suffix == ".nwrp":
+        raise TrainerError(f"-o {place} is one model, and {options.dataset} has {len(works)} data sets: give the "
+                           "folder that their models go to")
+    say = speaker(options)
+    lines, results, failed = [], [], []
+    for number, work in enumerate(works, 1):
+        say(f"{work.label}, {number} of {len(works)}")
+        try:
+            result = train_work(options, work, place)
+            lines.append(folders.summary(work.label, result["errors"], place / f"{work.name}.nwrp"))
+        except (TrainerError, OSError, MemoryError) as error:
+            why = str(error) if isinstance(error, TrainerError) else reason_of(error)
+            result = {"dataSet": work.label, "error": why, "interrupted": False}
+            failed.append(work.label)
+            lines.append(f"{work.label}: failed, as {why}")
+        results.append(result)
+        if result["interrupted"]:
+            lines += [f"{other.label}: not begun" for other in works[number:]]
+            break
+    for line in lines:
+        say(line)
     if options.json:
-        print(json.dumps(result, indent=1))
-    return INTERRUPTED if result["interrupted"] else 0
+        print(json.dumps(results, indent=1))
+    if results[-1]["interrupted"]:
+        return INTERRUPTED
+    if failed:
+        whys = "".join(f"; {one['dataSet']}: {one['error']}" for one in results if "error" in one)
+        raise TrainerError(f"{len(failed)} of {len(works)} data sets became no model{whys}")
+    return 0
+
+
+def train_work(options: argparse.Namespace, work: "Work", place: Path) -> dict[str, Any]:
+    from .files import model_path
+
+    if work.name is None:
+        raise TrainerError(work.why)
+    model = model_path(str(place / f"{work.name}.nwrp"))
+    report = str(Path(options.report) / work.name) if options.report else None
+    return {**train_one(options, work.folder, lambda settings: model, report), "dataSet": work.label}
 
 
 def pin_threads(count: int) -> None:

@@ -6,6 +6,7 @@ import json
 import os
 import random
 import resource
+import shutil
 import signal
 import stat
 import subprocess
@@ -160,6 +161,32 @@ class CommandTest(unittest.TestCase):
             said = " ".join(self.run_trainer(*command, "--help")[0].split())
             for name in KINDS:
                 self.assertTrue(name == "outputModelName" or described(name) in said, (command, name))
+
+    def test_every_data_set_below_a_folder(self) -> None:
+        """A model each, under the names that the deformer has for them; one that fails keeps no other from it."""
+        sets: dict[str, dict[str, Any]] = {"all/face/set": {"outputModelName": "head"}, "all/body": {},
+                                           "all/arm": {"outputModelName": ""}, "all/old.part": {}}
+        for place, train in sets.items():
+            synthetic.make(self.place / place, frames=60, geometry="limb", train={"epochs": 4, **train})
+        (self.place / "all/body/deltas.npy").unlink()
+        every = ("train", "all", "-o", "m", "--quarn", "none")
+        error = self.refused(*every, "--quiet")
+        self.assertRegex(error, r"1 of 3 data sets became no model; body: .*deltas\.npy")
+        written = ["head.nwrp", "head.report", "limb.nwrp", "limb.report"]
+        self.assertEqual(sorted(os.listdir(self.place / "m")), written)
+        together = self.digest("head.nwrp")
+        self.run_trainer("train", "all/face/set", "-o", "m/head", "--quarn", "none")
+        self.assertEqual(self.digest("head.nwrp"), together)
+
+        synthetic.make(self.place / "all/body/again", frames=60, train={"outputModelName": "head"})
+        (self.place / "all/body/dataset.json").unlink()
+        self.assertIn("body/again and face/set in all would both become head.nwrp", self.refused(*every))
+        shutil.rmtree(self.place / "all/body")
+        out, err = self.run_trainer(*every, "--json", "--report", "reports")
+        self.assertEqual([one["dataSet"] for one in json.loads(out)], ["arm", "face/set"])
+        self.assertRegex(err, r"(?s)arm, 1 of 2\n.*face/set: [\d.]+ mm in the mean without m/head\.nwrp, [\d.]+ mm")
+        self.assertEqual(sorted(os.listdir(self.place / "reports")), ["head", "limb"])
+        self.assertIn("-o m/x.nwrp is one model, and all has 2", self.refused("train", "all", "-o", "m/x.nwrp"))
 
     def test_zero_model_and_evaluation(self) -> None:
         self.run_trainer("zero", "data", "-o", "m/zero")
