@@ -90,7 +90,8 @@ void addExportCommand(CLI::App& app) {
                      "trainingDataName of the deformer]")
         ->type_name("FOLDER");
     command->add_option("--deformer", options->deformer, "The deformer [the only one]")->type_name("NAME");
-    command->add_option("--geometry", options->geometry, "One of its geometries [all]")->type_name("INDEX|NAME");
+    command->add_option("--geometry", options->geometry, "One of its geometries [all that have a target]")
+        ->type_name("INDEX|NAME");
     command->add_option("--frames", options->frames, "[exportStartFrame to exportEndFrame of the deformer]")
         ->type_name("A-B[xS]");
     command->add_flag("--controls-only", options->controlsOnly,

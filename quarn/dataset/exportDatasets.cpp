@@ -22,10 +22,23 @@ namespace {
 
 namespace fs = std::filesystem;
 
-std::vector<WarpGeometry> chosenGeometries(const Warp& warp, const std::string& choice) {
-    if (choice.empty() && warp.geometries.size() > 1)
-        return warp.geometries;
-    return {warp.geometry(choice)};
+// all that have a target; one alone is said to lack it by who reads it
+std::vector<WarpGeometry> chosenGeometries(const Warp& warp, const ExportOptions& options) {
+    if (!options.geometry.empty() || warp.geometries.size() < 2)
+        return {warp.geometry(options.geometry)};
+    std::vector<WarpGeometry> chosen;
+    std::string others;
+    for (const WarpGeometry& geometry : warp.geometries)
+        if (geometry.target.isNull())
+            others += (others.empty() ? "" : ", ") + geometry.name;
+        else
+            chosen.push_back(geometry);
+    if (chosen.empty())
+        throw std::runtime_error("none of the geometries of " + warp.name + " has a target (" + others +
+                                 "); quarn target SCENE --cache FILE.npy --geometry NAME connects one");
+    if (!others.empty())
+        options.console.note("without target, and not exported: " + others);
+    return chosen;
 }
 
 fs::path folderByScene(const Warp& warp, const WarpGeometry& geometry) {
@@ -50,9 +63,9 @@ std::vector<fs::path> foldersOf(const Warp& warp, const std::vector<WarpGeometry
     folders.reserve(geometries.size());
     for (const WarpGeometry& geometry : geometries) {
         const fs::path output = absolutePath(options.output);
-        fs::path folder = output.empty()           ? folderByScene(warp, geometry)
-                          : geometries.size() == 1 ? output
-                                                   : output / geometry.name;
+        // where one of several is left out, the others' places stay
+        const bool isOnly = !options.geometry.empty() || warp.geometries.size() == 1;
+        fs::path folder = output.empty() ? folderByScene(warp, geometry) : isOnly ? output : output / geometry.name;
         folder = folder.lexically_normal();
         const std::string label = geometry.name + " (" + std::to_string(geometry.index) + ")";
         if (const auto [other, isNew] = taken.emplace(folder, label); !isNew)
@@ -249,7 +262,7 @@ private:
 std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
     SceneSession session(options.scene);
     const Warp warp = Warp::find(options.deformer);
-    const std::vector<WarpGeometry> geometries = chosenGeometries(warp, options.geometry);
+    const std::vector<WarpGeometry> geometries = chosenGeometries(warp, options);
     const std::vector<fs::path> folders = foldersOf(warp, geometries, options);
     std::vector<ExportAnswer> answers;
     answers.reserve(geometries.size());

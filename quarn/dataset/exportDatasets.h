@@ -20,7 +20,7 @@ struct ExportOptions {
     SceneOptions scene;
     std::filesystem::path output; ///< of the one geometry, or the folder of the folders of several; empty: by the scene
     std::string deformer;         ///< empty: the only one
-    std::string geometry;         ///< index or name; empty: all of them
+    std::string geometry;         ///< index or name; empty: all of them that have a target
     std::string frames;           ///< as frameRange() reads them; empty: exportStartFrame to exportEndFrame
     bool overwrite = false;
     bool anyway = false; ///< a target that does not fit the skin is exported as well
@@ -41,7 +41,8 @@ struct ExportAnswer {
     std::uintmax_t bytes = 0;
 };
 
-/// Opens the scene and writes a complete data set for each geometry. Rows that an earlier run of the same set-up has
+/// Opens the scene and writes a complete data set for each geometry; of several those without target are noted and left
+/// out. Rows that an earlier run of the same set-up has
 /// left in FOLDER.part are gone on from; docs/dataset.md says when they are not. Whatever ends it early, an error or
 /// Ctrl-C, leaves FOLDER as it was. Errors are std::runtime_error with the sentence for the user. Thread: main.
 std::vector<ExportAnswer> exportDatasets(const ExportOptions& options);

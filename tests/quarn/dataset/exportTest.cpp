@@ -181,7 +181,24 @@ connectAttr strip_target.outMesh warp.targetGeometry[4]
     quarn::exportDatasets(flags);
     EXPECT_EQ(contentsOf(flags.output), contentsOf(folder.path() / "both" / "sleeve"));
 
-    save(3, "connectAttr strip.outMesh warp.input[1].inputGeometry");
+    // one without target is left out, and moves nobody
+    save(3, R"(
+duplicate strip -name hat
+connectAttr hat.outMesh warp.input[1].inputGeometry
+)");
+    flags.geometry.clear();
+    flags.output = folder.path() / "left";
+    flags.console.quiet = false;
+    testing::internal::CaptureStderr();
+    EXPECT_EQ(quarn::exportDatasets(flags).size(), 1U);
+    EXPECT_THAT(testing::internal::GetCapturedStderr(), HasSubstr("without target, and not exported: hat"));
+    EXPECT_EQ(contentsOf(flags.output / "strip").at("deltas.npy"), contentsOf(data()).at("deltas.npy"));
+    save(3, "connectAttr strip.outMesh warp.input[1].inputGeometry; disconnectAttr strip_target.outMesh "
+            "warp.targetGeometry[0]");
+    EXPECT_THAT(errorOf(options()), HasSubstr("none of the geometries of warp has a target (strip, strip)"));
+
+    save(3, "connectAttr strip.outMesh warp.input[1].inputGeometry\n"
+            "connectAttr strip_target.outMesh warp.targetGeometry[1]");
     EXPECT_THAT(errorOf(options()), HasSubstr("strip (0) and strip (1) would both be exported to"));
 }
 
