@@ -51,6 +51,15 @@ std::string differenceOf(const Sums& now, const Sums& before, const char* what) 
     return {};
 }
 
+// an input that was an output before, and other than it is now; or nothing
+std::string editedBetween(const Sums& outputs, const Sums& inputs) {
+    const auto found = std::find_if(inputs.begin(), inputs.end(), [&](const auto& input) {
+        const auto made = outputs.find(input.first);
+        return made != outputs.end() && made->second != input.second;
+    });
+    return found == inputs.end() ? std::string() : found->first;
+}
+
 // the file that an argument names by its whole path, also as "--flag=FILE"; or nothing
 std::string fileOf(const std::string& word) {
     const std::size_t begin = word.rfind('/', 0) == 0 ? 0 : word.find("=/") + 1;
@@ -212,6 +221,8 @@ std::string Ledger::whyToDo(const Step& step, const std::string& version) {
     const Entry now = entryOf(step, version);
     if (now.version != before.version)
         return "its program is " + now.version + ", was " + before.version;
+    if (const std::string file = editedBetween(before.outputs, now.inputs); !file.empty())
+        return file + ", which it had made, was edited, and is taken as it is";
     if (now.words != before.words)
         return "its arguments are others: " + differenceOf(now.words, before.words);
     if (std::string difference = differenceOf(now.inputs, before.inputs, "its input"); !difference.empty())
@@ -243,6 +254,15 @@ void Ledger::finish(const Step& step) {
         }
     }
     save();
+}
+
+bool Ledger::isForeign(const fs::path& file) {
+    const std::string sum = sums_.of(file);
+    return !sum.empty() && std::none_of(entries_.begin(), entries_.end(), [&](const auto& labelled) {
+        const Sums& outputs = labelled.second.outputs;
+        const auto found = outputs.find(file.string());
+        return found != outputs.end() && found->second == sum;
+    });
 }
 
 std::string Ledger::digestOf(const Step& step, const std::string& version) {

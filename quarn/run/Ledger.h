@@ -23,6 +23,8 @@ public:
     void begin(const Step& step, const std::string& version);
     /// That it is done. Throws when an output is missing.
     void finish(const Step& step);
+    /// Whether there is such a file in the folder, and no step that is done has left it as it is.
+    bool isForeign(const std::filesystem::path& file);
     /// Of a step's arguments, inputs and version: another one for another result.
     std::string digestOf(const Step& step, const std::string& version);
 

@@ -10,9 +10,9 @@
 
 namespace quarn {
 
-/// A mesh that has a skin, in the order of the deformer's geometries.
+/// A geometry of the deformer, in the order of these.
 struct MeshFacts {
-    std::string name, skin;       ///< nodes
+    std::string name, skin;       ///< nodes: the mesh, and what moves it
     std::size_t vertices = 0;     ///< of the scene
     std::size_t fileVertices = 0; ///< before they were joined
 };
@@ -38,12 +38,14 @@ struct RunFacts {
     std::optional<CharacterFacts> character;
     std::optional<FrameSpan> poses, motion;
     std::map<std::string, TargetFacts> targets; ///< by answerFile()
+    bool areLimitsEdited = false;               ///< the run's own limits.json is not as the import has left it
 };
 
 /// Where the answer of a step lies in the run's folder; `mesh` as in Step, or empty.
 std::filesystem::path answerFile(const std::string& step, const std::string& mesh = {});
 
-/// As far as answers are in the folder. One that cannot be read counts as none: its step is done again for that.
+/// As far as answers are in the folder; without `areLimitsEdited`. One that cannot be read counts as none: its step is
+/// done again for that.
 RunFacts readFacts(const std::filesystem::path& folder);
 
 } // namespace quarn

@@ -76,6 +76,12 @@ RunFolder::RunFolder(const RunSettings& settings, const fs::path& folder, const 
     , console_(console)
     , ledger_((requireOwn(folder), folder)) {}
 
+RunFacts RunFolder::known() {
+    RunFacts all = facts();
+    all.areLimitsEdited = ledger_.isForeign(limitsFile);
+    return all;
+}
+
 const FoundProgram& RunFolder::program(const Step& step) {
     const auto found = programs_.find(step.program);
     if (found != programs_.end())
@@ -100,6 +106,8 @@ void RunFolder::prepare(const Step& step) const {
     for (const fs::path& output : step.outputs)
         storage::makeFolders((folder_ / output).parent_path(), folder_ / output);
     std::error_code error;
+    for (const fs::path& file : step.replaced)
+        fs::remove(folder_ / file, error);
     fs::remove(logOf(step), error);
 }
 
@@ -185,7 +193,7 @@ std::vector<StepState> RunFolder::run(const std::string& until) {
     std::vector<StepState> states;
     for (;;) {
         // with what the last step has answered
-        const Plan plan = planOf(settings_, facts());
+        const Plan plan = planOf(settings_, known());
         if (states.size() >= countUntil(plan, until))
             return states;
         throwIfInterrupted();
@@ -200,7 +208,7 @@ std::vector<StepState> RunFolder::run(const std::string& until) {
 }
 
 std::vector<StepState> RunFolder::explain(const std::string& until) {
-    const Plan plan = planOf(settings_, facts());
+    const Plan plan = planOf(settings_, known());
     std::vector<StepState> states;
     std::set<fs::path> changing;
     for (std::size_t i = 0; i < countUntil(plan, until); ++i) {

@@ -36,6 +36,7 @@ public:
     const std::filesystem::path& path() const { return folder_; }
 
 private:
+    RunFacts known();
     const FoundProgram& program(const Step& step);
     std::string versionOf(const Step& step);
     std::filesystem::path logOf(const Step& step) const;

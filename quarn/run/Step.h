@@ -35,7 +35,8 @@ struct Step {
     Program program = Program::quarn;
     Words words; ///< behind the program; of a target command all of them
     std::vector<std::filesystem::path> inputs;
-    std::vector<std::filesystem::path> outputs; ///< files, or folders of files
+    std::vector<std::filesystem::path> outputs;  ///< files, or folders of files
+    std::vector<std::filesystem::path> replaced; ///< of these, those that it would not write over: removed before
     std::filesystem::path answer;               ///< where its standard output goes, one of `outputs`; empty for the log
     std::optional<TargetRequest> request;       ///< of a target command
     std::map<std::string, std::string> written; ///< texts that it reads, by the names of their files: written before

@@ -32,6 +32,21 @@ std::int64_t heldOutOf(const RunSettings& settings, std::int64_t all) {
     return settings.motion.empty() ? settings.heldOut.value_or(std::max(leastHeldOut, all / 10)) : 0;
 }
 
+// without these flags and their values, as "--flag" "VALUE" or "--flag=VALUE"
+Words withoutFlags(const Words& words, const Words& flags) {
+    const auto isFlag = [&](const std::string& word) {
+        return std::find(flags.begin(), flags.end(), word) != flags.end();
+    };
+    Words kept;
+    for (auto word = words.begin(); word != words.end(); ++word) {
+        if (isFlag(*word))
+            word += word + 1 == words.end() ? 0 : 1;
+        else if (!isFlag(word->substr(0, word->find('='))))
+            kept.push_back(*word);
+    }
+    return kept;
+}
+
 // of one mesh: whole paths by its name, or one without a name that is for the only mesh there is
 std::map<std::string, fs::path> filesByMesh(const Words& targets, const CharacterFacts& character) {
     Words names;
@@ -45,8 +60,8 @@ std::map<std::string, fs::path> filesByMesh(const Words& targets, const Characte
             throw std::runtime_error("the character has several meshes, " + joined(names) + ": whose targets are in " +
                                      word + "? Give them as MESH=FILE");
         if (std::find(names.begin(), names.end(), mesh) == names.end())
-            throw std::runtime_error("there are targets of \"" + mesh + "\", and no mesh of that name that has a " +
-                                     "skin; there is " + joined(names));
+            throw std::runtime_error("there are targets of \"" + mesh + "\", and no mesh of that name that " +
+                                     "something moves; there is " + joined(names));
         if (!files.emplace(mesh, equals == std::string::npos ? word : word.substr(equals + 1)).second)
             throw std::runtime_error("there are two files with targets of " + mesh);
     }
@@ -111,6 +126,7 @@ private:
                   std::move(outputs),
                   {},
                   {},
+                  {},
                   {}};
         plan_.push_back(std::move(step));
         return plan_.back();
@@ -137,10 +153,15 @@ private:
                                   {"import", settings_.character.string(), "-o", "character.json", "--neural-warp"},
                                   characterFiles(settings_.character), {"character.json"});
         appendFile(step, "--parents", settings_.parents);
+        if (facts_.areLimitsEdited && settings_.limits.empty()) {
+            appendFile(step, "--limits", limitsFile);
+            return append(step.words, withoutFlags(settings_.importOptions, {"--limits-from", "--limits-margin"}));
+        }
         appendFile(step, "--limits", settings_.limits);
-        if (settings_.limits.empty()) { // to be edited, and given the next time
-            append(step.words, {"--write-limits", "limits.json"});
-            step.outputs.emplace_back("limits.json");
+        if (settings_.limits.empty()) {
+            append(step.words, {"--write-limits", limitsFile});
+            step.outputs.emplace_back(limitsFile);
+            step.replaced.emplace_back(limitsFile);
         }
         append(step.words, settings_.importOptions);
     }
@@ -148,7 +169,7 @@ private:
     void requireMeshes() const {
         if (facts_.character->meshes.empty())
             throw std::runtime_error(settings_.character.string() +
-                                     " has no mesh with a skin: there is nothing to pose");
+                                     " has no mesh that joints or weights move: there is nothing to pose");
         if (settings_.hasTargets())
             static_cast<void>(chooseMeshes(settings_, *facts_.character));
     }

@@ -25,6 +25,9 @@ MeshChoice chooseMeshes(const RunSettings& settings, const CharacterFacts& chara
 /// The frames that nobody trains, at the end of the poses. Throws std::runtime_error when too few others are left.
 FrameSpan heldOutFrames(const RunSettings& settings, const FrameSpan& poses);
 
+/// In the run's folder, where no other limits are given: those that the import has taken, to be edited.
+constexpr const char* limitsFile = "limits.json";
+
 /// Texts of names of files and frames, as the steps have them.
 std::string framesText(const FrameSpan& span);
 std::filesystem::path skinFile(const std::string& scene, const std::string& mesh);

@@ -151,7 +151,7 @@ TEST(Plan, RefusesTargetsThatAreNobodys) {
     for (const Row& row : {Row{{"arm", "eye"}, {"/a.npy"}, "several meshes, arm, eye: whose targets are in /a.npy"},
                            Row{{"arm"}, {"leg=/a.npy"}, "targets of \"leg\", and no mesh of that name"},
                            Row{{"arm"}, {"arm=/a.npy", "/b.npy"}, "two files with targets of arm"},
-                           Row{{}, {"/a.npy"}, "/rigs/arm.glb has no mesh with a skin"}}) {
+                           Row{{}, {"/a.npy"}, "/rigs/arm.glb has no mesh that joints or weights move"}}) {
         const RunSettings settings = settingsWith([&](RunSettings& s) { s.targets = row.targets; });
         EXPECT_THAT(failureOf([&] { planOf(settings, factsOf(row.meshes)); }), HasSubstr(row.sentence));
     }

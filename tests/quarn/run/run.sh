@@ -82,6 +82,23 @@ expect 0 '' '^targets .*\n7 of 8' run bone.gltf -o made --until held-out "${with
 mv made moved
 expect 0 '' '^8 of 8 steps were done already\n$' run bone.gltf -o moved --until held-out "${with_targets[@]}"
 
+# --- limits: the run's own until somebody edits them, and then taken as they are, until they are gone ---
+limited=(run bone.gltf -o limited --until poses --import-option=--with-roots --samples 6)
+wider=("${limited[@]}" --import-option=--limits-margin=0.5)
+turns() { "$quarn" info limited/character.json --joints | grep -o 'rotateZ [^;]*'; }
+expect 0 '' '\nposes' "${limited[@]}"
+expect 0 '' '^import .*\n' "${wider[@]}" # what it has written is in nobody's way
+sed -i 's/-270\.0/-12.5.5/' limited/limits.json
+expect 0 'import: to do, as limits\.json, which it had made, was edited' '' "${wider[@]}" --explain
+expect 1 '' 'limits\.json: line' "${wider[@]}"
+sed -i 's/12\.5\.5/12.5/' limited/limits.json
+expect 0 '' '^import .*\n(.*\n)*poses' "${wider[@]}"
+[[ $(turns) == 'rotateZ -12.5 to 90 degrees' ]] || fail "not the limits that were edited: $(turns)"
+expect 0 '' '^2 of 2 steps were done already' "${wider[@]}"
+rm limited/limits.json
+expect 0 '' '^import .*\n(.*\n)*poses' "${limited[@]}"
+[[ $(turns) == 'rotateZ -180 to 0 degrees' && -s limited/limits.json ]] || fail "not its own limits: $(turns)"
+
 # --- targets in a file, from a recipe ---
 mkdir recipes
 cat >recipes/bone.json <<'RECIPE'
