@@ -17,6 +17,9 @@ struct SceneMesh {
     HObject mesh;
     MorphNodes morphs; ///< between mesh and skin
     HObject skin;      ///< null for a mesh that no joint moves
+
+    /// The last of the nodes that move it, whose outputGeom[0] it is in motion; null where nothing does.
+    HObject mover() const { return skin.isNull() ? morphs.shapes : skin; }
 };
 
 struct CharacterScene {

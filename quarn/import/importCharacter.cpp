@@ -102,15 +102,18 @@ public:
         const PosedJoints posed = options_.neuralWarp ? choose(rests, animation) : PosedJoints();
 
         SceneSession session(options_.plugins);
-        const WarpNodes nodes = options_.neuralWarp ? makeWarpNodes(options_.warp) : WarpNodes();
+        const WarpNodes nodes = options_.neuralWarp ? makeWarpNodes(options_.warp, !posed.joints.empty()) : WarpNodes();
         CharacterScene scene = buildScene(character_, rests);
         append(report_.warnings, std::move(scene.notes));
         if (animation != nullptr && !options_.noAnimation)
             report_.curves = addAnimation(character_, *animation, rests, options_.framesPerSecond, scene);
-        if (options_.neuralWarp)
-            connectWarp(nodes, settings(animation), posed.joints, scene);
-        tellWhatThereIs(scene, posed);
-        writeLimits(posed);
+        const PosedSliders sliders = hasMorphControls() ? chooseSliders(scene, animation) : PosedSliders();
+        if (options_.neuralWarp) {
+            requireControls(posed, sliders);
+            connectWarp(nodes, settings(animation), posed.joints, sliders, scene);
+        }
+        tellWhatThereIs(scene, posed, sliders);
+        writeLimits(posed, sliders);
         writeFiles(session, scene);
         return std::move(report_);
     }
@@ -131,7 +134,7 @@ private:
         if (!options_.limits.empty())
             limits_ = readLimits(options_.limits);
         if (options_.neuralWarp)
-            requireSkin();
+            requireMover();
     }
 
     const Animation* layAnimations() {
@@ -142,20 +145,23 @@ private:
         return &clips_.animation;
     }
 
+    bool hasMorphControls() const { return options_.neuralWarp && options_.morphControls; }
+
     // a file of plain meshes, say: what it has, and what is missing
-    void requireSkin() const {
+    void requireMover() const {
         std::string meshes;
         for (const CharacterMesh& mesh : character_.meshes) {
-            if (!mesh.bindings.empty() || mesh.parentJoint >= 0)
+            if (!mesh.bindings.empty() || mesh.parentJoint >= 0 || (hasMorphControls() && !mesh.morphTargets.empty()))
                 return;
             meshes +=
                 (meshes.empty() ? "" : ", ") + mesh.name + " of " + std::to_string(mesh.points.size()) + " vertices";
         }
-        throw std::runtime_error(options_.file.string() + " has meshes (" + meshes + "), " +
-                                 std::to_string(character_.joints.size()) + " joints, " +
-                                 std::to_string(character_.animations.size()) +
-                                 " animations, and no skin: --neural-warp needs a mesh that joints move. Bind it to a "
-                                 "skeleton in the program that it comes from, or import it without --neural-warp");
+        throw std::runtime_error(
+            options_.file.string() + " has meshes (" + meshes + "), " + std::to_string(character_.joints.size()) +
+            " joints, " + std::to_string(character_.animations.size()) +
+            " animations, and no skin and no morph targets" + (options_.morphControls ? "" : " that are controls") +
+            ": --neural-warp needs a mesh that joints or weights move. Bind it to a skeleton in "
+            "the program that it comes from, or import it without --neural-warp");
     }
 
     // what was said of the roots of the file is no longer so
@@ -176,25 +182,52 @@ private:
     }
 
     PosedJoints choose(const std::vector<JointRest>& rests, const Animation* animation) {
-        const LimitMap* limits = options_.limits.empty() ? nullptr : &limits_;
-        PoseChoice choice{limits, {}, options_.framesPerSecond, options_.withRoots, options_.limitsMargin};
-        if (animation != nullptr)
-            choice.animations = {animation};
-        if (options_.limitsFromAll)
-            choice.animations = allAnimations(character_);
+        const LimitMap* limits = options_.limits.empty() ? nullptr : &limits_.joints;
+        PoseChoice choice{limits, limitingAnimations(animation), options_.framesPerSecond, options_.withRoots,
+                          options_.limitsMargin};
+        choice.hasOthers = options_.morphControls && moveWeights(choice.animations);
         PosedJoints posed = choosePosedJoints(character_, rests, choice);
-        report_.notes = posed.notes;
+        append(report_.notes, std::exchange(posed.notes, {}));
+        if (options_.limits.empty() && options_.noAnimation && !choice.animations.empty())
+            report_.notes.emplace_back("--no-animation leaves the animation out of the scene, and limits of the poses "
+                                       "come from it all the same: --limits-from none leaves it out of these, too");
         for (const PosedJoint& joint : posed.joints)
             report_.poseInputs += static_cast<std::size_t>(std::count_if(
                 joint.limits.begin(), joint.limits.end(), [](const auto& axis) { return axis.has_value(); }));
         return posed;
     }
 
-    void tellWhatThereIs(const CharacterScene& scene, const PosedJoints& posed) {
+    std::vector<const Animation*> limitingAnimations(const Animation* taken) const {
+        if (options_.limitsFrom == LimitsFrom::all)
+            return allAnimations(character_);
+        if (options_.limitsFrom == LimitsFrom::none || taken == nullptr)
+            return {};
+        return {taken};
+    }
+
+    PosedSliders chooseSliders(const CharacterScene& scene, const Animation* animation) {
+        const SliderLimitMap* limits = options_.limits.empty() ? nullptr : &limits_.sliders;
+        PosedSliders posed = choosePosedSliders(character_, scene, limits, limitingAnimations(animation));
+        append(report_.notes, std::exchange(posed.notes, {}));
+        report_.poseWeights = posed.sliders.size();
+        return posed;
+    }
+
+    // limits that nothing becomes of would be lost in silence
+    void requireControls(const PosedJoints& joints, const PosedSliders& sliders) const {
+        if (!options_.morphControls && !limits_.sliders.empty())
+            throw std::runtime_error(options_.limits.string() + " limits the slider \"" +
+                                     limits_.sliders.begin()->first + "\", and --no-morph-controls leaves it out");
+        if (joints.joints.empty() && sliders.sliders.empty())
+            throw std::runtime_error("no joint is left whose turning the deformer could learn from, and no morph "
+                                     "target whose weight is a control");
+    }
+
+    void tellWhatThereIs(const CharacterScene& scene, const PosedJoints& posed, const PosedSliders& sliders) {
         report_.scene = options_.output.string();
         report_.metersPerUnit = character_.metersPerUnit;
         for (std::size_t i = 0; i < character_.meshes.size(); ++i)
-            tellMesh(character_.meshes[i], scene.meshes[i]);
+            tellMesh(character_.meshes[i], scene.meshes[i], isDeformed(scene, i, sliders));
         for (std::size_t i = 0; i < character_.joints.size(); ++i)
             report_.joints.push_back({character_.joints[i].name, nodeName(scene.joints[i]), false});
         for (const PosedJoint& joint : posed.joints)
@@ -211,24 +244,27 @@ private:
         report_.animations.push_back(told);
     }
 
-    void tellMesh(const CharacterMesh& mesh, const SceneMesh& made) {
+    void tellMesh(const CharacterMesh& mesh, const SceneMesh& made, bool isMoved) {
         const std::string node = nodeName(made.mesh);
         const fs::path map = mapFile(options_.output, node, character_.meshes.size());
-        report_.meshes.push_back({mesh.name, node, made.skin.isNull() ? "" : nodeName(made.skin), mesh.joinedOf.size(),
+        report_.meshes.push_back({mesh.name, node, isMoved ? nodeName(made.mover()) : "", mesh.joinedOf.size(),
                                   nameOf(mesh.fileOrder), mesh.points.size(), mesh.polygonSizes.size(),
                                   mesh.bindings.size(), mesh.morphTargets.size(), map.filename().string()});
-        if (made.skin.isNull() && options_.neuralWarp)
+        if (!isMoved && options_.neuralWarp)
             report_.notes.push_back("the mesh \"" + mesh.name +
-                                    "\" follows no joint and is no geometry of the deformer");
+                                    "\" follows no joint and no weight, and is no geometry of the deformer");
     }
 
-    void writeLimits(const PosedJoints& posed) const {
+    void writeLimits(const PosedJoints& posed, const PosedSliders& sliders) const {
         if (options_.writtenLimits.empty())
             return;
         std::vector<std::pair<std::string, JointLimits>> joints;
         for (const PosedJoint& joint : posed.joints)
             joints.emplace_back(character_.joints[joint.joint].name, joint.limits);
-        const std::string text = limitsText(joints);
+        std::vector<std::pair<std::string, ValueRange>> weights;
+        for (const PosedSlider& slider : sliders.sliders)
+            weights.emplace_back(slider.name, slider.limits);
+        const std::string text = limitsText(joints, weights);
         requireUnedited(options_.writtenLimits, text);
         storage::writeWhole(options_.writtenLimits, text);
     }
@@ -265,7 +301,7 @@ private:
     const ImportOptions& options_;
     Character character_;
     Clips clips_;
-    LimitMap limits_;
+    PoseLimits limits_;
     ImportReport report_;
 };
 

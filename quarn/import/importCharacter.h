@@ -12,6 +12,9 @@
 
 namespace quarn {
 
+/// Whose range limits of poses are: the animations' that are taken, those of all in the file, or of none.
+enum class LimitsFrom { animation, all, none };
+
 /// What the user has said.
 struct ImportOptions {
     std::filesystem::path file;
@@ -23,10 +26,11 @@ struct ImportOptions {
     std::optional<double> metersPerUnit;
     bool neuralWarp = false;
     WarpSettings warp;
-    std::filesystem::path limits;        ///< see readLimits(); empty for none
-    bool limitsFromAll = false;          ///< without those: of all animations of the file, not of the one that is taken
-    double limitsMargin = 0.0;           ///< of these, see PoseChoice::margin
-    std::filesystem::path writtenLimits; ///< where the limits go, to be edited; empty for nowhere
+    bool morphControls = true;                     ///< weights of morph targets are controls
+    std::filesystem::path limits;                  ///< see readLimits(); empty for none
+    LimitsFrom limitsFrom = LimitsFrom::animation; ///< without those
+    double limitsMargin = 0.0;                     ///< of these, see PoseChoice::margin
+    std::filesystem::path writtenLimits;           ///< where the limits go, to be edited; empty for nowhere
     bool withRoots = false;
     std::vector<std::string> plugins;
 };
@@ -36,7 +40,7 @@ struct ImportReport {
     struct Mesh {
         std::string name;
         std::string node;
-        std::string skin; ///< empty for a mesh that nothing moves
+        std::string skin; ///< what moves it: a skin, or the shapes of a geometry that has none; empty for none of both
         std::size_t fileVertices = 0;
         std::string fileOrder;    ///< what these are: nameOf(FileOrder)
         std::size_t vertices = 0; ///< after joining
@@ -62,7 +66,8 @@ struct ImportReport {
     std::vector<Joint> joints;
     std::vector<Animation> animations;
     std::size_t curves = 0;
-    std::size_t poseInputs = 0; ///< angles that sampling sets; 0 without a deformer
+    std::size_t poseInputs = 0;  ///< angles that sampling sets; 0 without a deformer
+    std::size_t poseWeights = 0; ///< weights of morph targets, likewise
     double metersPerUnit = 1.0;
     std::vector<std::string> warnings; ///< sentences without a full stop
     std::vector<std::string> notes;    ///< the same

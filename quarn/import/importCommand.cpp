@@ -14,7 +14,7 @@ namespace quarn {
 namespace {
 
 struct Options : ImportOptions {
-    std::string limitsFrom = "animation";
+    std::string limitsOf = "animation";
     Console console;
 };
 
@@ -47,18 +47,20 @@ void addWarpFlags(CLI::App& command, Options& options) {
     };
     add("--controls", options.warp.controls, "double-axis (default), ortho, quaternion or euler")
         ->check(CLI::IsMember({"double-axis", "ortho", "quaternion", "euler"}));
-    add("--limits", options.limits, "JSON: {\"joint\": {\"rotateX\": [least, largest], ...}}, in degrees")
+    add("--limits", options.limits,
+        "JSON: {\"joint\": {\"rotateX\": [least, largest], ...}, \"slider\": [least, largest]}, in degrees")
         ->type_name("FILE");
-
-    add("--limits-from", options.limitsFrom,
-        "Without --limits: those of the animation that is taken (default), or of all")
-        ->check(CLI::IsMember({"animation", "all"}))
+    add("--limits-from", options.limitsOf,
+        "Without --limits: those of the animation that is taken (default), of all, or of none")
+        ->check(CLI::IsMember({"animation", "all", "none"}))
         ->excludes("--limits");
     add("--limits-margin", options.limitsMargin, "More on both sides of what animations do, in parts of the range")
         ->check(CLI::Range(0.0, 10.0))
         ->excludes("--limits");
     add("--write-limits", options.writtenLimits, "Write the limits as a file for --limits, to be edited")
         ->type_name("FILE");
+    flags.add_flag("!--no-morph-controls", options.morphControls, "No controls of the weights of morph targets")
+        ->needs(warp);
     flags.add_flag("--with-roots", options.withRoots, "Controls also of the joints that place the character")
         ->needs(warp);
     add("--samples", options.warp.samples, "Poses to sample")->check(CLI::Range(1, std::numeric_limits<int>::max()));
@@ -78,7 +80,9 @@ void requireAbove0(const char* flag, double value) {
 }
 
 void execute(Options& options) {
-    options.limitsFromAll = options.limitsFrom == "all";
+    options.limitsFrom = options.limitsOf == "all"    ? LimitsFrom::all
+                         : options.limitsOf == "none" ? LimitsFrom::none
+                                                      : LimitsFrom::animation;
     requireAbove0("--fps", options.framesPerSecond);
     requireAbove0("--meters-per-unit", options.metersPerUnit.value_or(1.0));
     const ImportReport report = importCharacter(options);

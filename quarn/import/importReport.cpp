@@ -60,6 +60,14 @@ std::string morphText(const ImportReport::Mesh& mesh) {
     return mesh.morphTargets == 0 ? "" : ", " + std::to_string(mesh.morphTargets) + " morph targets";
 }
 
+std::string posedText(const ImportReport& report) {
+    const std::string angles = std::to_string(report.poseInputs) + " angles";
+    const std::string weights = std::to_string(report.poseWeights) + " weights";
+    if (report.poseInputs == 0)
+        return report.poseWeights == 0 ? "" : weights;
+    return report.poseWeights == 0 ? angles : angles + " and " + weights;
+}
+
 } // namespace
 
 std::string reportText(const ImportReport& report) {
@@ -78,8 +86,8 @@ std::string reportText(const ImportReport& report) {
     }
     if (report.curves > 0)
         text << "curves: " << report.curves << '\n';
-    if (report.poseInputs > 0)
-        text << "deformer warp: " << report.poseInputs << " angles to pose\n";
+    if (const std::string posed = posedText(report); !posed.empty())
+        text << "deformer warp: " << posed << " to pose\n";
     text << "scene " << report.scene << '\n';
     return text.str();
 }
@@ -96,6 +104,7 @@ std::string reportJson(const ImportReport& report) {
               [&](const auto& animation) { writeAnimation(writer, animation); });
     writeCount(writer, "curves", report.curves);
     writeCount(writer, "poseInputs", report.poseInputs);
+    writeCount(writer, "poseWeights", report.poseWeights);
     writeList(writer, "warnings", report.warnings, [&](const auto& text) { writeText(writer, text); });
     writeList(writer, "notes", report.notes, [&](const auto& text) { writeText(writer, text); });
     writer.EndObject();

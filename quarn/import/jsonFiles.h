@@ -14,22 +14,31 @@
 
 namespace quarn {
 
-/// Of rotateX, rotateY and rotateZ, in radians: least and largest angle, least below largest; none where an axis is
-/// not posed.
-using JointLimits = std::array<std::optional<std::pair<double, double>>, 3>;
+/// Least and largest value, least below largest.
+using ValueRange = std::pair<double, double>;
+/// Of rotateX, rotateY and rotateZ, in radians; none where an axis is not posed.
+using JointLimits = std::array<std::optional<ValueRange>, 3>;
 /// By the name of the joint in its file.
 using LimitMap = std::map<std::string, JointLimits>;
+/// Of weights, by the name of the slider in the scene: "head_sliders.jawOpen".
+using SliderLimitMap = std::map<std::string, ValueRange>;
+
+struct PoseLimits {
+    LimitMap joints;
+    SliderLimitMap sliders;
+};
 
 /// {"child joint": "parent joint", ...}. Throws std::runtime_error, naming file and place, for anything else and for a
 /// joint that stands twice.
 ParentMap readParents(const std::filesystem::path& file);
 
-/// {"joint": {"rotateX": [least, largest], ...}, ...} in degrees. Throws as readParents() does, and for an axis that is
-/// not one of the three, or a range of no width.
-LimitMap readLimits(const std::filesystem::path& file);
+/// {"joint": {"rotateX": [least, largest], ...}, "slider": [least, largest], ...}, angles in degrees. Throws as
+/// readParents() does, and for an axis that is not one of the three, or a range of no width.
+PoseLimits readLimits(const std::filesystem::path& file);
 
-/// The same file of limits, joints in this order: to be edited, and read by readLimits(). Degrees with four digits
+/// The same file of limits, joints and then sliders in this order: to be edited, and read by readLimits(). Four digits
 /// behind the point, rounded so that no range gets smaller.
-std::string limitsText(const std::vector<std::pair<std::string, JointLimits>>& joints);
+std::string limitsText(const std::vector<std::pair<std::string, JointLimits>>& joints,
+                       const std::vector<std::pair<std::string, ValueRange>>& sliders);
 
 } // namespace quarn

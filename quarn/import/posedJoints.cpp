@@ -110,11 +110,12 @@ std::vector<JointLimits> limitsOf(const Character& character, const std::vector<
         return limits;
     }
     limits = animatedLimits(character, rests, choice);
-    if (std::any_of(limits.begin(), limits.end(), isAny)) {
+    if (choice.hasOthers || std::any_of(limits.begin(), limits.end(), isAny)) {
         notes.push_back(animatedNote(choice));
         return limits;
     }
-    notes.emplace_back("limits of the poses: 30 degrees to both sides of every axis");
+    if (!limits.empty())
+        notes.emplace_back("limits of the poses: 30 degrees to both sides of every axis");
     JointLimits both;
     both.fill(std::pair(-defaultRange, defaultRange));
     limits.assign(limits.size(), both);
@@ -169,8 +170,6 @@ PosedJoints choosePosedJoints(const Character& character, const std::vector<Join
         else
             posed.joints.push_back({joint, limits[joint]});
     }
-    if (posed.joints.empty())
-        throw std::runtime_error("no joint is left whose turning the deformer could learn from");
     for (const LeftOut* reason : {&still, &roots, &unturned, &flat})
         reason->tell(posed.notes);
     return posed;

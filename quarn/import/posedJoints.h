@@ -22,6 +22,7 @@ struct PoseChoice {
     double framesPerSecond = 24.0;
     bool withRoots = false; ///< also joints without parent that have children
     double margin = 0.0;    ///< added on both sides of what animations do, in parts of the range
+    bool hasOthers = false; ///< animations move other controls: joints that they do not turn are to stay
 };
 
 struct PosedJoints {
@@ -30,11 +31,12 @@ struct PosedJoints {
 };
 
 /// The joints whose turning a deformer has to know of. Limits are the user's, who also chooses the joints by them; or
-/// else the range of angles of the animations, with 0 in it, and the margin; or else 30 degrees to both sides. Left out
+/// else the range of angles of the animations, with 0 in it, and the margin; or else, where these move nothing that is
+/// a control, 30 degrees to both sides. Left out
 /// are joints that would give controls that never change, or change nothing: those below which no vertex is moved,
 /// those that are not turned about any axis, those of scale 0, and roots, which place the whole character, unless
 /// `withRoots` or the user's limits ask for them. Throws std::runtime_error, naming it, for a joint of the limits that
-/// there is not, and when no joint is left.
+/// there is not.
 PosedJoints choosePosedJoints(const Character& character, const std::vector<JointRest>& rests,
                               const PoseChoice& choice);
 

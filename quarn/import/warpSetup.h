@@ -4,6 +4,7 @@
 
 #include "quarn/import/characterScene.h"
 #include "quarn/import/posedJoints.h"
+#include "quarn/import/posedSliders.h"
 
 #include <optional>
 #include <string>
@@ -24,17 +25,20 @@ struct WarpSettings {
 struct WarpNodes {
     HObject warp;
     HObject poses;
-    HObject axes;
+    HObject axes; ///< null where no joint is posed
     HObject controls;
 };
 
 /// Makes the nodes, first thing in a scene, so that they have the names by which other commands know them. Throws
 /// std::runtime_error, naming the node. Thread: main.
-WarpNodes makeWarpNodes(const WarpSettings& settings);
+WarpNodes makeWarpNodes(const WarpSettings& settings, bool hasJoints);
 
-/// Connects them: every mesh that a skin moves becomes a geometry of the deformer, by rising index. Throws
-/// std::runtime_error, naming the node. Thread: main.
+/// Whether the mesh is a geometry of the deformer: a skin moves it, or a slider that is posed.
+bool isDeformed(const CharacterScene& scene, std::size_t mesh, const PosedSliders& sliders);
+
+/// Connects them: every mesh that isDeformed() becomes a geometry of the deformer, by rising index. Controls are those
+/// of the joints, and then the sliders, mesh by mesh. Throws std::runtime_error, naming the node. Thread: main.
 void connectWarp(const WarpNodes& nodes, const WarpSettings& settings, const std::vector<PosedJoint>& joints,
-                 const CharacterScene& scene);
+                 const PosedSliders& sliders, const CharacterScene& scene);
 
 } // namespace quarn

@@ -14,6 +14,7 @@
 #include "quarn/info/LineList.h"
 #include "quarn/info/ModelReport.h"
 #include "quarn/info/SceneReport.h"
+#include "quarn/info/SliderReport.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/Warp.h"
 
@@ -174,21 +175,24 @@ void showDevices(bool asJson) {
 
 void showJoints(const Options& options) {
     std::vector<JointReport> joints;
+    std::vector<SliderReport> sliders;
     {
         const Silence silence;
         const StdoutAside aside;
         SceneSession session;
         session.open(options.path);
         joints = describeJoints();
+        sliders = describeSliders();
     }
     if (!options.json) {
-        std::cout << printable(jointsText(joints));
+        std::cout << printable(jointsText(joints) + slidersText(sliders));
         return;
     }
     rapidjson::StringBuffer buffer;
     JsonWriter writer(buffer);
     writer.StartObject();
     writeJoints(writer, joints);
+    writeSliders(writer, sliders);
     writer.EndObject();
     std::cout << printable(buffer.GetString()) << '\n';
 }
@@ -263,7 +267,7 @@ void addInfoCommand(CLI::App& app) {
     info->add_flag("--devices", options->devices, "List the OpenCL devices that quarn play --evaluator gpu can use");
     info->add_flag("--joints", options->joints,
                    "Of a scene: each joint, its parent, what is posed and how far, and "
-                   "how many vertices it moves");
+                   "how many vertices it moves; and the sliders that are posed");
     info->add_option("--scene", options->scene, "Tell whether the model fits the deformer of this scene");
     info->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     info->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");

@@ -4,6 +4,7 @@
 
 #include "quarn/scene/gltfParts.h"
 
+#include <algorithm>
 #include <array>
 #include <ostream>
 
@@ -71,6 +72,9 @@ private:
                 nodes.push_back(j);
         for (std::size_t i = 0; i < placedRoots().size(); ++i)
             nodes.push_back(skeleton_.joints.size() + i);
+        for (std::size_t mesh = 0; mesh < skeleton_.meshes.size(); ++mesh)
+            if (!skeleton_.meshes[mesh].inverseBinds)
+                nodes.push_back(firstMeshNode() + mesh);
         return nodes;
     }
 
@@ -81,7 +85,8 @@ private:
         if (skeleton_.metersPerUnit != 1.0)
             nodes = {firstMeshNode() + skeleton_.meshes.size()};
         for (std::size_t mesh = 0; mesh < skeleton_.meshes.size(); ++mesh)
-            nodes.push_back(firstMeshNode() + mesh);
+            if (skeleton_.meshes[mesh].inverseBinds)
+                nodes.push_back(firstMeshNode() + mesh);
         json.Key("scenes");
         json.StartArray();
         json.StartObject();
@@ -97,11 +102,13 @@ private:
             writeJoint(json, j);
         for (const std::size_t root : placedRoots())
             writeSpace(json, root);
+        std::size_t skins = 0;
         for (std::size_t mesh = 0; mesh < skeleton_.meshes.size(); ++mesh) {
             json.StartObject();
             writeText(json, "name", skeleton_.meshes[mesh].name);
             writeCount(json, "mesh", mesh);
-            writeCount(json, "skin", mesh);
+            if (skeleton_.meshes[mesh].inverseBinds)
+                writeCount(json, "skin", skins++);
             json.EndObject();
         }
         if (skeleton_.metersPerUnit != 1.0) {
@@ -151,15 +158,24 @@ private:
         for (const SkinnedGltf& mesh : skeleton_.meshes)
             writeMesh(json, mesh);
         json.EndArray();
+        writeSkins(json);
+    }
+
+    void writeSkins(JsonWriter& json) const {
+        const auto hasSkin = [](const SkinnedGltf& mesh) { return mesh.inverseBinds.has_value(); };
+        if (std::none_of(skeleton_.meshes.begin(), skeleton_.meshes.end(), hasSkin))
+            return;
         std::vector<std::size_t> all(skeleton_.joints.size());
         for (std::size_t j = 0; j < all.size(); ++j)
             all[j] = j;
         json.Key("skins");
         json.StartArray();
         for (const SkinnedGltf& mesh : skeleton_.meshes) {
+            if (!mesh.inverseBinds)
+                continue;
             json.StartObject();
             writeIndices(json, "joints", all);
-            writeCount(json, "inverseBindMatrices", mesh.inverseBinds);
+            writeCount(json, "inverseBindMatrices", *mesh.inverseBinds);
             json.EndObject();
         }
         json.EndArray();
@@ -180,19 +196,61 @@ private:
         }
         json.EndObject();
         writeCount(json, "indices", mesh.indices);
+        if (!mesh.targets.empty())
+            writeTargets(json, mesh);
         json.EndObject();
+        json.EndArray();
+        if (!mesh.targets.empty())
+            writeWeights(json, mesh);
+        json.EndObject();
+    }
+
+    // in the primitive
+    static void writeTargets(JsonWriter& json, const SkinnedGltf& mesh) {
+        json.Key("targets");
+        json.StartArray();
+        for (const SkinnedGltf::Target& target : mesh.targets) {
+            json.StartObject();
+            writeCount(json, "POSITION", target.positions);
+            json.EndObject();
+        }
+        json.EndArray();
+    }
+
+    // in the mesh; where the names go is no part of glTF, and everybody's habit
+    static void writeWeights(JsonWriter& json, const SkinnedGltf& mesh) {
+        std::vector<double> weights;
+        for (const SkinnedGltf::Target& target : mesh.targets)
+            weights.push_back(target.restWeight);
+        writeNumbers(json, "weights", weights);
+        json.Key("extras");
+        json.StartObject();
+        json.Key("targetNames");
+        json.StartArray();
+        for (const SkinnedGltf::Target& target : mesh.targets)
+            json.String(target.name.c_str());
         json.EndArray();
         json.EndObject();
     }
 
+    // those of joints, and then those of weights
+    std::vector<GltfSkeleton::Channel> channels() const {
+        std::vector<GltfSkeleton::Channel> all = skeleton_.channels;
+        for (std::size_t mesh = 0; mesh < skeleton_.meshes.size(); ++mesh)
+            if (!skeleton_.meshes[mesh].targets.empty())
+                all.push_back({firstMeshNode() + mesh, "weights", skeleton_.meshes[mesh].weightKeys});
+        return all;
+    }
+
     void writeAnimation(JsonWriter& json) const {
+        const std::vector<GltfSkeleton::Channel> all = channels();
         json.Key("animations");
         json.StartArray();
         json.StartObject();
         writeText(json, "name", "poses");
         json.Key("samplers");
         json.StartArray();
-        for (const GltfSkeleton::Channel& channel : skeleton_.channels) {
+        for (const GltfSkeleton::Channel& channel : all) {
             json.StartObject();
             writeCount(json, "input", skeleton_.times);
             writeCount(json, "output", channel.keys);
@@ -202,13 +260,13 @@ private:
         json.EndArray();
         json.Key("channels");
         json.StartArray();
-        for (std::size_t i = 0; i < skeleton_.channels.size(); ++i) {
+        for (std::size_t i = 0; i < all.size(); ++i) {
             json.StartObject();
             writeCount(json, "sampler", i);
             json.Key("target");
             json.StartObject();
-            writeCount(json, "node", skeleton_.channels[i].node);
-            writeText(json, "path", skeleton_.channels[i].path);
+            writeCount(json, "node", all[i].node);
+            writeText(json, "path", all[i].path);
             json.EndObject();
             json.EndObject();
         }

@@ -2,8 +2,10 @@
 #include "quarn/pose/gltfPoses.h"
 
 #include "quarn/pose/GltfSkeleton.h"
+#include "quarn/pose/valueAt.h"
 #include "quarn/scene/units.h"
 
+#include <algorithm>
 #include <cmath>
 #include <stdexcept>
 
@@ -35,9 +37,6 @@ public:
         : motion_(motion)
         , places_(places) {
         skeleton_.metersPerUnit = metersPerUnit();
-        if (motion.joints.empty())
-            throw std::runtime_error(
-                "the scene has no joints: .glb holds poses of a skeleton, .json those of any plugs");
         for (const SceneJoint& joint : motion.joints)
             addJoint(joint);
         addKeys();
@@ -45,7 +44,7 @@ public:
     }
 
     void write(std::ostream& out) const { writeSkeleton(out, skeleton_); }
-    GltfPosesAnswer answer() const { return {skeleton_.meshes.size(), notes_}; }
+    GltfPosesAnswer answer() const { return {skeleton_.meshes.size(), weights_, notes_}; }
 
 private:
     void addJoint(const SceneJoint& joint) {
@@ -93,18 +92,51 @@ private:
     }
 
     void addMeshes() {
-        for (const SceneSkin& skin : sceneSkins(motion_.joints)) {
-            if (const std::string why = whyNotInGltf(skin); !why.empty()) {
-                notes_.push_back("the mesh " + skin.mesh + " " + why + ", and is left out");
+        const std::vector<SceneShapes> shapes = sceneShapes();
+        const std::vector<SceneSkin> skins = sceneSkins(motion_.joints);
+        for (const SceneSkin& skin : skins)
+            addSkin(skin, shapes);
+        for (const SceneShapes& each : shapes) {
+            const auto takesIt = [&](const SceneSkin& skin) { return skin.input.source() == each.output; };
+            if (std::any_of(skins.begin(), skins.end(), takesIt))
                 continue;
-            }
-            if (skin.isMoved)
-                notes_.push_back("the mesh " + skin.mesh + " is in the file as it comes into " + skin.node +
-                                 " now: what moves it before is left out");
-            skeleton_.meshes.push_back(addSkinned(skin, restWorlds_, skeleton_.numbers));
+            skeleton_.meshes.push_back(addMorphed(each, skeleton_.numbers));
+            addWeights(each);
         }
         if (skeleton_.meshes.empty())
             notes_.emplace_back("no mesh is in the file, and quarn import needs one");
+        if (motion_.joints.empty() && skeleton_.meshes.empty())
+            throw std::runtime_error("the scene has no joints, and no mesh whose only weights are those of morph "
+                                     "targets: .glb holds poses of these, .json those of any plugs");
+    }
+
+    void addSkin(const SceneSkin& skin, const std::vector<SceneShapes>& all) {
+        if (const std::string why = whyNotInGltf(skin); !why.empty())
+            return notes_.push_back("the mesh " + skin.mesh + " " + why + ", and is left out");
+        const auto shapes = std::find_if(all.begin(), all.end(),
+                                         [&](const SceneShapes& each) { return each.output == skin.input.source(); });
+        const bool morphs = shapes != all.end();
+        if (skin.isMoved && !morphs)
+            notes_.push_back("the mesh " + skin.mesh + " is in the file as it comes into " + skin.node +
+                             " now: what moves it before is left out");
+        skeleton_.meshes.push_back(addSkinned(skin, morphs ? &*shapes : nullptr, restWorlds_, skeleton_.numbers));
+        if (morphs)
+            addWeights(*shapes);
+    }
+
+    // keys of the mesh that was added last, frame by frame
+    void addWeights(const SceneShapes& shapes) {
+        std::vector<float> keys;
+        OpenQuarn::EvaluationContext context(motion_.frames.first);
+        for (std::size_t number = 0; number < motion_.frames.count(); ++number) {
+            const int frame = motion_.frames.frame(number);
+            context.setTime(frame);
+            for (const SceneShapes::Shape& shape : shapes.shapes)
+                keys.push_back(static_cast<float>(valueAt(context, shape.weight, frame)));
+        }
+        skeleton_.meshes.back().weightKeys = skeleton_.numbers.add(keys, {Shape::scalar});
+        for (const SceneShapes::Shape& shape : shapes.shapes)
+            weights_.push_back(shape.control);
     }
 
     const Motion& motion_;
@@ -112,6 +144,7 @@ private:
     GltfSkeleton skeleton_;
     std::vector<std::vector<JointPose>> poses_; ///< of each joint
     std::vector<HMatrix> restWorlds_;
+    std::vector<HPlug> weights_;
     std::vector<std::string> notes_;
 };
 

@@ -72,6 +72,37 @@ std::vector<float> inverseBindsOf(const SceneSkin& skin, const std::vector<HMatr
     return numbers;
 }
 
+// positions of one vertex after the other, with zeros for those that stay
+std::vector<float> denseDeltas(const rig::ShapeDeltas& deltas, std::size_t vertices) {
+    std::vector<float> numbers(3 * vertices, 0.0F);
+    for (std::size_t i = 0; i < deltas.xyz.size(); ++i)
+        numbers[3 * std::size_t{deltas.vertices[i / 3]} + i % 3] = static_cast<float>(deltas.xyz[i]);
+    return numbers;
+}
+
+// positions and triangles
+SkinnedGltf addMesh(const std::string& name, const HPlug& mesh, std::size_t& vertices, GltfNumbers& numbers) {
+    std::vector<float> points;
+    readPoints(mesh, points);
+    const std::vector<std::uint32_t> triangles = gltfTriangles(polygonsOf(mesh));
+    vertices = points.size() / 3;
+    if (points.empty() || triangles.empty())
+        throw std::runtime_error("the mesh " + name + " has " + std::to_string(vertices) + " vertices and " +
+                                 std::to_string(triangles.size() / 3) + " triangles");
+    SkinnedGltf made;
+    made.name = name;
+    made.positions = numbers.add(points, {Shape::vec3, Use::vertices, true});
+    made.indices = numbers.add(triangles, {Shape::scalar, Use::indices});
+    return made;
+}
+
+void addTargets(const SceneShapes& shapes, std::size_t vertices, GltfNumbers& numbers, SkinnedGltf& made) {
+    for (const SceneShapes::Shape& shape : shapes.shapes)
+        made.targets.push_back({shape.name,
+                                numbers.add(denseDeltas(shape.deltas, vertices), {Shape::vec3, Use::vertices, true}),
+                                shape.restWeight});
+}
+
 } // namespace
 
 std::string whyNotInGltf(const SceneSkin& skin) {
@@ -86,23 +117,28 @@ std::string whyNotInGltf(const SceneSkin& skin) {
     return {};
 }
 
-SkinnedGltf addSkinned(const SceneSkin& skin, const std::vector<HMatrix>& restWorlds, GltfNumbers& numbers) {
-    std::vector<float> points;
-    readPoints(skin.input, points);
-    const std::vector<std::uint32_t> triangles = gltfTriangles(polygonsOf(skin.input));
-    if (points.size() != 3 * skin.weights.vertexCount() || triangles.empty())
-        throw std::runtime_error("the mesh " + skin.mesh + " has " + std::to_string(points.size() / 3) +
-                                 " vertices and " + std::to_string(triangles.size() / 3) + " triangles, and its skin " +
-                                 skin.node + " has " + std::to_string(skin.weights.vertexCount()) + " vertices");
-    SkinnedGltf made;
-    made.name = skin.mesh;
-    made.positions = numbers.add(points, {Shape::vec3, Use::vertices, true});
-    made.indices = numbers.add(triangles, {Shape::scalar, Use::indices});
+SkinnedGltf addSkinned(const SceneSkin& skin, const SceneShapes* shapes, const std::vector<HMatrix>& restWorlds,
+                       GltfNumbers& numbers) {
+    std::size_t vertices = 0;
+    SkinnedGltf made = addMesh(skin.mesh, shapes == nullptr ? skin.input : shapes->input, vertices, numbers);
+    if (vertices != skin.weights.vertexCount())
+        throw std::runtime_error("the mesh " + skin.mesh + " has " + std::to_string(vertices) +
+                                 " vertices, and its skin " + skin.node + " has " +
+                                 std::to_string(skin.weights.vertexCount()) + " vertices");
+    if (shapes != nullptr)
+        addTargets(*shapes, vertices, numbers, made);
     const InfluenceSets sets = setsOf(skin);
     for (std::size_t set = 0; set < sets.joints.size(); ++set)
         made.jointsAndWeights.emplace_back(numbers.add(sets.joints[set], {Shape::vec4, Use::vertices}),
                                            numbers.add(sets.weights[set], {Shape::vec4, Use::vertices}));
     made.inverseBinds = numbers.add(inverseBindsOf(skin, restWorlds), {Shape::mat4});
+    return made;
+}
+
+SkinnedGltf addMorphed(const SceneShapes& shapes, GltfNumbers& numbers) {
+    std::size_t vertices = 0;
+    SkinnedGltf made = addMesh(shapes.mesh, shapes.input, vertices, numbers);
+    addTargets(shapes, vertices, numbers, made);
     return made;
 }
 

@@ -49,12 +49,16 @@ std::string placeText(const FilePlaces& places, int frame, const std::string& en
     return "second " + numberText(places.seconds(frame)) + ", at " + numberText(places.perSecond) + " frames a second";
 }
 
-void noteWhatHasNoJoint(const Motion& motion, const Console& console) {
-    const auto isOfJoint = [](const PlugTrack& track) { return nodeType(track.plug.node()) == "joint"; };
-    const auto other = std::find_if_not(motion.tracks.begin(), motion.tracks.end(), isOfJoint);
+// `weights`: those that are in the file all the same
+void noteWhatHasNoJoint(const Motion& motion, const std::vector<HPlug>& weights, const Console& console) {
+    const auto isHeld = [&](const PlugTrack& track) {
+        return nodeType(track.plug.node()) == "joint" ||
+               std::find(weights.begin(), weights.end(), track.plug) != weights.end();
+    };
+    const auto other = std::find_if_not(motion.tracks.begin(), motion.tracks.end(), isHeld);
     if (other == motion.tracks.end())
         return;
-    const auto count = std::count_if(other, motion.tracks.end(), [&](const auto& track) { return !isOfJoint(track); });
+    const auto count = std::count_if(other, motion.tracks.end(), [&](const auto& track) { return !isHeld(track); });
     console.note(std::to_string(count) + (count == 1 ? " plug that moves is" : " plugs that move are") +
                  " of no joint and not in the file, " + other->name + " first: .json and .csv hold all");
 }
@@ -78,13 +82,13 @@ void writeTo(std::ostream& out, const std::string& ending, const Motion& motion,
         console.note(
             "a .bvh holds no mesh, no numbers of frames and no rotations of the rest pose: its skeleton stands "
             "with all joints unturned, and only the motion is the scene's");
-        return noteWhatHasNoJoint(motion, console);
+        return noteWhatHasNoJoint(motion, {}, console);
     }
     const GltfPosesAnswer answer = writeGltfPoses(out, motion, places);
     report.meshes = answer.meshes;
     for (const std::string& note : answer.notes)
         console.note(note);
-    noteWhatHasNoJoint(motion, console);
+    noteWhatHasNoJoint(motion, answer.weights, console);
 }
 
 } // namespace

@@ -43,9 +43,12 @@ void readKeysInScene(const std::string& text, const std::string& name) {
 }
 
 void readLimits(const std::string& path) {
-    for (const auto& [joint, limits] : quarn::readLimits(path))
+    const quarn::PoseLimits all = quarn::readLimits(path);
+    for (const auto& [joint, limits] : all.joints)
         for (const auto& range : limits)
             require(!range || range->first < range->second);
+    for (const auto& [slider, range] : all.sliders)
+        require(range.first < range.second);
 }
 
 } // namespace

@@ -4,14 +4,19 @@
 
 #include "openquarn_app/SceneFile.h"
 #include "quarn/character/characterFiles.h"
+#include "quarn/dataset/ControlReader.h"
 #include "quarn/import/ImportTest.h"
 #include "quarn/import/jsonFiles.h"
+#include "quarn/pose/PoseControls.h"
+#include "quarn/pose/samplePoses.h"
+#include "quarn/pose/writePoses.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/vertexMap.h"
 #include "storage/npyArray.h"
 #include "support/TemporaryFolder.h"
 
 #include <fstream>
+#include <sstream>
 
 namespace quarn {
 namespace {
@@ -40,6 +45,21 @@ protected:
 private:
     TemporaryFolder folder_;
 };
+
+// of the poses, by name and range; each is one that the network sees, too
+std::string controlsOf(const fs::path& scene) {
+    const SceneSession session(SceneOptions{scene, {}, 0});
+    std::ostringstream text;
+    const Warp warp = Warp::find();
+    for (const PoseControl& control : poseControls(poseCollector(warp)))
+        text << (text.str().empty() ? "" : ", ") << controlName(control.plug) << ' ' << control.limits.least << ' '
+             << control.limits.most;
+    ControlReader seen(warp);
+    seen.read();
+    seen.readNames();
+    EXPECT_EQ(text.str().find("arm_sliders.high") != std::string::npos, seen.names().back() == "arm_sliders.high");
+    return text.str();
+}
 
 // "lower" turns by a right angle about z within a second
 void turnLower(GltfWriter& file) {
@@ -150,8 +170,9 @@ TEST_F(ImportCharacter, SeveralMeshesAndOddNames) {
     options_.file = write("odd.gltf", strip.write().text());
     options_.neuralWarp = true;
     const ImportReport report = importCharacter(options_);
-    EXPECT_THAT(report.notes,
-                testing::Contains("the mesh \"table\" follows no joint and is no geometry of the deformer"));
+    EXPECT_THAT(
+        report.notes,
+        testing::Contains("the mesh \"table\" follows no joint and no weight, and is no geometry of the deformer"));
     EXPECT_EQ(report.joints.at(0).node, "warp1");
     EXPECT_EQ(report.meshes.at(0).node, "_1_arm___");
     EXPECT_EQ(report.meshes.at(1).node, "controls1");
@@ -264,6 +285,124 @@ TEST_F(ImportCharacter, ClipsEndAtAWholeFrame) {
     }
 }
 
+// the strip without its joints
+void onlyRise(GltfWriter& file) {
+    turnAndRise(file);
+    file.nodes = {R"({"name":"arm","mesh":0})"};
+    file.roots = "0";
+    file.skins.clear();
+    std::string& rise = file.animations[1];
+    rise.replace(rise.find(R"({"sampler":0)"), rise.find(R"({"sampler":1)") - rise.find(R"({"sampler":0)"), "");
+    rise.replace(rise.find("\"node\":2"), 8, "\"node\":0");
+    file.animations.erase(file.animations.begin());
+}
+
+struct Controls {
+    const char* name;
+    std::function<void(ImportOptions&)> change;
+    std::string limits; ///< a file of them; without, it is what the import writes that counts
+    const char* wanted; ///< name and range of each control
+};
+
+TEST_F(ImportCharacter, WeightsOfMorphTargetsAreControlsAsAnglesAre) {
+    const std::vector<Controls> rows = {
+        {"all", [](ImportOptions& o) { o.animations = {"all"}; }, "", "lower.rotateZ 0 1.5708, arm_sliders.high 0 1.5"},
+        {"what the animation leaves alone", [](ImportOptions& o) { o.animations = {"rise"}; }, "",
+         "arm_sliders.high 0 1.5"},
+        {"another animation", [](ImportOptions& o) { o.animations = {"wave"}; }, "",
+         "lower.rotateZ 0 1.5708, arm_sliders.high 0 1"},
+        {"no animation",
+         [](ImportOptions& o) { o.noAnimation = true, o.withRoots = false, o.limitsFrom = LimitsFrom::none; }, "",
+         "lower.rotateX -0.523599 0.523599, lower.rotateY -0.523599 0.523599, lower.rotateZ -0.523599 0.523599, "
+         "arm_sliders.high 0 1"},
+        {"no weights", [](ImportOptions& o) { o.morphControls = false; }, "", "lower.rotateZ 0 1.5708"},
+        {"limits of a slider", [](ImportOptions&) {}, R"({"arm_sliders.high": [0.25, 0.5]})",
+         "arm_sliders.high 0.25 0.5"},
+        {"limits of a joint", [](ImportOptions&) {}, R"({"lower": {"rotateZ": [0, 45]}})", "lower.rotateZ 0 0.785398"},
+        {"no joints", [&](ImportOptions& o) { o.file = path("face.gltf"); }, "", "arm_sliders.high 0 1.5"}};
+    Strip strip;
+    strip.more = turnAndRise;
+    write("arm.gltf", strip.write().text());
+    strip.more = onlyRise;
+    write("face.gltf", strip.write().text());
+    options_.neuralWarp = true;
+    options_.withRoots = true;
+    for (const Controls& row : rows) {
+        SCOPED_TRACE(row.name);
+        ImportOptions options = options_;
+        options.file = path("arm.gltf");
+        row.change(options);
+        if (!row.limits.empty())
+            options.limits = write("limits.json", row.limits);
+        else
+            options.writtenLimits = path(std::string(row.name) + ".json");
+        const ImportReport report = importCharacter(options);
+        EXPECT_EQ(controlsOf(options.output), row.wanted);
+        if (row.limits.empty()) { // and the same comes of what it has written
+            options.limits = std::exchange(options.writtenLimits, {});
+            importCharacter(options);
+            EXPECT_EQ(controlsOf(options.output), row.wanted);
+        }
+        EXPECT_EQ(report.meshes.at(0).skin, options.file == path("face.gltf") ? "arm_shapes" : "arm_skin");
+    }
+    options_.file = path("arm.gltf");
+    options_.limits = write("limits.json", R"({"arm_sliders.low": [0, 1]})");
+    EXPECT_THAT(failureOf([&] { importCharacter(options_); }),
+                HasSubstr("a slider \"arm_sliders.low\" that there is not; there is arm_sliders.high"));
+    options_.morphControls = false;
+    EXPECT_THAT(failureOf([&] { importCharacter(options_); }), HasSubstr("--no-morph-controls leaves it out"));
+    options_.limits.clear();
+    options_.file = path("face.gltf");
+    EXPECT_THAT(failureOf([&] { importCharacter(options_); }), HasSubstr("no morph targets that are controls"));
+}
+
+// sampled, written as an animation of the character, and imported once more
+TEST_F(ImportCharacter, PosesComeBackWithTheirWeights) {
+    for (const auto& [name, more, mover] :
+         {std::tuple("arm", &turnAndRise, "arm_skin"), std::tuple("face", &onlyRise, "arm_shapes")}) {
+        SCOPED_TRACE(name);
+        Strip strip;
+        strip.more = more;
+        options_.file = write(std::string(name) + ".gltf", strip.write().text());
+        options_.neuralWarp = true;
+        options_.metersPerUnit = 0.01;
+        importCharacter(options_);
+        const auto shapesOf = [mover = std::string(mover)](SceneSession& session, std::size_t frames) {
+            std::vector<std::vector<double>> shapes;
+            for (std::size_t frame = 1; frame <= frames; ++frame) {
+                session.host().setTime(static_cast<double>(frame));
+                shapes.push_back(pointsOf(findPlug(mover + ".outputGeom[0]")));
+            }
+            return shapes;
+        };
+        constexpr std::size_t frames = 6;
+        std::vector<std::vector<double>> sampled;
+        {
+            Console console;
+            console.quiet = true;
+            SceneSession session(SceneOptions{options_.output, {}, 0});
+            SampleOptions sampling;
+            sampling.samples = frames;
+            sampling.activationRate = 1.0;
+            samplePoses(Warp::find(), sampling, console);
+            sampled = shapesOf(session, frames);
+            EXPECT_NE(sampled.at(1), sampled.at(2));
+            EXPECT_EQ(writePoses({path("poses.glb"), 0}, Warp::find(), {1, frames, 1}, console).meshes, 1U);
+        }
+        ImportOptions back = options_;
+        back.file = path("poses.glb");
+        back.output = path("back.json");
+        back.metersPerUnit.reset();
+        importCharacter(back);
+        SceneSession session(SceneOptions{back.output, {}, 0});
+        const double unit = numberOf(findPlug("character.metersPerUnit"));
+        const std::vector<std::vector<double>> read = shapesOf(session, frames);
+        for (std::size_t frame = 0; frame < frames; ++frame)
+            for (std::size_t i = 0; i < read[frame].size(); ++i)
+                EXPECT_NEAR(read[frame][i] * unit / 0.01, sampled[frame].at(i), 1e-5) << frame << ' ' << i;
+    }
+}
+
 TEST_F(ImportCharacter, WhatCannotBeDoneLeavesNoScene) {
     const auto refused = [&](const std::string& why, const std::function<void(ImportOptions&)>& change) {
         ImportOptions options = options_;
@@ -303,12 +442,13 @@ TEST_F(ImportCharacter, DamagedJsonFilesAreRefusedByName) {
     EXPECT_THAT(parents("[]"), HasSubstr("holds no JSON object"));
     EXPECT_THAT(parents(""), HasSubstr("line 1"));
     EXPECT_THAT(parents(R"({"a": 1})"), HasSubstr("\"a\": its parent is not a text"));
-    EXPECT_THAT(parents(R"({"a": "b", "a": "c"})"), HasSubstr("\"a\": the joint stands twice"));
+    EXPECT_THAT(parents(R"({"a": "b", "a": "c"})"), HasSubstr("\"a\": it stands twice"));
     EXPECT_THAT(failureOf([&] { readParents(path("none.json")); }), HasSubstr("none.json does not exist"));
     EXPECT_THAT(failureOf([] { readLimits("/dev/zero"); }), HasSubstr("/dev/zero is no regular file"));
-    EXPECT_THAT(limits(R"({"a": []})"), HasSubstr("\"a\": not an object of axes"));
+    EXPECT_THAT(limits(R"({"a": 1})"), HasSubstr("\"a\": neither an object of axes"));
+    EXPECT_THAT(limits(R"({"a": [0]})"), HasSubstr("\"a\": not [least, largest]"));
     EXPECT_THAT(limits(R"({"a": {"rotatex": [0, 1]}})"), HasSubstr("\"rotatex\" is not one of"));
-    EXPECT_THAT(limits(R"({"a": {"rotateX": [0, 1, 2]}})"), HasSubstr("rotateX is not [least, largest]"));
+    EXPECT_THAT(limits(R"({"a": {"rotateX": [0, 1, 2]}})"), HasSubstr("rotateX: not [least, largest] in degrees"));
     EXPECT_THAT(limits(R"({"a": {"rotateX": [10, 10]}})"), HasSubstr("rotateX: the first of the two"));
     EXPECT_THAT(limits(R"({"a": {"rotateX": [0, NaN]}})"), HasSubstr("line 1"));
 }

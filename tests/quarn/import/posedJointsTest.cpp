@@ -78,7 +78,7 @@ TEST(PosedJoints, ThoseThatTellTheDeformerSomething) {
     const LimitMap unknown{{"kneee", limits}};
     EXPECT_THAT(failureOf([&] { chosen({&unknown, {}, 24.0, false}); }), HasSubstr("no joint \"kneee\""));
     const LimitMap still{{"toe", limits}};
-    EXPECT_THAT(failureOf([&] { chosen({&still, {}, 24.0, false}); }), HasSubstr("no joint is left"));
+    EXPECT_THAT(chosen({&still, {}, 24.0, false}), ElementsAre());
 }
 
 TEST(PosedJoints, ThoseLeftOutAreTold) {
@@ -98,9 +98,9 @@ TEST(PosedJoints, LimitsAreWrittenWithoutGettingSmaller) {
     JointLimits limits;
     limits[0] = {-0.3, 0.3};
     limits[2] = {-30.0 * degree, 0.0};
-    std::string text = limitsText({{"a \"b\"", limits}});
+    std::string text = limitsText({{"a \"b\"", limits}}, {{"face.smile", {-0.25, 1.00001}}});
     text.erase(std::remove_if(text.begin(), text.end(), [](char c) { return c == ' ' || c == '\n'; }), text.end());
-    EXPECT_EQ(text, R"({"a\"b\"":{"rotateX":[-17.1888,17.1888],"rotateZ":[-30.0,0.0]}})");
+    EXPECT_EQ(text, R"({"a\"b\"":{"rotateX":[-17.1888,17.1888],"rotateZ":[-30.0,0.0]},"face.smile":[-0.25,1.0001]})");
 }
 
 } // namespace
