@@ -35,6 +35,10 @@ for mesh in meshes:
     assert read(f"models/{mesh}.nwrp/metadata.json")["geometry"] == mesh
 PYTHON
 grep -q 'teeth' "$work/said"
+"$quarn" info "$work/talk/character.json" --joints | grep -qx 'head_sliders.jawOpen: 0 to 1.4'
+# what is left out of the scene and counts all the same is said
+"$quarn" import "$work/talk.gltf" -o "$work/still.json" --neural-warp --no-animation 2>"$work/notes" >"$work/told"
+grep -q -- '--limits-from none leaves it out' "$work/notes" && grep -q '3 angles and 3 weights' "$work/told"
 run --explain >"$work/explained"
 [[ -s $work/explained ]] && ! grep -v ': done$' "$work/explained" || exit 1
 run 2>&1 >/dev/null | grep -qE '^([0-9]+) of \1 steps were done already$'
