@@ -23,6 +23,7 @@ struct Joint {
     std::string name;      ///< not empty, unique among the joints
     int parent = -1;       ///< index into Character::joints, below that of the joint itself; -1 for a root
     HMatrix restTransform; ///< to the parent's space, as the file has it at rest; negative and uneven scale included
+    int sourceNode = -1;   ///< index of the node in a glTF file; -1 in others
 };
 
 /// How much a joint moves a vertex.
@@ -73,6 +74,7 @@ struct CharacterMesh {
     /// From the mesh's space to the world's, at rest. It places a mesh without skin; a skin does without it.
     HMatrix worldTransform;
     int parentJoint = -1; ///< the nearest joint at or above the mesh's node, or -1. A mesh without skin follows it
+    int sourceNode = -1;  ///< index of the node that shows it in a glTF file; -1 in others
 };
 
 enum class Interpolation : std::uint8_t {

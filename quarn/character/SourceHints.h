@@ -5,6 +5,7 @@
 #include "quarn/character/Character.h"
 
 #include <cstddef>
+#include <cstdlib>
 #include <map>
 #include <set>
 #include <string>
@@ -50,6 +51,10 @@ struct SourceHints {
     std::string nodeName(const std::string& imported) const {
         const auto found = nodeNames.find(imported);
         return found == nodeNames.end() ? imported : found->second;
+    }
+    /// The file's index of a node by its importer's name; -1 where the file has no such indices.
+    int nodeIndex(const std::string& imported) const {
+        return nodeNames.count(imported) == 0 ? -1 : std::atoi(imported.c_str() + 1); // see nodeId()
     }
 };
 

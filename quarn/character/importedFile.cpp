@@ -1,10 +1,14 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/importedFile.h"
 
+#include "storage/FileError.h"
+#include "storage/readWholeFile.h"
+
 #include <assimp/MemoryIOWrapper.h>
 
 #include <charconv>
 #include <filesystem>
+#include <stdexcept>
 #include <system_error>
 #include <utility>
 
@@ -41,6 +45,14 @@ std::string fileOfUri(const std::string& path, const std::string& uri) {
     const std::string folder = folderOf(path);
     std::string decoded = folder + percentDecoded(uri);
     return uri.find('%') != std::string::npos && isFile(decoded) ? decoded : folder + uri;
+}
+
+std::string readBeside(const std::string& path, const std::string& uri, const std::string& what) {
+    try {
+        return storage::readWholeFile(fileOfUri(path, uri), std::uint64_t{1} << 32U);
+    } catch (const storage::FileError& error) {
+        throw std::runtime_error("its " + what + " \"" + uri + "\" " + error.predicate());
+    }
 }
 
 ImportedFile::ImportedFile(std::string path, const std::string& bytes)

@@ -6,53 +6,23 @@
 #include "quarn/character/importedFile.h"
 #include "quarn/character/importerLog.h"
 #include "quarn/character/prepareGltf.h"
+#include "quarn/character/readApart.h"
 #include "quarn/character/skinnedMeshes.h"
 #include "quarn/character/transfer.h"
 #include "quarn/console/interrupt.h"
-#include "quarn/process/runApart.h"
-#include "storage/FileError.h"
-#include "storage/Json.h"
-#include "storage/readWholeFile.h"
 
 #include <assimp/BaseImporter.h>
 #include <assimp/Importer.hpp>
 #include <assimp/config.h>
 #include <assimp/importerdesc.h>
 
-#include <algorithm>
-#include <cctype>
 #include <cmath>
-#include <filesystem>
 #include <memory>
 #include <sstream>
 #include <stdexcept>
 
 namespace quarn {
 namespace {
-
-namespace fs = std::filesystem;
-
-std::string lowerEnding(const std::string& path) {
-    std::string ending = fs::path(path).extension().string();
-    std::transform(ending.begin(), ending.end(), ending.begin(),
-                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
-    return ending;
-}
-
-bool isGltf(const std::string& ending) {
-    return ending == ".gltf" || ending == ".glb";
-}
-
-std::string readBytes(const std::string& path) {
-    try {
-        std::string bytes = storage::readWholeFile(path, storage::jsonRules::character.mostBytes);
-        if (bytes.empty())
-            throw std::runtime_error("the file is empty");
-        return bytes;
-    } catch (const storage::FileError& error) {
-        throw std::runtime_error(error.predicate()); // the path is put before every error
-    }
-}
 
 // leaves the one importer that the ending stands for: a file is never taken for something else
 void keepImporterOf(Assimp::Importer& importer, const std::string& ending) {
@@ -103,18 +73,10 @@ Character convert(const aiScene& scene, const SourceHints& hints, const std::str
     return character;
 }
 
-std::string readUri(const std::string& path, const std::string& uri) {
-    try {
-        return storage::readWholeFile(fileOfUri(path, uri), std::uint64_t{1} << 32U);
-    } catch (const storage::FileError& error) {
-        throw std::runtime_error("its buffer \"" + uri + "\" " + error.predicate());
-    }
-}
-
 Character importFile(const std::string& path, const std::string& ending, std::string bytes) {
     SourceHints hints;
     if (isGltf(ending))
-        bytes = prepareGltf(bytes, hints, [&](const std::string& uri) { return readUri(path, uri); });
+        bytes = prepareGltf(bytes, hints, [&](const std::string& uri) { return readBeside(path, uri, "buffer"); });
     const ImporterLog log(hints.warnings);
     Assimp::Importer importer;
     keepImporterOf(importer, ending);
@@ -128,22 +90,11 @@ Character importFile(const std::string& path, const std::string& ending, std::st
     return convert(*scene, hints, ending, bytes);
 }
 
-// the importer does not check all that it is given: it works at a safe distance, and only its result comes here
-std::string importApart(const std::function<std::string()>& action) {
-    try {
-        return runApart(action);
-    } catch (const NoAnswer& none) {
-        throw std::runtime_error(none.why() == NoAnswer::Why::crashed
-                                     ? "the file is damaged: the importer does not survive it"
-                                     : std::string("reading the file ") + none.what());
-    }
-}
-
 Character readFile(const std::string& path) {
     const std::string ending = lowerEnding(path);
     if (!isGltf(ending) && ending != ".fbx" && ending != ".dae")
         throw std::runtime_error("\"" + ending + "\" is not one of the endings .gltf, .glb, .fbx and .dae");
-    const std::string bytes = readBytes(path);
+    const std::string bytes = readCharacterBytes(path);
     return unpackCharacter(importApart([&] { return packCharacter(importFile(path, ending, bytes)); }));
 }
 

@@ -91,7 +91,7 @@ private:
                                           "\"");
         if (!skeleton_.jointOf.emplace(node.mName.C_Str(), index).second && bones_.count(node.mName.C_Str()) > 0)
             character_.warnings.push_back("the skin may mean another of the joints named \"" + wanted + "\"");
-        character_.joints.push_back({name, parent, local});
+        character_.joints.push_back({name, parent, local, hints_.nodeIndex(node.mName.C_Str())});
         return static_cast<int>(index);
     }
 

@@ -139,6 +139,7 @@ public:
         mesh.name = names_.take(hints_.nodeName(shown.node->mName.C_Str()), "mesh");
         mesh.worldTransform = shown.worldTransform;
         mesh.parentJoint = shown.parentJoint;
+        mesh.sourceNode = hints_.nodeIndex(shown.node->mName.C_Str());
         std::size_t skipped = 0;
         std::vector<std::uint32_t> partSizes;
         std::vector<ImportedPart> parts;

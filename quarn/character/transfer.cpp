@@ -25,6 +25,7 @@ void transfer(Archive& archive, Item& joint) {
     archive(joint.name);
     archive(joint.parent);
     archive(joint.restTransform);
+    archive(joint.sourceNode);
 }
 template <class Archive, class Item>
 requires std::is_same_v<std::remove_const_t<Item>, MorphTarget>
@@ -48,6 +49,7 @@ void transfer(Archive& archive, Item& mesh) {
     archive(mesh.fileOrder);
     archive(mesh.worldTransform);
     archive(mesh.parentJoint);
+    archive(mesh.sourceNode);
 }
 template <class Archive, class Item>
 requires std::is_same_v<std::remove_const_t<Item>, JointChannel>
@@ -118,7 +120,7 @@ void checkMesh(const CharacterMesh& mesh, std::size_t joints) {
             require(influence.joint < joints && isBound[influence.joint]);
     for (const MorphTarget& target : mesh.morphTargets)
         require(target.vertices.size() == target.deltas.size() && allBelow(target.vertices, mesh.points.size()));
-    require(mesh.parentJoint >= -1 && mesh.parentJoint < static_cast<int>(joints));
+    require(mesh.parentJoint >= -1 && mesh.parentJoint < static_cast<int>(joints) && mesh.sourceNode >= -1);
 }
 
 template <class Value>
@@ -141,8 +143,10 @@ void checkAnimation(const Character& character, const Animation& animation) {
 }
 
 void checkIndices(const Character& character) {
-    for (std::size_t joint = 0; joint < character.joints.size(); ++joint)
-        require(character.joints[joint].parent >= -1 && character.joints[joint].parent < static_cast<int>(joint));
+    for (std::size_t index = 0; index < character.joints.size(); ++index) {
+        const Joint& joint = character.joints[index];
+        require(joint.parent >= -1 && joint.parent < static_cast<int>(index) && joint.sourceNode >= -1);
+    }
     for (const CharacterMesh& mesh : character.meshes)
         checkMesh(mesh, character.joints.size());
     for (const Animation& animation : character.animations)

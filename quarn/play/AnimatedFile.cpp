@@ -2,6 +2,7 @@
 #include "quarn/play/AnimatedFile.h"
 
 #include "quarn/play/ClipFile.h"
+#include "quarn/play/SourceClip.h"
 #include "quarn/play/UsdFile.h"
 #include "storage/framePattern.h"
 
@@ -16,6 +17,8 @@ std::unique_ptr<AnimatedFile> createAnimatedFile(const std::filesystem::path& pa
                                                  ClipMotion motion) {
     if (path.extension() == ".usda")
         return std::make_unique<UsdFile>(path, polygons, std::move(motion));
+    if (motion.source)
+        return std::make_unique<SourceClip>(path, std::move(polygons), std::move(motion));
     return std::make_unique<ClipFile>(path, std::move(polygons), std::move(motion));
 }
 

@@ -2,6 +2,7 @@
 // One file that holds a whole motion of a mesh, and its polygons.
 #pragma once
 
+#include "quarn/play/ClipSource.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/meshes.h"
 
@@ -11,6 +12,7 @@
 #include <optional>
 #include <span>
 #include <string>
+#include <vector>
 
 namespace quarn {
 
@@ -23,6 +25,7 @@ struct ClipMotion {
     bool isZUp = false;         ///< else y is up
     std::optional<double> allowedError =
         {}; ///< in millimetres, above 0: as few shapes as it allows, where there are any
+    std::shared_ptr<ClipSource> source = {}; ///< the file that the motion is put into; none: a file of the mesh alone
 };
 
 /// How many shapes stand for a motion, and how far from it that is at most, in millimetres.
@@ -43,12 +46,15 @@ public:
     virtual void finish() = 0;
     /// After finish(); none where the file has no shapes that were fitted.
     virtual std::optional<ShapesOfMotion> shapes() const { return std::nullopt; }
+    /// After finish(): what the user should know, sentences without a full stop.
+    virtual std::vector<std::string> notes() const { return {}; }
 };
 
 /// Whether a file of this name holds all frames of a play: ".usda", and ".glb" without "#" where there are several.
 bool isAnimatedFile(const std::filesystem::path& path, std::size_t frameCount);
-/// Throws storage::FileError where the file cannot be put into its place, and std::runtime_error, naming the path,
-/// where its format cannot hold the motion.
+/// `polygons` of the frames that are going to be added; with a source in the order of the scene. Throws
+/// storage::FileError where the file cannot be put into its place, and std::runtime_error, naming the path, where its
+/// format cannot hold the motion.
 std::unique_ptr<AnimatedFile> createAnimatedFile(const std::filesystem::path& path, MeshPolygons polygons,
                                                  ClipMotion motion);
 

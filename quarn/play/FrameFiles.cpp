@@ -25,9 +25,13 @@ std::string adviceFor(const std::string& ending) {
 }
 
 ClipMotion motionOf(const FrameWriting& writing) {
-    return {writing.meshName,          writing.frames,
-            writing.framesPerSecond,   writing.metersPerUnit * writing.space.scale,
-            writing.space.axes == "z", writing.allowedError};
+    return {writing.meshName,
+            writing.frames,
+            writing.framesPerSecond,
+            writing.metersPerUnit * writing.space.scale,
+            writing.space.axes == "z",
+            writing.allowedError,
+            writing.source};
 }
 
 } // namespace

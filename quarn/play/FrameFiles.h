@@ -33,6 +33,7 @@ struct FrameWriting {
     std::string meshName = {};               ///< as animated files call it
     double metersPerUnit = 1.0;              ///< of the scene
     std::optional<double> allowedError = {}; ///< as of a ClipMotion
+    std::shared_ptr<ClipSource> source = {}; ///< the same; with it order and space are the scene's
 };
 
 /// Every file is there as a whole or not at all; of those of all frames nothing is left without finish(). Thread:
@@ -52,6 +53,7 @@ public:
     void finish();
     /// As of an AnimatedFile.
     std::optional<ShapesOfMotion> shapes() const { return animated_ ? animated_->shapes() : std::nullopt; }
+    std::vector<std::string> notes() const { return animated_ ? animated_->notes() : std::vector<std::string>(); }
 
 private:
     std::span<const float> written(std::span<const float> xyz);

@@ -39,6 +39,7 @@ struct Options {
     int repeats = 1;
     bool isAnySizeWritten = false;
     std::string targets = "frames";
+    std::string clip;
     std::optional<double> allowedError;
 };
 
@@ -89,6 +90,46 @@ std::optional<double> allowedErrorOf(const Options& options, const FrameRange& f
     return isFitted ? std::optional(options.allowedError.value_or(usual)) : std::nullopt;
 }
 
+// what is played begins with this mesh of a file
+HObject meshOf(const PlayPlan& plan, const WarpGeometry* geometry) {
+    return meshBehind(geometry != nullptr ? geometry->input : plan.mesh);
+}
+
+// what a character was imported from is not replaced by a clip of it
+void requireOther(const fs::path& output) {
+    std::error_code none;
+    if (hasSourceFile() && fs::equivalent(sourceFile(), output, none))
+        throw std::runtime_error(output.string() + " is the character itself; name another file for the clip");
+}
+
+// the file that a clip is put into; with a note where there could be one and is none
+void addSource(PlayPlan& plan, const Options& options, const WarpGeometry* geometry) {
+    const bool isClip = plan.output.extension() == ".glb" && isAnimatedFile(plan.output, plan.frames.count());
+    if (!isClip && !options.clip.empty())
+        throw UsageError("--clip goes with -o FILE.glb and several frames");
+    const bool isAsked = options.clip == "character";
+    if (isAsked && !options.space.isTheScenes())
+        throw UsageError("--axes and --scale go with --clip mesh: the character's file has its own space");
+    if (isClip)
+        requireOther(plan.output);
+    if (!isClip || options.clip == "mesh" || (!isAsked && !hasSourceFile()))
+        return;
+    try {
+        if (!options.space.isTheScenes())
+            throw std::runtime_error("--axes and --scale are for the mesh alone");
+        plan.source = findClipSource(meshOf(plan, geometry), vertexCountOf(plan.mesh));
+        plan.order = VertexOrder();
+    } catch (const Interrupted&) {
+        throw;
+    } catch (const std::runtime_error& why) {
+        if (isAsked)
+            throw std::runtime_error("the motion cannot be put into the character's file: " + std::string(why.what()));
+        options.console.note("written is the mesh alone, without materials, UVs, pictures, skin and other meshes of "
+                             "the character: " +
+                             std::string(why.what()) + ". --clip mesh says that this is meant");
+    }
+}
+
 PlayPlan planFor(const Options& options) {
     chooseEvaluator(options.evaluator, options.device);
     const std::optional<Warp> warp = warpFor(options);
@@ -109,6 +150,7 @@ PlayPlan planFor(const Options& options) {
                                                                 : chooseModel(plan.mesh, options.model);
     addComparison(plan, options, warp ? &*warp : nullptr, geometry);
     addOrder(plan, options.order);
+    addSource(plan, options, geometry);
     return plan;
 }
 
@@ -164,6 +206,11 @@ void addClipOptions(CLI::App& command, Options& options) {
                     "Millimetres that a vertex may be off with --targets fit: 0.05 by default")
         ->check(CLI::PositiveNumber)
         ->type_name("MM");
+    command
+        .add_option("--clip", options.clip,
+                    "What a .glb of all frames is: the glTF file of the character with the motion in it (the default "
+                    "where it is one), or the mesh alone")
+        ->check(CLI::IsMember({"character", "mesh"}));
 }
 
 void addMeasureOptions(CLI::App& command, Options& options) {

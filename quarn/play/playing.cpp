@@ -67,6 +67,8 @@ public:
         if (files_) {
             files_->finish();
             result_.shapes = files_->shapes();
+            for (const std::string& note : files_->notes())
+                console_.note(note);
         }
         if (!plan_.trace.empty())
             result_.phases = writeTraceAndReadPhases(plan_.trace);
@@ -121,7 +123,7 @@ private:
         files_ = std::make_unique<FrameFiles>(plan_.output, polygonsOf(plan_.mesh),
                                               FrameWriting{plan_.order, plan_.space, plan_.frames,
                                                            framesPerSecond().value_or(24.0), plan_.meshName,
-                                                           metersPerUnit(), plan_.allowedError});
+                                                           metersPerUnit(), plan_.allowedError, plan_.source});
         if (const std::uint64_t bytes = files_->expectedBytes(); bytes != 0)
             console_.note(sizeSentence(plan_.output, bytes, plan_.isAnySizeWritten));
     }

@@ -35,6 +35,7 @@ struct PlayPlan {
     std::string meshName;                   ///< in animated files
     bool isAnySizeWritten = false;          ///< also what is far larger than the motion is worth
     std::optional<double> allowedError;     ///< as of a ClipMotion
+    std::shared_ptr<ClipSource> source;     ///< the same
     bool isOnGpu = false;                   ///< chooseEvaluator() was told so
     std::filesystem::path trace;            ///< recording of all that is timed; empty: none
     HPlug against;                          ///< mesh to compare with; null: none

@@ -28,6 +28,8 @@ void requireRead(const HStatus& status, const HPlug& plug) {
     require(status, std::string(plug.name().asChar()) + " could not be evaluated");
 }
 
+} // namespace
+
 std::string usableName(std::string name) {
     for (char& letter : name)
         if (std::isalnum(static_cast<unsigned char>(letter)) == 0 && letter != '_')
@@ -36,8 +38,6 @@ std::string usableName(std::string name) {
         name.insert(0, "_");
     return name;
 }
-
-} // namespace
 
 HObject createNode(const std::string& type, const std::string& name) {
     HStatus status;

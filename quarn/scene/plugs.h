@@ -14,6 +14,8 @@ class HMatrix;
 
 namespace quarn {
 
+/// A name as nodes have it: characters that cannot be in one become "_". Thread: any.
+std::string usableName(std::string name);
 /// A new node of that type. A name that is taken gets a number; characters that cannot be in a name become "_".
 HObject createNode(const std::string& type, const std::string& name);
 std::string nodeName(const HObject& node);

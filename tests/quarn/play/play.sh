@@ -56,6 +56,9 @@ expect 1 '' 'lost\.usda would have about 3248 MB: give --anyway' play "$scene" -
 expect 0 'played' 'clip\.glb will have about 1 MB' play "$scene" --frames 1-11 -o "$work/clip.glb"
 expect 0 '"shapes": {\s+"count": [12],' 'clip\.glb' play "$scene" --frames 1-11 --targets fit -o "$work/clip.glb" --json
 expect 2 '' 'fit goes with -o FILE\.glb' play "$scene" --frames 1 --targets fit -o "$work/clip.glb"
+expect 2 '' '--clip goes with -o FILE\.glb' play "$scene" --frames 1-3 --clip mesh -o "$work/clip.usda"
+expect 1 '' "cannot be put into the character's file: the scene knows no file" \
+  play "$scene" --frames 1-3 --clip character -o "$work/clip.glb"
 expect 2 '' '--error goes with --targets fit' play "$scene" --frames 1-3 --error 0.1 -o "$work/clip.glb"
 expect 1 '' 'has no target: connect' play "$scene" --frames 1 --against target
 expect 1 '' 'frame 1: .*none\.npy' bake "$work/lost.json" lost.outMesh --frames 1-3 -o "$work/lost.npy"
