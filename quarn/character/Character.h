@@ -62,6 +62,9 @@ struct CharacterMesh {
     std::vector<HPoint> points;              ///< in the mesh's space, w = 1; all finite
     std::vector<std::uint32_t> polygonSizes; ///< corners of each polygon, 3 or more
     std::vector<std::uint32_t> corners;      ///< indices into `points`, polygon by polygon
+    /// u and v of each texture coordinate, v up; finite. Empty: the mesh has none.
+    std::vector<float> uvs;
+    std::vector<std::uint32_t> cornerUvs; ///< for each of `corners`, which of them it has; empty where `uvs` is
     /// Those of each point: any number, by rising joint, no joint twice. [points.size()]; all empty in a mesh without
     /// skin.
     std::vector<std::vector<Influence>> influences;

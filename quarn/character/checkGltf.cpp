@@ -111,8 +111,12 @@ const Form timeForm{"SCALAR", {single}, "floats"};
 const Form moveForm{"VEC3", {single}, "floats by threes"};
 const Form turnForm{"VEC4", {single, signedByte, unsignedByte, signedShort, unsignedShort}, "rotations by fours"};
 const Form morphForm{"SCALAR", {single, signedByte, unsignedByte, signedShort, unsignedShort}, "weights"};
+// KHR_mesh_quantization: also whole numbers that stand for themselves
+const Form uvForm{
+    "VEC2", {single, signedByte, unsignedByte, signedShort, unsignedShort}, "texture coordinates by twos", false};
 // Draco decodes into what the accessor says, and nobody comes after it
 const Form dracoWeightForm{"VEC4", {single}, "floats by fours"};
+const Form dracoUvForm{"VEC2", {single}, "floats by twos"};
 
 class Accessors {
 public:
@@ -181,6 +185,7 @@ void checkPrimitive(const Accessors& accessors, const JsonValue& document, const
     if (!points)
         refuse(owner + " has no positions");
     accessors.count(member(primitive, "indices"), cornerForm, owner);
+    checkAttribute(accessors, *attributes, "TEXCOORD_0", isDraco ? dracoUvForm : uvForm, *points, owner);
     checkTargets(accessors, primitive, *points, owner);
     for (unsigned set = 0;; ++set) {
         const std::string joints = "JOINTS_" + std::to_string(set);

@@ -126,36 +126,47 @@ void keepFirstVertices(CharacterMesh& mesh) {
     keepFirstDeltas(mesh, first);
 }
 
-// appends the polygon without corners that repeat; false when too little is left
-bool appendPolygon(std::vector<std::uint32_t>& corners, const std::uint32_t* polygon, std::uint32_t size) {
-    const std::size_t begin = corners.size();
-    for (std::uint32_t i = 0; i < size; ++i)
-        if (corners.size() == begin || corners.back() != polygon[i])
-            corners.push_back(polygon[i]);
-    while (corners.size() > begin + 1 && corners.back() == corners[begin])
-        corners.pop_back();
-    if (corners.size() >= begin + 3)
+// the corners of a polygon, without those that repeat the one before; false when too little is left
+bool keepCorners(std::vector<std::size_t>& kept, const std::vector<std::uint32_t>& corners, std::size_t first,
+                 std::uint32_t size) {
+    const std::size_t begin = kept.size();
+    for (std::size_t corner = first; corner < first + size; ++corner)
+        if (kept.size() == begin || corners[kept.back()] != corners[corner])
+            kept.push_back(corner);
+    while (kept.size() > begin + 1 && corners[kept.back()] == corners[kept[begin]])
+        kept.pop_back();
+    if (kept.size() >= begin + 3)
         return true;
-    corners.resize(begin);
+    kept.resize(begin);
     return false;
+}
+
+// `kept` rises
+void keepOnly(std::vector<std::uint32_t>& numbers, const std::vector<std::size_t>& kept) {
+    if (numbers.empty())
+        return;
+    for (std::size_t i = 0; i < kept.size(); ++i)
+        numbers[i] = numbers[kept[i]];
+    numbers.resize(kept.size());
 }
 
 std::size_t renumberPolygons(CharacterMesh& mesh) {
     for (std::uint32_t& corner : mesh.corners)
         corner = mesh.joinedOf[corner];
-    std::vector<std::uint32_t> corners;
+    std::vector<std::size_t> kept;
     std::vector<std::uint32_t> sizes;
-    corners.reserve(mesh.corners.size());
+    kept.reserve(mesh.corners.size());
     sizes.reserve(mesh.polygonSizes.size());
-    const std::uint32_t* polygon = mesh.corners.data();
+    std::size_t first = 0;
     for (const std::uint32_t size : mesh.polygonSizes) {
-        const std::size_t before = corners.size();
-        if (appendPolygon(corners, polygon, size))
-            sizes.push_back(static_cast<std::uint32_t>(corners.size() - before));
-        polygon += size;
+        const std::size_t before = kept.size();
+        if (keepCorners(kept, mesh.corners, first, size))
+            sizes.push_back(static_cast<std::uint32_t>(kept.size() - before));
+        first += size;
     }
     const std::size_t gone = mesh.polygonSizes.size() - sizes.size();
-    mesh.corners = std::move(corners);
+    keepOnly(mesh.corners, kept);
+    keepOnly(mesh.cornerUvs, kept);
     mesh.polygonSizes = std::move(sizes);
     return gone;
 }

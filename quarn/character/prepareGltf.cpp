@@ -35,6 +35,7 @@ void keepReadAttributes(JsonValue& primitive, storage::JsonDocument& document) {
         return true;
     };
     keep("POSITION");
+    keep("TEXCOORD_0");
     for (unsigned set = 0; keep("JOINTS_" + std::to_string(set)) && keep("WEIGHTS_" + std::to_string(set));)
         ++set;
     attributes = kept;

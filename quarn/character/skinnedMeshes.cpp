@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/character/skinnedMeshes.h"
 
+#include "quarn/character/cornerUvs.h"
 #include "quarn/character/joinVertices.h"
 #include "quarn/character/morphTargets.h"
 #include "quarn/character/uniqueNames.h"
@@ -167,6 +168,9 @@ private:
         const aiMesh& part = *scene_.mMeshes[index];
         const auto firstPoint = static_cast<std::uint32_t>(mesh.points.size());
         appendPoints(part, mesh);
+        if (const std::size_t unusable = appendUvs(part, mesh); unusable > 0)
+            character_.warnings.push_back("the mesh \"" + mesh.name + "\" has " + std::to_string(unusable) +
+                                          " texture coordinates that are not finite; they are 0");
         mesh.influences.resize(mesh.points.size());
         appendSkin(part, firstPoint, skeleton_, mesh);
         if (part.mNumAnimMeshes > 0)
@@ -177,7 +181,9 @@ private:
     // false when nothing is left of the mesh
     bool finish(CharacterMesh mesh, const std::vector<ImportedPart>& parts, std::size_t skipped) {
         const std::string name = "the mesh \"" + mesh.name + "\" ";
+        takeCornerUvs(mesh);
         const std::size_t collapsed = joinVertices(mesh);
+        joinUvs(mesh);
         if (skipped > 0)
             character_.warnings.push_back(name + "has " + std::to_string(skipped) +
                                           " points or lines, which are left out");

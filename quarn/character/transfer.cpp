@@ -42,6 +42,8 @@ void transfer(Archive& archive, Item& mesh) {
     archive(mesh.points);
     archive(mesh.polygonSizes);
     archive(mesh.corners);
+    archive(mesh.uvs);
+    archive(mesh.cornerUvs);
     archive(mesh.influences);
     archive(mesh.bindings);
     archive(mesh.morphTargets);
@@ -108,6 +110,9 @@ void checkMesh(const CharacterMesh& mesh, std::size_t joints) {
         corners += size;
     require(corners == mesh.corners.size());
     require(allBelow(mesh.corners, mesh.points.size()) && allBelow(mesh.joinedOf, mesh.points.size()));
+    require(mesh.uvs.size() % 2 == 0 && allBelow(mesh.cornerUvs, mesh.uvs.size() / 2));
+    require(mesh.cornerUvs.size() == (mesh.uvs.empty() ? 0 : corners));
+    require(std::all_of(mesh.uvs.begin(), mesh.uvs.end(), [](float value) { return std::isfinite(value); }));
     require(mesh.influences.size() == mesh.points.size());
     require(mesh.fileOrder <= FileOrder::corners);
     std::vector<bool> isBound(joints, false);

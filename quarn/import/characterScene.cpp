@@ -49,13 +49,15 @@ void makeJoints(const Character& character, const std::vector<JointRest>& rests,
 
 // a mirroring transformation turns polygons inside out, unless they go round the other way
 MeshPolygons polygonsOf(const CharacterMesh& mesh, bool mirrored) {
-    MeshPolygons polygons{mesh.points.size(), mesh.polygonSizes, mesh.corners};
+    MeshPolygons polygons{mesh.points.size(), mesh.polygonSizes, mesh.corners, mesh.uvs, mesh.cornerUvs};
     if (!mirrored)
         return polygons;
-    auto first = polygons.corners.begin();
-    for (const std::uint32_t size : polygons.sizes) {
-        std::reverse(first, first + size);
-        first += size;
+    for (std::vector<std::uint32_t>* corners : {&polygons.corners, &polygons.uvCorners}) {
+        auto first = corners->begin();
+        for (std::size_t i = 0; first != corners->end(); ++i) {
+            std::reverse(first, first + polygons.sizes[i]);
+            first += polygons.sizes[i];
+        }
     }
     return polygons;
 }

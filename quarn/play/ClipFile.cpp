@@ -3,7 +3,6 @@
 
 #include "quarn/console/numberText.h"
 #include "quarn/play/fitClip.h"
-#include "quarn/scene/gltfParts.h"
 #include "quarn/scene/vertexNormals.h"
 
 #include <algorithm>
@@ -27,9 +26,9 @@ ClipFile::ClipFile(const std::filesystem::path& path, MeshPolygons polygons, Cli
     : path_(path)
     , file_(path)
     , polygons_(std::move(polygons))
-    , triangles_(gltfTriangles(polygons_))
+    , vertices_(polygons_)
     , motion_(std::move(motion)) {
-    if (triangles_.empty())
+    if (vertices_.triangles.empty())
         throw std::runtime_error(path.string() + ": glTF has no meshes without triangles: write .usda or .pc2");
     if (const std::uint64_t bytes = expectedBytes(); bytes > std::numeric_limits<std::uint32_t>::max())
         throw std::runtime_error(path.string() + " would have " + inGigabytes(bytes) +
@@ -38,8 +37,8 @@ ClipFile::ClipFile(const std::filesystem::path& path, MeshPolygons polygons, Cli
 
 std::uint64_t ClipFile::expectedBytes() const {
     const std::uint64_t frames = motion_.frames.count();
-    return frames * (bytesPerVertex * polygons_.vertexCount + frames * sizeof(float)) +
-           triangles_.size() * sizeof(triangles_[0]);
+    return frames * (bytesPerVertex * vertices_.count() + frames * sizeof(float)) +
+           (vertices_.uvs.size() + vertices_.triangles.size()) * sizeof(float);
 }
 
 void ClipFile::add(int frame, std::span<const float> xyz) {
@@ -48,6 +47,21 @@ void ClipFile::add(int frame, std::span<const float> xyz) {
 }
 
 MorphClip ClipFile::clip() {
+    MorphClip clip = clipOfMesh();
+    if (vertices_.copies.empty())
+        return clip;
+    split(clip.base);
+    for (ClipTarget& target : clip.targets)
+        split(target.shape);
+    return clip;
+}
+
+void ClipFile::split(ClipShape& shape) const {
+    shape.points = vertices_.withCopies<float>(shape.points, 3);
+    shape.normals = vertices_.withCopies<float>(shape.normals, 3);
+}
+
+MorphClip ClipFile::clipOfMesh() {
     if (!motion_.allowedError)
         return clipOfFrames(std::move(frames_), numbers_);
     const double millimetres = millimetresPerMeter * motion_.metersPerUnit;
@@ -66,7 +80,7 @@ void ClipFile::finish() {
     for (const int number : numbers_)
         seconds.push_back(static_cast<float>((number - zero) / motion_.framesPerSecond));
     try {
-        writeClip(file_.stream(), clip(), triangles_, seconds, motion_);
+        writeClip(file_.stream(), clip(), vertices_, seconds, motion_);
     } catch (const std::runtime_error& error) {
         throw std::runtime_error(path_.string() + " could not be written: " + error.what());
     }

@@ -4,6 +4,7 @@
 
 #include "quarn/play/AnimatedFile.h"
 #include "quarn/play/MorphClip.h"
+#include "quarn/scene/GltfVertices.h"
 #include "storage/WholeFile.h"
 
 #include <vector>
@@ -12,7 +13,7 @@ namespace quarn {
 
 /// Frames are kept until finish(): 24 bytes a vertex and frame. Between two frames every point goes on a straight line.
 /// Frame 1 is at 0 seconds, or the first one where that is before it. The node has the scale that makes metres of the
-/// mesh's unit; polygons are triangles.
+/// mesh's unit; polygons are triangles, and vertices are split where texture coordinates have a seam.
 class ClipFile : public AnimatedFile {
 public:
     ClipFile(const std::filesystem::path& path, MeshPolygons polygons, ClipMotion motion);
@@ -24,20 +25,22 @@ public:
 
 private:
     MorphClip clip();
+    MorphClip clipOfMesh();
+    void split(ClipShape& shape) const;
 
     std::filesystem::path path_;
     storage::WholeFile file_;
     MeshPolygons polygons_;
-    std::vector<std::uint32_t> triangles_;
+    GltfVertices vertices_;
     ClipMotion motion_;
     std::vector<int> numbers_;
     std::vector<ClipShape> frames_;
     std::optional<ShapesOfMotion> shapes_;
 };
 
-/// The file's content. `seconds` of each frame, rising from 0 or more; `triangles` not empty. The stream must be in the
-/// classic locale. Throws std::runtime_error where all of it is more than 4 GB.
-void writeClip(std::ostream& out, const MorphClip& clip, const std::vector<std::uint32_t>& triangles,
+/// The file's content. `clip` has vertices.count() vertices, `seconds` of each frame rise from 0 or more; there are
+/// triangles. The stream must be in the classic locale. Throws std::runtime_error where all of it is more than 4 GB.
+void writeClip(std::ostream& out, const MorphClip& clip, const GltfVertices& vertices,
                const std::vector<float>& seconds, const ClipMotion& motion);
 
 } // namespace quarn

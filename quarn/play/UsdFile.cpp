@@ -11,6 +11,8 @@ namespace quarn {
 namespace {
 
 constexpr std::uint64_t bytesPerPoint = 44; // "(-0.123456789, 1.23456789, 0.0123456789), ", with a margin
+constexpr std::uint64_t bytesPerUv = 30;
+constexpr std::uint64_t bytesPerIndex = 8;
 
 // in so many digits, whatever the locale: nine for float and seventeen for double read back as the same number
 void append(std::string& text, double value, int digits) {
@@ -41,6 +43,19 @@ void writeList(std::ostream& out, const char* name, const std::vector<std::uint3
     out << "    int[] " << name << " = [" << line << "]\n";
 }
 
+// by corner, as what reads USD takes it to a seam
+void writeUvs(std::ostream& out, const MeshPolygons& polygons) {
+    if (polygons.uvs.empty())
+        return;
+    std::string line = "[";
+    for (std::size_t i = 0; i < polygons.uvs.size(); ++i) {
+        line += i % 2 != 0 ? ", " : i == 0 ? "(" : "), (";
+        append(line, static_cast<double>(polygons.uvs[i]), 9);
+    }
+    out << "    texCoord2f[] primvars:st = " << line << ")] (\n        interpolation = \"faceVarying\"\n    )\n";
+    writeList(out, "primvars:st:indices", polygons.uvCorners);
+}
+
 bool isLetter(char c) {
     return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z') || c == '_';
 }
@@ -58,7 +73,8 @@ std::string primName(const std::string& text) {
 UsdFile::UsdFile(const std::filesystem::path& path, const MeshPolygons& polygons, ClipMotion motion)
     : file_(path)
     , motion_(std::move(motion))
-    , vertexCount_(polygons.vertexCount) {
+    , vertexCount_(polygons.vertexCount)
+    , uvBytes_(bytesPerUv * (polygons.uvs.size() / 2) + bytesPerIndex * polygons.uvCorners.size()) {
     writeHead(polygons);
 }
 
@@ -74,11 +90,12 @@ void UsdFile::writeHead(const MeshPolygons& polygons) {
         << "\"\n{\n    uniform token subdivisionScheme = \"none\"\n";
     writeList(out, "faceVertexCounts", polygons.sizes);
     writeList(out, "faceVertexIndices", polygons.corners);
+    writeUvs(out, polygons);
     out << "    point3f[] points.timeSamples = {\n";
 }
 
 std::uint64_t UsdFile::expectedBytes() const {
-    return bytesPerPoint * vertexCount_ * motion_.frames.count();
+    return bytesPerPoint * vertexCount_ * motion_.frames.count() + uvBytes_;
 }
 
 void UsdFile::add(int frame, std::span<const float> xyz) {

@@ -29,6 +29,7 @@ private:
     storage::WholeFile file_;
     ClipMotion motion_;
     std::size_t vertexCount_;
+    std::uint64_t uvBytes_;
     std::vector<int> frames_;
     std::vector<Box> boxes_; ///< of each frame
     std::string line_;

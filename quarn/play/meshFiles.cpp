@@ -34,11 +34,20 @@ void writeObj(std::ostream& out, std::span<const float> xyz, const MeshPolygons&
             appendNumber(line += ' ', xyz[3 * vertex + axis]);
         out << line << '\n';
     }
-    auto corner = polygons.corners.begin();
+    for (std::size_t uv = 0; 2 * uv < polygons.uvs.size(); ++uv) {
+        line = "vt";
+        appendNumber(line += ' ', polygons.uvs[2 * uv]);
+        appendNumber(line += ' ', polygons.uvs[2 * uv + 1]);
+        out << line << '\n';
+    }
+    std::size_t corner = 0;
     for (const std::uint32_t size : polygons.sizes) {
         line = "f";
-        for (std::uint32_t i = 0; i < size; ++i)
-            line += " " + std::to_string(std::uint64_t{*corner++} + 1);
+        for (std::uint32_t i = 0; i < size; ++i, ++corner) {
+            line += " " + std::to_string(std::uint64_t{polygons.corners[corner]} + 1);
+            if (!polygons.uvs.empty())
+                line += "/" + std::to_string(std::uint64_t{polygons.uvCorners[corner]} + 1);
+        }
         out << line << '\n';
     }
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // One posed mesh in a file that other programs open. Vertices are written in the order in which they are given, each
-// once, also where two lie at the same place or none of the polygons uses one.
+// once, also where two lie at the same place or none of the polygons uses one. Where texture coordinates have a seam
+// glTF needs vertices more, which follow behind.
 #pragma once
 
 #include "quarn/scene/meshes.h"
@@ -11,9 +12,11 @@
 
 namespace quarn {
 
-/// `xyz` 3 * polygons.vertexCount numbers. The stream must be in the classic locale. OBJ keeps all polygons.
+/// `xyz` 3 * polygons.vertexCount numbers. The stream must be in the classic locale. OBJ keeps all polygons,
+/// and texture coordinates by corner.
 void writeObj(std::ostream& out, std::span<const float> xyz, const MeshPolygons& polygons);
-/// Binary little-endian, which keeps polygons of up to 255 corners. Throws std::runtime_error for larger ones.
+/// Binary little-endian, which keeps polygons of up to 255 corners, without texture coordinates. Throws
+/// std::runtime_error for larger ones.
 void writePly(std::ostream& out, std::span<const float> xyz, const MeshPolygons& polygons);
 /// glTF 2.0 knows triangles only: polygons become fans from their first corner. `binary` GLB, else JSON with the
 /// numbers in it. Throws std::runtime_error for a mesh without vertices or polygons, and one that is too large.

@@ -8,19 +8,20 @@
 namespace quarn {
 namespace {
 
-// the accessors, by number: two for the base, two for each target, and these three
+// the accessors, by number: two for the base, two for each target, and these
 struct Accessors {
     explicit Accessors(std::size_t targetCount)
         : indices(2 + 2 * targetCount)
         , seconds(indices + 1)
-        , weights(indices + 2) {}
-    std::size_t indices, seconds, weights;
+        , weights(indices + 2)
+        , uvs(indices + 3) {}
+    std::size_t indices, seconds, weights, uvs;
 };
 
 // the binary chunk: views of what is alike, one after the other
 struct Numbers {
     std::vector<std::string_view> parts;
-    std::size_t vectorBytes = 0, indexBytes = 0, secondBytes = 0, weightBytes = 0;
+    std::size_t vectorBytes = 0, indexBytes = 0, secondBytes = 0, weightBytes = 0, uvBytes = 0;
 };
 
 void addShape(Numbers& numbers, const ClipShape& shape) {
@@ -37,8 +38,8 @@ public:
         , motion_(motion)
         , accessors_(clip.targets.size()) {}
 
-    std::string text(const Numbers& numbers, const std::vector<std::uint32_t>& triangles,
-                     const std::vector<float>& seconds) {
+    std::string text(const Numbers& numbers, const GltfVertices& vertices, const std::vector<float>& seconds) {
+        hasUvs_ = !vertices.uvs.empty();
         json_.StartObject();
         writeGltfAsset(json_);
         writeCount(json_, "scene", 0);
@@ -46,7 +47,7 @@ public:
         writeNode();
         writeMesh();
         writeAnimation();
-        writeAccessors(triangles, seconds);
+        writeAccessors(vertices, seconds);
         writeBuffer(numbers);
         json_.EndObject();
         return {buffer_.GetString(), buffer_.GetSize()};
@@ -82,6 +83,8 @@ private:
         json_.StartObject();
         writeCount(json_, "POSITION", first);
         writeCount(json_, "NORMAL", first + 1);
+        if (first == 0 && hasUvs_)
+            writeCount(json_, "TEXCOORD_0", accessors_.uvs);
         json_.EndObject();
     }
 
@@ -146,31 +149,35 @@ private:
         offset += bytesOf(shape.points).size() + bytesOf(shape.normals).size();
     }
 
-    void writeAccessors(const std::vector<std::uint32_t>& triangles, const std::vector<float>& seconds) {
+    void writeAccessors(const GltfVertices& vertices, const std::vector<float>& seconds) {
         beginList("accessors");
         std::size_t offset = 0;
         writeVectors(clip_.base, offset);
         for (const ClipTarget& target : clip_.targets)
             writeVectors(target.shape, offset);
-        beginAccessor(1, 0, gltfUnsigned, "SCALAR", triangles.size());
+        beginAccessor(1, 0, gltfUnsigned, "SCALAR", vertices.triangles.size());
         json_.EndObject();
         beginAccessor(2, 0, gltfFloat, "SCALAR", seconds.size());
         writeGltfBox(json_, seconds, 1);
         json_.EndObject();
         beginAccessor(3, 0, gltfFloat, "SCALAR", clip_.weights.size());
         json_.EndObject();
+        if (hasUvs_) {
+            beginAccessor(4, 0, gltfFloat, "VEC2", vertices.count());
+            json_.EndObject();
+        }
         json_.EndArray();
     }
 
-    void writeView(std::size_t& offset, std::size_t length, unsigned target) {
+    void writeView(std::size_t& offset, std::size_t length, unsigned target, std::size_t stride = 0) {
         json_.StartObject();
         writeCount(json_, "buffer", 0);
         writeCount(json_, "byteOffset", offset);
         writeCount(json_, "byteLength", length);
         if (target != 0)
             writeCount(json_, "target", target);
-        if (target == gltfVertexBuffer)
-            writeCount(json_, "byteStride", 3 * sizeof(float));
+        if (stride != 0)
+            writeCount(json_, "byteStride", stride);
         json_.EndObject();
         offset += length;
     }
@@ -178,10 +185,12 @@ private:
     void writeBuffer(const Numbers& numbers) {
         std::size_t offset = 0;
         beginList("bufferViews");
-        writeView(offset, numbers.vectorBytes, gltfVertexBuffer);
+        writeView(offset, numbers.vectorBytes, gltfVertexBuffer, 3 * sizeof(float));
         writeView(offset, numbers.indexBytes, gltfIndexBuffer);
         writeView(offset, numbers.secondBytes, 0);
         writeView(offset, numbers.weightBytes, 0);
+        if (hasUvs_)
+            writeView(offset, numbers.uvBytes, gltfVertexBuffer);
         json_.EndArray();
         beginList("buffers");
         json_.StartObject();
@@ -193,23 +202,26 @@ private:
     const MorphClip& clip_;
     const ClipMotion& motion_;
     Accessors accessors_;
+    bool hasUvs_ = false;
     rapidjson::StringBuffer buffer_;
     JsonWriter json_{buffer_};
 };
 
 } // namespace
 
-void writeClip(std::ostream& out, const MorphClip& clip, const std::vector<std::uint32_t>& triangles,
+void writeClip(std::ostream& out, const MorphClip& clip, const GltfVertices& vertices,
                const std::vector<float>& seconds, const ClipMotion& motion) {
     Numbers numbers;
     addShape(numbers, clip.base);
     for (const ClipTarget& target : clip.targets)
         addShape(numbers, target.shape);
-    numbers.parts.insert(numbers.parts.end(), {bytesOf(triangles), bytesOf(seconds), bytesOf(clip.weights)});
-    numbers.indexBytes = bytesOf(triangles).size();
+    numbers.parts.insert(numbers.parts.end(),
+                         {bytesOf(vertices.triangles), bytesOf(seconds), bytesOf(clip.weights), bytesOf(vertices.uvs)});
+    numbers.indexBytes = bytesOf(vertices.triangles).size();
     numbers.secondBytes = bytesOf(seconds).size();
     numbers.weightBytes = bytesOf(clip.weights).size();
-    writeGlb(out, ClipDocument(clip, motion).text(numbers, triangles, seconds), numbers.parts);
+    numbers.uvBytes = bytesOf(vertices.uvs).size();
+    writeGlb(out, ClipDocument(clip, motion).text(numbers, vertices, seconds), numbers.parts);
 }
 
 } // namespace quarn

@@ -190,6 +190,8 @@ private:
         json.Key("attributes");
         json.StartObject();
         writeCount(json, "POSITION", mesh.positions);
+        if (mesh.uvs)
+            writeCount(json, "TEXCOORD_0", *mesh.uvs);
         for (std::size_t set = 0; set < mesh.jointsAndWeights.size(); ++set) {
             writeCount(json, ("JOINTS_" + std::to_string(set)).c_str(), mesh.jointsAndWeights[set].first);
             writeCount(json, ("WEIGHTS_" + std::to_string(set)).c_str(), mesh.jointsAndWeights[set].second);

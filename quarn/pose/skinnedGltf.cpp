@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/skinnedGltf.h"
 
-#include "quarn/scene/gltfParts.h"
+#include "quarn/scene/GltfVertices.h"
 #include "quarn/scene/meshes.h"
 
 #include <algorithm>
@@ -80,27 +80,29 @@ std::vector<float> denseDeltas(const rig::ShapeDeltas& deltas, std::size_t verti
     return numbers;
 }
 
-// positions and triangles
-SkinnedGltf addMesh(const std::string& name, const HPlug& mesh, std::size_t& vertices, GltfNumbers& numbers) {
+// positions, texture coordinates and triangles
+SkinnedGltf addMesh(const std::string& name, const HPlug& mesh, const GltfVertices& vertices, GltfNumbers& numbers) {
     std::vector<float> points;
     readPoints(mesh, points);
-    const std::vector<std::uint32_t> triangles = gltfTriangles(polygonsOf(mesh));
-    vertices = points.size() / 3;
-    if (points.empty() || triangles.empty())
-        throw std::runtime_error("the mesh " + name + " has " + std::to_string(vertices) + " vertices and " +
-                                 std::to_string(triangles.size() / 3) + " triangles");
+    if (points.empty() || vertices.triangles.empty())
+        throw std::runtime_error("the mesh " + name + " has " + std::to_string(points.size() / 3) + " vertices and " +
+                                 std::to_string(vertices.triangles.size() / 3) + " triangles");
     SkinnedGltf made;
     made.name = name;
-    made.positions = numbers.add(points, {Shape::vec3, Use::vertices, true});
-    made.indices = numbers.add(triangles, {Shape::scalar, Use::indices});
+    made.positions = numbers.add(vertices.withCopies<float>(points, 3), {Shape::vec3, Use::vertices, true});
+    if (!vertices.uvs.empty())
+        made.uvs = numbers.add(vertices.uvs, {Shape::vec2, Use::vertices});
+    made.indices = numbers.add(vertices.triangles, {Shape::scalar, Use::indices});
     return made;
 }
 
-void addTargets(const SceneShapes& shapes, std::size_t vertices, GltfNumbers& numbers, SkinnedGltf& made) {
-    for (const SceneShapes::Shape& shape : shapes.shapes)
+void addTargets(const SceneShapes& shapes, const GltfVertices& vertices, GltfNumbers& numbers, SkinnedGltf& made) {
+    for (const SceneShapes::Shape& shape : shapes.shapes) {
+        const std::vector<float> deltas = denseDeltas(shape.deltas, vertices.meshVertices);
         made.targets.push_back({shape.name,
-                                numbers.add(denseDeltas(shape.deltas, vertices), {Shape::vec3, Use::vertices, true}),
+                                numbers.add(vertices.withCopies<float>(deltas, 3), {Shape::vec3, Use::vertices, true}),
                                 shape.restWeight});
+    }
 }
 
 } // namespace
@@ -119,24 +121,26 @@ std::string whyNotInGltf(const SceneSkin& skin) {
 
 SkinnedGltf addSkinned(const SceneSkin& skin, const SceneShapes* shapes, const std::vector<HMatrix>& restWorlds,
                        GltfNumbers& numbers) {
-    std::size_t vertices = 0;
-    SkinnedGltf made = addMesh(skin.mesh, shapes == nullptr ? skin.input : shapes->input, vertices, numbers);
-    if (vertices != skin.weights.vertexCount())
-        throw std::runtime_error("the mesh " + skin.mesh + " has " + std::to_string(vertices) +
+    const HPlug& mesh = shapes == nullptr ? skin.input : shapes->input;
+    const GltfVertices vertices(polygonsOf(mesh));
+    SkinnedGltf made = addMesh(skin.mesh, mesh, vertices, numbers);
+    if (vertices.meshVertices != skin.weights.vertexCount())
+        throw std::runtime_error("the mesh " + skin.mesh + " has " + std::to_string(vertices.meshVertices) +
                                  " vertices, and its skin " + skin.node + " has " +
                                  std::to_string(skin.weights.vertexCount()) + " vertices");
     if (shapes != nullptr)
         addTargets(*shapes, vertices, numbers, made);
     const InfluenceSets sets = setsOf(skin);
     for (std::size_t set = 0; set < sets.joints.size(); ++set)
-        made.jointsAndWeights.emplace_back(numbers.add(sets.joints[set], {Shape::vec4, Use::vertices}),
-                                           numbers.add(sets.weights[set], {Shape::vec4, Use::vertices}));
+        made.jointsAndWeights.emplace_back(
+            numbers.add(vertices.withCopies<std::uint16_t>(sets.joints[set], setSize), {Shape::vec4, Use::vertices}),
+            numbers.add(vertices.withCopies<float>(sets.weights[set], setSize), {Shape::vec4, Use::vertices}));
     made.inverseBinds = numbers.add(inverseBindsOf(skin, restWorlds), {Shape::mat4});
     return made;
 }
 
 SkinnedGltf addMorphed(const SceneShapes& shapes, GltfNumbers& numbers) {
-    std::size_t vertices = 0;
+    const GltfVertices vertices(polygonsOf(shapes.input));
     SkinnedGltf made = addMesh(shapes.mesh, shapes.input, vertices, numbers);
     addTargets(shapes, vertices, numbers, made);
     return made;

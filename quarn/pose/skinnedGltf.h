@@ -20,6 +20,7 @@ struct SkinnedGltf {
     };
     std::string name;
     std::size_t positions = 0;
+    std::optional<std::size_t> uvs;                                    ///< none: the mesh has none
     std::size_t indices = 0;                                           ///< of triangles
     std::vector<std::pair<std::size_t, std::size_t>> jointsAndWeights; ///< sets of four influences a vertex
     std::optional<std::size_t> inverseBinds;                           ///< of all joints of the scene; none: no skin
@@ -32,8 +33,8 @@ std::string whyNotInGltf(const SceneSkin& skin);
 
 /// Adds the numbers of a skin that glTF can hold; every joint of the scene is one of the skin's, by its index.
 /// `restWorlds` [joints] where they are at rest: those that move nothing are bound there. Polygons become fans of
-/// triangles, weights are brought to a sum of 1. `shapes`, or null, move the mesh before the skin. Throws
-/// std::runtime_error. Thread: main.
+/// triangles, weights are brought to a sum of 1, vertices are split where texture coordinates have a seam. `shapes`, or
+/// null, move the mesh before the skin. Throws std::runtime_error. Thread: main.
 SkinnedGltf addSkinned(const SceneSkin& skin, const SceneShapes* shapes, const std::vector<HMatrix>& restWorlds,
                        GltfNumbers& numbers);
 

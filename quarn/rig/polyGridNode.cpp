@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "rig/polyGridNode.h"
 
+#include "openquarn/HFnMesh.h"
 #include "openquarn/HFnMeshData.h"
 #include "openquarn_helpers/AttributeMaker.h"
 #include "openquarn_helpers/guard.h"
@@ -96,6 +97,21 @@ HIntArray cornersOf(const Grid& grid) {
     return corners;
 }
 
+// seen from above, u goes to the right and v up: it is 1 in the first row
+HStatus addUvs(const Grid& grid, const HIntArray& corners, HObject& mesh) {
+    HFloatArray us(static_cast<unsigned>((grid.columns + 1) * (grid.rows + 1))), vs(us.length());
+    unsigned vertex = 0;
+    for (int row = 0; row <= grid.rows; ++row)
+        for (int column = 0; column <= grid.columns; ++column) {
+            us[vertex] = static_cast<float>(static_cast<double>(column) / grid.columns);
+            vs[vertex++] = static_cast<float>(1.0 - static_cast<double>(row) / grid.rows);
+        }
+    HFnMesh set(mesh);
+    const HStatus status = set.setUVs(us, vs, corners);
+    mesh = set.object();
+    return status;
+}
+
 HStatus makeMesh(const Grid& grid, HObject& mesh) {
     HStatus status = check(grid);
     if (status.error())
@@ -103,8 +119,9 @@ HStatus makeMesh(const Grid& grid, HObject& mesh) {
     HIntArray counts(static_cast<unsigned>(grid.columns * grid.rows));
     for (int& count : counts)
         count = 4;
-    mesh = HFnMeshData().create(pointsOf(grid), counts, cornersOf(grid), &status);
-    return status;
+    const HIntArray corners = cornersOf(grid);
+    mesh = HFnMeshData().create(pointsOf(grid), counts, corners, &status);
+    return status.error() ? status : addUvs(grid, corners, mesh);
 }
 
 } // namespace

@@ -17,7 +17,7 @@ struct ShapeText {
 };
 
 ShapeText textOf(GltfNumbers::Shape shape) {
-    constexpr std::array<ShapeText, 4> texts = {{{"SCALAR", 1}, {"VEC3", 3}, {"VEC4", 4}, {"MAT4", 16}}};
+    constexpr std::array<ShapeText, 5> texts = {{{"SCALAR", 1}, {"VEC2", 2}, {"VEC3", 3}, {"VEC4", 4}, {"MAT4", 16}}};
     return texts.at(static_cast<std::size_t>(shape));
 }
 

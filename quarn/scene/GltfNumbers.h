@@ -18,7 +18,7 @@ namespace quarn {
 /// Lists of numbers, one after the other, and the accessors by which a document knows them. Thread: one at a time.
 class GltfNumbers {
 public:
-    enum class Shape { scalar, vec3, vec4, mat4 };
+    enum class Shape { scalar, vec2, vec3, vec4, mat4 };
     /// What the numbers are for; `plain` for what is neither, as inverse bind matrices and keys.
     enum class Use { plain, vertices, indices };
     struct Kind {

@@ -18,18 +18,6 @@ void putNumber(std::ostream& out, std::size_t number) {
 
 } // namespace
 
-std::vector<std::uint32_t> gltfTriangles(const MeshPolygons& polygons) {
-    std::vector<std::uint32_t> triangles;
-    triangles.reserve(3 * polygons.sizes.size());
-    const std::uint32_t* corner = polygons.corners.data();
-    for (const std::uint32_t size : polygons.sizes) {
-        for (std::uint32_t i = 2; i < size; ++i)
-            triangles.insert(triangles.end(), {corner[0], corner[i - 1], corner[i]});
-        corner += size;
-    }
-    return triangles;
-}
-
 void writeGltfAsset(JsonWriter& json) {
     json.Key("asset");
     json.StartObject();

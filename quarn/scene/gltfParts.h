@@ -3,7 +3,6 @@
 #pragma once
 
 #include "quarn/console/json.h"
-#include "quarn/scene/meshes.h"
 
 #include <cstdint>
 #include <iosfwd>
@@ -18,9 +17,6 @@ constexpr unsigned gltfVertexBuffer = 34962; ///< `target` of a buffer view
 constexpr unsigned gltfIndexBuffer = 34963;
 constexpr unsigned gltfFloat = 5126; ///< `componentType` of an accessor
 constexpr unsigned gltfUnsigned = 5125;
-
-/// Polygons as fans of triangles from their first corner: three vertices each.
-std::vector<std::uint32_t> gltfTriangles(const MeshPolygons& polygons);
 
 /// The bytes of numbers, which stay where they are.
 template <class Numbers>

@@ -53,6 +53,30 @@ void read(const HPlug& mesh, std::vector<Number>& xyz) {
     std::transform(from, from + xyz.size(), xyz.begin(), [](double value) { return static_cast<Number>(value); });
 }
 
+void readUvs(const HFnMesh& mesh, const HPlug& plug, MeshPolygons& polygons) {
+    HFloatArray us, vs;
+    HIntArray corners;
+    require(mesh.getUVs(us, vs, corners), plug);
+    for (unsigned uv = 0; uv < us.length(); ++uv)
+        polygons.uvs.insert(polygons.uvs.end(), {us[uv], vs[uv]});
+    for (const int uv : corners)
+        polygons.uvCorners.push_back(static_cast<std::uint32_t>(uv));
+}
+
+HStatus setUvs(HFnMesh mesh, const MeshPolygons& polygons, HObject& data) {
+    HFloatArray us(static_cast<unsigned>(polygons.uvs.size() / 2)), vs(us.length());
+    for (unsigned uv = 0; uv < us.length(); ++uv) {
+        us[uv] = polygons.uvs[2 * std::size_t{uv}];
+        vs[uv] = polygons.uvs[2 * std::size_t{uv} + 1];
+    }
+    HIntArray corners(static_cast<unsigned>(polygons.uvCorners.size()));
+    for (unsigned corner = 0; corner < corners.length(); ++corner)
+        corners[corner] = static_cast<int>(polygons.uvCorners[corner]);
+    const HStatus status = mesh.setUVs(us, vs, corners);
+    data = mesh.object();
+    return status;
+}
+
 } // namespace
 
 MeshPolygons polygonsOf(const HPlug& plug) {
@@ -70,6 +94,7 @@ MeshPolygons polygonsOf(const HPlug& plug) {
         for (const int vertex : vertices)
             polygons.corners.push_back(static_cast<std::uint32_t>(vertex));
     }
+    readUvs(mesh, plug, polygons);
     return polygons;
 }
 
@@ -122,6 +147,8 @@ HObject meshData(std::span<const double> xyz, const MeshPolygons& polygons) {
         corners[corner] = static_cast<int>(polygons.corners[corner]);
     HStatus status;
     HObject data = HFnMeshData().create(points, counts, corners, &status);
+    if (!status.error() && !polygons.uvs.empty())
+        status = setUvs(HFnMesh(data), polygons, data);
     if (status.error())
         throw std::runtime_error(std::string("the mesh cannot be made: ") + status.errorString().asChar());
     return data;

@@ -15,8 +15,10 @@ namespace quarn {
 /// Polygons of a mesh; points go beside it, since they change from frame to frame.
 struct MeshPolygons {
     std::size_t vertexCount = 0;
-    std::vector<std::uint32_t> sizes;   ///< corners of each polygon, 2 or more
-    std::vector<std::uint32_t> corners; ///< vertices, polygon by polygon, in winding order; below vertexCount
+    std::vector<std::uint32_t> sizes;          ///< corners of each polygon, 2 or more
+    std::vector<std::uint32_t> corners;        ///< vertices, polygon by polygon, in winding order; below vertexCount
+    std::vector<float> uvs = {};               ///< u and v of each texture coordinate, v up; empty: none
+    std::vector<std::uint32_t> uvCorners = {}; ///< for each of `corners`, which of them it has; empty where `uvs` is
 };
 
 /// Evaluates a plug that holds a mesh. Throws std::runtime_error, naming the plug, when it fails or holds none.

@@ -39,7 +39,8 @@ Triple pointAt(const MeshData& mesh, unsigned vertex) {
 
 std::string describe(const MeshData& mesh) {
     std::string text = counted(mesh.vertexCount(), "vertex", "vertices") + ", " +
-                       counted(mesh.topology->polygonCount(), "polygon", "polygons");
+                       counted(mesh.topology->polygonCount(), "polygon", "polygons") +
+                       (mesh.uvs ? ", " + counted(mesh.uvs->count(), "UV", "UVs") : "");
     if (mesh.vertexCount() == 0)
         return text;
     Triple low = pointAt(mesh, 0);

@@ -102,6 +102,14 @@ void writeMesh(JsonWriter& writer, const Data& data, const std::string&) {
         counts[i] = mesh.topology->offsets[i + 1] - mesh.topology->offsets[i];
     writeIntegers(writer, "counts", counts);
     writeIntegers(writer, "corners", mesh.topology->corners);
+    if (mesh.uvs) {
+        writer.key("uvs");
+        writer.StartArray();
+        for (const float number : mesh.uvs->uvs)
+            writer.floatNumber(number);
+        writer.EndArray();
+        writeIntegers(writer, "uvCorners", mesh.uvs->corners);
+    }
     if (mesh.tags && !mesh.tags->empty()) {
         writer.key("tags");
         writer.StartObject();
@@ -142,6 +150,21 @@ HPointArray readPoints(const Value& list) {
     return points;
 }
 
+std::shared_ptr<MeshData> readUvs(const Value& object, const MeshData& mesh) {
+    const Value& list = listIn(object, "uvs");
+    std::vector<double> numbers(list.Size());
+    if (numbers.size() % 2 != 0 || !readNumbers(list, numbers))
+        throw std::invalid_argument("its uvs are not two numbers each");
+    HFloatArray us(static_cast<unsigned>(numbers.size() / 2)), vs(us.length());
+    for (unsigned uv = 0; uv < us.length(); ++uv) {
+        us[uv] = static_cast<float>(numbers[2 * std::size_t{uv}]);
+        vs[uv] = static_cast<float>(numbers[2 * std::size_t{uv} + 1]);
+    }
+    HIntArray corners;
+    readIntegers(listIn(object, "uvCorners"), corners);
+    return withUvs(mesh, us, vs, corners);
+}
+
 std::shared_ptr<const ComponentTags> readTags(const Value& object) {
     auto tags = std::make_shared<ComponentTags>();
     for (const auto& member : object.GetObject()) {
@@ -164,7 +187,9 @@ std::shared_ptr<Data> readMesh(const Attribute&, const Value& value, std::string
         HIntArray corners;
         readIntegers(listIn(value, "counts"), counts);
         readIntegers(listIn(value, "corners"), corners);
-        const std::shared_ptr<MeshData> mesh = makeMesh(readPoints(listIn(value, "points")), counts, corners);
+        std::shared_ptr<MeshData> mesh = makeMesh(readPoints(listIn(value, "points")), counts, corners);
+        if (value.HasMember("uvs") || value.HasMember("uvCorners"))
+            mesh = readUvs(value, *mesh);
         const auto tags = value.FindMember("tags");
         if (tags == value.MemberEnd())
             return mesh;
@@ -238,7 +263,7 @@ const DataFormat* formatOf(HFnData::Type type) {
         {HFnData::kString, {"hex"}, writeString, readString},
         {HFnData::kMatrix, {}, writeMatrix, readMatrix},
         {HFnData::kDoubleArray, {}, writeDoubles, readDoubles},
-        {HFnData::kMesh, {"points", "counts", "corners", "tags"}, writeMesh, readMesh},
+        {HFnData::kMesh, {"points", "counts", "corners", "uvs", "uvCorners", "tags"}, writeMesh, readMesh},
         {HFnData::kPlugin, {"typeId", "text"}, writePlugin, readPlugin},
     };
     for (const DataFormat& format : formats)

@@ -66,7 +66,7 @@ void GeometryPoints::copyFrom(const HPointArray& points) {
 
 const std::shared_ptr<MeshData>& GeometryPoints::result() {
     if (written_) {
-        mesh_ = std::make_shared<MeshData>(mesh_->topology, written_, mesh_->tags);
+        mesh_ = mesh_->withPositions(written_);
         written_.reset();
     }
     return mesh_;

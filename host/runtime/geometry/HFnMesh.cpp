@@ -191,6 +191,28 @@ HStatus HFnMesh::getPoints(HPointArray& points) const {
                     [&](const MeshData& mesh) -> HStatus { return copyPoints(*mesh.points, points); });
 }
 
+HStatus HFnMesh::getUVs(HFloatArray& us, HFloatArray& vs, HIntArray& corners) const {
+    return withMesh(Operation::HFnMesh_getUVs, object_, [&](const MeshData& mesh) -> HStatus {
+        const std::size_t count = mesh.uvs ? mesh.uvs->count() : 0;
+        HStatus status = us.setLength(static_cast<unsigned>(count));
+        if (!status.error())
+            status = vs.setLength(static_cast<unsigned>(count));
+        if (status.error())
+            return status;
+        for (unsigned uv = 0; uv < count; ++uv) {
+            us[uv] = mesh.uvs->uvs[2 * std::size_t{uv}];
+            vs[uv] = mesh.uvs->uvs[2 * std::size_t{uv} + 1];
+        }
+        return mesh.uvs ? corners.assign(mesh.uvs->corners.data(), static_cast<unsigned>(mesh.uvs->corners.size()))
+                        : corners.setLength(0);
+    });
+}
+
+HStatus HFnMesh::setUVs(const HFloatArray& us, const HFloatArray& vs, const HIntArray& corners) {
+    return replaceMesh(Operation::HFnMesh_setUVs, object_,
+                       [&](const MeshData& mesh) { return withUvs(mesh, us, vs, corners); });
+}
+
 HStatus HFnMesh::setPoints(const HPointArray& points) {
     return replaceMesh(Operation::HFnMesh_setPoints, object_,
                        [&](const MeshData& mesh) { return withPoints(mesh, points); });

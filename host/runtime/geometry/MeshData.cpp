@@ -4,6 +4,7 @@
 #include "core/text.h"
 #include "geometry/forRanges.h"
 
+#include <cmath>
 #include <limits>
 #include <stdexcept>
 
@@ -72,11 +73,35 @@ void checkTag(const MeshData& mesh, const std::string& name, const HUintArray& v
     }
 }
 
+void checkUvs(const MeshData& mesh, const HFloatArray& us, const HFloatArray& vs, const HIntArray& corners) {
+    if (us.length() != vs.length() || us.length() > static_cast<std::size_t>(std::numeric_limits<int>::max()))
+        throw std::invalid_argument("UVs with " + number(us.length()) + " times u and " + number(vs.length()) +
+                                    " times v");
+    for (std::size_t uv = 0; uv < us.length(); ++uv)
+        if (!std::isfinite(us[uv]) || !std::isfinite(vs[uv]))
+            throw std::invalid_argument("UV " + number(uv) + " is not finite");
+    if (corners.length() != mesh.topology->corners.size())
+        throw std::invalid_argument("UVs for " + number(corners.length()) + " corners: the polygons have " +
+                                    number(mesh.topology->corners.size()));
+    for (std::size_t corner = 0; corner < corners.length(); ++corner)
+        if (corners[corner] < 0 || static_cast<std::size_t>(corners[corner]) >= us.length())
+            throw std::invalid_argument("corner " + number(corner) + " has UV " + std::to_string(corners[corner]) +
+                                        " of " + number(us.length()));
+}
+
 std::shared_ptr<ComponentTags> copyOfTags(const MeshData& mesh) {
     return mesh.tags ? std::make_shared<ComponentTags>(*mesh.tags) : std::make_shared<ComponentTags>();
 }
 
 } // namespace
+
+std::shared_ptr<MeshData> MeshData::withPositions(std::shared_ptr<const Positions> positions) const {
+    return std::make_shared<MeshData>(topology, std::move(positions), tags, uvs);
+}
+
+std::shared_ptr<MeshData> MeshData::withComponentTags(std::shared_ptr<const ComponentTags> componentTags) const {
+    return std::make_shared<MeshData>(topology, points, std::move(componentTags), uvs);
+}
 
 std::shared_ptr<const HUintArray> MeshData::tag(const std::string& name) const {
     if (!tags)
@@ -101,27 +126,40 @@ std::shared_ptr<MeshData> withPoints(const MeshData& mesh, const HPointArray& po
     if (points.length() != mesh.vertexCount())
         throw std::invalid_argument("a mesh of " + number(mesh.vertexCount()) + " vertices cannot have " +
                                     number(points.length()) + " points");
-    return std::make_shared<MeshData>(mesh.topology, positionsOf(points), mesh.tags);
+    return mesh.withPositions(positionsOf(points));
 }
 
 std::shared_ptr<MeshData> withTag(const MeshData& mesh, const std::string& name, const HUintArray& vertices) {
     checkTag(mesh, name, vertices);
     const std::shared_ptr<ComponentTags> tags = copyOfTags(mesh);
     (*tags)[name] = std::make_shared<HUintArray>(vertices);
-    return std::make_shared<MeshData>(mesh.topology, mesh.points, tags);
+    return mesh.withComponentTags(tags);
 }
 
 std::shared_ptr<MeshData> withTags(const MeshData& mesh, const std::shared_ptr<const ComponentTags>& tags) {
     for (const auto& [name, vertices] : *tags)
         checkTag(mesh, name, *vertices);
-    return std::make_shared<MeshData>(mesh.topology, mesh.points, tags);
+    return mesh.withComponentTags(tags);
 }
 
 std::shared_ptr<MeshData> withoutTag(const MeshData& mesh, const std::string& name) {
     const std::shared_ptr<ComponentTags> tags = copyOfTags(mesh);
     if (tags->erase(name) == 0)
         throw std::invalid_argument("the geometry has no component tag '" + name + "'");
-    return std::make_shared<MeshData>(mesh.topology, mesh.points, tags);
+    return mesh.withComponentTags(tags);
+}
+
+std::shared_ptr<MeshData> withUvs(const MeshData& mesh, const HFloatArray& us, const HFloatArray& vs,
+                                  const HIntArray& corners) {
+    if (us.length() == 0 && vs.length() == 0 && corners.length() == 0)
+        return std::make_shared<MeshData>(mesh.topology, mesh.points, mesh.tags);
+    checkUvs(mesh, us, vs, corners);
+    const auto set = std::make_shared<UvSet>();
+    set->uvs.reserve(2 * std::size_t{us.length()});
+    for (unsigned uv = 0; uv < us.length(); ++uv)
+        set->uvs.insert(set->uvs.end(), {us[uv], vs[uv]});
+    set->corners.assign(corners.begin(), corners.end());
+    return std::make_shared<MeshData>(mesh.topology, mesh.points, mesh.tags, set);
 }
 
 HStatus copyPoints(const Positions& from, HPointArray& points) {

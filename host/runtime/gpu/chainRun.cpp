@@ -156,7 +156,7 @@ private:
         const std::shared_ptr<Positions> points = chain_.links.back().state->pool->take(chain_.mesh->vertexCount());
         if (downloadPositions(positions_, *points) != CL_SUCCESS)
             return nullptr;
-        return std::make_shared<MeshData>(chain_.mesh->topology, points, chain_.mesh->tags);
+        return chain_.mesh->withPositions(points);
     }
 
     Chain& chain_;

@@ -2,6 +2,8 @@
 // layer.mjs make CACHE.npy FRAMES: points of any size for the strip of the example of the wave, by a fixed sequence.
 // layer.mjs check LAYER.usda CACHE.npy TEXT...: the layer has the cache's points to the bit, their boxes, the strip's
 // polygons, and each TEXT. Exit status 1, and a sentence, where it has not.
+// layer.mjs character FILE.gltf: two quads side by side, cut into triangles, apart at a seam of their picture.
+// layer.mjs uvs LAYER.usda: it has this mesh with the texture coordinates of every corner, to the bit.
 import { readFileSync, writeFileSync } from "node:fs";
 
 const vertexCount = 369;
@@ -88,6 +90,54 @@ async function check(layer, cache, ...texts) {
     fail(`${corners.length} corners`);
 }
 
+const quads = {
+  points: [0, 0, 0, 1, 0, 0, 1, 1, 0, 0, 1, 0, 1, 0, 0, 2, 0, 0, 2, 1, 0, 1, 1, 0],
+  uvs: [0, 0.1, 0.3, 0.1, 0.3, 0.95, 0, 0.95, 0.3, 0.1, 1, -3.7, 1e-5, 0.6, 0.7, 0.6],
+  corners: [0, 1, 2, 0, 2, 3, 4, 5, 6, 4, 6, 7],
+};
+
+function character(path) {
+  const lists = [Float32Array.from(quads.points), Float32Array.from(quads.uvs), Uint32Array.from(quads.corners)];
+  const bytes = Buffer.concat(lists.map((list) => Buffer.from(list.buffer)));
+  let end = 0;
+  const bufferViews = lists.map(({ byteLength }) => {
+    end += byteLength;
+    return { buffer: 0, byteOffset: end - byteLength, byteLength };
+  });
+  const accessor = (bufferView, type, componentType, count) => ({ bufferView, type, componentType, count });
+  const gltf = {
+    asset: { version: "2.0" },
+    scene: 0,
+    scenes: [{ nodes: [0] }],
+    nodes: [{ name: "sheet", mesh: 0 }],
+    meshes: [{ primitives: [{ attributes: { POSITION: 0, TEXCOORD_0: 1 }, indices: 2 }] }],
+    accessors: [accessor(0, "VEC3", 5126, 8), accessor(1, "VEC2", 5126, 8), accessor(2, "SCALAR", 5125, 12)],
+    bufferViews,
+    buffers: [{ byteLength: end, uri: `data:application/octet-stream;base64,${bytes.toString("base64")}` }],
+  };
+  writeFileSync(path, JSON.stringify(gltf));
+}
+
+async function checkUvs(layer) {
+  const text = await textOf(layer);
+  if (!/primvars:st = [^(]*\([^)]*\).*interpolation = "faceVarying"/s.test(text)) fail(`no primvars:st in\n${text}`);
+  const uvs = listOf(text, "primvars:st");
+  const indices = listOf(text, "primvars:st:indices");
+  const points = samplesOf(text, "points")[0][1];
+  const at = (list, width, index) => [...list.subarray(width * index, width * (index + 1))];
+  const corners = [...listOf(text, "faceVertexIndices")].map((vertex) => at(points, 3, vertex));
+  requireEqual("points", [points.length], [18]);
+  const wanted = quads.corners.flatMap((vertex) => at(Float32Array.from(quads.points), 3, vertex));
+  requireEqual("corners", corners.flat(), wanted);
+  const texture = quads.corners.flatMap((vertex) => {
+    const [u, v] = at(Float32Array.from(quads.uvs), 2, vertex);
+    return [u, Math.fround(1 - v)];
+  });
+  requireEqual("primvars:st", [...indices].flatMap((index) => at(uvs, 2, index)), texture);
+}
+
 const [, , mode, ...words] = process.argv;
 if (mode === "make") make(words[0], Number(words[1]));
+else if (mode === "character") character(words[0]);
+else if (mode === "uvs") await checkUvs(words[0]);
 else await check(...words);

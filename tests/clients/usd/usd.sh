@@ -1,5 +1,6 @@
 #!/usr/bin/env bash
-# usd.sh QUARN: a layer of USD that quarn writes, read by another program: the same bits of every point in every frame.
+# usd.sh QUARN: a layer of USD that quarn writes, read by another program: the same bits of every point in every frame,
+# and of the texture coordinates of every corner.
 # Skipped, in one word, where node or the parser is missing; fails then where NW_ALL_CLIENTS is set.
 set -euo pipefail
 quarn=$1
@@ -41,4 +42,10 @@ written --frames -1-3x2 --axes z --scale 100 -o "$work/any.usda"
 expect 0 'frames' '' play "$work/any.json" --plug any.outMesh --frames -1-3x2 --axes z --scale 100 \
   -o "$work/z.npy" --json --quiet
 check "$work/any.usda" "$work/z.npy" 'metersPerUnit = 1' 'upAxis = "Z"' 'endTimeCode = 3'
+
+# texture coordinates, from a file of another format
+node "$here/layer.mjs" character "$work/sheet.gltf"
+expect 0 'sheet' '' import "$work/sheet.gltf" -o "$work/sheet.json"
+expect 0 'frames' 'sheet\.usda will have' play "$work/sheet.json" --plug sheet.outMesh --frames 1-2 -o "$work/sheet.usda"
+node "$here/layer.mjs" uvs "$work/sheet.usda" >"$work/out" 2>"$work/err" || fail "sheet.usda:"
 exit $bad

@@ -42,6 +42,12 @@ std::string meshText(const HObject& object) {
     HIntArray vertices;
     for (int polygon = 0; !mesh.getPolygonVertices(polygon, vertices).error(); ++polygon)
         text << ::testing::PrintToString(std::vector<int>(vertices.begin(), vertices.end()));
+    HFloatArray us, vs;
+    HIntArray corners;
+    mesh.getUVs(us, vs, corners);
+    for (unsigned uv = 0; uv < us.length(); ++uv)
+        text << std::bit_cast<std::uint32_t>(us[uv]) << ' ' << std::bit_cast<std::uint32_t>(vs[uv]) << ' ';
+    text << ::testing::PrintToString(std::vector<int>(corners.begin(), corners.end()));
     const HFnGeometryData geometry(object);
     HStringArray tags;
     geometry.getComponentTags(tags);
@@ -175,7 +181,10 @@ HObject anyMesh(Random& random) {
         mesh.create(points, {3, 5}, {0, 1, 2, 5, 4, 3, 2, 1});
     if (below(random, 2) == 0)
         mesh.setComponentTag("shuffled", {5, 0, 3});
-    return mesh.object();
+    HFnMesh textured(mesh.object());
+    if (below(random, 2) == 0) // refused by those without polygons
+        textured.setUVs({anyFloat(random), 0.1F}, {anyFloat(random), anyFloat(random)}, {0, 1, 0, 1, 1, 0, 0, 1});
+    return textured.object();
 }
 
 unsigned anyIndex(Random& random) {

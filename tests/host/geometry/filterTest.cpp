@@ -72,7 +72,9 @@ TEST_F(FilterTest, OneGeometryLeavesTheOthersAlone) {
 TEST_F(FilterTest, UnsetPointsAreSharedAndSetOnesAreNot) {
     create("testDeformer", "d");
     create("testDeformer", "e");
-    const HObject mesh = withTag(grid(3, 3), "some", {8, 1});
+    HFnMesh textured(withTag(grid(3, 3), "some", {8, 1}));
+    EXPECT_EQ(text(textured.setUVs({0.5F}, {0.25F}, HIntArray(16))), "");
+    const HObject mesh = textured.object();
     set(input("d", 0), mesh);
     connect(output("d", 0), input("e", 0));
     Hooks::deform = [](HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
@@ -84,6 +86,10 @@ TEST_F(FilterTest, UnsetPointsAreSharedAndSetOnesAreNot) {
     const HObject result = plug(output("e", 0)).asHObject();
     HUintArray tag;
     EXPECT_EQ(text(HFnGeometryData(result).getComponentTag("some", tag)), "");
+    HFloatArray us, vs;
+    HIntArray corners;
+    EXPECT_EQ(text(HFnMesh(result).getUVs(us, vs, corners)), "");
+    EXPECT_EQ(corners.length(), 16U);
 
     // what was handed out stays as it was, also when its buffer would come in handy
     for (int frame = 2; frame < 6; ++frame) {

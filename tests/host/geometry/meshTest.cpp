@@ -7,6 +7,8 @@
 #include "openquarn/HFnMesh.h"
 #include "openquarn/HItGeometry.h"
 
+#include <limits>
+
 namespace {
 
 using namespace testNodes;
@@ -109,6 +111,50 @@ TEST_F(Mesh, TagsKeepTheirOrderAndAreChecked) {
     EXPECT_THAT(text(data.removeComponentTag("high")), HasSubstr("no component tag 'high'"));
     EXPECT_EQ(text(data.removeComponentTag("some")), "");
     EXPECT_EQ(data.getComponentTag("some", vertices), HStatus::kFailure);
+}
+
+TEST_F(Mesh, UVsBelongToCornersAndAreChecked) {
+    const HObject plain = testDeformers::withTag(grid(3, 2), "corner", {0}); // two quads
+    HFnMesh mesh(plain);
+    const HIntArray seam{0, 1, 2, 3, 0, 3, 2, 1};
+    EXPECT_EQ(text(mesh.setUVs({0, 1, 1, 0.25F}, {0, 0, 1, 1}, seam)), "");
+    const auto expectUvs = [&](const HObject& object) {
+        HFloatArray us, vs;
+        HIntArray corners;
+        EXPECT_EQ(text(HFnMesh(object).getUVs(us, vs, corners)), "");
+        EXPECT_THAT(us, ElementsAre(0, 1, 1, 0.25F));
+        EXPECT_THAT(vs, ElementsAre(0, 0, 1, 1));
+        EXPECT_EQ(corners, seam);
+    };
+    const HObject textured = mesh.object();
+    expectUvs(textured);
+    HFnMeshData data(textured);
+    EXPECT_EQ(text(data.setComponentTag("more", {1})), "");
+    EXPECT_EQ(text(data.removeComponentTag("corner")), "");
+    expectUvs(data.object());
+    EXPECT_EQ(text(mesh.setPoints(HPointArray(6))), "");
+    expectUvs(mesh.object());
+
+    const float none = std::numeric_limits<float>::quiet_NaN();
+    const struct {
+        HFloatArray us, vs;
+        HIntArray corners;
+        const char* why;
+    } rows[] = {
+        {{0, 1}, {0}, seam, "2 times u and 1 times v"},
+        {{0, 1}, {0, none}, seam, "UV 1 is not finite"},
+        {{0, 1}, {0, 1}, {0, 1, 0}, "UVs for 3 corners: the polygons have 8"},
+        {{0, 1, 2}, {0, 1, 2}, seam, "corner 3 has UV 3 of 3"},
+        {{0, 1}, {0, 1}, {0, 1, 0, 0, -1, 0, 0, 0}, "corner 4 has UV -1"},
+    };
+    for (const auto& row : rows)
+        EXPECT_THAT(text(mesh.setUVs(row.us, row.vs, row.corners)), HasSubstr(row.why));
+    expectUvs(mesh.object());
+    EXPECT_EQ(text(mesh.setUVs({}, {}, {})), "");
+    HFloatArray us(1), vs(1);
+    HIntArray corners(1);
+    EXPECT_EQ(text(mesh.getUVs(us, vs, corners)), "");
+    EXPECT_EQ(us.length() + vs.length() + corners.length(), 0U);
 }
 
 TEST_F(Mesh, PointsAreSetOnANewMesh) {

@@ -16,6 +16,8 @@ Character moving() {
     channel.rotation.interpolation = Interpolation::Step;
     channel.rotation.keys = {{0.5, HQuaternion(1.0, {0, 0, 1})}};
     character.meshes[0].morphTargets = {{"smile", 0.25, {1, 5}, {HVector(0, 0, 1), HVector(0, 2, 0)}}};
+    character.meshes[0].uvs = {0.25F, 0.5F, 1, 0};
+    character.meshes[0].cornerUvs.assign(character.meshes[0].corners.size(), 1);
     character.animations.push_back({"wave", 0.5, {channel}, {{0, 0, {Interpolation::Linear, {{0.5, 1.0}}}}}});
     character.warnings.emplace_back("something is odd");
     return character;
@@ -32,6 +34,7 @@ TEST(Transfer, ACharacterComesOverAsItIs) {
               before.animations[0].channels[0].rotation.keys[0].value);
     EXPECT_EQ(after.meshes[0].morphTargets.at(0).deltas, before.meshes[0].morphTargets[0].deltas);
     EXPECT_EQ(after.animations[0].morphs.at(0).weight.keys.at(0).value, 1.0);
+    EXPECT_EQ(after.meshes[0].uvs, before.meshes[0].uvs);
     EXPECT_EQ(after.warnings, before.warnings);
 }
 

@@ -88,10 +88,17 @@ TEST(CharacterScene, PolygonsGoRoundTheSameWayInAMirroredSpace) {
     Character character = randomCharacter(2, {});
     for (CharacterMesh& mesh : character.meshes)
         mesh.bindings.clear();
+    for (CharacterMesh& mesh : character.meshes) {
+        mesh.uvs = {0, 0.5F, 1, 0.25F};
+        mesh.cornerUvs = {0, 1, 1, 0, 1, 0, 0};
+    }
     character.meshes[1].worldTransform(0, 0) = -1.0;
     TestScene scene(character, nullptr);
     EXPECT_THAT(polygonsOf(plugOf(scene.scene().meshes[0].mesh, "outMesh")).corners, ElementsAre(0, 1, 2, 3, 4, 5, 6));
-    EXPECT_THAT(polygonsOf(plugOf(scene.scene().meshes[1].mesh, "outMesh")).corners, ElementsAre(2, 1, 0, 6, 5, 4, 3));
+    const MeshPolygons mirrored = polygonsOf(plugOf(scene.scene().meshes[1].mesh, "outMesh"));
+    EXPECT_THAT(mirrored.corners, ElementsAre(2, 1, 0, 6, 5, 4, 3));
+    EXPECT_THAT(mirrored.uvCorners, ElementsAre(1, 1, 0, 0, 0, 1, 0));
+    EXPECT_THAT(mirrored.uvs, ElementsAre(0, 0.5F, 1, 0.25F));
 }
 
 TEST(CharacterScene, JumpsOfAnimationStayJumps) {

@@ -3,6 +3,7 @@
 
 #include "host/support/testDeformers.h"
 
+#include "openquarn/HFnMesh.h"
 #include "openquarn_app/Commands.h"
 #include "quarn/play/commands.h"
 #include "quarn/pose/commands.h"
@@ -58,12 +59,23 @@ connectAttr axes.outputList[1].output controls.inputList[1].input
 connectAttr controls.output warp.controlValues
 )";
 
+// the whole picture on every quad: each edge between two is a seam
+HObject textured(const HObject& grid) {
+    HFnMesh mesh(grid);
+    HIntArray corners;
+    for (int corner = 0; corner < 4 * mesh.numPolygons(); ++corner)
+        corners.append(corner % 4);
+    if (mesh.setUVs({0, 1, 1, 0}, {0, 0, 1, 1}, corners).error())
+        throw std::runtime_error("no UVs");
+    return mesh.object();
+}
+
 } // namespace
 
 void write(const std::filesystem::path& scene, const std::string& further) {
     ::setenv("NEURALWARP_PLUGIN", NW_PLUGIN, 1);
     quarn::SceneSession session;
-    testDeformers::meshNode("strip", testDeformers::grid(vertexCount / 2, 2));
+    testDeformers::meshNode("strip", textured(testDeformers::grid(vertexCount / 2, 2)));
     run(rig);
     std::ostringstream limits;
     for (const auto& [plug, place, least, most, rest] : sampled)
