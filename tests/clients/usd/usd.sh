@@ -45,7 +45,7 @@ check "$work/any.usda" "$work/z.npy" 'metersPerUnit = 1' 'upAxis = "Z"' 'endTime
 
 # texture coordinates, from a file of another format
 node "$here/layer.mjs" character "$work/sheet.gltf"
-expect 0 'sheet' '' import "$work/sheet.gltf" -o "$work/sheet.json"
+expect 0 'sheet' 'has no skin' import "$work/sheet.gltf" -o "$work/sheet.json"
 expect 0 'frames' 'sheet\.usda will have' play "$work/sheet.json" --plug sheet.outMesh --frames 1-2 -o "$work/sheet.usda"
 node "$here/layer.mjs" uvs "$work/sheet.usda" >"$work/out" 2>"$work/err" || fail "sheet.usda:"
 exit $bad

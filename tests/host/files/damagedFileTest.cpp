@@ -93,7 +93,7 @@ TEST_F(DamagedFile, WhatIsNoMeshIsReportedAndKept) {
         {R"({"points":[0,0,0],"counts":[],"corners":[4294967296]})", "no whole number"},
         {R"({"points":[0,0,0],"counts":[],"corners":[],"uvs":[0,0]})", "it has no list 'uvCorners'"},
         {R"({"points":[0,0,0],"counts":[],"corners":[],"uvs":[0],"uvCorners":[]})", "not two numbers each"},
-        {R"({"points":[0,0,0],"counts":[2],"corners":[0,0],"uvs":[0,1e99],"uvCorners":[0,0]})", "UV 0 is not finite"},
+        {R"({"points":[0,0,0],"counts":[2],"corners":[0,0],"uvs":[0,1e+99],"uvCorners":[0,0]})", "UV 0 is not finite"},
         {R"({"points":[0,0,0],"counts":[2],"corners":[0,0],"uvs":[0,1],"uvCorners":[0,1]})", "corner 1 has UV 1 of 1"},
         {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"t":[-1]}})", "lists vertex 4294967295"},
         {R"({"points":[0,0,0],"counts":[],"corners":[],"tags":{"t":[0],"t":[0]}})", "'t' stands twice"},
