@@ -114,9 +114,11 @@ protected:
                     std::size_t triangles) const {
         const bool isOneFile = !storage::isFramePattern(meshPath);
         for (std::size_t frame = 0; frame < (isOneFile ? 1 : motion.size()); ++frame) {
-            const auto [xyz, faces] = meshIn(storage::frameFile(meshPath, frames.frame(frame)).string());
-            ASSERT_EQ(xyz.size(), motion[frame].size());
-            for (std::size_t i = 0; i < xyz.size(); ++i)
+            const auto [xyz, faces, hasUvs] = meshIn(storage::frameFile(meshPath, frames.frame(frame)).string());
+            const std::size_t copies = row.says("UVs", "split") ? stripScene::seamCopies : 0;
+            ASSERT_EQ(xyz.size(), motion[frame].size() + 3 * copies);
+            EXPECT_EQ(hasUvs, row.has("UVs"));
+            for (std::size_t i = 0; i < motion[frame].size(); ++i)
                 ASSERT_NEAR(xyz[i], motion[frame][i], row.says("positions", "to the bit") ? 0.0F : 1e-6F);
             EXPECT_EQ(faces, row.says("polygons", "all") ? polygons : triangles);
         }
@@ -126,11 +128,13 @@ private:
     struct Mesh {
         std::vector<float> xyz;
         std::size_t faces = 0;
+        bool hasUvs = false;
     };
     // of a motion its first frame: clipTest and tests/clients/usd have the others
     static Mesh meshIn(const std::string& name) {
         const std::string text = bytes(name);
         Mesh mesh;
+        mesh.hasUvs = text.find("\nvt ") != std::string::npos || text.find("primvars:st = [(") != std::string::npos;
         if (name.ends_with(".obj")) {
             const auto cache = storage::openPointCache(name);
             std::vector<double> xyz(3 * cache->vertexCount());
@@ -149,6 +153,7 @@ private:
                 throw std::runtime_error(importer.GetErrorString());
             const aiMesh& read = *scene->mMeshes[0];
             mesh.faces = read.mNumFaces;
+            mesh.hasUvs = read.HasTextureCoords(0);
             for (unsigned i = 0; i < 3 * read.mNumVertices; ++i)
                 mesh.xyz.push_back(read.mVertices[i / 3][i % 3]);
         }

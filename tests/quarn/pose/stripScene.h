@@ -9,6 +9,8 @@
 namespace stripScene {
 
 constexpr std::size_t vertexCount = 18;
+/// Each edge between two quads is a seam of the UVs: vertices more in a file that has them by vertex.
+constexpr std::size_t seamCopies = 14;
 
 /// A plug that is sampled, where "poses" has its limits, and these.
 struct Sampled {
