@@ -21,6 +21,11 @@ std::vector<Vec3> Camera::toCamera(std::span<const double> xyz) const {
     return points;
 }
 
+Vec3 Camera::directionToCamera(const HVector& direction) const {
+    return {static_cast<float>(direction * view.right), static_cast<float>(direction * view.up),
+            static_cast<float>(direction * view.viewer)};
+}
+
 Framing::Framing(const View& view, int width, int height, const Margins& margins)
     : view_(view) {
     const double tangent = std::tan(fieldOfView / 2.0 * std::numbers::pi / 180.0);

@@ -25,6 +25,8 @@ struct Camera {
 
     /// From object space, x, y, z of each vertex, to camera space.
     std::vector<Vec3> toCamera(std::span<const double> xyz) const;
+    /// The same of a direction, whose length stays.
+    Vec3 directionToCamera(const HVector& direction) const;
 };
 
 /// Parts of the picture's width and height that stay free.

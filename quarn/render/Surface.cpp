@@ -1,43 +1,32 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/render/Surface.h"
 
-#include <span>
+#include "quarn/scene/vertexNormals.h"
 
 namespace quarn {
 namespace {
 
-// twice the area, along the normal, also of a polygon that is not plane (Newell's method, about the first corner)
-Vec3 areaVector(std::span<const std::uint32_t> corners, const std::vector<Vec3>& points) {
-    const Vec3 first = points[corners[0]];
-    Vec3 sum;
-    for (std::size_t corner = 2; corner < corners.size(); ++corner)
-        sum += cross(points[corners[corner - 1]] - first, points[corners[corner]] - first);
-    return sum;
-}
-
-// `first` the surface's point that is the mesh's first vertex
-void addPolygon(Surface& surface, std::uint32_t first, std::span<const std::uint32_t> corners,
-                const std::vector<Vec3>& points) {
-    for (std::size_t corner = 2; corner < corners.size(); ++corner)
-        surface.triangles.push_back({first + corners[0], first + corners[corner - 1], first + corners[corner]});
-    const Vec3 area = areaVector(corners, points);
-    for (const std::uint32_t vertex : corners)
-        surface.normals[first + vertex] += area;
-}
+constexpr double crease = 60.0; // degrees: below most rims, and above what a bent finger's joints show
 
 } // namespace
 
-void addMesh(Surface& surface, const MeshPolygons& polygons, const std::vector<Vec3>& points) {
-    const std::size_t first = surface.points.size();
+void addMesh(Surface& surface, const MeshPolygons& polygons, std::span<const double> xyz, const Camera& camera) {
+    const auto firstPoint = static_cast<std::uint32_t>(surface.points.size());
+    const std::vector<Vec3> points = camera.toCamera(xyz);
     surface.points.insert(surface.points.end(), points.begin(), points.end());
-    surface.normals.resize(surface.points.size());
-    std::span<const std::uint32_t> corners = polygons.corners;
+    const std::vector<float> normals = cornerNormals(xyz, polygons, crease);
+    const auto point = [&](std::size_t corner) { return firstPoint + polygons.corners[corner]; };
+    const auto normal = [&](std::size_t corner) {
+        return camera.directionToCamera({normals[3 * corner], normals[3 * corner + 1], normals[3 * corner + 2]});
+    };
+    std::size_t first = 0;
     for (const std::uint32_t size : polygons.sizes) {
-        addPolygon(surface, static_cast<std::uint32_t>(first), corners.first(size), points);
-        corners = corners.subspan(size);
+        for (std::size_t corner = first + 2; corner < first + size; ++corner) {
+            surface.triangles.push_back({point(first), point(corner - 1), point(corner)});
+            surface.normals.push_back({normal(first), normal(corner - 1), normal(corner)});
+        }
+        first += size;
     }
-    for (std::size_t point = first; point < surface.points.size(); ++point)
-        surface.normals[point] = normalized(surface.normals[point]);
 }
 
 } // namespace quarn

@@ -24,7 +24,7 @@ void drawPanel(Picture& picture, const Layout& layout, int left, const Camera& c
         std::any_of(frame.begin(), frame.end(), [](const MeshFrame& mesh) { return !mesh.distances.empty(); });
     Surface surface;
     for (const MeshFrame& mesh : frame) {
-        addMesh(surface, mesh.polygons, camera.toCamera(mesh.points));
+        addMesh(surface, mesh.polygons, mesh.points, camera);
         if (isHeat)
             addHeat(surface, mesh, scale.range);
     }

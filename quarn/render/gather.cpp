@@ -79,11 +79,12 @@ Vec3 Tracer::direction(int x, int y, const Sample2& inside) const {
 
 Place Tracer::placeOf(const Hit& hit, const Vec3& ray) const {
     const auto& corners = surface_.triangles[hit.triangle];
+    const auto& normals = surface_.normals[hit.triangle];
     const std::array<float, 3> weights = {1.0F - hit.u - hit.v, hit.u, hit.v};
     Place place;
     place.position = ray * hit.distance;
     for (std::size_t corner = 0; corner < 3; ++corner)
-        place.normal += surface_.normals[corners[corner]] * weights[corner];
+        place.normal += normals.at(corner) * weights[corner];
     place.normal = normalized(place.normal);
     // both sides are shown: the one that is seen is the outside
     const Vec3 flat = dot(hit.normal, ray) > 0.0F ? -hit.normal : hit.normal;
@@ -93,7 +94,7 @@ Place Tracer::placeOf(const Hit& hit, const Vec3& ray) const {
     // (J. Hanika, "Hacking the Shadow Terminator", Ray Tracing Gems II, 2021)
     place.lifted = place.position + flat * offset;
     for (std::size_t corner = 0; corner < 3; ++corner) {
-        const Vec3 normal = surface_.normals[corners[corner]] * side;
+        const Vec3 normal = normals.at(corner) * side;
         const float below = std::min(0.0F, dot(place.position - surface_.points[corners[corner]], normal));
         place.lifted += normal * (-below * weights[corner]);
     }

@@ -19,6 +19,7 @@
 #include "quarn/scene/frames.h"
 #include "quarn/scene/modelJson.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/shownMeshes.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
 #include "storage/WholeFile.h"
@@ -108,6 +109,17 @@ void setSize(Layout& layout, const std::string& text, std::size_t panels) {
                          ", the picture's at most " + std::to_string(largestSide));
 }
 
+// one geometry of a deformer, where one is chosen; else the whole character
+Panel defaultPanel(const Options& options) {
+    Panel panel;
+    if (options.deformer.empty() && options.geometry.empty() && !options.model.isGiven())
+        for (const HPlug& mesh : shownMeshes())
+            panel.meshes.push_back({mesh, HPlug()});
+    if (panel.meshes.empty()) // caches without a mesh, say
+        panel.meshes.push_back({Warp::find(options.deformer).geometry(options.geometry).output, HPlug()});
+    return panel;
+}
+
 std::vector<Panel> panelsOf(const Options& options) {
     std::vector<Panel> panels;
     for (const PanelText& panel : options.panels)
@@ -115,7 +127,7 @@ std::vector<Panel> panelsOf(const Options& options) {
     if (!options.plug.empty())
         panels.insert(panels.begin(), panelFrom("=" + options.plug));
     if (panels.empty())
-        panels.push_back({"", {{Warp::find(options.deformer).geometry(options.geometry).output, HPlug()}}});
+        panels.push_back(defaultPanel(options));
     return panels;
 }
 
@@ -347,8 +359,7 @@ void render(const Options& options) {
 }
 
 void addWhatIsShown(CLI::App& command, Options& options) {
-    command.add_option("--plug", options.plug, "The mesh to show; by default what the deformer gives")
-        ->type_name("PLUG");
+    command.add_option("--plug", options.plug, "The mesh to show; by default all of the character")->type_name("PLUG");
     // in the order in which they are written, whichever of the two they are
     const auto add = [&options](bool isHeat) {
         return [&options, isHeat](const std::vector<std::string>& texts) {

@@ -24,6 +24,24 @@ draw -o "$work/pic.###.png" --frames 1-5x2 --heat "moved=strip.outMesh:wave.orig
 cmp "$work/pic.001.png" "$work/pic.005.png" # nothing moves in this scene
 grep -q '"rangeMillimetres"' "$work/json"
 
+# all of a character: each mesh as its last deformer gives it out, and none that only serves
+cat >"$work/two.json" <<'END'
+{"openquarnScene": 1,
+ "nodes": [
+  {"name": "floor", "type": "polyGrid", "values": {"width": 4}},
+  {"name": "roof", "type": "polyGrid", "values": {"width": 2}},
+  {"name": "goal", "type": "polyGrid", "values": {"width": 9}},
+  {"name": "lift", "type": "blendShape", "values": {"weight": {"0": [1]},
+    "shapes[0].shape[0].vertices": [0, 1], "shapes[0].shape[0].deltas": [0, 3, 0, 0, 2, 0]}},
+  {"name": "cache", "type": "pointCache"}],
+ "connections": [["roof.outMesh", "lift.input[0].inputGeometry"], ["goal.outMesh", "cache.inMesh"]]}
+END
+scene=$work/two.json
+"$quarn" render "$scene" --size 40x30 -o "$work/whole.png" 2>>"$work/err"
+"$quarn" render "$scene" --size 40x30 -o "$work/named.png" --panel "=floor.outMesh+lift.outputGeom[0]" 2>>"$work/err"
+cmp "$work/whole.png" "$work/named.png"
+scene=examples/wave/wave.json
+
 refused 2 "must end in .png" -o "$work/no.jpg"
 refused 1 "Not a directory" -o "$work/one.png/no.png"
 refused 1 "takes one picture" -o /dev/stdout --frames 1-2 --plug strip.outMesh --size 40x30

@@ -56,7 +56,7 @@ Camera cameraFor(const MeshFrame& frame) {
 
 PanelSight sightOf(const MeshFrame& frame, const Camera& camera) {
     Surface surface;
-    addMesh(surface, frame.polygons, camera.toCamera(frame.points));
+    addMesh(surface, frame.polygons, frame.points, camera);
     return gather(surface, camera, side, side);
 }
 
@@ -98,6 +98,19 @@ TEST(Trace, ASphereIsRoundAndLitFromTheKeyLight) {
             ASSERT_EQ(pixel.skyOpen, 1.0F);
         }
     EXPECT_GT(lightOf(at(side / 3, side / 3)).y, 2.0F * lightOf(at(side * 2 / 3, side * 3 / 4)).y);
+}
+
+TEST(Trace, ACubeIsFlatUpToItsRim) {
+    MeshFrame cube;
+    for (const double x : {0, 1})
+        for (const double y : {0, 1})
+            for (const double z : {0, 1})
+                cube.points.insert(cube.points.end(), {x, y, z});
+    cube.polygons = {8, {4, 4, 4, 4, 4, 4}, {0, 1, 3, 2, 4, 6, 7, 5, 0, 4, 5, 1, 2, 3, 7, 6, 0, 2, 6, 4, 1, 5, 7, 3}};
+    for (const PixelSight& pixel : sightOf(cube, cameraFor(cube)).pixels)
+        if (pixel.cover == 1.0F) {
+            ASSERT_GT(normalized(pixel.normal).z, 0.9999F);
+        }
 }
 
 TEST(Trace, AShelfShadowsTheWallBelowIt) {
