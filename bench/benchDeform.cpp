@@ -39,7 +39,7 @@ double stateBytesPerVertex(const neuralWarp::neuralWarpData& data, std::size_t v
                               bytesOf(data.vertexConnections.connections()) +
                               bytesOf(data.vertexConnections.connectionsIndexer()) + bytesOf(data.connectionWeights) +
                               bytesOf(data.affectMap) + bytesOf(data.affectedVertices) + bytesOf(data.restPoints) +
-                              bytesOf(data.restFramesInverse) + bytesOf(data.principalShapes);
+                              bytesOf(data.restFramesInverse) + data.principalShapes.bytes() + data.workspace.bytes();
     return static_cast<double>(bytes) / static_cast<double>(vertices);
 }
 
@@ -159,15 +159,17 @@ void benchProduct(const bench::Options& options) {
         for (const std::size_t shapes : {20U, 50U, 100U}) {
             if (vertices == 1000000 && (shapes != 20 || options.isQuick))
                 continue;
-            const std::vector<float> basis(3 * shapes * vertices, 0.5F), coefficients(shapes, 0.25F);
-            neuralWarp::Points deltas;
+            const std::vector<float> coefficients(shapes, 0.25F);
+            neuralWarp::PrincipalBasis basis;
+            basis.assign(std::vector<float>(3 * shapes * vertices, 0.5F), shapes);
+            neuralWarp::Points deltas, unused;
             bench::Phase phase;
             phase.name = "product S=" + std::to_string(shapes);
             phase.mesh = "-";
             phase.vertices = vertices;
-            phase.bytes = basis.size() * sizeof(float);
+            phase.bytes = basis.bytes();
             phase.ours = [&] {
-                extractPrincipalDeltas(deltas, coefficients, shapes, basis, neuralWarp::DrivenVertices(vertices));
+                extractPrincipalDeltas(deltas, coefficients, basis, neuralWarp::DrivenVertices(vertices), {}, unused);
             };
             for (const unsigned threads : {1U, 2U}) {
                 const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);

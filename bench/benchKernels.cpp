@@ -38,6 +38,8 @@ struct Subject {
     quill::VertexConnections connections;
     quill::VertexFrames frames;
     std::vector<float> weights, coefficients, basis;
+    neuralWarp::PrincipalBasis blocks;
+    neuralWarp::Points unused;
     std::vector<quill::mat4d> restFramesInverse;
 
     explicit Subject(std::size_t side)
@@ -46,6 +48,7 @@ struct Subject {
         , scratch(n)
         , coefficients(shapeCount, 0.01F)
         , basis(3 * n * shapeCount, 0.5F) {
+        blocks.assign(basis, shapeCount);
         const ZooMesh grid = makeGrid(side - 1, side - 1);
         points = smoothed = rest = grid.points;
         for (std::size_t i = 0; i < n; ++i)
@@ -164,7 +167,8 @@ Row smoothing(Subject& s, OnDevice& d) {
 }
 
 void extract(Subject& s) {
-    neuralWarp::extractPrincipalDeltas(s.deltas, s.coefficients, shapeCount, s.basis, neuralWarp::DrivenVertices(s.n));
+    neuralWarp::extractPrincipalDeltas(s.deltas, s.coefficients, s.blocks, neuralWarp::DrivenVertices(s.n), {},
+                                       s.unused);
 }
 
 Row shapes(Subject& s, OnDevice& d) {

@@ -88,9 +88,10 @@ void WarpFrame::addShapes() {
     neuralWarp::neuralWarpData& data = state();
     data.principalShapeCount = setting_.shapes;
     data.principalVertCount = setting_.shapes == 0 ? 0 : vertices_;
-    data.principalShapes.resize(3 * setting_.shapes * vertices_);
-    for (std::size_t i = 0; i < data.principalShapes.size(); ++i)
-        data.principalShapes[i] = noise(i);
+    std::vector<float> values(3 * setting_.shapes * vertices_);
+    for (std::size_t i = 0; i < values.size(); ++i)
+        values[i] = noise(i);
+    data.principalShapes.assign(values, setting_.shapes);
 }
 
 double quantile(std::vector<double> values, double q) {

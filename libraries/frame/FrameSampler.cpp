@@ -9,19 +9,39 @@
 namespace neuralWarp {
 namespace {
 
-void extractDeltas(Points& deltas, const FrameModel& model, const std::vector<float>& outputs) {
-    if (model.shapes.isUsed())
-        extractPrincipalDeltas(deltas, outputs, static_cast<std::size_t>(model.shapes.shapeCount), model.shapes.values,
-                               model.driven);
-    else
-        extractComputedDeltas(deltas, outputs, model.driven);
+void extractDeltas(FrameWorkspace& workspace, const FrameModel& model, const std::vector<float>& outputs) {
+    if (!model.shapes.isUsed()) {
+        extractComputedDeltas(workspace.deltas, outputs, model.driven);
+        return;
+    }
+    static const std::vector<std::uint32_t> none;
+    extractPrincipalDeltas(workspace.deltas, outputs, model.shapes.values, model.driven,
+                           model.driven.slots ? workspace.drivenBlocks(model) : none, workspace.slotDeltas);
 }
 
-void addOffsets(Points& result, const Points& points, const Points& deltas, const DrivenVertices& driven) {
+template <class Surface>
+void addOffsets(Points& result, const Surface& points, const Points& deltas, const DrivenVertices& driven) {
     quill::parallelFor(driven.count, [&](std::size_t k) {
         const std::size_t v = driven.vertex(k);
-        result[v] = points[v] + deltas[k];
+        result[v] = quill::val3<float>(points[v].x, points[v].y, points[v].z) + deltas[k];
     });
+}
+
+void pack(quill::PaddedPoints& rows, const Points& points) {
+    rows.resize(points.size());
+    quill::parallelFor(points.size(), [&](std::size_t v) { rows[v] = {points[v].x, points[v].y, points[v].z}; });
+}
+
+/// The points as deltas are meant on them, in workspace.smoothed; not in Offset mode without smoothing.
+void smooth(FrameWorkspace& workspace, const FrameModel& model, const Points& points, const IsCancelled& isCancelled) {
+    if (model.settings.isSmoothed())
+        if (const quill::Smoother& smoother = workspace.smoother(model); smoother.vertexCount() == points.size()) {
+            smoother.run(points, static_cast<std::size_t>(model.settings.smoothingIterations), workspace.smoothed,
+                         workspace.scratch, {isCancelled});
+            return;
+        }
+    if (model.settings.isSmoothed() || model.settings.isSurface())
+        pack(workspace.smoothed, points);
 }
 
 } // namespace
@@ -41,28 +61,35 @@ FrameCheck FrameSampler::check(std::size_t outputCount) const {
     return {rest < model_.vertexCount ? FrameFault::tooFewRestPoints : FrameFault::none, rest, model_.vertexCount};
 }
 
-FrameCheck FrameSampler::place(Points& result, Points& points, const std::vector<float>& outputs,
-                               const IsCancelled& isCancelled) const {
+FrameCheck FrameSampler::place(FrameWorkspace& workspace, Points& result, const Points& points,
+                               const std::vector<float>& outputs, const IsCancelled& isCancelled) const {
     if (points.size() != model_.vertexCount)
         return {FrameFault::otherPointCount, points.size(), model_.vertexCount};
     {
         const ObservedStep step(observer_, FrameStep::points);
-        smoothPoints(points, model_.rest, model_.settings.smoothingIterations, isCancelled);
+        smooth(workspace, model_, points, isCancelled);
     }
     if (const FrameCheck checked = check(outputs.size()); checked.fault != FrameFault::none)
         return checked;
-    Points deltas;
+    const bool isWhole = !model_.driven.vertices && model_.settings.deltaMode <= kSurfaceMode;
     {
         const ObservedStep step(observer_, FrameStep::deltas);
-        result.assign(model_.vertexCount, {});
-        extractDeltas(deltas, model_, outputs);
+        result.resize(model_.vertexCount);
+        if (!isWhole)
+            std::fill(result.begin(), result.end(), quill::val3<float>());
+        extractDeltas(workspace, model_, outputs);
     }
     const ObservedStep step(observer_, FrameStep::apply);
-    if (model_.settings.deltaMode == kOffsetMode)
-        addOffsets(result, points, deltas, model_.driven);
-    else if (model_.settings.isSurface())
-        model_.rest.frames.transportDeltas(result, deltas, model_.rest.points, model_.rest.smoothedFramesInverse,
-                                           points, model_.driven.vertices);
+    if (model_.settings.isSurface()) {
+        const quill::SurfaceTransport& transport = workspace.transport(model_);
+        if (transport.size() == model_.driven.count)
+            transport.run(result, workspace.deltas, workspace.smoothed);
+        else
+            std::fill(result.begin(), result.end(), quill::val3<float>());
+    } else if (model_.settings.deltaMode == kOffsetMode && model_.settings.isSmoothed())
+        addOffsets(result, workspace.smoothed, workspace.deltas, model_.driven);
+    else if (model_.settings.deltaMode == kOffsetMode)
+        addOffsets(result, points, workspace.deltas, model_.driven);
     return {};
 }
 

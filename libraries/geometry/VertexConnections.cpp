@@ -134,7 +134,7 @@ void VertexConnections::mushArray(std::vector<val3<float>>& positions, std::vect
                              step,
                              equivalent(step, 1.0, 1e-5),
                              includeSelf};
-    const SmoothingKernel kernel = smoothingKernel();
+    const SmoothingKernel kernel = smoothingKernel(instructionSet());
     scratch.resize(positions.size());
     for (std::size_t iteration = 0; iteration < iterations; ++iteration) {
         positions.swap(scratch);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include "quill/InstructionSet.h"
 #include "quill/val3.h"
 
 #include <cstddef>
@@ -36,10 +37,7 @@ void smoothAvx(const SmoothingPass& pass, const val3<float>* source, val3<float>
 void smoothAvx512(const SmoothingPass& pass, const val3<float>* source, val3<float>* destination, std::size_t begin,
                   std::size_t end);
 
-// The kernels that this processor can run, the fastest last; out has room for 3. Gives their number.
-std::size_t availableSmoothingKernels(SmoothingKernel* out);
-
-// The fastest of them, chosen once.
-SmoothingKernel smoothingKernel();
+// The one for an instruction set, which the processor must have.
+SmoothingKernel smoothingKernel(InstructionSet set);
 
 } // namespace quill

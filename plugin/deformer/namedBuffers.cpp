@@ -55,7 +55,7 @@ constexpr std::array buffers = {
     Buffer{"AffectToDeltaMap", [](const Data& d) { return publishedNumbers(d.affectMap); }},
     Buffer{"OriginalVerts", [](const Data& d) { return publishedPoints(d.restPoints); }},
     Buffer{"SmoothOriginalFramesInverse", [](const Data& d) { return publishedMatrices(d.restFramesInverse); }},
-    Buffer{"PrincipalShapesData", [](const Data& d) { return publishedNumbers(d.principalShapes); }},
+    Buffer{"PrincipalShapesData", [](const Data& d) { return publishedNumbers(d.principalShapes.slotMajor()); }},
 };
 
 } // namespace

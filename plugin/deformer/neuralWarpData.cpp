@@ -65,6 +65,7 @@ void neuralWarpData::copy(const HPxData& source) {
     affectedVertices = other.affectedVertices;
     mappedSlotCount = other.mappedSlotCount;
     directoryState = other.directoryState;
+    workspace.invalidate();
     session.load(other.session.modelPath(), true);
     if (isReplaced())
         setModelPathDirty(true); // the network may be of another model than the rest
@@ -110,12 +111,14 @@ void neuralWarpData::releaseUnusedCaches() {
         vertexConnections = {};
         connectionWeights = {};
         bump(connectionsCache);
+        workspace.invalidate();
     }
     if (!activeSettings.isSurface() && !vertexFrames.framesPairs().empty()) {
         vertexFrames = {};
         restFramesInverse = {};
         bump(framesCache);
         bump(restFramesCache);
+        workspace.invalidate();
     }
 }
 
@@ -141,6 +144,7 @@ void neuralWarpData::buildAffectMap() {
     affectMap.clear();
     affectedVertices.clear();
     mappedSlotCount = 0;
+    workspace.invalidate();
     bump(affectMapCache);
     if (!modelValid)
         return;

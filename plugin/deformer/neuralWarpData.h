@@ -4,6 +4,7 @@
 
 #include "frame/FrameModel.h"
 #include "frame/FrameObserver.h"
+#include "frame/FrameWorkspace.h"
 #include "nw_model/DirectoryState.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
@@ -102,7 +103,7 @@ public:
         affectedVertices; ///< the deformed vertices that a slot drives, ascending; empty as above
     Points restPoints;    ///< unsmoothed, object space
     std::vector<quill::mat4d> restFramesInverse; ///< inverted frames of the smoothed rest surface
-    std::vector<float> principalShapes;          ///< [principalVertCount][principalShapeCount][3]
+    PrincipalBasis principalShapes;              ///< principalVertCount slots of principalShapeCount shapes
     std::uint64_t principalShapeCount = 0;
     std::uint64_t principalVertCount = 0;
     std::filesystem::path modelRootPath;
@@ -127,6 +128,9 @@ public:
     /// How many slots of the model are read: the highest in use + 1. Follows componentMap and affectMap.
     std::size_t slotCount() const { return useAffectMap ? mappedSlotCount : componentMap.affectCount(); }
     std::size_t mappedSlotCount = 0;
+
+    /// What the frames of this geometry are computed in. Invalidated by whoever changes what frameModel() views.
+    FrameWorkspace workspace;
 
     /// Hears of each evaluation, on the CPU and on the GPU. Not owned, never null.
     FrameObserver* observer = &FrameObserver::none();

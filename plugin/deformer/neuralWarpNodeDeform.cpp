@@ -90,7 +90,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     status = prepare(block, multiIndex, *data, isActive, morph, attempt);
     if (status.error() || attempt == Attempt::nothing)
         return status;
-    Points result;
+    Points& result = data->workspace.result;
     if (data->modelApplied) {
         status = applyNeuralModel(block, multiIndex, *data, result);
         if (status.error())
@@ -133,14 +133,15 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
     if (const HStatus status = runNetwork(block, data, observer, controls, outputs); status.error())
         return reported(status, sourceUnit::node);
     const HProfilingScope scope(evaluationCategory(), 9, "ApplyDeltas", name());
-    Points points;
     {
         const ObservedStep step(observer, FrameStep::points);
-        if (const HStatus status = readInputPoints(data, block, multiIndex, points, false); status.error())
+        if (const HStatus status = readInputPoints(data, block, multiIndex, data.workspace.points, false);
+            status.error())
             return status;
     }
     const FrameSampler sampler(data.frameModel(), observer);
-    return statusOf(sampler.place(result, points, outputs, HLongWork::isInterrupted), data.session);
+    return statusOf(sampler.place(data.workspace, result, data.workspace.points, outputs, HLongWork::isInterrupted),
+                    data.session);
 }
 
 HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex,

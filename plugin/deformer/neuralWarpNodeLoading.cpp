@@ -127,7 +127,9 @@ HStatus loadPrincipalShapes(neuralWarpData& data) {
     const Entry entry(file);
     std::uint64_t shapes = 0;
     std::uint64_t vertices = 0;
-    if (entry.exists() && readPrincipalShapesFile(file, data.principalShapes, shapes, vertices)) {
+    std::vector<float> values;
+    if (entry.exists() && readPrincipalShapesFile(file, values, shapes, vertices)) {
+        data.principalShapes.assign(values, shapes);
         data.principalShapeCount = shapes;
         data.principalVertCount = vertices;
     }

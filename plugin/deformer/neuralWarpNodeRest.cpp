@@ -41,6 +41,7 @@ HStatus updateComponentMap(const neuralWarpNode& node, neuralWarpData& data) {
     const HIndexMapper mapper = node.indexMapper(data.multiIndex, &status);
     if (status.error())
         return reported(status, sourceUnit::node);
+    data.workspace.invalidate();
     data.componentMap = readIndexMap(mapper);
     data.indexMapDirty = false;
     return HStatus::kSuccess;
@@ -66,6 +67,7 @@ HStatus rebuildCaches(const neuralWarpNode& node, neuralWarpData& data, HDataBlo
     if (status.error())
         return reported(status, sourceUnit::node);
     const HFnMesh mesh(rest.asMesh(), &status);
+    data.workspace.invalidate();
     // a rest geometry with fewer vertices than the deformed one has no rest position for each of them
     if (status.error() || !readGeometryPoints(rest, data.restPoints, data.componentMap))
         return invalidRest();

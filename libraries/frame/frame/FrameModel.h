@@ -5,6 +5,7 @@
 
 #include "frame/DeltaSettings.h"
 #include "frame/Points.h"
+#include "frame/PrincipalBasis.h"
 #include "frame/SlotMap.h"
 #include "quill/VertexConnections.h"
 #include "quill/VertexFrames.h"
@@ -30,10 +31,10 @@ struct ShapeBasis {
     /// False: the outputs of the network are the deltas themselves.
     bool isUsed() const { return shapeCount != 0 && slotCount != 0; }
     /// How many slots there are values for, whatever the counts say. Only while isUsed().
-    std::size_t coveredSlots() const { return values.size() / 3 / static_cast<std::size_t>(shapeCount); }
+    std::size_t coveredSlots() const { return values.shapeCount() == shapeCount ? values.slotCount() : 0; }
 
-    const std::vector<float>& values; ///< [slotCount][shapeCount][3], as long as the counts are right
-    std::uint64_t shapeCount = 0;     ///< the counts are a file's, and not trusted
+    const PrincipalBasis& values;
+    std::uint64_t shapeCount = 0; ///< the counts are a file's, and not trusted
     std::uint64_t slotCount = 0;
 };
 

@@ -6,6 +6,7 @@
 #include "frame/FrameCheck.h"
 #include "frame/FrameModel.h"
 #include "frame/FrameObserver.h"
+#include "frame/FrameWorkspace.h"
 #include "frame/Network.h"
 #include "frame/smoothing.h"
 
@@ -14,9 +15,8 @@
 
 namespace neuralWarp {
 
-/// Computes frames of a geometry. Costs nothing to make, and keeps nothing from frame to frame; the working arrays of a
-/// frame are allocated in it and freed with it. Loops run on oneTBB's workers and give the same bits on any number of
-/// threads.
+/// Computes frames of a geometry. Costs nothing to make: what stays from frame to frame is in a FrameWorkspace. Loops
+/// run on oneTBB's workers and give the same bits on any number of threads.
 ///
 /// Thread: one at a time for one object and what it views. All throw what `observer` and the network throw, and
 /// std::bad_alloc.
@@ -36,11 +36,14 @@ public:
     ///   Offset    smoothed point + delta
     ///   Surface   rest point + delta, carried from the frame of the smoothed rest shape to that of the smoothed points
     /// and nowhere, for another mode.
-    ///   result       out, resized to model.vertexCount; zero where no slot drives a vertex. As it was after a fault
-    ///   points       in: the points that come in [model.vertexCount]; out: smoothed. May not be `result`
+    ///   workspace    of this geometry; invalidated when something that the model views has changed
+    ///   result       out, resized to model.vertexCount; zero where no slot drives a vertex. As it was after a fault.
+    ///   May
+    ///                be workspace.result
+    ///   points       the points that come in [model.vertexCount]. May be workspace.points
     ///   outputs      of the network: deltas [slots][3], or coefficients of the principal shapes [shapes]; any number
     ///   isCancelled  asked in long smoothing, which then throws quill::Cancelled
-    FrameCheck place(Points& result, Points& points, const std::vector<float>& outputs,
+    FrameCheck place(FrameWorkspace& workspace, Points& result, const Points& points, const std::vector<float>& outputs,
                      const IsCancelled& isCancelled = {}) const;
 
 private:

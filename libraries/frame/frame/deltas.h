@@ -3,9 +3,10 @@
 #pragma once
 
 #include "frame/Points.h"
+#include "frame/PrincipalBasis.h"
 #include "frame/SlotMap.h"
 
-#include <cstddef>
+#include <cstdint>
 #include <vector>
 
 namespace neuralWarp {
@@ -15,11 +16,13 @@ namespace neuralWarp {
 ///   outputs  at least [3 * (highest slot + 1)]: not checked
 void extractComputedDeltas(Points& deltas, const std::vector<float>& outputs, const DrivenVertices& driven);
 
-/// deltas[k] = the sum over all shapes j of coefficients[j] * basis[m][j], in single precision and increasing j.
+/// deltas[k] = the sum of the shapes in slot m of driven vertex k (PrincipalBasis::sum).
 ///   deltas        resized to driven.count
-///   coefficients  at least [shapeCount]: not checked
-///   basis         at least [highest slot + 1][shapeCount][3]: not checked
-void extractPrincipalDeltas(Points& deltas, const std::vector<float>& coefficients, std::size_t shapeCount,
-                            const std::vector<float>& basis, const DrivenVertices& driven);
+///   coefficients  at least [basis.shapeCount()]: not checked
+///   basis         has every slot that is read: not checked
+///   blocks        those of the basis that hold them; unused where every vertex has the slot of its own number
+///   slotDeltas    a working array, in the same case
+void extractPrincipalDeltas(Points& deltas, const std::vector<float>& coefficients, const PrincipalBasis& basis,
+                            const DrivenVertices& driven, const std::vector<std::uint32_t>& blocks, Points& slotDeltas);
 
 } // namespace neuralWarp

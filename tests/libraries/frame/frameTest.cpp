@@ -2,6 +2,7 @@
 // Frames without a host: the formulas in plain loops, what is refused, and what an observer sees.
 #include "frame/FrameSampler.h"
 #include "frame/blend.h"
+#include "quill/InstructionSet.h"
 #include "quill/WorkWatch.h"
 #include "support/meshZoo.h"
 
@@ -42,7 +43,7 @@ struct Grid {
                 count,
                 isMapped ? DrivenVertices(vertices, slots) : DrivenVertices(count),
                 isMapped ? std::size_t{4} : count,
-                {basis, shapeCount, shapes ? count : 0},
+                {shapeBlocks, shapeCount, shapes ? count : 0},
                 {connections, weights, frames, rest, restFramesInverse}} {
         map.setIdentity(count);
         connections.build(mesh.topology(), map, 0, false);
@@ -53,6 +54,7 @@ struct Grid {
         frames.calculateFrames(restFramesInverse, smoothed, map, true, nullptr);
         for (std::size_t i = 0; i < 3 * count * shapes; ++i)
             basis.push_back(0.25F * static_cast<float>(i));
+        shapeBlocks.assign(basis, shapes);
     }
     Vec deltaOf(std::size_t slot, const std::vector<float>& outputs) const {
         if (shapeCount == 0)
@@ -72,6 +74,7 @@ struct Grid {
     quill::IndexMapper map;
     quill::VertexConnections connections;
     std::vector<float> weights, basis;
+    PrincipalBasis shapeBlocks;
     quill::VertexFrames frames;
     std::vector<quill::mat4d> restFramesInverse;
     std::uint64_t shapeCount;
@@ -94,14 +97,14 @@ TEST(FrameSampler, PutsDrivenVerticesWhereTheFormulasSay) {
                 EXPECT_EQ(seen.outputs, outputs);
                 EXPECT_EQ(outputs.at(0), 0.75F);
 
+                FrameWorkspace workspace;
                 Points points = grid.rest, smoothed = grid.rest, result(2);
                 for (std::size_t v = 0; v < points.size(); ++v)
                     points[v].z = smoothed[v].z = points[v].x * points[v].y;
                 Points scratch;
                 grid.connections.mushArray(smoothed, scratch, static_cast<std::size_t>(settings.smoothingIterations),
                                            1.0F, nullptr, &grid.weights, false);
-                ASSERT_EQ(sampler.place(result, points, outputs).fault, FrameFault::none);
-                EXPECT_EQ(points, smoothed);
+                ASSERT_EQ(sampler.place(workspace, result, points, outputs).fault, FrameFault::none);
                 std::vector<quill::mat4d> now;
                 grid.frames.calculateFrames(now, smoothed, grid.map, false, nullptr);
                 Points wanted(Grid::count);
@@ -146,10 +149,12 @@ TEST(FrameSampler, RefusesWhatDoesNotReachEveryVertex) {
         SCOPED_TRACE(row.name);
         Grid grid({0, 1}, false, row.shapes);
         grid.basis.resize(row.basis);
+        grid.shapeBlocks.assign(grid.basis, row.shapes);
         grid.restFramesInverse.resize(row.restFrames);
         Points points(row.points), result{{1, 2, 3}};
         const std::vector<float> outputs(row.outputs);
-        const FrameCheck check = FrameSampler(grid.model).place(result, points, outputs);
+        FrameWorkspace workspace;
+        const FrameCheck check = FrameSampler(grid.model).place(workspace, result, points, outputs);
         EXPECT_EQ(check.fault, row.fault);
         EXPECT_EQ(result.size(), row.fault == FrameFault::none ? Grid::count : 1U);
         if (row.fault != FrameFault::none) {
@@ -160,6 +165,7 @@ TEST(FrameSampler, RefusesWhatDoesNotReachEveryVertex) {
     }
     Grid grid({0, 0}, true, 2); // reads four slots; the counts of the basis speak of nine
     grid.basis.resize(6 * 4);
+    grid.shapeBlocks.assign(grid.basis, 2);
     EXPECT_EQ(checkOutputs(grid.model, 2).fault, FrameFault::none);
     EXPECT_FALSE(areEnoughForAllSlots(grid.model, 2));
 }
@@ -167,12 +173,44 @@ TEST(FrameSampler, RefusesWhatDoesNotReachEveryVertex) {
 TEST(FrameSampler, EndsLongSmoothingOnRequest) {
     const Grid grid({1000, 0});
     int looks = 0;
-    Points points = grid.rest, result;
+    FrameWorkspace workspace;
+    Points result;
     Seen seen;
-    EXPECT_THROW(FrameSampler(grid.model, seen).place(result, points, {}, [&] { return ++looks == 3; }),
+    EXPECT_THROW(FrameSampler(grid.model, seen).place(workspace, result, grid.rest, {}, [&] { return ++looks == 3; }),
                  quill::Cancelled);
     EXPECT_EQ(looks, 3);
     EXPECT_THAT(seen.ended, ElementsAre(FrameStep::points));
+}
+
+TEST(PrincipalBasis, KeepsTheShapesAndAddsThemInOrderWithEveryInstructionSet) {
+    for (const std::size_t slots : {1U, 15U, 16U, 37U})
+        for (const std::size_t shapes : {1U, 2U, 51U}) {
+            SCOPED_TRACE(testing::Message() << slots << " slots, " << shapes << " shapes");
+            std::vector<float> values(3 * slots * shapes), coefficients(shapes);
+            for (std::size_t i = 0; i < values.size(); ++i)
+                values[i] = 1.0F / static_cast<float>(1 + i % 91);
+            for (std::size_t j = 0; j < shapes; ++j)
+                coefficients[j] = (j % 2 ? -1.0F : 1.0F) / static_cast<float>(3 + j);
+            Points wanted(slots);
+            for (std::size_t slot = 0; slot < slots; ++slot)
+                for (std::size_t j = 0; j < shapes; ++j)
+                    for (std::size_t axis = 0; axis < 3; ++axis)
+                        wanted[slot][axis] += coefficients[j] * values[3 * (shapes * slot + j) + axis];
+            PrincipalBasis basis;
+            values.push_back(9); // no slot
+            basis.assign(values, shapes);
+            values.pop_back();
+            EXPECT_EQ(basis.slotMajor(), values);
+            for (const auto set : {quill::InstructionSet::plain, quill::processorInstructionSet()}) {
+                quill::limitInstructionSet(set);
+                Points sums(slots);
+                basis.sum(sums.data(), coefficients.data(), 0, basis.blockCount());
+                EXPECT_EQ(sums, wanted);
+            }
+        }
+    PrincipalBasis none;
+    none.assign({1, 2, 3}, 0);
+    EXPECT_EQ(none.blockCount() + none.slotMajor().size(), 0U);
 }
 
 struct HomogeneousPoint {

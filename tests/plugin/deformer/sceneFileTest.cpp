@@ -99,9 +99,9 @@ TEST_F(WarpScene, ADuplicateHasAStateOfItsOwn) {
     run("setAttr warp1.export[0].smoothingIterations 4; neuralWarp -exportActive on -multiIndex 0 warp1;"
         "duplicate warp1 -name copy");
     const auto placed = [](neuralWarp::neuralWarpData& data) {
-        neuralWarp::Points points = makeGrid(1, 1).points, result;
+        neuralWarp::Points result;
         const std::vector<float> outputs = data.session.run(std::vector<float>{0.3F, 0.7F});
-        neuralWarp::FrameSampler(data.frameModel()).place(result, points, outputs);
+        neuralWarp::FrameSampler(data.frameModel()).place(data.workspace, result, makeGrid(1, 1).points, outputs);
         return result;
     };
     ASSERT_NE(state("copy", 1), rig.state(1));

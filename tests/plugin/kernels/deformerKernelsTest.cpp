@@ -18,8 +18,10 @@ TEST_F(DeformerKernels, PrincipalShapesGiveTheBitsOfTheProcessor) {
             const auto basis = dice.floats(3 * slots * shapes, 2.0);
             const auto coefficients = dice.floats(shapes, 2.0);
             Points expected;
-            neuralWarp::extractPrincipalDeltas(expected, coefficients, shapes, basis,
-                                               neuralWarp::DrivenVertices(slots));
+            neuralWarp::PrincipalBasis sums;
+            sums.assign(basis, shapes);
+            neuralWarp::extractPrincipalDeltas(expected, coefficients, sums, neuralWarp::DrivenVertices(slots), {},
+                                               expected);
             Launch launch(program, "gpu_principal_shapes_kernel");
             launch.output(Points(slots)).input(coefficients).input(basis);
             launch.value(static_cast<std::uint32_t>(shapes)).value(static_cast<std::uint32_t>(slots));

@@ -40,7 +40,7 @@ Spoil shapes(std::uint64_t shapeCount, std::uint64_t vertexCount, std::size_t va
     return inState([=](Data& data) {
         data.principalShapeCount = shapeCount;
         data.principalVertCount = vertexCount;
-        data.principalShapes.assign(values, 1.0F);
+        data.principalShapes.assign(std::vector<float>(values, 1.0F), data.principalShapeCount);
     });
 }
 

@@ -1,0 +1,47 @@
+// SPDX-License-Identifier: Apache-2.0
+// The principal shapes of a model, laid out for the sum of them that every frame makes.
+#pragma once
+
+#include "frame/Points.h"
+
+#include <cstddef>
+#include <cstdint>
+#include <span>
+#include <vector>
+
+namespace neuralWarp {
+
+/// Sixteen slots side by side, whose shapes follow each other: a sum then reads the basis once, from its beginning to
+/// its end, as fast as the memory gives it (decision 0182). Const members may run at the same time.
+class PrincipalBasis {
+public:
+    /// Slots of a block.
+    static constexpr std::size_t lanes = 16;
+
+    /// Takes over a basis.
+    ///   values      [slots][shapeCount][3], as files and devices have it; what is left over of a slot is left out
+    ///   shapeCount  0: there is no basis
+    /// Throws std::bad_alloc; the basis is then empty.
+    void assign(const std::vector<float>& values, std::uint64_t shapeCount);
+    void clear() { *this = {}; }
+
+    std::size_t shapeCount() const { return shapeCount_; }
+    std::size_t slotCount() const { return slotCount_; }
+    std::size_t blockCount() const { return (slotCount_ + lanes - 1) / lanes; }
+    /// Size in bytes.
+    std::size_t bytes() const { return values_.capacity() * sizeof(float); }
+    /// [slotCount()][shapeCount()][3] again.
+    std::vector<float> slotMajor() const;
+
+    /// sums[s] = the sum over all shapes j of coefficients[j] * shape j of slot s, in single precision and increasing
+    /// j, for the slots of the blocks begin .. end - 1, up to slotCount(). The same bits with every instruction set.
+    ///   sums          [slotCount()]
+    ///   coefficients  [shapeCount()]: not checked
+    void sum(quill::val3<float>* sums, const float* coefficients, std::size_t begin, std::size_t end) const;
+
+private:
+    std::size_t shapeCount_ = 0, slotCount_ = 0;
+    std::vector<float> values_; // [blocks][shapes][3][lanes], zero beyond the last slot
+};
+
+} // namespace neuralWarp
