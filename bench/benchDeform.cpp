@@ -4,6 +4,7 @@
 #include "PhaseClock.h"
 #include "harness.h"
 #include "options.h"
+#include "plainFrame.h"
 #include "warpFrame.h"
 
 #include "frame/deltas.h"
@@ -14,6 +15,7 @@
 
 #include <array>
 #include <chrono>
+#include <cmath>
 #include <exception>
 #include <sched.h>
 #include <sys/wait.h>
@@ -128,6 +130,81 @@ void useCores(unsigned count) {
     sched_setaffinity(0, sizeof cores, &cores);
 }
 
+// Whole frames of ours and of the plain yardstick, in turn.
+struct Pairs {
+    std::vector<double> ours, plain, ratios;
+};
+
+Pairs inTurn(WarpFrame& frame, plain::Frame& plainFrame, bool isPaused, double seconds) {
+    constexpr std::size_t fewest = 15;
+    Pairs pairs;
+    const auto timed = [&](double& last, const auto& run) {
+        if (isPaused)
+            std::this_thread::sleep_for(std::chrono::duration<double>(last));
+        else
+            run(); // brings back what the other one drove out of the caches
+        last = run();
+        return last;
+    };
+    const auto runPlain = [&] {
+        const std::vector<float> controls = frame.controls();
+        const auto start = std::chrono::steady_clock::now();
+        plainFrame.run(controls);
+        return std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
+    };
+    const auto start = std::chrono::steady_clock::now();
+    double lastOurs = frame.run(), lastPlain = runPlain();
+    while (pairs.ratios.size() < fewest ||
+           std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count() < seconds) {
+        pairs.ours.push_back(timed(lastOurs, [&] { return frame.run(); }));
+        pairs.plain.push_back(timed(lastPlain, runPlain));
+        pairs.ratios.push_back(pairs.ours.back() / pairs.plain.back());
+    }
+    return pairs;
+}
+
+// The largest distance in any coordinate of what the two make of the same controls.
+double largestDifference(const WarpFrame& frame, plain::Frame& plainFrame) {
+    plainFrame.run(frame.controls());
+    const HPointArray ours = frame.output();
+    double largest = 0.0;
+    for (std::size_t i = 0; i < ours.length(); ++i) {
+        const HPoint& p = plainFrame.output()[i];
+        largest = std::max({largest, std::abs(p.x - ours[i].x), std::abs(p.y - ours[i].y), std::abs(p.z - ours[i].z)});
+    }
+    return largest;
+}
+
+std::vector<WarpSetting> plainSettings(bool isQuick) {
+    if (isQuick)
+        return {{100, true, 50, 10}, {316, true, 50, 10}};
+    return {{100, true, 50, 10}, {316, true, 50, 10}, {316, false, 50, 10}, {1000, true, 50, 10}, {100, true, 0, 10}};
+}
+
+void benchPlain(const bench::Options& options, unsigned threads) {
+    useCores(threads);
+    const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
+    OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {}); // the shapes come after the first frame
+    for (const WarpSetting& setting : plainSettings(options.isQuick)) {
+        WarpFrame frame(setting);
+        plain::Frame plainFrame(frame.state(), frame.input(), setting.isSurface, setting.smoothing);
+        if (const double off = largestDifference(frame, plainFrame); !(off < 1e-5))
+            throw std::runtime_error("the plain frame is " + std::to_string(off) + " away from ours");
+        for (const bool isPaused : {false, true}) {
+            const Pairs pairs = inTurn(frame, plainFrame, isPaused, options.seconds);
+            const double ours = quantile(pairs.ours, 0.5), plain = quantile(pairs.plain, 0.5);
+            const double tail = quantile(pairs.ours, 0.99) / ours;
+            std::printf("%7zu %-7s %-7s %3u %-6s %8.0f %8.0f %6.2f %7.2f\n", frame.vertices(),
+                        setting.isSurface ? "Surface" : "Offset", modelName(setting).c_str(), threads,
+                        isPaused ? "paused" : "hot", ours * 1e6, plain * 1e6, quantile(pairs.ratios, 0.5), tail);
+            std::fprintf(options.csv.get(), "plain,%zu,%s,%s,%u,%s,%.1f,%.1f,%.3f,%.2f\n", frame.vertices(),
+                         setting.isSurface ? "Surface" : "Offset", modelName(setting).c_str(), threads,
+                         isPaused ? "paused" : "hot", ours * 1e6, plain * 1e6, quantile(pairs.ratios, 0.5), tail);
+            std::fflush(stdout);
+        }
+    }
+}
+
 void benchFrames(const bench::Options& options, unsigned threads) {
     useCores(threads);
     const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
@@ -139,11 +216,11 @@ void benchFrames(const bench::Options& options, unsigned threads) {
 }
 
 // In a process of its own, because the network's threads are counted once.
-void inChild(const bench::Options& options, unsigned threads) {
+void inChild(const bench::Options& options, unsigned threads, void (*run)(const bench::Options&, unsigned)) {
     std::fflush(nullptr);
     const pid_t child = fork();
     if (child == 0) {
-        benchFrames(options, threads);
+        run(options, threads);
         std::fflush(nullptr);
         _exit(0);
     }
@@ -211,7 +288,16 @@ int run(int argc, char** argv) {
         std::printf("single frames, each after a pause of one frame time: medians in us; rest: what the host does\n");
         printHeader(options->csv.get());
         for (const unsigned threads : {1U, 2U})
-            inChild(*options, threads);
+            inChild(*options, threads, benchFrames);
+    }
+    if (options->wants("plain")) {
+        std::printf(
+            "whole frames beside plain ones, in turn, medians in us; hot: one after the other, paused: after one "
+            "frame time; p99: of ours, over its median\n");
+        std::printf("%7s %-7s %-7s %3s %-6s %8s %8s %6s %7s\n", "verts", "mode", "model", "thr", "", "ours", "plain",
+                    "/plain", "p99");
+        for (const unsigned threads : {1U, 2U})
+            inChild(*options, threads, benchPlain);
     }
     if (options->wants("finite")) {
         std::printf("whether a frame has only finite coordinates, looked at after each frame (at most 2 %%)\n");

@@ -54,6 +54,7 @@ WarpFrame::WarpFrame(const WarpSetting& setting, Change change)
     const HObject mesh = warpRig::mesh(makeGrid(setting.side - 1, setting.side - 1));
     if (change == Change::input)
         inputs_ = {lifted(mesh), mesh};
+    input_ = mesh;
     rig_.emplace();
     rig_->addGeometry(0, {.mesh = mesh});
     rig_->setModelRoot(folder_.path());
@@ -71,6 +72,12 @@ void WarpFrame::change() {
         control_.setDouble(0.001 * static_cast<double>(frame_ % 1000));
     else
         rig_->setInput(0, inputs_[frame_ % inputs_.size()]);
+}
+
+std::vector<float> WarpFrame::controls() const {
+    std::vector<float> values(controlCount, 0.25F);
+    values[0] = static_cast<float>(0.001 * static_cast<double>(frame_ % 1000));
+    return values;
 }
 
 double WarpFrame::run() {

@@ -35,6 +35,10 @@ public:
     double run();
 
     neuralWarp::neuralWarpData& state() { return *rig_->state(0); }
+    // The points that come in, those that came out last, and the control values of that frame.
+    HPointArray input() const { return warpRig::pointsOf(input_); }
+    HPointArray output() const { return rig_->result(0); }
+    std::vector<float> controls() const;
     std::size_t vertices() const { return vertices_; }
 
 private:
@@ -47,6 +51,7 @@ private:
     OpenQuarn::Session session_;
     TemporaryFolder folder_;
     std::optional<warpRig::Rig> rig_;
+    HObject input_;
     std::vector<HObject> inputs_;
     HPlug output_, control_;
     unsigned frame_ = 0;
