@@ -8,6 +8,7 @@
 #include "nw_model/DirectoryState.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
+#include "openquarn/HPointArray.h"
 #include "openquarn/HPxData.h"
 #include "quill/IndexMapper.h"
 #include "quill/VertexConnections.h"
@@ -131,6 +132,7 @@ public:
 
     /// What the frames of this geometry are computed in. Invalidated by whoever changes what frameModel() views.
     FrameWorkspace workspace;
+    HPointArray positions; ///< those of the last frame: its memory is used again
 
     /// Hears of each evaluation, on the CPU and on the GPU. Not owned, never null.
     FrameObserver* observer = &FrameObserver::none();

@@ -152,7 +152,7 @@ private:
     HStatus prepare(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, bool isActive,
                     TargetMorph& morph, Attempt& attempt);
     HStatus applyNeuralModel(HDataBlock& block, std::uint32_t multiIndex, neuralWarpData& data, Points& result);
-    HStatus writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex, const neuralWarpData& data,
+    HStatus writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex, neuralWarpData& data,
                          const Blend& blend);
 
     HCallbackId attributeCallback_ = 0;

@@ -145,9 +145,9 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
 }
 
 HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex,
-                                     const neuralWarpData& data, const Blend& blend) {
+                                     neuralWarpData& data, const Blend& blend) {
     const float* vertexWeights = nullptr;
-    HPointArray positions;
+    HPointArray& positions = data.positions;
     {
         const ObservedStep step(*data.observer, FrameStep::fetch);
         HStatus status;

@@ -31,20 +31,28 @@ struct Blend {
 ///   blend      must fit `count`
 template <class Point>
 void blendPositions(Point* positions, std::size_t count, const float* weights, const Blend& blend) {
+    const auto moveTo = [](Point& p, const quill::val3<float>& c, double f) {
+        p.x += (static_cast<double>(c.x) - p.x) * f;
+        p.y += (static_cast<double>(c.y) - p.y) * f;
+        p.z += (static_cast<double>(c.z) - p.z) * f;
+    };
+    if (blend.model && !blend.target && !blend.driven.slots && !weights) { // what most frames are
+        const quill::val3<float>* const model = blend.model->data();
+        const auto f = static_cast<double>(blend.envelope);
+        quill::parallelForRange(count, [=](int begin, int end) {
+            for (int i = begin; i < end; ++i)
+                moveTo(positions[i], model[i], f);
+        });
+        return;
+    }
     quill::parallelFor(count, [&](std::size_t i) {
         Point& p = positions[i];
-        const auto f = static_cast<double>(weights ? weights[i] * blend.envelope : blend.envelope);
-        const auto moveTo = [&](quill::val3<float> c) {
-            if (blend.target)
-                c = c + ((*blend.target)[i] - c) * blend.targetWeight;
-            p.x += (static_cast<double>(c.x) - p.x) * f;
-            p.y += (static_cast<double>(c.y) - p.y) * f;
-            p.z += (static_cast<double>(c.z) - p.z) * f;
-        };
+        quill::val3<float> c{static_cast<float>(p.x), static_cast<float>(p.y), static_cast<float>(p.z)};
         if (blend.model && blend.driven.contains(i))
-            moveTo((*blend.model)[i]);
-        else
-            moveTo({static_cast<float>(p.x), static_cast<float>(p.y), static_cast<float>(p.z)});
+            c = (*blend.model)[i];
+        if (blend.target)
+            c = c + ((*blend.target)[i] - c) * blend.targetWeight;
+        moveTo(p, c, static_cast<double>(weights ? weights[i] * blend.envelope : blend.envelope));
     });
 }
 
