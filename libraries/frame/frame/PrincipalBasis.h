@@ -12,7 +12,7 @@
 namespace neuralWarp {
 
 /// Sixteen slots side by side, whose shapes follow each other: a sum then reads the basis once, from its beginning to
-/// its end, as fast as the memory gives it (decision 0182). Const members may run at the same time.
+/// its end, as fast as the memory gives it (decision 0183). Const members may run at the same time.
 class PrincipalBasis {
 public:
     /// Slots of a block.
