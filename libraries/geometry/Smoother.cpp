@@ -18,6 +18,8 @@ namespace {
 // So many passes go over the mesh together: their blocks have to stay in the cache side by side.
 constexpr std::size_t passesTogether = 10;
 constexpr std::size_t smallestBlock = 16;
+// Below this many quads one thread is done before others have begun.
+constexpr std::size_t fewestForThreads = 1024;
 // A mesh whose neighbours are farther apart is put into another order.
 constexpr std::size_t farthestAsItIs = 2048;
 
@@ -35,11 +37,28 @@ public:
 
     std::size_t blockCount() const { return (quads_.size() + blockSize_ - 1) / blockSize_; }
 
-    // The result is in buffer passes % 2. Every part of the mesh goes as far as it can without what others do; then the
-    // seams between them are done.
+    // The result is in buffer passes % 2.
     void run(std::size_t passes, std::size_t parts) const {
+        const std::size_t mostParts = std::max<std::size_t>(1, blockCount() / (2 * passes + 1));
+        if (mostParts < parts && quads_.size() > fewestForThreads)
+            runOneByOne(passes);
+        else
+            runTogether(passes, std::min(parts, mostParts));
+    }
+
+private:
+    // For meshes whose neighbours are far apart in every order.
+    void runOneByOne(std::size_t passes) const {
+        for (std::size_t pass = 1; pass <= passes; ++pass)
+            parallelForRange(quads_.size(), [&](int begin, int end) {
+                kernel_(quads_.data(), neighbours_.data(), buffers_[(pass - 1) % 2], buffers_[pass % 2],
+                        static_cast<std::size_t>(begin), static_cast<std::size_t>(end));
+            });
+    }
+
+    // Every part of the mesh goes as far as it can without what others do; then the seams between them are done.
+    void runTogether(std::size_t passes, std::size_t parts) const {
         const std::size_t blocks = blockCount();
-        parts = std::max<std::size_t>(1, std::min(parts, blocks / (2 * passes + 1)));
         const auto border = [&](std::size_t part) { return blocks * part / parts; };
         parallelFor(parts, [&](std::size_t part) {
             const std::size_t left = border(part), right = border(part + 1);
@@ -60,7 +79,6 @@ public:
         });
     }
 
-private:
     void runBlock(std::size_t pass, std::size_t block) const {
         const std::size_t begin = block * blockSize_;
         kernel_(quads_.data(), neighbours_.data(), buffers_[(pass - 1) % 2], buffers_[pass % 2], begin,

@@ -60,7 +60,8 @@ HStatus readMeshPoints(const HDataHandle& geometry, const neuralWarpData& data, 
     const HFnMesh mesh(geometry.asMesh(), &status);
     if (status.error())
         return reported(status, sourceUnit::node);
-    readGeometryPoints(geometry, points, data.componentMap);
+    if (!readGeometryPoints(geometry, points, data.componentMap))
+        points.clear(); // those of another frame are none
     if (smooth)
         smoothPoints(points, data.frameModel().rest, data.activeSettings.smoothingIterations, HLongWork::isInterrupted);
     return HStatus::kSuccess;

@@ -41,6 +41,11 @@ std::vector<ZooMesh> meshes() {
     loose.points.resize(loose.points.size() + 3, {1, 2, 3});
     loose.name = "loose";
     all.push_back(loose);
+    ZooMesh star = makeGrid(80, 70); // a vertex with neighbours everywhere: far apart in every order
+    star.name = "star";
+    for (std::uint32_t v = 3; v + 90 < star.vertexCount(); v += 89)
+        star.polygons.push_back({0, v, v + 40});
+    all.push_back(star);
     return all;
 }
 
