@@ -3,40 +3,39 @@
 
 #include "quarn/scene/plugs.h"
 
-#include <string>
+#include "openquarn/HPxGeometryFilter.h"
 
 namespace quarn {
 namespace {
 
 constexpr int longestChain = 1000;
 
-// The output of the deformer that deforms what the plug gives out; null where none does. `serves` is set when something
-// else takes it.
+// What the deformer that the plug goes into gives out, the last one where there are several; null without one.
+// `serves` is set when something else takes it.
 HPlug deformedOf(const HPlug& geometry, bool& serves) {
     HPlugArray destinations;
     geometry.destinations(destinations);
-    HPlug next;
+    HPlug deformed;
     for (const HPlug& destination : destinations) {
-        const std::string name = destination.name().asChar();
-        const std::size_t end = name.rfind("].inputGeometry");
-        const std::size_t begin = name.rfind("input[");
-        if (end == std::string::npos || begin == std::string::npos) {
+        if (destination == HPxGeometryFilter::inputGeometry)
+            deformed = HPlug(destination.node(), HPxGeometryFilter::outputGeom)
+                           .elementByLogicalIndex(destination.parent().logicalIndex());
+        else
             serves = true;
-            continue;
-        }
-        const std::string index = name.substr(begin + 6, end - begin - 6);
-        next = plugOf(destination.node(), "outputGeom[" + index + "]");
     }
-    return next;
+    return deformed;
 }
 
 // null where the mesh only serves
-HPlug endOfChain(HPlug geometry) {
+HPlug endOfChain(const HPlug& mesh) {
     bool serves = false;
+    HPlug geometry = deformedOf(mesh, serves);
+    if (geometry.isNull())
+        return serves ? HPlug() : mesh;
     for (int steps = 0; steps < longestChain; ++steps) {
         const HPlug next = deformedOf(geometry, serves);
         if (next.isNull())
-            return steps == 0 && serves ? HPlug() : geometry;
+            break;
         geometry = next;
     }
     return geometry;

@@ -7,9 +7,9 @@
 
 namespace quarn {
 
-/// What a character looks like: of each mesh and grid of the scene, in order of creation, what the last of its
-/// deformers gives out, or it itself. Meshes that only serve, as targets or rest meshes do, are left out. Throws
-/// std::runtime_error, naming the plug, for one that cannot be read. Thread: main.
+/// What a character looks like: of each mesh, and then of each grid of the scene, in order of creation, what the last
+/// of its deformers gives out, or it itself where it has none. Those that only serve another node, as targets and rest
+/// meshes do, are left out. Nothing is evaluated. Thread: main.
 std::vector<HPlug> shownMeshes();
 
 } // namespace quarn

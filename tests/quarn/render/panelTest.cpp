@@ -1,9 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "host/support/SceneTest.h"
+#include "host/support/testDeformers.h"
 
 #include "quarn/render/Panel.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/shownMeshes.h"
 
+#include <array>
 #include <limits>
 
 namespace {
@@ -65,6 +68,26 @@ TEST_F(PanelTest, WhatDoesNotFitIsRefusedByName) {
             requireDrawable(std::vector<double>{0, 0, 1e200}, "p", -3);
         },
         ThrowsMessage<std::runtime_error>("p cannot be drawn at frame -3: its vertex 0 is too far away"));
+}
+
+TEST_F(PanelTest, ACharacterIsWhatItsLastDeformersGive) {
+    testDeformers::registerTypes();
+    for (const char* name : {"body", "target", "eyes", "lone"})
+        addMesh(name, {0, 0, 0, 1, 0, 0, 0, 1, 0});
+    for (const char* name : {"skin", "warp"})
+        createNode("testDeformer", name);
+    const std::array<std::array<const char*, 2>, 5> connections = {
+        {{"body.outMesh", "skin.input[3].inputGeometry"},
+         {"body.outMesh", "warp.originalGeometry[2]"},
+         {"skin.outputGeom[3]", "warp.input[2].inputGeometry"},
+         {"target.outMesh", "warp.originalGeometry[4]"},
+         {"eyes.outMesh", "skin.input[1].inputGeometry"}}};
+    for (const auto& [source, destination] : connections)
+        connect(findPlug(source), findPlug(destination));
+    std::vector<std::string> names;
+    for (const HPlug& mesh : shownMeshes())
+        names.emplace_back(mesh.name().asChar());
+    EXPECT_THAT(names, ::testing::ElementsAre("warp.outputGeom[2]", "skin.outputGeom[1]", "lone.outMesh"));
 }
 
 } // namespace
