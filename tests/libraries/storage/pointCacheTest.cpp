@@ -110,7 +110,7 @@ TEST_F(PointCaches, InTextAreReadByVertex) {
         {"d.#.obj", "d.2.obj: its line 2 is no vertex: \"v 1 2,5 3\""},
         {"none.obj", "none.obj"}};
     for (const auto& [name, why] : rows)
-        EXPECT_THAT(failureOf([&] { openPointCache(path(name)); }),
+        EXPECT_THAT(failureOf([&, &file = name] { openPointCache(path(file)); }),
                     AllOf(HasSubstr("point cache '" + path(name) + "' cannot be read: "), HasSubstr(why)));
 }
 
