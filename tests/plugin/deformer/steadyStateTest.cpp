@@ -140,6 +140,10 @@ TEST_F(SteadyState, OnlyWhatACacheIsMadeOfRebuildsIt) {
         for (std::size_t i = 0; i < advanced.size(); ++i)
             advanced[i] -= before[i];
         EXPECT_EQ(advanced, row.advanced);
+        const Coordinates kept = result(*rig);
+        rig->state(0)->workspace = {};
+        expectEvaluation();
+        EXPECT_EQ(result(*rig), kept) << "by tables of before";
     }
     takeMessages();
 }
