@@ -1,6 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
-// The memory of an evaluation: which arrays it takes anew, and what happens when there is none for one of them. A program
-// of its own, because it replaces operator new for the whole process.
+// The memory of an evaluation: which arrays it takes anew, and what happens when there is none for one of them. A
+// program of its own, because it replaces operator new for the whole process.
 #include "plugin/deformer/support/FailureTest.h"
 #include "support/watchedNew.h"
 
