@@ -9,6 +9,7 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/render/Subject.h"
+#include "quarn/render/drawJoints.h"
 #include "quarn/render/drawPanel.h"
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
@@ -61,6 +62,7 @@ struct Options {
     std::string view = "25,10";
     std::string up = "y";
     std::string frameOn = "all";
+    bool hasJoints = false;
 };
 
 // what all pictures have in common
@@ -252,12 +254,14 @@ void drawPictures(const Shot& shot, const Options& options, SceneSession& sessio
         const Stage stage([&] { return "drawing " + name.string(); });
         session.host().setTime(frame);
         Picture picture(shot.layout.width * static_cast<int>(shot.panels.size()), shot.layout.height);
+        const std::vector<ShownJoint> joints = options.hasJoints ? shownJoints() : std::vector<ShownJoint>();
         int left = 0;
         for (std::size_t panel = 0; panel < shot.panels.size(); ++panel) {
             const PanelFrame shown = evaluatePanel(shot.panels[panel], frame);
             for (const MeshFrame& mesh : shown)
                 answer.measures[panel].add(mesh.distances);
             drawPanel(picture, shot.layout, left, shot.camera, shot.panels[panel], shown, shot.scale);
+            drawJoints(picture, shot.layout, left, shot.camera, joints);
             left += shot.layout.width;
         }
         throwIfAny(errors, frame);
@@ -410,6 +414,7 @@ void addRenderCommand(CLI::App& app) {
                      "What the camera is on: all, what is moving from frame to frame, or what is differing from panel "
                      "to panel")
         ->capture_default_str();
+    command->add_flag("--joints", options->hasJoints, "Draw the joints over every panel");
     command->add_option("--up", options->up, "The axis that points up: x, y or z")->capture_default_str();
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { render(*options); });

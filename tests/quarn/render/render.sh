@@ -40,6 +40,22 @@ scene=$work/two.json
 "$quarn" render "$scene" --size 40x30 -o "$work/whole.png" 2>>"$work/err"
 "$quarn" render "$scene" --size 40x30 -o "$work/named.png" --panel "=floor.outMesh+lift.outputGeom[0]" 2>>"$work/err"
 cmp "$work/whole.png" "$work/named.png"
+cat >"$work/bones.json" <<'END'
+{"openquarnScene": 1,
+ "nodes": [
+  {"name": "floor", "type": "polyGrid", "values": {"width": 4}},
+  {"name": "root", "type": "joint", "values": {"translateX": -1}},
+  {"name": "tip", "type": "joint", "values": {"translateX": 2}}],
+ "connections": [["root.worldMatrix", "tip.parentMatrix"]]}
+END
+scene=$work/bones.json
+shot() { "$quarn" render "$scene" --size 60x60 --view top -o "$work/$1" "${@:2}" 2>>"$work/err"; }
+shot plain.png
+shot bones.png --joints
+! cmp -s "$work/plain.png" "$work/bones.png" || fail "no joint is drawn"
+sed -i 's/"translateX": 2/"translateX": 0/' "$work/bones.json"
+shot short.png --joints
+! cmp -s "$work/short.png" "$work/bones.png" || fail "the joints are not where they stand"
 scene=examples/wave/wave.json
 
 refused 2 "must end in .png" -o "$work/no.jpg"
