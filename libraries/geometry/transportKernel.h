@@ -69,7 +69,7 @@ struct TransportBody {
         for (std::uint32_t k = 0; k < block.most; ++k, pairs += 2 * transportLanes) {
             const Vectors a = minus(loadRows(rows, pairs), here);
             const Vectors sum = plus(normal, cross(a, minus(loadRows(rows, pairs + transportLanes), here)));
-            // a lane without this pair keeps its sum: adding zero would lose the sign of one
+            // a lane without this pair keeps its sum: of an infinite vertex the padding adds what is no number
             normal = k < block.fewest ? sum : select(Lanes::moreThan(block.pairCount.data(), k), sum, normal);
             if (k == 0)
                 tangent = block.fewest > 0 ? a : select(Lanes::moreThan(block.pairCount.data(), 0), a, tangent);

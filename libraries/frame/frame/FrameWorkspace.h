@@ -18,9 +18,6 @@ class FrameWorkspace {
 public:
     /// Something that a FrameModel views has changed: the next frame lays the tables out anew. [any]
     void invalidate() { isSmootherDue_ = isTransportDue_ = areBlocksDue_ = true; }
-    /// Frees all of it.
-    void release() { *this = {}; }
-
     /// The tables for `model`, as they were laid out or made now. Those that do not fit the vertices are empty. Throw
     /// std::bad_alloc.
     const quill::Smoother& smoother(const FrameModel& model);

@@ -8,12 +8,8 @@ here=$(dirname "$0")
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 source tests/support/expect.sh
+source "$here/needs_blender.sh"
 
-if ! blender -b --python-exit-code 1 --python-expr 'import numpy' >/dev/null 2>&1; then
-  [[ ${NW_ALL_CLIENTS:-} ]] && echo "failed: no Blender, or none with NumPy" && exit 1
-  echo "skipped: no Blender, or none with NumPy"
-  exit 77
-fi
 blender -b --factory-startup --python-exit-code 1 --python "$here/limb.py" -- "$work" >"$work/log" 2>&1 ||
   { cat "$work/log" && exit 1; }
 
