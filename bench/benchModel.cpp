@@ -5,10 +5,14 @@
 #include "harness.h"
 #include "options.h"
 
+#include "frame/PrincipalBasis.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
+#include "nw_model/PrincipalBasisFiles.h"
 #include "nw_model/PrincipalShapes.h"
+#include "storage/fileSum.h"
 #include "support/TemporaryFolder.h"
+#include "support/npzBytes.h"
 
 #include <charconv>
 #include <cstdlib>
@@ -16,6 +20,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <span>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -112,16 +117,82 @@ std::string shapesText(std::size_t shapes, std::size_t vertices) {
     return text + "]]}";
 }
 
+fs::path write(const fs::path& path, const std::string& text) {
+    std::ofstream(path, std::ios::binary) << text;
+    return path;
+}
+
+// Shapes as the trainer writes them: nine digits a number, and the archive beside the text.
+void writeShapes(const fs::path& folder, std::size_t shapes, std::size_t vertices) {
+    std::vector<float> values(3 * shapes * vertices);
+    std::string text = "{\"principalShapeCount\": " + std::to_string(shapes) +
+                       ", \"principalVertCount\": " + std::to_string(vertices) + ", \"principalShapes\": [\n";
+    double value = 0.1234567890123456;
+    for (std::size_t s = 0; s < shapes; ++s) {
+        text += s == 0 ? "[" : ",\n[";
+        for (std::size_t i = 0; i < 3 * vertices; ++i) {
+            char number[32];
+            value = value * 3.9 * (1.0 - value);
+            float& stored = values[3 * (i / 3 * shapes + s) + i % 3];
+            stored = static_cast<float>(0.01 * (value - 0.5));
+            std::snprintf(number, sizeof number, "%s%.9g", i == 0 ? "" : ",", static_cast<double>(stored));
+            text += number;
+        }
+        text += "]";
+    }
+    const fs::path json = write(folder / "principal_shapes.json", text + "\n]}\n");
+    write(folder / "principal_shapes.npz",
+          shapesArchive(storage::sumOfFile(json, UINT64_MAX, 0).digits, values, shapes));
+}
+
+class BasisSink final : public neuralWarp::PrincipalShapesSink {
+public:
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
+        basis_.resize(vertCount, shapeCount);
+        filled_ = 0;
+    }
+    void append(std::span<const float> values) override {
+        basis_.set(filled_, values);
+        filled_ += values.size() / 3 / basis_.shapeCount();
+    }
+
+private:
+    neuralWarp::PrincipalBasis basis_;
+    std::size_t filled_ = 0;
+};
+
+// From the files of a model to the basis that frames read, and the parts of that way.
+std::vector<Phase> openingShapes(const fs::path& folder, std::size_t vertices, const std::string& name) {
+    constexpr std::size_t shapes = 50;
+    fs::create_directory(folder);
+    writeShapes(folder, shapes, vertices);
+    const fs::path json = folder / "principal_shapes.json";
+    const std::size_t numbers = 3 * shapes * vertices;
+    Phase all{"open shapes", name, numbers, fs::file_size(json)};
+    all.ours = [folder] {
+        BasisSink sink;
+        neuralWarp::PrincipalShapesAnswer answer;
+        if (!neuralWarp::readPrincipalBasis(folder, sink, answer) || !answer.isFromArchive)
+            throw std::runtime_error("the shapes cannot be opened: " + answer.whyNotArchive);
+    };
+    Phase sum{"open shapes: sum of text", name, numbers, fs::file_size(json)};
+    sum.ours = [json] { storage::sumOfFile(json, UINT64_MAX, 0); };
+    Phase text{"open shapes: by text", name, numbers, fs::file_size(json)};
+    text.ours = [json] {
+        std::vector<float> values;
+        std::uint64_t counts[2];
+        neuralWarp::readPrincipalShapesFile(json, values, counts[0], counts[1]);
+    };
+    Phase layOut{"open shapes: lay out", name, numbers, numbers * sizeof(float)};
+    layOut.ours = [values = std::vector<float>(numbers)] { neuralWarp::PrincipalBasis().assign(values, shapes); };
+    return {all, sum, layOut, text};
+}
+
 std::string metadataText(std::size_t indices) {
     std::string text = "{\"subsetState\": \"partial\", \"affectMap\": [0";
     for (std::size_t i = 1; i < indices; ++i)
         text += ", " + std::to_string(7 * i);
     return text + "]}";
-}
-
-fs::path write(const fs::path& path, const std::string& text) {
-    std::ofstream(path, std::ios::binary) << text;
-    return path;
 }
 
 Phase readingShapes(const fs::path& folder, std::vector<float>& values, std::vector<float>& plainValues) {
@@ -156,12 +227,17 @@ void runAll(const bench::Options& options, bench::Report& report) {
     std::vector<float> values, plainValues;
     neuralWarp::ModelMetadata record;
     std::vector<std::uint32_t> plainIndices;
+    const std::size_t vertices = options.isQuick ? 10000 : 100000;
+    const std::string name = options.isQuick ? "10 k x 50" : "100 k x 50";
     std::vector<Phase> phases = {
         running("direct", direct, bareDirect),
         running("wide", wide, bareWide),
         readingShapes(folder.path(), values, plainValues),
         readingMetadata(folder.path(), record, plainIndices),
     };
+    for (const Phase& phase :
+         options.wants("open shapes") ? openingShapes(folder.path() / "opened", vertices, name) : std::vector<Phase>())
+        phases.push_back(phase);
     for (Phase& phase : phases) {
         phase.parallel = false;
         if (phase.name.rfind(options.only, 0) == 0)

@@ -33,6 +33,6 @@ if(OnnxRuntime_LIBRARY)
   list(APPEND CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS "${_onnx_folder}")
 endif()
 string(JOIN ", " CPACK_DEBIAN_PACKAGE_DEPENDS "python3 (>= 3.9)" python3-torch python3-onnx python3-numpy python3-scipy
-  python3-tqdm python3-matplotlib)
+  python3-tqdm python3-matplotlib python3-xxhash)
 string(JOIN ", " CPACK_DEBIAN_PACKAGE_RECOMMENDS libopenblas0-pthread pocl-opencl-icd)
 include(CPack)

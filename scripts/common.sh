@@ -35,6 +35,7 @@ declare -A probe_of=(
   [libmeshoptimizer-dev]=/usr/include/meshoptimizer.h
   [libpugixml-dev]=/usr/include/pugixml.hpp
   [zlib1g-dev]=/usr/include/zlib.h # for compressed NumPy arrays; and Assimp's own configuration links it
+  [libxxhash-dev]=/usr/include/xxhash.h
   [libembree-dev]=embree3/rtcore.h
   [libstb-dev]=stb/stb_image_write.h
   [ocl-icd-opencl-dev]=CL/cl.h
@@ -52,6 +53,7 @@ declare -A probe_of=(
   [python3-scipy]=/usr/lib/python3/dist-packages/scipy/__init__.py
   [python3-tqdm]=/usr/lib/python3/dist-packages/tqdm/__init__.py
   [python3-matplotlib]=/usr/lib/python3/dist-packages/matplotlib/__init__.py
+  [python3-xxhash]=/usr/lib/python3/dist-packages/xxhash/__init__.py
   [python3-pil]=/usr/lib/python3/dist-packages/PIL/__init__.py
   [libopenblas0-pthread]=/usr/lib/*/openblas-pthread/libblas.so.3 # ten times as fast as the reference one
   [blender]=blender
@@ -70,10 +72,10 @@ declare -A probe_of=(
 # The same by what they are for; scripts that source this file install them.
 # shellcheck disable=SC2034
 build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-dev libgtest-dev libgmock-dev libeigen3-dev
-  libassimp-dev libmeshoptimizer-dev libpugixml-dev zlib1g-dev libembree-dev libstb-dev ocl-icd-opencl-dev
-  pocl-opencl-icd)
+  libassimp-dev libmeshoptimizer-dev libpugixml-dev zlib1g-dev libxxhash-dev libembree-dev libstb-dev
+  ocl-icd-opencl-dev pocl-opencl-icd)
 python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
-  python3-pil libopenblas0-pthread)
+  python3-xxhash python3-pil libopenblas0-pthread)
 # what a wheel of the trainer is made with, and installed in a place of its own
 wheel_packages=(python3-setuptools python3-wheel python3-venv)
 package_packages=(dpkg-dev file)

@@ -4,7 +4,7 @@
 # and a sentence if there is none.
 set -euo pipefail
 
-modules=(numpy scipy torch onnx tqdm matplotlib)
+modules=(numpy scipy torch onnx tqdm matplotlib xxhash)
 
 # The first of the modules that the interpreter lacks, or nothing. Finding is enough: importing takes seconds.
 missing_of() {

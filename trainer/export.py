@@ -4,12 +4,14 @@
 The network is written node by node (decision 0084).
 """
 
+import io
 import json
 from pathlib import Path
 from typing import Any, Optional, Union
 
 import numpy as np
 import onnx
+import xxhash
 from onnx import TensorProto, helper, numpy_helper
 from torch import Tensor, nn
 
@@ -23,7 +25,7 @@ from .settings import WITHOUT_EFFECT, Settings
 OPSET = 16
 IR_VERSION = 8
 METADATA_LIMIT, SHAPES_LIMIT = 64 << 20, 1 << 30  # bytes that the deformer reads
-BYTES_OF_A_NUMBER = 13                            # of a float32 in a JSON list, at most about
+BYTES_OF_A_NUMBER = 14                            # of a float32 in a JSON list, at most about
 METADATA_KEYS = ("deltaCount", "deltaMode", "smoothingIterations", "affectCount", "fullCount", "subsetState",
                  "componentTagExpression", "geometry")
 
@@ -93,7 +95,7 @@ class GraphWriter:
         return model
 
 
-# --- metadata.json, principal_shapes.json ---
+# --- metadata.json, principal_shapes.json, principal_shapes.npz ---
 
 def metadata(dataset: Dataset, settings: Optional[Settings], seed: Optional[int]) -> dict[str, Any]:
     """What the deformer needs to know of the data set, and where the model comes from."""
@@ -128,11 +130,23 @@ def write_model(folder: Path, model: onnx.ModelProto, metadata_: dict[str, Any],
     write_bytes(folder / "metadata.json", text.encode())
     write_bytes(folder / "model.onnx", model.SerializeToString(deterministic=True))
     if shapes is not None:
-        write_shapes(folder / "principal_shapes.json", shapes)
+        write_shapes(folder, shapes)
 
 
-def write_shapes(path: Path, shapes: np.ndarray) -> None:
-    # as text a float32 has the fewest digits that give it back
-    rows = ",\n".join("[" + ",".join(shape.astype(str).tolist()) + "]" for shape in shapes)
-    write_bytes(path, (f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
-                       f'"principalShapes": [\n{rows}\n]}}\n').encode())
+def write_shapes(folder: Path, shapes: np.ndarray) -> None:
+    # nine digits give a float32 back, also where a reader errs in a double's last places; it takes "-0" for 0
+    numbers = ",".join(["%.9g"] * shapes.shape[1])
+    rows = ",\n".join("[" + numbers % tuple(shape.tolist()) + "]" for shape in shapes + np.float32(0))
+    text = (f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
+            f'"principalShapes": [\n{rows}\n]}}\n').encode()
+    write_bytes(folder / "principal_shapes.json", text)
+    write_bytes(folder / "principal_shapes.npz", shapes_archive(text, shapes + np.float32(0)))
+
+
+def shapes_archive(text: bytes, shapes: np.ndarray) -> bytes:
+    """The numbers of that JSON for readers in a hurry: they count while the JSON is the one of that sum."""
+    by_vertex = shapes.reshape(len(shapes), -1, 3).transpose(1, 0, 2)
+    archive = io.BytesIO()
+    np.savez(archive, json_xxh3_128=np.array(xxhash.xxh3_128_hexdigest(text).encode()),
+             shapes=np.ascontiguousarray(by_vertex, "<f4"))
+    return archive.getvalue()

@@ -19,7 +19,7 @@ from .settings import Settings
 from .shapes import principal_basis
 from .training import History, Split, fit, make_deterministic, split_rows
 
-MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json")
+MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json", "principal_shapes.npz")
 VERIFIED_ROWS = 64
 TOLERANCE = 1e-4  # of the root mean square of the outputs
 

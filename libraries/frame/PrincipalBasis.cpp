@@ -10,24 +10,37 @@
 
 namespace neuralWarp {
 
-void PrincipalBasis::assign(const std::vector<float>& values, std::uint64_t shapeCount) {
+void PrincipalBasis::resize(std::size_t slotCount, std::size_t shapeCount) {
     clear();
-    const std::size_t slots = shapeCount == 0 ? 0 : values.size() / 3 / static_cast<std::size_t>(shapeCount);
-    if (slots == 0)
+    if (slotCount == 0 || shapeCount == 0)
         return;
+    quill::resizeInLargePages(values_, (slotCount + lanes - 1) / lanes * shapeCount * 3 * lanes);
+    shapeCount_ = shapeCount;
+    slotCount_ = slotCount;
+}
+
+void PrincipalBasis::set(std::size_t first, std::span<const float> values) {
+    const std::size_t end = first + values.size() / (3 * shapeCount_);
+    for (std::size_t b = first / lanes; b * lanes < end; ++b) {
+        float* out = values_.data() + b * shapeCount_ * 3 * lanes;
+        const std::size_t slot = std::max(first, b * lanes);
+        const std::size_t count = std::min(end, (b + 1) * lanes) - slot;
+        const float* const in = values.data() + (slot - first) * 3 * shapeCount_;
+        out += slot % lanes;
+        for (std::size_t i = 0; i < 3 * shapeCount_; ++i, out += lanes)
+            for (std::size_t lane = 0; lane < count; ++lane)
+                out[lane] = in[3 * shapeCount_ * lane + i];
+    }
+}
+
+void PrincipalBasis::assign(const std::vector<float>& values, std::uint64_t shapeCount) {
     const auto shapes = static_cast<std::size_t>(shapeCount);
-    const std::size_t blocks = (slots + lanes - 1) / lanes;
-    quill::resizeInLargePages(values_, blocks * shapes * 3 * lanes);
-    quill::parallelFor(blocks, [&](std::size_t b) {
-        float* out = values_.data() + b * shapes * 3 * lanes;
-        const std::size_t count = std::min(lanes, slots - lanes * b);
-        for (std::size_t j = 0; j < shapes; ++j)
-            for (std::size_t axis = 0; axis < 3; ++axis, out += lanes)
-                for (std::size_t lane = 0; lane < count; ++lane)
-                    out[lane] = values[3 * (shapes * (lanes * b + lane) + j) + axis];
+    resize(shapes == 0 ? 0 : values.size() / 3 / shapes, shapes);
+    quill::parallelFor(blockCount(), [&](std::size_t b) {
+        const std::size_t first = lanes * b;
+        const std::size_t count = std::min(lanes, slotCount_ - first);
+        set(first, std::span(values).subspan(3 * shapes * first, 3 * shapes * count));
     });
-    shapeCount_ = shapes;
-    slotCount_ = slots;
 }
 
 std::vector<float> PrincipalBasis::slotMajor() const {

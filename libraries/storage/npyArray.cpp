@@ -34,13 +34,7 @@ Body bodyOf(std::string_view bytes, const std::string& descr, std::size_t dimens
                                  ", where '" + descr + "' in " + std::to_string(dimensions) +
                                  (dimensions == 1 ? " dimension is" : " dimensions are") + " expected");
     const std::string_view numbers = bytes.substr(place.start + place.length);
-    std::uint64_t needed = sizeof(float);
-    for (const std::uint64_t size : array.shape)
-        if (__builtin_mul_overflow(needed, size, &needed))
-            throw std::runtime_error("its shape " + npyShapeText(array.shape) + " is too large");
-    if (needed != numbers.size())
-        throw std::runtime_error("its shape " + npyShapeText(array.shape) + " takes " + std::to_string(needed) +
-                                 " bytes, and " + std::to_string(numbers.size()) + " follow the header");
+    requireNpySize(array, sizeof(float), numbers.size());
     return {array.shape, numbers};
 }
 

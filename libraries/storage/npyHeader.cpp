@@ -209,6 +209,16 @@ NpyHeader parseNpyHeader(std::string_view text) {
     return header;
 }
 
+void requireNpySize(const NpyArray& array, std::size_t numberSize, std::uint64_t size) {
+    std::uint64_t needed = numberSize;
+    for (const std::uint64_t count : array.shape)
+        if (__builtin_mul_overflow(needed, count, &needed))
+            fail("its shape " + npyShapeText(array.shape) + " is too large");
+    if (needed != size)
+        fail("its shape " + npyShapeText(array.shape) + " takes " + std::to_string(needed) + " bytes, and " +
+             std::to_string(size) + " follow the header");
+}
+
 std::string npyShapeText(const std::vector<std::uint64_t>& shape) {
     std::string text;
     for (std::size_t i = 0; i < std::min<std::size_t>(shape.size(), 5); ++i)

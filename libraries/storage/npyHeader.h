@@ -46,6 +46,8 @@ NpyPlace findNpyHeader(std::string_view bytes);
 /// Reads the header's text, of any array in C order whose elements are plain. Throws std::runtime_error, with the
 /// reason alone, for anything but the three keys. [any]
 NpyArray parseNpyArray(std::string_view text);
+/// Throws the same unless `size` bytes are those of all numbers, of `numberSize` bytes each. [any]
+void requireNpySize(const NpyArray& array, std::size_t numberSize, std::uint64_t size);
 /// "[2, 3]"; of more than five numbers the first five. [any]
 std::string npyShapeText(const std::vector<std::uint64_t>& shape);
 

@@ -8,7 +8,9 @@
 #include "storage/FileBytes.h"
 
 #include <cstdint>
+#include <optional>
 #include <string>
+#include <string_view>
 
 namespace storage {
 
@@ -23,6 +25,8 @@ struct ZipMember {
 /// The one member of the archive whose name ends in ".npy". Throws std::runtime_error, with the reason alone, for
 /// anything that is no such archive, with none or several of them, and for encrypted members and other methods. [any]
 ZipMember findOnlyArray(const FileBytes& file);
+/// The member of that name; nothing when there is none. Throws the same, and for two of that name. [any]
+std::optional<ZipMember> findMember(const FileBytes& file, std::string_view name);
 
 /// What lies before and behind the bytes of the only member of an archive, which is stored.
 struct ZipFrame {

@@ -4,9 +4,9 @@
 #include "storage/zipRecords.h"
 
 #include <algorithm>
-#include <optional>
 #include <stdexcept>
 #include <string_view>
+#include <vector>
 
 namespace storage {
 namespace {
@@ -100,19 +100,17 @@ Entry entryAt(std::string_view bytes) {
     return entry;
 }
 
-/// The only array of a directory's bytes.
-Entry onlyArray(std::string_view directory) {
-    std::optional<Entry> found;
-    std::size_t arrays = 0;
+/// Those of a directory's members whose name `isWanted`.
+template <class IsWanted>
+std::vector<Entry> entriesOf(std::string_view directory, IsWanted isWanted) {
+    std::vector<Entry> entries;
     while (!directory.empty()) {
         const Entry entry = entryAt(directory);
         directory.remove_prefix(entry.length);
-        if (entry.name.ends_with(".npy") && arrays++ == 0)
-            found = entry;
+        if (isWanted(entry.name))
+            entries.push_back(entry);
     }
-    if (arrays != 1)
-        refuse("it has " + std::to_string(arrays) + " arrays: a point cache is one");
-    return *found;
+    return entries;
 }
 
 FileBytes bytesOf(const FileBytes& file, const Entry& entry) {
@@ -126,16 +124,17 @@ FileBytes bytesOf(const FileBytes& file, const Entry& entry) {
     return file.part(start, entry.packed);
 }
 
-} // namespace
-
-ZipMember findOnlyArray(const FileBytes& file) {
+/// What is at the end: all central headers.
+std::string directoryOf(const FileBytes& file) {
     const Directory directory = findDirectory(file);
     constexpr std::uint64_t mostDirectory = 1U << 20U;
     if (directory.size > mostDirectory)
         refuse("its directory takes " + std::to_string(directory.size) + " bytes: at most " +
                std::to_string(mostDirectory) + " are read");
-    const std::string bytes = wanted(file, directory.start, static_cast<std::size_t>(directory.size), "directory");
-    const Entry entry = onlyArray(bytes);
+    return wanted(file, directory.start, static_cast<std::size_t>(directory.size), "directory");
+}
+
+ZipMember memberOf(const FileBytes& file, const Entry& entry) {
     constexpr std::uint16_t encrypted = 1, stored = 0, deflated = 8;
     if ((entry.flags & encrypted) != 0)
         refuse("its array is encrypted");
@@ -147,6 +146,26 @@ ZipMember findOnlyArray(const FileBytes& file) {
         refuse("it is damaged: its stored array has two sizes, " + std::to_string(member.size) + " and " +
                std::to_string(member.bytes.size) + " bytes");
     return member;
+}
+
+} // namespace
+
+ZipMember findOnlyArray(const FileBytes& file) {
+    const std::string directory = directoryOf(file);
+    const auto arrays = entriesOf(directory, [](std::string_view name) { return name.ends_with(".npy"); });
+    if (arrays.size() != 1)
+        refuse("it has " + std::to_string(arrays.size()) + " arrays: a point cache is one");
+    return memberOf(file, arrays.front());
+}
+
+std::optional<ZipMember> findMember(const FileBytes& file, std::string_view name) {
+    const std::string directory = directoryOf(file);
+    const auto members = entriesOf(directory, [name](std::string_view found) { return found == name; });
+    if (members.empty())
+        return {};
+    if (members.size() > 1)
+        refuse("it has " + std::to_string(members.size()) + " members " + std::string(name));
+    return memberOf(file, members.front());
 }
 
 } // namespace storage

@@ -7,12 +7,13 @@
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
-#include "nw_model/PrincipalShapes.h"
+#include "nw_model/PrincipalBasisFiles.h"
 #include "openquarn/HGlobal.h"
 #include "openquarn/HItGeometry.h"
 #include "openquarn/HLongWork.h"
 #include "openquarn/Instrumenter.h"
 
+#include <span>
 #include <system_error>
 
 namespace neuralWarp {
@@ -121,17 +122,37 @@ HStatus loadNetwork(neuralWarpData& data) {
     return reported({HStatus::kFailure, "'" + file.string() + "' cannot be used: " + reason}, sourceUnit::node);
 }
 
+/// Puts shapes where frames read them, as they come from their file.
+class BasisSink final : public PrincipalShapesSink {
+public:
+    explicit BasisSink(PrincipalBasis& basis)
+        : basis_(basis) {}
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
+        basis_.resize(static_cast<std::size_t>(vertCount), static_cast<std::size_t>(shapeCount));
+        filled_ = 0;
+    }
+    void append(std::span<const float> values) override {
+        basis_.set(filled_, values);
+        filled_ += values.size() / (3 * basis_.shapeCount());
+    }
+
+private:
+    PrincipalBasis& basis_;
+    std::size_t filled_ = 0; ///< slots
+};
+
 /// None when the directory has no such file, or a bad one.
 HStatus loadPrincipalShapes(neuralWarpData& data) {
-    const fs::path file = data.modelDirectory / "principal_shapes.json";
-    const Entry entry(file);
-    std::uint64_t shapes = 0;
-    std::uint64_t vertices = 0;
-    std::vector<float> values;
-    if (entry.exists() && readPrincipalShapesFile(file, values, shapes, vertices)) {
-        data.principalShapes.assign(values, shapes);
-        data.principalShapeCount = shapes;
-        data.principalVertCount = vertices;
+    const Entry entry(data.modelDirectory / "principal_shapes.json");
+    if (!entry.exists())
+        return entry.status;
+    BasisSink sink(data.principalShapes);
+    PrincipalShapesAnswer answer;
+    if (readPrincipalBasis(data.modelDirectory, sink, answer)) {
+        data.principalShapeCount = answer.shapeCount;
+        data.principalVertCount = answer.vertCount;
+    } else {
+        data.principalShapes.clear();
     }
     return entry.status;
 }

@@ -41,6 +41,11 @@ void readShapes(ModelReport& model) {
     model.hasShapes = sizes.hasFile;
     model.shapeCount = sizes.count;
     model.shapeVertices = sizes.vertices;
+    model.shapeSource = sizes.source;
+    if (!sizes.whyNotArchive.empty())
+        model.notes.push_back("principal_shapes.npz is not used, and principal_shapes.json is read instead, which "
+                              "takes longer: " +
+                              sizes.whyNotArchive);
 }
 
 std::string numbers(const char* what, std::size_t has, const char* needs, std::size_t needed) {
@@ -105,7 +110,7 @@ ModelReport readModel(const fs::path& directory, neuralWarp::ModelSession& sessi
     ModelReport model;
     model.directory = directory;
     const auto state = neuralWarp::DirectoryState::atRest(directory);
-    for (const char* file : {"metadata.json", "model.onnx", "principal_shapes.json"})
+    for (const char* file : {"metadata.json", "model.onnx", "principal_shapes.json", "principal_shapes.npz"})
         model.bytes += sizeOf(directory / file);
     readMetadata(directory, model.metadata, model.problems);
     readNetwork(model, session);

@@ -16,13 +16,15 @@ namespace quarn {
 
 struct ModelReport {
     std::filesystem::path directory;
-    std::uint64_t bytes = 0; ///< of its three files
+    std::uint64_t bytes = 0; ///< of its four files
     neuralWarp::ModelMetadata metadata;
     std::size_t inputs = 0;  ///< control values that the network takes; 0 when it cannot be run
     std::size_t outputs = 0; ///< values that it gives; 0 when it cannot be run
     bool hasShapes = false;  ///< there is a file of principal shapes
     std::uint64_t shapeCount = 0;
     std::uint64_t shapeVertices = 0;
+    std::string shapeSource;           ///< the file that the shapes' numbers are read from; empty for none
+    std::vector<std::string> notes;    ///< one sentence each: what is odd, and keeps nothing from working
     std::vector<std::string> problems; ///< one sentence each: what keeps it from being used, in itself
 };
 

@@ -23,6 +23,7 @@ void transfer(Archive& archive, Answer& answer) {
     auto& metadata = model.metadata;
     archive(model.bytes), archive(model.inputs), archive(model.outputs), archive(model.hasShapes);
     archive(model.shapeCount), archive(model.shapeVertices), archive(model.problems);
+    archive(model.shapeSource), archive(model.notes);
     archive(metadata.loaded), archive(metadata.deltaCount), archive(metadata.deltaMode);
     archive(metadata.smoothingIterations), archive(metadata.affectCount), archive(metadata.fullCount);
     archive(metadata.affectMap), archive(metadata.subsetState), archive(metadata.componentTagExpression);

@@ -76,8 +76,8 @@ std::string modelText(const ModelReport& model, const std::optional<Fit>& fit) {
             "network: " + std::to_string(model.inputs) + " controls to " + std::to_string(model.outputs) + " outputs\n";
     if (model.shapeCount != 0)
         text += std::to_string(model.shapeCount) + " principal shapes of " + std::to_string(model.shapeVertices) +
-                " vertices\n";
-    text += lines("damaged", model.problems);
+                " vertices, read from " + model.shapeSource + "\n";
+    text += lines("damaged", model.problems) + lines("note", model.notes);
     if (fit)
         text += lines("does not fit", fit->errors) + lines("warning", fit->warnings) +
                 (fit->errors.empty() && model.problems.empty() ? "fits\n" : "");
@@ -95,7 +95,9 @@ std::string modelJson(const ModelReport& model, const std::optional<Fit>& fit) {
     writeCount(json, "outputs", model.outputs);
     writeCount(json, "principalShapes", model.shapeCount);
     writeCount(json, "principalShapeVertices", model.shapeVertices);
+    writeText(json, "principalShapesFile", model.shapeSource);
     writeTexts(json, "problems", model.problems);
+    writeTexts(json, "notes", model.notes);
     if (fit) {
         writeBool(json, "fits", fit->errors.empty() && model.problems.empty());
         writeTexts(json, "misfits", fit->errors);

@@ -55,7 +55,7 @@ fs::path checkout() {
 
 // finding modules is enough: importing them takes seconds
 constexpr const char* findModules = "import sys, importlib.util as u\n"
-                                    "names = 'numpy scipy torch onnx tqdm matplotlib'.split()\n"
+                                    "names = 'numpy scipy torch onnx tqdm matplotlib xxhash'.split()\n"
                                     "missing = [n for n in names if u.find_spec(n) is None]\n"
                                     "print('lacks ' + ', '.join(missing)) if missing else None\n"
                                     "sys.exit(bool(missing))\n";
@@ -77,8 +77,9 @@ std::string findPython() {
             return python;
         reasons += python + " " + said.line + "; ";
     }
-    throw std::runtime_error("no Python for the trainer: " + reasons + "install (Debian) python3-torch, " +
-                             "python3-onnx, python3-scipy, python3-tqdm, python3-matplotlib, or set NW_PYTHON");
+    throw std::runtime_error(
+        "no Python for the trainer: " + reasons + "install (Debian) python3-torch, " +
+        "python3-onnx, python3-scipy, python3-tqdm, python3-matplotlib, python3-xxhash, or set NW_PYTHON");
 }
 
 FoundProgram found(Words words, std::map<std::string, std::string> environment) {

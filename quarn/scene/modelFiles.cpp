@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/modelFiles.h"
 
-#include "nw_model/PrincipalShapes.h"
+#include "nw_model/PrincipalBasisFiles.h"
 
 #include <algorithm>
 
@@ -10,6 +10,17 @@ namespace quarn {
 namespace fs = std::filesystem;
 using neuralWarp::ModelMetadata;
 using neuralWarp::SubsetState;
+
+namespace {
+
+/// Who only wants to know whether the numbers can be read.
+class NoSink final : public neuralWarp::PrincipalShapesSink {
+public:
+    void begin(std::uint64_t, std::uint64_t) override {}
+    void append(std::span<const float>) override {}
+};
+
+} // namespace
 
 void readMetadata(const fs::path& directory, ModelMetadata& metadata, std::vector<std::string>& problems) {
     const fs::path file = directory / "metadata.json";
@@ -32,13 +43,19 @@ void readMetadata(const fs::path& directory, ModelMetadata& metadata, std::vecto
 }
 
 ShapeSizes readShapeSizes(const fs::path& directory, std::vector<std::string>& problems) {
-    const fs::path file = directory / "principal_shapes.json";
     ShapeSizes sizes;
-    sizes.hasFile = fs::exists(file);
-    std::vector<float> values;
-    if (sizes.hasFile && !neuralWarp::readPrincipalShapesFile(file, values, sizes.count, sizes.vertices))
+    sizes.hasFile = fs::exists(directory / "principal_shapes.json");
+    if (!sizes.hasFile)
+        return sizes;
+    NoSink sink;
+    neuralWarp::PrincipalShapesAnswer answer;
+    if (!neuralWarp::readPrincipalBasis(directory, sink, answer))
         problems.emplace_back("principal_shapes.json is damaged: the deformer would take the network's outputs "
                               "for deltas");
+    sizes.count = answer.shapeCount;
+    sizes.vertices = answer.vertCount;
+    sizes.source = answer.isFromArchive ? "principal_shapes.npz" : "principal_shapes.json";
+    sizes.whyNotArchive = answer.whyNotArchive;
     return sizes;
 }
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// The two JSON files of a model directory, and what the deformer takes from them without a word.
+// The files of a model directory beside its network, and what the deformer takes from them without a word.
 #pragma once
 
 #include "nw_model/ModelMetadata.h"
@@ -21,9 +21,11 @@ struct ShapeSizes {
     bool hasFile = false;
     std::uint64_t count = 0;    ///< shapes
     std::uint64_t vertices = 0; ///< of each
+    std::string source;         ///< the name of the file that the numbers are read from; empty for none
+    std::string whyNotArchive;  ///< principal_shapes.npz is there and of no use: the reason
 };
 
-/// The same of principal_shapes.json, which need not be there.
+/// The same of principal_shapes.json and what stands for it, neither of which need be there.
 ShapeSizes readShapeSizes(const std::filesystem::path& directory, std::vector<std::string>& problems);
 
 } // namespace quarn

@@ -4,13 +4,17 @@
 #include <algorithm>
 #include <cmath>
 #include <filesystem>
+#include <fstream>
+#include <span>
 #include <streambuf>
+#include <string_view>
 #include <vector>
 
 #include <sys/mman.h>
 #include <unistd.h>
 
 #include "nw_model/ModelSession.h"
+#include "nw_model/PrincipalBasisFiles.h"
 #include "readers.h"
 #include "require.h"
 #include "support/TemporaryFolder.h"
@@ -28,6 +32,24 @@ public:
 
 private:
     std::vector<char> bytes_;
+};
+
+/// Two shapes of one vertex, as the JSON of every archive has them.
+constexpr std::string_view shapesText =
+    "{\"principalShapeCount\": 2, \"principalVertCount\": 1, \"principalShapes\": [[1,2,3],[4,5,6]]}\n";
+
+class CheckingSink final : public PrincipalShapesSink {
+public:
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
+        require(shapeCount == 2 && vertCount == 1);
+        count = 0;
+    }
+    void append(std::span<const float> values) override {
+        count += values.size();
+        require(std::all_of(values.begin(), values.end(), [](float value) { return std::isfinite(value); }));
+    }
+
+    std::size_t count = 0;
 };
 
 /// A file in memory under a path that ends in ".onnx".
@@ -77,6 +99,21 @@ bool fuzzPrincipalShapes(const std::uint8_t* data, std::size_t size) {
     require(shapes.values.capacity() <= size);
     require(std::all_of(shapes.values.begin(), shapes.values.end(), [](float value) { return std::isfinite(value); }));
     return accepted;
+}
+
+bool fuzzShapesArchive(const std::uint8_t* data, std::size_t size) {
+    static const TemporaryFolder folder;
+    const auto write = [](const char* name, const char* bytes, std::size_t count) {
+        std::ofstream(folder.path() / name, std::ios::binary).write(bytes, static_cast<std::streamsize>(count));
+    };
+    write("principal_shapes.json", shapesText.data(), shapesText.size());
+    write("principal_shapes.npz", reinterpret_cast<const char*>(data), size);
+    CheckingSink sink;
+    PrincipalShapesAnswer answer;
+    require(readPrincipalBasis(folder.path(), sink, answer)); // the JSON is sound
+    require(sink.count == 6 && answer.shapeCount == 2 && answer.vertCount == 1);
+    require(answer.isFromArchive == answer.whyNotArchive.empty());
+    return answer.isFromArchive;
 }
 
 bool fuzzOnnxLoad(const std::uint8_t* data, std::size_t size) {

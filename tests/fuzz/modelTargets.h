@@ -10,4 +10,5 @@
 /// headers promise. Returns true when the product accepted the input.
 bool fuzzMetadata(const std::uint8_t* data, std::size_t size);
 bool fuzzPrincipalShapes(const std::uint8_t* data, std::size_t size);
+bool fuzzShapesArchive(const std::uint8_t* data, std::size_t size);
 bool fuzzOnnxLoad(const std::uint8_t* data, std::size_t size);

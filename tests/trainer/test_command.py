@@ -221,6 +221,9 @@ class CommandTest(unittest.TestCase):
                      ("--activation", "Linear"), ("--principal-shapes",)):
             out, _ = self.run_trainer("train", "data", "-o", "m/arm", "--quarn", quarn, "--json", *more)
             self.assertTrue(json.loads(out)["verifiedWithQuarn"])
+        found = json.loads(subprocess.run([quarn, "info", self.place / "m/arm.nwrp", "--json"], capture_output=True,
+                                          check=True).stdout)
+        self.assertEqual((found["principalShapesFile"], found["notes"]), ("principal_shapes.npz", []))
         by_quarn = json.loads(self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", quarn)[0])
         by_numpy = json.loads(self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", "none")[0])
         self.assertAlmostEqual(by_quarn["network"]["mean"]["mm"], by_numpy["network"]["mean"]["mm"], places=5)

@@ -10,6 +10,7 @@ from typing import Any
 from unittest import mock
 
 import numpy as np
+import xxhash
 
 import synthetic
 from trainer import export, memory, pipeline, shapes
@@ -169,10 +170,16 @@ class ShapesTest(unittest.TestCase):
         random = np.random.default_rng(3)
         values = (random.standard_normal((3, 300)) * 10.0 ** random.integers(-30, 30, (3, 300))).astype(np.float32)
         with tempfile.TemporaryDirectory() as place:
-            export.write_shapes(Path(place) / "shapes.json", values)
-            read = json.loads((Path(place) / "shapes.json").read_text())
+            export.write_shapes(Path(place), values)
+            text = (Path(place) / "principal_shapes.json").read_bytes()
+            read = json.loads(text)
+            with np.load(Path(place) / "principal_shapes.npz") as archive:
+                by_vertex, digits = archive["shapes"], archive["json_xxh3_128"]
         self.assertEqual((read["principalShapeCount"], read["principalVertCount"]), (3, 100))
         np.testing.assert_array_equal(np.array(read["principalShapes"], np.float32), values)
+        np.testing.assert_array_equal(by_vertex.reshape(100, 3, 3).swapaxes(0, 1).reshape(3, 300), values)
+        self.assertEqual(by_vertex.dtype, np.dtype("<f4"))
+        self.assertEqual(digits.item(), xxhash.xxh3_128_hexdigest(text).encode())
 
 
 class AdviceTest(unittest.TestCase):

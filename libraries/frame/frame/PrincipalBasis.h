@@ -23,6 +23,11 @@ public:
     ///   shapeCount  0: there is no basis
     /// Throws std::bad_alloc; the basis is then empty.
     void assign(const std::vector<float>& values, std::uint64_t shapeCount);
+    /// Makes room for a basis, all of it 0; for none when one of the counts is. Throws std::bad_alloc; the basis is
+    /// then empty.
+    void resize(std::size_t slotCount, std::size_t shapeCount);
+    /// Sets slots from `first` on: `values` [n][shapeCount()][3], no more than there is room for.
+    void set(std::size_t first, std::span<const float> values);
     void clear() { *this = {}; }
 
     std::size_t shapeCount() const { return shapeCount_; }

@@ -201,6 +201,12 @@ TEST(PrincipalBasis, KeepsTheShapesAndAddsThemInOrderWithEveryInstructionSet) {
             basis.assign(values, shapes);
             values.pop_back();
             EXPECT_EQ(basis.slotMajor(), values);
+            PrincipalBasis pieces;
+            pieces.resize(slots, shapes);
+            for (std::size_t slot = 0; slot < slots; slot += 7)
+                pieces.set(slot, std::span(values).subspan(3 * shapes * slot,
+                                                           3 * shapes * std::min(slots - slot, std::size_t{7})));
+            EXPECT_EQ(pieces.slotMajor(), values);
             for (const auto set : {quill::InstructionSet::plain, quill::processorInstructionSet()}) {
                 quill::limitInstructionSet(set);
                 Points sums(slots);

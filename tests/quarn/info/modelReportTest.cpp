@@ -100,6 +100,24 @@ TEST_F(ModelReports, DamageIsNoFit) {
     EXPECT_THAT(fitOf(silent, geometry).warnings, IsEmpty()) << "nobody knows how many controls it takes";
 }
 
+TEST_F(ModelReports, SayWhereTheShapesAreRead) {
+    ModelSpec spec = fourVertices();
+    spec.bias.resize(1);
+    spec.shapes = {std::vector<float>(12)};
+    EXPECT_THAT(modelText(read(spec), {}),
+                HasSubstr("1 principal shapes of 4 vertices, read from principal_shapes.json"));
+    EXPECT_THAT(modelText(read(spec), {}), Not(HasSubstr("note")));
+    writeFile(folder_.path() / "m.nwrp/principal_shapes.npz", "no archive");
+    const ModelAnswer damaged = readModelApart(folder_.path() / "m.nwrp", {});
+    EXPECT_THAT(damaged.model.problems, IsEmpty());
+    EXPECT_THAT(
+        modelText(damaged.model, {}),
+        HasSubstr("note: principal_shapes.npz is not used, and principal_shapes.json is read instead, which takes "
+                  "longer: it is no archive of NumPy"));
+    EXPECT_THAT(modelJson(damaged.model, {}), HasSubstr("\"principalShapesFile\": \"principal_shapes.json\""));
+    EXPECT_THAT(modelJson(damaged.model, {}), HasSubstr("\"notes\": [\n"));
+}
+
 TEST_F(ModelReports, ComeFromAnotherProcessAsTheyAre) {
     ModelSpec spec = fourVertices();
     spec.subsetState = "partial";

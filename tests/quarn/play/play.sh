@@ -130,7 +130,7 @@ misspelt=('the key .?openQuarnScene.? is not known' 'modelNmae')
 expect 0 "warning: .*misspelt\.json: .*${misspelt[0]}.*\n(.|\n)*warning: .*${misspelt[1]}" '' info "$work/misspelt.json"
 expect 0 "\"warnings\": \[\s+\".*${misspelt[0]}.*\"(.|\n)*${misspelt[1]}" '' info "$work/misspelt.json" --json
 expect 0 '"warnings": \[\],' '' info "$scene" --json
-expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices\nfits\n' '' \
+expect 0 'network: 2 controls to 2 outputs\n2 principal shapes of 369 vertices, read from principal_shapes.json\nfits\n' '' \
   info "$work/models/wave.nwrp" --scene "$scene"
 
 # why a network and a file of shapes were refused; nothing in a file reaches the terminal as a control character
