@@ -190,6 +190,14 @@ private:
 
 } // namespace
 
+void checkModelOptionsVariable() {
+    const char* given = std::getenv(modelOptionsVariable); // NOLINT(concurrency-mt-unsafe): as the header says
+    const std::string value = given == nullptr ? "" : given;
+    if (!value.empty() && value != "0" && value != "1")
+        throw std::runtime_error(std::string("the environment variable ") + modelOptionsVariable + " is \"" + value +
+                                 "\", and may only be 0 or 1");
+}
+
 /// What is held of ONNX Runtime. The names go before the allocator, the session before its environment.
 struct ModelSession::Runtime {
     Environment env;
@@ -207,6 +215,7 @@ void ModelSession::Runtime::build(const std::filesystem::path& path) {
         throw std::runtime_error("ONNX Runtime is older than version 1.16");
     }
     scanOnnxFile(path);
+    checkModelOptionsVariable();
     env.renew();
     Ort::SessionOptions options;
     options.SetGraphOptimizationLevel(ORT_ENABLE_ALL);

@@ -1,12 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "OnnxScan.h"
 
+#include "storage/Json.h"
+
 #include <algorithm>
 #include <fstream>
 #include <limits>
 #include <map>
 #include <stdexcept>
 #include <string>
+#include <thread>
 #include <vector>
 
 namespace neuralWarp {
@@ -18,12 +21,16 @@ constexpr int deepest = 100;               // as deep as the runtime reads
 constexpr std::uint64_t longestName = 512; // of what is kept to compare: the longest that matters is "Constant"
 
 /// The kinds of message of onnx.proto that are looked into; field numbers are those of that file.
-enum class Kind { none, model, graph, node, attribute, tensor, sparseTensor, function, training, valueInfo };
+enum class Kind { none, model, graph, node, attribute, tensor, sparseTensor, function, training, valueInfo, entry };
 
 Kind kindOfField(Kind message, std::uint64_t field) {
     switch (message) {
     case Kind::model:
-        return field == 7 ? Kind::graph : field == 20 ? Kind::training : field == 25 ? Kind::function : Kind::none;
+        return field == 7    ? Kind::graph
+               : field == 14 ? Kind::entry
+               : field == 20 ? Kind::training
+               : field == 25 ? Kind::function
+                             : Kind::none;
     case Kind::training:
         return field == 1 || field == 2 ? Kind::graph : Kind::none;
     case Kind::function:
@@ -46,6 +53,37 @@ Kind kindOfField(Kind message, std::uint64_t field) {
     default:
         return Kind::none;
     }
+}
+
+constexpr const char* configKey = "ort_config";
+
+[[noreturn]] void refuseConfig(const std::string& reason) {
+    throw std::runtime_error(std::string("its metadata entry \"") + configKey + "\" " + reason);
+}
+
+void checkThreadCount(const std::string& name, const storage::JsonValue& value) {
+    if (name != "intra_op_num_threads" && name != "inter_op_num_threads")
+        refuseConfig("sets \"" + name + "\", and may only set numbers of threads");
+    const unsigned cores = std::max(std::thread::hardware_concurrency(), 1U);
+    if (!value.IsUint() || value.GetUint() < 1 || value.GetUint() > cores)
+        refuseConfig("must give a whole number from 1 to " + std::to_string(cores) + ", the machine's cores, as \"" +
+                     name + "\"");
+}
+
+/// Where the environment says so the runtime takes session options from this entry, and a stranger's may write files or
+/// start any number of threads (decision 0060). Every member counts: of repeated ones another may be taken than ours.
+void checkConfig(const std::string& text) {
+    storage::JsonDocument document;
+    try {
+        document = storage::parseJson(text, storage::jsonRules::networkOptions);
+    } catch (const storage::JsonError& error) {
+        refuseConfig(std::string("is no JSON: ") + error.what());
+    }
+    if (!document.IsObject() || document.MemberCount() != 1 ||
+        storage::viewOf(document.MemberBegin()->name) != "session_options" || !document.MemberBegin()->value.IsObject())
+        refuseConfig("is no object of \"session_options\" alone");
+    for (const auto& option : document.MemberBegin()->value.GetObject())
+        checkThreadCount(std::string(storage::viewOf(option.name)), option.value);
 }
 
 /// The wire format of protocol buffers.
@@ -115,8 +153,8 @@ private:
 /// What is remembered of the message that is being read, for those in which it matters.
 struct Seen {
     std::string name;                 ///< of a tensor or a value; the operator of a node
-    std::vector<std::string> inputs;  ///< of a node
-    std::vector<std::string> outputs; ///< of a node
+    std::vector<std::string> inputs;  ///< of a node; the keys of a metadata entry
+    std::vector<std::string> outputs; ///< of a node; the values of a metadata entry
     std::uint64_t bound = 0;          ///< largest integer in a tensor, or in the attributes of a node
     bool hasInteger = false;
     void take(std::uint64_t value) {
@@ -148,6 +186,8 @@ private:
 
     void field(Kind kind, std::uint64_t end, int depth, Seen& seen) {
         const std::uint64_t key = wire_.varint();
+        if (key > std::numeric_limits<std::uint32_t>::max()) // the runtime would drop what is beyond, and see another
+            throw std::runtime_error("the file is damaged: a field in it has no number");
         const std::uint64_t number = key >> 3U;
         switch (key & 7U) {
         case 0:
@@ -186,10 +226,32 @@ private:
             name(kind, length, seen);
         else if (kind == Kind::function && number == 4)
             define(wire_.text(length), unbounded);
+        else if (kind == Kind::entry && (number == 1 || number == 2))
+            entryText(number == 1 ? seen.inputs : seen.outputs, length);
         else if (kind == Kind::tensor && (number == 7 || number == 9))
             integers(number, length, seen);
         else
             wire_.skip(length);
+    }
+
+    // one byte too many stands for a text that is too long
+    void entryText(std::vector<std::string>& texts, std::uint64_t length) {
+        texts.push_back(wire_.text(length));
+        if (length > longestName)
+            texts.back() += '\0';
+    }
+
+    void entry(const Seen& entry) {
+        if (std::find(entry.inputs.begin(), entry.inputs.end(), configKey) == entry.inputs.end())
+            return;
+        if (entry.inputs.size() != 1 || entry.outputs.size() != 1)
+            refuseConfig("has not one key and one value");
+        if (entry.outputs.front().size() > longestName)
+            refuseConfig("is longer than " + std::to_string(longestName) + " bytes");
+        checkConfig(entry.outputs.front());
+        if (hasConfig_)
+            refuseConfig("is there more than once");
+        hasConfig_ = true;
     }
 
     void name(Kind kind, std::uint64_t length, Seen& seen) {
@@ -215,6 +277,8 @@ private:
         message(inner, end, depth + 1, within);
         if (inner == Kind::node)
             return node(within);
+        if (inner == Kind::entry)
+            return entry(within);
         if (kind == Kind::graph && inner == Kind::tensor)
             return define(within.name, within.hasInteger ? within.bound : unbounded);
         if (kind == Kind::graph && inner == Kind::valueInfo && depth > 1) // those of the whole network are its controls
@@ -254,6 +318,7 @@ private:
     Wire& wire_;
     std::map<std::string, std::uint64_t> bounds_; ///< largest integer that a name can stand for
     std::vector<std::string> loops_;              ///< the names of their numbers of rounds
+    bool hasConfig_ = false;                      ///< there was an entry with session options
 };
 
 } // namespace

@@ -34,6 +34,7 @@ inline constexpr JsonRules joints          = {std::uint64_t{64} << 20U, 0,      
 inline constexpr JsonRules dataset         = {std::uint64_t{64} << 20U, 0,      false, true,  true};
 inline constexpr JsonRules modelMetadata   = {std::uint64_t{64} << 20U, 0,      false, false, false};
 inline constexpr JsonRules principalShapes = {std::uint64_t{1} << 30U,  0,      false, false, false};
+inline constexpr JsonRules networkOptions  = {512,                      8,      true,  true,  false};
 inline constexpr JsonRules recipe          = {std::uint64_t{16} << 20U, 0,      true,  true,  true};
 inline constexpr JsonRules ledger          = {std::uint64_t{64} << 20U, 0,      true,  false, false}; // our own
 inline constexpr JsonRules trace           = {UINT64_MAX,               0,      false, false, false}; // our own

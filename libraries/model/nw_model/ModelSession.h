@@ -32,6 +32,14 @@ enum class ModelType : std::int32_t {
 inline constexpr std::int32_t modelInputLimit = std::int32_t{1} << 20;
 inline constexpr std::int32_t modelOutputLimit = std::int32_t{1} << 27;
 
+/// The variable of the environment that says whether the runtime takes numbers of threads from the metadata entry
+/// "ort_config" of a network: "1", or "0" as without the variable. It counts at the load of each model (decision 0060).
+inline constexpr const char* modelOptionsVariable = "ORT_LOAD_CONFIG_FROM_MODEL";
+
+/// Throws std::runtime_error, which names the variable and its value, when that is neither "0" nor "1" nor empty: no
+/// model can be loaded then. Thread: any, while no other changes the environment.
+void checkModelOptionsVariable();
+
 /// Loads one trained network and runs it on a vector of control values, on the CPU.
 ///
 /// A model can be run when it has exactly one input, float32 of shape [N] with N > 0, and at least one output, the
@@ -39,7 +47,8 @@ inline constexpr std::int32_t modelOutputLimit = std::int32_t{1} << 27;
 /// be within the two limits above. Further outputs are not computed. Any other model is refused at load, and so is one
 /// whose first output is its input itself, which computes nothing. A scalar output is refused because the runtime
 /// reports an output without a declared shape in the same way. Refused as well, before the runtime sees them: a network
-/// whose data lie in other files, and one with a Loop that may make more than ten thousand rounds or any number.
+/// whose data lie in other files, one with a Loop that may make more than ten thousand rounds or any number, and one
+/// whose "ort_config" asks for anything but 1 to as many threads as the machine has cores.
 ///
 /// Thread: one thread at a time for one object; different objects are independent.
 class ModelSession {
@@ -60,7 +69,7 @@ public:
     /// file; "." and ".." have no extension). A path below something that is not a directory is NotFound. When the
     /// file system cannot say whether the file exists (a loop of links, a name that is too long, a directory that may
     /// not be searched), the result is NotLoaded and type() stays. That, and an ONNX file that gives no session
-    /// (damaged, refused as above, or not a regular file), prints
+    /// (damaged, refused as above, or not a regular file; or any, as checkModelOptionsVariable() says), prints
     /// "[NEURAL WARP] ERROR, Failed to load the ONNX model PATH\n" on standard output and leaves the reason in
     /// errorText().
     ///

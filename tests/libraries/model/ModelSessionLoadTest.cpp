@@ -1,7 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "nw_model/ModelSession.h"
 
+#include <cstdlib>
+#include <fstream>
+#include <iterator>
+#include <list>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include <gmock/gmock.h>
@@ -42,6 +47,41 @@ void expectNoSession(const fs::path& path, LoadResult result, const std::string&
 
 void copyModel(const fs::path& to) {
     fs::copy_file(testModel("direct"), to, fs::copy_options::overwrite_existing);
+}
+
+/// A part of a protocol buffer: `tag` is its field and kind, as bytes.
+std::string part(const std::string& tag, const std::string& bytes) {
+    std::string size;
+    for (std::size_t rest = bytes.size(); rest > 0 || size.empty(); rest >>= 7U)
+        size.push_back(static_cast<char>((rest & 127U) | (rest >= 128 ? 128U : 0U)));
+    return tag + size + bytes;
+}
+
+const std::string entryTag = "r", keyTag = "\n", valueTag = "\x12"; // fields 14 of the file, 1 and 2 of the entry
+
+std::string entry(const std::string& value) {
+    return part(entryTag, part(keyTag, "ort_config") + part(valueTag, value));
+}
+
+std::string threads(const std::string& count) {
+    return R"({"session_options": {"intra_op_num_threads": )" + count + "}}";
+}
+
+/// A network that can be run, with more bytes behind its own: parts in any order make one file.
+std::string networkWith(const std::string& more) {
+    std::ifstream file(testModel("direct"), std::ios::binary);
+    return std::string(std::istreambuf_iterator<char>(file), {}) + more;
+}
+
+/// The variable by which the runtime reads the entry; null: none.
+void setOptionsVariable(const char* value) {
+    ::unsetenv(modelOptionsVariable);
+    if (value != nullptr)
+        ::setenv(modelOptionsVariable, value, 1);
+}
+
+std::ptrdiff_t threadsOfProcess() {
+    return std::distance(fs::directory_iterator("/proc/self/task"), fs::directory_iterator());
 }
 
 } // namespace
@@ -154,6 +194,84 @@ TEST(ModelSessionLoad, UnusableModelsAreRefused) {
     for (const auto& [name, reason] : cases) {
         expectNoSession(testModel(name), LoadResult::Loaded, reason);
     }
+}
+
+TEST(ModelSessionLoad, OptionsInTheMetadataAreOnlyNumbersOfThreads) {
+    const std::string cores = std::to_string(std::max(std::thread::hardware_concurrency(), 1U));
+    const std::string number = "must give a whole number from 1 to " + cores, one = threads("1");
+    const auto options = [](const std::string& text) { return entry("{\"session_options\": " + text + "}"); };
+    const std::vector<std::pair<std::string, std::string>> cases = {
+        {options(R"({"enable_profiling": 1})"), "sets \"enable_profiling\", and may only set numbers of threads"},
+        {options(R"({"intra_op_num_threads": 1, "graph_optimization_level": 99})"),
+         "sets \"graph_optimization_level\""},
+        {options(R"({"inter_op_num_threads": 0})"), number + ", the machine's cores, as \"inter_op_num_threads\""},
+        {options(R"({"intra_op_num_threads": 1, "intra_op_num_threads": 0})"), number},
+        {entry(threads("100000")), number},
+        {entry(threads(std::to_string(std::max(std::thread::hardware_concurrency(), 1U) + 1))), number},
+        {entry(threads("-1")), number},
+        {entry(threads("1.0")), number},
+        {entry(threads("\"1\"")), number},
+        {entry(threads("4294967297")), number},
+        {entry("{}"), "is no object of \"session_options\" alone"},
+        {entry("[" + one + "]"), "is no object of \"session_options\" alone"},
+        {options("1"), "is no object of \"session_options\" alone"},
+        {entry(R"({"run_options": {}})"), "is no object of \"session_options\" alone"},
+        {entry(R"({"session_options": {}, "session_options": {"enable_profiling": 1}})"), "is no object of"},
+        {entry(""), "is no JSON"},
+        {entry("{\"session_options\": "), "is no JSON: line 1, column"},
+        {entry(one + std::string(1, '\0')), "is no JSON"},
+        {options("{\"\xff\": 1}"), "is no JSON"},
+        {entry(std::string(500, '[')), "is no JSON"},
+        {entry(one + std::string(512, ' ')), "is longer than 512 bytes"},
+        {entry(std::string(std::size_t{1} << 20U, '[')), "is longer than 512 bytes"},
+        {entry(one) + entry(one), "is there more than once"},
+        {part(entryTag, part(keyTag, "x") + part(keyTag, "ort_config") + part(valueTag, one)),
+         "not one key and one value"},
+        {part(entryTag, part(keyTag, "ort_config") + part(keyTag, "x")), "not one key and one value"},
+        {part(entryTag, part(keyTag, "ort_config")), "not one key and one value"},
+        // field numbers that begin anew beyond 32 bits for the runtime, which would read the entry
+        {part("\xf2\x80\x80\x80\x10", part(keyTag, "ort_config") + part(valueTag, one)), "a field in it has no number"},
+        {entry(one).substr(0, 20), "it ends in the middle of a part"},
+        {part(entryTag, part(keyTag, "ort_config").substr(0, 5)), "it ends in the middle of a part"}};
+    const TestFolder folder;
+    for (const char* variable : {static_cast<const char*>(nullptr), "0", "1"}) {
+        setOptionsVariable(variable); // the same whether or not the runtime would read it
+        for (const auto& [bytes, reason] : cases)
+            expectNoSession(folder.write("model.onnx", networkWith(bytes)), LoadResult::Loaded, reason);
+    }
+    setOptionsVariable(nullptr);
+}
+
+TEST(ModelSessionLoad, ANetworkRunsOnAsManyThreadsAsItSays) {
+    const TestFolder folder;
+    std::list<ModelSession> sessions; // all stay: threads that end are counted for a while
+    const auto startedBy = [&](const std::string& more, const char* variable) {
+        setOptionsVariable(variable);
+        const std::ptrdiff_t before = threadsOfProcess();
+        EXPECT_EQ(sessions.emplace_back().load(folder.write("model.onnx", networkWith(more)), true),
+                  LoadResult::Loaded);
+        EXPECT_THAT(sessions.back().run(std::vector<float>(7)), SizeIs(6)) << sessions.back().errorText();
+        return threadsOfProcess() - before;
+    };
+    startedBy("", nullptr); // what the runtime starts once
+    const std::ptrdiff_t usual = startedBy("", nullptr);
+    const int most = std::thread::hardware_concurrency() > 1 ? 2 : 1;
+    const std::string foreign = part(entryTag, part(keyTag, "ort_config ") + part(valueTag, "{")); // another key
+    for (const char* variable : {static_cast<const char*>(nullptr), "", "0", "1"}) {
+        const bool isRead = variable != nullptr && *variable == '1';
+        EXPECT_EQ(startedBy(foreign, variable), usual);
+        for (int count = 1; count <= most; ++count)
+            EXPECT_EQ(startedBy(entry(threads(std::to_string(count))), variable), isRead ? count - 1 : usual);
+    }
+    for (const char* variable : {"yes", "2", "01", " 1"}) {
+        setOptionsVariable(variable);
+        ModelSession session;
+        StdoutCapture out;
+        session.load(testModel("direct"), true);
+        EXPECT_EQ(session.errorText(), "the environment variable ORT_LOAD_CONFIG_FROM_MODEL is \"" +
+                                           std::string(variable) + "\", and may only be 0 or 1");
+    }
+    setOptionsVariable(nullptr);
 }
 
 TEST(ModelSessionLoad, OnlyRegularFilesReachTheRuntime) {
