@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // quarn: the host without a screen.
+#include "nw_model/ModelSession.h"
 #include "openquarn_app/Messages.h"
 #include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
@@ -12,6 +13,7 @@
 #include "quarn/info/commands.h"
 #include "quarn/play/commands.h"
 #include "quarn/pose/commands.h"
+#include "quarn/process/ownVariable.h"
 #include "quarn/render/commands.h"
 #include "quarn/run/commands.h"
 
@@ -77,6 +79,7 @@ int run(int argc, char** argv) {
     for (CLI::App* command : app.get_subcommands({}))
         quarn::addLogOptions(*command, log);
     app.parse_complete_callback([&] {
+        neuralWarp::checkModelOptionsVariable();
         if (log.verbose || !log.file.empty())
             quarn::Log::begin(log.verbose, log.file, allWords, argv);
     });
@@ -97,6 +100,7 @@ int run(int argc, char** argv) {
 
 int main(int argc, char** argv) {
     try {
+        quarn::setOwnVariable(neuralWarp::modelOptionsVariable, "1"); // decision 0060
         OpenQuarn::setMessageSink(print);
         return run(argc, argv);
     } catch (const quarn::UsageError& error) {

@@ -29,6 +29,11 @@ BYTES_OF_A_NUMBER = 14                            # of a float32 in a JSON list,
 METADATA_KEYS = ("deltaCount", "deltaMode", "smoothingIterations", "affectCount", "fullCount", "subsetState",
                  "componentTagExpression", "geometry")
 
+# Below this more threads of the network's runtime gain less than they take from the deformer, as they spin after a run.
+# A fixed size, because a model does not depend on the machine that trained it (decision 0060).
+ONE_THREAD_BELOW = 16_000_000  # bytes of weights
+ONE_THREAD = json.dumps({"session_options": {"intra_op_num_threads": 1}})
+
 ACTIVATION_NODES = {nn.Sigmoid: "Sigmoid", nn.Tanh: "Tanh", nn.ReLU: "Relu"}
 
 
@@ -91,6 +96,8 @@ class GraphWriter:
             [helper.make_tensor_value_info(output_name, TensorProto.FLOAT, [output_count])], self.constants)
         model = helper.make_model(graph, opset_imports=[helper.make_opsetid("", OPSET)], ir_version=IR_VERSION,
                                   producer_name="neuralWarp trainer", producer_version=__version__)
+        if sum(len(constant.raw_data) for constant in self.constants) < ONE_THREAD_BELOW:
+            helper.set_model_props(model, {"ort_config": ONE_THREAD})
         onnx.checker.check_model(model, full_check=True)
         return model
 

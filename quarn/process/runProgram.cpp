@@ -2,6 +2,7 @@
 #include "quarn/process/runProgram.h"
 
 #include "quarn/console/interrupt.h"
+#include "quarn/process/ownVariable.h"
 #include "storage/Descriptor.h"
 #include "storage/FileError.h"
 
@@ -36,9 +37,11 @@ std::vector<char*> pointersTo(std::vector<std::string>& texts) {
 
 std::vector<std::string> environmentOf(const ProgramCall& call) {
     std::vector<std::string> texts;
-    for (char** entry = environ; *entry != nullptr; ++entry)
-        if (const std::string text = *entry; call.environment.count(text.substr(0, text.find('='))) == 0)
+    for (char** entry = environ; *entry != nullptr; ++entry) {
+        const std::string text = *entry, name = text.substr(0, text.find('='));
+        if (call.environment.count(name) == 0 && !isOwnVariable(name))
             texts.push_back(text);
+    }
     for (const auto& [name, value] : call.environment)
         texts.push_back(std::string(name).append("=").append(value));
     return texts;

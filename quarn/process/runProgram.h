@@ -19,7 +19,7 @@ struct ProgramCall {
     std::filesystem::path folder;                   ///< where it runs; empty for where this process is
     int log = -1;                                   ///< an open file of the caller, for its standard error
     int output = -1;                                ///< likewise, for its standard output; -1 for the log
-    std::map<std::string, std::string> environment; ///< beside what this process has
+    std::map<std::string, std::string> environment; ///< beside what this process has and is not its own (ownVariable.h)
     std::optional<std::chrono::seconds> timeout;
     std::chrono::milliseconds grace{10'000}; ///< between the request to end, and the end
 };

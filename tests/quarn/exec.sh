@@ -44,6 +44,16 @@ expect 0 'models/wade\.nwrp\n$' 'info: on\n$' exec -
 echo 'try print a' >"$work/in"
 expect 1 '' "line 1: try: no error came of 'print'" exec -
 
+# networks may say how many threads they want, unless the user does not wish it; a path shows what is set
+printf 'createNode pointCache -name c; setAttr c.cacheFile "/%s.npy"; meshInfo c.outMesh\n' \
+  '$ORT_LOAD_CONFIG_FROM_MODEL' >"$work/in"
+expect 1 'c\n' "'/1\.npy'" exec -
+export ORT_LOAD_CONFIG_FROM_MODEL=0
+expect 1 'c\n' "'/0\.npy'" exec -
+export ORT_LOAD_CONFIG_FROM_MODEL=2
+expect 1 '' '^quarn: the environment variable ORT_LOAD_CONFIG_FROM_MODEL is "2", and may only be 0 or 1\n$' exec -
+unset ORT_LOAD_CONFIG_FROM_MODEL
+
 # a scene that cannot be read is said once
 for command in info play 'render -o x.png'; do
   # shellcheck disable=SC2086 # words

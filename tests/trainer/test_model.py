@@ -10,6 +10,7 @@ from typing import Any
 from unittest import mock
 
 import numpy as np
+import onnx
 import xxhash
 
 import synthetic
@@ -79,6 +80,14 @@ class ModelTest(unittest.TestCase):
         graph = NumpyModel(self.place / "model.nwrp/model.onnx").graph
         dims = [[d.dim_value for d in value.type.tensor_type.shape.dim] for value in (graph.input[0], graph.output[0])]
         self.assertEqual((graph.input[0].name, graph.output[0].name, dims), ("controls", "deltas", [[3], [144]]))
+
+    def test_small_networks_ask_for_one_thread(self) -> None:
+        entry = {"ort_config": '{"session_options": {"intra_op_num_threads": 1}}'}
+        self.train(synthetic.make(self.place / "data", frames=20), epochs=1)
+        # these outputs and one more weight: 16 MB are no less
+        for model, wanted in ((onnx.load(self.place / "model.nwrp/model.onnx"), [entry]),
+                              (export.zero_model(1, 3_999_998), [entry]), (export.zero_model(1, 3_999_999), [])):
+            self.assertEqual([{prop.key: prop.value} for prop in model.metadata_props], wanted)
 
     def test_metadata_of_a_partial_subset(self) -> None:
         affect = [40, 3, 17, 21]

@@ -3,6 +3,7 @@
 #include "quarn/process/runProgram.h"
 
 #include "quarn/console/interrupt.h"
+#include "quarn/process/ownVariable.h"
 #include "storage/openToAppend.h"
 #include "storage/readWholeFile.h"
 #include "support/TemporaryFolder.h"
@@ -11,6 +12,7 @@
 #include <gmock/gmock.h>
 
 #include <csignal>
+#include <cstdlib>
 #include <thread>
 
 namespace quarn {
@@ -48,6 +50,17 @@ TEST(RunProgram, GivesWordsAsTheyAreAnEmptyInputAndItsFolder) {
     call.call.words = {"sh", "-c", "echo found on the PATH"};
     EXPECT_TRUE(call.run().isGood());
     EXPECT_EQ(storage::readWholeFile(call.folder() / "answer", 100), "found on the PATH\n");
+}
+
+TEST(RunProgram, KeepsItsOwnVariablesToItself) {
+    ::setenv("NW_THEIRS", "theirs", 1);
+    for (const char* name : {"NW_OURS", "NW_TOLD", "NW_THEIRS"})
+        setOwnVariable(name, "ours");
+    EXPECT_STREQ(std::getenv("NW_OURS"), "ours");
+    Call call("echo \"${NW_OURS-none} $NW_TOLD $NW_THEIRS\"");
+    call.call.environment = {{"NW_TOLD", "told"}};
+    EXPECT_TRUE(call.run().isGood());
+    EXPECT_EQ(call.log(), "none told theirs\n");
 }
 
 TEST(RunProgram, TellsHowItEnded) {
