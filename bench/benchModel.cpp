@@ -4,6 +4,7 @@
 // the file.
 #include "harness.h"
 #include "options.h"
+#include "secondCore.h"
 
 #include "frame/PrincipalBasis.h"
 #include "nw_model/ModelMetadata.h"
@@ -252,6 +253,7 @@ int main(int argc, char** argv) {
     if (!options)
         return 2;
     try {
+        ::setenv(neuralWarp::modelOptionsVariable, "1", 0); // as quarn does
         const OrtApi* api = OrtGetApiBase()->GetApi(16);
         if (!api)
             throw std::runtime_error("ONNX Runtime is too old");
@@ -260,6 +262,8 @@ int main(int argc, char** argv) {
         report.header();
         runAll(*options, report);
         bench::Report::legend("the bare runtime, or a loop that only converts a file's numbers");
+        if (options->wants("second core"))
+            bench::measureSecondCore(*options);
         std::printf("CSV: %s\n", options->csvPath.c_str());
         return 0;
     } catch (const std::exception& error) {

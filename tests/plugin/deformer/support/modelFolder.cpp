@@ -103,7 +103,8 @@ std::string networkBytes(const ModelSpec& spec) {
                               block(11, valueInfo("controls", spec.controls)) + block(12, valueInfo("deltas", outputs));
     constexpr std::uint64_t formatVersion = 7;
     constexpr std::uint64_t operatorSet = 13;
-    return number(1, formatVersion) + block(7, graph) + block(8, number(2, operatorSet));
+    const std::string entry = spec.options.empty() ? "" : block(14, block(1, "ort_config") + block(2, spec.options));
+    return number(1, formatVersion) + block(7, graph) + block(8, number(2, operatorSet)) + entry;
 }
 
 void writeModel(const std::filesystem::path& directory, const ModelSpec& spec) {

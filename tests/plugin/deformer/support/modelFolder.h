@@ -22,6 +22,8 @@ struct ModelSpec {
     std::string subsetState = "complete";
     std::vector<std::uint32_t> affectMap; ///< for "partial"
     std::string componentTagExpression = "*";
+
+    std::string options; ///< what the network's metadata hold as "ort_config"; empty: no such entry
 };
 
 /// Writes metadata, network and shapes into the folder, which is made when it is missing; files of before are replaced,
