@@ -21,15 +21,23 @@ void extractDeltas(FrameWorkspace& workspace, const FrameModel& model, const std
 
 template <class Surface>
 void addOffsets(Points& result, const Surface& points, const Points& deltas, const DrivenVertices& driven) {
-    quill::parallelFor(driven.count, [&](std::size_t k) {
-        const std::size_t v = driven.vertex(k);
-        result[v] = quill::val3<float>(points[v].x, points[v].y, points[v].z) + deltas[k];
-    });
+    quill::parallelFor(
+        driven.count,
+        [&](std::size_t k) {
+            const std::size_t v = driven.vertex(k);
+            result[v] = quill::val3<float>(points[v].x, points[v].y, points[v].z) + deltas[k];
+        },
+        quill::copyGrain);
 }
 
 void pack(quill::PaddedPoints& rows, const Points& points) {
     rows.resize(points.size());
-    quill::parallelFor(points.size(), [&](std::size_t v) { rows[v] = {points[v].x, points[v].y, points[v].z}; });
+    quill::parallelFor(
+        points.size(),
+        [&](std::size_t v) {
+            rows[v] = {points[v].x, points[v].y, points[v].z};
+        },
+        quill::copyGrain);
 }
 
 /// The points as deltas are meant on them, in workspace.smoothed; not in Offset mode without smoothing.

@@ -162,10 +162,13 @@ void Smoother::run(const std::vector<val3<float>>& points, std::size_t passes, P
     PaddedPoints& first = order ? scratch.a : out;
     first.resize(rowLanes * quads_.size());
     scratch.b.resize(rowLanes * quads_.size());
-    parallelFor(vertexCount_, [&, to = first.data(), from = points.data()](std::size_t place) {
-        const val3<float>& p = from[order ? order[place] : place];
-        to[place] = {p.x, p.y, p.z, 0.0F};
-    });
+    parallelFor(
+        vertexCount_,
+        [&, to = first.data(), from = points.data()](std::size_t place) {
+            const val3<float>& p = from[order ? order[place] : place];
+            to[place] = {p.x, p.y, p.z, 0.0F};
+        },
+        copyGrain);
     const auto parts = static_cast<std::size_t>(std::max(1, tbb::this_task_arena::max_concurrency()));
     for (std::size_t left = passes; left > 0;) {
         if (watch.isCancelled && watch.isCancelled())
@@ -181,8 +184,9 @@ void Smoother::run(const std::vector<val3<float>>& points, std::size_t passes, P
         return;
     }
     out.resize(vertexCount_);
-    parallelFor(vertexCount_,
-                [&, to = out.data(), from = first.data()](std::size_t place) { to[order[place]] = from[place]; });
+    parallelFor(
+        vertexCount_, [&, to = out.data(), from = first.data()](std::size_t place) { to[order[place]] = from[place]; },
+        copyGrain);
 }
 
 RowsKernel rowsKernel([[maybe_unused]] InstructionSet set) {

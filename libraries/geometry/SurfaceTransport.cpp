@@ -76,10 +76,14 @@ void SurfaceTransport::run(std::vector<val3<float>>& out, const std::vector<val3
         return;
     const TransportTables tables{blocks_.data(), pairs_.data(), rest_.data(), inverses_.data(), listed_, isIdentity_};
     const TransportKernel kernel = transportKernel(instructionSet());
-    parallelForRange(blocks_.size(), [&](int begin, int end) {
-        kernel(tables, &positions.data()->x, deltas.data(), out.data(), static_cast<std::size_t>(begin),
-               static_cast<std::size_t>(end));
-    });
+    constexpr std::size_t grain = copyGrain / 8 / transportLanes; // a frame takes eight times as long
+    parallelForRange(
+        blocks_.size(),
+        [&](int begin, int end) {
+            kernel(tables, &positions.data()->x, deltas.data(), out.data(), static_cast<std::size_t>(begin),
+                   static_cast<std::size_t>(end));
+        },
+        grain);
 }
 
 TransportKernel transportKernel([[maybe_unused]] InstructionSet set) {

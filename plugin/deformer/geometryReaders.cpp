@@ -48,10 +48,13 @@ bool readGeometryPoints(const HDataHandle& geometry, Points& points, const quill
     if (status.error())
         return false;
     points.resize(map.affectCount());
-    quill::parallelFor(points.size(), [&](std::size_t k) {
-        const double* p = xyz + std::size_t{3} * map.toFull(k);
-        points[k] = {static_cast<float>(p[0]), static_cast<float>(p[1]), static_cast<float>(p[2])};
-    });
+    quill::parallelFor(
+        points.size(),
+        [&](std::size_t k) {
+            const double* p = xyz + std::size_t{3} * map.toFull(k);
+            points[k] = {static_cast<float>(p[0]), static_cast<float>(p[1]), static_cast<float>(p[2])};
+        },
+        quill::copyGrain);
     return true;
 }
 

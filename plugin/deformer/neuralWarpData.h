@@ -8,7 +8,6 @@
 #include "nw_model/DirectoryState.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
-#include "openquarn/HPointArray.h"
 #include "openquarn/HPxData.h"
 #include "quill/IndexMapper.h"
 #include "quill/VertexConnections.h"
@@ -132,7 +131,6 @@ public:
 
     /// What the frames of this geometry are computed in. Invalidated by whoever changes what frameModel() views.
     FrameWorkspace workspace;
-    HPointArray positions; ///< those of the last frame: its memory is used again
 
     /// Hears of each evaluation, on the CPU and on the GPU. Not owned, never null.
     FrameObserver* observer = &FrameObserver::none();

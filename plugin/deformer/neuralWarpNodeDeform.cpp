@@ -10,6 +10,7 @@
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
+#include "openquarn/HIndexMapper.h"
 #include "openquarn/HItGeometry.h"
 #include "openquarn/HLongWork.h"
 
@@ -147,28 +148,31 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
 HStatus neuralWarpNode::writeBlended(HDataBlock& block, HItGeometry& iterator, std::uint32_t multiIndex,
                                      neuralWarpData& data, const Blend& blend) {
     const float* vertexWeights = nullptr;
-    HPointArray& positions = data.positions;
+    HIndexMapper mapper;
+    MovedPoints points{};
     {
         const ObservedStep step(*data.observer, FrameStep::fetch);
         HStatus status;
-        const std::size_t count = indexMapper(multiIndex, &status).affectCount();
+        mapper = indexMapper(multiIndex, &status);
         if (status.error())
             return reported(status, sourceUnit::node);
         vertexWeights = envelopeWeights(block, multiIndex, &status);
         if (status.error())
             return reported(status, sourceUnit::node);
-        status = iterator.allPositions(positions, HSpace::kObject);
+        points.count = mapper.affectCount();
+        points.vertices = mapper.isIdentityMap() ? nullptr : mapper.affectMap().data();
+        points.from = iterator.rawPositions(&status);
         if (status.error())
             return reported(status, sourceUnit::node);
-        if (positions.length() != count || !blend.fits(count))
-            return misfit("the deformed geometry", positions.length(), count);
+        if (iterator.count() != points.count || !blend.fits(points.count))
+            return misfit("the deformed geometry", iterator.count(), points.count);
+        points.to = iterator.rawPositionsToSet(&status);
+        if (status.error())
+            return reported(status, sourceUnit::node);
     }
-    {
-        const ObservedStep step(*data.observer, FrameStep::blend);
-        blendPositions(positions.data(), positions.length(), vertexWeights, blend);
-    }
-    const ObservedStep step(*data.observer, FrameStep::writeBack);
-    return reported(iterator.setAllPositions(positions, HSpace::kObject), sourceUnit::node);
+    const ObservedStep step(*data.observer, FrameStep::blend);
+    blendPositions(points, vertexWeights, blend);
+    return HStatus::kSuccess;
 }
 
 } // namespace neuralWarp

@@ -43,9 +43,18 @@ public:
     /// that has the right length already is written in place.
     HStatus allPositions(HPointArray& points, HSpace::Space space = HSpace::kObject) const;
     /// x, y and z of every vertex of the whole geometry, in its own order whatever this iterator visits: for readers
-    /// that would copy the points only to convert them. Owned by the host, valid until a position is set or this and
-    /// the handle it was made on are gone. Null, and a failure, when it stands on no geometry; null for no vertices.
+    /// that would copy the points only to convert them. Owned by the host, valid until a position is set by another
+    /// call than rawPositionsToSet(), or this and the handle it was made on are gone. Null, and a failure, when it
+    /// stands on no geometry; null for no vertices.
     const double* rawPositions(HStatus* status = nullptr) const;
+    /// Where the positions of the whole geometry are set by writing them, laid out as rawPositions() has them: for
+    /// deformers that would copy the points only to move each. Every vertex that this iterator visits has to be
+    /// written, whatever is there before; the others are there already, and stay. What rawPositions() gave before is
+    /// another array, or the same one when positions have been set already, and stays as it is: a loop may read there
+    /// and write here, different vertices on different threads. They count as set with the call, and come into the
+    /// value of a handle when the iterator is destroyed. Owned by the host, valid until positions are set by another
+    /// call or this is gone. Null, and a failure, when it stands on no geometry; null for no vertices.
+    double* rawPositionsToSet(HStatus* status = nullptr);
     /// Sets all of them. Fails with kInvalidParameter, and changes nothing, when there are not count() points.
     HStatus setAllPositions(const HPointArray& points, HSpace::Space space = HSpace::kObject);
 

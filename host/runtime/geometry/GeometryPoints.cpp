@@ -19,7 +19,9 @@ double* GeometryPoints::writable(bool keep) {
     const Positions& present = *mesh_->points;
     std::shared_ptr<Positions> made = pool_ ? pool_->take(present.vertexCount()) : newPositions(present.vertexCount());
     if (keep)
-        std::copy_n(present.xyz(), 3 * present.vertexCount(), made->xyz());
+        forRanges(present.vertexCount(), [&, to = made->xyz()](std::size_t begin, std::size_t end) {
+            std::copy(present.xyz() + 3 * begin, present.xyz() + 3 * end, to + 3 * begin);
+        });
     written_ = std::move(made);
     return written_->xyz();
 }

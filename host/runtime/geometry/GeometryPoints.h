@@ -21,6 +21,8 @@ public:
     HPoint point(unsigned position) const;
     /// Of all vertices.
     const double* raw() const { return current().xyz(); }
+    /// Of all vertices, to be written: those that are visited by the caller, in full; the others have their points.
+    double* rawToSet() { return writable(!isWhole()); }
     void setPoint(unsigned position, const HPoint& point);
     HStatus copyTo(HPointArray& points) const;
     /// count() points.

@@ -101,6 +101,14 @@ const double* HItGeometry::rawPositions(HStatus* status) const {
     });
 }
 
+double* HItGeometry::rawPositionsToSet(HStatus* status) {
+    double* none = nullptr;
+    return apiValue(Operation::HItGeometry_rawPositionsToSet, status, none, [&](HStatus& outcome) {
+        outcome = impl_ ? HStatus() : noGeometry();
+        return impl_ ? impl_->rawToSet() : nullptr;
+    });
+}
+
 HStatus HItGeometry::setAllPositions(const HPointArray& points, HSpace::Space space) {
     return apiCall(Operation::HItGeometry_setAllPositions, [&]() -> HStatus {
         HStatus status = impl_ ? spaceStatus(space) : noGeometry();

@@ -1,8 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "geometry/Positions.h"
 
+#include "quill/largePages.h"
+
 #include <atomic>
+#include <cstdlib>
 #include <cstring>
+#include <new>
 #include <utility>
 
 namespace OpenQuarn {
@@ -13,14 +17,23 @@ std::uint64_t nextVersion() {
     return last.fetch_add(1, std::memory_order_relaxed) + 1;
 }
 
-// not std::make_unique: that would write zeros into memory that is written in full right after
-std::unique_ptr<double[]> uninitialised(std::size_t vertexCount) {
-    return std::unique_ptr<double[]>(new double[3 * vertexCount]); // NOLINT(modernize-make-unique)
+PositionBuffer uninitialised(std::size_t vertexCount) {
+    constexpr std::size_t largePage = std::size_t{2} << 20U;
+    const std::size_t bytes = 3 * vertexCount * sizeof(double);
+    void* memory = nullptr;
+    if (bytes > 0 && posix_memalign(&memory, bytes < largePage ? alignof(std::max_align_t) : largePage, bytes) != 0)
+        throw std::bad_alloc();
+    quill::adviseLargePages(memory, bytes);
+    return PositionBuffer(static_cast<double*>(memory));
 }
 
 } // namespace
 
-Positions::Positions(std::size_t vertexCount, std::unique_ptr<double[]> buffer, std::weak_ptr<PositionPool> pool)
+void FreeMemory::operator()(double* memory) const noexcept {
+    std::free(memory); // NOLINT(cppcoreguidelines-no-malloc): it comes from posix_memalign
+}
+
+Positions::Positions(std::size_t vertexCount, PositionBuffer buffer, std::weak_ptr<PositionPool> pool)
     : vertexCount_(vertexCount)
     , version_(nextVersion())
     , xyz_(std::move(buffer))
@@ -39,7 +52,7 @@ bool Positions::sameAs(const Positions& other) const {
 }
 
 std::shared_ptr<Positions> PositionPool::take(std::size_t vertexCount) {
-    std::unique_ptr<double[]> buffer;
+    PositionBuffer buffer;
     {
         const std::scoped_lock lock(mutex_);
         if (spareCount_ == vertexCount)
@@ -52,7 +65,7 @@ std::shared_ptr<Positions> PositionPool::take(std::size_t vertexCount) {
     return std::make_shared<Positions>(vertexCount, std::move(buffer), weak_from_this());
 }
 
-void PositionPool::giveBack(std::unique_ptr<double[]> buffer, std::size_t vertexCount) noexcept {
+void PositionPool::giveBack(PositionBuffer buffer, std::size_t vertexCount) noexcept {
     const std::scoped_lock lock(mutex_);
     spare_.swap(buffer);
     spareCount_ = vertexCount;

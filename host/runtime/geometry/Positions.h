@@ -11,12 +11,18 @@ namespace OpenQuarn {
 
 class PositionPool;
 
+struct FreeMemory {
+    void operator()(double* memory) const noexcept;
+};
+/// Aligned to large pages where it is as large as one, which it then asks for.
+using PositionBuffer = std::unique_ptr<double[], FreeMemory>;
+
 /// x, y, z of each vertex as doubles, object space. Written by the one who made it, and by nobody once a mesh shares
 /// it.
 class Positions {
 public:
     /// Not initialised. `pool` gets the buffer back; may be null.
-    Positions(std::size_t vertexCount, std::unique_ptr<double[]> buffer, std::weak_ptr<PositionPool> pool);
+    Positions(std::size_t vertexCount, PositionBuffer buffer, std::weak_ptr<PositionPool> pool);
     ~Positions();
     Positions(const Positions&) = delete;
     Positions& operator=(const Positions&) = delete;
@@ -32,7 +38,7 @@ public:
 private:
     const std::size_t vertexCount_;
     const std::uint64_t version_;
-    std::unique_ptr<double[]> xyz_;
+    PositionBuffer xyz_;
     const std::weak_ptr<PositionPool> pool_;
 };
 
@@ -44,10 +50,10 @@ public:
 
 private:
     friend class Positions;
-    void giveBack(std::unique_ptr<double[]> buffer, std::size_t vertexCount) noexcept;
+    void giveBack(PositionBuffer buffer, std::size_t vertexCount) noexcept;
 
     std::mutex mutex_;
-    std::unique_ptr<double[]> spare_;
+    PositionBuffer spare_;
     std::size_t spareCount_ = 0;
 };
 

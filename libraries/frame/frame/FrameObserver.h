@@ -9,8 +9,8 @@ namespace neuralWarp {
 
 /// Steps of a frame in which a model is applied, in their order. Those of the library are network, points, deltas,
 /// apply; the others are those of a host around it.
-enum class FrameStep : std::size_t { prepare, gather, network, points, deltas, apply, fetch, blend, writeBack };
-inline constexpr std::size_t frameStepCount = 9;
+enum class FrameStep : std::size_t { prepare, gather, network, points, deltas, apply, fetch, blend };
+inline constexpr std::size_t frameStepCount = 8;
 
 /// Hears of one frame after another, on the thread that computes it. Each call does nothing unless it is overridden.
 class FrameObserver {

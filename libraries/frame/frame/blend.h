@@ -4,9 +4,9 @@
 
 #include "frame/Points.h"
 #include "frame/SlotMap.h"
-#include "quill/parallelFor.h"
 
 #include <cstddef>
+#include <cstdint>
 
 namespace neuralWarp {
 
@@ -24,36 +24,20 @@ struct Blend {
     float envelope = 1.0F;
 };
 
-/// Moves each position p by f * (c - p), where c is the model's position of a driven vertex and p itself (in single
-/// precision) of any other, then brought towards the target, and f = envelope * weight.
-///   positions  [count] object space, of any type with members x, y and z in double precision; others stay as they are
-///   weights    [count], or null: all 1
-///   blend      must fit `count`
-template <class Point>
-void blendPositions(Point* positions, std::size_t count, const float* weights, const Blend& blend) {
-    const auto moveTo = [](Point& p, const quill::val3<float>& c, double f) {
-        p.x += (static_cast<double>(c.x) - p.x) * f;
-        p.y += (static_cast<double>(c.y) - p.y) * f;
-        p.z += (static_cast<double>(c.z) - p.z) * f;
-    };
-    if (blend.model && !blend.target && !blend.driven.slots && !weights) { // what most frames are
-        const quill::val3<float>* const model = blend.model->data();
-        const auto f = static_cast<double>(blend.envelope);
-        quill::parallelForRange(count, [=](int begin, int end) {
-            for (int i = begin; i < end; ++i)
-                moveTo(positions[i], model[i], f);
-        });
-        return;
-    }
-    quill::parallelFor(count, [&](std::size_t i) {
-        Point& p = positions[i];
-        quill::val3<float> c{static_cast<float>(p.x), static_cast<float>(p.y), static_cast<float>(p.z)};
-        if (blend.model && blend.driven.contains(i))
-            c = (*blend.model)[i];
-        if (blend.target)
-            c = c + ((*blend.target)[i] - c) * blend.targetWeight;
-        moveTo(p, c, static_cast<double>(weights ? weights[i] * blend.envelope : blend.envelope));
-    });
-}
+/// Positions of a mesh, and where they are written: a frame reads each once, and writes it once. x, y and z of every
+/// vertex of the whole mesh, in object space. Nothing is owned.
+struct MovedPoints {
+    const double* from;
+    double* to;                              ///< the same array as `from`, or one beside it
+    std::size_t count = 0;                   ///< of the deformed vertices
+    const std::uint32_t* vertices = nullptr; ///< [count] the vertex of the mesh that each is, none twice; null: all
+};
+
+/// Writes each deformed position p as p + f * (c - p), where c is the model's position of a driven vertex and p itself
+/// (in single precision) of any other, then brought towards the target, and f = envelope * weight. Of the other
+/// vertices of the mesh nothing is written.
+///   weights    [points.count], or null: all 1
+///   blend      must fit `points.count`
+void blendPositions(const MovedPoints& points, const float* weights, const Blend& blend);
 
 } // namespace neuralWarp

@@ -77,8 +77,9 @@ TEST_F(FilterTest, UnsetPointsAreSharedAndSetOnesAreNot) {
     const HObject mesh = textured.object();
     set(input("d", 0), mesh);
     connect(output("d", 0), input("e", 0));
-    Hooks::deform = [](HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
-        return node.name() == HString("e") ? testDeformers::pushPoints(node, block, iterator, index) : HStatus();
+    auto push = testDeformers::pushPoints;
+    Hooks::deform = [&](HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
+        return node.name() == HString("e") ? push(node, block, iterator, index) : HStatus();
     };
     plug("e.input[0].componentTagExpression").setString("some");
     EXPECT_THAT(pushed(output("e", 0), mesh), ElementsAre(0, 1, 0, 0, 0, 0, 0, 0, 1));
@@ -92,10 +93,16 @@ TEST_F(FilterTest, UnsetPointsAreSharedAndSetOnesAreNot) {
     EXPECT_EQ(corners.length(), 16U);
 
     // what was handed out stays as it was, also when its buffer would come in handy
-    for (int frame = 2; frame < 6; ++frame) {
+    for (int frame = 2; frame < 10; ++frame) {
+        push = frame % 4 < 2 ? testDeformers::pushPoints : testDeformers::pushRawPoints;
+        set(input("d", 0), withTag(grid(3, 3, frame), "some", {8, 1}));
         plug("e.push").setDouble(frame);
-        EXPECT_THAT(pushed(output("e", 0), mesh), ElementsAre(0, frame, 0, 0, 0, 0, 0, 0, frame));
+        EXPECT_THAT(pushed(output("e", 0), plug(input("d", 0)).asHObject()),
+                    ElementsAre(0, frame, 0, 0, 0, 0, 0, 0, frame));
     }
+    push = testDeformers::pushRawPoints;
+    plug("e.input[0].componentTagExpression").setString("*");
+    EXPECT_THAT(pushed(output("e", 0), plug(input("d", 0)).asHObject()), ::testing::Each(9.0));
     HPointArray kept;
     EXPECT_EQ(text(HFnMesh(result).getPoints(kept)), "");
     EXPECT_EQ(kept[8], HPoint(3, 2, 0));
@@ -165,6 +172,14 @@ TEST_F(FilterTest, FailuresKeepTheFrame) {
          [&] {
              Hooks::deform = [=](HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
                  testDeformers::pushPoints(node, block, iterator, index);
+                 return fail();
+             };
+         },
+         {"no luck"}},
+        {"deform fails after it has written points",
+         [&] {
+             Hooks::deform = [=](HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
+                 testDeformers::pushRawPoints(node, block, iterator, index);
                  return fail();
              };
          },

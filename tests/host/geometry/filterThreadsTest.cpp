@@ -17,6 +17,8 @@ class FilterThreads : public FilterTest {
 protected:
     /// Something that depends on order, weight and position, differently for each geometry.
     static HStatus twist(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
+        if (index == 4 && node.name() == HString("second"))
+            return testDeformers::pushRawPoints(node, block, iterator, index);
         HPointArray points;
         HStatus status = iterator.allPositions(points);
         const float* weights = node.envelopeWeights(block, index);

@@ -223,10 +223,23 @@ TEST_F(Mesh, IteratorsVisitAllVerticesAndWriteIntoTheHandle) {
     EXPECT_EQ(pointsOf(handle.asMesh()), points) << "at once";
 
     HStatus status;
-    const HItGeometry nothing{HDataHandle(), &status};
+    {
+        HItGeometry raw(handle);
+        const double* from = raw.rawPositions();
+        double* to = raw.rawPositionsToSet(&status);
+        EXPECT_EQ(text(status), "");
+        for (std::size_t i = 0; i < 60; ++i)
+            to[i] = from[i] + 1.0;
+        EXPECT_EQ(pointsOf(handle.asMesh()), points) << "not yet";
+    }
+    EXPECT_EQ(pointsOf(handle.asMesh())[3], HPoint(2, 3, 4));
+
+    HItGeometry nothing{HDataHandle(), &status};
     EXPECT_EQ(status, HStatus::kInvalidParameter);
     EXPECT_TRUE(nothing.isDone());
     EXPECT_EQ(nothing.allPositions(points), HStatus::kInvalidParameter);
+    EXPECT_EQ(nothing.rawPositionsToSet(&status), nullptr);
+    EXPECT_EQ(status, HStatus::kInvalidParameter);
     const HIndexMapper mapper;
     EXPECT_TRUE(mapper.isIdentityMap());
     EXPECT_TRUE(mapper.affectMap().isEmpty());

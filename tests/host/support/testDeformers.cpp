@@ -39,9 +39,17 @@ void registerTypes() {
     testAttributes::addType<TestDeformer, TestDeformer::initialize, 0x7e570011, HPxNode::kDeformerNode>("testDeformer");
 }
 
+namespace {
+
+double pushOf(HDataBlock& block) {
+    return block.inputValue(pushAttribute).asDouble() *
+           static_cast<double>(block.inputValue(HPxGeometryFilter::envelope).asFloat());
+}
+
+} // namespace
+
 HStatus pushPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
-    const double push = block.inputValue(pushAttribute).asDouble() *
-                        static_cast<double>(block.inputValue(HPxGeometryFilter::envelope).asFloat());
+    const double push = pushOf(block);
     if (push == 0.0)
         return HStatus::kSuccess;
     HStatus status;
@@ -53,6 +61,29 @@ HStatus pushPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterat
     for (unsigned i = 0; i < points.length(); ++i)
         points[i].x += push * static_cast<double>(weights ? weights[i] : 1.0F);
     return status.error() ? status : iterator.setAllPositions(points);
+}
+
+HStatus pushRawPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index) {
+    const double push = pushOf(block);
+    if (push == 0.0)
+        return HStatus::kSuccess;
+    const HIndexMapper mapper = node.indexMapper(index);
+    const float* weights = node.envelopeWeights(block, index);
+    HStatus status;
+    const double* from = iterator.rawPositions(&status);
+    EXPECT_EQ(text(status), "");
+    const std::vector<double> before(from, from + std::size_t{3} * mapper.fullCount());
+    double* to = iterator.rawPositionsToSet(&status);
+    if (status.error())
+        return status;
+    for (unsigned i = 0; i < iterator.count(); ++i) {
+        const std::size_t at = std::size_t{3} * (mapper.isIdentityMap() ? i : mapper.affectMap()[i]);
+        std::copy_n(from + at, 3, to + at);
+        to[at] += push * static_cast<double>(weights ? weights[i] : 1.0F);
+    }
+    EXPECT_EQ(std::vector<double>(from, from + before.size()), before) << "what was read stays";
+    EXPECT_EQ(iterator.rawPositions(), to);
+    return status;
 }
 
 HObject grid(unsigned columns, unsigned rows, double depth) {

@@ -17,6 +17,8 @@ void registerTypes();
 
 /// Moves each affected vertex by push * envelope * weight along x; touches nothing when the envelope is 0.
 HStatus pushPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index);
+/// The same, without an array of its own.
+HStatus pushRawPoints(HPxDeformerNode& node, HDataBlock& block, HItGeometry& iterator, unsigned index);
 
 struct Hooks {
     /// initializeMultiIndex() of every test deformer; nothing by default.

@@ -8,6 +8,8 @@
 
 #include <gmock/gmock.h>
 
+#include <cmath>
+
 namespace {
 
 using namespace neuralWarp;
@@ -219,12 +221,8 @@ TEST(PrincipalBasis, KeepsTheShapesAndAddsThemInOrderWithEveryInstructionSet) {
     EXPECT_EQ(none.blockCount() + none.slotMajor().size(), 0U);
 }
 
-struct HomogeneousPoint {
-    double x, y, z, w;
-};
-
 TEST(Blend, GoesByEnvelopeAndWeightTowardsTheModelAndTheTarget) {
-    const Indices vertices{1}, slots{missingIndex, 0};
+    const Indices driven{1}, slots{missingIndex, 0}, listed{2, 0};
     const Points model{{9, 9, 9}, {3, 0, 0}}, target{{1, 1, 0}, {1, 2, 0}};
     const std::vector<float> weights{1.0F, 0.5F};
     struct Row {
@@ -240,17 +238,39 @@ TEST(Blend, GoesByEnvelopeAndWeightTowardsTheModelAndTheTarget) {
           {"model", &model, nullptr, nullptr, same, 2.0, 0.0},
           {"weights", &model, nullptr, weights.data(), same, 1.5, 0.0},
           {"target", nullptr, &target, nullptr, third + (0.5 * (1 + rounded) - third) * 0.5, 1.0, 0.5},
-          {"both", &model, &target, weights.data(), third + (0.5 * (1 + rounded) - third) * 0.5, 1.25, 0.25}}) {
-        SCOPED_TRACE(row.name);
-        std::vector<HomogeneousPoint> points{{third, 0, 0, 7}, {1, 0, 0, 8}};
-        const Blend blend{DrivenVertices(vertices, slots), row.model, row.target, 0.5F, 0.5F};
-        ASSERT_TRUE(blend.fits(2) && (!(row.model || row.target) || !blend.fits(3)));
-        blendPositions(points.data(), points.size(), row.weights, blend);
-        EXPECT_NEAR(points[0].x, row.x0, row.target ? 1e-7 : 0.0);
-        EXPECT_EQ(points[1].x, row.x1);
-        EXPECT_EQ(points[1].y, row.y1);
-        EXPECT_EQ(points[0].w + points[1].w, 15.0);
+          {"both", &model, &target, weights.data(), third + (0.5 * (1 + rounded) - third) * 0.5, 1.25, 0.25}})
+        for (const bool isListed : {false, true})
+            for (const bool isInPlace : {false, true}) {
+                SCOPED_TRACE(std::string(row.name) + (isListed ? ", listed" : "") + (isInPlace ? ", in place" : ""));
+                const std::size_t first = isListed ? 6 : 0, second = isListed ? 0 : 3;
+                std::vector<double> from(9), to(9, 7.0);
+                from[first] = third;
+                from[second] = 1.0;
+                const Blend blend{DrivenVertices(driven, slots), row.model, row.target, 0.5F, 0.5F};
+                ASSERT_TRUE(blend.fits(2) && (!(row.model || row.target) || !blend.fits(3)));
+                std::vector<double>& out = isInPlace ? from : to;
+                const double beside = out[isListed ? 3 : 6];
+                blendPositions({from.data(), out.data(), 2, isListed ? listed.data() : nullptr}, row.weights, blend);
+                EXPECT_NEAR(out[first], row.x0, row.target ? 1e-7 : 0.0);
+                EXPECT_EQ(out[second], row.x1);
+                EXPECT_EQ(out[second + 1], row.y1);
+                EXPECT_EQ(out[isListed ? 3 : 6], beside);
+            }
+}
+
+TEST(Blend, HasTheSameBitsWhereAllGoTheSameWay) {
+    const std::size_t count = 1001;
+    Points model(count);
+    std::vector<double> from(3 * count), to(3 * count), other(3 * count);
+    const std::vector<float> weights(count, 1.0F);
+    for (std::size_t i = 0; i < from.size(); ++i) {
+        from[i] = std::sin(static_cast<double>(i));
+        (&model.front().x)[i] = static_cast<float>(std::cos(static_cast<double>(i * i)));
     }
+    const Blend blend{DrivenVertices(count), &model, nullptr, 0.0F, 0.3F};
+    blendPositions({from.data(), to.data(), count}, nullptr, blend);
+    blendPositions({from.data(), other.data(), count}, weights.data(), blend);
+    EXPECT_EQ(to, other);
 }
 
 } // namespace

@@ -84,6 +84,25 @@ std::size_t threadsInALoop() {
     return threads.size();
 }
 
+TEST(ParallelFor, VisitsEachIndexOnceAndStartsNobodyForLittle) {
+    for (const std::size_t grain : {0U, 1U, 100U, 8192U})
+        for (const std::size_t count : {0U, 1U, 99U, 100U, 101U, 8193U, 50000U}) {
+            SCOPED_TRACE(std::to_string(count) + " by " + std::to_string(grain));
+            std::vector<int> visits(count);
+            std::atomic<unsigned> pieces = 0;
+            quill::parallelForRange(
+                count,
+                [&](int begin, int end) {
+                    ++pieces;
+                    for (int i = begin; i < end; ++i)
+                        ++visits[static_cast<std::size_t>(i)];
+                },
+                grain);
+            EXPECT_EQ(visits, std::vector<int>(count, 1));
+            EXPECT_LE(pieces, std::max<std::size_t>(1, grain > 0 ? 2 * count / grain : count));
+        }
+}
+
 TEST(Determinism, EqualBitsForEveryNumberOfThreadsAndEveryRun) {
     const ZooMesh grid = makeGrid(400, 300);
     std::set<std::uint64_t> hashes;
