@@ -63,7 +63,7 @@ fs::path writeNetwork(const fs::path& folder, std::size_t bytes, bool hasEntry) 
     spec.bias.resize(bytes / sizeof(float) / (controlCount + 1));
     if (hasEntry)
         spec.options = R"({"session_options": {"intra_op_num_threads": 1}})";
-    const fs::path path = folder / (std::to_string(bytes) + (hasEntry ? "-entry.onnx" : ".onnx"));
+    fs::path path = folder / (std::to_string(bytes) + (hasEntry ? "-entry.onnx" : ".onnx"));
     writeFile(path, networkBytes(spec));
     return path;
 }
