@@ -16,6 +16,7 @@
 #include <array>
 #include <chrono>
 #include <cmath>
+#include <cstdlib>
 #include <exception>
 #include <sched.h>
 #include <sys/wait.h>
@@ -177,7 +178,8 @@ double largestDifference(const WarpFrame& frame, plain::Frame& plainFrame) {
 std::vector<WarpSetting> plainSettings(bool isQuick) {
     if (isQuick)
         return {{100, true, 50, 10}, {316, true, 50, 10}};
-    return {{100, true, 50, 10}, {316, true, 50, 10}, {316, false, 50, 10}, {1000, true, 50, 10}, {100, true, 0, 10}};
+    return {{100, true, 50, 10}, {316, true, 50, 10},      {316, false, 50, 10},    {1000, true, 50, 10},
+            {100, true, 0, 10},  {100, true, 0, 10, true}, {316, true, 0, 10, true}};
 }
 
 void benchPlain(const bench::Options& options, unsigned threads) {
@@ -193,7 +195,7 @@ void benchPlain(const bench::Options& options, unsigned threads) {
             const Pairs pairs = inTurn(frame, plainFrame, isPaused, options.seconds);
             const double ours = quantile(pairs.ours, 0.5), plain = quantile(pairs.plain, 0.5);
             const double tail = quantile(pairs.ours, 0.99) / ours;
-            std::printf("%7zu %-7s %-7s %3u %-6s %8.0f %8.0f %6.2f %7.2f\n", frame.vertices(),
+            std::printf("%7zu %-7s %-13s %3u %-6s %8.0f %8.0f %6.2f %7.2f\n", frame.vertices(),
                         setting.isSurface ? "Surface" : "Offset", modelName(setting).c_str(), threads,
                         isPaused ? "paused" : "hot", ours * 1e6, plain * 1e6, quantile(pairs.ratios, 0.5), tail);
             std::fprintf(options.csv.get(), "plain,%zu,%s,%s,%u,%s,%.1f,%.1f,%.3f,%.2f\n", frame.vertices(),
@@ -293,7 +295,7 @@ int run(int argc, char** argv) {
         std::printf(
             "whole frames beside plain ones, in turn, medians in us; hot: one after the other, paused: after one "
             "frame time; p99: of ours, over its median\n");
-        std::printf("%7s %-7s %-7s %3s %-6s %8s %8s %6s %7s\n", "verts", "mode", "model", "thr", "", "ours", "plain",
+        std::printf("%7s %-7s %-13s %3s %-6s %8s %8s %6s %7s\n", "verts", "mode", "model", "thr", "", "ours", "plain",
                     "/plain", "p99");
         for (const unsigned threads : {1U, 2U})
             inChild(*options, threads, benchPlain);
@@ -313,6 +315,7 @@ int run(int argc, char** argv) {
 
 int main(int argc, char** argv) {
     try {
+        ::setenv(neuralWarp::modelOptionsVariable, "1", 0); // as quarn does
         return run(argc, argv);
     } catch (const std::exception& error) {
         std::fprintf(stderr, "bench_deform: %s\n", error.what());

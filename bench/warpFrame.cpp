@@ -22,10 +22,15 @@ ModelSpec modelOf(const WarpSetting& setting, std::size_t vertices) {
     ModelSpec spec;
     const std::size_t outputs = setting.shapes == 0 ? 3 * vertices : setting.shapes;
     spec.controls = controlCount;
+    if (setting.hasHidden)
+        spec.hidden = {512, 512};
     spec.bias.assign(outputs, 0.125F);
-    spec.weights.resize(controlCount * outputs);
+    spec.weights.resize((setting.hasHidden ? 512 : controlCount) * outputs);
     for (std::size_t i = 0; i < spec.weights.size(); ++i)
         spec.weights[i] = noise(i);
+    constexpr std::size_t largestOnOneThread = 16U << 20U; // bytes; as the trainer has it
+    if (spec.weights.size() * sizeof(float) < largestOnOneThread)
+        spec.options = R"({"session_options": {"intra_op_num_threads": 1}})";
     spec.deltaMode = setting.isSurface ? 1 : 0;
     spec.smoothingIterations = setting.smoothing;
     spec.fullCount = spec.affectCount = static_cast<std::uint32_t>(vertices);
@@ -42,7 +47,8 @@ HObject lifted(const HObject& mesh) {
 } // namespace
 
 std::string modelName(const WarpSetting& setting) {
-    return setting.shapes == 0 ? "direct" : "S=" + std::to_string(setting.shapes);
+    const std::string name = setting.shapes == 0 ? "direct" : "S=" + std::to_string(setting.shapes);
+    return setting.hasHidden ? name + " 2x512" : name;
 }
 
 WarpFrame::WarpFrame(const WarpSetting& setting, Change change)

@@ -18,6 +18,7 @@ struct WarpSetting {
     bool isSurface;
     std::size_t shapes; // 0: a direct model
     unsigned smoothing;
+    bool hasHidden = false; // two hidden layers of 512
 };
 
 std::string modelName(const WarpSetting& setting);

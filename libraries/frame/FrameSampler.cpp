@@ -40,25 +40,20 @@ void pack(quill::PaddedPoints& rows, const Points& points) {
         quill::copyGrain);
 }
 
+} // namespace
+
 /// The points as deltas are meant on them, in workspace.smoothed; not in Offset mode without smoothing.
-void smooth(FrameWorkspace& workspace, const FrameModel& model, const Points& points, const IsCancelled& isCancelled) {
-    if (model.settings.isSmoothed())
-        if (const quill::Smoother& smoother = workspace.smoother(model); smoother.vertexCount() == points.size()) {
-            smoother.run(points, static_cast<std::size_t>(model.settings.smoothingIterations), workspace.smoothed,
+void FrameSampler::smooth(FrameWorkspace& workspace, const Points& points, const IsCancelled& isCancelled) const {
+    const ObservedStep step(observer_, FrameStep::points);
+    const DeltaSettings& settings = model_.settings;
+    if (settings.isSmoothed())
+        if (const quill::Smoother& smoother = workspace.smoother(model_); smoother.vertexCount() == points.size()) {
+            smoother.run(points, static_cast<std::size_t>(settings.smoothingIterations), workspace.smoothed,
                          workspace.scratch, {isCancelled});
             return;
         }
-    if (model.settings.isSmoothed() || model.settings.isSurface())
+    if (settings.isSmoothed() || settings.isSurface())
         pack(workspace.smoothed, points);
-}
-
-} // namespace
-
-std::vector<float> FrameSampler::predict(Network& network, std::span<const float> controls) const {
-    const ObservedStep step(observer_, FrameStep::network);
-    std::vector<float> outputs = network.run(controls);
-    observer_.takeOutputs(outputs);
-    return outputs;
 }
 
 FrameCheck FrameSampler::check(std::size_t outputCount) const {
@@ -73,10 +68,20 @@ FrameCheck FrameSampler::place(FrameWorkspace& workspace, Points& result, const 
                                const std::vector<float>& outputs, const IsCancelled& isCancelled) const {
     if (points.size() != model_.vertexCount)
         return {FrameFault::otherPointCount, points.size(), model_.vertexCount};
-    {
-        const ObservedStep step(observer_, FrameStep::points);
-        smooth(workspace, model_, points, isCancelled);
-    }
+    smooth(workspace, points, isCancelled);
+    return move(workspace, result, points, outputs);
+}
+
+FrameCheck FrameSampler::place(FrameWorkspace& workspace, Points& result, const Points& points, Prediction& prediction,
+                               const IsCancelled& isCancelled) const {
+    if (points.size() != model_.vertexCount)
+        return {FrameFault::otherPointCount, points.size(), model_.vertexCount};
+    prediction.meanwhile([&] { smooth(workspace, points, isCancelled); });
+    return move(workspace, result, points, prediction.outputs());
+}
+
+FrameCheck FrameSampler::move(FrameWorkspace& workspace, Points& result, const Points& points,
+                              const std::vector<float>& outputs) const {
     if (const FrameCheck checked = check(outputs.size()); checked.fault != FrameFault::none)
         return checked;
     const bool isWhole = !model_.driven.vertices && model_.settings.deltaMode <= kSurfaceMode;

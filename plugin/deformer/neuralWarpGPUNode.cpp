@@ -3,9 +3,11 @@
 #include "deformer/neuralWarpGPUNode.h"
 
 #include "deformer/ProfiledFrame.h"
+#include "deformer/SessionNetwork.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
 #include "frame/FrameCheck.h"
+#include "frame/Prediction.h"
 #include "messages/displayErrorGated.h"
 #include "messages/guard.h"
 #include "messages/messageText.h"
@@ -129,9 +131,11 @@ bool neuralWarpGPUNode::runInference(HDataBlock& block, neuralWarpData& data, st
     }
     ProfiledFrame observer(*data.observer, "InferenceDeltasForGPU",
                            "Inference Neural Warp deltas to be applied on the GPU.", false);
-    const HStatus status = runNetwork(block, data, observer, controls_, outputs);
+    const HStatus status = gatherControlValues(block, data.session.inputCount(), observer, controls_);
     if (reported(status, sourceUnit::gpuNode).error())
         return false;
+    SessionNetwork network(data.session);
+    outputs = std::move(Prediction(network, controls_, observer, Prediction::Where::inLine).outputs());
     if (outputs.empty())
         raiseMessage<Text::kErrorMLModelNoDeltas>(displayErrorGated);
     return !outputs.empty();

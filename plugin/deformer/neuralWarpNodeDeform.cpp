@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The evaluation of one geometry.
 #include "deformer/ProfiledFrame.h"
+#include "deformer/SessionNetwork.h"
 #include "deformer/framePlan.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
@@ -130,18 +131,23 @@ HStatus neuralWarpNode::applyNeuralModel(HDataBlock& block, std::uint32_t multiI
     if (!data.canApplyModel())
         return {HStatus::kFailure, "there is no model to apply"};
     ProfiledFrame observer(*data.observer, "InferenceDeltas", name(), data.activeSettings.isSurface());
-    std::vector<float> controls, outputs;
-    if (const HStatus status = runNetwork(block, data, observer, controls, outputs); status.error())
+    std::vector<float> controls;
+    if (const HStatus status = gatherControlValues(block, data.session.inputCount(), observer, controls);
+        status.error())
         return reported(status, sourceUnit::node);
+    const FrameModel model = data.frameModel();
+    SessionNetwork network(data.session);
+    Prediction prediction(network, controls, observer, Prediction::bestFor(model.vertexCount));
     const HProfilingScope scope(evaluationCategory(), 9, "ApplyDeltas", name());
-    {
+    HStatus status;
+    prediction.meanwhile([&] {
         const ObservedStep step(observer, FrameStep::points);
-        if (const HStatus status = readInputPoints(data, block, multiIndex, data.workspace.points, false);
-            status.error())
-            return status;
-    }
-    const FrameSampler sampler(data.frameModel(), observer);
-    return statusOf(sampler.place(data.workspace, result, data.workspace.points, outputs, HLongWork::isInterrupted),
+        status = readInputPoints(data, block, multiIndex, data.workspace.points, false);
+    });
+    if (status.error())
+        return status;
+    const FrameSampler sampler(model, observer);
+    return statusOf(sampler.place(data.workspace, result, data.workspace.points, prediction, HLongWork::isInterrupted),
                     data.session);
 }
 

@@ -2,7 +2,7 @@
 #include "deformer/neuralWarpUtils.h"
 
 #include "deformer/neuralWarpNode.h"
-#include "frame/FrameSampler.h"
+#include "frame/FrameObserver.h"
 #include "messages/displayErrorGated.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
@@ -11,19 +11,6 @@
 #include <utility>
 
 namespace neuralWarp {
-namespace {
-
-class SessionNetwork final : public Network {
-public:
-    explicit SessionNetwork(ModelSession& session)
-        : session_(session) {}
-    std::vector<float> run(std::span<const float> controls) override { return session_.run(controls); }
-
-private:
-    ModelSession& session_;
-};
-
-} // namespace
 
 neuralWarpData* fetchNodeData(HDataBlock& block, std::uint32_t multiIndex) {
     HStatus status;
@@ -43,7 +30,9 @@ HDataHandle existingElement(HDataBlock& block, const HObject& array, std::uint32
     return status.error() ? HDataHandle() : elements.inputValue(&status);
 }
 
-HStatus gatherControlValues(HDataBlock& block, std::int32_t inputCount, std::vector<float>& controls) {
+HStatus gatherControlValues(HDataBlock& block, std::int32_t inputCount, FrameObserver& observer,
+                            std::vector<float>& controls) {
+    const ObservedStep step(observer, FrameStep::gather);
     HStatus status;
     HArrayDataHandle values = block.inputArrayValue(neuralWarpNode::controlValues, &status);
     if (status.error())
@@ -63,18 +52,6 @@ HStatus gatherControlValues(HDataBlock& block, std::int32_t inputCount, std::vec
         if (status.error())
             return reported(status, sourceUnit::utils);
     }
-    return HStatus::kSuccess;
-}
-
-HStatus runNetwork(HDataBlock& block, neuralWarpData& data, FrameObserver& observer, std::vector<float>& controls,
-                   std::vector<float>& outputs) {
-    {
-        const ObservedStep step(observer, FrameStep::gather);
-        if (const HStatus status = gatherControlValues(block, data.session.inputCount(), controls); status.error())
-            return status;
-    }
-    SessionNetwork network(data.session);
-    outputs = FrameSampler(data.frameModel(), observer).predict(network, controls);
     return HStatus::kSuccess;
 }
 

@@ -18,16 +18,11 @@ neuralWarpData* fetchNodeData(HDataBlock& block, std::uint32_t multiIndex);
 /// failing status, when there is no such element. [eval]
 HDataHandle existingElement(HDataBlock& block, const HObject& array, std::uint32_t multiIndex, HStatus& status);
 
-/// Reads the first `inputCount` elements of `controlValues`, by position, into `controls`. With fewer elements it
-/// shows both counts and fails; a failing host call is reported and returned. [eval]
-HStatus gatherControlValues(HDataBlock& block, std::int32_t inputCount, std::vector<float>& controls);
-
-/// Gathers the control values of a model that can be applied, and runs its network on them.
-///   controls  out, kept by the caller for its memory
-///   outputs   out; empty when the network failed
-/// Fails as gatherControlValues() does. [eval]
-HStatus runNetwork(HDataBlock& block, neuralWarpData& data, FrameObserver& observer, std::vector<float>& controls,
-                   std::vector<float>& outputs);
+/// Reads the first `inputCount` elements of `controlValues`, by position, into `controls`, as the step
+/// FrameStep::gather. With fewer elements it shows both counts and fails; a failing host call is reported and returned.
+/// [eval]
+HStatus gatherControlValues(HDataBlock& block, std::int32_t inputCount, FrameObserver& observer,
+                            std::vector<float>& controls);
 
 /// Index of the profiling category "Evaluation". [any]
 int evaluationCategory();

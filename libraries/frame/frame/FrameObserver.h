@@ -8,7 +8,8 @@
 namespace neuralWarp {
 
 /// Steps of a frame in which a model is applied, in their order. Those of the library are network, points, deltas,
-/// apply; the others are those of a host around it.
+/// apply; the others are those of a host around it. Where the network runs beside the points (frame/Prediction.h), its
+/// step comes after theirs, and is the rest of it that the frame waits for.
 enum class FrameStep : std::size_t { prepare, gather, network, points, deltas, apply, fetch, blend };
 inline constexpr std::size_t frameStepCount = 8;
 

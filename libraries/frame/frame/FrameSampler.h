@@ -1,16 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
-// One frame: from control values to the positions that the model gives its vertices. Blending towards them is a step of
-// its own (frame/blend.h).
+// One frame: from what a network gives to the positions that the model gives its vertices. Blending towards them is a
+// step of its own (frame/blend.h).
 #pragma once
 
 #include "frame/FrameCheck.h"
 #include "frame/FrameModel.h"
 #include "frame/FrameObserver.h"
 #include "frame/FrameWorkspace.h"
-#include "frame/Network.h"
+#include "frame/Prediction.h"
 #include "frame/smoothing.h"
 
-#include <span>
 #include <vector>
 
 namespace neuralWarp {
@@ -27,11 +26,6 @@ public:
         : model_(model)
         , observer_(observer) {}
 
-    /// Runs the network, and shows its outputs to the observer.
-    ///   controls  as Network::run() takes them
-    /// Returns the outputs; empty when the network failed.
-    std::vector<float> predict(Network& network, std::span<const float> controls) const;
-
     /// Where the model puts the vertices that it drives, in object space:
     ///   Offset    smoothed point + delta
     ///   Surface   rest point + delta, carried from the frame of the smoothed rest shape to that of the smoothed points
@@ -45,8 +39,14 @@ public:
     ///   isCancelled  asked in long smoothing, which then throws quill::Cancelled
     FrameCheck place(FrameWorkspace& workspace, Points& result, const Points& points, const std::vector<float>& outputs,
                      const IsCancelled& isCancelled = {}) const;
+    /// The same; the points are smoothed while a prediction is under way.
+    FrameCheck place(FrameWorkspace& workspace, Points& result, const Points& points, Prediction& prediction,
+                     const IsCancelled& isCancelled = {}) const;
 
 private:
+    void smooth(FrameWorkspace& workspace, const Points& points, const IsCancelled& isCancelled) const;
+    FrameCheck move(FrameWorkspace& workspace, Points& result, const Points& points,
+                    const std::vector<float>& outputs) const;
     FrameCheck check(std::size_t outputCount) const;
 
     FrameModel model_;

@@ -7,6 +7,14 @@
 #include "support/meshZoo.h"
 
 #include <gmock/gmock.h>
+#include <tbb/global_control.h>
+#include <tbb/task_arena.h>
+
+#include <atomic>
+#include <chrono>
+#include <stdexcept>
+#include <thread>
+#include <utility>
 
 #include <cmath>
 
@@ -17,6 +25,7 @@ using quill::missingIndex;
 using testing::ElementsAre;
 using Indices = std::vector<std::uint32_t>;
 using Vec = quill::val3<float>;
+using Where = Prediction::Where;
 
 /// Gives what it holds; with controls, the first of them on top of each.
 struct Given final : Network {
@@ -84,20 +93,22 @@ struct Grid {
 };
 
 TEST(FrameSampler, PutsDrivenVerticesWhereTheFormulasSay) {
+    bool isBeside = false;
     for (const DeltaSettings settings : {DeltaSettings{0, 0}, {2, 0}, {0, 1}, {2, 1}, {0, 7}})
         for (const bool isMapped : {false, true})
             for (const std::uint64_t shapes : {0U, 2U}) {
-                SCOPED_TRACE(testing::Message() << "mode " << settings.deltaMode << ", " << settings.smoothingIterations
-                                                << " passes, " << shapes << " shapes, mapped " << isMapped);
+                isBeside = !isBeside;
+                SCOPED_TRACE(testing::Message()
+                             << "mode " << settings.deltaMode << ", " << settings.smoothingIterations << " passes, "
+                             << shapes << " shapes, mapped " << isMapped << ", beside " << isBeside);
                 const Grid grid(settings, isMapped, shapes);
                 Given network;
                 for (std::size_t i = 0; i < (shapes ? shapes : 3 * Grid::count); ++i)
                     network.values.push_back(0.5F - 0.125F * static_cast<float>(i));
                 Seen seen;
                 const FrameSampler sampler(grid.model, seen);
-                const std::vector<float> outputs = sampler.predict(network, std::vector<float>{0.25F});
-                EXPECT_EQ(seen.outputs, outputs);
-                EXPECT_EQ(outputs.at(0), 0.75F);
+                const std::vector<float> controls{0.25F};
+                Prediction prediction(network, controls, seen, isBeside ? Where::beside : Where::inLine);
 
                 FrameWorkspace workspace;
                 Points points = grid.rest, smoothed = grid.rest, result(2);
@@ -106,7 +117,10 @@ TEST(FrameSampler, PutsDrivenVerticesWhereTheFormulasSay) {
                 Points scratch;
                 grid.connections.mushArray(smoothed, scratch, static_cast<std::size_t>(settings.smoothingIterations),
                                            1.0F, nullptr, &grid.weights, false);
-                ASSERT_EQ(sampler.place(workspace, result, points, outputs).fault, FrameFault::none);
+                ASSERT_EQ(sampler.place(workspace, result, points, prediction).fault, FrameFault::none);
+                const std::vector<float> outputs = prediction.outputs();
+                EXPECT_EQ(seen.outputs, outputs);
+                EXPECT_EQ(outputs.at(0), 0.75F);
                 std::vector<quill::mat4d> now;
                 grid.frames.calculateFrames(now, smoothed, grid.map, false, nullptr);
                 Points wanted(Grid::count);
@@ -120,10 +134,71 @@ TEST(FrameSampler, PutsDrivenVerticesWhereTheFormulasSay) {
                                     : transportDelta(grid.rest[v], delta, grid.restFramesInverse[v], now[v]);
                 }
                 EXPECT_EQ(result, wanted);
-                EXPECT_THAT(seen.steps,
-                            ElementsAre(FrameStep::network, FrameStep::points, FrameStep::deltas, FrameStep::apply));
+                std::vector<FrameStep> steps{FrameStep::network, FrameStep::points, FrameStep::deltas,
+                                             FrameStep::apply};
+                if (isBeside)
+                    std::swap(steps[0], steps[1]);
+                EXPECT_EQ(seen.steps, steps);
                 EXPECT_EQ(seen.ended, seen.steps);
             }
+}
+
+/// Waits, for a bounded time, until the caller is where it should be meanwhile, and then gives nothing or throws.
+struct Held final : Network {
+    std::vector<float> run(std::span<const float>) override {
+        const auto deadline = std::chrono::steady_clock::now() + std::chrono::seconds(20);
+        while (!isReached && std::chrono::steady_clock::now() < deadline)
+            std::this_thread::yield();
+        isAlone = !isReached;
+        if (throws)
+            throw std::runtime_error("no network");
+        isDone = true;
+        return {};
+    }
+    std::atomic<bool> isReached = false;
+    bool isAlone = false, isDone = false, throws = false;
+};
+
+TEST(Prediction, RunsBesideTheFrameAndEndsWithIt) {
+    const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, 2);
+    tbb::task_arena arena(2);  // also on one core
+    const Grid grid({200, 1}); // looks for a cancellation as it begins, and later
+    for (const std::string outcome : {"nothing", "thrown", "cancelled"}) {
+        SCOPED_TRACE(outcome);
+        Held network;
+        network.throws = outcome == "thrown";
+        Seen seen;
+        FrameWorkspace workspace;
+        Points result(3);
+        const auto frame = [&] {
+            Prediction prediction(network, {}, seen, Where::beside);
+            return FrameSampler(grid.model, seen).place(workspace, result, grid.rest, prediction, [&] {
+                network.isReached = true;
+                return outcome == "cancelled";
+            });
+        };
+        std::string ended;
+        arena.execute([&] {
+            try {
+                ended = frame().fault == FrameFault::noOutputs ? "nothing" : "placed";
+            } catch (const std::runtime_error&) {
+                ended = "thrown";
+            } catch (const quill::Cancelled&) {
+                ended = "cancelled";
+            }
+        });
+        EXPECT_EQ(ended, outcome);
+        EXPECT_FALSE(network.isAlone) << "it ran where the frame is, which waited for it";
+        EXPECT_TRUE(network.isDone || outcome != "nothing");
+        EXPECT_EQ(result, Points(3)) << "as it was";
+        EXPECT_EQ(seen.ended, seen.steps);
+    }
+}
+
+TEST(Prediction, StaysInLineWhereNobodyCanCome) {
+    EXPECT_EQ(Prediction::bestFor(2), Where::inLine);
+    const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, 1);
+    EXPECT_EQ(Prediction::bestFor(1000000), Where::inLine);
 }
 
 TEST(FrameSampler, RefusesWhatDoesNotReachEveryVertex) {
@@ -178,7 +253,8 @@ TEST(FrameSampler, EndsLongSmoothingOnRequest) {
     FrameWorkspace workspace;
     Points result;
     Seen seen;
-    EXPECT_THROW(FrameSampler(grid.model, seen).place(workspace, result, grid.rest, {}, [&] { return ++looks == 3; }),
+    EXPECT_THROW(FrameSampler(grid.model, seen)
+                     .place(workspace, result, grid.rest, std::vector<float>(), [&] { return ++looks == 3; }),
                  quill::Cancelled);
     EXPECT_EQ(looks, 3);
     EXPECT_THAT(seen.ended, ElementsAre(FrameStep::points));

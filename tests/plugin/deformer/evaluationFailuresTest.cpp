@@ -125,6 +125,24 @@ TEST_F(EvaluationFailures, AreSaidAndLeaveTheGeometryAsItCame) {
     }
 }
 
+TEST_F(EvaluationFailures, OfANetworkBesideTheFrameAreSaidOnce) {
+    const HObject mesh = unevenMesh(30, 30);
+    writeModel(modelDirectory(), modelSpec(31 * 31));
+    makeRig(mesh);
+    ASSERT_EQ(rig->deform(0), HStatus::kSuccess);
+    const Coordinates right = result(*rig);
+    for (int frame = 0; frame < 20; ++frame) {
+        rig->setControls({std::numeric_limits<double>::quiet_NaN()});
+        EXPECT_EQ(rig->deform(0), HStatus::kFailure);
+        EXPECT_EQ(said(), (Texts{"error: [NEURAL WARP] No delta computed from the ML model",
+                                 report("the model gave no values: a control value is not finite")}));
+        EXPECT_EQ(result(*rig), coordinates(warpRig::pointsOf(mesh)));
+        rig->setControls({1.0});
+        EXPECT_EQ(rig->deform(0), HStatus::kSuccess);
+        EXPECT_EQ(result(*rig), right);
+    }
+}
+
 TEST_F(EvaluationFailures, LongWorkEndsWhenTheUserAsksForIt) {
     writeChanged([](ModelSpec& spec) { spec.smoothingIterations = 4000000000U; });
     makeRig();

@@ -4,6 +4,8 @@
 #include "plugin/deformer/support/FailureTest.h"
 #include "support/watchedNew.h"
 
+#include <tbb/global_control.h>
+
 #include <algorithm>
 
 namespace {
@@ -14,6 +16,7 @@ public:
     static constexpr std::size_t n = (columns + 1) * (columns + 1);
     using Sizes = std::vector<std::size_t>;
 
+    const tbb::global_control limit{tbb::global_control::max_allowed_parallelism, 1}; ///< that whose memory is watched
     static HObject largeMesh() { return unevenMesh(columns, columns); }
     void writeMyModel(std::uint32_t deltaMode, std::uint32_t smoothing) const {
         ModelSpec spec = modelSpec(n);

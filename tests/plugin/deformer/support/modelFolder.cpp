@@ -28,23 +28,40 @@ std::string block(unsigned field, const std::string& bytes) {
 
 constexpr std::uint64_t floatType = 1; // TensorProto.FLOAT
 
-std::string valueInfo(const char* name, std::uint64_t size) {
+std::string valueInfo(const std::string& name, std::uint64_t size) {
     const std::string shape = block(1, number(1, size));
     const std::string tensorType = number(1, floatType) + block(2, shape);
     return block(1, name) + block(2, block(1, tensorType));
 }
 
-std::string node(const char* operation, const char* a, const char* b, const char* output) {
-    return block(1, a) + block(1, b) + block(2, output) + block(4, operation);
+std::string node(const char* operation, const std::vector<std::string>& inputs, const std::string& output) {
+    std::string bytes;
+    for (const std::string& input : inputs)
+        bytes += block(1, input);
+    return bytes + block(2, output) + block(4, operation);
 }
 
-std::string tensor(const char* name, const std::vector<std::uint64_t>& dims, const std::vector<float>& values) {
+std::string tensor(const std::string& name, const std::vector<std::uint64_t>& dims, const std::vector<float>& values) {
     std::string bytes;
     for (const std::uint64_t dim : dims)
         bytes += number(1, dim);
     std::string raw(values.size() * sizeof(float), '\0');
     std::memcpy(raw.data(), values.data(), raw.size());
     return bytes + number(2, floatType) + block(8, name) + block(9, raw);
+}
+
+std::string layer(const std::string& name, const std::string& from, const std::string& to, std::size_t width,
+                  const std::vector<float>& weights, const std::vector<float>& bias) {
+    const std::string w = name + "weights", product = name + "product", b = name + "bias";
+    return block(1, node("MatMul", {from, w}, product)) + block(1, node("Add", {product, b}, to)) +
+           block(5, tensor(w, {width, bias.size()}, weights)) + block(5, tensor(b, {bias.size()}, bias));
+}
+
+std::vector<float> someWeights(std::size_t count) {
+    std::vector<float> weights(count);
+    for (std::size_t i = 0; i < count; ++i)
+        weights[i] = 0.001F * static_cast<float>(i % 101) - 0.03F;
+    return weights;
 }
 
 // --- the JSON files ---
@@ -94,13 +111,18 @@ void writeFile(const std::filesystem::path& path, const std::string& bytes) {
 
 std::string networkBytes(const ModelSpec& spec) {
     const std::size_t outputs = spec.bias.size();
-    const std::vector<float> weights =
-        spec.weights.empty() ? std::vector<float>(spec.controls * outputs) : spec.weights;
-    const std::string graph = block(1, node("MatMul", "controls", "weights", "product")) +
-                              block(1, node("Add", "product", "bias", "deltas")) + block(2, "linear") +
-                              block(5, tensor("weights", {spec.controls, outputs}, weights)) +
-                              block(5, tensor("bias", {outputs}, spec.bias)) +
-                              block(11, valueInfo("controls", spec.controls)) + block(12, valueInfo("deltas", outputs));
+    std::string graph = block(2, "layers"), values = "controls";
+    std::size_t width = spec.controls;
+    for (const std::size_t next : spec.hidden) {
+        const std::string name = "hidden" + std::to_string(graph.size()) + "_";
+        graph += layer(name, values, name + "sum", width, someWeights(width * next), std::vector<float>(next));
+        graph += block(1, node("Relu", {name + "sum"}, name + "values"));
+        values = name + "values";
+        width = next;
+    }
+    graph += layer("", values, "deltas", width,
+                   spec.weights.empty() ? std::vector<float>(width * outputs) : spec.weights, spec.bias) +
+             block(11, valueInfo("controls", spec.controls)) + block(12, valueInfo("deltas", outputs));
     constexpr std::uint64_t formatVersion = 7;
     constexpr std::uint64_t operatorSet = 13;
     const std::string entry = spec.options.empty() ? "" : block(14, block(1, "ort_config") + block(2, spec.options));

@@ -7,11 +7,14 @@
 #include <string>
 #include <vector>
 
-/// What a model directory says. The network computes outputs = controls * weights + bias.
+/// What a model directory says. The network computes outputs = values * weights + bias, where the values are the
+/// controls, or what the hidden layers made of them.
 struct ModelSpec {
     std::size_t controls = 1;
+    /// How wide each hidden layer is, which computes max(values * w + 0, 0) with some small w of its own.
+    std::vector<std::size_t> hidden = {};
     std::vector<float> bias{1.0F}; ///< as many as there are outputs
-    std::vector<float> weights;    ///< [controls][outputs]; empty: all 0, so that the outputs are the bias
+    std::vector<float> weights;    ///< [values][outputs]; empty: all 0, so that the outputs are the bias
     /// Principal shapes, each 3 values per slot; none: no file of shapes, the outputs are the deltas themselves.
     std::vector<std::vector<float>> shapes;
 
