@@ -21,9 +21,11 @@
 #include <filesystem>
 #include <fstream>
 #include <iterator>
+#include <memory>
 #include <span>
 #include <stdexcept>
 #include <string>
+#include <utility>
 #include <vector>
 
 #define ORT_API_MANUAL_INIT
@@ -148,7 +150,7 @@ void writeShapes(const fs::path& folder, std::size_t shapes, std::size_t vertice
 
 class BasisSink final : public neuralWarp::PrincipalShapesSink {
 public:
-    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float>) override {
         basis_.resize(vertCount, shapeCount);
         filled_ = 0;
     }
@@ -156,6 +158,7 @@ public:
         basis_.set(filled_, values);
         filled_ += values.size() / 3 / basis_.shapeCount();
     }
+    void append(std::span<const std::uint16_t>) override {}
 
 private:
     neuralWarp::PrincipalBasis basis_;
@@ -187,6 +190,29 @@ std::vector<Phase> openingShapes(const fs::path& folder, std::size_t vertices, c
     Phase layOut{"open shapes: lay out", name, numbers, numbers * sizeof(float)};
     layOut.ours = [values = std::vector<float>(numbers)] { neuralWarp::PrincipalBasis().assign(values, shapes); };
     return {all, sum, layOut, text};
+}
+
+// The sum that a frame makes, of halves held against that of floats.
+Phase summing(std::size_t vertices, const std::string& name) {
+    constexpr std::size_t shapes = 50;
+    neuralWarp::PrincipalBasis floats, halves;
+    floats.assign(std::vector<float>(3 * shapes * vertices, 0.25F), shapes);
+    halves.resizeHalves(vertices, std::vector<float>(shapes, 1.0F));
+    halves.set(0, std::span<const std::uint16_t>(std::vector<std::uint16_t>(3 * shapes * vertices, 0x3400)));
+    auto sum = [sums = std::vector<quill::val3<float>>(vertices),
+                coefficients = std::vector<float>(shapes, 0.5F)](const neuralWarp::PrincipalBasis& basis) mutable {
+        basis.sum(sums.data(), coefficients.data(), 0, basis.blockCount());
+    };
+    const std::size_t numbers = 3 * shapes * vertices;
+    Phase phase{"sum shapes: halves", name, numbers, numbers * sizeof(std::uint16_t)};
+    // shared: a copy would not lie in large pages
+    phase.ours = [sum, basis = std::make_shared<const neuralWarp::PrincipalBasis>(std::move(halves))]() mutable {
+        sum(*basis);
+    };
+    phase.plain = [sum, basis = std::make_shared<const neuralWarp::PrincipalBasis>(std::move(floats))]() mutable {
+        sum(*basis);
+    };
+    return phase;
 }
 
 std::string metadataText(std::size_t indices) {
@@ -236,6 +262,7 @@ void runAll(const bench::Options& options, bench::Report& report) {
         readingShapes(folder.path(), values, plainValues),
         readingMetadata(folder.path(), record, plainIndices),
     };
+    phases.push_back(summing(vertices, name));
     for (const Phase& phase :
          options.wants("open shapes") ? openingShapes(folder.path() / "opened", vertices, name) : std::vector<Phase>())
         phases.push_back(phase);

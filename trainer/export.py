@@ -19,6 +19,7 @@ from . import __version__
 from .dataset import Dataset
 from .errors import TrainerError
 from .files import write_bytes
+from .halves import Halves
 from .network import Normalisation
 from .settings import WITHOUT_EFFECT, Settings
 
@@ -128,8 +129,9 @@ def check_shapes_size(shape_count: int, delta_count: int) -> None:
 
 
 def write_model(folder: Path, model: onnx.ModelProto, metadata_: dict[str, Any],
-                shapes: Optional[np.ndarray] = None) -> None:
-    """Writes the files into an existing folder. shapes: float32 [S, 3 * D], in scene units, or none."""
+                shapes: Optional[np.ndarray] = None, halves: Optional[Halves] = None) -> None:
+    """Writes the files into an existing folder. shapes: float32 [S, 3 * D], in scene units, or none; halves: what they
+    are decoded from."""
     text = json.dumps(metadata_, indent=1, allow_nan=False) + "\n"
     if len(text) > METADATA_LIMIT:
         raise TrainerError(f"metadata.json would have {len(text)} bytes, more than the {METADATA_LIMIT} that the "
@@ -137,23 +139,30 @@ def write_model(folder: Path, model: onnx.ModelProto, metadata_: dict[str, Any],
     write_bytes(folder / "metadata.json", text.encode())
     write_bytes(folder / "model.onnx", model.SerializeToString(deterministic=True))
     if shapes is not None:
-        write_shapes(folder, shapes)
+        write_shapes(folder, shapes, halves)
 
 
-def write_shapes(folder: Path, shapes: np.ndarray) -> None:
-    # nine digits give a float32 back, also where a reader errs in a double's last places; it takes "-0" for 0
+def write_shapes(folder: Path, shapes: np.ndarray, halves: Optional[Halves] = None) -> None:
+    shapes = shapes + np.float32(0)  # readers take "-0" for 0
+    # nine digits give a float32 back, also where a reader errs in a double's last places
     numbers = ",".join(["%.9g"] * shapes.shape[1])
-    rows = ",\n".join("[" + numbers % tuple(shape.tolist()) + "]" for shape in shapes + np.float32(0))
+    rows = ",\n".join("[" + numbers % tuple(shape.tolist()) + "]" for shape in shapes)
     text = (f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
             f'"principalShapes": [\n{rows}\n]}}\n').encode()
     write_bytes(folder / "principal_shapes.json", text)
-    write_bytes(folder / "principal_shapes.npz", shapes_archive(text, shapes + np.float32(0)))
+    write_bytes(folder / "principal_shapes.npz", shapes_archive(text, shapes, halves))
 
 
-def shapes_archive(text: bytes, shapes: np.ndarray) -> bytes:
+def shapes_archive(text: bytes, shapes: np.ndarray, halves: Optional[Halves]) -> bytes:
     """The numbers of that JSON for readers in a hurry: they count while the JSON is the one of that sum."""
-    by_vertex = shapes.reshape(len(shapes), -1, 3).transpose(1, 0, 2)
+    arrays = {"json_xxh3_128": np.array(xxhash.xxh3_128_hexdigest(text).encode()), "shapes": by_vertex(shapes, "<f4")}
+    if halves is not None:
+        arrays.update(shapes=by_vertex(halves.numbers, "<f2"), scales=halves.scales.astype("<f4"))
     archive = io.BytesIO()
-    np.savez(archive, json_xxh3_128=np.array(xxhash.xxh3_128_hexdigest(text).encode()),
-             shapes=np.ascontiguousarray(by_vertex, "<f4"))
+    np.savez(archive, **arrays)
     return archive.getvalue()
+
+
+def by_vertex(shapes: np.ndarray, kind: str) -> np.ndarray:
+    """[D, S, 3] of [S, 3 * D]"""
+    return np.ascontiguousarray(shapes.reshape(len(shapes), -1, 3).transpose(1, 0, 2), kind)

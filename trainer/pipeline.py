@@ -2,7 +2,7 @@
 """From a data set to a published model: targets, training, export, verification, errors."""
 
 import time
-from dataclasses import dataclass
+from dataclasses import dataclass, replace
 from pathlib import Path
 from typing import Any, Callable, Optional
 
@@ -13,6 +13,7 @@ from torch import nn
 from . import evaluator, export, files, memory, plausible, progress, report
 from .dataset import Dataset
 from .errors import TrainerError
+from .halves import Halves, rounding, to_halves
 from .measure import measure
 from .network import Normalisation, build, check_size, measure_controls, parameter_count, predict
 from .settings import Settings
@@ -50,6 +51,8 @@ class Targets:
     unit: float                             # by which the network's last layer is scaled
     shapes: Optional[np.ndarray] = None     # float32 [S, 3 * D] that the scaled outputs are coefficients of
     explained: Optional[float] = None
+    halves: Optional[Halves] = None         # what the shapes are decoded from
+    rounding: Optional[dict[str, Any]] = None  # what that costs, over all rows
 
 
 def train(job: Job) -> dict[str, Any]:
@@ -58,6 +61,9 @@ def train(job: Job) -> dict[str, Any]:
     dataset, settings = job.dataset, job.settings
     if dataset.delta_count == 0:
         raise TrainerError(f"{dataset.folder} has no deltas: its subset is {dataset.description['subsetState']}")
+    if settings.principalShapesHalf and not settings.principalShapesEnabled:
+        raise TrainerError("half precision is for principal shapes, and this model has none: give --principal-shapes "
+                           "as well, or leave --half-shapes away")
     check_size(settings, dataset.control_count, 1 if settings.principalShapesEnabled else 3 * dataset.delta_count)
     make_deterministic(job.seed, job.threads)
     memory.warn_of_slow_blas(job.say)
@@ -120,7 +126,18 @@ def principal_targets(job: Job, rows: np.ndarray) -> Targets:
     unit = np.sqrt(np.mean(np.square(coefficients[rows], dtype=np.float64)))
     coefficients *= np.float32(1 / unit)
     shapes = (basis.shapes.astype(np.float64) * unit).astype(np.float32)
-    return Targets(len(shapes), lambda rows: coefficients[rows], 1.0, shapes, basis.explained)
+    targets = Targets(len(shapes), lambda rows: coefficients[rows], 1.0, shapes, basis.explained)
+    return halved(job, targets, shapes) if settings.principalShapesHalf else targets
+
+
+def halved(job: Job, targets: Targets, shapes: np.ndarray) -> Targets:
+    """The same with shapes of half precision, and a word on what is lost."""
+    halves = to_halves(shapes)
+    decoded = halves.decoded()
+    lost = rounding(job.dataset, np.arange(job.dataset.frame_count), targets.of, decoded - shapes)
+    job.say(f"in half precision the shapes put vertices off by {lost['mean']['mm']:.2g} mm in the mean and "
+            f"{lost['max']['mm']:.2g} mm at most")
+    return replace(targets, shapes=decoded, halves=halves, rounding=lost)
 
 
 # --- training and export ---
@@ -152,7 +169,7 @@ def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, 
     metadata = export.metadata(job.dataset, job.settings, job.seed)
     if history.interrupted:
         metadata["interruptedAfterEpochs"] = len(history.train)
-    export.write_model(part, model, metadata, targets.shapes)
+    export.write_model(part, model, metadata, targets.shapes, targets.halves)
     rows = report_rows(split)[:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
     wanted = predict(network, normalisation, controls)
@@ -193,6 +210,7 @@ def summarise(job: Job, trained: Trained, targets: Targets, split: Split) -> dic
         "verifiedWithQuarn": job.quarn is not None, "heldOut": len(split[1]) > 0,
         "errors": measure(job.dataset, report_rows(split), deltas_of, targets.shapes),
         "principalShapes": None if targets.shapes is None else len(targets.shapes), "explained": targets.explained,
+        "halfPrecision": targets.rounding,
         "parameters": sum(p.numel() for p in network.parameters()),
         "epochs": len(history.train), "bestEpoch": history.best_epoch, "bestLoss": history.best_loss,
         "interrupted": history.interrupted,

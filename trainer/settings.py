@@ -28,6 +28,7 @@ class Settings:
     principalShapesLimit: int = 20
     principalShapesAccuracy: float = 0.8
     preloadData: bool = True
+    principalShapesHalf: bool = False  # not an attribute of the node
     patience: int = 50  # epochs without a better validation loss until training stops; not an attribute of the node
 
 
@@ -44,6 +45,7 @@ MEANINGS = {
     "principalShapesEnabled": "learn coefficients of principal shapes, not the deltas themselves",
     "principalShapesLimit": "most principal shapes",
     "principalShapesAccuracy": "part of the deltas' sum of squares that the shapes hold; 0.99 and more looks right",
+    "principalShapesHalf": "keep principal shapes in half precision: half the size, and off by what is then said",
     "preloadData": "hold the deltas in memory; the model is the same without",
     "patience": "stop after so many epochs without a better validation loss",
 }

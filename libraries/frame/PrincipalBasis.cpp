@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "frame/PrincipalBasis.h"
 
+#include "half.h"
 #include "quill/largePages.h"
 #include "quill/parallelFor.h"
 #include "sumShapes.h"
@@ -10,27 +11,47 @@
 
 namespace neuralWarp {
 
-void PrincipalBasis::resize(std::size_t slotCount, std::size_t shapeCount) {
+template <class Number>
+void PrincipalBasis::makeRoom(std::vector<Number>& numbers, std::size_t slotCount, std::size_t shapeCount) {
     clear();
     if (slotCount == 0 || shapeCount == 0)
         return;
-    quill::resizeInLargePages(values_, (slotCount + lanes - 1) / lanes * shapeCount * 3 * lanes);
+    quill::resizeInLargePages(numbers, (slotCount + lanes - 1) / lanes * shapeCount * 3 * lanes);
     shapeCount_ = shapeCount;
     slotCount_ = slotCount;
 }
 
-void PrincipalBasis::set(std::size_t first, std::span<const float> values) {
+template <class Number>
+void PrincipalBasis::put(std::vector<Number>& numbers, std::size_t first, std::span<const Number> values) {
     const std::size_t end = first + values.size() / (3 * shapeCount_);
     for (std::size_t b = first / lanes; b * lanes < end; ++b) {
-        float* out = values_.data() + b * shapeCount_ * 3 * lanes;
         const std::size_t slot = std::max(first, b * lanes);
         const std::size_t count = std::min(end, (b + 1) * lanes) - slot;
-        const float* const in = values.data() + (slot - first) * 3 * shapeCount_;
+        const Number* const in = values.data() + (slot - first) * 3 * shapeCount_;
+        Number* out = numbers.data() + b * shapeCount_ * 3 * lanes;
         out += slot % lanes;
         for (std::size_t i = 0; i < 3 * shapeCount_; ++i, out += lanes)
             for (std::size_t lane = 0; lane < count; ++lane)
                 out[lane] = in[3 * shapeCount_ * lane + i];
     }
+}
+
+void PrincipalBasis::resize(std::size_t slotCount, std::size_t shapeCount) {
+    makeRoom(values_, slotCount, shapeCount);
+}
+
+void PrincipalBasis::resizeHalves(std::size_t slotCount, std::span<const float> scales) {
+    std::vector<float> kept(scales.begin(), scales.end());
+    makeRoom(halves_, slotCount, scales.size());
+    scales_ = std::move(kept);
+}
+
+void PrincipalBasis::set(std::size_t first, std::span<const float> values) {
+    put(values_, first, values);
+}
+
+void PrincipalBasis::set(std::size_t first, std::span<const std::uint16_t> halves) {
+    put(halves_, first, halves);
 }
 
 void PrincipalBasis::assign(const std::vector<float>& values, std::uint64_t shapeCount) {
@@ -46,19 +67,30 @@ void PrincipalBasis::assign(const std::vector<float>& values, std::uint64_t shap
 std::vector<float> PrincipalBasis::slotMajor() const {
     std::vector<float> values(3 * shapeCount_ * slotCount_);
     quill::parallelFor(slotCount_, [&](std::size_t slot) {
-        const float* const block = values_.data() + slot / lanes * shapeCount_ * 3 * lanes + slot % lanes;
-        for (std::size_t i = 0; i < 3 * shapeCount_; ++i)
-            values[3 * shapeCount_ * slot + i] = block[i * lanes];
+        const std::size_t first = slot / lanes * shapeCount_ * 3 * lanes + slot % lanes;
+        for (std::size_t i = 0; i < 3 * shapeCount_; ++i) {
+            const std::size_t place = first + i * lanes;
+            values[3 * shapeCount_ * slot + i] =
+                hasHalves() ? scales_[i / 3] * decodeHalf(halves_[place]) : values_[place];
+        }
     });
     return values;
 }
 
+void PrincipalBasis::sumBlock(float* components, const float* coefficients, std::size_t block) const {
+    const std::size_t first = block * shapeCount_ * 3 * lanes;
+    if (hasHalves())
+        sumHalfShapes(quill::instructionSet())(components, halves_.data() + first, scales_.data(), coefficients,
+                                               shapeCount_);
+    else
+        sumShapes(quill::instructionSet())(components, values_.data() + first, coefficients, shapeCount_);
+}
+
 void PrincipalBasis::sum(quill::val3<float>* sums, const float* coefficients, std::size_t begin,
                          std::size_t end) const {
-    const SumShapes kernel = sumShapes(quill::instructionSet());
     std::array<float, 3 * lanes> components; // [3][lanes]
     for (std::size_t b = begin; b < end; ++b) {
-        kernel(components.data(), values_.data() + b * shapeCount_ * 3 * lanes, coefficients, shapeCount_);
+        sumBlock(components.data(), coefficients, b);
         const std::size_t first = lanes * b;
         const std::size_t count = std::min(lanes, slotCount_ - first);
         for (std::size_t lane = 0; lane < count; ++lane)

@@ -2,7 +2,9 @@
 #include "nw_model/PrincipalBasisFiles.h"
 
 #include <algorithm>
+#include <cmath>
 #include <fstream>
+#include <optional>
 #include <stdexcept>
 #include <vector>
 
@@ -55,30 +57,64 @@ std::string sumIn(const storage::NpzFile& archive) {
     return text;
 }
 
-Counts countsOf(const storage::NpzArray& shapes) {
+/// How the numbers of an archive lie in it.
+struct Layout {
+    Counts counts;
+    bool hasHalves = false;
+};
+
+Layout layoutOf(const storage::NpzArray& shapes) {
     const storage::NpyArray& head = shapes.head();
-    if (head.descr != "<f4" || head.shape.size() != 3 || head.shape.back() != 3)
+    const bool hasHalves = head.descr == "<f2";
+    if ((head.descr != "<f4" && !hasHalves) || head.shape.size() != 3 || head.shape.back() != 3)
         throw std::runtime_error("its shapes are '" + head.descr + "' " + storage::npyShapeText(head.shape) +
-                                 ", where '<f4' [vertices, shapes, 3] are to be");
-    shapes.requireSize(sizeof(float));
-    return {head.shape[1], head.shape[0]};
+                                 ", where '<f4' or '<f2' [vertices, shapes, 3] are to be");
+    shapes.requireSize(hasHalves ? sizeof(std::uint16_t) : sizeof(float));
+    return {{head.shape[1], head.shape[0]}, hasHalves};
+}
+
+std::vector<float> scalesIn(const storage::NpzFile& archive, std::uint64_t shapeCount) {
+    storage::NpzArray array = archive.array("scales");
+    if (array.head().descr != "<f4" || array.head().shape != std::vector<std::uint64_t>{shapeCount})
+        throw std::runtime_error("its scales are '" + array.head().descr + "' " +
+                                 storage::npyShapeText(array.head().shape) + ", and not one for each shape");
+    array.requireSize(sizeof(float));
+    std::vector<float> scales(shapeCount);
+    array.read(std::as_writable_bytes(std::span(scales)));
+    array.finish();
+    constexpr float largestHalf = 65504;
+    for (const float scale : scales)
+        if (!std::isfinite(scale * largestHalf))
+            throw std::runtime_error("it has a scale that is not finite, or too large: " + std::to_string(scale));
+    return scales;
+}
+
+std::optional<std::size_t> firstNotFinite(std::span<const float> values) {
+    return storage::firstNotFinite(values);
+}
+
+std::optional<std::size_t> firstNotFinite(std::span<const std::uint16_t> halves) {
+    constexpr unsigned exponent = 0x7C00;
+    const auto bad =
+        std::find_if(halves.begin(), halves.end(), [](std::uint16_t half) { return (half & exponent) == exponent; });
+    return bad == halves.end() ? std::nullopt : std::optional<std::size_t>(bad - halves.begin());
 }
 
 /// `counts` those of the array, whose size is that of the file.
+template <class Number>
 void passOn(PrincipalShapesSink& sink, storage::NpzArray& shapes, const Counts& counts) {
     constexpr std::size_t blockBytes = 1U << 18U; // stays in the second cache until it is passed on
     const std::size_t perVertex = 3 * static_cast<std::size_t>(counts.shapes);
-    const std::size_t perBlock = std::max<std::size_t>(blockBytes / sizeof(float) / perVertex, 1);
-    std::vector<float> block(perVertex * std::min<std::uint64_t>(perBlock, counts.vertices));
-    sink.begin(counts.shapes, counts.vertices);
+    const std::size_t perBlock = std::max<std::size_t>(blockBytes / sizeof(Number) / perVertex, 1);
+    std::vector<Number> block(perVertex * std::min<std::uint64_t>(perBlock, counts.vertices));
     for (std::uint64_t vertex = 0; vertex < counts.vertices; vertex += perBlock) {
         const auto values =
             std::span(block).first(perVertex * std::min<std::uint64_t>(perBlock, counts.vertices - vertex));
         shapes.read(std::as_writable_bytes(values));
-        if (const auto bad = storage::firstNotFinite(values))
+        if (const auto bad = firstNotFinite(values))
             throw std::runtime_error("its shapes have a number that is not finite, of vertex " +
                                      std::to_string(vertex + *bad / perVertex));
-        sink.append(values);
+        sink.append(std::span<const Number>(values));
     }
     shapes.finish();
 }
@@ -89,7 +125,7 @@ Counts readArchive(const fs::path& archivePath, const fs::path& jsonPath, Princi
     const storage::NpzFile archive(archivePath);
     const std::string wanted = sumIn(archive);
     storage::NpzArray shapes = archive.array("shapes");
-    const Counts counts = countsOf(shapes);
+    const auto [counts, hasHalves] = layoutOf(shapes);
     const storage::FileSum found = storage::sumOfFile(jsonPath, principalShapesFileLimit, headSize);
     if (found.digits != wanted)
         throw std::runtime_error("it was made of another principal_shapes.json than the one that is there");
@@ -101,7 +137,12 @@ Counts readArchive(const fs::path& archivePath, const fs::path& jsonPath, Princi
         throw std::runtime_error("it has " + std::to_string(counts.shapes) + " shapes of " +
                                  std::to_string(counts.vertices) + " vertices, and principal_shapes.json begins with " +
                                  std::to_string(told.shapes) + " of " + std::to_string(told.vertices));
-    passOn(sink, shapes, counts);
+    const std::vector<float> scales = hasHalves ? scalesIn(archive, counts.shapes) : std::vector<float>();
+    sink.begin(counts.shapes, counts.vertices, scales);
+    if (hasHalves)
+        passOn<std::uint16_t>(sink, shapes, counts);
+    else
+        passOn<float>(sink, shapes, counts);
     return counts;
 }
 
@@ -141,8 +182,8 @@ bool readPrincipalBasis(const fs::path& directory, PrincipalShapesSink& sink, Pr
         answer.shapeCount = shapes.shapeCount;
         answer.vertCount = shapes.vertCount;
         if (!shapes.values.empty()) {
-            sink.begin(shapes.shapeCount, shapes.vertCount);
-            sink.append(shapes.values);
+            sink.begin(shapes.shapeCount, shapes.vertCount, {});
+            sink.append(std::span<const float>(shapes.values));
         }
         return isRead;
     } catch (...) {

@@ -127,16 +127,24 @@ class BasisSink final : public PrincipalShapesSink {
 public:
     explicit BasisSink(PrincipalBasis& basis)
         : basis_(basis) {}
-    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
-        basis_.resize(static_cast<std::size_t>(vertCount), static_cast<std::size_t>(shapeCount));
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float> scales) override {
+        const auto slots = static_cast<std::size_t>(vertCount);
+        if (scales.empty())
+            basis_.resize(slots, static_cast<std::size_t>(shapeCount));
+        else
+            basis_.resizeHalves(slots, scales);
         filled_ = 0;
     }
-    void append(std::span<const float> values) override {
+    void append(std::span<const float> values) override { put(values); }
+    void append(std::span<const std::uint16_t> halves) override { put(halves); }
+
+private:
+    template <class Number>
+    void put(std::span<const Number> values) {
         basis_.set(filled_, values);
         filled_ += values.size() / (3 * basis_.shapeCount());
     }
 
-private:
     PrincipalBasis& basis_;
     std::size_t filled_ = 0; ///< slots
 };

@@ -16,8 +16,9 @@ namespace {
 /// Who only wants to know whether the numbers can be read.
 class NoSink final : public neuralWarp::PrincipalShapesSink {
 public:
-    void begin(std::uint64_t, std::uint64_t) override {}
+    void begin(std::uint64_t, std::uint64_t, std::span<const float>) override {}
     void append(std::span<const float>) override {}
+    void append(std::span<const std::uint16_t>) override {}
 };
 
 } // namespace

@@ -40,13 +40,17 @@ constexpr std::string_view shapesText =
 
 class CheckingSink final : public PrincipalShapesSink {
 public:
-    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
-        require(shapeCount == 2 && vertCount == 1);
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float> scales) override {
+        require(shapeCount == 2 && vertCount == 1 && (scales.empty() || scales.size() == 2));
         count = 0;
     }
     void append(std::span<const float> values) override {
         count += values.size();
         require(std::all_of(values.begin(), values.end(), [](float value) { return std::isfinite(value); }));
+    }
+    void append(std::span<const std::uint16_t> halves) override {
+        count += halves.size();
+        require(std::all_of(halves.begin(), halves.end(), [](unsigned half) { return (half & 0x7C00U) != 0x7C00U; }));
     }
 
     std::size_t count = 0;

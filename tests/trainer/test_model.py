@@ -14,7 +14,7 @@ import onnx
 import xxhash
 
 import synthetic
-from trainer import export, memory, pipeline, shapes
+from trainer import export, halves, memory, pipeline, shapes
 from trainer.dataset import load_dataset
 from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory, NumpyModel
@@ -108,6 +108,24 @@ class ModelTest(unittest.TestCase):
         moved = controls + np.array([0, 0, 0, 100], np.float32)
         np.testing.assert_array_equal(model.deltas(controls), model.deltas(moved))
 
+    def test_shapes_of_half_precision_are_said_to_be_off(self) -> None:
+        data = synthetic.make(self.place / "data", frames=30)
+        whole = self.train(data, epochs=3, principalShapesEnabled=True)
+        with np.load(self.place / "model.nwrp/principal_shapes.npz") as archive:
+            floats = archive["shapes"]
+        half = self.train(data, epochs=3, principalShapesEnabled=True, principalShapesHalf=True)
+        with np.load(self.place / "model.nwrp/principal_shapes.npz") as archive:
+            off = archive["shapes"].astype(np.float32) * archive["scales"][:, None] - floats
+        self.assertIsNone(whole["halfPrecision"])
+        lost = half["halfPrecision"]["max"]["mm"]
+        self.assertTrue(any(f"{lost:.2g} mm at most" in line for line in self.said))
+        # coefficients have a root mean square of 1 over rows and shapes
+        bound = float(np.linalg.norm(off, axis=2).max()) * (30 * off.shape[1])**0.5 * off.shape[1]**0.5
+        self.assertGreater(lost, 0)
+        self.assertLess(lost, 1000 * bound * load_dataset(data).description["metersPerUnit"])
+        with self.assertRaisesRegex(TrainerError, "give --principal-shapes as well"):
+            self.train(data, principalShapesHalf=True)
+
     def test_small_and_empty_data(self) -> None:
         self.assertEqual(self.train(synthetic.make(self.place / "one", frames=1), epochs=3)["heldOut"], False)
         self.train(synthetic.make(self.place / "two", frames=2), epochs=3, principalShapesEnabled=True)
@@ -189,6 +207,23 @@ class ShapesTest(unittest.TestCase):
         np.testing.assert_array_equal(by_vertex.reshape(100, 3, 3).swapaxes(0, 1).reshape(3, 300), values)
         self.assertEqual(by_vertex.dtype, np.dtype("<f4"))
         self.assertEqual(digits.item(), xxhash.xxh3_128_hexdigest(text).encode())
+
+    def test_halves_are_the_numbers_of_the_text(self) -> None:
+        random = np.random.default_rng(3)
+        values = (random.standard_normal((6, 300)) * 10.0 ** np.array([[-38], [-3], [0], [4], [30], [0]])).astype("<f4")
+        values[5] = 0
+        values[1, :9] *= np.float32(1e-9)  # below the least half that there is: some are -0
+        made = halves.to_halves(values)
+        decoded = made.decoded()
+        np.testing.assert_array_less(np.abs(decoded - values).max(axis=1)[1:5], np.abs(values).max(axis=1)[1:5] / 2**11)
+        with tempfile.TemporaryDirectory() as place:
+            export.write_shapes(Path(place), decoded, made)
+            read = json.loads((Path(place) / "principal_shapes.json").read_text())["principalShapes"]
+            with np.load(Path(place) / "principal_shapes.npz") as archive:
+                stored = archive["shapes"].astype(np.float32) * archive["scales"][:, None]
+                self.assertEqual(archive["shapes"].dtype, np.dtype("<f2"))
+        by_shape = np.ascontiguousarray(stored.transpose(1, 0, 2)).reshape(6, 300)
+        np.testing.assert_array_equal(np.array(read, np.float32).view(np.uint32), by_shape.view(np.uint32))
 
 
 class AdviceTest(unittest.TestCase):

@@ -7,7 +7,7 @@ namespace quill {
 enum class InstructionSet {
     plain, ///< what every processor of the architecture has
     avx,
-    avx2,
+    avx2,   ///< AVX2 and F16C
     avx512, ///< AVX-512F and AVX-512VL
 };
 

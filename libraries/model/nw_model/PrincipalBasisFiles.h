@@ -15,9 +15,13 @@ public:
     virtual ~PrincipalShapesSink() = default;
     /// A basis of `shapeCount` shapes of `vertCount` vertices comes, neither of them 0 and as large as the file says
     /// that holds it. What came of another before is void. May throw.
-    virtual void begin(std::uint64_t shapeCount, std::uint64_t vertCount) = 0;
-    /// Its next vertices, [n][shapeCount][3], in model (object) space units: all of them finite. May throw.
+    ///   scales  [shapeCount] for halves: a number is scale * half, rounded to single precision, and finite; empty for
+    ///           floats
+    virtual void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float> scales) = 0;
+    /// Its next vertices, [n][shapeCount][3], in model (object) space units: all of them finite. May throw. The first
+    /// for floats, the second for halves (IEEE 754 binary16).
     virtual void append(std::span<const float> values) = 0;
+    virtual void append(std::span<const std::uint16_t> halves) = 0;
 };
 
 /// What came of a reading.
@@ -32,6 +36,8 @@ struct PrincipalShapesAnswer {
 /// sink takes. The archive is one of NumPy, stored, with
 ///   "json_xxh3_128"  '|S32' []                     XXH3-128 of all bytes of the JSON, as hexadecimal digits
 ///   "shapes"         '<f4' [vertices, shapes, 3]   the numbers that the JSON gives, to the bit
+/// or, of a model in half precision, with "shapes" as '<f2' of the same shape, and
+///   "scales"         '<f4' [shapes]                by which they are multiplied to give those numbers
 /// It counts while it is sound, finite, of the JSON that is there, and of the two counts that the JSON begins with;
 /// else the JSON is read as readPrincipalShapesFile() does, with its messages.
 ///

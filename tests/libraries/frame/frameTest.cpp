@@ -17,6 +17,7 @@
 #include <utility>
 
 #include <cmath>
+#include <cstring>
 
 namespace {
 
@@ -295,6 +296,45 @@ TEST(PrincipalBasis, KeepsTheShapesAndAddsThemInOrderWithEveryInstructionSet) {
     PrincipalBasis none;
     none.assign({1, 2, 3}, 0);
     EXPECT_EQ(none.blockCount() + none.slotMajor().size(), 0U);
+}
+
+TEST(PrincipalBasis, HalvesAreTheFloatsThatTheyStandFor) {
+    constexpr std::uint32_t finite = 0x7C00; // halves of one sign
+    constexpr std::size_t shapes = 31, slots = 2 * finite / (3 * shapes);
+    const auto number = [](std::uint32_t half) { // by the definition
+        const auto fraction = static_cast<double>(half & 0x3FFU);
+        const int exponent = static_cast<int>(half >> 10U & 31U);
+        const double magnitude = exponent == 0 ? std::ldexp(fraction, -24) : std::ldexp(1024 + fraction, exponent - 25);
+        return static_cast<float>((half & 0x8000U) != 0 ? -magnitude : magnitude);
+    };
+    std::vector<float> scales(shapes), coefficients(shapes), values;
+    for (std::size_t j = 0; j < shapes; ++j) {
+        scales[j] = j % 3 == 0 ? std::ldexp(1.0F, -static_cast<int>(j)) : 0.001F * static_cast<float>(j);
+        coefficients[j] = (j % 2 ? -1.0F : 1.0F) / static_cast<float>(3 + j);
+    }
+    std::vector<std::uint16_t> halves;
+    for (std::size_t i = 0; i < 3 * shapes * slots; ++i) { // nearly all that there are
+        const std::size_t half = i < finite ? i : 0x8000 + i - finite;
+        halves.push_back(static_cast<std::uint16_t>(half));
+        values.push_back(scales[i / 3 % shapes] * number(halves.back()));
+    }
+    PrincipalBasis floats, basis;
+    floats.assign(values, shapes);
+    basis.resizeHalves(slots, scales);
+    const std::size_t part = 3 * shapes * 21;
+    basis.set(0, std::span<const std::uint16_t>(halves).first(part));
+    basis.set(21, std::span<const std::uint16_t>(halves).subspan(part));
+    EXPECT_EQ(basis.slotMajor(), values);
+    EXPECT_LT(basis.bytes(), 6 * floats.bytes() / 10);
+    Points wanted(slots);
+    floats.sum(wanted.data(), coefficients.data(), 0, floats.blockCount());
+    for (const auto set :
+         {quill::InstructionSet::plain, quill::InstructionSet::avx, quill::processorInstructionSet()}) {
+        quill::limitInstructionSet(set);
+        Points sums(slots);
+        basis.sum(sums.data(), coefficients.data(), 0, basis.blockCount());
+        EXPECT_EQ(std::memcmp(sums.data(), wanted.data(), slots * sizeof(sums[0])), 0);
+    }
 }
 
 TEST(Blend, GoesByEnvelopeAndWeightTowardsTheModelAndTheTarget) {

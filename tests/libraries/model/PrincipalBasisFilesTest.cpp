@@ -19,20 +19,36 @@ using testing::HasSubstr;
 
 namespace {
 
+/// The number that a finite half is, by its definition.
+float numberOf(std::uint16_t half) {
+    const int exponent = half >> 10U & 31;
+    const double magnitude =
+        exponent == 0 ? std::ldexp(half & 0x3FF, -24) : std::ldexp(1024 + (half & 0x3FF), exponent - 25);
+    return static_cast<float>((half & 0x8000) != 0 ? -magnitude : magnitude);
+}
+
 /// Keeps what comes; `failures` beginnings fail.
 class Collector final : public PrincipalShapesSink {
 public:
-    void begin(std::uint64_t shapeCount, std::uint64_t vertCount) override {
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float> scalesOf) override {
         values.clear();
+        scales.assign(scalesOf.begin(), scalesOf.end());
         size = 3 * shapeCount * vertCount;
         if (failures-- > 0)
             throw std::bad_alloc();
     }
     void append(std::span<const float> more) override { values.insert(values.end(), more.begin(), more.end()); }
 
+    void append(std::span<const std::uint16_t> halves) override {
+        for (const std::uint16_t half : halves) {
+            const float scale = scales.at(values.size() / 3 % scales.size());
+            values.push_back(scale * numberOf(half));
+        }
+    }
+
     int failures = 0;
     std::size_t size = 0;
-    std::vector<float> values;
+    std::vector<float> values, scales;
 };
 
 struct Reading {
@@ -87,9 +103,6 @@ struct Model {
     }
     std::string digits() const { return storage::sumOfFile(folder / "principal_shapes.json", UINT64_MAX, 0).digits; }
     std::string archive() const { return shapesArchive(digits(), values, shapeCount); }
-    std::string numbers() const {
-        return {reinterpret_cast<const char*>(values.data()), values.size() * sizeof(float)};
-    }
     std::vector<std::uint32_t> bits() const {
         std::vector<std::uint32_t> bits;
         for (const float value : values)
@@ -101,6 +114,19 @@ struct Model {
     std::uint64_t shapeCount, vertCount;
     std::vector<float> values;
 };
+
+/// "principal_shapes.npz" of halves.
+std::string halvesArchive(const std::string& digits, const std::string& numbers, const std::string& scales,
+                          std::uint64_t shapes, std::uint64_t vertices) {
+    return npzBytes({{"json_xxh3_128", npyBytes("|S32", {}, digits)},
+                     {"shapes", npyBytes("<f2", {vertices, shapes, 3}, numbers)},
+                     {"scales", npyBytes("<f4", {scales.size() / sizeof(float)}, scales)}});
+}
+
+template <class Number>
+std::string bytesOf(const std::vector<Number>& numbers) {
+    return {reinterpret_cast<const char*>(numbers.data()), numbers.size() * sizeof(Number)};
+}
 
 } // namespace
 
@@ -125,6 +151,33 @@ TEST(PrincipalBasisFiles, BothWaysGiveTheSameBits) {
     }
 }
 
+TEST(PrincipalBasisFiles, HalvesAreTheNumbersOfTheText) {
+    Model model(7, 6500);
+    std::mt19937 random(3);
+    const std::vector<float> scales{1, 0.125F, 3e30F, 1e-30F, 0.3F, 65536, 7};
+    std::vector<std::uint16_t> halves;
+    for (std::size_t i = 0; i < model.values.size(); ++i) {
+        halves.push_back(static_cast<std::uint16_t>(random() % 0x7C00 + (i % 2 == 0 ? 0x8000 : 0)));
+        if (halves.back() == 0x8000)
+            halves.back() = 0; // "-0" is read as 0
+        model.values[i] = scales[i / 3 % 7] * numberOf(halves.back());
+    }
+    model.writeText();
+    const auto reading = [&](const std::vector<std::uint16_t>& numbers, const std::vector<float>& by) {
+        model.folder.write("principal_shapes.npz",
+                           halvesArchive(model.digits(), bytesOf(numbers), bytesOf(by), 7, 6500));
+        Reading answer = read(model.folder.path());
+        EXPECT_TRUE(answer.ok && answer.bits == model.bits());
+        return answer.answer;
+    };
+    EXPECT_TRUE(reading(halves, scales).isFromArchive);
+    EXPECT_THAT(reading(halves, {1, 2, 3}).whyNotArchive,
+                HasSubstr("scales are '<f4' [3], and not one for each shape"));
+    EXPECT_THAT(reading(halves, {1, 2, 3, 4, 5, 6, 1e35F}).whyNotArchive, HasSubstr("not finite, or too large"));
+    halves[3 * 7 * 6000 + 5] = 0xFC00;
+    EXPECT_THAT(reading(halves, scales).whyNotArchive, HasSubstr("not finite, of vertex 6000"));
+}
+
 TEST(PrincipalBasisFiles, NoDamageOfTheArchiveChangesABit) {
     const Model model(2, 1);
     const std::string sound = model.archive();
@@ -144,7 +197,7 @@ TEST(PrincipalBasisFiles, NoDamageOfTheArchiveChangesABit) {
 
 TEST(PrincipalBasisFiles, WhatIsWrongWithTheArchiveIsSaid) {
     const Model model(3, 4);
-    const std::string digits = model.digits(), numbers = model.numbers();
+    const std::string digits = model.digits(), numbers = bytesOf(model.values);
     const auto with = [&](const std::string& sum, const std::string& shapes) {
         return npzBytes({{"json_xxh3_128", sum}, {"shapes", shapes}});
     };
@@ -168,8 +221,10 @@ TEST(PrincipalBasisFiles, WhatIsWrongWithTheArchiveIsSaid) {
         {with(npyBytes("|S32", {2}, digits + digits), shapes({4, 3, 3})), "json_xxh3_128 is no text of 32 digits"},
         {with(text("0" + digits.substr(1)), shapes({4, 3, 3})), "made of another principal_shapes.json"},
         {with(text(digits), npyBytes(">f4", {4, 3, 3}, numbers)), "its shapes are '>f4' [4, 3, 3]"},
+        {with(text(digits), npyBytes("<f2", {4, 3, 3}, numbers)), "takes 72 bytes, and 144 follow"},
+        {with(text(digits), npyBytes("<f2", {4, 3, 3}, numbers.substr(72))), "it has no array 'scales'"},
         {with(text(digits), npyBytes("<f8", {4, 3, 3}, numbers + numbers)), "its shapes are '<f8'"},
-        {with(text(digits), shapes({12, 3})), "[12, 3], where '<f4' [vertices, shapes, 3]"},
+        {with(text(digits), shapes({12, 3})), "[12, 3], where '<f4' or '<f2' [vertices, shapes, 3]"},
         {with(text(digits), shapes({3, 3, 4})), "[3, 3, 4], where"},
         {with(text(digits), fortran), "Fortran order"},
         {with(text(digits), shapes({3, 4, 3})), "4 shapes of 3 vertices, and principal_shapes.json begins with 3 of 4"},

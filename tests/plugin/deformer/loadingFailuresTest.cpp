@@ -7,7 +7,11 @@
 #include "openquarn_app/Commands.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Usage.h"
+#include "storage/byteOrder.h"
+#include "storage/fileSum.h"
+#include "support/npzBytes.h"
 
+#include <bit>
 #include <functional>
 
 namespace {
@@ -233,6 +237,44 @@ TEST_F(LoadingFailures, OfTheNetworkAndItsShapes) {
         {"bad shapes", text(shapes, "[1"), loads({}), "Parse error\n"},
         {"loop instead of shapes", loopAt(shapes), networkFails({unanswered("model.nwrp/principal_shapes.json")}, "")},
     });
+}
+
+/// The text has other numbers than the archive that names it: which of them came shows in the result.
+TEST_F(LoadingFailures, ShapesComeFromTheirArchive) {
+    const ModelSpec direct = modelSpec();
+    writeModel(modelDirectory(), direct);
+    makeRig();
+    EXPECT_EQ(deform(), "");
+    const Coordinates wanted = result(*rig);
+    writeChanged([](ModelSpec& spec) { spec.bias = {1.0F}; });
+    std::string zeros = "0";
+    for (std::size_t i = 1; i < direct.bias.size(); ++i)
+        zeros += ",0";
+    writeFile(file("principal_shapes.json"),
+              R"({"principalShapeCount": 1, "principalVertCount": 9, "principalShapes": [[)" + zeros + "]]}");
+    const std::string digits = storage::sumOfFile(file("principal_shapes.json"), UINT64_MAX, 0).digits;
+    std::string halves;
+    for (unsigned number = 1; number <= direct.bias.size(); ++number) { // in eighths, as halves
+        const unsigned exponent = std::bit_width(number) - 1U;
+        storage::putLittle(halves,
+                           static_cast<std::uint16_t>((exponent + 15U) << 10U | (number << 10U >> exponent & 0x3FFU)));
+    }
+    std::string eighth;
+    storage::putLittle(eighth, 0.125F);
+    for (const std::string& archive :
+         {shapesArchive(digits, direct.bias, 1), npzBytes({{"json_xxh3_128", npyBytes("|S32", {}, digits)},
+                                                           {"shapes", npyBytes("<f2", {9, 1, 3}, halves)},
+                                                           {"scales", npyBytes("<f4", {1}, eighth)}})}) {
+        writeFile(file("principal_shapes.npz"), archive);
+        setModelName("model");
+        EXPECT_EQ(deform(), "");
+        EXPECT_EQ(result(*rig), wanted);
+        EXPECT_THAT(shown(), IsEmpty());
+    }
+    fs::remove(file("principal_shapes.npz"));
+    setModelName("model");
+    EXPECT_EQ(deform(), "");
+    EXPECT_EQ(result(*rig), rounded());
 }
 
 /// The directory becomes that of another model in the middle of a load, at a message of it: what comes out is the other
