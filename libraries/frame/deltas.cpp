@@ -19,8 +19,8 @@ void extractComputedDeltas(Points& deltas, const std::vector<float>& outputs, co
 void extractPrincipalDeltas(Points& deltas, const std::vector<float>& coefficients, const PrincipalBasis& basis,
                             const DrivenVertices& driven, const std::vector<std::uint32_t>& blocks,
                             Points& slotDeltas) {
-    // one shape of a block takes about as long as two vertices are copied
-    const std::size_t grain = quill::copyGrain / 2 / (basis.shapeCount() + 1);
+    // one shape of a block takes longer than a vertex is copied
+    const std::size_t grain = quill::copyGrain / (basis.shapeCount() + 1);
     if (!driven.slots) {
         // a model may have more slots than are driven, and no block writes beyond the basis
         deltas.resize(basis.slotCount());

@@ -76,7 +76,7 @@ void SurfaceTransport::run(std::vector<val3<float>>& out, const std::vector<val3
         return;
     const TransportTables tables{blocks_.data(), pairs_.data(), rest_.data(), inverses_.data(), listed_, isIdentity_};
     const TransportKernel kernel = transportKernel(instructionSet());
-    constexpr std::size_t grain = copyGrain / 8 / transportLanes; // a frame takes eight times as long
+    constexpr std::size_t grain = copyGrain / 4 / transportLanes; // a frame takes longer than a copy
     parallelForRange(
         blocks_.size(),
         [&](int begin, int end) {
