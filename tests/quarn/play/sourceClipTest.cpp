@@ -8,6 +8,7 @@
 #include "quarn/import/importCharacter.h"
 #include "quarn/play/ClipSource.h"
 #include "quarn/play/FrameFiles.h"
+#include "quarn/play/JointTracks.h"
 #include "quarn/play/beforeSkin.h"
 #include "quarn/play/fitInSkin.h"
 #include "support/TemporaryFolder.h"
@@ -171,7 +172,15 @@ TEST_F(SourceClipTest, IsTheMotionWhateverTheFileHas) {
                            ""},
                           {"positions in whole numbers", [](Strip& strip) { strip.more = quantize; }, ""},
                           {"targets, and two nodes that show them", [](Strip& strip) { strip.more = addMorph; },
-                           "the animation \"wave\" (animations[0]) keeps"}};
+                           "the animation \"wave\" (animations[0]) keeps"},
+                          {"a target of which more is asked than there is",
+                           [](Strip& strip) {
+                               strip.more = [](GltfWriter& file) {
+                                   addMorph(file);
+                                   file.animations.erase(file.animations.begin());
+                               };
+                           },
+                           "the animation \"face\" (animations[0])"}};
     const Motion motion = anyMotion();
     for (const Case& each : cases)
         for (const char* ending : {".gltf", ".glb"}) {
@@ -188,6 +197,20 @@ TEST_F(SourceClipTest, IsTheMotionWhateverTheFileHas) {
             EXPECT_LT(errorOfClip(motion), 6e-5);
             EXPECT_LE(shapes_->count, 4U);
         }
+}
+
+// "lower" gets where it has to be from where keys can bring "upper", which has shear in the scene
+TEST(JointTracks, AreBelowWhatTheFileHasAbove) {
+    const storage::JsonDocument file = parseGltf(Strip().write().text());
+    const GltfNodes nodes(file);
+    HMatrix sheared, moved;
+    sheared(1, 0) = 0.5;
+    for (unsigned axis = 0; axis < 3; ++axis)
+        moved(3, axis) = 2.0;
+    const JointTracks tracks(nodes, {0, 1}, {{sheared}, {moved}});
+    const std::vector<HMatrix> worlds = tracks.worlds(0);
+    EXPECT_FALSE(worlds[0].isEquivalent(sheared, 0.1));
+    EXPECT_TRUE(worlds[1].isEquivalent(moved, 1e-6));
 }
 
 TEST_F(SourceClipTest, ChangesNothingElse) {
