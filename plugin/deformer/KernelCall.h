@@ -35,6 +35,8 @@ public:
     cl_int enqueue(HOpenCLEvent& event) {
         return status_ == CL_SUCCESS ? kernel_.enqueueKernel(waitFor_, &event) : status_;
     }
+    /// The same without an event, for what comes next in the queue anyway.
+    cl_int enqueue() { return status_ == CL_SUCCESS ? kernel_.enqueueKernel(waitFor_, nullptr) : status_; }
 
 private:
     HOpenCLKernelInfo& kernel_;

@@ -149,7 +149,10 @@ Status neuralWarpGPUNode::deformPrepared(const HEvaluationNode& evaluationNode, 
         prepareAffectMapBuffer();
         prepareWeightsBuffer(evaluationNode);
         syncState_.capture(*this);
-        if (!uploadSetupBuffers() || (deltasActive_ && !uploadOutputs(data, outputs)) || !loadKernels())
+        if (deltasActive_)
+            takeSlots(data, outputs);
+        // what is small goes up last, and the kernels follow at once: the device is woken once
+        if (!uploadSetupBuffers() || !loadKernels() || (deltasActive_ && !uploadOutputs(outputs)))
             return kDeformerFailure;
     }
     {

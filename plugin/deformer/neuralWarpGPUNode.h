@@ -56,7 +56,8 @@ private:
     // On the device. A status is OpenCL's; each step waits for the event, and replaces it by its own.
     bool uploadSetupBuffers();
     void forgetSetupEvents();
-    bool uploadOutputs(const neuralWarpData& data, const std::vector<float>& outputs);
+    void takeSlots(const neuralWarpData& data, const std::vector<float>& outputs);
+    bool uploadOutputs(const std::vector<float>& outputs);
     bool loadKernels();
     bool areConnectionsUsable() const;
     bool areFramesUsable() const;

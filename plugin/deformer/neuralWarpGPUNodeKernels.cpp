@@ -89,10 +89,13 @@ void neuralWarpGPUNode::forgetSetupEvents() {
         buffer->setBufferReadyEvent({});
 }
 
-bool neuralWarpGPUNode::uploadOutputs(const neuralWarpData& data, const std::vector<float>& outputs) {
+void neuralWarpGPUNode::takeSlots(const neuralWarpData& data, const std::vector<float>& outputs) {
     principalActive_ = data.frameModel().shapes.isUsed();
     shapeCount_ = static_cast<std::uint32_t>(data.principalShapeCount);
     deltaVertexCount_ = static_cast<std::uint32_t>(principalActive_ ? data.principalVertCount : outputs.size() / 3);
+}
+
+bool neuralWarpGPUNode::uploadOutputs(const std::vector<float>& outputs) {
     return uploadFloats(outputs, principalActive_ ? coefficientsBuffer_ : deltasBuffer_) == CL_SUCCESS;
 }
 
@@ -187,8 +190,9 @@ cl_int neuralWarpGPUNode::enqueueSmoothing(HOpenCLEvent& event, const HOpenCLBuf
         status = enqueueCopy(event);
     HOpenCLBuffer* source = &affectPositionsA_;
     HOpenCLBuffer* destination = &affectPositionsB_;
+    // passes follow one another in the queue, which is in order: the first waits for all, the last has the event
     for (std::int32_t pass = 0; pass < smoothingIterations_ && status == CL_SUCCESS; ++pass) {
-        KernelCall call(smoothKernel_, event);
+        KernelCall call(smoothKernel_, pass == 0 ? event : HOpenCLEvent());
         call.buffer(*destination)
             .buffer(*source)
             .nullBuffer() // a mask
@@ -197,10 +201,12 @@ cl_int neuralWarpGPUNode::enqueueSmoothing(HOpenCLEvent& event, const HOpenCLBuf
             .buffer(connectionsBuffer_)
             .buffer(connectionWeightsBuffer_)
             .value<cl_uint>(affectCount());
-        status = call.enqueue(event);
-        destination->setBufferReadyEvent(event);
+        status = pass + 1 == smoothingIterations_ ? call.enqueue(event) : call.enqueue();
+        for (HOpenCLBuffer* buffer : {source, destination})
+            buffer->setBufferReadyEvent({});
         std::swap(source, destination);
     }
+    source->setBufferReadyEvent(event);
     current = source;
     return status;
 }

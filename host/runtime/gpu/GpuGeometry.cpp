@@ -10,7 +10,7 @@ namespace OpenQuarn {
 cl_int DevicePositions::bring(const Positions& positions) {
     if (version == positions.version())
         return CL_SUCCESS;
-    const cl_int status = uploadPositions(positions, buffer);
+    const cl_int status = stagePositions(positions, buffer);
     version = status == CL_SUCCESS ? positions.version() : 0;
     return status;
 }

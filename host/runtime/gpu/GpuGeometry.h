@@ -20,11 +20,11 @@ class Node;
 
 /// Positions of a mesh on the device.
 struct DevicePositions {
-    /// Uploads them unless they are there already. A failing status leaves nothing.
+    /// Stages them (transfer.h) unless they are there already. A failing status leaves nothing.
     cl_int bring(const Positions& positions);
 
     HOpenCLBuffer buffer;
-    std::uint64_t version = 0; ///< of what was uploaded; 0: nothing
+    std::uint64_t version = 0; ///< of what is in the buffer; 0: nothing
 };
 
 /// What its registration info says of a node.

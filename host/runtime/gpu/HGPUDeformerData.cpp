@@ -2,6 +2,7 @@
 #include "openquarn/gpu/HGPUDeformerData.h"
 
 #include "core/Operations.h"
+#include "gpu/transfer.h"
 
 #include <utility>
 
@@ -12,16 +13,26 @@ HGPUDeformerData::HGPUDeformerData() = default;
 HGPUDeformerData::~HGPUDeformerData() = default;
 
 HOpenCLBuffer HGPUDeformerData::getBuffer(const HPlug& plug, const HString& name, cl_int* status) const {
-    cl_int outcome = CL_SUCCESS;
+    cl_int outcome = CL_INVALID_OPERATION;
     HOpenCLBuffer buffer;
-    if (isRefused(Operation::HGPUDeformerData_getBuffer))
-        outcome = CL_INVALID_OPERATION;
-    for (const Entry& entry : entries_)
-        if (outcome == CL_SUCCESS && entry.plug == plug && entry.name == name)
-            buffer = entry.supplier ? entry.supplier(outcome) : entry.buffer;
+    if (!isRefused(Operation::HGPUDeformerData_getBuffer)) {
+        buffer = find(plug, name, outcome);
+        if (outcome == CL_SUCCESS)
+            outcome = OpenQuarn::writeStaged(buffer);
+        if (outcome != CL_SUCCESS)
+            buffer.reset();
+    }
     if (status)
         *status = outcome;
     return buffer;
+}
+
+HOpenCLBuffer HGPUDeformerData::find(const HPlug& plug, const HString& name, cl_int& status) const {
+    status = CL_SUCCESS;
+    for (const Entry& entry : entries_)
+        if (entry.plug == plug && entry.name == name)
+            return entry.supplier ? entry.supplier(status) : entry.buffer;
+    return {};
 }
 
 HGPUDeformerData::Entry& HGPUDeformerData::entryOf(const HPlug& plug, const HString& name) {

@@ -5,6 +5,7 @@
 #include "gpu/Device.h"
 #include "gpu/failure.h"
 
+#include <atomic>
 #include <exception>
 #include <mutex>
 #include <new>
@@ -16,7 +17,7 @@ using OpenQuarn::noteFailure;
 
 namespace {
 
-// for good: whoever cannot be waited for may still read it
+// for good: whoever cannot be waited for may still use it
 void abandon(std::unique_ptr<std::byte[]> copy) {
     static auto& abandoned = *new std::vector<std::unique_ptr<std::byte[]>>;
     static std::mutex mutex;
@@ -24,7 +25,15 @@ void abandon(std::unique_ptr<std::byte[]> copy) {
     abandoned.push_back(std::move(copy));
 }
 
+std::uint64_t nextNumber() {
+    static std::atomic<std::uint64_t> last{0};
+    return ++last;
+}
+
 } // namespace
+
+HOpenCLBuffer::Impl::Impl()
+    : number(nextNumber()) {}
 
 HOpenCLBuffer::Impl::~Impl() {
     if (waitForCopy() != CL_SUCCESS)
@@ -34,16 +43,17 @@ HOpenCLBuffer::Impl::~Impl() {
 }
 
 cl_int HOpenCLBuffer::Impl::waitForCopy() {
-    if (copyRead.isNull())
+    if (copyDone.isNull())
         return CL_SUCCESS;
-    cl_event event = copyRead.get();
+    cl_event event = copyDone.get();
     const cl_int status = noteFailure(clWaitForEvents(1, &event), "clWaitForEvents");
     if (status == CL_SUCCESS || status == CL_EXEC_STATUS_ERROR_FOR_EVENTS_IN_WAIT_LIST) // it is over, either way
-        copyRead.reset();
+        copyDone.reset();
     return status;
 }
 
 cl_int HOpenCLBuffer::Impl::takeCopy(std::size_t bytes) {
+    staged = 0; // what nobody has asked for
     const cl_int status = waitForCopy();
     if (status != CL_SUCCESS || bytes <= copyCapacity)
         return status;

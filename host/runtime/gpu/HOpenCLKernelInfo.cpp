@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "openquarn/gpu/HOpenCLKernelInfo.h"
 
+#include "core/Object.h"
+#include "gpu/Buffer.h"
 #include "gpu/Device.h"
 #include "gpu/activity.h"
 #include "gpu/failure.h"
@@ -8,11 +10,39 @@
 #include "openquarn/gpu/HOpenCLUtils.h"
 
 #include <algorithm>
+#include <cstdint>
+#include <cstring>
 #include <exception>
 #include <string>
 #include <utility>
+#include <vector>
 
 using OpenQuarn::noteFailure;
+
+namespace {
+
+/// What an argument was set to; nothing known of one with 0 bytes.
+struct Argument {
+    std::size_t bytes = 0;
+    bool isBuffer = false;
+    std::uint64_t value = 0; ///< a buffer's number, 0 for a null buffer
+    bool operator==(const Argument&) const = default;
+};
+
+/// A value as large as a handle may be one, of something that comes and goes.
+Argument argumentOf(std::size_t bytes, const void* value) {
+    if (!value || bytes >= sizeof(cl_mem))
+        return {};
+    Argument argument{.bytes = bytes};
+    std::memcpy(&argument.value, value, bytes);
+    return argument;
+}
+
+cl_int noKernel(cl_uint index) {
+    return noteFailure(CL_INVALID_KERNEL, "clSetKernelArg", "argument " + std::to_string(index));
+}
+
+} // namespace
 
 struct HOpenCLKernelInfo::Impl {
     Impl() = default;
@@ -28,7 +58,11 @@ struct HOpenCLKernelInfo::Impl {
     cl_kernel kernel = nullptr;
     std::size_t localSize = 1;
     std::size_t workItems = 0;
+    std::vector<Argument> arguments; ///< as they are set
+    bool isLent = false;             ///< others may have set them
 
+    /// `argument` what the value is, if that is known.
+    cl_int set(cl_uint index, std::size_t bytes, const void* value, const Argument& argument);
     bool create(const std::string& file);
     cl_int enqueue(const HOpenCLEventList& waitFor, HOpenCLEvent* done) const;
     cl_int enqueueRange(std::size_t begin, std::size_t count, std::size_t local, const HOpenCLEventList& waitFor,
@@ -48,6 +82,21 @@ bool HOpenCLKernelInfo::Impl::create(const std::string& file) {
                                       nullptr);
     localSize = std::clamp<std::size_t>(largest, 1, usualLocalSize);
     return noteFailure(status, "clGetKernelWorkGroupInfo", name) == CL_SUCCESS;
+}
+
+cl_int HOpenCLKernelInfo::Impl::set(cl_uint index, std::size_t bytes, const void* value, const Argument& argument) {
+    const bool isKept = index < arguments.size();
+    if (!isLent && argument.bytes > 0 && isKept && arguments[index] == argument)
+        return CL_SUCCESS;
+    if (isKept)
+        arguments[index] = {};
+    const cl_int status = clSetKernelArg(kernel, index, bytes, value);
+    if (status != CL_SUCCESS)
+        return noteFailure(status, "clSetKernelArg", "argument " + std::to_string(index));
+    if (!isKept)
+        arguments.resize(std::size_t{index} + 1);
+    arguments[index] = argument;
+    return CL_SUCCESS;
 }
 
 // A global size is a multiple of the local one: whole groups first, then what is left, one by one. The queue is in
@@ -108,7 +157,10 @@ bool HOpenCLKernelInfo::isLoaded() const noexcept {
     return impl_ != nullptr;
 }
 cl_kernel HOpenCLKernelInfo::kernel() const noexcept {
-    return impl_ ? impl_->kernel : nullptr;
+    if (!impl_)
+        return nullptr;
+    impl_->isLent = true;
+    return impl_->kernel;
 }
 std::size_t HOpenCLKernelInfo::workItems() const noexcept {
     return impl_ ? impl_->workItems : 0;
@@ -118,8 +170,17 @@ void HOpenCLKernelInfo::reset() noexcept {
 }
 
 void HOpenCLKernelInfo::setKernelArgBuffer(cl_uint index, const HOpenCLBuffer& buffer, cl_int& status, bool isValid) {
-    cl_mem memory = isValid ? buffer.get() : nullptr;
-    HOpenCLUtils::setKernelArg(*this, index, sizeof(cl_mem), &memory, status);
+    const HOpenCLBuffer::Impl* of = isValid ? OpenQuarn::Access::impl(buffer).get() : nullptr;
+    cl_mem memory = of ? of->memory : nullptr;
+    const Argument argument{.bytes = sizeof memory, .isBuffer = true, .value = of ? of->number : 0};
+    if (status == CL_SUCCESS)
+        status = impl_ ? impl_->set(index, sizeof memory, &memory, argument) : noKernel(index);
+}
+
+void HOpenCLUtils::setKernelArg(const HOpenCLKernelInfo& kernel, cl_uint index, std::size_t bytes, const void* value,
+                                cl_int& status) {
+    if (status == CL_SUCCESS)
+        status = kernel.impl_ ? kernel.impl_->set(index, bytes, value, argumentOf(bytes, value)) : noKernel(index);
 }
 
 cl_int HOpenCLKernelInfo::enqueueKernel(const HOpenCLEventList& waitFor, HOpenCLEvent* done) {

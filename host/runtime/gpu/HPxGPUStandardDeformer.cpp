@@ -29,6 +29,13 @@ struct HPxGPUStandardDeformer::Standard {
     unsigned vertexCount = 0;
     float envelope = 1.0F;
     cl_int status = CL_SUCCESS; ///< of the preparations of this evaluation
+
+    /// Uploads the input, if that has been left for later.
+    cl_int bringInput() {
+        if (status == CL_SUCCESS)
+            status = OpenQuarn::writeStaged(input);
+        return status;
+    }
 };
 
 HPxGPUStandardDeformer::HPxGPUStandardDeformer()
@@ -60,7 +67,9 @@ HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::prepareEvaluation(
     now.status = CL_SUCCESS;
     now.outputPlug = outputPlug;
     outputData.clear();
-    now.input = inputPlugs.empty() ? HOpenCLBuffer() : inputData.getBuffer(inputPlugs.front(), sPositionsName);
+    now.input = {};
+    if (!inputPlugs.empty())
+        now.input = inputData.find(inputPlugs.front(), sPositionsName, now.status);
     now.vertexCount = static_cast<unsigned>(now.input.bufferSize() / sizeof(T3dFltVector));
     if (now.input.isNull() || !impl_->affected || impl_->affected->fullCount != now.vertexCount) {
         OpenQuarn::noteFailure("the geometry has no positions on the device");
@@ -106,6 +115,8 @@ cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
     if (isRefused(Operation::HPxGPUStandardDeformer_initializeOutputPositions))
         return CL_INVALID_OPERATION;
     Standard& now = *standard_;
+    if (now.bringInput() == CL_SUCCESS && event.isNull())
+        event = now.input.bufferReadyEvent();
     if (now.status != CL_SUCCESS || isIdentityMap())
         return now.status;
     const std::shared_ptr<OpenQuarn::Device> device = OpenQuarn::currentDevice();
@@ -125,7 +136,7 @@ cl_int HPxGPUStandardDeformer::initializeOutputPositions(HOpenCLEvent& event) {
 
 HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::finishEvaluation(const HOpenCLEvent& event,
                                                                         HGPUDeformerData& outputData) {
-    if (isRefused(Operation::HPxGPUStandardDeformer_finishEvaluation))
+    if (isRefused(Operation::HPxGPUStandardDeformer_finishEvaluation) || standard_->status != CL_SUCCESS)
         return kDeformerFailure;
     standard_->output.setBufferReadyEvent(event);
     outputData.setBuffer(standard_->outputPlug, sPositionsName, standard_->output);
@@ -135,6 +146,7 @@ HPxGPUDeformer::DeformerStatus HPxGPUStandardDeformer::finishEvaluation(const HO
 const HOpenCLBuffer& HPxGPUStandardDeformer::inputPositions() const {
     if (isRefused(Operation::HPxGPUStandardDeformer_inputPositions))
         return noBuffer;
+    standard_->bringInput(); // finishEvaluation() answers for a failure
     return standard_->input;
 }
 

@@ -6,6 +6,7 @@
 #include "gpu/activity.h"
 #include "gpu/deformerImpl.h"
 #include "gpu/failure.h"
+#include "gpu/programs.h"
 #include "gpu/transfer.h"
 #include "graph/arrayLock.h"
 #include "graph/plugImpl.h"
@@ -169,6 +170,7 @@ private:
 
 std::shared_ptr<MeshData> runChain(Chain& chain, const std::shared_ptr<Device>& device) {
     try {
+        const OneLook look;
         return ChainRun(chain, device).run();
     } catch (const std::exception& error) { // no memory: the CPU's evaluation may do with less
         noteFailure(error.what());

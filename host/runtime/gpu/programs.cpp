@@ -34,6 +34,7 @@ struct Entry {
     std::shared_ptr<Device> device; // a device that comes later has another address
     std::shared_ptr<const Program> program;
     std::string failure;
+    std::uint64_t look = 0; ///< the last in which its files were looked at
 };
 
 struct Programs {
@@ -48,6 +49,9 @@ Programs& programs() {
 }
 
 std::atomic<bool> withoutDoubles = false;
+
+std::atomic<std::uint64_t> lastLook = 0;
+thread_local std::uint64_t thisLook = 0; ///< 0: each time is another look
 
 bool isCurrent(const Entry& entry) {
     return std::all_of(entry.stamps.begin(), entry.stamps.end(),
@@ -112,7 +116,7 @@ std::shared_ptr<Program> makeProgram(std::shared_ptr<Device> device, const std::
 // Neither a program nor a text: something failed that may not fail next time, and is noted.
 Entry compile(const Key& key, const std::shared_ptr<Device>& device) {
     KernelSource source = readKernelSource(key.file, key.folders);
-    Entry entry{std::move(source.stamps), device, nullptr, {}};
+    Entry entry{std::move(source.stamps), device, nullptr, {}, thisLook};
     const auto program = makeProgram(device, source.text);
     if (!program)
         return entry;
@@ -131,13 +135,23 @@ const Entry* findCurrent(const Key& key) {
     const auto found = programs().entries.find(key);
     if (found == programs().entries.end())
         return nullptr;
-    if (isCurrent(found->second))
-        return &found->second;
+    Entry& entry = found->second;
+    if ((thisLook != 0 && entry.look == thisLook) || isCurrent(entry)) {
+        entry.look = thisLook;
+        return &entry;
+    }
     programs().entries.erase(found);
     return nullptr;
 }
 
 } // namespace
+
+OneLook::OneLook() noexcept
+    : before_(std::exchange(thisLook, ++lastLook)) {}
+
+OneLook::~OneLook() {
+    thisLook = before_;
+}
 
 Program::~Program() {
     if (id)

@@ -5,6 +5,7 @@
 #include "openquarn/HStringArray.h"
 #include "openquarn/gpu/opencl.h"
 
+#include <cstdint>
 #include <memory>
 #include <string>
 
@@ -26,6 +27,18 @@ struct Program {
 /// reason noted, when it cannot be; a text that does not compile is compiled again only when it has changed.
 /// `includes` may be null.
 std::shared_ptr<const Program> loadProgram(const std::string& file, const HStringArray* includes);
+
+/// While one lives, its thread looks at the files of each program once.
+class OneLook {
+public:
+    OneLook() noexcept;
+    ~OneLook();
+    OneLook(const OneLook&) = delete;
+    OneLook& operator=(const OneLook&) = delete;
+
+private:
+    std::uint64_t before_;
+};
 
 /// Forgets all programs; who uses one keeps it.
 void forgetPrograms();

@@ -9,8 +9,10 @@
 #include "gpu/failure.h"
 #include "openquarn/gpu/HOpenCLUtils.h"
 
+#include <chrono>
 #include <cstring>
 #include <string>
+#include <thread>
 #include <utility>
 
 namespace OpenQuarn {
@@ -33,8 +35,8 @@ cl_int write(Buffer& buffer, cl_bool isBlocking, std::size_t bytes, const void* 
 
 // Writes the host's copy, which is its own.
 cl_int writeCopy(Buffer& buffer, std::size_t bytes, HOpenCLEvent& written) {
-    const cl_int status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), buffer.copyRead);
-    written = buffer.copyRead; // a copy that cannot be made is noted; the queue keeps the order without it
+    const cl_int status = write(buffer, CL_FALSE, bytes, buffer.copy.get(), buffer.copyDone);
+    written = buffer.copyDone; // a copy that cannot be made is noted; the queue keeps the order without it
     return status;
 }
 
@@ -114,14 +116,6 @@ void narrow(const Positions& positions, float* to) {
     });
 }
 
-cl_int writeNarrowedCopy(const Positions& positions, Buffer& buffer, std::size_t bytes, HOpenCLEvent& written) {
-    const cl_int status = buffer.takeCopy(bytes);
-    if (status != CL_SUCCESS)
-        return status;
-    narrow(positions, reinterpret_cast<float*>(buffer.copy.get()));
-    return writeCopy(buffer, bytes, written);
-}
-
 cl_int writeMapped(const Positions& positions, Buffer& buffer, std::size_t bytes, HOpenCLEvent& written) {
     Mapped mapped(buffer, CL_MAP_WRITE_INVALIDATE_REGION, bytes, nullptr);
     if (mapped.status() != CL_SUCCESS)
@@ -130,18 +124,27 @@ cl_int writeMapped(const Positions& positions, Buffer& buffer, std::size_t bytes
     return mapped.unmap(&written);
 }
 
-// To map means to wait for the device, which takes longer than to copy what is small (decision 0099).
-cl_int writePositions(const Positions& positions, Buffer& buffer) {
-    const TimedStep step(*buffer.device, "upload");
-    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
-    HOpenCLEvent written;
-    const cl_int status = bytes <= small ? writeNarrowedCopy(positions, buffer, bytes, written)
-                                         : writeMapped(positions, buffer, bytes, written);
-    if (status != CL_SUCCESS)
-        return status;
+void positionsWritten(Buffer& buffer, std::size_t bytes, HOpenCLEvent written) {
     countUpload("positions", bytes);
     timeCommand(*buffer.device, "upload", written.get());
     buffer.ready = std::move(written);
+}
+
+// To map means to wait for the device, which takes longer than to copy what is small (decision 0099).
+cl_int stage(const Positions& positions, Buffer& buffer) {
+    const TimedStep step(*buffer.device, "upload");
+    const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
+    HOpenCLEvent written;
+    const cl_int status = bytes <= small ? buffer.takeCopy(bytes) : writeMapped(positions, buffer, bytes, written);
+    if (status != CL_SUCCESS)
+        return status;
+    if (bytes > small) {
+        positionsWritten(buffer, bytes, std::move(written));
+        return CL_SUCCESS;
+    }
+    narrow(positions, reinterpret_cast<float*>(buffer.copy.get()));
+    buffer.staged = bytes;
+    buffer.ready = {};
     return CL_SUCCESS;
 }
 
@@ -161,16 +164,40 @@ void widen(const float* from, Positions& positions) {
     });
 }
 
+// Looks whether a command is over, for as long as it takes to put a thread to sleep and to wake it a few times (some
+// 30 us each on a virtual machine): a small frame is over by then. Others run meanwhile, the device's threads among
+// them. What fails here is told by whoever waits.
+void pollBriefly(const Device& device, const HOpenCLEvent& command) {
+    constexpr std::chrono::microseconds longest(100);
+    if (clFlush(device.queue) != CL_SUCCESS)
+        return;
+    cl_int state = CL_QUEUED;
+    for (const auto start = std::chrono::steady_clock::now(); std::chrono::steady_clock::now() - start < longest;) {
+        if (clGetEventInfo(command.get(), CL_EVENT_COMMAND_EXECUTION_STATUS, sizeof state, &state, nullptr) !=
+                CL_SUCCESS ||
+            state <= CL_COMPLETE)
+            return;
+        std::this_thread::yield();
+    }
+}
+
 cl_int readCopy(Buffer& buffer, std::size_t bytes, Positions& positions, HOpenCLEvent* read) {
     cl_int status = buffer.takeCopy(bytes);
     if (status != CL_SUCCESS)
         return status;
     const HOpenCLEventList waitFor = {buffer.ready};
-    status = clEnqueueReadBuffer(buffer.device->queue, buffer.memory, CL_TRUE, 0, bytes, buffer.copy.get(),
-                                 waitFor.length(), waitFor.data(), read ? read->receive() : nullptr);
+    status = noteFailure(clEnqueueReadBuffer(buffer.device->queue, buffer.memory, CL_FALSE, 0, bytes, buffer.copy.get(),
+                                             waitFor.length(), waitFor.data(), buffer.copyDone.receive()),
+                         "clEnqueueReadBuffer", "download");
+    if (status != CL_SUCCESS)
+        return status;
+    if (read)
+        *read = buffer.copyDone;
+    pollBriefly(*buffer.device, buffer.copyDone);
+    status = buffer.waitForCopy();
     if (status == CL_SUCCESS)
         widen(reinterpret_cast<const float*>(buffer.copy.get()), positions);
-    return noteFailure(status, "clEnqueueReadBuffer", "download");
+    return status;
 }
 
 cl_int readMapped(const Buffer& buffer, std::size_t bytes, Positions& positions, HOpenCLEvent* read) {
@@ -210,16 +237,29 @@ cl_int uploadNamed(std::string_view name, std::size_t bytes, const void* data, H
     return status;
 }
 
-cl_int uploadPositions(const Positions& positions, HOpenCLBuffer& buffer) {
+cl_int stagePositions(const Positions& positions, HOpenCLBuffer& buffer) {
     const std::size_t bytes = positions.vertexCount() * bytesPerVertex;
     cl_int status = buffer.ensureBufferSize(bytes);
     if (status == CL_SUCCESS && bytes > 0)
-        status = writePositions(positions, implOf(buffer));
+        status = stage(positions, implOf(buffer));
     else if (status == CL_SUCCESS)
         buffer.setBufferReadyEvent({});
     if (status != CL_SUCCESS)
         buffer.reset();
     return status;
+}
+
+cl_int writeStaged(const HOpenCLBuffer& buffer) {
+    if (buffer.isNull() || implOf(buffer).staged == 0)
+        return CL_SUCCESS;
+    Buffer& impl = implOf(buffer);
+    const TimedStep step(*impl.device, "upload");
+    HOpenCLEvent written;
+    const cl_int status = writeCopy(impl, impl.staged, written);
+    if (status != CL_SUCCESS)
+        return status;
+    positionsWritten(impl, std::exchange(impl.staged, 0), std::move(written));
+    return CL_SUCCESS;
 }
 
 cl_int downloadPositions(const HOpenCLBuffer& buffer, Positions& positions) {

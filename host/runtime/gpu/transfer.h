@@ -10,9 +10,13 @@
 
 namespace OpenQuarn {
 
-/// Makes the buffer hold the positions as packed floats, ready with its event. Answers with CL_SUCCESS, or with the
-/// status of what failed, which is noted; the buffer has no contents then.
-cl_int uploadPositions(const Positions& positions, HOpenCLBuffer& buffer);
+/// Makes room in the buffer for the positions as packed floats. What is large is uploaded, ready with its event; what
+/// is small waits, without an event, for writeStaged(), so that the device is not woken for it alone (decision 0188).
+/// Answers with CL_SUCCESS, or with the status of what failed, which is noted; the buffer has no contents then.
+cl_int stagePositions(const Positions& positions, HOpenCLBuffer& buffer);
+/// Uploads what waits, ready with the buffer's event; where nothing does, nothing happens. After a failure, which is
+/// noted, it still waits. Whoever hands a buffer to the device calls this first.
+cl_int writeStaged(const HOpenCLBuffer& buffer);
 
 /// Waits for the buffer's ready event, and reads as many positions as `positions` has.
 cl_int downloadPositions(const HOpenCLBuffer& buffer, Positions& positions);

@@ -1,12 +1,15 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "OnDevice.h"
 
+#include "gpu/programs.h"
+
 #include <gmock/gmock.h>
 
 #include <array>
 #include <functional>
 #include <numeric>
 #include <thread>
+#include <utility>
 
 using namespace OpenQuarn;
 using testing::AllOf;
@@ -103,6 +106,57 @@ TEST_F(GpuKernels, TakeNullBuffersAndKeepTheFirstFailure) {
     takeFailure();
 }
 
+TEST_F(GpuKernels, AreToldOfAnArgumentOnceUntilItIsAnother) {
+    const HString file = write("add.cl", "__kernel void add(__global int* to, __global int* a, uint b) {\n"
+                                         "    if (get_global_id(0) == 0) to[0] = (a ? a[0] : 100) + (int)b;\n}\n");
+    HOpenCLKernelInfo kernel;
+    ASSERT_TRUE(kernel.loadOrUpdate(file, "add", 1));
+    HOpenCLBuffer to, a, other;
+    ASSERT_TRUE(upload<int>({0}, to) == CL_SUCCESS && upload<int>({1}, a) == CL_SUCCESS &&
+                upload<int>({2}, other) == CL_SUCCESS);
+    const auto ofNewMemory = [&] { // which often lies where the old one did
+        a.reset();
+        ASSERT_EQ(upload<int>({3}, a), CL_SUCCESS);
+    };
+    const auto refuse = [&] {
+        cl_int status = CL_SUCCESS;
+        clshim::failCallOf("clSetKernelArg", 1, CL_OUT_OF_RESOURCES);
+        kernel.setKernelArgBuffer(1, other, status);
+        EXPECT_EQ(std::exchange(status, CL_SUCCESS), CL_OUT_OF_RESOURCES);
+        takeFailure();
+    };
+    const struct {
+        const char* what;
+        std::function<void()> before;
+        HOpenCLBuffer& a;
+        bool isValid;
+        cl_uint b;
+        int expected;
+        std::uint64_t told;
+    } rows[] = {{"all are new", [] {}, a, true, 10, 11, 3},
+                {"none is", [] {}, a, true, 10, 11, 0},
+                {"another value", [] {}, a, true, 20, 21, 1},
+                {"another buffer", [] {}, other, true, 20, 22, 1},
+                {"no buffer", [] {}, other, false, 20, 120, 1},
+                {"none again", [] {}, a, false, 20, 120, 0},
+                {"a buffer again", [] {}, a, true, 20, 21, 1},
+                {"of new memory", ofNewMemory, a, true, 20, 23, 1},
+                {"after one that failed", refuse, a, true, 20, 23, 1},
+                {"of a kernel that others have", [&] { kernel.kernel(); }, a, true, 20, 23, 3}};
+    for (const auto& row : rows) {
+        SCOPED_TRACE(row.what);
+        row.before();
+        const std::uint64_t before = clshim::calls("clSetKernelArg");
+        cl_int status = CL_SUCCESS;
+        kernel.setKernelArgBuffer(0, to, status);
+        kernel.setKernelArgBuffer(1, row.a, status, row.isValid);
+        HOpenCLUtils::setKernelArg(kernel, 2, sizeof row.b, &row.b, status);
+        EXPECT_EQ(clshim::calls("clSetKernelArg") - before, row.told);
+        ASSERT_TRUE(status == CL_SUCCESS && kernel.enqueueKernel({}, nullptr) == CL_SUCCESS);
+        EXPECT_EQ(contents<int>(to, 1).front(), row.expected);
+    }
+}
+
 TEST_F(GpuKernels, AreCompiledAgainOnlyWhenAFileChanges) {
     const auto builds = [] { return clshim::calls("clBuildProgram"); };
     const HStringArray folders = {folder("first"), folder("second \"of two\"")};
@@ -154,6 +208,16 @@ TEST_F(GpuKernels, ThatAreLoadedFollowTheirFileAndTheDevice) {
     writeAnswer("kept.cl", "", "22");
     EXPECT_TRUE(isAnother());
     EXPECT_FALSE(isAnother());
+    {
+        const OneLook look;
+        EXPECT_FALSE(isAnother());
+        writeAnswer("kept.cl", "", "333");
+        EXPECT_FALSE(isAnother()) << "it was looked at";
+        const OneLook another;
+        EXPECT_TRUE(isAnother());
+    }
+    writeAnswer("kept.cl", "", "4444");
+    EXPECT_TRUE(isAnother());
 }
 
 TEST_F(GpuKernels, IncludeAsACompilerDoes) {

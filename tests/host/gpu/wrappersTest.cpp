@@ -156,8 +156,17 @@ TEST_F(GpuPositions, GoUpAsFloatsAndComeDownAsDoubles) {
             sent->xyz()[i] = 0.1 * static_cast<double>(i) - 1e4;
             expected[i] = static_cast<float>(sent->xyz()[i]);
         }
-        ASSERT_EQ(uploadPositions(*sent, buffer), CL_SUCCESS);
+        Gpu::resetCounts();
+        ASSERT_EQ(stagePositions(*sent, buffer), CL_SUCCESS);
+        const bool isStaged = count == 1 || count == 5; // what is small
         EXPECT_EQ(buffer.bufferSize(), 12 * count);
+        EXPECT_EQ(buffer.bufferReadyEvent().isNull(), isStaged || count == 0);
+        EXPECT_EQ(Gpu::counts().uploads.count("positions"), count > 5 ? 1U : 0U);
+        for (const bool isFirst : {true, false}) {
+            const std::uint64_t writes = clshim::calls("clEnqueueWriteBuffer");
+            ASSERT_EQ(writeStaged(buffer), CL_SUCCESS);
+            EXPECT_EQ(clshim::calls("clEnqueueWriteBuffer") - writes, isStaged && isFirst ? 1U : 0U);
+        }
         EXPECT_EQ(buffer.bufferReadyEvent().isNull(), count == 0);
         ASSERT_EQ(downloadPositions(buffer, *received), CL_SUCCESS);
         EXPECT_EQ(std::vector<double>(received->xyz(), received->xyz() + 3 * count), expected);
@@ -181,7 +190,8 @@ TEST_F(GpuCounting, NamesWhatHappenedAndMeasuresWhenAsked) {
         ASSERT_EQ(uploadNamed("Connections", 4, "abcd", named, HOpenCLUtils::kKeepData), CL_SUCCESS);
         const auto points = newPositions(2);
         std::fill(points->xyz(), points->xyz() + 6, 1.0);
-        ASSERT_EQ(uploadPositions(*points, positions), CL_SUCCESS);
+        ASSERT_EQ(stagePositions(*points, positions), CL_SUCCESS);
+        ASSERT_EQ(writeStaged(positions), CL_SUCCESS);
         ASSERT_EQ(downloadPositions(positions, *points), CL_SUCCESS);
         HOpenCLKernelInfo kernel;
         for (const std::size_t items : {2U, 0U, 1U}) {

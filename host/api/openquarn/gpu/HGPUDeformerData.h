@@ -29,6 +29,7 @@ public:
     void clear() noexcept;
 
 private:
+    friend class HPxGPUStandardDeformer;
     struct Entry {
         HPlug plug;
         HString name;
@@ -36,5 +37,7 @@ private:
         Supplier supplier; ///< empty: `buffer` it is
     };
     Entry& entryOf(const HPlug& plug, const HString& name);
+    /// getBuffer() that leaves the upload for later.
+    HOpenCLBuffer find(const HPlug& plug, const HString& name, cl_int& status) const;
     std::vector<Entry> entries_;
 };

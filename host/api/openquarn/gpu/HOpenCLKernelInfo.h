@@ -31,7 +31,8 @@ public:
     bool loadOrUpdate(const HString& file, const HString& kernel, std::size_t workItems,
                       const HStringArray* includeDirectories = nullptr);
     bool isLoaded() const noexcept;
-    /// Null when there is none. Stays this object's.
+    /// Null when there is none. Stays this object's. Who asks may set arguments past it: from then on it sets each one
+    /// anew, where it otherwise leaves those that have their value.
     cl_kernel kernel() const noexcept;
     std::size_t workItems() const noexcept;
 
@@ -49,6 +50,7 @@ public:
     void reset() noexcept;
 
 private:
+    friend class HOpenCLUtils;
     struct Impl;
     std::unique_ptr<Impl> impl_; ///< null: no kernel
 };

@@ -26,12 +26,13 @@ public:
     void prepareAffectMapBuffer();
     /// The same for the weights. [eval]
     void prepareWeightsBuffer(const HEvaluationNode& evaluationNode);
-    /// Copies the input to the output where some vertices are not affected, after `event`, which it replaces. [eval]
+    /// Has the input uploaded, which may have been left until now, and copies it to the output where some vertices are
+    /// not affected, after `event`, which it replaces. [eval]
     cl_int initializeOutputPositions(HOpenCLEvent& event);
-    /// Hands the output positions on, ready after `event`. [eval]
+    /// Hands the output positions on, ready after `event`. kDeformerFailure where a step before has failed. [eval]
     DeformerStatus finishEvaluation(const HOpenCLEvent& event, HGPUDeformerData& outputData);
 
-    /// Positions of all vertices of the geometry: 3 floats each, packed. [eval]
+    /// Positions of all vertices of the geometry: 3 floats each, packed. They too are uploaded by now. [eval]
     const HOpenCLBuffer& inputPositions() const;
     HOpenCLBuffer& outputPositions();
     /// Number of vertices of the geometry. [eval]

@@ -263,6 +263,7 @@ TEST_F(Parity, OfEnvelopesAndSwitchesThatAreAnimated) {
             expectNear(scene, 0, gpu.points, cpu);
             const bool isFlat = key == "envelope" && i == 10;
             EXPECT_EQ(gpu.counts.launches.empty(), isFlat);
+            EXPECT_EQ(gpu.counts.uploads.count("positions"), isFlat ? 0U : 1U);
             EXPECT_EQ(largestDistance(cpu, scene.input()) <= 0.01 * diagonal(cpu), isFlat);
         }
     }
