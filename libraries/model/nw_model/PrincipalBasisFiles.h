@@ -32,7 +32,7 @@ struct PrincipalShapesAnswer {
 };
 
 /// Reads the basis of principal shapes of a model, "principal_shapes.json", or the same numbers from the archive
-/// "principal_shapes.npz" beside it, which takes a fifth of the time or less, and a block of memory beside what the
+/// "principal_shapes.npz" beside it, which takes a tenth of the time, and a block of memory beside what the
 /// sink takes. The archive is one of NumPy, stored, with
 ///   "json_xxh3_128"  '|S32' []                     XXH3-128 of all bytes of the JSON, as hexadecimal digits
 ///   "shapes"         '<f4' [vertices, shapes, 3]   the numbers that the JSON gives, to the bit
