@@ -30,7 +30,7 @@ PositionBuffer uninitialised(std::size_t vertexCount) {
 } // namespace
 
 void FreeMemory::operator()(double* memory) const noexcept {
-    std::free(memory); // NOLINT(cppcoreguidelines-no-malloc): it comes from posix_memalign
+    std::free(memory); // it comes from posix_memalign
 }
 
 Positions::Positions(std::size_t vertexCount, PositionBuffer buffer, std::weak_ptr<PositionPool> pool)
