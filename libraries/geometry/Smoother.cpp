@@ -23,73 +23,107 @@ constexpr std::size_t fewestForThreads = 1024;
 // A mesh whose neighbours are farther apart is put into another order.
 constexpr std::size_t farthestAsItIs = 2048;
 
+// What the first pass starts from and the last one leaves, both in the order of vertices; null: in the buffers.
+struct Ends {
+    const val3<float>* points = nullptr;
+    PaddedPoint* out = nullptr;
+};
+
 // Several passes over a mesh in blocks, which a pass may do as soon as the one before has done the block, and the ones
 // beside it (time skewing: Wonnacott, Using Time Skewing to Eliminate Idle Time due to Memory Bandwidth and Network
-// Limitations, 2000). Pass p = 1, 2, ... reads buffer (p - 1) % 2 and writes p % 2.
+// Limitations, 2000). Pass p = 1, 2, ... reads buffer (p - 1) % 2 and writes p % 2; pass 0 puts points into buffer 0.
 class PassesTogether {
 public:
+    // order: [vertexCount] the vertex at each place, or null
     PassesTogether(const std::vector<RowQuad>& quads, const std::vector<NeighbourQuad>& neighbours,
-                   std::size_t blockSize, std::array<PaddedPoint*, 2> buffers)
+                   std::size_t blockSize, std::size_t vertexCount, const std::uint32_t* order)
         : quads_(quads)
         , neighbours_(neighbours)
         , blockSize_(blockSize)
-        , buffers_(buffers) {}
+        , vertexCount_(vertexCount)
+        , order_(order) {}
 
-    std::size_t blockCount() const { return (quads_.size() + blockSize_ - 1) / blockSize_; }
-
-    // The result is in buffer passes % 2.
-    void run(std::size_t passes, std::size_t parts) const {
-        const std::size_t mostParts = std::max<std::size_t>(1, blockCount() / (2 * passes + 1));
+    // What `ends` does not take is in buffer passes % 2.
+    void run(std::size_t passes, std::size_t parts, std::array<PaddedPoint*, 2> buffers, const Ends& ends) {
+        last_ = passes;
+        buffers_ = buffers;
+        ends_ = ends;
+        const std::size_t mostParts = std::max<std::size_t>(1, blockCount() / (2 * passes + 3));
         if (mostParts < parts && quads_.size() > fewestForThreads)
-            runOneByOne(passes);
+            runOneByOne();
         else
-            runTogether(passes, std::min(parts, mostParts));
+            runTogether(std::min(parts, mostParts));
     }
 
 private:
+    std::size_t blockCount() const { return (quads_.size() + blockSize_ - 1) / blockSize_; }
+
     // For meshes whose neighbours are far apart in every order.
-    void runOneByOne(std::size_t passes) const {
-        for (std::size_t pass = 1; pass <= passes; ++pass)
+    void runOneByOne() const {
+        for (std::size_t pass = 0; pass <= last_; ++pass)
             parallelForRange(quads_.size(), [&](int begin, int end) {
-                kernel_(quads_.data(), neighbours_.data(), buffers_[(pass - 1) % 2], buffers_[pass % 2],
-                        static_cast<std::size_t>(begin), static_cast<std::size_t>(end));
+                runQuads(pass, static_cast<std::size_t>(begin), static_cast<std::size_t>(end));
             });
     }
 
     // Every part of the mesh goes as far as it can without what others do; then the seams between them are done.
-    void runTogether(std::size_t passes, std::size_t parts) const {
+    void runTogether(std::size_t parts) const {
         const std::size_t blocks = blockCount();
         const auto border = [&](std::size_t part) { return blocks * part / parts; };
         parallelFor(parts, [&](std::size_t part) {
             const std::size_t left = border(part), right = border(part + 1);
-            for (std::size_t step = left; step < right + passes; ++step)
-                for (std::size_t pass = 1; pass <= passes && step + 1 >= left + pass; ++pass) {
-                    const std::size_t block = step + 1 - pass;
-                    const std::size_t leftInset = part == 0 ? 0 : pass - 1,
-                                      rightInset = part + 1 == parts ? 0 : pass - 1;
+            for (std::size_t step = left; step < right + last_; ++step)
+                for (std::size_t pass = 0; pass <= last_ && step >= left + pass; ++pass) {
+                    const std::size_t block = step - pass;
+                    const std::size_t leftInset = part == 0 ? 0 : pass, rightInset = part + 1 == parts ? 0 : pass;
                     if (block >= left + leftInset && block + rightInset < right)
                         runBlock(pass, block);
                 }
         });
         parallelFor(parts - 1, [&](std::size_t seam) {
             const std::size_t at = border(seam + 1);
-            for (std::size_t pass = 2; pass <= passes; ++pass)
-                for (std::size_t block = at - (pass - 1); block < at + (pass - 1); ++block)
+            for (std::size_t pass = 1; pass <= last_; ++pass)
+                for (std::size_t block = at - pass; block < at + pass; ++block)
                     runBlock(pass, block);
         });
     }
 
     void runBlock(std::size_t pass, std::size_t block) const {
         const std::size_t begin = block * blockSize_;
-        kernel_(quads_.data(), neighbours_.data(), buffers_[(pass - 1) % 2], buffers_[pass % 2], begin,
-                std::min(begin + blockSize_, quads_.size()));
+        runQuads(pass, begin, std::min(begin + blockSize_, quads_.size()));
+    }
+
+    void runQuads(std::size_t pass, std::size_t begin, std::size_t end) const {
+        if (pass == 0)
+            takeIn(rowLanes * begin, std::min(rowLanes * end, vertexCount_));
+        else
+            kernel_(quads_.data(), neighbours_.data(), buffers_[(pass - 1) % 2], buffers_[pass % 2], begin, end);
+        if (pass == last_)
+            putOut(rowLanes * begin, std::min(rowLanes * end, vertexCount_));
+    }
+
+    // The places begin .. end - 1. Done block by block beside the passes, whose arithmetic hides how long points that
+    // lie all over the memory take.
+    void takeIn(std::size_t begin, std::size_t end) const {
+        for (std::size_t place = begin; ends_.points && place < end; ++place) {
+            const val3<float>& p = ends_.points[order_ ? order_[place] : place];
+            buffers_[0][place] = {p.x, p.y, p.z, 0.0F};
+        }
+    }
+    void putOut(std::size_t begin, std::size_t end) const {
+        for (std::size_t place = begin; ends_.out && place < end; ++place)
+            ends_.out[order_ ? order_[place] : place] = buffers_[last_ % 2][place];
     }
 
     const std::vector<RowQuad>& quads_;
     const std::vector<NeighbourQuad>& neighbours_;
     std::size_t blockSize_; // in quads
-    std::array<PaddedPoint*, 2> buffers_;
+    std::size_t vertexCount_;
+    const std::uint32_t* order_;
     RowsKernel kernel_ = rowsKernel(instructionSet());
+    std::size_t last_ = 0;
+    std::array<PaddedPoint*, 2> buffers_{};
+    Ends ends_;
 };
 
 } // namespace
@@ -159,34 +193,26 @@ void Smoother::run(const std::vector<val3<float>>& points, std::size_t passes, P
     if (points.size() != vertexCount_)
         return;
     const std::uint32_t* const order = order_.empty() ? nullptr : order_.data();
+    // points in an order of their own are put into `out` at last, others are there already
     PaddedPoints& first = order ? scratch.a : out;
     first.resize(rowLanes * quads_.size());
     scratch.b.resize(rowLanes * quads_.size());
-    parallelFor(
-        vertexCount_,
-        [&, to = first.data(), from = points.data()](std::size_t place) {
-            const val3<float>& p = from[order ? order[place] : place];
-            to[place] = {p.x, p.y, p.z, 0.0F};
-        },
-        copyGrain);
+    if (order)
+        out.resize(vertexCount_);
     const auto parts = static_cast<std::size_t>(std::max(1, tbb::this_task_arena::max_concurrency()));
-    for (std::size_t left = passes; left > 0;) {
+    PassesTogether together(quads_, neighbours_, blockSize_, vertexCount_, order);
+    std::size_t done = 0;
+    do {
         if (watch.isCancelled && watch.isCancelled())
             throw Cancelled();
-        const std::size_t now = std::min(left, passesTogether);
-        PassesTogether(quads_, neighbours_, blockSize_, {first.data(), scratch.b.data()}).run(now, parts);
+        const std::size_t now = std::min(passes - done, passesTogether);
+        together.run(now, parts, {first.data(), scratch.b.data()},
+                     {done == 0 ? points.data() : nullptr, order && done + now == passes ? out.data() : nullptr});
         if (now % 2 == 1)
             first.swap(scratch.b);
-        left -= now;
-    }
-    if (!order) {
-        out.resize(vertexCount_);
-        return;
-    }
+        done += now;
+    } while (done < passes);
     out.resize(vertexCount_);
-    parallelFor(
-        vertexCount_, [&, to = out.data(), from = first.data()](std::size_t place) { to[order[place]] = from[place]; },
-        copyGrain);
 }
 
 RowsKernel rowsKernel([[maybe_unused]] InstructionSet set) {

@@ -54,7 +54,7 @@ public:
 
 private:
     std::size_t vertexCount_ = 0;
-    std::size_t blockSize_ = 0;        // neighbours are in the same block of vertices or the next one on either side
+    std::size_t blockSize_ = 1;        // neighbours are in the same block of vertices or the next one on either side
     std::vector<std::uint32_t> order_; // [vertexCount] the vertex at each place; empty: each at its own
     std::vector<RowQuad> quads_;       // by place
     std::vector<NeighbourQuad> neighbours_;
