@@ -8,6 +8,8 @@
 #include "probes.h"
 #include "support/meshZoo.h"
 
+#include "quill/Smoother.h"
+#include "quill/SurfaceTransport.h"
 #include "quill/VertexConnections.h"
 #include "quill/VertexFrames.h"
 #include "quill/bulk.h"
@@ -38,6 +40,11 @@ struct Subject {
     quill::VertexFrames frames, rebuiltFrames;
     std::vector<float> weights, floats;
     std::vector<quill::mat4d> matrices;
+    std::vector<quill::mat4d> inverses; // of the frames at rest
+    quill::Smoother smoother;
+    quill::Smoother::Scratch smootherScratch;
+    quill::SurfaceTransport transport;
+    quill::PaddedPoints padded;
     quill::mat4d motion{{0.8, 0.6, 0, 0, -0.6, 0.8, 0, 0, 0, 0, 1, 0, 1e-3, 2e-3, 0, 1}};
 
     Subject(std::string nameIn, const ZooMesh& mesh)
@@ -53,6 +60,10 @@ struct Subject {
         frames.build(topology, map, &points);
         connections.calculateConnectionWeights(weights, points, 1.0, 0.0);
         floats.resize(16 * n);
+        smoother.build(connections, weights, n);
+        frames.calculateFrames(inverses, points, map, true, nullptr);
+        transport.build(frames, points, inverses, n, nullptr);
+        smoother.run(points, 0, padded, smootherScratch);
     }
 
     Phase phase(std::string phaseName, std::size_t bytes) const { return {std::move(phaseName), name, n, bytes}; }
@@ -83,6 +94,31 @@ Phase smoothing(Subject& s, EigenProduct& eigen) {
         for (std::size_t i = 0; i < passes; ++i)
             eigen.pass();
     };
+    return phase;
+}
+
+// As a frame has it: from points to smoothed points in rows, in ten passes.
+Phase smoothingFrame(Subject& s) {
+    constexpr std::size_t passes = 10;
+    Phase phase = s.phase("frame smoothing", 0);
+    phase.perCall = passes;
+    phase.ours = [&s] { s.smoother.run(s.points, passes, s.padded, s.smootherScratch); };
+    phase.plain = [&s] {
+        s.smoothed = s.points;
+        for (std::size_t i = 0; i < passes; ++i) {
+            s.scratch.swap(s.smoothed);
+            plain::smoothingPass(s.scratch, s.smoothed, s.connections.connectionsIndexer(), s.connections.connections(),
+                                 s.weights);
+        }
+    };
+    return phase;
+}
+
+// Frames and transport as a frame has them, beside one vertex after another.
+Phase transporting(Subject& s) {
+    Phase phase = s.phase("frame transport", 0);
+    phase.ours = [&s] { s.transport.run(s.smoothed, s.points, s.padded); };
+    phase.plain = [&s] { s.frames.transportDeltas(s.smoothed, s.points, s.points, s.inverses, s.points, nullptr); };
     return phase;
 }
 
@@ -165,9 +201,10 @@ void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::
              const bench::Options& options, bench::Report& report) {
     Subject s(name, mesh);
     EigenProduct eigen(s.connections, s.weights, s.points);
-    std::vector<Phase> phases{smoothing(s, eigen), framing(s, false)};
+    std::vector<Phase> phases{smoothing(s, eigen), smoothingFrame(s), framing(s, false)};
     if (allPhases) {
-        phases.insert(phases.end(), {weighing(s), framing(s, true), transforming(s), inverting(s), narrowing(s)});
+        phases.insert(phases.end(),
+                      {transporting(s), weighing(s), framing(s, true), transforming(s), inverting(s), narrowing(s)});
     }
     if (threads == 1)
         phases.insert(phases.end(), {buildingConnections(s), buildingFrames(s)});
@@ -223,7 +260,7 @@ int main(int argc, char** argv) {
     bool ok = runOnCores(1, *options);
     if (const std::size_t cores = std::thread::hardware_concurrency(); cores > 1)
         ok = runOnCores(cores, *options) && ok;
-    bench::Report::legend("a plain loop of the same shape, or a set per vertex");
+    bench::Report::legend("a plain loop of the same shape, a set per vertex, or one vertex after another");
     std::printf("CSV: %s\n", options->csvPath.c_str());
     return ok ? 0 : 1;
 }

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "probes.h"
 
+#include "quill/largePages.h"
 #include "quill/parallelFor.h"
 
 #include <algorithm>
@@ -83,6 +84,20 @@ void Triad::run() {
         const float *b = b_.data(), *c = c_.data();
         for (int i = begin; i < end; ++i)
             a[i] = b[i] + 0.5F * c[i];
+    });
+}
+
+ReadProbe::ReadProbe(std::size_t bytes) {
+    quill::resizeInLargePages(values_, bytes / sizeof(std::uint32_t));
+}
+
+void ReadProbe::run() {
+    quill::parallelForRange(values_.size(), [&](int begin, int end) {
+        const std::uint32_t* const values = values_.data();
+        std::uint32_t sum = 0;
+        for (int i = begin; i < end; ++i)
+            sum += values[i];
+        sum_ += sum;
     });
 }
 

@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #pragma once
 
+#include <atomic>
 #include <cstddef>
+#include <cstdint>
 #include <vector>
 
 // What the machine gives at the moment: a shared machine's cores and bandwidth come and go.
@@ -23,6 +25,17 @@ public:
 
 private:
     std::vector<float> a_, b_, c_;
+};
+
+// A sum over as many bytes, in large pages: the time that reading them takes at the least.
+class ReadProbe {
+public:
+    explicit ReadProbe(std::size_t bytes);
+    void run();
+
+private:
+    std::vector<std::uint32_t> values_;
+    std::atomic<std::uint32_t> sum_{0}; // so that no compiler leaves the reading out
 };
 
 } // namespace bench

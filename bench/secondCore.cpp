@@ -108,6 +108,7 @@ void measureSecondCore(const Options& options) {
     const TemporaryFolder folder;
     std::printf("a parallel loop on two threads, alone and after a network's run: medians in us\n"
                 "weights/MB entry    network     alone     after  /alone  cores\n");
+    std::fputs("phase,weights_mb,entry,network_us,alone_us,after_us,ratio,cores_at_work\n", options.csv.get());
     Loop loop;
     for (const std::size_t bytes : {2'000'000U, 14'000'000U, 20'000'000U, 60'000'000U}) {
         for (const bool hasEntry : {false, true}) {
