@@ -19,6 +19,7 @@
 #include <cmath>
 #include <cstdlib>
 #include <exception>
+#include <fstream>
 #include <sched.h>
 #include <sys/wait.h>
 #include <thread>
@@ -33,9 +34,9 @@ using bench::WarpFrame;
 using bench::WarpSetting;
 using neuralWarp::frameStepCount;
 
-template <class T>
-std::size_t bytesOf(const std::vector<T>& values) {
-    return values.capacity() * sizeof(T);
+template <class Array>
+std::size_t bytesOf(const Array& values) {
+    return values.capacity() * sizeof(values[0]);
 }
 
 double stateBytesPerVertex(const neuralWarp::neuralWarpData& data, std::size_t vertices) {
@@ -217,6 +218,48 @@ void benchFrames(const bench::Options& options, unsigned threads) {
     }
 }
 
+std::size_t residentBytes() {
+    std::size_t pages = 0, resident = 0;
+    std::ifstream("/proc/self/statm") >> pages >> resident;
+    return resident * static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
+}
+
+// One frame of each of many characters, and as many of the first, in turn.
+void benchMany(const bench::Options& options, unsigned threads, const WarpSetting& setting) {
+    constexpr std::size_t characters = 64;
+    useCores(threads);
+    const tbb::global_control limit(tbb::global_control::max_allowed_parallelism, threads);
+    OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {}); // the shapes come after the first frame
+    const std::size_t before = residentBytes();
+    const auto residentWith = [&] { return static_cast<double>(residentBytes() - before) / 1e6; };
+    double ofOne = 0.0;
+    {
+        WarpFrame one(setting);
+        ofOne = residentWith();
+    }
+    WarpFrame frame(setting, WarpFrame::Change::control, characters);
+    const double further = (residentWith() - ofOne) / static_cast<double>(characters - 1);
+    std::vector<double> many, same, ratios;
+    const auto frames = [&](std::size_t step) {
+        double seconds = 0.0;
+        for (std::size_t i = 0; i < characters; ++i)
+            seconds += frame.run(i * step);
+        return seconds / static_cast<double>(characters);
+    };
+    const auto start = std::chrono::steady_clock::now();
+    while (ratios.size() < 7 ||
+           std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count() < options.seconds) {
+        many.push_back(frames(1));
+        same.push_back(frames(0));
+        ratios.push_back(same.back() / many.back());
+    }
+    std::printf("%7zu %-7s %3u %8.0f %8.0f %6.2f %8.2f %8.2f\n", frame.vertices(), modelName(setting).c_str(), threads,
+                quantile(many, 0.5) * 1e6, quantile(same, 0.5) * 1e6, quantile(ratios, 0.5), ofOne, further);
+    std::fprintf(options.csv.get(), "many,%zu,%s,%u,%.1f,%.1f,%.3f,%.3f,%.3f\n", frame.vertices(),
+                 modelName(setting).c_str(), threads, quantile(many, 0.5) * 1e6, quantile(same, 0.5) * 1e6,
+                 quantile(ratios, 0.5), ofOne, further);
+}
+
 // In a process of its own, because the network's threads are counted once.
 void inChild(const bench::Options& options, unsigned threads, void (*run)(const bench::Options&, unsigned)) {
     std::fflush(nullptr);
@@ -303,6 +346,15 @@ int run(int argc, char** argv) {
         std::fputs("kind,vertices,mode,model,threads,state,us,plain_us,ratio,p99_over_median\n", options->csv.get());
         for (const unsigned threads : {1U, 2U})
             inChild(*options, threads, benchPlain);
+    }
+    if (options->wants("many")) {
+        std::printf(
+            "64 characters of one model, a frame of each, beside as many frames of one: us a frame; resident MB "
+            "of the first, and of each further one\n");
+        std::printf("%7s %-7s %3s %8s %8s %6s %8s %8s\n", "verts", "model", "thr", "each", "one", "ratio", "first",
+                    "further");
+        inChild(*options, 1, [](const auto& o, unsigned threads) { benchMany(o, threads, {50, true, 50, 10}); });
+        inChild(*options, 1, [](const auto& o, unsigned threads) { benchMany(o, threads, {100, true, 50, 10}); });
     }
     if (options->wants("finite")) {
         std::printf("whether a frame has only finite coordinates, looked at after each frame (at most 2 %%)\n");

@@ -51,7 +51,7 @@ std::string modelName(const WarpSetting& setting) {
     return setting.hasHidden ? name + " 2x512" : name;
 }
 
-WarpFrame::WarpFrame(const WarpSetting& setting, Change change)
+WarpFrame::WarpFrame(const WarpSetting& setting, Change change, std::size_t characters)
     : setting_(setting)
     , change_(change)
     , vertices_(setting.side * setting.side) {
@@ -61,23 +61,29 @@ WarpFrame::WarpFrame(const WarpSetting& setting, Change change)
     if (change == Change::input)
         inputs_ = {lifted(mesh), mesh};
     input_ = mesh;
-    rig_.emplace();
-    rig_->addGeometry(0, {.mesh = mesh});
-    rig_->setModelRoot(folder_.path());
-    rig_->setControls(std::vector<double>(controlCount, 0.25));
-    output_ = rig_->output(0);
-    control_ = rig_->plug("controlValues[0]");
-    OpenQuarn::evaluate(output_); // without shapes yet, when it needs some
-    addShapes();
-    run();
+    while (rigs_.size() < characters)
+        addCharacter();
 }
 
-void WarpFrame::change() {
+void WarpFrame::addCharacter() {
+    const std::size_t character = rigs_.size();
+    warpRig::Rig& rig = rigs_.emplace_back("warp" + std::to_string(character + 1));
+    rig.addGeometry(0, {.mesh = input_});
+    rig.setModelRoot(folder_.path());
+    rig.setControls(std::vector<double>(controlCount, 0.25));
+    outputs_.push_back(rig.output(0));
+    controls_.push_back(rig.plug("controlValues[0]"));
+    OpenQuarn::evaluate(outputs_.back()); // without shapes yet, when it needs some
+    addShapes(character);
+    run(character);
+}
+
+void WarpFrame::change(std::size_t character) {
     ++frame_;
     if (change_ == Change::control)
-        control_.setDouble(0.001 * static_cast<double>(frame_ % 1000));
+        controls_[character].setDouble(0.001 * static_cast<double>(frame_ % 1000));
     else
-        rig_->setInput(0, inputs_[frame_ % inputs_.size()]);
+        rigs_[character].setInput(0, inputs_[frame_ % inputs_.size()]);
 }
 
 std::vector<float> WarpFrame::controls() const {
@@ -86,19 +92,19 @@ std::vector<float> WarpFrame::controls() const {
     return values;
 }
 
-double WarpFrame::run() {
-    change();
+double WarpFrame::run(std::size_t character) {
+    change(character);
     const auto start = std::chrono::steady_clock::now();
-    const HStatus status = OpenQuarn::evaluate(output_);
+    const HStatus status = OpenQuarn::evaluate(outputs_[character]);
     const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
-    if (status.error() || !state().modelApplied)
+    if (status.error() || !state(character).modelApplied)
         throw std::runtime_error("a frame failed: " + status.errorString().asStdString());
     return seconds;
 }
 
 // past the file: as text, a large basis takes longer to read than all frames together
-void WarpFrame::addShapes() {
-    neuralWarp::neuralWarpData& data = state();
+void WarpFrame::addShapes(std::size_t character) {
+    neuralWarp::neuralWarpData& data = state(character);
     data.principalShapeCount = setting_.shapes;
     data.principalVertCount = setting_.shapes == 0 ? 0 : vertices_;
     std::vector<float> values(3 * setting_.shapes * vertices_);

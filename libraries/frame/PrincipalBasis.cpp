@@ -8,6 +8,7 @@
 
 #include <algorithm>
 #include <array>
+#include <utility>
 
 namespace neuralWarp {
 
@@ -62,6 +63,17 @@ void PrincipalBasis::assign(const std::vector<float>& values, std::uint64_t shap
         const std::size_t count = std::min(lanes, slotCount_ - first);
         set(first, std::span(values).subspan(3 * shapes * first, 3 * shapes * count));
     });
+    share();
+}
+
+void PrincipalBasis::share() {
+    if (values_.empty() && halves_.empty())
+        return;
+    quill::SharedArray<float> floats(std::move(values_));
+    sharedHalves_ = std::move(halves_);
+    sharedValues_ = std::move(floats);
+    values_ = {};
+    halves_ = {};
 }
 
 std::vector<float> PrincipalBasis::slotMajor() const {
@@ -71,7 +83,7 @@ std::vector<float> PrincipalBasis::slotMajor() const {
         for (std::size_t i = 0; i < 3 * shapeCount_; ++i) {
             const std::size_t place = first + i * lanes;
             values[3 * shapeCount_ * slot + i] =
-                hasHalves() ? scales_[i / 3] * decodeHalf(halves_[place]) : values_[place];
+                hasHalves() ? scales_[i / 3] * decodeHalf(halfBlocks()[place]) : floatBlocks()[place];
         }
     });
     return values;
@@ -80,10 +92,10 @@ std::vector<float> PrincipalBasis::slotMajor() const {
 void PrincipalBasis::sumBlock(float* components, const float* coefficients, std::size_t block) const {
     const std::size_t first = block * shapeCount_ * 3 * lanes;
     if (hasHalves())
-        sumHalfShapes(quill::instructionSet())(components, halves_.data() + first, scales_.data(), coefficients,
+        sumHalfShapes(quill::instructionSet())(components, halfBlocks() + first, scales_.data(), coefficients,
                                                shapeCount_);
     else
-        sumShapes(quill::instructionSet())(components, values_.data() + first, coefficients, shapeCount_);
+        sumShapes(quill::instructionSet())(components, floatBlocks() + first, coefficients, shapeCount_);
 }
 
 void PrincipalBasis::sum(quill::val3<float>* sums, const float* coefficients, std::size_t begin,

@@ -176,11 +176,13 @@ void Smoother::build(const VertexConnections& connections, const std::vector<flo
             }
         }
     }
+    SharedArray<std::uint32_t> sharedOrder(std::move(order));
+    SharedArray<RowQuad> sharedQuads(std::move(quads));
+    neighbours_ = std::move(neighbours);
+    order_ = std::move(sharedOrder);
+    quads_ = std::move(sharedQuads);
     vertexCount_ = vertexCount;
     blockSize_ = std::max(smallestBlock, (reach + rowLanes - 1) / rowLanes);
-    order_ = std::move(order);
-    quads_ = std::move(quads);
-    neighbours_ = std::move(neighbours);
 }
 
 std::size_t Smoother::bytes() const {

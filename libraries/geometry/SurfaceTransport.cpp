@@ -7,6 +7,7 @@
 
 #include <algorithm>
 #include <stdexcept>
+#include <utility>
 
 namespace quill {
 
@@ -41,25 +42,34 @@ void SurfaceTransport::build(const VertexFrames& frames, const std::vector<val3<
         block.most = *std::max_element(block.pairCount.begin(), block.pairCount.end());
         pairs += 2 * transportLanes * static_cast<std::size_t>(block.most);
     }
-    resizeInLargePages(pairs_, pairs);
-    resizeInLargePages(rest_, 3 * transportLanes * blocks.size());
-    resizeInLargePages(inverses_, 12 * transportLanes * blocks.size());
+    std::vector<std::uint32_t> pairTable;
+    std::vector<float> rest;
+    std::vector<double> inverses;
+    resizeInLargePages(pairTable, pairs);
+    resizeInLargePages(rest, 3 * transportLanes * blocks.size());
+    resizeInLargePages(inverses, 12 * transportLanes * blocks.size());
     for (std::size_t b = 0; b < blocks.size(); ++b) {
         const TransportBlock& block = blocks[b];
         for (std::size_t j = 0; j < transportLanes; ++j) {
             const std::uint32_t v = block.vertex[j];
             for (std::size_t k = 0; k < block.most; ++k)
                 for (std::size_t side = 0; side < 2; ++side)
-                    pairs_[block.firstPair + (2 * k + side) * transportLanes + j] =
+                    pairTable[block.firstPair + (2 * k + side) * transportLanes + j] =
                         k < block.pairCount[j] ? frames.framesPairs()[indexer[v] + 2 * k + side] : v;
             for (std::size_t c = 0; c < 3; ++c) {
-                rest_[(3 * b + c) * transportLanes + j] = restPoints[v][c];
+                rest[(3 * b + c) * transportLanes + j] = restPoints[v][c];
                 for (std::size_t r = 0; r < 4; ++r)
-                    inverses_[(12 * b + 4 * c + r) * transportLanes + j] = restFramesInverse[v](r, c);
+                    inverses[(12 * b + 4 * c + r) * transportLanes + j] = restFramesInverse[v](r, c);
             }
         }
     }
-    blocks_ = std::move(blocks);
+    SharedArray<TransportBlock> sharedBlocks(std::move(blocks));
+    SharedArray<std::uint32_t> sharedPairs(std::move(pairTable));
+    SharedArray<float> sharedRest(std::move(rest));
+    inverses_ = std::move(inverses);
+    blocks_ = std::move(sharedBlocks);
+    pairs_ = std::move(sharedPairs);
+    rest_ = std::move(sharedRest);
     vertexCount_ = vertexCount;
     listed_ = listed;
     isIdentity_ = !subset;

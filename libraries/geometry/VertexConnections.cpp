@@ -78,8 +78,9 @@ void VertexConnections::build(const MeshTopology& topology, const IndexMapper& m
     NeighbourLists lists = edgeNeighbours(topology, map);
     if (extraRings > 0)
         lists = RingExpander(lists, extraRings, includeSelf).expand();
-    connections_ = std::move(lists.neighbours);
+    SharedArray<std::uint32_t> connections(std::move(lists.neighbours));
     connectionsIndexer_ = std::move(lists.indexer);
+    connections_ = std::move(connections);
 }
 
 void VertexConnections::calculateConnectionWeights(std::vector<float>& weights,

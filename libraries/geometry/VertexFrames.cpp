@@ -161,8 +161,9 @@ void VertexFrames::build(const MeshTopology& topology, const IndexMapper& map,
     for (std::size_t v = 0; v < n; ++v)
         putTangentReferenceFirst({pairs.data() + cursor[v], pairs.data() + cursor[v + 1]}, edges.of(v));
 
-    framesPairs_ = std::move(pairs);
+    SharedArray<std::uint32_t> sharedPairs(std::move(pairs));
     framesIndexer_ = std::move(cursor);
+    framesPairs_ = std::move(sharedPairs);
 }
 
 void VertexFrames::calculateFrames(std::vector<mat4d>& frames, const std::vector<val3<float>>& positions,

@@ -51,7 +51,7 @@ constexpr std::array buffers = {
     Buffer{"Connections", [](const Data& d) { return publishedNumbers(d.vertexConnections.connections()); }},
     Buffer{"ConnectionsIndexer",
            [](const Data& d) { return publishedNumbers(d.vertexConnections.connectionsIndexer()); }},
-    Buffer{"ConnectionWeights", [](const Data& d) { return publishedNumbers(d.connectionWeights); }},
+    Buffer{"ConnectionWeights", [](const Data& d) { return publishedNumbers(d.connectionWeights.get()); }},
     Buffer{"AffectToDeltaMap", [](const Data& d) { return publishedNumbers(d.affectMap); }},
     Buffer{"OriginalVerts", [](const Data& d) { return publishedPoints(d.restPoints); }},
     Buffer{"SmoothOriginalFramesInverse", [](const Data& d) { return publishedMatrices(d.restFramesInverse); }},

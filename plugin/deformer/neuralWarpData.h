@@ -95,15 +95,15 @@ public:
 
     quill::VertexFrames vertexFrames;
     quill::VertexConnections vertexConnections;
-    std::vector<float> connectionWeights; ///< parallel to vertexConnections.connections()
-    quill::IndexMapper componentMap;      ///< the deformed vertices, in the host's order
+    quill::SharedArray<float> connectionWeights; ///< parallel to vertexConnections.connections()
+    quill::IndexMapper componentMap;             ///< the deformed vertices, in the host's order
     /// For each deformed vertex the model slot that drives it, or missingIndex. Empty unless useAffectMap.
     std::vector<std::uint32_t> affectMap;
     std::vector<std::uint32_t>
         affectedVertices; ///< the deformed vertices that a slot drives, ascending; empty as above
-    Points restPoints;    ///< unsmoothed, object space
-    std::vector<quill::mat4d> restFramesInverse; ///< inverted frames of the smoothed rest surface
-    PrincipalBasis principalShapes;              ///< principalVertCount slots of principalShapeCount shapes
+    quill::SharedArray<quill::val3<float>> restPoints;  ///< unsmoothed, object space
+    quill::SharedArray<quill::mat4d> restFramesInverse; ///< inverted frames of the smoothed rest surface
+    PrincipalBasis principalShapes;                     ///< principalVertCount slots of principalShapeCount shapes
     std::uint64_t principalShapeCount = 0;
     std::uint64_t principalVertCount = 0;
     std::filesystem::path modelRootPath;

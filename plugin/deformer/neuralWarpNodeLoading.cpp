@@ -159,6 +159,7 @@ HStatus loadPrincipalShapes(neuralWarpData& data) {
     if (readPrincipalBasis(data.modelDirectory, sink, answer)) {
         data.principalShapeCount = answer.shapeCount;
         data.principalVertCount = answer.vertCount;
+        data.principalShapes.share();
     } else {
         data.principalShapes.clear();
     }

@@ -23,7 +23,9 @@ HStatus invalidRest() {
 
 void rebuildConnections(neuralWarpData& data, const quill::MeshTopology& topology) {
     data.vertexConnections.build(topology, data.componentMap, 0, false);
-    data.vertexConnections.calculateConnectionWeights(data.connectionWeights, data.restPoints, 1.0, 0.0);
+    std::vector<float> weights;
+    data.vertexConnections.calculateConnectionWeights(weights, data.restPoints, 1.0, 0.0);
+    data.connectionWeights = std::move(weights);
     data.connectionsDirty = false;
     data.restFramesDirty = true;
     data.bump(neuralWarpData::connectionsCache);
@@ -69,7 +71,10 @@ HStatus rebuildCaches(const neuralWarpNode& node, neuralWarpData& data, HDataBlo
     const HFnMesh mesh(rest.asMesh(), &status);
     data.workspace.invalidate();
     // a rest geometry with fewer vertices than the deformed one has no rest position for each of them
-    if (status.error() || !readGeometryPoints(rest, data.restPoints, data.componentMap))
+    Points points;
+    const bool isWhole = !status.error() && readGeometryPoints(rest, points, data.componentMap);
+    data.restPoints = std::move(points);
+    if (!isWhole)
         return invalidRest();
     quill::MeshTopology topology;
     if (status = readMeshTopology(mesh, topology); status.error())

@@ -74,7 +74,7 @@ HStatus findRestSurface(const neuralWarpNode& node, const neuralWarpData& data, 
     const std::size_t count = data.componentMap.affectCount();
     if (data.activeSettings.isSurface() && !data.framesTopologyDirty && data.restPoints.size() == count) {
         surface.frames = &data.vertexFrames;
-        surface.restPoints = &data.restPoints;
+        surface.restPoints = &data.restPoints.get();
         return HStatus::kSuccess;
     }
     HStatus status;

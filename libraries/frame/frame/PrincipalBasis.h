@@ -3,6 +3,7 @@
 #pragma once
 
 #include "frame/Points.h"
+#include "quill/SharedArray.h"
 
 #include <cstddef>
 #include <cstdint>
@@ -33,15 +34,22 @@ public:
     /// resize(), finite halves (IEEE 754 binary16) behind resizeHalves().
     void set(std::size_t first, std::span<const float> values);
     void set(std::size_t first, std::span<const std::uint16_t> halves);
+    /// All slots are set: from now on it is held once with all bases of the same values. Throws std::bad_alloc.
+    void share();
+    /// Whether it is held once with another. [any]
+    bool isSharedWith(const PrincipalBasis& other) const {
+        return shapeCount_ != 0 && floatBlocks() == other.floatBlocks() && halfBlocks() == other.halfBlocks();
+    }
     void clear() { *this = {}; }
 
     std::size_t shapeCount() const { return shapeCount_; }
     std::size_t slotCount() const { return slotCount_; }
     std::size_t blockCount() const { return (slotCount_ + lanes - 1) / lanes; }
-    bool hasHalves() const { return !halves_.empty(); }
+    bool hasHalves() const { return !halves_.empty() || !sharedHalves_.empty(); }
     /// Size in bytes.
     std::size_t bytes() const {
-        return (values_.capacity() + scales_.capacity()) * sizeof(float) + halves_.capacity() * sizeof(std::uint16_t);
+        return (values_.capacity() + sharedValues_.capacity() + scales_.capacity()) * sizeof(float) +
+               (halves_.capacity() + sharedHalves_.capacity()) * sizeof(std::uint16_t);
     }
     /// [slotCount()][shapeCount()][3] again, as floats.
     std::vector<float> slotMajor() const;
@@ -60,10 +68,15 @@ private:
     void put(std::vector<Number>& numbers, std::size_t first, std::span<const Number> values);
     void sumBlock(float* components, const float* coefficients, std::size_t block) const;
 
+    const float* floatBlocks() const { return sharedValues_.empty() ? values_.data() : sharedValues_.data(); }
+    const std::uint16_t* halfBlocks() const { return sharedHalves_.empty() ? halves_.data() : sharedHalves_.data(); }
+
     std::size_t shapeCount_ = 0, slotCount_ = 0;
-    // [blocks][shapes][3][lanes], zero beyond the last slot: one of the two
+    // [blocks][shapes][3][lanes], zero beyond the last slot: one of the two, while it is filled, and from then on
     std::vector<float> values_;
     std::vector<std::uint16_t> halves_;
+    quill::SharedArray<float> sharedValues_;
+    quill::SharedArray<std::uint16_t> sharedHalves_;
     std::vector<float> scales_; // [shapes], of halves
 };
 

@@ -2,6 +2,7 @@
 #pragma once
 
 #include "quill/PaddedPoints.h"
+#include "quill/SharedArray.h"
 #include "quill/VertexConnections.h"
 #include "quill/WorkWatch.h"
 #include "quill/val3.h"
@@ -55,9 +56,9 @@ public:
 private:
     std::size_t vertexCount_ = 0;
     std::size_t blockSize_ = 1;        // neighbours are in the same block of vertices or the next one on either side
-    std::vector<std::uint32_t> order_; // [vertexCount] the vertex at each place; empty: each at its own
-    std::vector<RowQuad> quads_;       // by place
-    std::vector<NeighbourQuad> neighbours_;
+    SharedArray<std::uint32_t> order_; // [vertexCount] the vertex at each place; empty: each at its own
+    SharedArray<RowQuad> quads_;       // by place
+    SharedArray<NeighbourQuad> neighbours_;
 };
 
 } // namespace quill

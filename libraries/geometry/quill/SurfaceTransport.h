@@ -2,6 +2,7 @@
 #pragma once
 
 #include "quill/PaddedPoints.h"
+#include "quill/SharedArray.h"
 #include "quill/VertexFrames.h"
 #include "quill/mat4d.h"
 #include "quill/val3.h"
@@ -54,10 +55,10 @@ public:
 private:
     std::size_t vertexCount_ = 0, listed_ = 0;
     bool isIdentity_ = true;
-    std::vector<TransportBlock> blocks_;
-    std::vector<std::uint32_t> pairs_;
-    std::vector<float> rest_;
-    std::vector<double> inverses_;
+    SharedArray<TransportBlock> blocks_;
+    SharedArray<std::uint32_t> pairs_;
+    SharedArray<float> rest_;
+    SharedArray<double> inverses_;
 };
 
 } // namespace quill

@@ -3,6 +3,7 @@
 
 #include "quill/IndexMapper.h"
 #include "quill/MeshTopology.h"
+#include "quill/SharedArray.h"
 #include "quill/val3.h"
 
 #include <cstddef>
@@ -60,8 +61,8 @@ public:
                    bool includeSelf) const;
 
 private:
-    std::vector<std::uint32_t> connections_;
-    std::vector<std::uint32_t> connectionsIndexer_;
+    SharedArray<std::uint32_t> connections_;
+    SharedArray<std::uint32_t> connectionsIndexer_;
 };
 
 } // namespace quill

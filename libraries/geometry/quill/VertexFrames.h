@@ -3,6 +3,7 @@
 
 #include "quill/IndexMapper.h"
 #include "quill/MeshTopology.h"
+#include "quill/SharedArray.h"
 #include "quill/WorkWatch.h"
 #include "quill/mat4d.h"
 #include "quill/val3.h"
@@ -96,8 +97,8 @@ public:
                                 std::vector<val3<float>>& out) const;
 
 private:
-    std::vector<std::uint32_t> framesPairs_;
-    std::vector<std::uint32_t> framesIndexer_;
+    SharedArray<std::uint32_t> framesPairs_;
+    SharedArray<std::uint32_t> framesIndexer_;
 };
 
 } // namespace quill

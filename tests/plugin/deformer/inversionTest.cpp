@@ -72,8 +72,8 @@ protected:
         return std::make_tuple(d.framesTopologyDirty, d.indexMapDirty, d.connectionsDirty, d.restFramesDirty,
                                d.modelApplied, d.exportMode, d.modelLoadPending, d.metadataDirty, d.modelPathDirty,
                                d.cacheVersions, d.vertexFrames.framesPairs(), d.vertexFrames.framesIndexer(),
-                               d.vertexConnections.connections(), d.connectionWeights, d.restPoints,
-                               d.restFramesInverse);
+                               d.vertexConnections.connections(), d.connectionWeights.get(), d.restPoints.get(),
+                               d.restFramesInverse.get());
     }
 
     HObject mesh;

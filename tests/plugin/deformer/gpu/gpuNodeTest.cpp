@@ -84,13 +84,20 @@ TEST_F(GpuTest, AnswersAndSaysWhatIsWrong) {
         {"a basis that says too much", shapes(1, 10, 27), failure, {}},
         {"other vertices", inState([](Data& d) { d.componentMap.setIdentity(8); }), failure, {}},
         {"no frames", inState([](Data& d) { d.vertexFrames = {}; }), failure, {}},
-        {"no rest frames", inState([](Data& d) { d.restFramesInverse.clear(); }), failure, {}},
-        {"a rest point less", inState([](Data& d) { d.restPoints.pop_back(); }), failure, {}},
+        {"no rest frames", inState([](Data& d) { d.restFramesInverse = {}; }), failure, {}},
+        {"a rest point less",
+         inState([](Data& d) {
+             neuralWarp::Points points = d.restPoints;
+             points.pop_back();
+             d.restPoints = points;
+         }),
+         failure,
+         {}},
         {"no connections",
          inState([](Data& d) {
              d.activeSettings.smoothingIterations = 2;
              d.vertexConnections = {};
-             d.connectionWeights.clear();
+             d.connectionWeights = {};
          }),
          failure,
          {}},
