@@ -251,7 +251,7 @@ void benchMany(const bench::Options& options, unsigned threads, const WarpSettin
            std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count() < options.seconds) {
         many.push_back(frames(1));
         same.push_back(frames(0));
-        ratios.push_back(same.back() / many.back());
+        ratios.push_back(many.back() / same.back());
     }
     std::printf("%7zu %-7s %3u %8.0f %8.0f %6.2f %8.2f %8.2f\n", frame.vertices(), modelName(setting).c_str(), threads,
                 quantile(many, 0.5) * 1e6, quantile(same, 0.5) * 1e6, quantile(ratios, 0.5), ofOne, further);
@@ -351,8 +351,9 @@ int run(int argc, char** argv) {
         std::printf(
             "64 characters of one model, a frame of each, beside as many frames of one: us a frame; resident MB "
             "of the first, and of each further one\n");
-        std::printf("%7s %-7s %3s %8s %8s %6s %8s %8s\n", "verts", "model", "thr", "each", "one", "ratio", "first",
+        std::printf("%7s %-7s %3s %8s %8s %6s %8s %8s\n", "verts", "model", "thr", "each", "one", "/one", "first",
                     "further");
+        std::fputs("kind,vertices,model,threads,each_us,one_us,ratio,first_mb,further_mb\n", options->csv.get());
         inChild(*options, 1, [](const auto& o, unsigned threads) { benchMany(o, threads, {50, true, 50, 10}); });
         inChild(*options, 1, [](const auto& o, unsigned threads) { benchMany(o, threads, {100, true, 50, 10}); });
     }

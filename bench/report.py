@@ -39,6 +39,7 @@ class Line(NamedTuple):
 RUNS: Dict[str, List[str]] = {
     "plain": ["bench_deform", "--only", "plain", "--seconds", "1"],
     "frames": ["bench_deform", "--only", "frames", "--quick", "--seconds", "1"],
+    "many": ["bench_deform", "--only", "many", "--seconds", "2"],
     "product": ["bench_deform", "--only", "product"],
     "smoothing": ["bench_quill", "--only", "frame smoothing", "--seconds", "1"],
     "transport": ["bench_quill", "--only", "frame transport", "--seconds", "1"],
@@ -70,7 +71,7 @@ BEFORE: Dict[Tuple[str, str, str, str, str], str] = {
 
 
 def thousands(count: str) -> str:
-    return {"10000": "10 k", "99856": "100 k", "1000000": "1 M", "100000": "100 k"}.get(count, count)
+    return {"2500": "2.5 k", "10000": "10 k", "99856": "100 k", "1000000": "1 M"}.get(count, count)
 
 
 def whole_frames() -> List[Line]:
@@ -124,6 +125,12 @@ def around_frames() -> List[Line]:
         small = {"vertices": "1024", "threads": threads}
         lines.append(Line(f"what the host adds to a frame, 1 k, {threads} thr, paused, us", "frames", small, "rest_us",
                           8.0, None, "{:.1f}"))
+    for vertices in ("2500", "10000"):
+        where = {"kind": "many", "vertices": vertices}
+        lines.append(Line(f"frame of each of 64 characters / as many of one, {thousands(vertices)}, 1 thr", "many",
+                          where, "ratio", 1.05))
+        lines.append(Line(f"memory of each further of 64 characters, {thousands(vertices)}, MB", "many", where,
+                          "further_mb"))
     lines.append(Line("opening shapes, 100 k, S=50, s", "opening", {"phase": "open shapes"}, "ns_per_vertex_median",
                       0.4, "0.79", "{:.3f}", 3 * 50 * 100000 * 1e-9))
     for passes, before in (("0", "115"), ("10", "129")):

@@ -4,14 +4,6 @@
 #include <algorithm>
 
 namespace neuralWarp {
-namespace {
-
-template <class T>
-std::size_t bytesOf(const std::vector<T>& values) {
-    return values.capacity() * sizeof(T);
-}
-
-} // namespace
 
 const quill::Smoother& FrameWorkspace::smoother(const FrameModel& model) {
     if (!isSmootherDue_)
@@ -50,8 +42,8 @@ const std::vector<std::uint32_t>& FrameWorkspace::drivenBlocks(const FrameModel&
 }
 
 std::size_t FrameWorkspace::bytes() const {
-    return smoother_.bytes() + transport_.bytes() + bytesOf(drivenBlocks_) + bytesOf(points) + bytesOf(deltas) +
-           bytesOf(slotDeltas) + bytesOf(result) + bytesOf(smoothed) + bytesOf(scratch.a) + bytesOf(scratch.b);
+    return smoother_.bytes() + transport_.bytes() + drivenBlocks_.capacity() * sizeof(drivenBlocks_[0]) +
+           FrameArrays::bytes();
 }
 
 } // namespace neuralWarp

@@ -92,6 +92,7 @@ HStatus neuralWarpNode::evaluate(HDataBlock& block, HItGeometry& iterator, std::
     status = prepare(block, multiIndex, *data, isActive, morph, attempt);
     if (status.error() || attempt == Attempt::nothing)
         return status;
+    const LentArrays arrays(data->workspace);
     Points& result = data->workspace.result;
     if (data->modelApplied) {
         status = applyNeuralModel(block, multiIndex, *data, result);

@@ -2,8 +2,8 @@
 // What the frames of one geometry keep from one to the next.
 #pragma once
 
+#include "frame/FrameArrays.h"
 #include "frame/FrameModel.h"
-#include "quill/PaddedPoints.h"
 #include "quill/Smoother.h"
 #include "quill/SurfaceTransport.h"
 
@@ -12,9 +12,9 @@
 
 namespace neuralWarp {
 
-/// The tables of a geometry at rest, laid out for its frames, and the arrays in which a frame works: a frame allocates
-/// none. Belongs to one geometry. One thread at a time.
-class FrameWorkspace {
+/// The tables of a geometry at rest, laid out for its frames, and the arrays in which a frame works: its own, or those
+/// that LentArrays lends it. Belongs to one geometry. One thread at a time.
+class FrameWorkspace : public FrameArrays {
 public:
     /// Something that a FrameModel views has changed: the next frame lays the tables out anew. [any]
     void invalidate() { isSmootherDue_ = isTransportDue_ = areBlocksDue_ = true; }
@@ -26,10 +26,6 @@ public:
     const std::vector<std::uint32_t>& drivenBlocks(const FrameModel& model);
     /// Size of the tables and arrays, in bytes.
     std::size_t bytes() const;
-
-    Points points, deltas, slotDeltas, result;
-    quill::PaddedPoints smoothed;
-    quill::Smoother::Scratch scratch;
 
 private:
     bool isSmootherDue_ = true, isTransportDue_ = true, areBlocksDue_ = true;
