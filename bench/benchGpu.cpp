@@ -293,8 +293,8 @@ void benchFixedCost(unsigned passes, const bench::Options& options, Table& table
         for (const Pace pace : {Pace::inARow, Pace::single})
             for (const double seconds : runFrames(frame, 300, pace))
                 fixed[pace].push_back(seconds - kernels);
-    table.add({"fixed cost, in a row", "host", fixed[Pace::inARow], 0, {}, largestFixedCost});
-    table.add({"fixed cost, after a pause", "host", fixed[Pace::single], 0, {}, largestFixedCost});
+    table.add({"fixed cost in a row", "host", fixed[Pace::inARow], 0, {}, largestFixedCost});
+    table.add({"fixed cost after a pause", "host", fixed[Pace::single], 0, {}, largestFixedCost});
 }
 
 void benchEmptyLaunch(const Table& table) {
