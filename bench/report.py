@@ -106,7 +106,7 @@ def parts() -> List[Line]:
                               {"mesh": "grid", "vertices": vertices, "threads": threads}, "ratio_to_plain_loop", limit))
         for vertices in ("10000", "99856"):
             where = {"vertices": vertices, "threads": threads}
-            lines.append(Line(f"smoothing of shuffled vertices / of ordered ones, {thousands(vertices)}, {threads} thr, "
+            lines.append(Line(f"smoothing of shuffled vertices / of ordered, {thousands(vertices)}, {threads} thr, "
                               "hot", "smoothing", {"mesh": "shuffled", **where}, "ns_per_vertex_median", 1.15, "1.39",
                               over={"mesh": "grid", **where}))
             lines.append(Line(f"frames and transport / before, {thousands(vertices)}, {threads} thr, hot", "transport",
