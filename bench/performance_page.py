@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 """Runs the benchmarks that docs/performance.md quotes, and writes its table anew.
 
-usage: report.py PROGRAMS PAGE
+usage: performance_page.py PROGRAMS PAGE
     PROGRAMS  the folder of the built benchmarks
     PAGE      the page; what stands between its two marks is replaced
 """
@@ -199,7 +199,7 @@ def main(programs: str, page: str) -> None:
     path = pathlib.Path(page)
     text = path.read_text(encoding="utf-8")
     if text.count(BEGIN) != 1 or text.count(END) != 1 or text.index(BEGIN) > text.index(END):
-        sys.exit(f"report: {page} does not hold {BEGIN} and then {END}, once each")
+        sys.exit(f"performance_page: {page} does not hold {BEGIN} and then {END}, once each")
     measured = table(run_all(pathlib.Path(programs)))
     cores = len(os.sched_getaffinity(0))
     said = f"Measured on {datetime.date.today()}, {processor()}, {cores} cores.\n\n{measured}\n"
