@@ -172,9 +172,10 @@ void HOpenCLKernelInfo::reset() noexcept {
 void HOpenCLKernelInfo::setKernelArgBuffer(cl_uint index, const HOpenCLBuffer& buffer, cl_int& status, bool isValid) {
     const HOpenCLBuffer::Impl* of = isValid ? OpenQuarn::Access::impl(buffer).get() : nullptr;
     cl_mem memory = of ? of->memory : nullptr;
-    const Argument argument{.bytes = sizeof memory, .isBuffer = true, .value = of ? of->number : 0};
+    constexpr std::size_t bytes = sizeof(cl_mem); // NOLINT(bugprone-sizeof-expression): a buffer is a pointer
+    const Argument argument{.bytes = bytes, .isBuffer = true, .value = of ? of->number : 0};
     if (status == CL_SUCCESS)
-        status = impl_ ? impl_->set(index, sizeof memory, &memory, argument) : noKernel(index);
+        status = impl_ ? impl_->set(index, bytes, &memory, argument) : noKernel(index);
 }
 
 void HOpenCLUtils::setKernelArg(const HOpenCLKernelInfo& kernel, cl_uint index, std::size_t bytes, const void* value,
