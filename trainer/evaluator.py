@@ -72,7 +72,7 @@ def read_answer(path: Path, rows: int, model: Path) -> np.ndarray:
 
 
 class NumpyModel:
-    """A chain of the nodes that this trainer writes."""
+    """A network of the nodes that this trainer writes."""
 
     STEPS: dict[str, Callable[..., np.ndarray]] = {
         "Sub": np.subtract, "Mul": np.multiply, "Add": np.add, "MatMul": np.matmul, "Tanh": np.tanh,

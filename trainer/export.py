@@ -20,7 +20,7 @@ from .dataset import Dataset
 from .errors import TrainerError
 from .files import write_bytes
 from .halves import Halves
-from .network import Normalisation
+from .network import Network, Normalisation
 from .settings import WITHOUT_EFFECT, Settings
 
 OPSET = 16
@@ -40,12 +40,13 @@ ACTIVATION_NODES = {nn.Sigmoid: "Sigmoid", nn.Tanh: "Tanh", nn.ReLU: "Relu"}
 
 # --- model.onnx ---
 
-def onnx_model(network: nn.Sequential, normalisation: Normalisation, output_name: str) -> onnx.ModelProto:
+def onnx_model(network: Network, normalisation: Normalisation, output_name: str) -> onnx.ModelProto:
     """The network from raw controls, float32 [C], to outputs, float32 [K]: one pose, as the deformer runs it."""
     graph = GraphWriter("controls")
     graph.add("Sub", normalisation.center)
     graph.add("Mul", np.float32(1 / normalisation.deviation))
-    layers = list(network)
+    controls = graph.value
+    layers = list(network.chain)
     for layer in layers:
         if isinstance(layer, nn.Linear):
             scale = normalisation.unit if layer is layers[-1] else 1.0
@@ -55,6 +56,15 @@ def onnx_model(network: nn.Sequential, normalisation: Normalisation, output_name
             graph.add("LeakyRelu", alpha=layer.negative_slope)
         elif type(layer) in ACTIVATION_NODES:
             graph.add(ACTIVATION_NODES[type(layer)])
+        elif isinstance(layer, nn.SiLU):  # x sigmoid(x)
+            before = graph.value
+            graph.add("Sigmoid")
+            graph.join("Mul", before)
+    if network.line is not None:
+        outputs = graph.value
+        graph.value = controls
+        graph.add("MatMul", scaled(network.line.weight, normalisation.unit).T)
+        graph.join("Add", outputs)
     return graph.finish(output_name, layers[0].in_features, layers[-1].out_features)
 
 
@@ -71,7 +81,7 @@ def zero_model(control_count: int, output_count: int) -> onnx.ModelProto:
 
 
 class GraphWriter:
-    """A chain of nodes, each fed by the one before and at most one constant."""
+    """Nodes, each fed by `value`, which is the one before, and at most one constant or other node."""
 
     def __init__(self, input_name: str) -> None:
         self.nodes: list[onnx.NodeProto] = []
@@ -87,6 +97,12 @@ class GraphWriter:
                                                           f"{name}_constant"))
             inputs.append(self.constants[-1].name)
         self.nodes.append(helper.make_node(kind, inputs, [name], name=name, **attributes))
+        self.value = name
+
+    def join(self, kind: str, other: str) -> None:
+        """A node of the one before and of another before that."""
+        name = f"{kind.lower()}{len(self.nodes)}"
+        self.nodes.append(helper.make_node(kind, [self.value, other], [name], name=name))
         self.value = name
 
     def finish(self, output_name: str, input_count: int, output_count: int) -> onnx.ModelProto:

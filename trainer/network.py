@@ -1,7 +1,9 @@
 # SPDX-License-Identifier: Apache-2.0
-"""The network: a chain of dense layers from normalised controls to normalised outputs, and what normalises them."""
+"""The network: dense layers, and a straight line beside them where it is asked for, from normalised controls to
+normalised outputs, and what normalises them."""
 
 from dataclasses import dataclass
+from typing import Optional
 
 import numpy as np
 import torch
@@ -15,7 +17,20 @@ LEAKY_SLOPE = 0.01
 CONSTANT = 1e-6  # a control whose deviation is below this part of the common one counts as never moved
 
 MODULES = {"Sigmoid": nn.Sigmoid, "Tanh": nn.Tanh, "ReLU": nn.ReLU, "LeakyReLU": lambda: nn.LeakyReLU(LEAKY_SLOPE),
-           "Linear": None}
+           "Linear": None, "SiLU": nn.SiLU}
+
+
+class Network(nn.Module):
+    """A chain of layers, and what a straight line from the controls adds to its outputs."""
+
+    def __init__(self, chain: nn.Sequential, line: Optional[nn.Linear]) -> None:
+        super().__init__()
+        self.chain = chain
+        self.line = line
+
+    def forward(self, controls: torch.Tensor) -> torch.Tensor:
+        outputs = self.chain(controls)
+        return outputs if self.line is None else outputs + self.line(controls)
 
 
 @dataclass(frozen=True)
@@ -46,7 +61,8 @@ def layer_sizes(settings: Settings, inputs: int, outputs: int) -> list[tuple[int
 
 
 def parameter_count(settings: Settings, inputs: int, outputs: int) -> int:
-    return sum((before + 1) * after for before, after in layer_sizes(settings, inputs, outputs))
+    chain = sum((before + 1) * after for before, after in layer_sizes(settings, inputs, outputs))
+    return chain + (inputs * outputs if settings.linearPath else 0)
 
 
 def check_size(settings: Settings, inputs: int, outputs: int) -> None:
@@ -61,8 +77,8 @@ def check_size(settings: Settings, inputs: int, outputs: int) -> None:
                        f"{WEIGHT_BYTES_LIMIT / 1e9} GB a model may have: {advice}")
 
 
-def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> nn.Sequential:
-    """The layers, initialised by torch's generator. `still` [inputs]: controls that must have no influence."""
+def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> Network:
+    """The network, initialised by torch's generator. `still` [inputs]: controls that must have no influence."""
     layers: list[nn.Module] = []
     for before, after in layer_sizes(settings, inputs, outputs):
         layers.append(nn.Linear(before, after))
@@ -72,14 +88,17 @@ def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> n
             layers.append(nn.Dropout(settings.dropoutRatio))
     while not isinstance(layers[-1], nn.Linear):  # nothing follows the last layer
         layers.pop()
-    network = nn.Sequential(*layers)
+    chain = nn.Sequential(*layers)
+    line = nn.Linear(inputs, outputs, bias=False) if settings.linearPath else None
     with torch.no_grad():
         # their input is 0 all through the training, so the weights would stay as random as they began
-        network[0].weight[:, torch.from_numpy(still)] = 0
-    return network
+        chain[0].weight[:, torch.from_numpy(still)] = 0
+        if line is not None:
+            line.weight.zero_()  # the layers start as they would without it
+    return Network(chain, line)
 
 
-def predict(network: nn.Sequential, normalisation: Normalisation, controls: np.ndarray) -> np.ndarray:
+def predict(network: Network, normalisation: Normalisation, controls: np.ndarray) -> np.ndarray:
     """Outputs of the network, float32 [rows, K] in units of the model, for raw controls [rows, C]."""
     network.eval()
     with torch.no_grad():

@@ -8,14 +8,13 @@ from typing import Any, Callable, Optional
 
 import numpy as np
 import torch
-from torch import nn
 
 from . import evaluator, export, files, memory, plausible, progress, report
 from .dataset import Dataset
 from .errors import TrainerError
 from .halves import Halves, rounding, to_halves
 from .measure import measure
-from .network import Normalisation, build, check_size, measure_controls, parameter_count, predict
+from .network import Network, Normalisation, build, check_size, measure_controls, parameter_count, predict
 from .settings import Settings
 from .shapes import principal_basis
 from .training import History, Split, fit, make_deterministic, split_rows
@@ -24,7 +23,7 @@ MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json", "principa
 VERIFIED_ROWS = 64
 TOLERANCE = 1e-4  # of the root mean square of the outputs
 
-Trained = tuple[nn.Sequential, Normalisation, History]
+Trained = tuple[Network, Normalisation, History]
 
 
 @dataclass(frozen=True)

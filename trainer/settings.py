@@ -7,7 +7,8 @@ from typing import Any, Callable
 
 from .errors import TrainerError
 
-ACTIVATIONS = ("Sigmoid", "Tanh", "ReLU", "LeakyReLU", "Linear")
+ACTIVATIONS = ("Sigmoid", "Tanh", "ReLU", "LeakyReLU", "Linear",
+               "SiLU")  # the last is not a label of the node's attribute
 
 # settings by which the model does not change: where it goes, and where the data lies while it is trained
 WITHOUT_EFFECT = ("outputModelName", "preloadData")
@@ -28,6 +29,7 @@ class Settings:
     principalShapesLimit: int = 20
     principalShapesAccuracy: float = 0.8
     preloadData: bool = True
+    linearPath: bool = False  # not an attribute of the node
     principalShapesHalf: bool = False  # not an attribute of the node
     patience: int = 50  # epochs without a better validation loss until training stops; not an attribute of the node
 
@@ -45,6 +47,7 @@ MEANINGS = {
     "principalShapesEnabled": "learn coefficients of principal shapes, not the deltas themselves",
     "principalShapesLimit": "most principal shapes",
     "principalShapesAccuracy": "part of the deltas' sum of squares that the shapes hold; 0.99 and more looks right",
+    "linearPath": "a straight line from the controls to the outputs beside the hidden layers, learned with them",
     "principalShapesHalf": "keep principal shapes in half precision: half the size, and off by what is then said",
     "preloadData": "hold the deltas in memory; the model is the same without",
     "patience": "stop after so many epochs without a better validation loss",

@@ -41,7 +41,7 @@ def split_rows(count: int, ratio: float, seed: int) -> Split:
     return np.sort(order[held:]), np.sort(order[:held])
 
 
-def fit(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, split: Split, settings: Settings, seed: int,
+def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Split, settings: Settings, seed: int,
         on_epoch: Callable[[History], None], is_interrupted: Callable[[], bool]) -> History:
     """Trains `network` and leaves it with its best weights.
 
@@ -87,7 +87,7 @@ def cut(rows: np.ndarray, size: int) -> list[np.ndarray]:
     return [np.sort(rows[first:first + size]) for first in range(0, len(rows), size)]
 
 
-def train_epoch(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray],
+def train_epoch(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray],
                 optimizer: torch.optim.Optimizer, settings: Settings, epoch: int, steps: int,
                 is_interrupted: Callable[[], bool]) -> Optional[float]:
     """The mean loss; None where the epoch was not finished."""
@@ -107,12 +107,12 @@ def train_epoch(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsO
     return total / sum(map(len, batches))
 
 
-def mean_loss(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray]) -> float:
+def mean_loss(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray]) -> float:
     network.eval()
     with torch.no_grad():
         total = sum(float(batch_loss(network, inputs, targets_of, batch)) * len(batch) for batch in batches)
     return total / sum(map(len, batches))
 
 
-def batch_loss(network: nn.Sequential, inputs: np.ndarray, targets_of: TargetsOf, batch: np.ndarray) -> torch.Tensor:
+def batch_loss(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batch: np.ndarray) -> torch.Tensor:
     return torch.nn.functional.mse_loss(network(torch.from_numpy(inputs[batch])), torch.from_numpy(targets_of(batch)))

@@ -45,7 +45,8 @@ class ModelTest(unittest.TestCase):
         motion = load_dataset(synthetic.make(self.place / "motion", seed=8, frames=50))
         variants: list[dict[str, Any]] = [
                         {}, {"principalShapesEnabled": True, "principalShapesAccuracy": 0.999},
-                        {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"}]
+                        {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"},
+                        {"activationFunction": "SiLU", "linearPath": True}]
         for changes in variants:
             with self.subTest(changes):
                 report = self.train(data, **changes)
@@ -66,7 +67,8 @@ class ModelTest(unittest.TestCase):
         for activation in ACTIVATIONS:
             for layers in (1, 3):
                 with self.subTest(activation, layers=layers):
-                    self.train(data, activationFunction=activation, hiddenLayerCount=layers, epochs=2, dropoutRatio=0.2)
+                    self.train(data, activationFunction=activation, hiddenLayerCount=layers, linearPath=layers == 3,
+                               epochs=2, dropoutRatio=0.2)
 
         def spoiled(parameter: Any, scale: float) -> np.ndarray:
             return 1.001 * parameter.detach().numpy() * scale
@@ -101,7 +103,7 @@ class ModelTest(unittest.TestCase):
 
     def test_a_control_that_never_moves_has_no_influence(self) -> None:
         data = synthetic.make(self.place / "data", constant_control=True)
-        self.train(data, epochs=3)
+        self.train(data, epochs=3, linearPath=True)
         self.assertTrue(any("never move" in line and "joint3.rotateX" in line for line in self.said))
         model = ModelDirectory(self.place / "model.nwrp", None)
         controls = load_dataset(data).controls[:5]
