@@ -197,6 +197,19 @@ void runCircle(std::size_t corners, std::size_t threads, const bench::Options& o
         report.add(bench::measure(phase, threads, options.seconds));
 }
 
+// Smoothing of the same mesh with its vertices in any order, beside the ordered one.
+void runOrder(const ZooMesh& mesh, std::size_t threads, const bench::Options& options, bench::Report& report) {
+    constexpr std::size_t passes = 10;
+    Phase phase{"frame order", "shuffled", mesh.vertexCount()};
+    if (!phase.name.starts_with(options.only))
+        return;
+    Subject ordered("grid", mesh), mixed("shuffled", shuffled(mesh, 1));
+    phase.perCall = passes;
+    phase.ours = [&] { mixed.smoother.run(mixed.points, passes, mixed.padded, mixed.smootherScratch); };
+    phase.plain = [&] { ordered.smoother.run(ordered.points, passes, ordered.padded, ordered.smootherScratch); };
+    report.add(bench::measure(phase, threads, options.seconds));
+}
+
 void runMesh(const std::string& name, const ZooMesh& mesh, bool allPhases, std::size_t threads,
              const bench::Options& options, bench::Report& report) {
     Subject s(name, mesh);
@@ -222,6 +235,8 @@ void runAll(std::size_t threads, const bench::Options& options, bench::Report& r
         const ZooMesh grid = makeGrid(size.gridSide - 1, size.gridSide - 1);
         runMesh("grid", grid, true, threads, options, report);
         runMesh("shuffled", shuffled(grid, 1), false, threads, options, report);
+        if (size.gridSide < 1000)
+            runOrder(grid, threads, options, report);
         runMesh("icosphere", makeIcosphere(size.subdivisions), false, threads, options, report);
     }
     for (const std::size_t corners : {std::size_t{512}, std::size_t{4096}})
@@ -260,7 +275,8 @@ int main(int argc, char** argv) {
     bool ok = runOnCores(1, *options);
     if (const std::size_t cores = std::thread::hardware_concurrency(); cores > 1)
         ok = runOnCores(cores, *options) && ok;
-    bench::Report::legend("a plain loop of the same shape, a set per vertex, or one vertex after another");
+    bench::Report::legend(
+        "a plain loop of the same shape, a set per vertex, one vertex after another, or vertices in order");
     std::printf("CSV: %s\n", options->csvPath.c_str());
     return ok ? 0 : 1;
 }
