@@ -31,7 +31,7 @@ class Settings:
     preloadData: bool = True
     linearPath: bool = False  # not an attribute of the node
     principalShapesHalf: bool = False  # not an attribute of the node
-    patience: int = 50  # epochs without a better validation loss until training stops; not an attribute of the node
+    patience: int = 50  # epochs without a better validation loss until the last phase; not an attribute of the node
 
 
 MEANINGS = {
@@ -50,7 +50,8 @@ MEANINGS = {
     "linearPath": "a straight line from the controls to the outputs beside the hidden layers, learned with them",
     "principalShapesHalf": "keep principal shapes in half precision: half the size, and off by what is then said",
     "preloadData": "hold the deltas in memory; the model is the same without",
-    "patience": "stop after so many epochs without a better validation loss",
+    "patience": "after so many epochs without a better validation loss the rate falls to 0 within as many, and "
+                "the training ends",
 }
 LIMITS: dict[str, tuple[float, float]] = {
     "batchSize": (1, 100000), "epochs": (1, 100000), "learningRate": (0, 1), "validationRatio": (0, 0.99),

@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Training: the split of the rows, the loop over epochs, early stopping. The same seed gives the same bits."""
+"""Training: the split of the rows, the loop over epochs. The same seed gives the same bits."""
 
 import copy
 import math
@@ -11,6 +11,7 @@ import torch
 from torch import nn
 
 from .errors import TrainerError
+from .schedule import Schedule
 from .settings import Settings
 
 Split = tuple[np.ndarray, np.ndarray]             # rows to train on, rows to validate on
@@ -55,11 +56,12 @@ def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Sp
     rows, held = split
     order = np.random.default_rng((seed, 1))
     optimizer = torch.optim.Adam(network.parameters(), lr=settings.learningRate)
-    steps = settings.epochs * math.ceil(len(rows) / settings.batchSize)
-    history, best = History(), None
-    for epoch in range(1, settings.epochs + 1):
+    schedule = Schedule(settings.learningRate, settings.epochs, settings.patience)
+    history, best, epoch = History(), None, 0
+    while epoch < schedule.end:
+        epoch += 1
         batches = cut(order.permutation(rows), settings.batchSize)
-        loss = train_epoch(network, inputs, targets_of, batches, optimizer, settings, epoch - 1, steps, is_interrupted)
+        loss = train_epoch(network, inputs, targets_of, batches, optimizer, schedule, epoch - 1, is_interrupted)
         if loss is None:
             history.interrupted = True
             break
@@ -70,12 +72,11 @@ def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Sp
         if not math.isfinite(loss):
             raise TrainerError(f"the loss of epoch {epoch} is {loss}: the training has diverged; give a learning rate "
                                f"below {settings.learningRate:g}")
-        if loss < history.best_loss:
+        if loss < math.inf:
             history.best_loss, history.best_epoch = loss, epoch
             best = copy.deepcopy(network.state_dict())
         on_epoch(history)
-        if epoch - history.best_epoch >= settings.patience:
-            break
+        schedule.note(epoch, history.best_epoch)
     if best is None:
         raise KeyboardInterrupt("before an epoch was finished: there is no network yet")
     network.load_state_dict(best)
@@ -88,7 +89,7 @@ def cut(rows: np.ndarray, size: int) -> list[np.ndarray]:
 
 
 def train_epoch(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray],
-                optimizer: torch.optim.Optimizer, settings: Settings, epoch: int, steps: int,
+                optimizer: torch.optim.Optimizer, schedule: Schedule, epoch: int,
                 is_interrupted: Callable[[], bool]) -> Optional[float]:
     """The mean loss; None where the epoch was not finished."""
     network.train()
@@ -96,9 +97,7 @@ def train_epoch(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, b
     for index, batch in enumerate(batches):
         if is_interrupted():
             return None
-        # half a cosine from the full rate to 0 over all steps
-        step = epoch * len(batches) + index
-        optimizer.param_groups[0]["lr"] = settings.learningRate * 0.5 * (1 + math.cos(math.pi * step / steps))
+        optimizer.param_groups[0]["lr"] = schedule.at(epoch * len(batches) + index, len(batches))
         optimizer.zero_grad()
         loss = batch_loss(network, inputs, targets_of, batch)
         loss.backward()

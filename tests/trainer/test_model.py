@@ -21,6 +21,7 @@ from trainer.evaluator import ModelDirectory, NumpyModel
 from trainer.measure import Distances, advice
 from trainer.network import check_size
 from trainer.plausible import doubts
+from trainer.schedule import Schedule
 from trainer.settings import ACTIVATIONS, Settings
 
 
@@ -152,10 +153,24 @@ class ModelTest(unittest.TestCase):
         self.train(self.place / "1", epochs=1)
         self.assertIn("of the character's diagonal", self.said[0])
 
-    def test_training_ends_early_and_keeps_the_best(self) -> None:
+    def test_training_ends_early_with_small_steps_and_keeps_the_best(self) -> None:
         data = synthetic.make(self.place / "data", frames=30)
-        report = self.train(data, epochs=200, patience=3, learningRate=0.5)
-        self.assertEqual(report["epochs"], report["bestEpoch"] + 3)
+        rates: list[float] = []
+        rate = Schedule.at
+
+        def noted(schedule: Schedule, step: int, steps: int) -> float:
+            rates.append(rate(schedule, step, steps))
+            return rates[-1]
+
+        for epochs, patience, wanted in ((50, 3, 7), (50, 40, 50), (8, 3, 7), (6, 3, 6), (5, 4, 5), (5, 9, 5)):
+            rates.clear()
+            # nothing gets better than the first epoch
+            with mock.patch.object(Schedule, "at", noted), mock.patch("trainer.training.mean_loss", lambda *_: 1.0):
+                report = self.train(data, epochs=epochs, patience=patience, batchSize=4, learningRate=0.01)
+            self.assertEqual((report["epochs"], report["bestEpoch"]), (wanted, 1))
+            falls = -np.diff(rates, append=0)  # evenly: no leap, neither where the last phase begins nor at the end
+            self.assertTrue((falls > 0).all() and falls.max() < 4 * 0.01 / min(wanted, patience) / 6, (rates, wanted))
+            self.assertEqual(rates[0], 0.01)
         with mock.patch("trainer.training.mean_loss", lambda *_: float("nan")):
             with self.assertRaisesRegex(TrainerError, "epoch 1 is nan.*learning rate below 0.003"):
                 self.train(data)
