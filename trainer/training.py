@@ -72,7 +72,7 @@ def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Sp
         if not math.isfinite(loss):
             raise TrainerError(f"the loss of epoch {epoch} is {loss}: the training has diverged; give a learning rate "
                                f"below {settings.learningRate:g}")
-        if loss < math.inf:
+        if loss < history.best_loss:
             history.best_loss, history.best_epoch = loss, epoch
             best = copy.deepcopy(network.state_dict())
         on_epoch(history)
