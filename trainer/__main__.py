@@ -91,6 +91,7 @@ SETTING_FLAGS = {
     "validationRatio": "--validation-ratio", "hiddenLayerCount": "--hidden-layers", "neuronsPerLayer": "--neurons",
     "activationFunction": "--activation", "dropoutRatio": "--dropout", "principalShapesLimit": "--principal-limit",
     "principalShapesAccuracy": "--principal-accuracy", "patience": "--patience",
+    "guard": "--guard", "guardWidth": "--guard-width",
 }
 
 
@@ -143,6 +144,7 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     """Trains the model of a data set. Returns its report."""
     from . import evaluator, pipeline
     from .dataset import load_dataset
+    from .guard import check_guard
     from .measure import advice, as_lines
     from .settings import KINDS, override
 
@@ -151,6 +153,7 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     dataset = load_dataset(folder)
     changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
     settings = override(dataset.settings, changes, lambda name: SETTING_FLAGS.get(name, name))
+    check_guard(settings, changes)
     model = model_of(settings)
     report = Path(wanted_report) if wanted_report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,

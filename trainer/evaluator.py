@@ -76,6 +76,7 @@ class NumpyModel:
 
     STEPS: dict[str, Callable[..., np.ndarray]] = {
         "Sub": np.subtract, "Mul": np.multiply, "Add": np.add, "MatMul": np.matmul, "Tanh": np.tanh,
+        "Max": np.maximum, "Min": np.minimum, "ReduceMax": lambda x: x.max(axis=-1, keepdims=True),
         "Relu": lambda x: np.maximum(x, 0), "Sigmoid": lambda x: 0.5 + 0.5 * np.tanh(0.5 * x),
     }
 

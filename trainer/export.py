@@ -19,6 +19,7 @@ from . import __version__
 from .dataset import Dataset
 from .errors import TrainerError
 from .files import write_bytes
+from .guard import Guard, add_clamp, add_fade
 from .halves import Halves
 from .network import Network, Normalisation
 from .settings import WITHOUT_EFFECT, Settings
@@ -40,9 +41,13 @@ ACTIVATION_NODES = {nn.Sigmoid: "Sigmoid", nn.Tanh: "Tanh", nn.ReLU: "Relu"}
 
 # --- model.onnx ---
 
-def onnx_model(network: Network, normalisation: Normalisation, output_name: str) -> onnx.ModelProto:
+def onnx_model(network: Network, normalisation: Normalisation, output_name: str,
+               guard: Optional[Guard] = None) -> onnx.ModelProto:
     """The network from raw controls, float32 [C], to outputs, float32 [K]: one pose, as the deformer runs it."""
     graph = GraphWriter("controls")
+    if guard is not None:
+        add_clamp(graph, guard)
+    clamped = graph.value
     graph.add("Sub", normalisation.center)
     graph.add("Mul", np.float32(1 / normalisation.deviation))
     controls = graph.value
@@ -65,6 +70,8 @@ def onnx_model(network: Network, normalisation: Normalisation, output_name: str)
         graph.value = controls
         graph.add("MatMul", scaled(network.line.weight, normalisation.unit).T)
         graph.join("Add", outputs)
+    if guard is not None:
+        add_fade(graph, guard, graph.input_name, clamped)
     return graph.finish(output_name, layers[0].in_features, layers[-1].out_features)
 
 
@@ -89,7 +96,7 @@ class GraphWriter:
         self.input_name = self.value = input_name
 
     def add(self, kind: str, constant: Union[np.ndarray, np.floating, None] = None,
-            **attributes: float) -> None:
+            **attributes: Any) -> None:
         name = f"{kind.lower()}{len(self.nodes)}"
         inputs = [self.value]
         if constant is not None:

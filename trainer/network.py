@@ -10,6 +10,7 @@ import torch
 from torch import nn
 
 from .errors import TrainerError
+from .guard import Guard
 from .settings import Settings
 
 WEIGHT_BYTES_LIMIT = 1_500_000_000  # an ONNX file of one piece ends at 2 GiB
@@ -98,8 +99,11 @@ def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> N
     return Network(chain, line)
 
 
-def predict(network: Network, normalisation: Normalisation, controls: np.ndarray) -> np.ndarray:
+def predict(network: Network, normalisation: Normalisation, controls: np.ndarray,
+            guard: Optional[Guard] = None) -> np.ndarray:
     """Outputs of the network, float32 [rows, K] in units of the model, for raw controls [rows, C]."""
+    if guard is not None:
+        return predict(network, normalisation, guard.clamped(controls)) * guard.factor(controls)
     network.eval()
     with torch.no_grad():
         return network(torch.from_numpy(normalisation.normalised(controls))).numpy() * np.float32(normalisation.unit)

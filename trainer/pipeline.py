@@ -12,6 +12,7 @@ import torch
 from . import evaluator, export, files, memory, plausible, progress, report
 from .dataset import Dataset
 from .errors import TrainerError
+from .guard import guard_of
 from .halves import Halves, rounding, to_halves
 from .measure import measure
 from .network import Network, Normalisation, build, check_size, measure_controls, parameter_count, predict
@@ -164,14 +165,15 @@ def train_network(job: Job, targets: Targets, split: Split) -> Trained:
 def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split) -> None:
     """Writes the model's files, runs them as others will, and refuses them where the outputs differ."""
     network, normalisation, history = trained
-    model = export.onnx_model(network, normalisation, "deltas" if targets.shapes is None else "weights")
+    guard = guard_of(job.settings, job.dataset.controls[split[0]])
+    model = export.onnx_model(network, normalisation, "deltas" if targets.shapes is None else "weights", guard)
     metadata = export.metadata(job.dataset, job.settings, job.seed)
     if history.interrupted:
         metadata["interruptedAfterEpochs"] = len(history.train)
     export.write_model(part, model, metadata, targets.shapes, targets.halves)
     rows = report_rows(split)[:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
-    wanted = predict(network, normalisation, controls)
+    wanted = predict(network, normalisation, controls, guard)
     compare(evaluator.NumpyModel(part / "model.onnx").run(controls), wanted, targets.unit, "the exported network")
     if job.quarn is None:
         job.say("there is no quarn: the model is not verified with the deformer's own runtime")
@@ -198,9 +200,10 @@ def report_rows(split: Split) -> np.ndarray:
 
 def summarise(job: Job, trained: Trained, targets: Targets, split: Split) -> dict[str, Any]:
     network, normalisation, history = trained
+    guard = guard_of(job.settings, job.dataset.controls[split[0]])
 
     def deltas_of(controls: np.ndarray) -> np.ndarray:
-        outputs = predict(network, normalisation, controls)
+        outputs = predict(network, normalisation, controls, guard)
         return outputs if targets.shapes is None else outputs @ targets.shapes
 
     return {

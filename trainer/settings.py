@@ -9,6 +9,8 @@ from .errors import TrainerError
 
 ACTIVATIONS = ("Sigmoid", "Tanh", "ReLU", "LeakyReLU", "Linear",
                "SiLU")  # the last is not a label of the node's attribute
+GUARDS = ("none", "clamp", "fade")
+LABELS = {"activationFunction": ACTIVATIONS, "guard": GUARDS}
 
 # settings by which the model does not change: where it goes, and where the data lies while it is trained
 WITHOUT_EFFECT = ("outputModelName", "preloadData")
@@ -31,6 +33,8 @@ class Settings:
     preloadData: bool = True
     linearPath: bool = False  # not an attribute of the node
     principalShapesHalf: bool = False  # not an attribute of the node
+    guard: str = "none"  # not an attribute of the node
+    guardWidth: float = 1.0  # not an attribute of the node
     patience: int = 50  # epochs without a better validation loss until the last phase; not an attribute of the node
 
 
@@ -49,6 +53,8 @@ MEANINGS = {
     "principalShapesAccuracy": "part of the deltas' sum of squares that the shapes hold; 0.99 and more looks right",
     "linearPath": "a straight line from the controls to the outputs beside the hidden layers, learned with them",
     "principalShapesHalf": "keep principal shapes in half precision: half the size, and off by what is then said",
+    "guard": "what becomes of controls beyond the ranges of the training rows, one of " + ", ".join(GUARDS),
+    "guardWidth": "of --guard fade: how far beyond, in parts of a control's range, the outputs are 0",
     "preloadData": "hold the deltas in memory; the model is the same without",
     "patience": "after so many epochs without a better validation loss the rate falls to 0 within as many, and "
                 "the training ends",
@@ -57,6 +63,7 @@ LIMITS: dict[str, tuple[float, float]] = {
     "batchSize": (1, 100000), "epochs": (1, 100000), "learningRate": (0, 1), "validationRatio": (0, 0.99),
     "hiddenLayerCount": (1, 100), "neuronsPerLayer": (1, 100000), "dropoutRatio": (0, 1),
     "principalShapesLimit": (1, 500), "principalShapesAccuracy": (0, 1), "patience": (1, 100000),
+    "guardWidth": (0.001, 1000),
 }
 KINDS: dict[str, type] = {field.name: field.type for field in fields(Settings)}
 WORDS = {bool: "true or false", int: "a whole number", float: "a number", str: "a text"}
@@ -102,14 +109,14 @@ def check_value(name: str, value: Any, called: str) -> None:
     fits = isinstance(value, (int, float) if kind is float else kind) and (kind is bool or not isinstance(value, bool))
     if not fits:
         raise TrainerError(f"{called} is {value!r}, not {WORDS[kind]}")
-    if name == "activationFunction" and value.lower() not in [label.lower() for label in ACTIVATIONS]:
-        raise TrainerError(f"{called} is {value!r}, not one of {', '.join(ACTIVATIONS)}")
+    if name in LABELS and value.lower() not in [label.lower() for label in LABELS[name]]:
+        raise TrainerError(f"{called} is {value!r}, not one of {', '.join(LABELS[name])}")
     low, high = LIMITS.get(name, (-math.inf, math.inf))
     if kind in (int, float) and not low <= value <= high:
         raise TrainerError(f"{called} is {value}, not between {low} and {high}")
 
 
 def normalised(values: dict[str, Any]) -> dict[str, Any]:
-    """The activation function with the capitals of its label."""
-    labels = {label.lower(): label for label in ACTIVATIONS}
-    return {name: labels[value.lower()] if name == "activationFunction" else value for name, value in values.items()}
+    """Labels with their capitals."""
+    labels = {name: {label.lower(): label for label in labels} for name, labels in LABELS.items()}
+    return {name: labels[name][value.lower()] if name in labels else value for name, value in values.items()}

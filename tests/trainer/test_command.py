@@ -218,7 +218,7 @@ class CommandTest(unittest.TestCase):
                                                       check=False).stdout:
             self.skipTest("the quarn of this build cannot run models")
         for more in (("--activation", "Sigmoid"), ("--activation", "Tanh"), ("--activation", "ReLU"),
-                     ("--activation", "Linear"), ("--activation", "SiLU", "--linear-path"),
+                     ("--activation", "Linear"), ("--activation", "SiLU", "--linear-path", "--guard", "fade"),
                      ("--principal-shapes",), ("--principal-shapes", "--half-shapes")):
             out, _ = self.run_trainer("train", "data", "-o", "m/arm", "--quarn", quarn, "--json", *more)
             self.assertTrue(json.loads(out)["verifiedWithQuarn"])
