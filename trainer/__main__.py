@@ -38,6 +38,8 @@ def parser() -> Parser:
     evaluate.add_argument("model", metavar="MODEL.nwrp")
     add_quarn(evaluate)
     evaluate.add_argument("--json", action="store_true", help="write the errors as JSON")
+    evaluate.add_argument("--report", metavar="FOLDER", help="write the errors there as well, and those of every frame "
+                          "and vertex as .npy")
 
     zero = commands.add_parser("zero", help="write a model that outputs zeros", allow_abbrev=False)
     add_dataset(zero)
@@ -73,6 +75,8 @@ def add_train(commands: "argparse._SubParsersAction[Parser]") -> None:
     train.add_argument("-o", "--output", metavar="MODEL.nwrp",
                        help="model directory; if not given: models/NAME.nwrp with the data set's outputModelName. Of "
                        "several data sets the folder of these, models if not given")
+    train.add_argument("--validation-set", metavar="DATASET", help="validate and test on its rows, half of them each, "
+                       "and train on all rows of the other; of the same mesh")
     train.add_argument("--seed", type=int, default=1, help="of everything that is drawn at random (default 1)")
     train.add_argument("--threads", type=int, default=1, help="of the arithmetic; the model depends on it (default 1)")
     train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model; of several "
@@ -147,18 +151,21 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     from .guard import check_guard
     from .measure import advice, as_lines
     from .settings import KINDS, override
+    from .split import sentence
 
     say = speaker(options)
     quarn = evaluator.find_quarn(options.quarn)
     dataset = load_dataset(folder)
+    validation = load_dataset(options.validation_set) if options.validation_set else None
     changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
     settings = override(dataset.settings, changes, lambda name: SETTING_FLAGS.get(name, name))
     check_guard(settings, changes)
     model = model_of(settings)
     report = Path(wanted_report) if wanted_report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
-                                         not options.quiet))
-    for line in [*as_lines(result["errors"]), *advice(result["errors"], result["explained"], settings)]:
+                                         not options.quiet, validation))
+    for line in [*as_lines(result["errors"]), sentence(result["split"]),
+                 *advice(result["errors"], result["explained"], settings)]:
         say(line)
     say(f"wrote {model} and {report}")
     return result
@@ -239,9 +246,9 @@ def speaker(options: argparse.Namespace) -> Callable[[str], None]:
 def command_evaluate(options: argparse.Namespace) -> int:
     import numpy as np
 
-    from . import evaluator
+    from . import evaluator, files, report
     from .dataset import load_dataset
-    from .measure import as_lines, measure
+    from .measure import as_lines, measured
 
     quarn = evaluator.find_quarn(options.quarn)
     dataset = load_dataset(options.dataset)
@@ -249,8 +256,11 @@ def command_evaluate(options: argparse.Namespace) -> int:
         raise TrainerError(f"{options.dataset} has no deltas to compare with")
     model = evaluator.ModelDirectory(options.model, quarn)
     model.check_fits(dataset)
-    errors = measure(dataset, np.arange(dataset.frame_count), model.deltas, model.shapes)
-    errors["ranWith"] = "quarn" if quarn else "numpy"
+    found = measured(dataset, np.arange(dataset.frame_count), model.deltas, model.shapes)
+    errors = {**found.errors, "ranWith": "quarn" if quarn else "numpy"}
+    if options.report:
+        with files.whole_folder(Path(options.report), report.ERROR_NAMES) as part:
+            report.write_errors(part, errors, dataset, found)
     if options.json:
         print(json.dumps(errors, indent=1))
     else:

@@ -5,11 +5,12 @@ import hashlib
 import json
 from dataclasses import dataclass
 from pathlib import Path
-from typing import Any, Iterator, Union
+from typing import Any, Iterator, Optional, Union
 
 import numpy as np
 
 from .errors import TrainerError
+from .sequence import drawn_rows
 from .settings import Settings, read_settings
 
 FORMAT, VERSION = "neuralWarp training data", 1
@@ -28,7 +29,9 @@ class Dataset:
     controls: np.ndarray   # float32 [F, C]
     deltas: np.ndarray     # float32 [F, 3 * D], mapped from the file
     frames: np.ndarray     # int32 [F]
-    digest: str            # SHA-256 of the four files
+    digest: str            # SHA-256 of the description and these three files
+    drawn: np.ndarray      # bool [F]: rows that are independent of their neighbours; the others are a motion's
+    skin: Optional[np.ndarray] = None  # float32 [F, D], mapped: how far the skin is from the target; older sets lack it
 
     @property
     def frame_count(self) -> int:
@@ -70,9 +73,10 @@ def load_dataset(place: Union[str, Path]) -> Dataset:
     digest = hashlib.sha256(text)
     for name in ("controls", "deltas", "frames"):
         check_and_digest(arrays[name], folder / description["files"][name], arrays["frames"], digest)
-    return Dataset(folder, description, read_settings(description.get("train", {}), f"{path}: train"),
-                   np.array(arrays["controls"]), arrays["deltas"].reshape(frames, -1), np.array(arrays["frames"]),
-                   digest.hexdigest())
+    numbers, frame_of = np.array(arrays["controls"]), np.array(arrays["frames"])
+    return Dataset(folder, description, read_settings(description.get("train", {}), f"{path}: train"), numbers,
+                   arrays["deltas"].reshape(frames, -1), frame_of, digest.hexdigest(),
+                   drawn_rows(description, numbers, frame_of, path), open_skin(description, folder, frame_of, path))
 
 
 # --- dataset.json ---
@@ -168,6 +172,16 @@ def open_array(path: Path, kind: str, shape: tuple[int, ...]) -> np.memmap:
     if surplus:
         raise TrainerError(f"{path} has {surplus} bytes after its array")
     return array
+
+
+def open_skin(description: dict[str, Any], folder: Path, frames: np.ndarray, path: Path) -> Optional[np.memmap]:
+    """The distances of the skin, which no model depends on: they are in no digest."""
+    if "skin" not in description["files"]:
+        return None
+    place = array_path(description, folder, "skin", path)
+    skin = open_array(place, "<f4", (description["frameCount"], description["deltaCount"]))
+    check_and_digest(skin, place, frames, hashlib.sha256())
+    return skin
 
 
 def check_and_digest(array: np.ndarray, path: Path, frames: np.ndarray, digest: "hashlib._Hash") -> None:

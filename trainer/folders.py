@@ -8,6 +8,7 @@ from typing import Any, Optional, Union
 
 from .dataset import parse, read_bounded
 from .errors import TrainerError
+from .measure import before
 
 DESCRIPTION = "dataset.json"  # only a complete data set has one
 
@@ -65,5 +66,6 @@ def name_of(description: dict[str, Any], folder: Path) -> str:
 
 def summary(label: str, errors: dict[str, Any], model: Path) -> str:
     """The line of a model: how far vertices were from where they should be, and are."""
-    base, network = (errors[name]["mean"]["mm"] for name in ("base", "network"))
-    return f"{label}: {base:.4g} mm in the mean without {model}, {network:.4g} mm with it"
+    called, stage = before(errors)
+    return (f"{label}: {stage['mean']['mm']:.4g} mm in the mean with {called}, "
+            f"{errors['network']['mean']['mm']:.4g} mm with {model}")

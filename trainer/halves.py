@@ -10,7 +10,7 @@ from typing import Any, Callable
 import numpy as np
 
 from .dataset import Dataset
-from .measure import Distances
+from .measure import Stage
 
 LARGEST = 15     # numbers of a shape go up to 2^15; half precision ends at 65504
 SMALLEST = -100  # of a scale's exponents: then no product of scale and number is too small to be exact
@@ -36,7 +36,7 @@ def to_halves(shapes: np.ndarray) -> Halves:
 def rounding(dataset: Dataset, rows: np.ndarray, coefficients: Callable[[np.ndarray], np.ndarray],
              differences: np.ndarray) -> dict[str, Any]:
     """How far vertices go wrong over `rows` by differences [S, 3 * D] of the shapes, with the best coefficients."""
-    distances = Distances()
+    stage = Stage(dataset)
     for part, _ in dataset.blocks(rows):
-        distances.add(part, coefficients(part) @ differences)
-    return distances.summary(dataset)
+        stage.add(part, coefficients(part) @ differences)
+    return stage.summary()

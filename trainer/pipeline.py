@@ -7,18 +7,18 @@ from pathlib import Path
 from typing import Any, Callable, Optional
 
 import numpy as np
-import torch
 
 from . import evaluator, export, files, memory, plausible, progress, report
 from .dataset import Dataset
 from .errors import TrainerError
 from .guard import guard_of
 from .halves import Halves, rounding, to_halves
-from .measure import measure
+from .measure import Measured, measured
 from .network import Network, Normalisation, build, check_size, measure_controls, parameter_count, predict
 from .settings import Settings
 from .shapes import principal_basis
-from .training import History, Split, fit, make_deterministic, split_rows
+from .split import Split, join, split_rows, split_with
+from .training import History, fit, make_deterministic
 
 MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json", "principal_shapes.npz")
 VERIFIED_ROWS = 64
@@ -40,6 +40,7 @@ class Job:
     quarn: Optional[str]        # path of the executable
     say: Callable[[str], None]  # takes a line for the user
     progress: bool
+    validation: Optional[Dataset] = None  # rows that are held out; without it some of the data set's
 
 
 @dataclass(frozen=True)
@@ -69,23 +70,32 @@ def train(job: Job) -> dict[str, Any]:
     memory.warn_of_slow_blas(job.say)
     for doubt in plausible.doubts(dataset):
         job.say(doubt)
-    split = split_rows(dataset.frame_count, settings.validationRatio, job.seed)
+    job, split = split_job(job)
     # the inner one is published first: a report without its model would be a lie
     with files.whole_folder(job.report, report.NAMES) as report_part:
         with files.whole_folder(job.model, MODEL_NAMES) as part:
-            history, result = train_into(job, part, split)
+            history, errors, result = train_into(job, part, split)
             result["seconds"] = time.monotonic() - start
-            report.write_report(report_part, result, history)
+            report.write_report(report_part, result, history, job.dataset, errors)
     return result
 
 
-def train_into(job: Job, part: Path, split: Split) -> tuple[History, dict[str, Any]]:
-    """Trains and writes the model's files. Returns the history and the report, without the seconds."""
-    targets = make_targets(job, split[0])
+def split_job(job: Job) -> tuple[Job, Split]:
+    """The job over the rows of both data sets, where there are two, and which of these are for what."""
+    if job.validation is None:
+        return job, split_rows(job.dataset, job.settings.validationRatio, job.seed)
+    split = split_with(job.dataset, job.validation, job.seed)
+    return replace(job, dataset=join(job.dataset, job.validation)), split
+
+
+def train_into(job: Job, part: Path, split: Split) -> tuple[History, Measured, dict[str, Any]]:
+    """Trains and writes the model's files. Returns the history, the errors, and the report without the seconds."""
+    targets = make_targets(job, split.train)
     check_size(job.settings, job.dataset.control_count, targets.count)
     trained = train_network(job, targets, split)
     export_and_verify(job, part, trained, targets, split)
-    return trained[2], summarise(job, trained, targets, split)
+    errors = errors_of(job, trained, targets, split)
+    return trained[2], errors, {**summarise(job, trained, targets, split, errors), "sizes": report.sizes(part)}
 
 
 # --- targets ---
@@ -144,7 +154,7 @@ def halved(job: Job, targets: Targets, shapes: np.ndarray) -> Targets:
 
 def train_network(job: Job, targets: Targets, split: Split) -> Trained:
     dataset, settings = job.dataset, job.settings
-    normalisation = measure_controls(dataset.controls[split[0]], targets.unit)
+    normalisation = measure_controls(dataset.controls[split.train], targets.unit)
     if normalisation.still.any():
         names = [dataset.description["controlNames"][i] for i in np.flatnonzero(normalisation.still)]
         job.say(f"{len(names)} of {dataset.control_count} controls never move in these frames and get no influence, "
@@ -152,7 +162,7 @@ def train_network(job: Job, targets: Targets, split: Split) -> Trained:
                 + (", ..." if len(names) > 5 else ""))
     weights = 4 * parameter_count(settings, dataset.control_count, targets.count)
     job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
-            f"{len(split[0])} frames, validating on {len(split[1])}")
+            f"{len(split.train)} frames, validating on {len(split.validation)}")
     network = build(settings, dataset.control_count, targets.count, normalisation.still)
     with progress.counted(settings.epochs, job.say, job.progress) as on_epoch, \
             progress.noted_interrupt() as is_interrupted:
@@ -165,13 +175,13 @@ def train_network(job: Job, targets: Targets, split: Split) -> Trained:
 def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split) -> None:
     """Writes the model's files, runs them as others will, and refuses them where the outputs differ."""
     network, normalisation, history = trained
-    guard = guard_of(job.settings, job.dataset.controls[split[0]])
+    guard = guard_of(job.settings, job.dataset.controls[split.train])
     model = export.onnx_model(network, normalisation, "deltas" if targets.shapes is None else "weights", guard)
     metadata = export.metadata(job.dataset, job.settings, job.seed)
     if history.interrupted:
         metadata["interruptedAfterEpochs"] = len(history.train)
     export.write_model(part, model, metadata, targets.shapes, targets.halves)
-    rows = report_rows(split)[:VERIFIED_ROWS]
+    rows = split.measured()[1][:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
     wanted = predict(network, normalisation, controls, guard)
     compare(evaluator.NumpyModel(part / "model.onnx").run(controls), wanted, targets.unit, "the exported network")
@@ -193,24 +203,25 @@ def compare(found: np.ndarray, wanted: np.ndarray, unit: float, called: str) -> 
                            f"{TOLERANCE * unit:g}: it is not published")
 
 
-def report_rows(split: Split) -> np.ndarray:
-    """Rows that errors are measured on: those held out, or all where none was."""
-    return split[1] if len(split[1]) else split[0]
-
-
-def summarise(job: Job, trained: Trained, targets: Targets, split: Split) -> dict[str, Any]:
-    network, normalisation, history = trained
-    guard = guard_of(job.settings, job.dataset.controls[split[0]])
+def errors_of(job: Job, trained: Trained, targets: Targets, split: Split) -> Measured:
+    network, normalisation, _ = trained
+    guard = guard_of(job.settings, job.dataset.controls[split.train])
 
     def deltas_of(controls: np.ndarray) -> np.ndarray:
         outputs = predict(network, normalisation, controls, guard)
         return outputs if targets.shapes is None else outputs @ targets.shapes
 
+    return measured(job.dataset, split.measured()[1], deltas_of, targets.shapes)
+
+
+def summarise(job: Job, trained: Trained, targets: Targets, split: Split, errors: Measured) -> dict[str, Any]:
+    network, _, history = trained
+    held = None if job.validation is None else job.validation.folder.resolve().name
     return {
         "dataSet": job.dataset.folder.resolve().name, "model": job.model.name, "seed": job.seed,
-        "threads": job.threads, "torch": str(torch.__version__), "settings": vars(job.settings),
-        "verifiedWithQuarn": job.quarn is not None, "heldOut": len(split[1]) > 0,
-        "errors": measure(job.dataset, report_rows(split), deltas_of, targets.shapes),
+        "threads": job.threads, "versions": report.versions(), "settings": vars(job.settings),
+        "verifiedWithQuarn": job.quarn is not None, "heldOut": split.how != "none",
+        "split": {**split.facts(), "validationSet": held}, "errors": errors.errors,
         "principalShapes": None if targets.shapes is None else len(targets.shapes), "explained": targets.explained,
         "halfPrecision": targets.rounding,
         "parameters": sum(p.numel() for p in network.parameters()),

@@ -1,21 +1,61 @@
 # SPDX-License-Identifier: Apache-2.0
-"""The report folder: report.json and loss.png."""
+"""The report folder: report.json, the errors per frame and vertex as arrays, and of a training the losses."""
 
 import io
 import json
 import os
+import platform
 from pathlib import Path
 from typing import Any
 
+import numpy as np
+
+from . import __version__
+from .dataset import Dataset
 from .files import write_bytes
+from .measure import Measured
 from .training import History
 
-NAMES = ("report.json", "loss.png")
+ERROR_NAMES = ("report.json", "frames.npy", "frameErrors.npy", "vertices.npy", "vertexErrors.npy")
+NAMES = (*ERROR_NAMES, "losses.csv", "loss.png")
 
 
-def write_report(folder: Path, report: dict[str, Any], history: History) -> None:
-    write_bytes(folder / "report.json", (json.dumps(report, indent=1, allow_nan=False) + "\n").encode())
+def write_report(folder: Path, report: dict[str, Any], history: History, dataset: Dataset, errors: Measured) -> None:
+    write_errors(folder, report, dataset, errors)
+    write_bytes(folder / "losses.csv", losses(history).encode())
     draw_losses(folder / "loss.png", history)
+
+
+def write_errors(folder: Path, report: dict[str, Any], dataset: Dataset, errors: Measured) -> None:
+    """report.json, and what the network leaves in mm, a mean and a largest distance each: of every measured frame
+    beside its number, and of every vertex beside its index in the whole mesh."""
+    write_bytes(folder / "report.json", (json.dumps(report, indent=1, allow_nan=False) + "\n").encode())
+    vertices = [dataset.vertex(slot) for slot in range(dataset.delta_count)]
+    for name, numbers, kind in (("frames", dataset.frames[errors.rows], "<i4"), ("frameErrors", errors.by_frame, "<f4"),
+                                ("vertices", np.array(vertices), "<i4"), ("vertexErrors", errors.by_vertex, "<f4")):
+        content = io.BytesIO()
+        np.save(content, np.ascontiguousarray(numbers, kind))
+        write_bytes(folder / f"{name}.npy", content.getvalue())
+
+
+def versions() -> dict[str, str]:
+    """Of what a model depends on."""
+    import torch  # by whoever trains; evaluate does without
+
+    return {"trainer": __version__, "python": platform.python_version(), "torch": str(torch.__version__),
+            "numpy": np.__version__}
+
+
+def sizes(model: Path) -> dict[str, int]:
+    """Bytes of each file of a model directory."""
+    return {path.name: path.stat().st_size for path in sorted(model.iterdir())}
+
+
+def losses(history: History) -> str:
+    """A line of names, and one for each epoch."""
+    held = [str(loss) for loss in history.validation] or [""] * len(history.train)
+    lines = [f"{epoch},{train},{other}" for epoch, (train, other) in enumerate(zip(history.train, held), 1)]
+    return "\n".join(["epoch,training,validation", *lines]) + "\n"
 
 
 def draw_losses(path: Path, history: History) -> None:

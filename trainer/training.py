@@ -1,5 +1,5 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Training: the split of the rows, the loop over epochs. The same seed gives the same bits."""
+"""Training: the loop over epochs. The same seed gives the same bits."""
 
 import copy
 import math
@@ -13,8 +13,8 @@ from torch import nn
 from .errors import TrainerError
 from .schedule import Schedule
 from .settings import Settings
+from .split import Split
 
-Split = tuple[np.ndarray, np.ndarray]             # rows to train on, rows to validate on
 TargetsOf = Callable[[np.ndarray], np.ndarray]    # normalised outputs, float32 [n, K], for sorted rows
 
 
@@ -33,15 +33,6 @@ def make_deterministic(seed: int, threads: int) -> None:
     torch.set_num_threads(threads)
 
 
-def split_rows(count: int, ratio: float, seed: int) -> Split:
-    """Sorted rows to train on, and rows to validate on, drawn at random: the poses of a data set are in no order.
-
-    At least one row is left to train on; with a ratio above 0 and two rows, one validates."""
-    held = min(count - 1, max(1, round(count * ratio))) if ratio > 0 else 0
-    order = np.random.default_rng(seed).permutation(count)
-    return np.sort(order[held:]), np.sort(order[:held])
-
-
 def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Split, settings: Settings, seed: int,
         on_epoch: Callable[[History], None], is_interrupted: Callable[[], bool]) -> History:
     """Trains `network` and leaves it with its best weights.
@@ -53,7 +44,7 @@ def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Sp
     is_interrupted  asked before each step: a yes ends the training with what was best until then, and with
                     KeyboardInterrupt where no epoch was finished
     """
-    rows, held = split
+    rows, held = split.train, split.validation
     order = np.random.default_rng((seed, 1))
     optimizer = torch.optim.Adam(network.parameters(), lr=settings.learningRate)
     schedule = Schedule(settings.learningRate, settings.epochs, settings.patience)

@@ -11,11 +11,15 @@ COLUMNS, ROWS = 8, 6
 
 
 def make(folder: Path, frames: int = 160, seed: int = 7, affect: Optional[Sequence[int]] = None,
-         train: Optional[dict[str, Any]] = None, constant_control: bool = False, **changes: Any) -> Path:
-    """A bulge and a twist on a grid of 48 vertices, for three controls. `affect`: vertices of a partial subset."""
+         train: Optional[dict[str, Any]] = None, constant_control: bool = False, motion: bool = False,
+         skin: Optional[np.ndarray] = None, **changes: Any) -> Path:
+    """A bulge and a twist on a grid of 48 vertices, for three controls. `affect`: vertices of a partial subset;
+    `motion`: rows that follow each other, instead of drawn ones; `skin`: float32 [frames, vertices] distances."""
     folder.mkdir(parents=True)
     random = np.random.default_rng(seed)
     controls = random.uniform(-1, 1, (frames, 3))
+    if motion:
+        controls = np.sin(np.arange(frames)[:, None] / (5, 7, 11) + controls[0])
     deltas = deltas_of(controls)
     if constant_control:
         controls = np.hstack([controls, np.full((frames, 1), 5.0)])
@@ -41,6 +45,10 @@ def make(folder: Path, frames: int = 160, seed: int = 7, affect: Optional[Sequen
     np.save(folder / "controls.npy", controls.astype("<f4"))
     np.save(folder / "deltas.npy", np.ascontiguousarray(deltas, "<f4"))
     np.save(folder / "frames.npy", np.arange(101, 101 + frames, dtype="<i4"))
+    if skin is not None:
+        np.save(folder / "skin.npy", skin)
+        changes = {"files": {"controls": "controls.npy", "deltas": "deltas.npy", "frames": "frames.npy",
+                             "skin": "skin.npy"}, **changes}
     (folder / "dataset.json").write_text(json.dumps({**description, **changes}))
     return folder
 

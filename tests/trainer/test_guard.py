@@ -15,7 +15,7 @@ from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory
 from trainer.guard import check_guard
 from trainer.settings import GUARDS, Settings, override
-from trainer.training import split_rows
+from trainer.split import split_rows
 
 WIDTH = 0.5
 HELD_OUT = 0.9  # extremes of the controls are among them
@@ -37,7 +37,7 @@ class GuardTest(unittest.TestCase):
                                                 lambda line: None, False))
                     models[guard] = ModelDirectory(path, None)
                 with self.subTest(shapes=shapes):
-                    rows = dataset.controls[split_rows(dataset.frame_count, HELD_OUT, 1)[0]]
+                    rows = dataset.controls[split_rows(dataset, HELD_OUT, 1).train]
                     self.check(models, rows)
 
     def check(self, models: dict[str, ModelDirectory], rows: np.ndarray) -> None:

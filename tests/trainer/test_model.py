@@ -18,7 +18,7 @@ from trainer import export, halves, memory, pipeline, shapes
 from trainer.dataset import load_dataset
 from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory, NumpyModel
-from trainer.measure import Distances, advice
+from trainer.measure import Distances, advice, lengths_of
 from trainer.network import check_size
 from trainer.plausible import doubts
 from trainer.schedule import Schedule
@@ -246,16 +246,18 @@ class ShapesTest(unittest.TestCase):
 class AdviceTest(unittest.TestCase):
     def test_says_what_the_errors_mean(self) -> None:
         def stage(mean: float, p99: float) -> dict[str, dict[str, float]]:
-            return {"mean": {"mm": mean}, "p99": {"mm": p99}}
+            return {"mean": {"mm": mean}, "p99": {"mm": p99}, "p9999": {"mm": p99}}
 
         for basis, network, explained, wanted in (
                 (stage(1, 3), stage(1.3, 3), 0.87, "an accuracy of 0.8 and at most 20 .* 87.0 %"),
                 (stage(1, 3), stage(1.5, 3), 0.87, None), (stage(1, 3), stage(1.3, 3), 0.995, None),
                 (None, stage(1, 3), None, None),
-                (None, stage(5, 13), None, r"more than no correction does \(mean and p99\)"),
-                (None, stage(1, 13), None, r"\(p99\)")):
-            said = " ".join(advice({"base": stage(4, 12), "basis": basis, "network": network}, explained, Settings()))
-            self.assertRegex(said, wanted or r"\A\Z")
+                (None, stage(5, 13), None, r"more than the skin would \(mean and p99 and p99.99\)"),
+                (None, stage(1, 13), None, r"\(p99 and p99.99\)")):
+            stages = {"skin": stage(4, 12), "base": stage(6, 15), "basis": basis, "network": network}
+            self.assertRegex(" ".join(advice(stages, explained, Settings())), wanted or r"\A\Z")
+        said = advice({**stages, "skin": None, "network": stage(1, 16)}, None, Settings())
+        self.assertRegex(said[0], r"more than zero deltas would \(p99 and p99.99\)")
 
 
 class SizesTest(unittest.TestCase):
@@ -273,13 +275,15 @@ class DistancesTest(unittest.TestCase):
         random = np.random.default_rng(5)
         for scale, kept, tolerance in ((1e-4, 0, 1e-3), (1.0, 0, 1e-3), (1e4, 1000, 1e-3), (1.0, 2000, 1e-12)):
             differences = (scale * random.standard_normal((50, 3 * 40))).astype(np.float32)
-            distances = Distances()
+            distances = Distances(40)
             with mock.patch("trainer.measure.KEPT", kept):
                 for first in range(0, 50, 7):
-                    distances.add(np.arange(first, min(first + 7, 50)), differences[first:first + 7])
+                    part = differences[first:first + 7]
+                    distances.add(np.arange(first, first + len(part)), lengths_of(part))
             lengths = np.linalg.norm(differences.reshape(50, 40, 3).astype(np.float64), axis=2)
-            ranked = np.quantile(lengths, 0.99, method="linear" if kept == 2000 else "inverted_cdf")
-            self.assertAlmostEqual(distances.percentile(0.99) / ranked, 1, delta=tolerance)
+            for name, share in (("p99", 0.99), ("p9999", 0.9999)):
+                ranked = np.quantile(lengths, share, method="linear" if kept == 2000 else "inverted_cdf")
+                self.assertAlmostEqual(distances.figures()[name] / ranked, 1, delta=tolerance)
             self.assertEqual(distances.where, np.unravel_index(np.argmax(lengths), lengths.shape))
             self.assertAlmostEqual(distances.total / lengths.sum(), 1, places=12)
 
