@@ -43,7 +43,8 @@ MEANINGS = {
     "batchSize": "rows of a step",
     "epochs": "passes over the rows; the learning rate falls to 0 over them",
     "learningRate": "of Adam, at the start",
-    "validationRatio": "part of the rows that are held out, and that errors are told of",
+    "validationRatio": "part of the rows that is not trained on: half of it chooses the epoch, errors are told of the "
+                       "other half",
     "hiddenLayerCount": "hidden layers",
     "neuronsPerLayer": "neurons of each hidden layer",
     "activationFunction": "one of " + ", ".join(ACTIVATIONS),
