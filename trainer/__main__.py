@@ -82,9 +82,22 @@ def add_train(commands: "argparse._SubParsersAction[Parser]") -> None:
     train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model; of several "
                        "the folder of these")
     add_quarn(train)
+    add_going_on(train)
     train.add_argument("--quiet", action="store_true", help="only errors")
     train.add_argument("--json", action="store_true", help="write the report to standard output as well")
     add_settings(train.add_argument_group("settings", SETTINGS_RULE))
+
+
+def add_going_on(train: argparse.ArgumentParser) -> None:
+    goes_on = train.add_mutually_exclusive_group()
+    goes_on.add_argument("--resume", dest="resume", action="store_const", const="resume", default="anew",
+                         help="go on from NAME.checkpoint beside the model, which an interrupted training has left")
+    goes_on.add_argument("--resume-if-fits", dest="resume", action="store_const", const="if fits",
+                         help="the same, and begin anew where that is of another training or damaged")
+    train.add_argument("--checkpoint-every", type=float, default=60, metavar="SECONDS",
+                       help="how often it is written (default 60), if that takes at most 2 %% of the time")
+    train.add_argument("--device", default="cpu", metavar="DEVICE",
+                       help="cpu (default), cuda, or auto: cuda where there is one. The model depends on it")
 
 
 SETTINGS_RULE = ("Each takes the place of the data set's, which come from the node's train attributes; what the data "
@@ -131,6 +144,8 @@ def settings_text() -> str:
 def command_train(options: argparse.Namespace) -> int:
     if not 0 <= options.seed < 2**32:
         raise TrainerError(f"--seed is {options.seed}, not a whole number from 0 to {2**32 - 1}")
+    if not 0 <= options.checkpoint_every <= 1e6:
+        raise TrainerError(f"--checkpoint-every is {options.checkpoint_every:g}, not a number of seconds from 0 to 1e6")
     pin_threads(options.threads)
     from . import folders
 
@@ -148,13 +163,14 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     """Trains the model of a data set. Returns its report."""
     from . import evaluator, pipeline
     from .dataset import load_dataset
+    from .device import Device
     from .guard import check_guard
     from .measure import advice, as_lines
     from .settings import KINDS, override
     from .split import sentence
 
     say = speaker(options)
-    quarn = evaluator.find_quarn(options.quarn)
+    quarn, device = evaluator.find_quarn(options.quarn), Device(options.device)
     dataset = load_dataset(folder)
     validation = load_dataset(options.validation_set) if options.validation_set else None
     changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
@@ -163,7 +179,8 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     model = model_of(settings)
     report = Path(wanted_report) if wanted_report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
-                                         not options.quiet, validation))
+                                         not options.quiet, validation, options.resume,
+                                         options.checkpoint_every, device))
     for line in [*as_lines(result["errors"]), sentence(result["split"]),
                  *advice(result["errors"], result["explained"], settings)]:
         say(line)

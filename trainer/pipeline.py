@@ -2,14 +2,16 @@
 """From a data set to a published model: targets, training, export, verification, errors."""
 
 import time
-from dataclasses import dataclass, replace
+from dataclasses import dataclass, field, replace
 from pathlib import Path
 from typing import Any, Callable, Optional
 
 import numpy as np
 
-from . import evaluator, export, files, memory, plausible, progress, report
+from . import evaluator, export, files, memory, plausible, progress, report, resume
+from .checkpoint import Checkpoints
 from .dataset import Dataset
+from .device import Device
 from .errors import TrainerError
 from .guard import guard_of
 from .halves import Halves, rounding, to_halves
@@ -41,6 +43,9 @@ class Job:
     say: Callable[[str], None]  # takes a line for the user
     progress: bool
     validation: Optional[Dataset] = None  # rows that are held out; without it some of the data set's
+    going_on: str = resume.ANEW             # from a checkpoint; a wish of resume
+    checkpoint_every: float = resume.EVERY  # seconds
+    device: Device = field(default_factory=lambda: Device("cpu"))
 
 
 @dataclass(frozen=True)
@@ -77,6 +82,8 @@ def train(job: Job) -> dict[str, Any]:
             history, errors, result = train_into(job, part, split)
             result["seconds"] = time.monotonic() - start
             report.write_report(report_part, result, history, job.dataset, errors)
+    if not history.interrupted:
+        resume.discard(job.model)
     return result
 
 
@@ -161,15 +168,25 @@ def train_network(job: Job, targets: Targets, split: Split) -> Trained:
                 f"as of a joint that turns about one axis only: {', '.join(names[:5])}"
                 + (", ..." if len(names) > 5 else ""))
     weights = 4 * parameter_count(settings, dataset.control_count, targets.count)
-    job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
-            f"{len(split.train)} frames, validating on {len(split.validation)}")
-    network = build(settings, dataset.control_count, targets.count, normalisation.still)
-    with progress.counted(settings.epochs, job.say, job.progress) as on_epoch, \
-            progress.noted_interrupt() as is_interrupted:
-        history = fit(network, normalisation.normalised(dataset.controls), targets.of, split, settings, job.seed,
-                      on_epoch, is_interrupted)
+    inputs = normalisation.normalised(dataset.controls)
+    with progress.noted_signals() as ended_by:
+        job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
+                f"{len(split.train)} frames, validating on {len(split.validation)}")
+        network = build(settings, dataset.control_count, targets.count, normalisation.still)
+        checkpoints = open_checkpoints(job, inputs, targets, split)
+        with progress.counted(settings.epochs, job.say, job.progress) as on_epoch:
+            history = fit(network, inputs, targets.of, split, settings, job.seed, on_epoch, ended_by, job.device,
+                          checkpoints)
     job.say(f"{len(history.train)} epochs, the best is {history.best_epoch} with a loss of {history.best_loss:.3e}")
     return network, normalisation, history
+
+
+def open_checkpoints(job: Job, inputs: np.ndarray, targets: Targets, split: Split) -> Checkpoints:
+    identity = {**resume.identity_of(job.dataset, job.validation, job.settings, job.seed, job.threads, job.device.kind,
+                                     None),
+                "digest of what is learned": resume.digest_of(inputs, targets.of, split)}
+    return resume.open_checkpoints(resume.checkpoint_path(job.model), identity, job.checkpoint_every, job.going_on,
+                                   job.say)
 
 
 def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split) -> None:
@@ -219,7 +236,8 @@ def summarise(job: Job, trained: Trained, targets: Targets, split: Split, errors
     held = None if job.validation is None else job.validation.folder.resolve().name
     return {
         "dataSet": job.dataset.folder.resolve().name, "model": job.model.name, "seed": job.seed,
-        "threads": job.threads, "versions": report.versions(), "settings": vars(job.settings),
+        "threads": job.threads, "device": job.device.kind, "versions": report.versions(),
+        "settings": vars(job.settings),
         "verifiedWithQuarn": job.quarn is not None, "heldOut": split.how != "none",
         "split": {**split.facts(), "validationSet": held}, "errors": errors.errors,
         "principalShapes": None if targets.shapes is None else len(targets.shapes), "explained": targets.explained,

@@ -9,7 +9,7 @@ from typing import Callable, Iterator, Optional
 
 from tqdm import tqdm
 
-from .training import History
+from .state import History
 
 LINES = 20  # where there is no terminal to draw a bar on
 
@@ -35,20 +35,25 @@ def say_line(done: int, epochs: int, history: History, say: Callable[[str], None
 
 
 @contextmanager
-def noted_interrupt() -> Iterator[Callable[[], bool]]:
-    """Gives what tells whether the user has pressed Ctrl-C in the meantime. A second one ends the program at once."""
+def noted_signals() -> Iterator[Callable[[], int]]:
+    """Gives what tells which signal has come in the meantime: SIGINT (Ctrl-C), SIGTERM, or none (0). A second one ends
+    the program at once."""
     asked: list[int] = []
+    before = {number: signal.getsignal(number) for number in (signal.SIGINT, signal.SIGTERM)}
 
-    def on_interrupt(number: int, frame: Optional[FrameType]) -> None:
+    def on_signal(number: int, frame: Optional[FrameType]) -> None:
         asked.append(number)
         signal.signal(signal.SIGINT, signal.default_int_handler)
-        print("trainer: interrupted: the training ends with the best network so far (Ctrl-C again: without)",
-              file=sys.stderr, flush=True)
+        signal.signal(signal.SIGTERM, before[signal.SIGTERM])
+        if number == signal.SIGINT:
+            print("trainer: interrupted: the training ends with the best network so far (Ctrl-C again: without)",
+                  file=sys.stderr, flush=True)
 
-    before = signal.getsignal(signal.SIGINT)
-    if before is not signal.SIG_IGN:  # as in a job that a script has put into the background
-        signal.signal(signal.SIGINT, on_interrupt)
+    for number, handler in before.items():
+        if handler is not signal.SIG_IGN:  # as in a job that a script has put into the background
+            signal.signal(number, on_signal)
     try:
-        yield lambda: bool(asked)
+        yield lambda: asked[0] if asked else 0
     finally:
-        signal.signal(signal.SIGINT, before)
+        for number, handler in before.items():
+            signal.signal(number, handler)

@@ -14,7 +14,7 @@ from . import __version__
 from .dataset import Dataset
 from .files import write_bytes
 from .measure import Measured
-from .training import History
+from .state import History
 
 ERROR_NAMES = ("report.json", "frames.npy", "frameErrors.npy", "vertices.npy", "vertexErrors.npy")
 NAMES = (*ERROR_NAMES, "losses.csv", "loss.png")

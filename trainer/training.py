@@ -1,30 +1,22 @@
 # SPDX-License-Identifier: Apache-2.0
 """Training: the loop over epochs. The same seed gives the same bits."""
 
-import copy
 import math
-from dataclasses import dataclass, field
-from typing import Callable, Optional
+import signal
+from typing import Callable
 
 import numpy as np
 import torch
-from torch import nn
 
-from .errors import TrainerError
-from .schedule import Schedule
+from .checkpoint import Checkpoints
+from .device import Device
+from .errors import Terminated, TrainerError
+from .network import Network
 from .settings import Settings
 from .split import Split
+from .state import History, State
 
 TargetsOf = Callable[[np.ndarray], np.ndarray]    # normalised outputs, float32 [n, K], for sorted rows
-
-
-@dataclass
-class History:
-    train: list[float] = field(default_factory=list)       # mean loss of each epoch
-    validation: list[float] = field(default_factory=list)  # empty without validation rows
-    best_epoch: int = 0                             # from 1
-    best_loss: float = math.inf
-    interrupted: bool = False                       # by the user, who gets what was best until then
 
 
 def make_deterministic(seed: int, threads: int) -> None:
@@ -33,44 +25,45 @@ def make_deterministic(seed: int, threads: int) -> None:
     torch.set_num_threads(threads)
 
 
-def fit(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, split: Split, settings: Settings, seed: int,
-        on_epoch: Callable[[History], None], is_interrupted: Callable[[], bool]) -> History:
-    """Trains `network` and leaves it with its best weights.
+def fit(network: Network, inputs: np.ndarray, targets_of: TargetsOf, split: Split, settings: Settings, seed: int,
+        on_epoch: Callable[[History], None], ended_by: Callable[[], int], device: Device,
+        checkpoints: Checkpoints) -> History:
+    """Trains `network` and leaves it, on the processor, with its best weights.
 
-    inputs          float32 [F, C], normalised controls of all rows
-    targets_of      gives float32 [n, K], normalised outputs, for an array of sorted rows
-    split           rows to train on, rows to validate on (may be none: then the training loss decides)
-    on_epoch        called with the History after each epoch; what it raises ends the training
-    is_interrupted  asked before each step: a yes ends the training with what was best until then, and with
-                    KeyboardInterrupt where no epoch was finished
+    inputs       float32 [F, C], normalised controls of all rows
+    targets_of   gives float32 [n, K], normalised outputs, for an array of sorted rows
+    split        rows to train on, rows to validate on (may be none: then the training loss decides)
+    on_epoch     called with the History after each epoch; what it raises ends the training
+    ended_by     asked before each step for the number of a signal that came, or 0. SIGINT ends the training with what
+                 was best until then, and with KeyboardInterrupt where no epoch was finished; SIGTERM with Terminated.
+                 A checkpoint is written before
+    checkpoints  where they go, and whether the training goes on from the one that is there
     """
     rows, held = split.train, split.validation
+    state = State(network, settings, device)
+    if checkpoints.resumed:
+        checkpoints.restore(state)
     order = np.random.default_rng((seed, 1))
-    optimizer = torch.optim.Adam(network.parameters(), lr=settings.learningRate)
-    schedule = Schedule(settings.learningRate, settings.epochs, settings.patience)
-    history, best, epoch = History(), None, 0
-    while epoch < schedule.end:
-        epoch += 1
+    for _ in range(state.epoch):
+        order.permutation(rows)
+    history = state.history
+    while state.epoch < state.schedule.end:
         batches = cut(order.permutation(rows), settings.batchSize)
-        loss = train_epoch(network, inputs, targets_of, batches, optimizer, schedule, epoch - 1, is_interrupted)
-        if loss is None:
+        if not train_epoch(state, inputs, targets_of, batches, ended_by, checkpoints):
             history.interrupted = True
             break
-        history.train.append(loss)
-        if len(held):
-            history.validation.append(mean_loss(network, inputs, targets_of, cut(held, settings.batchSize)))
-        loss = (history.validation or history.train)[-1]
-        if not math.isfinite(loss):
-            raise TrainerError(f"the loss of epoch {epoch} is {loss}: the training has diverged; give a learning rate "
-                               f"below {settings.learningRate:g}")
-        if loss < history.best_loss:
-            history.best_loss, history.best_epoch = loss, epoch
-            best = copy.deepcopy(network.state_dict())
+        loss = state.total / len(rows)
+        validation = mean_loss(state, inputs, targets_of, cut(held, settings.batchSize)) if len(held) else None
+        for value in (loss, validation):
+            if value is not None and not math.isfinite(value):
+                raise TrainerError(f"the loss of epoch {state.epoch + 1} is {value}: the training has diverged; give a "
+                                   f"learning rate below {settings.learningRate:g}")
+        state.note_loss(loss, validation)
         on_epoch(history)
-        schedule.note(epoch, history.best_epoch)
-    if best is None:
+    if state.best is None:
         raise KeyboardInterrupt("before an epoch was finished: there is no network yet")
-    network.load_state_dict(best)
+    network.load_state_dict(state.best)
+    network.cpu()
     return history
 
 
@@ -79,30 +72,36 @@ def cut(rows: np.ndarray, size: int) -> list[np.ndarray]:
     return [np.sort(rows[first:first + size]) for first in range(0, len(rows), size)]
 
 
-def train_epoch(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray],
-                optimizer: torch.optim.Optimizer, schedule: Schedule, epoch: int,
-                is_interrupted: Callable[[], bool]) -> Optional[float]:
-    """The mean loss; None where the epoch was not finished."""
-    network.train()
-    total = 0.0
-    for index, batch in enumerate(batches):
-        if is_interrupted():
-            return None
-        optimizer.param_groups[0]["lr"] = schedule.at(epoch * len(batches) + index, len(batches))
-        optimizer.zero_grad()
-        loss = batch_loss(network, inputs, targets_of, batch)
+def train_epoch(state: State, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray],
+                ended_by: Callable[[], int], checkpoints: Checkpoints) -> bool:
+    """The steps of an epoch that are not done yet. False where the user has ended it."""
+    state.network.train()
+    for batch in batches[state.batch:]:
+        signalled = ended_by()
+        if signalled or checkpoints.is_due():
+            checkpoints.save(state)
+        if signalled == signal.SIGTERM:
+            raise Terminated
+        if signalled:
+            return False
+        state.optimizer.param_groups[0]["lr"] = state.schedule.at(state.epoch * len(batches) + state.batch,
+                                                                  len(batches))
+        state.optimizer.zero_grad()
+        loss = batch_loss(state, inputs, targets_of, batch)
         loss.backward()
-        optimizer.step()
-        total += float(loss.detach()) * len(batch)
-    return total / sum(map(len, batches))
+        state.optimizer.step()
+        state.total += float(loss.detach()) * len(batch)
+        state.batch += 1
+    return True
 
 
-def mean_loss(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray]) -> float:
-    network.eval()
+def mean_loss(state: State, inputs: np.ndarray, targets_of: TargetsOf, batches: list[np.ndarray]) -> float:
+    state.network.eval()
     with torch.no_grad():
-        total = sum(float(batch_loss(network, inputs, targets_of, batch)) * len(batch) for batch in batches)
+        total = sum(float(batch_loss(state, inputs, targets_of, batch)) * len(batch) for batch in batches)
     return total / sum(map(len, batches))
 
 
-def batch_loss(network: nn.Module, inputs: np.ndarray, targets_of: TargetsOf, batch: np.ndarray) -> torch.Tensor:
-    return torch.nn.functional.mse_loss(network(torch.from_numpy(inputs[batch])), torch.from_numpy(targets_of(batch)))
+def batch_loss(state: State, inputs: np.ndarray, targets_of: TargetsOf, batch: np.ndarray) -> torch.Tensor:
+    to = state.device.tensor
+    return torch.nn.functional.mse_loss(state.network(to(inputs[batch])), to(targets_of(batch)))

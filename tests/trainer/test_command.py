@@ -89,29 +89,35 @@ class CommandTest(unittest.TestCase):
         self.assertFalse((self.place / "m/arm.nwrp/principal_shapes.json").exists())
 
     def test_killed_at_any_time(self) -> None:
-        self.run_trainer(*TRAIN, "--epochs", "30")
+        longer = (*TRAIN, "--epochs", "600", "--patience", "600")
+        self.run_trainer(*longer)
         wanted = self.digest()
         self.run_trainer(*TRAIN, "--seed", "2")
         before = self.digest()
         moments = random.Random(4)
-        for _ in range(6):
-            process = self.start(*TRAIN, "--epochs", "30")
-            time.sleep(moments.uniform(0, 2.5))
+        checkpoint = self.place / "m/arm.checkpoint"
+        for wait in (0.5, 2, 10, 10):
+            process = self.start(*longer, "--checkpoint-every", "0", "--resume")
+            end = time.monotonic() + wait
+            while time.monotonic() < end and process.poll() is None and not (wait > 2 and checkpoint.exists()):
+                time.sleep(moments.uniform(0, 0.05))
             process.kill()
             process.communicate()
             self.assertIn(self.digest(), (before, wanted))
-        self.run_trainer(*TRAIN, "--epochs", "30")
+        self.assertTrue(checkpoint.exists())
+        self.assertIn("going on from m/arm.checkpoint", self.run_trainer(*longer, "--resume")[0])
         self.assertEqual(self.digest(), wanted)
         self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
 
     def test_interrupted(self) -> None:
-        """SIGTERM leaves nothing, Ctrl-C the best network so far; and nothing where there is none yet."""
+        """Both leave a checkpoint, and Ctrl-C the best network so far where there is one."""
         for number, after, status, said, left in (
-                (signal.SIGTERM, "validating on", 143, "", []),
-                (signal.SIGINT, "validating on", 130, "trainer: interrupted", []),
-                (signal.SIGINT, "epoch 2000 of", 130, "ends with the best network so far", ["arm.nwrp", "arm.report"])):
+                (signal.SIGTERM, "validating on", 143, "", ["arm.checkpoint"]),
+                (signal.SIGINT, "validating on", 130, "trainer: interrupted", ["arm.checkpoint"]),
+                (signal.SIGINT, "epoch 2000 of", 130, "ends with the best network so far",
+                 ["arm.checkpoint", "arm.nwrp", "arm.report"])):
             # epochs of one step, or of many slow ones
-            more = ("--batch-size", "100000") if left else ("--batch-size", "1", "--neurons", "3000")
+            more = ("--batch-size", "100000") if "arm.nwrp" in left else ("--batch-size", "1", "--neurons", "3000")
             process = self.start(*TRAIN, "--epochs", "40000", "--patience", "40000", *more)
             assert process.stdout
             while after not in process.stdout.readline():
@@ -121,7 +127,7 @@ class CommandTest(unittest.TestCase):
             self.assertEqual(process.returncode, status, out + err)
             self.assertIn(said, err)
             self.assertEqual(sorted(os.listdir(self.place / "m")), left, err)
-            if left:
+            if "arm.nwrp" in left:
                 report, metadata = (json.loads((self.place / "m" / name).read_text())
                                     for name in ("arm.report/report.json", "arm.nwrp/metadata.json"))
                 self.assertTrue(report["interrupted"] and 2000 <= report["epochs"] < 40000)
