@@ -17,6 +17,7 @@ from .guard import guard_of
 from .halves import Halves, rounding, to_halves
 from .measure import Measured, measured
 from .network import Network, Normalisation, build, check_size, measure_controls, parameter_count, predict
+from .rest import with_rest
 from .settings import Settings
 from .shapes import principal_basis
 from .split import Split, join, split_rows, split_with
@@ -76,6 +77,7 @@ def train(job: Job) -> dict[str, Any]:
     for doubt in plausible.doubts(dataset):
         job.say(doubt)
     job, split = split_job(job)
+    split = with_rest(job.dataset, split)
     # the inner one is published first: a report without its model would be a lie
     with files.whole_folder(job.report, report.NAMES) as report_part:
         with files.whole_folder(job.model, MODEL_NAMES) as part:

@@ -74,6 +74,6 @@ def identity_of(dataset: Dataset, validation: Optional[Dataset], settings: Setti
 def digest_of(inputs: np.ndarray, targets_of: TargetsOf, split: Split) -> str:
     """Of what the network learns. Shapes of another processor are others: in their last bits, or altogether."""
     digest = hashlib.sha256()
-    for array in (inputs, split.train, split.validation, targets_of(split.train[:LOOKED_AT])):
+    for array in (inputs, split.train, split.again, split.validation, targets_of(split.train[:LOOKED_AT])):
         digest.update(np.ascontiguousarray(array).data)
     return digest.hexdigest()

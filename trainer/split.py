@@ -31,6 +31,7 @@ class Split(NamedTuple):
     test: np.ndarray        # choose nothing
     how: str                # "random", "blocks", "random and blocks" or "none"
     left_out: int = 0       # rows that are in no part
+    again: np.ndarray = np.arange(0)  # of those that are trained on, what an epoch has once more; with repetitions
 
     def measured(self) -> tuple[str, np.ndarray]:
         """The rows that errors are told of, and which part they are: the last one that has any."""

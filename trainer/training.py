@@ -39,7 +39,7 @@ def fit(network: Network, inputs: np.ndarray, targets_of: TargetsOf, split: Spli
                  A checkpoint is written before
     checkpoints  where they go, and whether the training goes on from the one that is there
     """
-    rows, held = split.train, split.validation
+    rows, held = np.concatenate([split.train, split.again]), split.validation
     state = State(network, settings, device)
     if checkpoints.resumed:
         checkpoints.restore(state)
