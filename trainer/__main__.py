@@ -121,8 +121,10 @@ def add_settings(group: argparse._ArgumentGroup) -> None:
     kind.add_argument("--principal-shapes", dest="principalShapesEnabled", action="store_true", default=None,
                       help=described("principalShapesEnabled"))
     kind.add_argument("--direct", dest="principalShapesEnabled", action="store_false", help="learn the deltas")
-    group.add_argument("--linear-path", dest="linearPath", action="store_true", default=None,
+    group.add_argument("--linear-path", dest="linearPath", action=argparse.BooleanOptionalAction,
                        help=described("linearPath"))
+    group.add_argument("--local-neurons", dest="localNeurons", action=argparse.BooleanOptionalAction,
+                       help=described("localNeurons"))
     group.add_argument("--half-shapes", dest="principalShapesHalf", action="store_true", default=None,
                        help=described("principalShapesHalf"))
     group.add_argument("--preload", dest="preloadData", action=argparse.BooleanOptionalAction,
@@ -134,7 +136,8 @@ def settings_text() -> str:
     from .settings import described
 
     flags = {**SETTING_FLAGS, "principalShapesEnabled": "--principal-shapes",
-             "linearPath": "--linear-path", "principalShapesHalf": "--half-shapes", "preloadData": "--preload"}
+             "linearPath": "--linear-path", "localNeurons": "--local-neurons",
+             "principalShapesHalf": "--half-shapes", "preloadData": "--preload"}
     return "\n".join(["settings of train, for everything else see 'trainer train --help':",
                       *(f"  {flag:22} {described(name)}" for name, flag in flags.items()), "", SETTINGS_RULE])
 

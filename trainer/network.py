@@ -11,10 +11,12 @@ from torch import nn
 
 from .errors import TrainerError
 from .guard import Guard
+from .line import Line
 from .settings import Settings
 
 WEIGHT_BYTES_LIMIT = 1_500_000_000  # an ONNX file of one piece ends at 2 GiB
 LEAKY_SLOPE = 0.01
+AT_THE_START = 0.1  # of their usual size: weights of the last layer beside a line, which they are to correct
 CONSTANT = 1e-6  # a control whose deviation is below this part of the common one counts as never moved
 
 MODULES = {"Sigmoid": nn.Sigmoid, "Tanh": nn.Tanh, "ReLU": nn.ReLU, "LeakyReLU": lambda: nn.LeakyReLU(LEAKY_SLOPE),
@@ -78,8 +80,14 @@ def check_size(settings: Settings, inputs: int, outputs: int) -> None:
                        f"{WEIGHT_BYTES_LIMIT / 1e9} GB a model may have: {advice}")
 
 
-def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> Network:
-    """The network, initialised by torch's generator. `still` [inputs]: controls that must have no influence."""
+def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray, line: Optional[Line] = None,
+          seen: Optional[np.ndarray] = None) -> Network:
+    """The network, initialised by torch's generator.
+
+    still  bool [inputs]: controls that must have no influence
+    line   where the straight line beside the layers begins, for settings that have one; at 0 where none is given
+    seen   bool [neurons, inputs]: controls that each neuron of the first layer sees; all where it is not given
+    """
     layers: list[nn.Module] = []
     for before, after in layer_sizes(settings, inputs, outputs):
         layers.append(nn.Linear(before, after))
@@ -90,13 +98,27 @@ def build(settings: Settings, inputs: int, outputs: int, still: np.ndarray) -> N
     while not isinstance(layers[-1], nn.Linear):  # nothing follows the last layer
         layers.pop()
     chain = nn.Sequential(*layers)
-    line = nn.Linear(inputs, outputs, bias=False) if settings.linearPath else None
+    beside = nn.Linear(inputs, outputs, bias=False) if settings.linearPath else None
     with torch.no_grad():
+        if seen is not None:
+            narrow(chain[0], torch.from_numpy(seen))
         # their input is 0 all through the training, so the weights would stay as random as they began
         chain[0].weight[:, torch.from_numpy(still)] = 0
-        if line is not None:
-            line.weight.zero_()  # the layers start as they would without it
-    return Network(chain, line)
+        if beside is not None:
+            beside.weight.zero_()
+        if beside is not None and line is not None:
+            beside.weight.copy_(torch.from_numpy(line.weights))
+            chain[-1].weight.mul_(AT_THE_START)
+            chain[-1].bias.copy_(torch.from_numpy(line.offset))
+    return Network(chain, beside)
+
+
+def narrow(layer: nn.Linear, seen: torch.Tensor) -> None:
+    """Leaves each neuron the inputs that it is to see, bool [neurons, inputs], now and through the training."""
+    mask = seen.to(layer.weight.dtype)
+    counts = mask.sum(dim=1, keepdim=True)
+    layer.weight.mul_(mask * torch.sqrt(layer.in_features / counts.clamp(min=1)))  # sums as large as those of all
+    layer.weight.register_hook(lambda gradient: gradient * mask)
 
 
 def predict(network: Network, normalisation: Normalisation, controls: np.ndarray,

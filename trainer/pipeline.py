@@ -15,7 +15,9 @@ from .device import Device
 from .errors import TrainerError
 from .guard import guard_of
 from .halves import Halves, rounding, to_halves
+from .line import Line, best_line
 from .measure import Measured, measured
+from .neighbourhoods import plugs_of, seen_by_neurons, shares
 from .network import Network, Normalisation, build, check_size, measure_controls, parameter_count, predict
 from .rest import with_rest
 from .settings import Settings
@@ -171,10 +173,12 @@ def train_network(job: Job, targets: Targets, split: Split) -> Trained:
                 + (", ..." if len(names) > 5 else ""))
     weights = 4 * parameter_count(settings, dataset.control_count, targets.count)
     inputs = normalisation.normalised(dataset.controls)
+    line = best_line(inputs, targets.of, split.train, normalisation.still)
+    seen = seen_controls(job, line, targets) if settings.localNeurons else None
     with progress.noted_signals() as ended_by:
         job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
                 f"{len(split.train)} frames, validating on {len(split.validation)}")
-        network = build(settings, dataset.control_count, targets.count, normalisation.still)
+        network = build(settings, dataset.control_count, targets.count, normalisation.still, line, seen)
         checkpoints = open_checkpoints(job, inputs, targets, split)
         with progress.counted(settings.epochs, job.say, job.progress) as on_epoch:
             history = fit(network, inputs, targets.of, split, settings, job.seed, on_epoch, ended_by, job.device,
@@ -189,6 +193,16 @@ def open_checkpoints(job: Job, inputs: np.ndarray, targets: Targets, split: Spli
                 "digest of what is learned": resume.digest_of(inputs, targets.of, split)}
     return resume.open_checkpoints(resume.checkpoint_path(job.model), identity, job.checkpoint_every, job.going_on,
                                    job.say)
+
+
+def seen_controls(job: Job, line: Line, targets: Targets) -> np.ndarray:
+    plugs = plugs_of(job.dataset.description["controlNames"])
+    neighbours = shares(line.weights, targets.shapes, plugs)
+    seen = seen_by_neurons(neighbours, plugs, job.dataset.control_count, job.settings.neuronsPerLayer)
+    local = seen[~seen.all(axis=1)]
+    job.say(f"{len(local)} of {len(seen)} neurons of the first layer see a neighbourhood"
+            + (f", {local.mean():.0%} of the controls in the mean" if len(local) else ""))
+    return seen
 
 
 def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split) -> None:

@@ -32,6 +32,7 @@ class Settings:
     principalShapesAccuracy: float = 0.8
     preloadData: bool = True
     linearPath: bool = False  # not an attribute of the node
+    localNeurons: bool = False  # not an attribute of the node
     principalShapesHalf: bool = False  # not an attribute of the node
     guard: str = "none"  # not an attribute of the node
     guardWidth: float = 1.0  # not an attribute of the node
@@ -53,6 +54,7 @@ MEANINGS = {
     "principalShapesLimit": "most principal shapes",
     "principalShapesAccuracy": "part of the deltas' sum of squares that the shapes hold; 0.99 and more looks right",
     "linearPath": "a straight line from the controls to the outputs beside the hidden layers, learned with them",
+    "localNeurons": "three of four neurons of the first layer see only joints and sliders that move the same vertices",
     "principalShapesHalf": "keep principal shapes in half precision: half the size, and off by what is then said",
     "guard": "what becomes of controls beyond the ranges of the training rows, one of " + ", ".join(GUARDS),
     "guardWidth": "of --guard fade: how far beyond, in parts of a control's range, the outputs are 0",
