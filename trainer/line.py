@@ -34,14 +34,15 @@ def best_line(inputs: np.ndarray, targets_of: Callable[[np.ndarray], np.ndarray]
     controls = inputs[rows][:, moving].astype(np.float64)
     center = controls.mean(axis=0)
     controls -= center
-    products, sums = 0.0, 0.0
-    step = max(1, BLOCK_BYTES // (4 * targets_of(rows[:1]).shape[1]))
+    outputs = targets_of(rows[:1]).shape[1]
+    products, sums = np.zeros((len(moving), outputs)), np.zeros(outputs)
+    step = max(1, BLOCK_BYTES // (4 * outputs))
     for first in range(0, len(rows), step):
         targets = targets_of(rows[first:first + step]).astype(np.float64)
         products += controls[first:first + step].T @ targets
         sums += targets.sum(axis=0)
     squares = controls.T @ controls + RIDGE * len(rows) * np.eye(len(moving))
-    solved = scipy.linalg.solve(squares, products, assume_a="pos") if len(moving) else np.zeros((0, len(sums)))
-    weights = np.zeros((len(sums), inputs.shape[1]), np.float32)
+    solved = scipy.linalg.solve(squares, products, assume_a="pos") if len(moving) else products
+    weights = np.zeros((outputs, inputs.shape[1]), np.float32)
     weights[:, moving] = solved.T
     return Line(weights, (sums / len(rows) - center @ solved).astype(np.float32))
