@@ -164,7 +164,7 @@ def command_train(options: argparse.Namespace) -> int:
 def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: Callable[["Settings"], Path],
               wanted_report: Optional[str]) -> dict[str, Any]:
     """Trains the model of a data set. Returns its report."""
-    from . import evaluator, pipeline
+    from . import evaluator, limits, pipeline
     from .dataset import load_dataset
     from .device import Device
     from .guard import check_guard
@@ -185,7 +185,7 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
                                          not options.quiet, validation, options.resume,
                                          options.checkpoint_every, device))
     for line in [*as_lines(result["errors"]), sentence(result["split"]),
-                 *advice(result["errors"], result["explained"], settings)]:
+                 *limits.sentences(result), *advice(result["errors"])]:
         say(line)
     say(f"wrote {model} and {report}")
     return result

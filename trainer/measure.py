@@ -8,14 +8,12 @@ from typing import Any, Callable, Optional
 import numpy as np
 
 from .dataset import Dataset
-from .settings import Settings
 
 # So many distances are kept, and their percentiles are exact. More are counted in bins of equal bits: a float32's
 # exponent and the first 11 bits of its fraction. Memory is bounded for any number of frames, and the percentiles then
 # within 2^-11 (0.05 %) of the exact ones.
 KEPT = 1 << 24
 DROPPED_BITS = 12
-ENOUGH_EXPLAINED = 0.99  # part of the deltas' sum of squares: what shapes that hold it leave is hardly seen
 BINS = 1 << (31 - DROPPED_BITS)
 
 STAGES = {"skin": "skin", "base": "zero deltas", "basis": "basis", "network": "network"}  # what readers see of each
@@ -207,31 +205,13 @@ def before(errors: dict[str, Any]) -> tuple[str, dict[str, Any]]:
     return ("the skin", errors["skin"]) if errors["skin"] else ("zero deltas", errors["base"])
 
 
-def is_at_floor(errors: dict[str, Any], explained: float) -> bool:
-    """Whether most of what is left is what the shapes cannot show, and more of them could be had.
-
-    What the shapes cannot show and what the network does wrong in their span are at right angles: at 1.4 times the
-    basis's error the two are alike."""
-    return (errors["basis"] is not None and explained < ENOUGH_EXPLAINED
-            and errors["network"]["mean"]["mm"] <= 2**0.5 * errors["basis"]["mean"]["mm"])
-
-
-def advice(errors: dict[str, Any], explained: Optional[float], settings: Settings) -> list[str]:
-    """What the errors say about the settings: sentences, none where there is nothing to be done."""
-    sentences = []
-    if explained is not None and is_at_floor(errors, explained):
-        sentences.append(
-            f"the shapes limit this model: with an accuracy of {settings.principalShapesAccuracy:g} and at most "
-            f"{settings.principalShapesLimit} of them they hold {100 * explained:.1f} % of the deltas, and the network "
-            "leaves little more than the best that they could do; --principal-accuracy 0.99 --principal-limit 200 "
-            "would leave less")
+def advice(errors: dict[str, Any]) -> list[str]:
+    """A sentence where the model makes things worse."""
     called, stage = before(errors)
     worse = [FIGURE_NAMES.get(name, name) for name in FIGURES[:-1]
              if errors["network"][name]["mm"] > stage[name]["mm"]]
-    if worse:
-        sentences.append(f"the network leaves more than {called} would ({' and '.join(worse)}): it needs more frames, "
-                         "or more epochs")
-    return sentences
+    return [f"the network leaves more than {called} would ({' and '.join(worse)}): it needs more frames, or more epochs"
+            ] if worse else []
 
 
 def as_lines(errors: dict[str, Any]) -> list[str]:

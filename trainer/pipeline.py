@@ -8,7 +8,7 @@ from typing import Any, Callable, Optional
 
 import numpy as np
 
-from . import evaluator, export, files, memory, plausible, progress, report, resume
+from . import evaluator, export, files, limits, memory, plausible, progress, report, resume
 from .checkpoint import Checkpoints
 from .dataset import Dataset
 from .device import Device
@@ -63,6 +63,10 @@ class Targets:
     halves: Optional[Halves] = None         # what the shapes are decoded from
     rounding: Optional[dict[str, Any]] = None  # what that costs, over all rows
 
+    def deltas(self, outputs: np.ndarray) -> np.ndarray:
+        """float32 [n, 3 * D] in scene units, of scaled outputs [n, count]."""
+        return outputs if self.shapes is None else outputs @ self.shapes
+
 
 def train(job: Job) -> dict[str, Any]:
     """Trains, verifies and publishes. Returns the report."""
@@ -103,10 +107,11 @@ def train_into(job: Job, part: Path, split: Split) -> tuple[History, Measured, d
     """Trains and writes the model's files. Returns the history, the errors, and the report without the seconds."""
     targets = make_targets(job, split.train)
     check_size(job.settings, job.dataset.control_count, targets.count)
-    trained = train_network(job, targets, split)
+    trained, line = train_network(job, targets, split)
     export_and_verify(job, part, trained, targets, split)
     errors = errors_of(job, trained, targets, split)
-    return trained[2], errors, {**summarise(job, trained, targets, split, errors), "sizes": report.sizes(part)}
+    return trained[2], errors, {**summarise(job, trained, targets, split, errors),
+                                **limits_of(job, trained, line, targets, split, errors), "sizes": report.sizes(part)}
 
 
 # --- targets ---
@@ -163,7 +168,7 @@ def halved(job: Job, targets: Targets, shapes: np.ndarray) -> Targets:
 
 # --- training and export ---
 
-def train_network(job: Job, targets: Targets, split: Split) -> Trained:
+def train_network(job: Job, targets: Targets, split: Split) -> tuple[Trained, Line]:
     dataset, settings = job.dataset, job.settings
     normalisation = measure_controls(dataset.controls[split.train], targets.unit)
     if normalisation.still.any():
@@ -184,7 +189,7 @@ def train_network(job: Job, targets: Targets, split: Split) -> Trained:
             history = fit(network, inputs, targets.of, split, settings, job.seed, on_epoch, ended_by, job.device,
                           checkpoints)
     job.say(f"{len(history.train)} epochs, the best is {history.best_epoch} with a loss of {history.best_loss:.3e}")
-    return network, normalisation, history
+    return (network, normalisation, history), line
 
 
 def open_checkpoints(job: Job, inputs: np.ndarray, targets: Targets, split: Split) -> Checkpoints:
@@ -237,14 +242,24 @@ def compare(found: np.ndarray, wanted: np.ndarray, unit: float, called: str) -> 
 
 
 def errors_of(job: Job, trained: Trained, targets: Targets, split: Split) -> Measured:
+    return measured(job.dataset, split.measured()[1], deltas_of(job, trained, targets, split), targets.shapes)
+
+
+def deltas_of(job: Job, trained: Trained, targets: Targets, split: Split) -> Callable[[np.ndarray], np.ndarray]:
+    """What the model gives for controls [n, C]: deltas [n, 3 * D], in scene units."""
     network, normalisation, _ = trained
     guard = guard_of(job.settings, job.dataset.controls[split.train])
+    return lambda controls: targets.deltas(predict(network, normalisation, controls, guard))
 
-    def deltas_of(controls: np.ndarray) -> np.ndarray:
-        outputs = predict(network, normalisation, controls, guard)
-        return outputs if targets.shapes is None else outputs @ targets.shapes
 
-    return measured(job.dataset, split.measured()[1], deltas_of, targets.shapes)
+def limits_of(job: Job, trained: Trained, line: Line, targets: Targets, split: Split,
+              errors: Measured) -> dict[str, Any]:
+    """What a straight line would leave, what the model leaves where it was trained, and what keeps it from better."""
+    normalisation, unit = trained[1], np.float32(trained[1].unit)
+    on_trained = limits.on_trained_rows(job.dataset, split.train, deltas_of(job, trained, targets, split))
+    return {"trainedRows": on_trained, "limit": limits.limit(errors.errors, on_trained, split.how != "none"),
+            "line": limits.of_line(job.dataset, split.measured()[1], lambda controls: targets.deltas(
+                line.outputs(normalisation.normalised(controls)) * unit))}
 
 
 def summarise(job: Job, trained: Trained, targets: Targets, split: Split, errors: Measured) -> dict[str, Any]:

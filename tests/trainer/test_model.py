@@ -6,7 +6,7 @@ import tempfile
 import unittest
 from dataclasses import replace
 from pathlib import Path
-from typing import Any
+from typing import Any, Optional
 from unittest import mock
 
 import numpy as np
@@ -14,11 +14,13 @@ import onnx
 import xxhash
 
 import synthetic
-from trainer import export, halves, memory, pipeline, shapes
+from trainer import export, halves, limits, memory, pipeline, shapes
 from trainer.dataset import load_dataset
 from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory, NumpyModel
+from trainer.line import best_line
 from trainer.measure import Distances, advice, lengths_of
+from trainer.neighbourhoods import plugs_of, seen_by_neurons, shares
 from trainer.network import check_size
 from trainer.plausible import doubts
 from trainer.schedule import Schedule
@@ -47,7 +49,7 @@ class ModelTest(unittest.TestCase):
         variants: list[dict[str, Any]] = [
                         {}, {"principalShapesEnabled": True, "principalShapesAccuracy": 0.999},
                         {"preloadData": False}, {"validationRatio": 0.0}, {"activationFunction": "Tanh"},
-                        {"activationFunction": "SiLU", "linearPath": True}]
+                        {"activationFunction": "SiLU", "linearPath": True, "localNeurons": True}]
         for changes in variants:
             with self.subTest(changes):
                 report = self.train(data, **changes)
@@ -248,16 +250,59 @@ class AdviceTest(unittest.TestCase):
         def stage(mean: float, p99: float) -> dict[str, dict[str, float]]:
             return {"mean": {"mm": mean}, "p99": {"mm": p99}, "p9999": {"mm": p99}}
 
-        for basis, network, explained, wanted in (
-                (stage(1, 3), stage(1.3, 3), 0.87, "an accuracy of 0.8 and at most 20 .* 87.0 %"),
-                (stage(1, 3), stage(1.5, 3), 0.87, None), (stage(1, 3), stage(1.3, 3), 0.995, None),
-                (None, stage(1, 3), None, None),
-                (None, stage(5, 13), None, r"more than the skin would \(mean and p99 and p99.99\)"),
-                (None, stage(1, 13), None, r"\(p99 and p99.99\)")):
-            stages = {"skin": stage(4, 12), "base": stage(6, 15), "basis": basis, "network": network}
-            self.assertRegex(" ".join(advice(stages, explained, Settings())), wanted or r"\A\Z")
-        said = advice({**stages, "skin": None, "network": stage(1, 16)}, None, Settings())
+        stages = {"skin": stage(4, 12), "base": stage(6, 15)}
+        for network, wanted in ((stage(1, 3), r"\A\Z"), (stage(1, 13), r"\(p99 and p99.99\)"),
+                                (stage(5, 13), r"more than the skin would \(mean and p99 and p99.99\)")):
+            self.assertRegex(" ".join(advice({**stages, "network": network})), wanted)
+        said = advice({**stages, "skin": None, "network": stage(1, 16)})
         self.assertRegex(said[0], r"more than zero deltas would \(p99 and p99.99\)")
+
+    def test_says_what_the_limit_is(self) -> None:
+        def report(basis: Optional[float], network: float, trained: float, held_out: bool = True) -> dict[str, Any]:
+            def stage(mean: float) -> dict[str, Any]:
+                return {"mean": {"mm": mean}, "p9999": {"mm": 4 * mean}}
+
+            errors = {"basis": None if basis is None else stage(basis), "network": stage(network)}
+            return {"errors": errors, "trainedRows": stage(trained), "line": stage(7), "explained": 0.87,
+                    "settings": vars(Settings()), "limit": limits.limit(errors, stage(trained), held_out)}
+
+        for given, wanted in ((report(1, 1.4, 0.5), r"shapes are the limit: .* 0.8 and at most 20 .* 87 %"),
+                              (report(1, 1.5, 0.9), "poses are the limit: .* 0.9 mm .* 1.5 mm on others"),
+                              (report(1, 1.5, 1.1), "network is the limit"), (report(None, 1.5, 0.9), "poses are"),
+                              (report(1, 1.5, 0.9, False), r"28 mm at p99.99\Z")):
+            self.assertRegex(" ".join(limits.sentences(given)), "leaves 7 mm in the mean, .*" + wanted)
+
+
+class LineTest(unittest.TestCase):
+    def setUp(self) -> None:
+        random = np.random.default_rng(3)
+        self.controls = random.standard_normal((60, 5)).astype(np.float32)
+        self.controls[:, 2] = 0
+        self.still = np.arange(5) == 2
+        # controls 0 and 1 are one joint and move vertices 0 to 9; 3 moves 8 to 19, 4 moves 20 to 29
+        self.weights = np.zeros((5, 30, 3), np.float32)
+        self.weights[:2, :10], self.weights[3, 8:20], self.weights[4, 20:] = 1, 2, 3
+        self.targets = (self.controls @ self.weights.reshape(5, -1) + 5).astype(np.float32)
+
+    def test_is_what_numpy_finds(self) -> None:
+        rows = np.arange(0, 60, 2)
+        found = best_line(self.controls, lambda some: self.targets[some], rows, self.still)
+        np.testing.assert_allclose(found.weights.T, self.weights.reshape(5, -1), atol=1e-2)
+        np.testing.assert_allclose(found.outputs(self.controls), self.targets, atol=3e-2)
+
+    def test_neurons_see_what_moves_the_same_vertices(self) -> None:
+        plugs = plugs_of(["a.m:0", "a.m:1", "b.m:0", "c.slider", "d.slider"])
+        self.assertEqual([plug.tolist() for plug in plugs], [[0, 1], [2], [3], [4]])
+        flat = self.weights.reshape(5, -1)
+        for line, basis in ((flat.T.copy(), None), (np.eye(5, dtype=np.float32), flat)):
+            near = shares(line, basis, plugs)
+            # of its ten vertices joint a shares two with slider c, whose 2 is more than a's sqrt(2) there
+            self.assertAlmostEqual(near[0, 2], 2 / (8 + 2 * 2**0.5 / 2), places=5)
+            self.assertEqual((near[0, 3], near[1].max(), near[3, 3]), (0, 0, 1))
+            seen = seen_by_neurons(near, plugs, 5, 8)
+            wide, c, d = [True] * 5, [False] * 3 + [True, False], [False] * 4 + [True]
+            self.assertEqual(seen[:6].tolist(), 2 * [[True, True, False, False, False], c, d])
+            self.assertEqual(seen[6:].tolist(), [wide, wide])
 
 
 class SizesTest(unittest.TestCase):
