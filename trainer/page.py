@@ -6,12 +6,13 @@ import html
 import io
 import json
 from pathlib import Path
-from typing import Any, Optional
+from typing import Any, Iterable, Optional
 
 from .files import write_bytes
-from .rows import STAGES, Json, Report
+from .measure import FIGURE_NAMES, FIGURES, STAGES
+from .rows import RATIOS, Json, Report
 
-FIGURES = ("mean", "p99", "max")
+CELL = 8 * len(FIGURES) - 1  # columns of a stage in the table of text
 
 
 def name_of(row: Json) -> str:
@@ -30,23 +31,29 @@ def device_line(rows: list[Json]) -> str:
     return f"GPU: {used[0]['device']}"
 
 
+def names_of(figures: Iterable[str]) -> list[str]:
+    """As readers see them."""
+    return [FIGURE_NAMES.get(name, name) for name in figures]
+
+
 # --- as text ---
 
 def cell(stage: Optional[Json]) -> str:
     if stage is None:
-        return f"{'-':>23}"
-    return f"{stage['mean_mm']:7.3f} {stage['p99_mm']:7.3f} {stage['max_mm']:7.3f}"
+        return f"{'-':>{CELL}}"
+    return " ".join(f"{stage[f'{name}_mm']:7.3f}" for name in FIGURES)
 
 
 def table(rows: list[Json]) -> str:
-    """The errors in mm: a line a row, mean, p99 and maximum of each stage."""
-    width = max(18, *(len(name_of(row)) for row in rows))
-    lines = [f"{'mm: mean, p99, max':{width}}" + "".join(f" | {stage:^23}" for stage in STAGES) +
-             " |  mean   max | ms CPU   GPU | GPU from CPU, max"]
+    """The errors in mm: a line a row, the figures of each stage."""
+    head = "mm: " + ", ".join(names_of(FIGURES))
+    width = max(len(head), *(len(name_of(row)) for row in rows))
+    lines = [f"{head:{width}}" + "".join(f" | {called:^{CELL}}" for called in STAGES.values()) +
+             " | " + " ".join(f"{name:>6}" for name in names_of(RATIOS)) + " | ms CPU   GPU | GPU from CPU, max"]
     for row in rows:
         part, gpu = row["ratio"], row["gpu"]
         lines.append(f"{name_of(row):{width}}" + "".join(f" | {cell(row[stage])}" for stage in STAGES)
-                     + f" | {number(part['mean'], '5.3f'):>5} {number(part['max'], '5.3f'):>5}"
+                     + " | " + " ".join(f"{number(part[name]):>6}" for name in RATIOS)
                      + f" | {row['cpu']['median_ms']:6.3f} {number(gpu and gpu['median_ms'], '5.3f'):>5}"
                      + f" | {number(gpu and gpu['difference']['max_mm'], '.2g', ' mm')}")
     return "\n".join(lines) + "\n" + device_line(rows) + "\n"
@@ -105,28 +112,30 @@ def html_times(row: Json) -> str:
 
 
 def html_table(rows: list[Json]) -> str:
-    head = "".join(f'<th colspan="3">{stage}</th>' for stage in STAGES)
-    names = "".join(f"<th>{name}</th>" for name in FIGURES) * len(STAGES)
-    lines = [f"<tr><th></th>{head}<th colspan='2'>network, part of before</th><th colspan='2'>CPU, ms a frame</th>"
-             "<th colspan='2'>GPU, ms a frame</th><th>GPU from CPU</th></tr>",
-             f"<tr><th></th>{names}<th>mean</th><th>max</th>" + "<th>median</th><th>p99</th>" * 2 + "<th>max</th></tr>"]
+    head = "".join(f'<th colspan="{len(FIGURES)}">{called}</th>' for called in STAGES.values())
+    names = "".join(f"<th>{name}</th>" for name in names_of(FIGURES)) * len(STAGES)
+    parts = "".join(f"<th>{name}</th>" for name in names_of(RATIOS))
+    lines = [f"<tr><th></th>{head}<th colspan='{len(RATIOS)}'>network, part of before</th>"
+             "<th colspan='2'>CPU, ms a frame</th><th colspan='2'>GPU, ms a frame</th><th>GPU from CPU</th></tr>",
+             f"<tr><th></th>{names}{parts}" + "<th>median</th><th>p99</th>" * 2 + "<th>max</th></tr>"]
     for row in rows:
         cells = "".join(html_cells(row[stage], stage == "network") for stage in STAGES)
-        lines.append(f"<tr><td>{html.escape(name_of(row))}</td>{cells}"
-                     f"<td>{number(row['ratio']['mean'])}</td><td>{number(row['ratio']['max'])}</td>"
-                     f"{html_times(row)}</tr>")
+        ratios = "".join(f"<td>{number(row['ratio'][name])}</td>" for name in RATIOS)
+        lines.append(f"<tr><td>{html.escape(name_of(row))}</td>{cells}{ratios}{html_times(row)}</tr>")
     return "<table>" + "\n".join(lines) + "</table>"
 
 
 def html_worst(rows: list[Json]) -> str:
     items = []
     for row in rows:
-        network, moves = row["network"], row["jitter_mm"]
-        text = (f"{html.escape(name_of(row))}: p99.99 {network['p9999_mm']:.3f} mm; worst at vertex "
-                f"{network['worst']['vertex']} in frame {network['worst']['frame']}")
+        worst, moves, trembles = row["network"]["worst"], row["jitter_mm"], row["errorJitter_mm"]
+        text = (f"{html.escape(name_of(row))}: the network is worst at vertex {worst['vertex']} in frame "
+                f"{worst['frame']}")
         if moves:
             text += (f"; jitter {moves['network']:.3f} mm, of the target {moves['target']:.3f} mm, "
-                     f"of the skin {moves['skin']:.3f} mm")
+                     f"of the skin {moves['skin']:.3f} mm; jitter of the error {trembles['network']['mean']:.4f} mm "
+                     f"in the mean and {trembles['network']['max']:.3f} mm at most, of the skin's "
+                     f"{trembles['skin']['mean']:.4f} mm and {trembles['skin']['max']:.3f} mm")
         items.append(f"<li>{text}</li>")
     return "<ul>" + "".join(items) + "</ul>"
 
@@ -158,9 +167,11 @@ def page(report: Report, rows: list[Json], moving: Optional[bytes], remark: str 
 the mesh that the deformer makes with a network, and the distance that is left. {html_facts(rows)}</p>
 <h2>Errors on the held-out {held_out}, in mm and in % of the bounding box's diagonal</h2>
 {html_table(rows)}
-<p><small>skin: linear skinning alone. base: the deformer with deltas of zero (in surface mode the rest surface carried
-by smoothed frames). basis: the best that the principal shapes could do. network: the trained model, through the
-plug-in. The part of before is of the smaller of skin and base. {remark}
+<p><small>skin: linear skinning alone. zero deltas: the deformer with a network that outputs zeros (in
+surface mode the rest surface carried by smoothed frames, in offset mode the skin). basis: the best that the principal
+shapes could do. network: the trained model, through the plug-in. The part of before is of the smaller of skin and zero
+deltas. p99.99: one vertex of ten thousand, in all frames together, is further away. Jitter: the largest second
+difference over three frames; that of the error is what trembles where the target does not. {remark}
 {html.escape(device_line(rows))}. GPU from CPU: the largest distance of a vertex between the two.</small></p>
 <h2>Where it is worst{", and how smooth" if report.is_motion else ""}</h2>
 {html_worst(rows)}

@@ -10,12 +10,12 @@ from typing import Any, Optional
 import numpy as np
 
 from .errors import TrainerError
+from .measure import FIGURES, PERCENTILES
 
 Json = dict[str, Any]
 
 FORMAT, VERSION = "neuralWarp report rows", 1
-STAGES = ("skin", "base", "basis", "network")
-PERCENTILES = {"p99": 99, "p9999": 99.99}
+RATIOS = ("mean", "p9999", "max")
 AGREEMENT = 1e-6  # mm: what the player and this module, which see the same files, may differ by
 
 
@@ -98,7 +98,7 @@ def distances(points: np.ndarray, target: np.ndarray, scale: float) -> np.ndarra
 def statistics(errors: np.ndarray, diagonal_mm: float, first_frame: int) -> Json:
     """Mean, percentiles and largest of distances in mm, the same in % of the diagonal, and where the largest is."""
     values = {"mean": float(errors.mean()), "max": float(errors.max())}
-    values.update({name: float(np.percentile(errors, part)) for name, part in PERCENTILES.items()})
+    values.update({name: float(np.quantile(errors, part)) for name, part in PERCENTILES.items()})
     frame, vertex = np.unravel_index(np.argmax(errors), errors.shape)
     return {
         **{f"{name}_mm": value for name, value in values.items()},
@@ -111,19 +111,34 @@ def percent(millimetres: float, diagonal_mm: float) -> Optional[float]:
     return 100 * millimetres / diagonal_mm if diagonal_mm > 0 else None
 
 
+def second_differences(points: np.ndarray, scale: float) -> np.ndarray:
+    """Lengths over the motion, in mm, of each vertex in each frame but the first and last: what shows as popping."""
+    exact = points.astype(np.float64)
+    return np.linalg.norm(exact[2:] - 2 * exact[1:-1] + exact[:-2], axis=2) * scale
+
+
 def jitter(points: np.ndarray, scale: float) -> float:
-    """Largest second difference over the motion, in mm: what shows as popping."""
+    """The largest of them; 0 of a motion too short for any."""
+    return float(second_differences(points, scale).max()) if len(points) > 2 else 0.0
+
+
+def jitter_of_error(points: np.ndarray, target: np.ndarray, scale: float) -> Json:
+    """Mean and largest second difference of what is left, in mm: how much a mesh trembles where the target does not."""
     if len(points) < 3:
-        return 0.0
-    second = points[2:].astype(np.float64) - 2 * points[1:-1] + points[:-2]
-    return float(np.linalg.norm(second, axis=2).max() * scale)
+        return {"mean": 0.0, "max": 0.0}
+    second = second_differences(points.astype(np.float64) - target, scale)
+    return {"mean": float(second.mean()), "max": float(second.max())}
 
 
-def judged(stage: Optional[Json]) -> Optional[Json]:
+def judged(stage: Optional[Json], path: Path) -> Optional[Json]:
     """The trainer's figures of one stage, with the names of the report; none where the stage does not exist."""
     if stage is None:
         return None
-    numbers = {name: stage[name] for name in ("mean", "p99", "max")}
+    missing = [name for name in FIGURES if name not in stage]
+    if missing:
+        raise TrainerError(f"{path} has no {missing[0]}: another version of the trainer wrote it, and it has to be "
+                           "made again")
+    numbers = {name: stage[name] for name in FIGURES}
     return {
         **{f"{name}_mm": value["mm"] for name, value in numbers.items()},
         **{f"{name}_percent": value["percentOfDiagonal"] for name, value in numbers.items()},
@@ -179,14 +194,14 @@ def figures(row: Row, is_motion: bool, first_frame: int) -> Json:
     kind = "principal" if learned["settings"]["principalShapesEnabled"] else "direct"
     errors: Json = {
         "skin": statistics(distances(skin, target, scale), diagonal, first_frame),
-        "base": judged(evaluated["base"]),
-        "basis": judged(evaluated.get("basis")),
+        "base": judged(evaluated["base"], row.evaluate),
+        "basis": judged(evaluated.get("basis"), row.evaluate),
         "network": statistics(distances(network, target, scale), diagonal, first_frame),
     }
     name = " ".join(part for part in (row.mesh, mode, kind) if part)
     require_agreement(f"{name}, skin", errors["skin"], played["before"])
     require_agreement(f"{name}, network", errors["network"], played["distance"])
-    best = {figure: min(errors[stage][figure] for stage in ("skin", "base")) for figure in ("mean_mm", "max_mm")}
+    best = {figure: min(errors[stage][f"{figure}_mm"] for stage in ("skin", "base")) for figure in RATIOS}
     return {
         "mesh": row.mesh,
         "mode": mode,
@@ -197,9 +212,11 @@ def figures(row: Row, is_motion: bool, first_frame: int) -> Json:
         "epochs": learned["epochs"],
         "smoothingIterations": trained["smoothingIterations"],
         **errors,
-        "ratio": {figure: ratio(errors["network"][f"{figure}_mm"], best[f"{figure}_mm"]) for figure in ("mean", "max")},
+        "ratio": {figure: ratio(errors["network"][f"{figure}_mm"], best[figure]) for figure in RATIOS},
         "jitter_mm": {what: jitter(points, scale) for what, points in
                       (("skin", skin), ("target", target), ("network", network))} if is_motion else None,
+        "errorJitter_mm": {what: jitter_of_error(points, target, scale) for what, points in
+                           (("skin", skin), ("network", network))} if is_motion else None,
         "cpu": times(played),
         "gpu": figures_of_gpu(row.gpu, network, scale, diagonal, first_frame) if row.gpu else None,
     }

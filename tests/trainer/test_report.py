@@ -43,7 +43,7 @@ class ReportTest(unittest.TestCase):
         played = {"medianMs": 2.0, "p99Ms": 3.0, "boxDiagonalMm": 100.0,
                   "before": {"mm": {"mean": 3 * mean, "max": 3.0}}, "distance": {"mm": {"mean": mean, "max": 1.0}},
                   "gpu": {"device": "D", "onGpu": 3, "fallbacks": 0}}
-        stage: rows.Json = {name: {"mm": 2.0, "percentOfDiagonal": 2.0} for name in ("mean", "p99", "max")}
+        stage: rows.Json = {name: {"mm": 2.0, "percentOfDiagonal": 2.0} for name in ("mean", "p99", "p9999", "max")}
         self.write(f"{mesh}/training/report.json", {"settings": {"principalShapesEnabled": principal}, "epochs": 7})
         (self.place / mesh / "training" / "loss.png").write_bytes(b"a picture")
         evaluate: rows.Json = {"base": {**stage, "worstFrame": FIRST, "worstVertex": 0}, "basis": None}
