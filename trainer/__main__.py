@@ -96,6 +96,8 @@ def add_going_on(train: argparse.ArgumentParser) -> None:
                          help="the same, and begin anew where that is of another training or damaged")
     train.add_argument("--checkpoint-every", type=float, default=60, metavar="SECONDS",
                        help="how often it is written (default 60), if that takes at most 2 %% of the time")
+    train.add_argument("--warm-start", metavar="MODEL.nwrp",
+                       help="begin as this model, which was trained on fewer poses, say, with the same layers")
     train.add_argument("--device", default="cpu", metavar="DEVICE",
                        help="cpu (default), cuda, or auto: cuda where there is one. The model depends on it")
 
@@ -180,10 +182,13 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     settings = override(dataset.settings, changes, lambda name: SETTING_FLAGS.get(name, name))
     check_guard(settings, changes)
     model = model_of(settings)
+    first = Path(options.warm_start) if options.warm_start else None
+    if first and first.resolve() == model.resolve():
+        raise TrainerError(f"--warm-start {first} is the model that is to be written: give that another name with -o")
     report = Path(wanted_report) if wanted_report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
                                          not options.quiet, validation, options.resume,
-                                         options.checkpoint_every, device))
+                                         options.checkpoint_every, device, first))
     for line in [*as_lines(result["errors"]), sentence(result["split"]),
                  *limits.sentences(result), *advice(result["errors"])]:
         say(line)

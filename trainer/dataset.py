@@ -3,6 +3,7 @@
 
 import hashlib
 import json
+import mmap
 from dataclasses import dataclass
 from pathlib import Path
 from typing import Any, Iterator, Optional, Union
@@ -49,12 +50,13 @@ class Dataset:
         """Index in the whole mesh of the vertex that a slot of the deltas belongs to."""
         return self.description["affectMap"][slot] if self.description["subsetState"] == "partial" else slot
 
-    def blocks(self, rows: np.ndarray) -> Iterator[tuple[np.ndarray, np.ndarray]]:
-        """The deltas of `rows` in blocks of bounded size: pairs of row indices and float32 [rows, 3 * D]."""
-        step = max(1, BLOCK_BYTES // (4 * max(1, self.deltas.shape[1])))
+    def blocks(self, rows: np.ndarray, size: Optional[int] = None) -> Iterator[tuple[np.ndarray, np.ndarray]]:
+        """The deltas of `rows` in blocks of `size` bytes: pairs of row indices and float32 [rows, 3 * D]."""
+        step = max(1, (size or BLOCK_BYTES) // (4 * max(1, self.deltas.shape[1])))
         for first in range(0, len(rows), step):
             part = rows[first:first + step]
             yield part, np.asarray(self.deltas[part])
+            release(self.deltas)
 
 
 def load_dataset(place: Union[str, Path]) -> Dataset:
@@ -149,6 +151,14 @@ def check_affect_map(indices: object, delta_count: Any, full_count: Any, path: P
 
 # --- the arrays ---
 
+def release(array: Any) -> None:
+    """Gives back the memory of what was read of a mapped file; the system may still have it at hand."""
+    for part in getattr(array, "parts", (array,)):
+        mapped = getattr(part, "_mmap", None)
+        if mapped is not None:
+            mapped.madvise(mmap.MADV_DONTNEED)
+
+
 def array_path(description: dict[str, Any], folder: Path, name: str, path: Path) -> Path:
     value = description["files"].get(name)
     if not isinstance(value, str) or not value or Path(value).name != value:
@@ -191,6 +201,7 @@ def check_and_digest(array: np.ndarray, path: Path, frames: np.ndarray, digest: 
     for first in range(0, len(array), step):
         block = np.ascontiguousarray(array[first:first + step])
         digest.update(block.data)
+        release(array)
         if not np.isfinite(block).all():
             row, *where = np.argwhere(~np.isfinite(block))[0]
             names = ("vertex", "axis") if len(where) == 2 else ("control",)

@@ -118,7 +118,7 @@ def narrow(layer: nn.Linear, seen: torch.Tensor) -> None:
     mask = seen.to(layer.weight.dtype)
     counts = mask.sum(dim=1, keepdim=True)
     layer.weight.mul_(mask * torch.sqrt(layer.in_features / counts.clamp(min=1)))  # sums as large as those of all
-    layer.weight.register_hook(lambda gradient: gradient * mask)
+    layer.weight.register_hook(lambda gradient: gradient * mask.to(gradient.device))
 
 
 def predict(network: Network, normalisation: Normalisation, controls: np.ndarray,

@@ -8,7 +8,7 @@ from typing import Any, Callable, Optional
 
 import numpy as np
 
-from . import evaluator, export, files, limits, memory, plausible, progress, report, resume
+from . import evaluator, export, files, limits, memory, plausible, progress, report, resume, warm
 from .checkpoint import Checkpoints
 from .dataset import Dataset
 from .device import Device
@@ -49,6 +49,7 @@ class Job:
     going_on: str = resume.ANEW             # from a checkpoint; a wish of resume
     checkpoint_every: float = resume.EVERY  # seconds
     device: Device = field(default_factory=lambda: Device("cpu"))
+    first: Optional[Path] = None            # model directory whose network this one begins as
 
 
 @dataclass(frozen=True)
@@ -117,24 +118,22 @@ def train_into(job: Job, part: Path, split: Split) -> tuple[History, Measured, d
 # --- targets ---
 
 def make_targets(job: Job, rows: np.ndarray) -> Targets:
+    return principal_targets(job, rows) if job.settings.principalShapesEnabled else direct_targets(job, rows)
+
+
+def direct_targets(job: Job, rows: np.ndarray) -> Targets:
     unit = root_mean_square(job.dataset, rows)
-    if unit == 0:
-        raise TrainerError(f"every delta of {job.dataset.folder} is 0: check that the targets were connected when it "
-                           "was exported ('trainer zero' makes a model that outputs zeros)")
-    return principal_targets(job, rows) if job.settings.principalShapesEnabled else direct_targets(job, unit)
-
-
-def root_mean_square(dataset: Dataset, rows: np.ndarray) -> float:
-    total = sum(float(np.sum(np.square(block, dtype=np.float64))) for _, block in dataset.blocks(rows))
-    return float(np.sqrt(total / (len(rows) * dataset.deltas.shape[1])))
-
-
-def direct_targets(job: Job, unit: float) -> Targets:
     deltas = job.dataset.deltas
     if memory.holds(deltas.nbytes, job.settings.preloadData, job.say):
         deltas = np.array(deltas)
     scale = np.float32(1 / unit)
     return Targets(deltas.shape[1], lambda rows: np.asarray(deltas[rows]) * scale, unit)
+
+
+def root_mean_square(dataset: Dataset, rows: np.ndarray) -> float:
+    total = sum(float(np.sum(np.square(block, dtype=np.float64))) for _, block in dataset.blocks(rows))
+    plausible.require_any(dataset, total)
+    return float(np.sqrt(total / (len(rows) * dataset.deltas.shape[1])))
 
 
 def principal_targets(job: Job, rows: np.ndarray) -> Targets:
@@ -184,6 +183,10 @@ def train_network(job: Job, targets: Targets, split: Split) -> tuple[Trained, Li
         job.say(f"training {weights // 4} parameters ({memory.text(5 * weights)} with what their training needs) on "
                 f"{len(split.train)} frames, validating on {len(split.validation)}")
         network = build(settings, dataset.control_count, targets.count, normalisation.still, line, seen)
+        if job.first:
+            warm.begin_as(job.first, network, normalisation, targets.shapes, dataset, settings)
+            job.say(f"beginning as {job.first}: rows that are held out may be among those that it was trained on, and "
+                    "their errors flatter then")
         checkpoints = open_checkpoints(job, inputs, targets, split)
         with progress.counted(settings.epochs, job.say, job.progress) as on_epoch:
             history = fit(network, inputs, targets.of, split, settings, job.seed, on_epoch, ended_by, job.device,
@@ -193,8 +196,9 @@ def train_network(job: Job, targets: Targets, split: Split) -> tuple[Trained, Li
 
 
 def open_checkpoints(job: Job, inputs: np.ndarray, targets: Targets, split: Split) -> Checkpoints:
+    first = None if job.first is None else warm.digest_of(job.first)
     identity = {**resume.identity_of(job.dataset, job.validation, job.settings, job.seed, job.threads, job.device.kind,
-                                     None),
+                                     first),
                 "digest of what is learned": resume.digest_of(inputs, targets.of, split)}
     return resume.open_checkpoints(resume.checkpoint_path(job.model), identity, job.checkpoint_every, job.going_on,
                                    job.say)
@@ -218,6 +222,8 @@ def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, 
     metadata = export.metadata(job.dataset, job.settings, job.seed)
     if history.interrupted:
         metadata["interruptedAfterEpochs"] = len(history.train)
+    if job.first:
+        metadata["firstNetwork"] = warm.digest_of(job.first)
     export.write_model(part, model, metadata, targets.shapes, targets.halves)
     rows = split.measured()[1][:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
@@ -275,5 +281,5 @@ def summarise(job: Job, trained: Trained, targets: Targets, split: Split, errors
         "halfPrecision": targets.rounding,
         "parameters": sum(p.numel() for p in network.parameters()),
         "epochs": len(history.train), "bestEpoch": history.best_epoch, "bestLoss": history.best_loss,
-        "interrupted": history.interrupted,
+        "interrupted": history.interrupted, "firstNetwork": None if job.first is None else job.first.name,
     }

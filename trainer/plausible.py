@@ -7,9 +7,17 @@ from typing import Any, Optional
 import numpy as np
 
 from .dataset import Dataset
+from .errors import TrainerError
 
 LARGEST_MEAN = 0.1  # of the character's diagonal; corrections that sculptors and simulations make have a few hundredths
 LOOKED_AT = 500  # rows at most, spread over all: a mean needs no more
+
+
+def require_any(dataset: Dataset, total: float) -> None:
+    """`total`: sum of squares of the deltas that are to be learned."""
+    if total == 0:
+        raise TrainerError(f"every delta of {dataset.folder} is 0: check that the targets were connected when it was "
+                           "exported ('trainer zero' makes a model that outputs zeros)")
 
 
 def mean_length(dataset: Dataset) -> float:

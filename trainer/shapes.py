@@ -4,7 +4,9 @@
 The deltas are not centred: a model directory has no mean shape, so the shapes have to span the mean as well.
 The basis is a truncated singular value decomposition of the deltas X [rows, 3 * D], by the eigenvectors of the smaller
 of X X^T and X^T X where that is small, else by random projection with power iterations (Halko, Martinsson, Tropp,
-"Finding structure with randomness", SIAM Review 53, 2011, algorithms 4.4 and 5.1).
+"Finding structure with randomness", SIAM Review 53, 2011, section 4.5 on X^T X, and the Rayleigh-Ritz method for the
+values). Then X is read once for an iteration, block by block, and once for the values: a set may be larger than the
+memory (decision 0191).
 """
 
 from dataclasses import dataclass
@@ -13,10 +15,12 @@ import numpy as np
 import scipy.linalg
 
 from .dataset import Dataset
+from .plausible import require_any
 
 EXACT_SIDE = 2048        # largest matrix whose eigenvectors are computed: some seconds
 OVERSAMPLING = 10        # Halko et al., section 4.2: 5 or 10
 POWER_ITERATIONS = 3
+LARGE_BLOCK = 256 << 20  # bytes; with each block some hundred MB of sums are read and written
 RELATIVE_FLOOR = 1e-6    # singular values below this part of the largest are rounding of float32 data
 
 
@@ -39,6 +43,7 @@ def principal_basis(dataset: Dataset, rows: np.ndarray, limit: int, accuracy: fl
         vectors, values, total = exact(dataset, rows, limit)
     else:
         vectors, values, total = randomized(dataset, rows, limit, seed)
+    require_any(dataset, total)
     parts = np.cumsum(values**2) / total
     usable = max(1, int(np.count_nonzero(values > RELATIVE_FLOOR * values[0])))
     count = min(usable, int(np.searchsorted(parts[:usable], accuracy - 1e-9)) + 1)
@@ -88,18 +93,32 @@ def times_deltas(dataset: Dataset, rows: np.ndarray, left: np.ndarray) -> np.nda
 def randomized(dataset: Dataset, rows: np.ndarray, limit: int,
                seed: int) -> tuple[np.ndarray, np.ndarray, float]:
     size = min(limit + OVERSAMPLING, len(rows), dataset.deltas.shape[1])
-    right = np.linalg.qr(np.random.default_rng(seed).standard_normal((dataset.deltas.shape[1], size)))[0]
+    right = orthonormal(np.random.default_rng(seed).standard_normal((dataset.deltas.shape[1], size)))
     for _ in range(POWER_ITERATIONS):
-        left = np.linalg.qr(deltas_times(dataset, rows, right))[0]
-        right = np.linalg.qr(times_deltas(dataset, rows, left.T).T)[0]
-    projected = deltas_times(dataset, rows, right)
-    _, values, turn = np.linalg.svd(projected, full_matrices=False)
-    total = sum(float(np.sum(np.square(block, dtype=np.float64))) for _, block in dataset.blocks(rows))
-    return (turn @ right.T)[:limit], values[:limit], total
+        right = orthonormal(inner_products_times(dataset, rows, right))
+    gram, total = np.zeros((size, size)), 0.0
+    for _, block in dataset.blocks(rows):
+        block = block.astype(np.float64)
+        total += float(np.vdot(block, block))
+        projected = block @ right
+        gram += projected.T @ projected
+    squares, turn = np.linalg.eigh(gram)
+    return (right @ turn[:, :-limit - 1:-1]).T, np.sqrt(np.maximum(squares[:-limit - 1:-1], 0)), total
 
 
-def deltas_times(dataset: Dataset, rows: np.ndarray, right: np.ndarray) -> np.ndarray:
-    return np.concatenate([block.astype(np.float64) @ right for _, block in dataset.blocks(rows)])
+def orthonormal(columns: np.ndarray) -> np.ndarray:
+    return scipy.linalg.qr(columns, mode="economic", overwrite_a=True, check_finite=False)[0]
+
+
+def inner_products_times(dataset: Dataset, rows: np.ndarray, right: np.ndarray) -> np.ndarray:
+    """X^T X times right [3 * D, k]. The products of a block are in single precision, which puts a direction off by its
+    rounding times the first singular value in parts of its own: the next iteration starts there, and the values are
+    computed in double precision."""
+    right = right.astype(np.float32)
+    product = np.zeros(right.shape)
+    for _, block in dataset.blocks(rows, LARGE_BLOCK):
+        product += block.T @ (block @ right)
+    return product
 
 
 def with_fixed_signs(vectors: np.ndarray) -> np.ndarray:

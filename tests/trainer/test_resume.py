@@ -68,7 +68,7 @@ class ResumeTest(unittest.TestCase):
         variants: list[tuple[dict[str, Any], Any]] = [
             ({"dropoutRatio": 0.2, "validationRatio": 0.0}, mean_loss), ({"patience": 2, "epochs": 12}, worse),
             ({"principalShapesEnabled": True, "principalShapesHalf": True, "principalShapesAccuracy": 0.95}, mean_loss),
-            ({"activationFunction": "SiLU", "linearPath": True, "preloadData": False}, mean_loss)]
+            ({"activationFunction": "SiLU", "linearPath": True, "localNeurons": True, "preloadData": False}, mean_loss)]
         for changes, loss in variants:
             with self.subTest(changes), mock.patch("trainer.training.mean_loss", loss):
                 wanted = self.train(resume.ANEW, **changes)
