@@ -76,7 +76,8 @@ def add_train(commands: "argparse._SubParsersAction[Parser]") -> None:
                        help="model directory; if not given: models/NAME.nwrp with the data set's outputModelName. Of "
                        "several data sets the folder of these, models if not given")
     train.add_argument("--validation-set", metavar="DATASET", help="validate and test on its rows, half of them each, "
-                       "and train on all rows of the other; of the same mesh")
+                       "and train on all rows of the other; of the same mesh. Of several data sets a folder with one "
+                       "of the same name for each")
     train.add_argument("--seed", type=int, default=1, help="of everything that is drawn at random (default 1)")
     train.add_argument("--threads", type=int, default=1, help="of the arithmetic; the model depends on it (default 1)")
     train.add_argument("--report", metavar="FOLDER", help="if not given: NAME.report beside the model; of several "
@@ -157,14 +158,15 @@ def command_train(options: argparse.Namespace) -> int:
     below = folders.sets_below(options.dataset)
     if below:
         return train_all(options, folders.works_of(options.dataset, below))
-    result = train_one(options, options.dataset, lambda settings: output_path(options, settings), options.report)
+    result = train_one(options, options.dataset, options.validation_set,
+                       lambda settings: output_path(options, settings), options.report)
     if options.json:
         print(json.dumps(result, indent=1))
     return INTERRUPTED if result["interrupted"] else 0
 
 
-def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: Callable[["Settings"], Path],
-              wanted_report: Optional[str]) -> dict[str, Any]:
+def train_one(options: argparse.Namespace, folder: Union[str, Path], validation_set: Union[str, Path, None],
+              model_of: Callable[["Settings"], Path], wanted_report: Optional[str]) -> dict[str, Any]:
     """Trains the model of a data set. Returns its report."""
     from . import evaluator, limits, pipeline
     from .dataset import load_dataset
@@ -177,7 +179,7 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], model_of: C
     say = speaker(options)
     quarn, device = evaluator.find_quarn(options.quarn), Device(options.device)
     dataset = load_dataset(folder)
-    validation = load_dataset(options.validation_set) if options.validation_set else None
+    validation = load_dataset(validation_set) if validation_set else None
     changes = {name: getattr(options, name) for name in KINDS if getattr(options, name, None) is not None}
     settings = override(dataset.settings, changes, lambda name: SETTING_FLAGS.get(name, name))
     check_guard(settings, changes)
@@ -240,7 +242,8 @@ def train_work(options: argparse.Namespace, work: "Work", place: Path) -> dict[s
         raise TrainerError(work.why)
     model = model_path(str(place / f"{work.name}.nwrp"))
     report = str(Path(options.report) / work.name) if options.report else None
-    return {**train_one(options, work.folder, lambda settings: model, report), "dataSet": work.label}
+    validation = Path(options.validation_set) / work.label if options.validation_set else None
+    return {**train_one(options, work.folder, validation, lambda settings: model, report), "dataSet": work.label}
 
 
 def pin_threads(count: int) -> None:

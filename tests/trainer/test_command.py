@@ -17,7 +17,9 @@ import unittest
 from pathlib import Path
 from typing import Any
 
+import numpy as np
 import synthetic
+from trainer import report
 from trainer.settings import KINDS, described
 
 ROOT = Path(__file__).resolve().parents[2]
@@ -188,7 +190,11 @@ class CommandTest(unittest.TestCase):
         (self.place / "all/body/dataset.json").unlink()
         self.assertIn("body/again and face/set in all would both become head.nwrp", self.refused(*every))
         shutil.rmtree(self.place / "all/body")
-        out, err = self.run_trainer(*every, "--json", "--report", "reports")
+        for name in ("arm", "face/set"):  # each with the one of its name
+            synthetic.make(self.place / "held" / name, frames=10 + len(name), seed=9)
+        out, err = self.run_trainer(*every, "--json", "--report", "reports", "--validation-set", "held")
+        self.assertEqual([(one["split"]["train"], one["split"]["validation"], one["split"]["test"])
+                          for one in json.loads(out)], [(60, 7, 6), (60, 9, 9)])
         self.assertEqual([one["dataSet"] for one in json.loads(out)], ["arm", "face/set"])
         self.assertRegex(err, r"(?s)arm, 1 of 2\n.*face/set: [\d.]+ mm in the mean with zero deltas, .* with m/head")
         self.assertEqual(sorted(os.listdir(self.place / "reports")), ["head", "limb"])
@@ -200,9 +206,24 @@ class CommandTest(unittest.TestCase):
         zero = json.loads(self.run_trainer("evaluate", "data", "m/zero.nwrp", "--json", "--quarn", "none")[0])
         arm = json.loads(self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", "none")[0])
         self.assertEqual(zero["network"], zero["base"])
+        out, _ = self.run_trainer("evaluate", "data", "m/arm.nwrp", "--json", "--quarn", "none", "--report", "errors")
+        errors = self.place / "errors"
+        self.assertEqual(json.loads((errors / "report.json").read_text()), json.loads(out))
+        self.assertEqual(sorted(os.listdir(errors)), sorted(report.ERROR_NAMES))
+        frames, vertices = (np.load(errors / f"{what}Errors.npy") for what in ("frame", "vertex"))
+        self.assertEqual((frames.shape, vertices.shape), ((60, 2), (48, 2)))
+        for values in (frames, vertices):
+            self.assertAlmostEqual(float(values[:, 0].mean()) / arm["network"]["mean"]["mm"], 1, places=4)
+            self.assertAlmostEqual(float(values[:, 1].max()) / arm["network"]["max"]["mm"], 1, places=4)
+        self.assertEqual(np.load(errors / "frames.npy")[np.argmax(frames[:, 1])], arm["network"]["worstFrame"])
+        self.assertEqual(np.load(errors / "vertices.npy")[np.argmax(vertices[:, 1])], arm["network"]["worstVertex"])
+        (errors / "mine").touch()
+        self.assertIn("holds mine", self.refused("evaluate", "data", "m/arm.nwrp", "--quarn", "none", "--report",
+                                                 "errors"))
         self.assertLess(arm["network"]["mean"]["mm"], arm["base"]["mean"]["mm"])
         synthetic.make(self.place / "part", affect=[1, 2])
         self.assertIn("do not belong together", self.refused("evaluate", "part", "m/arm.nwrp", "--quarn", "none"))
+        self.assertIn("part cannot validate data: its ", self.refused(*TRAIN, "--validation-set", "part"))
 
     def test_quarn_has_the_last_word(self) -> None:
         quarn = self.place / "quarn"

@@ -57,6 +57,12 @@ class ModelTest(unittest.TestCase):
                 self.assertLess(errors["network"]["mean"]["mm"], 0.25 * errors["base"]["mean"]["mm"])
                 self.assertEqual(report["heldOut"], "validationRatio" not in changes)
                 self.assertEqual(self.read("model.report/report.json"), json.loads(json.dumps(report)))
+                self.assertEqual(report["sizes"], {path.name: path.stat().st_size
+                                                   for path in (self.place / "model.nwrp").iterdir()})
+                head, *losses = (self.place / "model.report/losses.csv").read_text().splitlines()
+                best = losses[report["bestEpoch"] - 1].split(",")
+                self.assertEqual((head, len(losses)), ("epoch,training,validation", report["epochs"]))
+                self.assertEqual(float(best[2] or best[1]), report["bestLoss"])
                 self.assertTrue((self.place / "model.report/loss.png").read_bytes().startswith(b"\x89PNG"))
                 # the published files alone, on poses that were in no training
                 model = ModelDirectory(self.place / "model.nwrp", None)

@@ -67,6 +67,9 @@ class ReportTest(unittest.TestCase):
         for found, wanted in ((arm["network"]["max_mm"], 1), (arm["network"]["p9999_percent"], 0.983),
                               (arm["skin"]["max_mm"], 3), (arm["ratio"]["max"], 1 / 2),
                               (arm["jitter_mm"]["target"] > 1, 1), (arm["gpu"]["difference"]["max_mm"], 0),
+                              (arm["errorJitter_mm"]["network"]["max"], 2 * (1 - 0.1)),
+                              (arm["errorJitter_mm"]["network"]["mean"], (2 + 1) * (1 - 0.1) / (2 * VERTICES)),
+                              (arm["errorJitter_mm"]["skin"]["max"], 6 * (1 - 0.1)),
                               (eye["ratio"]["mean"], arm["ratio"]["mean"])):
             self.assertAlmostEqual(found, wanted, 3)
         page.write(self.report, [arm, eye], self.place)
