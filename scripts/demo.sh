@@ -169,8 +169,7 @@ demo_folders() {
 
 # demo_row ROW STEP ARGS...: the row's quarn run, up to the step, in the folder data/ROW
 demo_row() {
-  local row=$1 last=$2 smoothing=0 kind=(--train-option=--principal-limit --train-option=100
-    --train-option=--principal-accuracy --train-option=0.999)
+  local row=$1 last=$2 smoothing=0 kind=()
   shift 2
   [[ $row != surface_* ]] || smoothing=$surface_smoothing
   [[ $row != *_direct ]] || kind=(--train-option=--direct)
@@ -178,7 +177,7 @@ demo_row() {
     --parents examples/hand/parents.json --limits examples/hand/limits.json \
     --import-option=--delta-mode --import-option="${row%_*}" --import-option=--smoothing --import-option="$smoothing" \
     --samples "$demo_samples" --activation-rate "$activation_rate" --seed 1 --motion examples/hand/motion.json \
-    --epochs "$demo_epochs" --train-option=--learning-rate --train-option=0.001 "${kind[@]}" "$@"
+    --epochs "$demo_epochs" "${kind[@]}" "$@"
 }
 
 # demo_row_with_targets ROW STEP ARGS...: the first row has them made, the others take them from there
@@ -232,8 +231,7 @@ demo_arm() {
   "$python" examples/arm/write_arm.py "$demo_out/arm.glb"
   NW_PYTHON=$python "$QUARN" run "$demo_out/arm.glb" -o "$demo_out/arm" --limits examples/arm/limits.json \
     --samples "$(arm_samples)" --activation-rate 0.8 --seed 1 --motion examples/arm/motion.json \
-    --epochs "$demo_epochs" --train-option=--learning-rate --train-option=0.001 \
-    --train-option=--principal-accuracy --train-option=0.999 \
+    --epochs "$demo_epochs" \
     --render-option=--view --render-option=15,15 --render-option=--range --render-option=30 \
     --target-command "$python" examples/arm/arm_targets.py >"$logs/arm.log"
   local skin=arm_skin.outputGeom[0] target=arm_target.outMesh neural=warp.outputGeom[0]

@@ -335,10 +335,11 @@ private:
             append(step.words, {"--seed", std::to_string(*settings_.seed)});
         if (settings_.epochs)
             append(step.words, {"--epochs", std::to_string(*settings_.epochs)});
-        // what a node made by hand has not, and nearly every mesh is the better for
+        // what a node made by hand has not, and nearly every mesh is the better for; a flag of the user's comes behind
         const auto& own = settings_.trainOptions;
         if (std::find(own.begin(), own.end(), "--direct") == own.end())
             step.words.emplace_back("--principal-shapes");
+        append(step.words, {"--activation", "SiLU", "--linear-path", "--local-neurons"});
         append(step.words, own);
     }
 

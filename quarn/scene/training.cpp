@@ -3,29 +3,35 @@
 
 #include "quarn/scene/plugs.h"
 
+#include <array>
+#include <string>
+
 namespace quarn {
 namespace {
 
-struct Training {
-    double accuracy;
-    int limit;
+struct Setting {
+    const char* attribute;
+    double byDefault; // as the plug gives it
+    double good;
 };
 
-constexpr Training byDefault{static_cast<double>(0.8F), 20};
-constexpr Training good{0.99, 200};
+constexpr std::array<Setting, 5> settings = {{
+    {"batchSize", 128.0, 32.0},
+    {"learningRate", 0.0005, 0.003},
+    {"validationRatio", static_cast<double>(0.2F), 0.1},
+    {"principalShapesAccuracy", static_cast<double>(0.8F), 0.99999},
+    {"principalShapesLimit", 20.0, 200.0},
+}};
 
 } // namespace
 
 void setGoodTraining(const HPlug& train) {
     const std::string name = train.name().asChar();
-    const HPlug accuracy = findPlug(name + ".principalShapesAccuracy");
-    const HPlug limit = findPlug(name + ".principalShapesLimit");
-    const bool isUntouched = numberOf(accuracy) == byDefault.accuracy && wholeNumberOf(limit) == byDefault.limit &&
-                             !accuracy.isDestination() && !limit.isDestination();
-    if (!isUntouched)
-        return;
-    setNumber(accuracy, good.accuracy);
-    setNumber(limit, good.limit);
+    for (const Setting& setting : settings) {
+        const HPlug plug = findPlug(name + "." + setting.attribute);
+        if (numberOf(plug) == setting.byDefault && !plug.isDestination())
+            setNumber(plug, setting.good);
+    }
 }
 
 } // namespace quarn

@@ -12,8 +12,7 @@ python=$(scripts/find_python.sh) || {
 }
 "$python" examples/arm/write_arm.py "$work/arm.glb"
 NW_PYTHON=$python "$quarn" run "$work/arm.glb" -o "$work/arm" --limits examples/arm/limits.json --samples 200 \
-  --activation-rate 0.8 --motion examples/arm/motion.json --epochs 120 --train-option=--learning-rate \
-  --train-option=0.001 --until evaluate --target-command "$python" examples/arm/arm_targets.py
+  --activation-rate 0.8 --motion examples/arm/motion.json --epochs 120 --until evaluate --target-command "$python" examples/arm/arm_targets.py
 "$python" - "$work/arm/answers/evaluate-arm.json" <<'PYTHON'
 import json
 import sys
