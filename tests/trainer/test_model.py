@@ -11,6 +11,7 @@ from unittest import mock
 
 import numpy as np
 import onnx
+import torch
 import xxhash
 
 import synthetic
@@ -21,7 +22,7 @@ from trainer.evaluator import ModelDirectory, NumpyModel
 from trainer.line import best_line
 from trainer.measure import Distances, advice, lengths_of
 from trainer.neighbourhoods import plugs_of, seen_by_neurons, shares
-from trainer.network import check_size
+from trainer.network import build, check_size
 from trainer.plausible import doubts
 from trainer.schedule import Schedule
 from trainer.settings import ACTIVATIONS, Settings
@@ -311,6 +312,22 @@ class LineTest(unittest.TestCase):
             wide, c, d = [True] * 5, [False] * 3 + [True, False], [False] * 4 + [True]
             self.assertEqual(seen[:6].tolist(), 2 * [[True, True, False, False, False], c, d])
             self.assertEqual(seen[6:].tolist(), [wide, wide])
+
+    def test_networks_begin_at_the_line_and_neurons_stay_blind(self) -> None:
+        line = best_line(self.controls, lambda some: self.targets[some], np.arange(60), self.still)
+        settings = Settings(neuronsPerLayer=12, activationFunction="SiLU", linearPath=True)
+        seen = np.arange(5) % 3 == np.arange(12)[:, None] % 3
+        network = build(settings, 5, 90, self.still, line, seen)
+        inputs, targets = torch.from_numpy(self.controls), torch.from_numpy(self.targets)
+        with torch.no_grad():
+            self.assertLess(float((network(inputs) - targets).abs().max()), 0.3)
+        first = network.chain[0].weight
+        adam = torch.optim.Adam(network.parameters(), lr=0.01)
+        for _ in range(3):
+            adam.zero_grad()
+            (network(inputs) - 2 * targets).square().mean().backward()
+            adam.step()
+        np.testing.assert_array_equal(first.detach().numpy() != 0, seen & ~self.still)
 
 
 class SizesTest(unittest.TestCase):
