@@ -2,6 +2,7 @@
 #include "quarn/play/FramePlayer.h"
 
 #include "openquarn_app/Evaluation.h"
+#include "quarn/scene/EnvelopeGuard.h"
 #include "quarn/scene/FrameLog.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/meshes.h"
@@ -13,9 +14,10 @@
 
 namespace quarn {
 
-FramePlayer::FramePlayer(SceneSession& session, HPlug mesh)
+FramePlayer::FramePlayer(SceneSession& session, HPlug mesh, EnvelopeGuard* guard)
     : session_(session)
-    , mesh_(std::move(mesh)) {}
+    , mesh_(std::move(mesh))
+    , guard_(guard) {}
 
 double FramePlayer::show(int frame) {
     using Clock = std::chrono::steady_clock;
@@ -24,6 +26,8 @@ double FramePlayer::show(int frame) {
     const FrameLog log(frame);
     const Clock::time_point begin = Clock::now();
     session_.host().setTime(frame);
+    if (guard_ != nullptr)
+        guard_->apply(frame);
     const HStatus status = OpenQuarn::evaluate(mesh_);
     const std::chrono::duration<double> seconds = Clock::now() - begin;
     requireNoErrors();

@@ -10,13 +10,15 @@
 
 namespace quarn {
 
+class EnvelopeGuard;
 class SceneSession;
 
 /// Shows frames of a mesh plug. Errors are std::runtime_error with "frame N: " and what the host said. Thread: main.
 class FramePlayer {
 public:
-    /// `mesh` must hold a mesh. `session` outlives it.
-    FramePlayer(SceneSession& session, HPlug mesh);
+    /// `mesh` must hold a mesh. `guard`: applied in every frame, as part of what is timed; may be null. Both outlive
+    /// it, as `session` does.
+    FramePlayer(SceneSession& session, HPlug mesh, EnvelopeGuard* guard);
 
     /// Sets the time and evaluates the mesh. Returns how long that took, in seconds. Throws also when the mesh could be
     /// evaluated and something before it, or its model, failed: the frame would not be what the scene describes.
@@ -30,6 +32,7 @@ private:
 
     SceneSession& session_;
     HPlug mesh_;
+    EnvelopeGuard* guard_;
     HostErrors errors_;
     int frame_ = 0;
 };

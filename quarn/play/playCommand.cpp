@@ -32,6 +32,7 @@ struct Options {
     SceneOptions scene;
     Console console;
     ModelOption model;
+    GuardOption guard;
     std::string deformer, geometry, plug, frames, against;
     std::string order = "scene", evaluator = "cpu", device;
     CacheSpace space;
@@ -148,6 +149,8 @@ PlayPlan planFor(const Options& options) {
     plan.isOnGpu = options.evaluator == "gpu";
     plan.model = geometry != nullptr && options.model.isGiven() ? chooseModel(*warp, *geometry, options.model)
                                                                 : chooseModel(plan.mesh, options.model);
+    if (options.guard.isOn)
+        plan.guardWidth = options.guard.width;
     addComparison(plan, options, warp ? &*warp : nullptr, geometry);
     addOrder(plan, options.order);
     addSource(plan, options, geometry);
@@ -184,6 +187,7 @@ void bake(Options& options) {
                          std::to_string(result.vertexCount) + " vertices to " + options.output.string());
     if (!plan.model.note.empty())
         options.console.note(plan.model.note);
+    noteGuard(options.console, result.guard, options.guard.width);
 }
 
 void addFrameOptions(CLI::App& command, Options& options) {
@@ -240,6 +244,7 @@ void addPlayCommand(CLI::App& app) {
     command->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");
     command->add_option("--plug", options->plug, "Play this mesh plug instead of what the deformer gives out");
     addModelOptions(*command, options->model);
+    addGuardOptions(*command, options->guard);
     command
         ->add_option("-o,--output", options->output,
                      "FILE.npy, .npz, .pc2, .mdd, .usda or .glb for all frames; FILE.####.obj, .ply, .gltf or .glb")
@@ -262,6 +267,7 @@ void addBakeCommand(CLI::App& app) {
         ->type_name("FILE")
         ->required();
     addModelOptions(*command, options->model);
+    addGuardOptions(*command, options->guard);
     addFrameOptions(*command, *options);
     addConsoleOptions(*command, options->console, false);
     command->callback([options] { bake(*options); });

@@ -141,6 +141,7 @@ std::string playText(const PlayResult& result, const PlayPlan& plan, double mete
     if (result.shapes)
         out << "written with " << result.shapes->count << " shapes, at most " << result.shapes->error
             << " mm from any frame\n";
+    out << guardText(result.guard, plan.guardWidth.value_or(0.0));
     if (!result.mesh)
         return out.str();
     const Scale scale = scaleOf(result, metersPerUnit);
@@ -169,6 +170,7 @@ std::string playJson(const PlayResult& result, const PlayPlan& plan, double mete
     writeTimes(json, result);
     writeGpu(json, result.gpu);
     writeShapes(json, result.shapes);
+    writeGuard(json, result.guard, plan.guardWidth.value_or(0.0));
     writeComparison(json, "distance", result.mesh, scale);
     writeComparison(json, "before", result.before, scale);
     if (result.mesh) {

@@ -38,14 +38,23 @@ std::string sizeSentence(const std::filesystem::path& path, std::uint64_t bytes,
     return path.string() + " will have about " + size;
 }
 
+std::optional<EnvelopeGuard> guardOf(const PlayPlan& plan) {
+    if (!plan.guardWidth)
+        return {};
+    return EnvelopeGuard(AppliedModels({plan.mesh}).geometries(), *plan.guardWidth);
+}
+
 class Playing {
 public:
     Playing(SceneSession& session, PlayPlan plan, const Console& console)
         : console_(console)
         , plan_(std::move(plan))
-        , player_(session, plan_.mesh)
         , models_({plan_.mesh, plan_.against})
+        , guard_(guardOf(plan_))
+        , player_(session, plan_.mesh, guard_ ? &*guard_ : nullptr)
         , progress_(console, "playing", plan_.frames.count() * static_cast<std::size_t>(plan_.repeats)) {
+        if (guard_)
+            models_.setGuarded();
         if (!plan_.output.empty())
             checkFramePattern(plan_.output, plan_.frames);
         if (!plan_.trace.empty())
@@ -74,6 +83,8 @@ public:
             result_.phases = writeTraceAndReadPhases(plan_.trace);
         if (plan_.isOnGpu)
             takeGpuUse();
+        if (guard_)
+            result_.guard = guard_->reports();
         return std::move(result_);
     }
 
@@ -158,8 +169,9 @@ private:
 
     const Console& console_;
     PlayPlan plan_;
-    FramePlayer player_;
     AppliedModels models_;
+    std::optional<EnvelopeGuard> guard_;
+    FramePlayer player_;
     Progress progress_;
     RecordingEnd recordingEnd_;
     PlayResult result_;

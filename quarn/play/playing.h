@@ -9,6 +9,7 @@
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/evaluator.h"
 #include "quarn/scene/CacheSpace.h"
+#include "quarn/scene/EnvelopeGuard.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/useModel.h"
 
@@ -41,6 +42,7 @@ struct PlayPlan {
     HPlug against;                          ///< mesh to compare with; null: none
     HPlug before;                           ///< compared as well, where there is `against`; may be null
     ModelInUse model;                       ///< that was chosen for the mesh; only to be told
+    std::optional<double> guardWidth;       ///< of an EnvelopeGuard of the mesh; none: it has none
     std::optional<std::vector<float>> rest; ///< whose box lengths are compared with; none: `against` in the first frame
 };
 
@@ -59,6 +61,7 @@ struct PlayResult {
     Jitter targetJitter;
     double boxDiagonal = 0.0;             ///< 0 without a comparison
     std::optional<ShapesOfMotion> shapes; ///< none: nothing was written that has fitted ones
+    std::vector<GuardReport> guard;       ///< empty without a guard
 };
 
 /// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. Thread: main.

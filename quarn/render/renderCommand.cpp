@@ -14,6 +14,7 @@
 #include "quarn/render/heat.h"
 #include "quarn/render/pictureNames.h"
 #include "quarn/scene/AppliedModels.h"
+#include "quarn/scene/EnvelopeGuard.h"
 #include "quarn/scene/FrameLog.h"
 #include "quarn/scene/HostErrors.h"
 #include "quarn/scene/SceneSession.h"
@@ -56,6 +57,7 @@ struct Options {
     std::string deformer;
     std::string geometry;
     ModelOption model;
+    GuardOption guard;
     std::vector<PanelText> panels;
     double range = 0.0; // millimetres; 0 for the largest distance
     std::string size = "480x480";
@@ -73,6 +75,13 @@ struct Shot {
     Layout layout;
     Camera camera;
     HeatScale scale;
+    std::optional<EnvelopeGuard> guard;
+
+    void setTime(SceneSession& session, int frame) {
+        session.host().setTime(frame);
+        if (guard)
+            guard->apply(frame);
+    }
 };
 
 // over all vertices and pictures of a panel, in object space
@@ -186,12 +195,15 @@ double largestOf(const std::vector<double>& distances) {
     return distances.empty() ? 0.0 : *std::max_element(distances.begin(), distances.end());
 }
 
-AppliedModels modelsOf(const std::vector<Panel>& panels) {
+AppliedModels modelsOf(const Shot& shot) {
     std::vector<HPlug> meshes;
-    for (const Panel& panel : panels)
+    for (const Panel& panel : shot.panels)
         for (const PanelMesh& mesh : panel.meshes)
             meshes.insert(meshes.end(), {mesh.mesh, mesh.reference});
-    return AppliedModels(meshes);
+    AppliedModels models(meshes);
+    if (shot.guard)
+        models.setGuarded();
+    return models;
 }
 
 // looks at the frames before any is drawn: where the camera has to stand, and how far the colours have to reach
@@ -203,13 +215,13 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
     const std::size_t looks = std::min(count, mostFramesLookedAt);
     const Stage stage([] { return std::string("looking at the frames"); });
     const HostErrors errors;
-    AppliedModels models = modelsOf(shot.panels);
+    AppliedModels models = modelsOf(shot);
     Progress progress(options.console, "looking at the frames", looks);
     for (std::size_t number = 0; number < looks; ++number) {
         // with more frames than looks, spread evenly from the first to the last
         const int frame = shot.frames.frame(looks == count ? number : number * (count - 1) / (looks - 1));
         const FrameLog log(frame);
-        session.host().setTime(frame);
+        shot.setTime(session, frame);
         models.blame([&] {
             std::vector<PanelFrame> shown;
             for (const Panel& panel : shot.panels)
@@ -242,17 +254,17 @@ void warnOfEmptyPanels(const Shot& shot, const Console& console) {
                              " has no polygons: there is nothing to see of it");
 }
 
-void drawPictures(const Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
+void drawPictures(Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
     const std::filesystem::path pattern = absolutePath(options.output);
     const std::size_t count = shot.frames.count();
     const HostErrors errors;
-    AppliedModels models = modelsOf(shot.panels);
+    AppliedModels models = modelsOf(shot);
     Progress progress(options.console, "drawing", count);
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
         const std::filesystem::path name = pictureName(pattern, frame, count > 1);
         const Stage stage([&] { return "drawing " + name.string(); });
-        session.host().setTime(frame);
+        shot.setTime(session, frame);
         Picture picture(shot.layout.width * static_cast<int>(shot.panels.size()), shot.layout.height);
         const std::vector<ShownJoint> joints = options.hasJoints ? shownJoints() : std::vector<ShownJoint>();
         int left = 0;
@@ -309,7 +321,7 @@ void writePanels(JsonWriter& writer, const Shot& shot, const Answer& answer) {
     writer.EndArray();
 }
 
-std::string jsonOf(const Shot& shot, const Answer& answer) {
+std::string jsonOf(const Shot& shot, const Answer& answer, const Options& options) {
     rapidjson::StringBuffer buffer;
     JsonWriter writer(buffer);
     writer.StartObject();
@@ -323,11 +335,13 @@ std::string jsonOf(const Shot& shot, const Answer& answer) {
     writer.Key("height");
     writer.Int(shot.layout.height);
     writePanels(writer, shot, answer);
+    writeGuard(writer, shot.guard ? shot.guard->reports() : std::vector<GuardReport>(), options.guard.width);
     writer.EndObject();
     return std::string(buffer.GetString()) + "\n";
 }
 
-void tell(const Shot& shot, const Answer& answer, const Console& console) {
+void tell(const Shot& shot, const Answer& answer, const Options& options) {
+    const Console& console = options.console;
     if (shot.frames.count() > mostFramesLookedAt)
         console.note("the camera and the range of colours are those of " + std::to_string(mostFramesLookedAt) +
                      " of the " + std::to_string(shot.frames.count()) + " frames");
@@ -336,6 +350,8 @@ void tell(const Shot& shot, const Answer& answer, const Console& console) {
         for (const ModelInUse& model : models)
             if (!model.note.empty() && notes.insert(model.note).second)
                 console.note(model.note);
+    if (shot.guard)
+        noteGuard(console, shot.guard->reports(), options.guard.width);
     const std::string last = answer.pictures.back().string();
     console.note(answer.pictures.size() == 1 ? "drew " + last
                                              : "drew " + std::to_string(answer.pictures.size()) + " pictures, " +
@@ -353,11 +369,13 @@ void render(const Options& options) {
         Shot shot = plan(options, session);
         Answer answer;
         answer.measures.resize(shot.panels.size());
+        if (options.guard.isOn)
+            shot.guard.emplace(modelsOf(shot).geometries(), options.guard.width);
         look(shot, view, options, session);
         warnOfEmptyPanels(shot, options.console);
         drawPictures(shot, options, session, answer);
-        tell(shot, answer, options.console);
-        told = options.console.json ? jsonOf(shot, answer) : "";
+        tell(shot, answer, options);
+        told = options.console.json ? jsonOf(shot, answer, options) : "";
     }
     std::cout << told;
 }
@@ -389,6 +407,7 @@ void addWhatIsShown(CLI::App& command, Options& options) {
     command.add_option("--geometry", options.geometry, "The deformer's geometry, where it has several")
         ->type_name("INDEX|NAME");
     addModelOptions(command, options.model);
+    addGuardOptions(command, options.guard);
 }
 
 } // namespace

@@ -126,15 +126,16 @@ AppliedModels::AppliedModels(const std::vector<HPlug>& meshes) {
                                      [i = index](const WarpGeometry& geometry) { return geometry.index == i; });
         if (at != warp.geometries.end()) {
             WarpGeometry geometry = *at;
-            unchecked_.push_back({std::move(warp), std::move(geometry)});
+            geometries_.push_back({std::move(warp), std::move(geometry)});
         }
     }
+    unchecked_ = geometries_;
 }
 
 void AppliedModels::requireSound() {
-    std::erase_if(unchecked_, [](const Geometry& one) {
+    std::erase_if(unchecked_, [this](const Geometry& one) {
         if (!isApplied(one))
-            return !canChange(one);
+            return !isGuarded_ && !canChange(one);
         requireSound(one);
         return true;
     });

@@ -15,8 +15,18 @@ namespace quarn {
 /// The geometries of deformers that some mesh plugs depend on. Thread: main.
 class AppliedModels {
 public:
+    struct Geometry {
+        Warp warp;
+        WarpGeometry geometry;
+    };
+
     /// Null plugs are passed over.
     explicit AppliedModels(const std::vector<HPlug>& meshes);
+
+    const std::vector<Geometry>& geometries() const { return geometries_; }
+
+    /// Somebody else sets envelopes from now on: that of a deformer that does not apply its model may rise again.
+    void setGuarded() { isGuarded_ = true; }
 
     /// To be called after a frame has been evaluated without an error. The first time that a deformer applies its model
     /// (switched on, envelope not 0, not replaced by a target morph), looks into the model directory and at the rest
@@ -37,15 +47,12 @@ public:
     }
 
 private:
-    struct Geometry {
-        Warp warp;
-        WarpGeometry geometry;
-    };
     static bool isApplied(const Geometry& geometry);
     static bool canChange(const Geometry& geometry);
     static void requireSound(const Geometry& geometry);
 
-    std::vector<Geometry> unchecked_;
+    std::vector<Geometry> geometries_, unchecked_;
+    bool isGuarded_ = false;
 };
 
 } // namespace quarn

@@ -104,6 +104,21 @@ wait "$player" || status=$?
 [[ $status == 130 ]] && grep -q interrupted "$work/err" || fail "interrupted: status $status"
 ! compgen -G "$work/.whole-*" >/dev/null && [[ ! -e $work/long.npy ]] || fail "something is left of an interrupted play"
 
+# a guard: at 1 the first control is as far beyond its range as that is wide
+expect 1 '' 'frame 1: the guard of wave fails: .*wave\.nwrp does not say which poses' play "$scene" --frames 1 --guard
+cp "$work/models/wave.nwrp/metadata.json" "$work/metadata.json"
+sed -i 's/^{/{"controlNames": ["a", "b"], "certificate": {"controls": {"minima": [0, -1], "maxima": [0.5, 1]}, "trainingFrames": 9, "errors": []},/' \
+  "$work/models/wave.nwrp/metadata.json"
+guarded=('lowered in 5 of 11 frames, and 0 in 1; frame 11 is furthest .* by 1 of a range \(.* 0 from 1 on\)')
+expect 0 "${guarded[0]}"'(.|\n)*max 221' '' play "$scene" --frames 1-11 --against strip.outMesh --guard --repeat 2
+expect 0 '"off": 0,(.|\n)*"max": 22[45]\.' '' \
+  play "$scene" --frames 11 --against strip.outMesh --guard --guard-width 2 --json
+expect 0 '' "${guarded[0]}" bake "$scene" 'wave.outputGeom[0]' --frames 1-11 -o "$work/guarded.npy" --guard
+expect 0 '"lowered": 1,' 'lowered in 1 of 1 frames' render "$scene" --frames 11 -o "$work/a.png" --size 40x30 --guard --json
+expect 2 '' '--guard-width requires --guard' play "$scene" --guard-width 2
+expect 1 '' 'what is shown has none' bake "$scene" strip.outMesh --frames 1 -o "$work/lost.npy" --guard
+mv "$work/metadata.json" "$work/models/wave.nwrp"
+
 # a model that is off: the only one that fits is taken, and what is shown is always said
 fits=('"model": {\s+"name": "wave",\s+"from": "only one that fits"' 'played .* model wave\nthe model of wave is off in the scene; taken is wave')
 expect 0 "${fits[0]}" '' play "$work/off.json" --frames 1-3 --json
