@@ -2,7 +2,7 @@
 // The deformer in export mode, and what it gives frame by frame.
 #pragma once
 
-#include "quarn/dataset/ControlReader.h"
+#include "quarn/scene/ControlReader.h"
 #include "quarn/scene/Warp.h"
 
 #include "openquarn/HIndexMapper.h"

@@ -19,9 +19,12 @@ private:
     std::mt19937_64 engine_;
 };
 
-double drawValue(const ValueLimits& limits, double activationRate, Dice& dice) {
-    if (dice.throwOnce() >= activationRate)
+double drawValue(const ValueLimits& limits, const DrawSettings& settings, Dice& dice) {
+    if (dice.throwOnce() >= settings.activationRate)
         return limits.rest;
+    // without such a rate there is no throw for it: the poses of a seed stay those that they were
+    if (settings.limitRate > 0.0 && dice.throwOnce() < settings.limitRate)
+        return dice.throwOnce() < 0.5 ? limits.least : limits.most;
     const double part = dice.throwOnce();
     return std::clamp(limits.least * (1.0 - part) + limits.most * part, limits.least, limits.most);
 }
@@ -34,7 +37,7 @@ std::size_t drawPoses(PoseSet& poses, const DrawSettings& settings, const std::f
     std::size_t dropped = 0;
     for (std::size_t inVain = 0; poses.count() < settings.count && inVain < drawsInVain;) {
         std::transform(poses.limits().begin(), poses.limits().end(), pose.begin(),
-                       [&](const ValueLimits& limits) { return drawValue(limits, settings.activationRate, dice); });
+                       [&](const ValueLimits& limits) { return drawValue(limits, settings, dice); });
         const bool isNew = poses.add(pose);
         inVain = isNew ? 0U : inVain + 1;
         dropped += isNew ? 0U : 1U;

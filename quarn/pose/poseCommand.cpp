@@ -6,7 +6,9 @@
 #include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
+#include "quarn/console/numberText.h"
 #include "quarn/pose/keyPoses.h"
+#include "quarn/pose/refinePoses.h"
 #include "quarn/pose/samplePoses.h"
 #include "quarn/pose/writePoses.h"
 #include "quarn/scene/SceneSession.h"
@@ -27,6 +29,7 @@ struct Options {
     std::string deformer;
     SampleOptions sampling;
     std::string from = "limits";
+    RefineOptions refining;
     std::filesystem::path keys;
     std::string others = "rest";
     PosesFileOptions written;
@@ -81,6 +84,46 @@ void printText(const SampleReport& report) {
               << " from limits, the default pose included, " << report.fromAnimation << " from animation; "
               << report.drawnAgain << " drawn again and " << report.framesLeftOut
               << " frames left out, being near another\n";
+}
+
+void writeReport(JsonWriter& writer, const RefineReport& report, const Options& options) {
+    writeText(writer, "collector", report.collector);
+    writeCount(writer, "poses", report.known + report.added.size());
+    writeCount(writer, "values", report.values);
+    writeCount(writer, "known", report.known);
+    writer.Key("seed");
+    writer.Uint64(options.refining.seed);
+    writeFrames(writer, report.firstFrame, report.lastFrame);
+    writer.Key("candidates");
+    writer.StartObject();
+    writeCount(writer, "count", report.candidates);
+    writer.Key("disagreementMm");
+    writer.Double(report.candidatesMm);
+    writer.EndObject();
+    writer.Key("added");
+    writer.StartArray();
+    for (const AddedPose& pose : report.added) {
+        writer.StartObject();
+        writer.Key("frame");
+        writer.Int(pose.frame);
+        writer.Key("disagreementMm");
+        writer.Double(pose.mm);
+        writer.Key("distance");
+        writer.Double(pose.distance);
+        writeCount(writer, "atLimits", pose.atLimits);
+        writer.EndObject();
+    }
+    writer.EndArray();
+}
+
+void printText(const RefineReport& report) {
+    double mm = 0.0;
+    for (const AddedPose& pose : report.added)
+        mm += pose.mm / static_cast<double>(report.added.size());
+    std::cout << report.added.size() << " poses added behind " << report.known << ", now "
+              << frames(report.firstFrame, report.lastFrame) << ": the models are " << numberText(mm)
+              << " mm apart in them in the mean, and " << numberText(report.candidatesMm) << " mm in the "
+              << report.candidates << " candidates\n";
 }
 
 void writeReport(JsonWriter& writer, const KeysReport& report, const Options&) {
@@ -148,17 +191,39 @@ std::optional<Warp> warpOf(const Options& options) {
     return hasWarp ? std::optional(Warp::find(options.deformer)) : std::nullopt;
 }
 
+void requireTolerance(double tolerance) {
+    if (!std::isfinite(tolerance) || tolerance < 0.0)
+        throw UsageError("--tolerance is a finite number from 0 on");
+}
+
 void sample(SceneSession& session, Options& options) {
     options.sampling.fromLimits = options.from != "animation";
     options.sampling.fromAnimation = options.from != "limits";
     if (!options.sampling.fromAnimation && !options.sampling.frames.empty())
         throw UsageError("--frames chooses frames of the animation: add --from animation or --from both");
-    if (!options.sampling.fromLimits && (options.sampling.samples || options.sampling.activationRate))
-        throw UsageError("--samples and --activation-rate are for poses from limits: use --from both");
-    if (!std::isfinite(options.sampling.tolerance) || options.sampling.tolerance < 0.0)
-        throw UsageError("--tolerance is a finite number from 0 on");
+    if (!options.sampling.fromLimits &&
+        (options.sampling.samples || options.sampling.activationRate || options.sampling.limitRate > 0.0))
+        throw UsageError("--samples, --activation-rate and --limit-rate are for poses from limits: use --from both");
+    requireTolerance(options.sampling.tolerance);
     const Warp warp = Warp::find(options.deformer);
     const SampleReport report = samplePoses(warp, options.sampling, options.console);
+    deliver(session, warp, report, options);
+}
+
+void refine(SceneSession& session, Options& options) {
+    RefineOptions& refining = options.refining;
+    if (options.sampling.samples || options.sampling.start || options.from != "limits" ||
+        options.sampling.limitRate > 0.0)
+        throw UsageError("--samples, --start, --from and --limit-rate are for the first poses: --add N says how many "
+                         "--refine adds behind them");
+    if (refining.count == 0)
+        throw UsageError("--refine needs --add N: how many poses to add");
+    requireTolerance(options.sampling.tolerance);
+    refining.activationRate = options.sampling.activationRate;
+    refining.seed = options.sampling.seed;
+    refining.tolerance = options.sampling.tolerance;
+    const Warp warp = Warp::find(options.deformer);
+    const RefineReport report = refinePoses(warp, refining, options.console);
     deliver(session, warp, report, options);
 }
 
@@ -181,6 +246,8 @@ void pose(Options& options) {
     watchForInterrupt();
     options.output = absolutePath(options.output);
     options.keys = absolutePath(options.keys);
+    for (std::filesystem::path& model : options.refining.models)
+        model = absolutePath(model);
     options.written.file = absolutePath(options.written.file);
     if (options.output.empty() && options.written.file.empty())
         throw UsageError("--output is required: the scene to write; or --write FILE for the poses that there are");
@@ -189,6 +256,8 @@ void pose(Options& options) {
     SceneSession session(options.scene);
     if (options.output.empty())
         writeOnly(options);
+    else if (!options.refining.models.empty())
+        refine(session, options);
     else if (options.keys.empty())
         sample(session, options);
     else
@@ -201,6 +270,10 @@ void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& output
         command.add_option("--samples", sampling.samples, "Poses to draw; the collector's samples when not given"),
         command.add_option("--activation-rate", sampling.activationRate,
                            "How likely a value leaves its default, 0 to 1; the collector's when not given"),
+        command
+            .add_option("--limit-rate", sampling.limitRate,
+                        "How likely an active value stands at one of its limits, 0 to 1")
+            ->capture_default_str(),
         command.add_option("--start", sampling.start,
                            "Frame of the first pose; the collector's samplesStartFrame when not given"),
         command.add_option("--seed", sampling.seed, "Another seed gives other poses")->capture_default_str(),
@@ -215,6 +288,24 @@ void addSamplingOptions(CLI::App& command, Options& options, CLI::Option& output
         option->excludes(&keys)->needs(&output);
     command.add_option("--frames", sampling.frames, "Frames of the animation, as 1-100 or 1-100x5; all by default")
         ->excludes(&keys);
+}
+
+void addRefineOptions(CLI::App& command, Options& options, CLI::Option& output, CLI::Option& keys) {
+    CLI::Option* models = command
+                              .add_option("--refine", options.refining.models,
+                                          "Add poses to those that the scene has: where these models, trained of them "
+                                          "with different seeds, disagree most")
+                              ->type_name("MODEL...")
+                              ->excludes(&keys)
+                              ->needs(&output);
+    command.add_option("--add", options.refining.count, "With --refine: how many poses to add")
+        ->check(CLI::Range(1, 1'000'000))
+        ->needs(models);
+    command
+        .add_option("--candidates", options.refining.candidates,
+                    "With --refine: drawn poses to choose from; 20 for each to add, and 1000 at least, by default")
+        ->check(CLI::Range(1, 1'000'000))
+        ->needs(models);
 }
 
 void addWriteOptions(CLI::App& command, Options& options) {
@@ -249,6 +340,7 @@ void addPoseCommand(CLI::App& app) {
         ->needs(keys)
         ->capture_default_str();
     addSamplingOptions(*command, *options, *output, *keys);
+    addRefineOptions(*command, *options, *output, *keys);
     addWriteOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);
     command->callback([options] { pose(*options); });

@@ -6,17 +6,15 @@
 #include "quarn/pose/animationPoses.h"
 #include "quarn/pose/drawPoses.h"
 #include "quarn/pose/poseKeys.h"
+#include "quarn/pose/rigPoses.h"
 #include "quarn/scene/plugs.h"
 
-#include <numeric>
 #include <stdexcept>
 
 namespace quarn {
 namespace {
 
 constexpr int largestFrame = 100'000'000;
-constexpr std::size_t mostPoses = 1'000'000;
-constexpr std::size_t mostNumbers = 100'000'000; // 800 MB
 
 DrawSettings drawSettings(const HObject& collector, const SampleOptions& options) {
     const HPlug samples = plugOf(collector, "samples");
@@ -32,7 +30,9 @@ DrawSettings drawSettings(const HObject& collector, const SampleOptions& options
         setNumber(samples, count);
     if (options.activationRate)
         setNumber(rate, likely);
-    return {static_cast<std::size_t>(count), likely, options.seed};
+    if (!(options.limitRate >= 0.0 && options.limitRate <= 1.0))
+        throw std::runtime_error("the limit rate is " + numberText(options.limitRate) + ", not from 0 to 1");
+    return {static_cast<std::size_t>(count), likely, options.seed, options.limitRate};
 }
 
 int firstFrame(const HObject& collector, const SampleOptions& options) {
@@ -46,21 +46,6 @@ int firstFrame(const HObject& collector, const SampleOptions& options) {
     return frame;
 }
 
-void requireRoom(std::size_t poses, std::size_t values) {
-    if (poses > mostPoses || poses > mostNumbers / values)
-        throw std::runtime_error(std::to_string(poses) + " poses of " + std::to_string(values) +
-                                 " values are too many: at most " + std::to_string(mostPoses) + " poses and " +
-                                 std::to_string(mostNumbers) + " numbers can be made");
-}
-
-std::vector<ValueLimits> limitsOf(const std::vector<PoseControl>& controls) {
-    std::vector<ValueLimits> limits;
-    limits.reserve(controls.size());
-    for (const PoseControl& control : controls)
-        limits.push_back(control.limits);
-    return limits;
-}
-
 void addDefaultPose(PoseSet& poses) {
     std::vector<double> rest;
     rest.reserve(poses.limits().size());
@@ -72,7 +57,7 @@ void addDefaultPose(PoseSet& poses) {
 void draw(PoseSet& poses, const HObject& collector, const SampleOptions& options, const Console& console,
           SampleReport& report) {
     const DrawSettings settings = drawSettings(collector, options);
-    requireRoom(settings.count, poses.limits().size());
+    requireRoomForPoses(settings.count, poses.limits().size());
     Progress progress(console, "drawing poses", settings.count);
     progress.advance(poses.count());
     report.drawnAgain = drawPoses(poses, settings, [&](std::size_t steps) { progress.advance(steps); });
@@ -84,7 +69,7 @@ void takeFromAnimation(PoseSet& poses, const std::vector<PoseControl>& controls,
                        const Console& console, SampleReport& report) {
     requireOwnAnimation(controls);
     const FrameRange frames = options.frames.empty() ? extentOf(animationCurves()) : frameRange(options.frames);
-    requireRoom(poses.count() + frames.count(), controls.size());
+    requireRoomForPoses(poses.count() + frames.count(), controls.size());
     Progress progress(console, "taking poses from the animation", frames.count());
     const AnimationPoses taken =
         addAnimationPoses(poses, controls, frames, [&](std::size_t steps) { progress.advance(steps); });
@@ -106,26 +91,6 @@ void warnOfDefaults(const Console& console, const std::vector<PoseControl>& cont
     for (const PoseControl& control : controls)
         if (control.limits.rest < control.limits.least || control.limits.rest > control.limits.most)
             console.warn("the default of " + control.input + " lies outside of its limits");
-}
-
-// keys go on only when all is known, so that an error changes nothing
-void putKeys(const PoseSet& poses, const std::vector<PoseControl>& controls, int firstFrame) {
-    removePoseKeys();
-    PoseKeys keys;
-    keys.times.resize(poses.count());
-    std::iota(keys.times.begin(), keys.times.end(), static_cast<double>(firstFrame));
-    for (std::size_t i = 0; i < controls.size(); ++i) {
-        keys.values = poses.track(i);
-        putPoseKeys(controls[i].plug, keys);
-    }
-}
-
-void noteWhatStillMoves(const Console& console) {
-    const std::vector<HObject> curves = animationCurves();
-    if (!curves.empty())
-        console.note(std::to_string(curves.size()) + (curves.size() == 1 ? " curve" : " curves") +
-                     " of the scene's animation still drive what is not sampled, " + nodeName(curves.front()) +
-                     (curves.size() == 1 ? "" : " among them"));
 }
 
 } // namespace
@@ -150,10 +115,8 @@ SampleReport samplePoses(const Warp& warp, const SampleOptions& options, const C
     report.poses = poses.count();
     report.fromAnimation = report.poses - report.fromLimits;
     report.lastFrame = report.firstFrame + static_cast<int>(report.poses) - 1;
-    putKeys(poses, controls, report.firstFrame);
-    setNumber(warp.plug("exportStartFrame"), report.firstFrame);
-    setNumber(warp.plug("exportEndFrame"), report.lastFrame);
-    noteWhatStillMoves(console);
+    // keys go on only when all is known, so that an error changes nothing
+    putSampledPoses(warp, poses, controls, report.firstFrame, console);
     stage.result(
         [&] { return std::to_string(report.poses) + " poses of " + std::to_string(report.values) + " values"; });
     return report;

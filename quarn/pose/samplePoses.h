@@ -18,6 +18,7 @@ struct SampleOptions {
     std::optional<int> start; ///< frame of the first pose
     std::uint64_t seed = 1;
     double tolerance = 1e-3;
+    double limitRate = 0.0; ///< of drawn poses, as in DrawSettings
     bool fromLimits = true;
     bool fromAnimation = false;
     std::string frames; ///< of the animation, as frameRange() reads it; empty for the extent of its keys

@@ -97,15 +97,24 @@ fs::path answerFile(const std::string& step, const std::string& mesh) {
     return fs::path("answers") / (step + (mesh.empty() ? "" : "-" + mesh) + ".json");
 }
 
+std::string ofRound(const std::string& step, std::size_t round) {
+    return round == 0 ? step : step + "-" + std::to_string(round);
+}
+
 RunFacts readFacts(const fs::path& folder) {
     RunFacts facts;
     facts.character = read(folder / answerFile("import"), characterIn);
     facts.poses = read(folder / answerFile("poses"), framesIn);
     facts.motion = read(folder / answerFile("motion"), framesIn);
+    while (const auto span = read(folder / answerFile(ofRound("refine", facts.refined.size() + 1)), framesIn))
+        facts.refined.push_back(*span);
     if (!facts.character)
         return facts;
+    std::vector<std::string> steps{"motion-target"};
+    for (std::size_t round = 0; round <= facts.refined.size(); ++round)
+        steps.push_back(ofRound("target", round));
     for (const MeshFacts& mesh : facts.character->meshes)
-        for (const char* step : {"target", "motion-target"}) {
+        for (const std::string& step : steps) {
             const fs::path file = answerFile(step, mesh.name);
             const std::optional<TargetFacts> target = read(folder / file, targetIn);
             if (target)

@@ -37,9 +37,13 @@ struct TargetFacts {
 struct RunFacts {
     std::optional<CharacterFacts> character;
     std::optional<FrameSpan> poses, motion;
+    std::vector<FrameSpan> refined;             ///< all poses after each round that has added some
     std::map<std::string, TargetFacts> targets; ///< by answerFile()
     bool areLimitsEdited = false;               ///< the run's own limits.json is not as the import has left it
 };
+
+/// The name by which the answer of a step of a round is kept.
+std::string ofRound(const std::string& step, std::size_t round);
 
 /// Where the answer of a step lies in the run's folder; `mesh` as in Step, or empty.
 std::filesystem::path answerFile(const std::string& step, const std::string& mesh = {});

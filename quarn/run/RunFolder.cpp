@@ -97,7 +97,7 @@ std::string RunFolder::versionOf(const Step& step) {
 }
 
 fs::path RunFolder::logOf(const Step& step) const {
-    return folder_ / "log" / (step.name + (step.mesh.empty() ? "" : "-" + step.mesh) + ".log");
+    return folder_ / "log" / (step.joined('-') + ".log");
 }
 
 void RunFolder::prepare(const Step& step) const {

@@ -4,6 +4,7 @@
 #include "quarn/console/UsageError.h"
 #include "quarn/console/numberText.h"
 
+#include <algorithm>
 #include <cmath>
 #include <limits>
 
@@ -51,7 +52,42 @@ void requireOneOf(const char* name, const std::string& value, std::initializer_l
     throw UsageError(std::string(name) + " is \"" + value + "\", not one of " + names);
 }
 
+// of rounds: three where nobody has said
+std::int64_t stepOf(const RunSettings& settings) {
+    return settings.refineStep.value_or((*settings.refineTo - settings.sampleCount() + 2) / 3);
+}
+
+void checkRefining(const RunSettings& settings) {
+    if (!settings.refines() && (settings.refineStep || settings.ensemble || settings.ensembleEpochs))
+        throw UsageError("--refine-step, --ensemble and --ensemble-epochs are for --refine-to N");
+    requireRange("refine-to", settings.refineTo, 3);
+    requireRange("refine-step", settings.refineStep, 1);
+    requireRange("ensemble", settings.ensemble, 2);
+    requireRange("ensemble-epochs", settings.ensembleEpochs, 1);
+    if (!settings.refines())
+        return;
+    if (*settings.refineTo <= settings.sampleCount())
+        throw UsageError("refine-to is " + std::to_string(*settings.refineTo) + ", and there are " +
+                         std::to_string(settings.sampleCount()) + " samples to begin with: it is the number of all");
+    if (settings.targetCommand.empty())
+        throw UsageError("--refine-to needs a --target-command: what is added is not known before, and its targets are "
+                         "made meanwhile");
+    if (!settings.from.empty() && settings.from != "limits")
+        throw UsageError("--refine-to begins with poses from limits: from is \"" + settings.from + "\"");
+    if (settings.rounds() > 100)
+        throw UsageError("--refine-step " + std::to_string(*settings.refineStep) + " makes " +
+                         std::to_string(settings.rounds()) + " rounds: at most 100 are made");
+}
+
 } // namespace
+
+std::int64_t RunSettings::rounds() const {
+    return refines() ? (*refineTo - sampleCount() + stepOf(*this) - 1) / stepOf(*this) : 0;
+}
+
+std::int64_t RunSettings::addedIn(std::int64_t round) const {
+    return std::min(stepOf(*this), *refineTo - sampleCount() - (round - 1) * stepOf(*this));
+}
 
 Words withWholePaths(const Words& words, const fs::path& base) {
     Words whole;
@@ -82,6 +118,7 @@ void check(const RunSettings& settings) {
     requireRange("held-out", settings.heldOut, 3);
     requireRange("seed", settings.seed, 0);
     requireRange("epochs", settings.epochs, 1);
+    checkRefining(settings);
     requireRange("target-timeout", settings.targetTimeout, 1);
     requireRange("target-part", settings.targetPart, 1);
     requireOneOf("from", settings.from, {"limits", "animation", "both"});

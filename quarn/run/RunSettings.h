@@ -16,6 +16,7 @@ struct RunSettings {
     std::filesystem::path character;
     std::filesystem::path parents, limits, motion;
     std::optional<std::int64_t> samples, heldOut, seed, epochs, targetTimeout, targetPart;
+    std::optional<std::int64_t> refineTo, refineStep, ensemble, ensembleEpochs;
     std::optional<double> activationRate, scale;
     std::string from, order, axes;
     bool align = false, anyway = false;
@@ -25,6 +26,10 @@ struct RunSettings {
         renderOptions; ///< words for these commands
 
     std::int64_t sampleCount() const { return samples.value_or(1000); }
+    bool refines() const { return refineTo.has_value(); }
+    /// Rounds in which poses are added, and how many in the round, from 1 on.
+    std::int64_t rounds() const;
+    std::int64_t addedIn(std::int64_t round) const;
     bool hasTargets() const { return !targets.empty() || !targetCommand.empty(); }
 };
 
@@ -40,6 +45,10 @@ void visitSettings(const Visit& visit) {
     visit("from", &Settings::from, "limits|animation|both", "Where poses come from [limits]");
     visit("activation-rate", &Settings::activationRate, "R", "How likely a value leaves its default, 0 to 1");
     visit("seed", &Settings::seed, "S", "Of poses and training; another one gives others [1]");
+    visit("refine-to", &Settings::refineTo, "N", "Poses in the end: those added stand where models disagree most");
+    visit("refine-step", &Settings::refineStep, "N", "Poses added in a round [a third of those to add]");
+    visit("ensemble", &Settings::ensemble, "N", "Models that are trained and compared in a round, 2 or more [3]");
+    visit("ensemble-epochs", &Settings::ensembleEpochs, "N", "Of these trainings [as of the last]");
     visit("motion", &Settings::motion, "KEYS", "A motion that is never trained, as for quarn pose --keys");
     visit("targets", &Settings::targets, "[MESH=]FILE", "The shapes of the poses, a point cache; may be repeated");
     visit("motion-targets", &Settings::motionTargets, "[MESH=]FILE", "The shapes of the motion, likewise");

@@ -17,7 +17,8 @@ namespace quarn {
 struct TargetRequest {
     std::string mesh;
     std::filesystem::path character, skeleton, scene, rest, skin;
-    std::string order; ///< of vertices
+    std::filesystem::path known; ///< shapes of the frames before these, which go before theirs; empty for none
+    std::string order;           ///< of vertices
     std::size_t vertices = 0;
     int firstFrame = 0, lastFrame = 0;
     double metersPerUnit = 1.0;
@@ -30,8 +31,9 @@ enum class Program { quarn, trainer, targetCommand };
 
 /// Runs in the run's folder. Own files are named from there, others by whole paths.
 struct Step {
-    std::string name; ///< "train"
-    std::string mesh; ///< of several meshes the one it is about; else empty
+    std::string name;  ///< "train"
+    std::string mesh;  ///< of several meshes the one it is about; else empty
+    std::string round; ///< which of several alike it is, as "2" of rounds, "2.1" of models in one; else empty
     Program program = Program::quarn;
     Words words; ///< behind the program; of a target command all of them
     std::vector<std::filesystem::path> inputs;
@@ -41,7 +43,13 @@ struct Step {
     std::optional<TargetRequest> request;       ///< of a target command
     std::map<std::string, std::string> written; ///< texts that it reads, by the names of their files: written before
 
-    std::string label() const { return mesh.empty() ? name : name + " " + mesh; }
+    std::string label() const { return joined(' '); }
+    std::string joined(char between) const {
+        std::string text = name;
+        for (const std::string& part : {round, mesh})
+            text += part.empty() ? "" : between + part;
+        return text;
+    }
 };
 
 using Plan = std::vector<Step>;

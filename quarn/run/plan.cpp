@@ -83,24 +83,39 @@ public:
         poses();
         if (hasMotion())
             motion();
+        else if (settings_.refines())
+            heldOutPoses();
         each([&](const MeshFacts& mesh) { rest(mesh); });
-        skins("poses", facts_.poses);
-        if (hasMotion())
-            skins("motion", facts_.motion);
-        if (!settings_.hasTargets() || !facts_.poses || (hasMotion() && !facts_.motion))
+        skins("skin", "poses", facts_.poses);
+        if (hasHeldScene())
+            skins("motion-skin", "motion", facts_.motion);
+        if (!settings_.hasTargets() || !facts_.poses || (hasHeldScene() && !facts_.motion))
             return plan_;
+        posed_ = {"poses", 0, *facts_.poses};
         targets();
+        while (posed_.round < static_cast<std::size_t>(settings_.rounds()))
+            if (!refine())
+                return plan_;
         models();
         return plan_;
     }
 
 private:
+    /// A scene with poses to train: those that were drawn, or those that a round has added to them.
+    struct Posed {
+        std::string scene;
+        std::size_t round = 0;
+        FrameSpan frames;
+    };
+
     bool hasMotion() const { return !settings_.motion.empty(); }
+    // rounds add poses behind those that are there: what is held out is not among them
+    bool hasHeldScene() const { return hasMotion() || settings_.refines(); }
     // of skins; targets in the order of the rest pose are made to fit those of the scene
     std::string order() const { return settings_.order == "file" ? "file" : "scene"; }
     std::string dataOf(const MeshFacts& mesh) const { return "data/" + mesh.name; }
-    std::string heldScene() const { return hasMotion() ? "motion" : "poses"; }
-    FrameSpan heldFrames() const { return hasMotion() ? *facts_.motion : heldOutFrames(settings_, *facts_.poses); }
+    std::string heldScene() const { return hasHeldScene() ? "motion" : "poses"; }
+    FrameSpan heldFrames() const { return hasHeldScene() ? *facts_.motion : heldOutFrames(settings_, *facts_.poses); }
 
     template <class Do>
     void each(const Do& action) {
@@ -120,6 +135,7 @@ private:
               std::vector<fs::path> outputs) {
         Step step{name,
                   mesh != nullptr && facts_.character->meshes.size() > 1 ? mesh->name : "",
+                  {},
                   Program::quarn,
                   std::move(words),
                   std::move(inputs),
@@ -133,12 +149,17 @@ private:
     }
     // its answer is kept as JSON, in the place that facts are read from
     Step& addAnswering(const char* name, const MeshFacts* mesh, Words words, std::vector<fs::path> inputs,
-                       std::vector<fs::path> outputs) {
+                       std::vector<fs::path> outputs, std::size_t round = 0) {
         Step& step = add(name, mesh, std::move(words), std::move(inputs), std::move(outputs));
+        setRound(step, round);
         step.words.emplace_back("--json");
-        step.answer = answerFile(name, mesh != nullptr ? mesh->name : "");
+        step.answer = answerFile(ofRound(name, round), mesh != nullptr ? mesh->name : "");
         step.outputs.push_back(step.answer);
         return step;
+    }
+    static void setRound(Step& step, std::size_t round) {
+        if (round > 0)
+            step.round = std::to_string(round);
     }
     static void append(Words& words, const Words& more) { words.insert(words.end(), more.begin(), more.end()); }
     static void appendFile(Step& step, const char* flag, const fs::path& file) {
@@ -175,19 +196,28 @@ private:
     }
 
     void poses() {
+        const std::int64_t samples = settings_.sampleCount();
+        sample("poses", samples + (hasHeldScene() ? 0 : heldOutOf(settings_, samples)), settings_.seed);
+    }
+
+    // with another seed, as a scene of their own
+    void heldOutPoses() {
+        sample("motion", heldOutOf(settings_, settings_.sampleCount()), settings_.seed.value_or(1) + 1);
+    }
+
+    void sample(const char* name, std::int64_t count, const std::optional<std::int64_t>& seed) {
+        const std::string scene = name;
         Step& step =
-            addAnswering("poses", nullptr, {"pose", "character.json", "-o", "poses.json", "--write", "poses.glb"},
-                         {"character.json"}, {"poses.json", "poses.glb"});
+            addAnswering(name, nullptr, {"pose", "character.json", "-o", scene + ".json", "--write", scene + ".glb"},
+                         {"character.json"}, {scene + ".json", scene + ".glb"});
         if (!settings_.from.empty())
             append(step.words, {"--from", settings_.from});
-        if (settings_.from != "animation") {
-            const std::int64_t samples = settings_.sampleCount();
-            append(step.words, {"--samples", std::to_string(samples + heldOutOf(settings_, samples))});
-        }
+        if (settings_.from != "animation")
+            append(step.words, {"--samples", std::to_string(count)});
         if (settings_.activationRate)
             append(step.words, {"--activation-rate", decimal(*settings_.activationRate)});
-        if (settings_.seed)
-            append(step.words, {"--seed", std::to_string(*settings_.seed)});
+        if (seed)
+            append(step.words, {"--seed", std::to_string(*seed)});
         append(step.words, settings_.poseOptions);
     }
 
@@ -211,43 +241,54 @@ private:
         addPoints("rest", mesh, "character.json", mesh.name + ".outMesh", {1, 1}, dataOf(mesh) + "/rest.npy", order());
     }
 
-    void skins(const std::string& scene, const std::optional<FrameSpan>& frames) {
+    void skins(const char* name, const std::string& scene, const std::optional<FrameSpan>& frames) {
         if (!frames)
             return;
         each([&](const MeshFacts& mesh) {
-            addPoints(scene == "poses" ? "skin" : "motion-skin", mesh, scene + ".json", mesh.skin + ".outputGeom[0]",
-                      *frames, skinFile(scene, mesh.name).string(), order());
+            setRound(addPoints(name, mesh, scene + ".json", mesh.skin + ".outputGeom[0]", *frames,
+                               skinFile(scene, mesh.name).string(), order()),
+                     posed_.round);
         });
     }
 
     // --- with targets ---
 
     void targets() {
-        targetsOf("poses", settings_.targets, *facts_.poses);
-        if (hasMotion())
-            targetsOf("motion", settings_.motionTargets, *facts_.motion);
+        makeTargets("targets", "poses", settings_.targets, posed_.frames, {});
+        connectTargets("target", "poses");
+        if (!hasHeldScene())
+            return;
+        makeTargets("motion-targets", "motion", settings_.motionTargets, *facts_.motion, {});
+        connectTargets("motion-target", "motion");
     }
 
-    void targetsOf(const std::string& scene, const Words& given, const FrameSpan& frames) {
-        const bool isMotion = scene == "motion";
+    // `frames` are those that are made; those of the scene `known` are there
+    void makeTargets(const char* name, const std::string& scene, const Words& given, const FrameSpan& frames,
+                     const std::string& known) {
         const std::map<std::string, fs::path> files = filesByMesh(given, *facts_.character);
-        std::map<std::string, fs::path> caches;
         eachChosen([&](const MeshFacts& mesh) {
             const auto file = files.find(mesh.name);
             if (file == files.end() && settings_.targetCommand.empty())
                 throw std::runtime_error("there are targets of the poses of " + mesh.name + ", and none of its motion");
             if (!settings_.targetCommand.empty())
-                askFor(isMotion ? "motion-targets" : "targets", mesh, scene, frames);
-            caches[mesh.name] =
-                settings_.targetCommand.empty() ? file->second : fs::path(dataOf(mesh) + "/" + scene + "_target.npy");
+                askFor(name, mesh, scene, frames, known);
+            caches_[mesh.name] = settings_.targetCommand.empty() ? file->second : targetFile(scene, mesh);
         });
+    }
+
+    fs::path targetFile(const std::string& scene, const MeshFacts& mesh) const {
+        return dataOf(mesh) + "/" + scene + "_target.npy";
+    }
+
+    // those that were made
+    void connectTargets(const char* name, const std::string& scene) {
         eachChosen([&](const MeshFacts& mesh) {
-            const fs::path& cache = caches.at(mesh.name);
+            const fs::path& cache = caches_.at(mesh.name);
             const std::string output = scene + "." + mesh.name + ".json";
-            Step& step = addAnswering(isMotion ? "motion-target" : "target", &mesh,
+            Step& step = addAnswering(name, &mesh,
                                       {"target", scene + ".json", "--cache", cache.string(), "--geometry", mesh.name,
                                        "--order", settings_.order.empty() ? "scene" : settings_.order, "-o", output},
-                                      {scene + ".json", cache}, {output});
+                                      {scene + ".json", cache}, {output}, posed_.round);
             if (!settings_.axes.empty())
                 append(step.words, {"--axes", settings_.axes});
             if (settings_.scale)
@@ -260,14 +301,19 @@ private:
         });
     }
 
-    void askFor(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames) {
+    void askFor(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames,
+                const std::string& known) {
         const fs::path skin = skinFile(scene, mesh.name);
         const std::string rest = dataOf(mesh) + "/rest.npy";
         Step& step = add(name, &mesh, settings_.targetCommand,
-                         {settings_.character, scene + ".glb", scene + ".json", rest, skin},
-                         {dataOf(mesh) + "/" + scene + "_target.npy"});
+                         {settings_.character, scene + ".glb", scene + ".json", rest, skin}, {targetFile(scene, mesh)});
         step.program = Program::targetCommand;
+        setRound(step, posed_.round);
         TargetRequest& request = step.request.emplace();
+        if (!known.empty()) {
+            request.known = targetFile(known, mesh);
+            step.inputs.push_back(request.known);
+        }
         request.mesh = mesh.name;
         request.character = settings_.character;
         request.skeleton = scene + ".glb";
@@ -285,20 +331,73 @@ private:
 
     // as the scene plays it: the file that was given, or what quarn target has made of it; none before that is done
     const TargetFacts* targetOf(const std::string& scene, const MeshFacts& mesh) const {
-        const auto found = facts_.targets.find(answerFile(scene == "motion" ? "motion-target" : "target", mesh.name));
+        const std::string step = scene == "motion" ? "motion-target" : ofRound("target", posed_.round);
+        const auto found = facts_.targets.find(answerFile(step, mesh.name));
         return found == facts_.targets.end() ? nullptr : &found->second;
+    }
+    bool hasTargetsOf(const std::string& scene) {
+        bool isKnown = true;
+        eachChosen([&](const MeshFacts& mesh) { isKnown = isKnown && targetOf(scene, mesh) != nullptr; });
+        return isKnown;
+    }
+
+    // --- rounds that add poses where models disagree ---
+
+    // false where no more can be told
+    bool refine() {
+        if (!hasTargetsOf(posed_.scene))
+            return false;
+        const Posed before = posed_;
+        const std::size_t round = before.round + 1;
+        const std::string scene = "refined" + std::to_string(round);
+        const Words models = ensemble(round);
+        Step& step = addAnswering("refine", nullptr,
+                                  {"pose", before.scene + ".json", "-o", scene + ".json", "--write", scene + ".glb",
+                                   "--add", std::to_string(settings_.addedIn(static_cast<std::int64_t>(round)))},
+                                  {before.scene + ".json"}, {scene + ".json", scene + ".glb"}, round);
+        if (settings_.seed)
+            append(step.words, {"--seed", std::to_string(*settings_.seed)});
+        step.words.emplace_back("--refine");
+        append(step.words, models);
+        step.inputs.insert(step.inputs.end(), models.begin(), models.end());
+        if (facts_.refined.size() < round)
+            return false;
+        posed_ = {scene, round, facts_.refined[round - 1]};
+        const FrameSpan added{before.frames.last + 1, posed_.frames.last};
+        skins("skin", scene, added);
+        makeTargets("targets", scene, {}, added, before.scene);
+        connectTargets("target", scene);
+        return true;
+    }
+
+    // models of the poses that there are
+    Words ensemble(std::size_t round) {
+        const std::string set = posed_.scene + "_set";
+        Words models;
+        eachChosen([&](const MeshFacts& mesh) {
+            setRound(exportFrames("ensemble-set", mesh, posed_.scene, posed_.frames, set), round);
+        });
+        eachChosen([&](const MeshFacts& mesh) {
+            for (std::int64_t member = 1; member <= settings_.ensemble.value_or(3); ++member) {
+                const std::string number = std::to_string(member);
+                const std::string name = "ensemble/" + posed_.scene + "." + mesh.name + "." + number;
+                Step& step = trainOf("ensemble", mesh, dataOf(mesh) + "/" + set, name + ".nwrp", name + ".report",
+                                     settings_.ensembleEpochs ? settings_.ensembleEpochs : settings_.epochs);
+                step.round = std::to_string(round) + "." + number;
+                // the last one counts: whatever is among the options, members differ
+                append(step.words, {"--seed", std::to_string(settings_.seed.value_or(1) + member)});
+                models.push_back(name + ".nwrp");
+            }
+        });
+        return models;
     }
 
     void models() {
-        bool isKnown = true;
-        eachChosen([&](const MeshFacts& mesh) {
-            isKnown = isKnown && targetOf("poses", mesh) != nullptr && targetOf(heldScene(), mesh) != nullptr;
-        });
-        if (!isKnown)
+        if (!hasTargetsOf(posed_.scene) || !hasTargetsOf(heldScene()))
             return;
         const FrameSpan held = heldFrames();
-        const FrameSpan trained{facts_.poses->first, hasMotion() ? facts_.poses->last : held.first - 1};
-        eachChosen([&](const MeshFacts& mesh) { exportFrames("export", mesh, "poses", trained, "set"); });
+        const FrameSpan trained{posed_.frames.first, hasHeldScene() ? posed_.frames.last : held.first - 1};
+        eachChosen([&](const MeshFacts& mesh) { exportFrames("export", mesh, posed_.scene, trained, "set"); });
         eachChosen([&](const MeshFacts& mesh) { exportFrames("held-out", mesh, heldScene(), held, "heldOut"); });
         eachChosen([&](const MeshFacts& mesh) { train(mesh); });
         eachChosen([&](const MeshFacts& mesh) { measure(mesh, held); });
@@ -310,8 +409,8 @@ private:
         return {folder + "/dataset.json", folder + "/controls.npy", folder + "/deltas.npy", folder + "/frames.npy"};
     }
 
-    void exportFrames(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames,
-                      const char* set) {
+    Step& exportFrames(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames,
+                       const std::string& set) {
         const std::string file = scene + "." + mesh.name + ".json";
         const std::string folder = dataOf(mesh) + "/" + set;
         Step& step =
@@ -322,25 +421,30 @@ private:
         if (settings_.anyway)
             step.words.emplace_back("--anyway");
         append(step.words, settings_.exportOptions);
+        return step;
     }
 
     void train(const MeshFacts& mesh) {
-        const std::string set = dataOf(mesh) + "/set";
-        const std::string model = "models/" + mesh.name + ".nwrp";
-        const std::string training = dataOf(mesh) + "/training";
+        Step& step = trainOf("train", mesh, dataOf(mesh) + "/set", "models/" + mesh.name + ".nwrp",
+                             dataOf(mesh) + "/training", settings_.epochs);
+        if (settings_.seed) // what is among the options comes before it
+            step.words.insert(step.words.begin() + 6, {"--seed", std::to_string(*settings_.seed)});
+    }
+
+    Step& trainOf(const char* name, const MeshFacts& mesh, const std::string& set, const std::string& model,
+                  const std::string& training, const std::optional<std::int64_t>& epochs) {
         Step& step =
-            add("train", &mesh, {"train", set, "-o", model, "--report", training}, setFiles(set), {model, training});
+            add(name, &mesh, {"train", set, "-o", model, "--report", training}, setFiles(set), {model, training});
         step.program = Program::trainer;
-        if (settings_.seed)
-            append(step.words, {"--seed", std::to_string(*settings_.seed)});
-        if (settings_.epochs)
-            append(step.words, {"--epochs", std::to_string(*settings_.epochs)});
+        if (epochs)
+            append(step.words, {"--epochs", std::to_string(*epochs)});
         // what a node made by hand has not, and nearly every mesh is the better for; a flag of the user's comes behind
         const auto& own = settings_.trainOptions;
         if (std::find(own.begin(), own.end(), "--direct") == own.end())
             step.words.emplace_back("--principal-shapes");
         append(step.words, {"--activation", "SiLU", "--linear-path", "--local-neurons"});
         append(step.words, own);
+        return step;
     }
 
     void measure(const MeshFacts& mesh, const FrameSpan& held) {
@@ -446,7 +550,9 @@ private:
     const RunSettings& settings_;
     const RunFacts& facts_;
     Plan plan_;
-    ReportRows rows_; ///< as far as pictures are planned
+    Posed posed_;
+    std::map<std::string, fs::path> caches_; ///< of targets, by mesh: those that were planned last
+    ReportRows rows_;                        ///< as far as pictures are planned
 };
 
 } // namespace
@@ -456,10 +562,11 @@ Plan planOf(const RunSettings& settings, const RunFacts& facts) {
 }
 
 const Words& stepNames() {
-    static const Words names = {
-        "import",          "poses",          "motion",        "rest",     "skin",     "motion-skin",    "targets",
-        "target",          "motion-targets", "motion-target", "export",   "held-out", "train",          "held-out-skin",
-        "held-out-target", "play",           "play-gpu",      "evaluate", "pictures", "moving-picture", "report"};
+    static const Words names = {"import",       "poses",         "motion",          "rest",           "skin",
+                                "motion-skin",  "targets",       "target",          "motion-targets", "motion-target",
+                                "ensemble-set", "ensemble",      "refine",          "export",         "held-out",
+                                "train",        "held-out-skin", "held-out-target", "play",           "play-gpu",
+                                "evaluate",     "pictures",      "moving-picture",  "report"};
     return names;
 }
 

@@ -161,15 +161,25 @@ private:
     }
 
     void join() const {
-        if (size_ >= request_.frames())
+        if (size_ >= request_.frames() && request_.known.empty())
             return storage::moveFolder(part(0), output_);
         storage::NpyWriter writer(output_.string(), request_.vertices);
+        if (!request_.known.empty())
+            appendKnown(writer);
         for (std::size_t first = 0; first < request_.frames(); first += size_) {
             const Answer answer(part(first), count(first), request_.vertices);
             for (std::size_t row = 0; row < count(first); ++row)
                 writer.append(answer.frame(row));
         }
         writer.finish();
+    }
+
+    void appendKnown(storage::NpyWriter& writer) const {
+        const fs::path file = place_.folder / request_.known;
+        const std::size_t frames = storage::NpyFile(file.string()).frameCount();
+        const Answer known(file, frames, request_.vertices);
+        for (std::size_t row = 0; row < frames; ++row)
+            writer.append(known.frame(row));
     }
 
     const Step& step_;

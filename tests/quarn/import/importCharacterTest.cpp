@@ -4,12 +4,12 @@
 
 #include "openquarn_app/SceneFile.h"
 #include "quarn/character/characterFiles.h"
-#include "quarn/dataset/ControlReader.h"
 #include "quarn/import/ImportTest.h"
 #include "quarn/import/jsonFiles.h"
 #include "quarn/pose/PoseControls.h"
 #include "quarn/pose/samplePoses.h"
 #include "quarn/pose/writePoses.h"
+#include "quarn/scene/ControlReader.h"
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/vertexMap.h"
 #include "storage/npyArray.h"

@@ -23,11 +23,12 @@ RunFacts factsOf(const std::vector<std::string>& meshes) {
     facts.character.emplace();
     for (const std::string& mesh : meshes) {
         facts.character->meshes.push_back({mesh, mesh + "_skin", 10, 12});
-        for (const char* step : {"target", "motion-target"})
+        for (const char* step : {"target", "target-1", "target-2", "motion-target"})
             facts.targets[answerFile(step, mesh).string()] = {mesh + "_target", "/caches/" + mesh + ".npy", {}, {}};
     }
     facts.poses = {1, 44};
     facts.motion = {1, 120};
+    facts.refined = {{1, 60}, {1, 64}};
     return facts;
 }
 
@@ -45,6 +46,15 @@ struct Kind {
     std::function<void(RunSettings&)> change;
 };
 
+// two of them: 16 poses, and the 4 that are left
+void addInRounds(RunSettings& settings) {
+    settings.targetCommand = {"make"};
+    settings.samples = 44;
+    settings.refineTo = 64;
+    settings.refineStep = 16;
+    settings.ensemble = 2;
+}
+
 const std::vector<Kind>& kinds() {
     static const std::vector<Kind> all = {
         {"no targets", {"arm"}, [](RunSettings&) {}},
@@ -56,6 +66,7 @@ const std::vector<Kind>& kinds() {
              s.motion = "/rigs/keys.json";
              s.targetCommand = {"make"};
          }},
+        {"rounds", {"arm", "eye"}, addInRounds},
         {"caches of one of two", {"eye", "arm"}, [](RunSettings& s) {
              s.motion = "/rigs/keys.json";
              s.targets = {"arm=/caches/arm.npy"};
@@ -100,7 +111,8 @@ TEST(Plan, GrowsAtItsEndWithWhatIsKnown) {
         EXPECT_EQ(before, Words{"import"});
         for (const auto& learn : std::vector<std::function<void()>>{
                  [&] { known.character = all.character; }, [&] { known.poses = all.poses; },
-                 [&] { known.motion = all.motion; }, [&] { known.targets = all.targets; }}) {
+                 [&] { known.motion = all.motion; }, [&] { known.targets = all.targets; },
+                 [&] { known.refined = all.refined; }}) {
             learn();
             // what the poses or the motion have answered is known when their step is done, and the next follows
             Words now = labelsOf(settings, known);
@@ -131,6 +143,33 @@ TEST(Plan, HoldsTheLastPosesOut) {
             }
         }
     }
+}
+
+// targets are asked for of what a round has added, and each set has all that there is
+TEST(Plan, RoundsTrainOnAllAndAskForWhatIsNew) {
+    const auto valueOf = [](const Step& step, const char* flag) {
+        return *(std::find(step.words.begin(), step.words.end(), flag) + 1);
+    };
+    Words told;
+    std::set<std::string> seeds;
+    for (const Step& step : planOf(settingsWith(addInRounds), factsOf({"arm"}))) {
+        if (step.request)
+            told.push_back(step.label() + " " + step.request->known.string() + " " +
+                           framesText({step.request->firstFrame, step.request->lastFrame}));
+        else if (step.name == "ensemble-set" || step.name == "export")
+            told.push_back(step.label() + " " + valueOf(step, "--frames"));
+        else if (step.name == "refine")
+            told.push_back(step.label() + " " + step.words[1] + " adds " + valueOf(step, "--add"));
+        else if (step.name == "ensemble")
+            seeds.insert(valueOf(step, "--seed"));
+        else if (step.name == "motion")
+            told.push_back(step.label() + " " + valueOf(step, "--samples"));
+    }
+    EXPECT_THAT(told, testing::ElementsAre("motion 4", "targets  1-44", "motion-targets  1-120", "ensemble-set 1 1-44",
+                                           "refine 1 poses.json adds 16", "targets 1 data/arm/poses_target.npy 45-60",
+                                           "ensemble-set 2 1-60", "refine 2 refined1.json adds 4",
+                                           "targets 2 data/arm/refined1_target.npy 61-64", "export 1-64"));
+    EXPECT_EQ(seeds, (std::set<std::string>{"2", "3"}));
 }
 
 TEST(Plan, NamesAMeshByItsPlaceInTheDeformer) {
@@ -221,7 +260,13 @@ TEST(Settings, ThatNoRunCanHaveAreRefusedWithTheirValue) {
         {[](RunSettings& s) { s.motion = "/k", s.targets = {"/x"}; }, "--motion has to have targets as well"},
         {[](RunSettings& s) { s.motion = "/k", s.heldOut = 9; }, "not both"},
         {[](RunSettings& s) { s.motionTargets = {"/x"}; }, "give it with --motion"},
-        {[](RunSettings& s) { s.targetPart = 9; }, "are for a --target-command"}};
+        {[](RunSettings& s) { s.targetPart = 9; }, "are for a --target-command"},
+        {[](RunSettings& s) { s.refineTo = 60; }, "--refine-to needs a --target-command"},
+        {[](RunSettings& s) { addInRounds(s), s.refineTo = 44; }, "refine-to is 44, and there are 44 samples"},
+        {[](RunSettings& s) { addInRounds(s), s.ensemble = 1; }, "ensemble is 1, not a whole number from 2"},
+        {[](RunSettings& s) { addInRounds(s), s.refineTo = 9999, s.refineStep = 1; }, "makes 9955 rounds"},
+        {[](RunSettings& s) { addInRounds(s), s.from = "both"; }, "from is \"both\""},
+        {[](RunSettings& s) { s.ensemble = 3; }, "are for --refine-to"}};
     for (const auto& [change, sentence] : rows)
         EXPECT_THAT(failureOf([&, &change = change] { check(settingsWith(change)); }), HasSubstr(sentence));
 }

@@ -123,6 +123,21 @@ TEST_F(TargetProgramTest, IsAskedAgainOnlyForPartsThatAreMissing) {
     EXPECT_EQ(std::distance(fs::directory_iterator(folder.path() / "out"), {}), 1);
 }
 
+// shapes that are there already go before those that are asked for, in parts or at once
+TEST_F(TargetProgramTest, PutsWhatItGetsBehindWhatIsKnown) {
+    cache("known", firstFrame, 2);
+    request.known = "known";
+    request.firstFrame = firstFrame + 2;
+    cache("new", request.firstFrame, frames - 2);
+    EXPECT_EQ(run("cp new $out"), "");
+    EXPECT_TRUE(hasAll());
+    fs::remove(folder.path() / "out/targets.npy");
+    request.part = 2;
+    EXPECT_EQ(run("echo $first; cp part$first $out"), "");
+    EXPECT_EQ(log(), "5\n7\n");
+    EXPECT_TRUE(hasAll());
+}
+
 TEST_F(TargetProgramTest, PartsOfAnotherRequestDoNotCount) {
     request.part = 2;
     run("[ $first != 7 ] || exit 1; cp part$first $out");

@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/dataset/ControlReader.h"
+#include "quarn/scene/ControlReader.h"
 
-#include "quarn/dataset/controlNames.h"
+#include "quarn/scene/controlNames.h"
 #include "quarn/scene/plugs.h"
 
 #include "openquarn_app/Evaluation.h"

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/dataset/controlNames.h"
+#include "quarn/scene/controlNames.h"
 
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/plugs.h"

@@ -1,0 +1,26 @@
+// SPDX-License-Identifier: Apache-2.0
+// Poses and the rig that they are of.
+#pragma once
+
+#include "quarn/console/Console.h"
+#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/Warp.h"
+
+#include <vector>
+
+namespace quarn {
+
+constexpr std::size_t mostPoses = 1'000'000; ///< that are made
+
+/// Of each control, in their order.
+std::vector<ValueLimits> limitsOf(const std::vector<PoseControl>& controls);
+
+/// Throws std::runtime_error for more poses of so many values, 1 or more, than are made.
+void requireRoomForPoses(std::size_t poses, std::size_t values);
+
+/// Puts the poses on the controls, one a frame, in place of all that quarn pose has put on the rig before, and sets the
+/// frames that the deformer exports. Says what still moves. Throws std::runtime_error, naming the plug. Thread: main.
+void putSampledPoses(const Warp& warp, const PoseSet& poses, const std::vector<PoseControl>& controls, int firstFrame,
+                     const Console& console);
+
+} // namespace quarn
