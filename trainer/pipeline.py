@@ -8,7 +8,7 @@ from typing import Any, Callable, Optional
 
 import numpy as np
 
-from . import evaluator, export, files, limits, memory, plausible, progress, report, resume, warm
+from . import certificate, evaluator, export, files, limits, memory, plausible, progress, report, resume, warm
 from .checkpoint import Checkpoints
 from .dataset import Dataset
 from .device import Device
@@ -25,7 +25,8 @@ from .shapes import principal_basis
 from .split import Split, join, split_rows, split_with
 from .training import History, fit, make_deterministic
 
-MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json", "principal_shapes.npz")
+MODEL_NAMES = ("model.onnx", "metadata.json", "principal_shapes.json", "principal_shapes.npz",
+               certificate.POSES_NAME)
 VERIFIED_ROWS = 64
 TOLERANCE = 1e-4  # of the root mean square of the outputs
 
@@ -109,8 +110,10 @@ def train_into(job: Job, part: Path, split: Split) -> tuple[History, Measured, d
     targets = make_targets(job, split.train)
     check_size(job.settings, job.dataset.control_count, targets.count)
     trained, line = train_network(job, targets, split)
-    export_and_verify(job, part, trained, targets, split)
-    errors = errors_of(job, trained, targets, split)
+    measure = errors_of(job, trained, targets, split)
+    errors = measure(split.measured()[1])
+    knowledge = certificate.write(part, job.dataset, split, errors, measure)
+    export_and_verify(job, part, trained, targets, split, knowledge)
     return trained[2], errors, {**summarise(job, trained, targets, split, errors),
                                 **limits_of(job, trained, line, targets, split, errors), "sizes": report.sizes(part)}
 
@@ -214,8 +217,11 @@ def seen_controls(job: Job, line: Line, targets: Targets) -> np.ndarray:
     return seen
 
 
-def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split) -> None:
-    """Writes the model's files, runs them as others will, and refuses them where the outputs differ."""
+def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, split: Split,
+                      knowledge: dict[str, Any]) -> None:
+    """Writes the model's files, runs them as others will, and refuses them where the outputs differ.
+
+    knowledge: the certificate, whose own file is written already"""
     network, normalisation, history = trained
     guard = guard_of(job.settings, job.dataset.controls[split.train])
     model = export.onnx_model(network, normalisation, "deltas" if targets.shapes is None else "weights", guard)
@@ -224,6 +230,7 @@ def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, 
         metadata["interruptedAfterEpochs"] = len(history.train)
     if job.first:
         metadata["firstNetwork"] = warm.digest_of(job.first)
+    metadata["certificate"] = knowledge
     export.write_model(part, model, metadata, targets.shapes, targets.halves)
     rows = split.measured()[1][:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
@@ -247,8 +254,10 @@ def compare(found: np.ndarray, wanted: np.ndarray, unit: float, called: str) -> 
                            f"{TOLERANCE * unit:g}: it is not published")
 
 
-def errors_of(job: Job, trained: Trained, targets: Targets, split: Split) -> Measured:
-    return measured(job.dataset, split.measured()[1], deltas_of(job, trained, targets, split), targets.shapes)
+def errors_of(job: Job, trained: Trained, targets: Targets, split: Split) -> Callable[[np.ndarray], Measured]:
+    """Gives the errors over rows, ascending."""
+    deltas = deltas_of(job, trained, targets, split)
+    return lambda rows: measured(job.dataset, rows, deltas, targets.shapes)
 
 
 def deltas_of(job: Job, trained: Trained, targets: Targets, split: Split) -> Callable[[np.ndarray], np.ndarray]:

@@ -153,16 +153,17 @@ ExpectedError::ExpectedError(std::vector<double> distances, std::vector<double> 
         throw std::invalid_argument("expectedError has errors that fall, or are below 0");
 }
 
-double ExpectedError::at(double distance) const {
+double ExpectedError::at(double distance, double outside) const {
+    const double growth = (1.0 + outside) * (1.0 + outside) * (1.0 + outside);
     const auto next = std::upper_bound(distances_.begin(), distances_.end(), distance);
     const auto index = static_cast<std::size_t>(next - distances_.begin());
     if (index == 0)
-        return millimetres_.front();
+        return growth * millimetres_.front();
+    if (next == distances_.end())
+        return growth * millimetres_.back();
     const double before = distances_[index - 1];
-    if (next == distances_.end()) // nothing is known of an error at the distance 0, which a curve may consist of
-        return millimetres_.back() * (before > 0.0 ? distance / before : 1.0);
     const double part = (distance - before) / (*next - before);
-    return millimetres_[index - 1] + part * (millimetres_[index] - millimetres_[index - 1]);
+    return growth * (millimetres_[index - 1] + part * (millimetres_[index] - millimetres_[index - 1]));
 }
 
 std::optional<ModelCertificate> readCertificate(const std::filesystem::path& path) {

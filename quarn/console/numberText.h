@@ -8,5 +8,7 @@ namespace quarn {
 
 /// As a person reads it, in six digits, whatever the user's locale. Thread: any.
 std::string numberText(double value);
+/// The same in three digits, for what is measured or estimated. Thread: any.
+std::string roughText(double value);
 
 } // namespace quarn

@@ -191,6 +191,7 @@ std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, cons
     writeCount(writer, "deltaMode", static_cast<std::size_t>(sampler.kind().mode));
     writeCount(writer, "smoothingIterations", static_cast<std::size_t>(sampler.kind().smoothingIterations));
     writeSubset(writer, sampler.map());
+    writeText(writer, "meshSum", facts.restSum);
     writeText(writer, "componentTagExpression", textOf(warp.plug("input", geometry, "componentTagExpression")));
     writeControls(writer, sampler.names(), rangesOf(controls, shape));
     writer.Key("metersPerUnit");

@@ -16,6 +16,7 @@ struct DatasetFacts {
     std::string scene;   ///< name of its file
     double diagonal = 0; ///< of the rest mesh's bounding box, in units of the scene
     DatasetShape shape;
+    std::string restSum;          ///< meshSum() of the rest mesh
     std::optional<TargetFit> fit; ///< none where the target was not compared with the skin
 };
 

@@ -6,6 +6,7 @@
 #include "quarn/dataset/description.h"
 #include "quarn/dataset/exportFrames.h"
 #include "quarn/dataset/sceneSetup.h"
+#include "quarn/scene/meshSum.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/targetCheck.h"
@@ -108,6 +109,7 @@ public:
         , setup_(setupNow()) {
         facts_.scene = sceneFile_.filename().string();
         facts_.diagonal = diagonalOf(geometry.original);
+        facts_.restSum = meshSum(geometry.original);
         facts_.shape = {frames_.count(), sampler_.names().size(), sampler_.map().affectCount()};
     }
 

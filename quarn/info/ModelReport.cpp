@@ -110,11 +110,13 @@ ModelReport readModel(const fs::path& directory, neuralWarp::ModelSession& sessi
     ModelReport model;
     model.directory = directory;
     const auto state = neuralWarp::DirectoryState::atRest(directory);
-    for (const char* file : {"metadata.json", "model.onnx", "principal_shapes.json", "principal_shapes.npz"})
+    for (const char* file :
+         {"metadata.json", "model.onnx", "principal_shapes.json", "principal_shapes.npz", "trained_poses.npy"})
         model.bytes += sizeOf(directory / file);
     readMetadata(directory, model.metadata, model.problems);
     readNetwork(model, session);
     readShapes(model);
+    model.knowledge = readKnowledge(directory);
     if (!state.isStillThatOf(directory))
         throw std::runtime_error(directory.string() + " was replaced or written into while it was read");
     if (model.metadata.loaded && model.outputs != 0)
@@ -129,6 +131,10 @@ Fit fitOf(const ModelReport& model, const GeometryFacts& geometry) {
                                      "the model was trained on:", model.metadata.fullCount));
     else
         compareSubsets(fit, model.metadata, geometry);
+    const std::string trained = model.knowledge.certificate ? model.knowledge.certificate->mesh : "";
+    if (!trained.empty() && !geometry.restSum.empty() && trained != geometry.restSum)
+        fit.warnings.push_back("the rest mesh of " + geometry.name + " is another than the one it was trained on (" +
+                               geometry.restSum + ", not " + trained + ")");
     if (model.inputs > geometry.controls)
         fit.errors.push_back(
             numbers("controlValues has elements:", geometry.controls, "the network takes:", model.inputs));

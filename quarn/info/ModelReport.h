@@ -4,6 +4,8 @@
 
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
+#include "quarn/scene/PoseWatch.h"
+#include "quarn/scene/modelFiles.h"
 #include "storage/npyArray.h"
 
 #include <cstdint>
@@ -16,7 +18,7 @@ namespace quarn {
 
 struct ModelReport {
     std::filesystem::path directory;
-    std::uint64_t bytes = 0; ///< of its four files
+    std::uint64_t bytes = 0; ///< of its five files
     neuralWarp::ModelMetadata metadata;
     std::size_t inputs = 0;  ///< control values that the network takes; 0 when it cannot be run
     std::size_t outputs = 0; ///< values that it gives; 0 when it cannot be run
@@ -26,6 +28,7 @@ struct ModelReport {
     std::string shapeSource;           ///< the file that the shapes' numbers are read from; empty for none
     std::vector<std::string> notes;    ///< one sentence each: what is odd, and keeps nothing from working
     std::vector<std::string> problems; ///< one sentence each: what keeps it from being used, in itself
+    ModelKnowledge knowledge;
 };
 
 /// Slots of the model that a deformer reads: the vertices that it was trained on.
@@ -54,12 +57,14 @@ struct GeometryFacts {
     std::size_t vertices = 0;            ///< of the whole geometry
     std::vector<std::uint32_t> affected; ///< those that the deformer affects, in its order; all when it has no tag
     std::size_t controls = 0;            ///< elements of controlValues
+    std::string restSum = {};            ///< meshSum() of its rest mesh; empty without one
 };
 
 /// How model and geometry fit.
 struct Fit {
     std::vector<std::string> errors;   ///< the deformer refuses the model for each of them
     std::vector<std::string> warnings; ///< it uses the model, and somebody should know
+    std::vector<PoseReport> poses;     ///< of frames of the scene, where they were looked at
 };
 Fit fitOf(const ModelReport& model, const GeometryFacts& geometry);
 

@@ -17,6 +17,10 @@
 #include "quarn/info/SliderReport.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/Warp.h"
+#include "quarn/scene/frames.h"
+#include "quarn/scene/meshSum.h"
+#include "quarn/scene/meshes.h"
+#include "quarn/scene/plugs.h"
 
 #include <CLI/CLI.hpp>
 
@@ -139,7 +143,7 @@ std::string summaryText(const SceneSummary& summary, const OpenedScene& opened) 
 
 struct Options {
     fs::path path, scene, controls, outputs;
-    std::string deformer, geometry;
+    std::string deformer, geometry, frames;
     bool json = false, devices = false, joints = false;
 };
 
@@ -212,11 +216,44 @@ void showScene(const Options& options) {
         std::cout << printable(summaryText(summary, opened));
 }
 
-GeometryFacts factsOfScene(const Options& options) {
+// those that are asked for, or of the export range so many that nobody waits for them
+FrameRange framesToLookAt(const Options& options, const Warp& warp) {
+    if (!options.frames.empty())
+        return frameRange(options.frames);
+    constexpr std::size_t most = 10'000;
+    FrameRange frames = frameRange(std::to_string(wholeNumberOf(warp.plug("exportStartFrame"))) + "-" +
+                                   std::to_string(wholeNumberOf(warp.plug("exportEndFrame"))));
+    frames.step = static_cast<int>((frames.count() + most - 1) / most);
+    return frames;
+}
+
+// whether the model, which has a certificate, knows the poses of the scene: nothing but the controls is evaluated
+PoseReport posesOfScene(SceneSession& session, const Options& options, const Warp& warp, const WarpGeometry& geometry,
+                        const ModelReport& model) {
+    PoseReport report{warp.name, geometry.name, model.directory.stem().string(), model.knowledge.why, true, {}};
+    PoseCounter counter(*model.knowledge.certificate, model.knowledge.poses);
+    const FrameRange frames = framesToLookAt(options, warp);
+    for (std::size_t number = 0; number < frames.count(); ++number) {
+        throwIfInterrupted();
+        session.host().setTime(frames.frame(number));
+        counter.add(frames.frame(number), controlsOf(warp));
+    }
+    report.counts = counter.counts();
+    return report;
+}
+
+Fit fitOfScene(const Options& options, const ModelReport& model) {
     SceneSession session;
     session.open(options.scene);
     const Warp warp = Warp::find(options.deformer);
-    return factsOf(warp, warp.geometry(options.geometry));
+    const WarpGeometry& geometry = warp.geometry(options.geometry);
+    GeometryFacts facts = factsOf(warp, geometry);
+    if (vertexCountOf(geometry.original) != 0)
+        facts.restSum = meshSum(geometry.original);
+    Fit fit = fitOf(model, facts);
+    if (model.knowledge.certificate)
+        fit.poses.push_back(posesOfScene(session, options, warp, geometry, model));
+    return fit;
 }
 
 void showModel(const Options& options) {
@@ -231,7 +268,7 @@ void showModel(const Options& options) {
     std::optional<Fit> fit;
     if (!options.scene.empty()) {
         const StdoutAside aside;
-        fit = fitOf(model, factsOfScene(options));
+        fit = fitOfScene(options, model);
     }
     if (!options.controls.empty())
         storage::writeFloatTable(absolutePath(options.outputs), {controls.rows, model.outputs, answer.outputs});
@@ -251,6 +288,8 @@ void showInfo(const Options& options) {
         throw UsageError("quarn info needs the path of a scene file or a model directory, or --devices");
     if (fs::is_directory(options.path) && options.joints)
         throw UsageError(options.path.string() + " is a model directory, and --joints is for a scene");
+    if (!options.frames.empty() && options.scene.empty())
+        throw UsageError("--frames goes with --scene: the frames of it that the model is to know");
     if (fs::is_directory(options.path))
         return showModel(options);
     if (!options.scene.empty() || !options.controls.empty())
@@ -271,6 +310,10 @@ void addInfoCommand(CLI::App& app) {
     info->add_option("--scene", options->scene, "Tell whether the model fits the deformer of this scene");
     info->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     info->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");
+    info->add_option(
+            "--frames", options->frames,
+            "With --scene: the frames whose poses the model is to know; the deformer's export range by default")
+        ->type_name("A-B[xS]");
     CLI::Option* run = info->add_option("--run", options->controls, "Run the network on each row of this array")
                            ->type_name("CONTROLS.npy");
     CLI::Option* outputs =

@@ -104,6 +104,7 @@ ModelAnswer readModelApart(const std::filesystem::path& directory, const storage
         throw;
     }
     answer.model.directory = directory;
+    answer.model.knowledge = readKnowledge(directory); // our own readers, which the deformer's players use as well
     stage.result([&] { return std::to_string(answer.model.problems.size()) + " problems"; });
     return answer;
 }

@@ -2,6 +2,8 @@
 #include "quarn/console/json.h"
 #include "quarn/info/LineList.h"
 #include "quarn/info/ModelReport.h"
+#include "quarn/info/certificateTexts.h"
+#include "quarn/scene/poseTexts.h"
 
 #include <array>
 
@@ -77,9 +79,10 @@ std::string modelText(const ModelReport& model, const std::optional<Fit>& fit) {
     if (model.shapeCount != 0)
         text += std::to_string(model.shapeCount) + " principal shapes of " + std::to_string(model.shapeVertices) +
                 " vertices, read from " + model.shapeSource + "\n";
+    text += certificateText(model.knowledge);
     text += lines("damaged", model.problems) + lines("note", model.notes);
     if (fit)
-        text += lines("does not fit", fit->errors) + lines("warning", fit->warnings) +
+        text += posesText(fit->poses) + lines("does not fit", fit->errors) + lines("warning", fit->warnings) +
                 (fit->errors.empty() && model.problems.empty() ? "fits\n" : "");
     return text;
 }
@@ -96,12 +99,14 @@ std::string modelJson(const ModelReport& model, const std::optional<Fit>& fit) {
     writeCount(json, "principalShapes", model.shapeCount);
     writeCount(json, "principalShapeVertices", model.shapeVertices);
     writeText(json, "principalShapesFile", model.shapeSource);
+    writeCertificate(json, model.knowledge);
     writeTexts(json, "problems", model.problems);
     writeTexts(json, "notes", model.notes);
     if (fit) {
         writeBool(json, "fits", fit->errors.empty() && model.problems.empty());
         writeTexts(json, "misfits", fit->errors);
         writeTexts(json, "warnings", fit->warnings);
+        writePoses(json, fit->poses);
     }
     json.EndObject();
     return std::string(buffer.GetString()) + "\n";

@@ -14,6 +14,7 @@
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/poseTexts.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
 #include "storage/CacheFormat.h"
@@ -188,6 +189,7 @@ void bake(Options& options) {
     if (!plan.model.note.empty())
         options.console.note(plan.model.note);
     noteGuard(options.console, result.guard, options.guard.width);
+    notePoses(options.console, result.poses);
 }
 
 void addFrameOptions(CLI::App& command, Options& options) {

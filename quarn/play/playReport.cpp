@@ -4,6 +4,7 @@
 #include "quarn/console/json.h"
 #include "quarn/play/playing.h"
 #include "quarn/scene/modelJson.h"
+#include "quarn/scene/poseTexts.h"
 
 #include <locale>
 #include <sstream>
@@ -142,6 +143,7 @@ std::string playText(const PlayResult& result, const PlayPlan& plan, double mete
         out << "written with " << result.shapes->count << " shapes, at most " << result.shapes->error
             << " mm from any frame\n";
     out << guardText(result.guard, plan.guardWidth.value_or(0.0));
+    out << posesText(result.poses);
     if (!result.mesh)
         return out.str();
     const Scale scale = scaleOf(result, metersPerUnit);
@@ -171,6 +173,7 @@ std::string playJson(const PlayResult& result, const PlayPlan& plan, double mete
     writeGpu(json, result.gpu);
     writeShapes(json, result.shapes);
     writeGuard(json, result.guard, plan.guardWidth.value_or(0.0));
+    writePoses(json, result.poses);
     writeComparison(json, "distance", result.mesh, scale);
     writeComparison(json, "before", result.before, scale);
     if (result.mesh) {

@@ -52,6 +52,7 @@ public:
         , models_({plan_.mesh, plan_.against})
         , guard_(guardOf(plan_))
         , player_(session, plan_.mesh, guard_ ? &*guard_ : nullptr)
+        , poses_(AppliedModels({plan_.mesh}))
         , progress_(console, "playing", plan_.frames.count() * static_cast<std::size_t>(plan_.repeats)) {
         if (guard_)
             models_.setGuarded();
@@ -85,6 +86,7 @@ public:
             takeGpuUse();
         if (guard_)
             result_.guard = guard_->reports();
+        result_.poses = poses_.reports();
         return std::move(result_);
     }
 
@@ -110,6 +112,7 @@ private:
 
     // once is enough: each repeat shows the same
     void lookAt(int frame) {
+        poses_.look(frame);
         player_.read(points_);
         requireFinite(points_, plan_.mesh, frame);
         const std::size_t count = points_.size() / 3;
@@ -172,6 +175,7 @@ private:
     AppliedModels models_;
     std::optional<EnvelopeGuard> guard_;
     FramePlayer player_;
+    PoseWatch poses_;
     Progress progress_;
     RecordingEnd recordingEnd_;
     PlayResult result_;

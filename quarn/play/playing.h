@@ -10,6 +10,7 @@
 #include "quarn/play/evaluator.h"
 #include "quarn/scene/CacheSpace.h"
 #include "quarn/scene/EnvelopeGuard.h"
+#include "quarn/scene/PoseWatch.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/useModel.h"
 
@@ -62,6 +63,7 @@ struct PlayResult {
     double boxDiagonal = 0.0;             ///< 0 without a comparison
     std::optional<ShapesOfMotion> shapes; ///< none: nothing was written that has fitted ones
     std::vector<GuardReport> guard;       ///< empty without a guard
+    std::vector<PoseReport> poses;        ///< of the models that were on
 };
 
 /// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. Thread: main.

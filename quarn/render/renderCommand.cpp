@@ -21,6 +21,7 @@
 #include "quarn/scene/frames.h"
 #include "quarn/scene/modelJson.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/poseTexts.h"
 #include "quarn/scene/shownMeshes.h"
 #include "quarn/scene/units.h"
 #include "quarn/scene/useModel.h"
@@ -103,6 +104,7 @@ struct Measure {
 struct Answer {
     std::vector<std::filesystem::path> pictures;
     std::vector<Measure> measures; // of each panel
+    std::vector<PoseReport> poses;
 };
 
 void setSize(Layout& layout, const std::string& text, std::size_t panels) {
@@ -259,6 +261,7 @@ void drawPictures(Shot& shot, const Options& options, SceneSession& session, Ans
     const std::size_t count = shot.frames.count();
     const HostErrors errors;
     AppliedModels models = modelsOf(shot);
+    PoseWatch poses(models);
     Progress progress(options.console, "drawing", count);
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
@@ -278,12 +281,14 @@ void drawPictures(Shot& shot, const Options& options, SceneSession& session, Ans
         }
         throwIfAny(errors, frame);
         models.requireSound();
+        poses.look(frame);
         storage::WholeFile file(name);
         writePng(file.stream(), picture);
         file.finish();
         answer.pictures.push_back(name);
         progress.advance();
     }
+    answer.poses = poses.reports();
 }
 
 void writeMeshes(JsonWriter& writer, const Panel& panel, const std::vector<ModelInUse>& models) {
@@ -336,6 +341,7 @@ std::string jsonOf(const Shot& shot, const Answer& answer, const Options& option
     writer.Int(shot.layout.height);
     writePanels(writer, shot, answer);
     writeGuard(writer, shot.guard ? shot.guard->reports() : std::vector<GuardReport>(), options.guard.width);
+    writePoses(writer, answer.poses);
     writer.EndObject();
     return std::string(buffer.GetString()) + "\n";
 }
@@ -352,6 +358,7 @@ void tell(const Shot& shot, const Answer& answer, const Options& options) {
                 console.note(model.note);
     if (shot.guard)
         noteGuard(console, shot.guard->reports(), options.guard.width);
+    notePoses(console, answer.poses);
     const std::string last = answer.pictures.back().string();
     console.note(answer.pictures.size() == 1 ? "drew " + last
                                              : "drew " + std::to_string(answer.pictures.size()) + " pictures, " +

@@ -4,6 +4,7 @@
 #include "nw_model/PrincipalBasisFiles.h"
 
 #include <algorithm>
+#include <stdexcept>
 
 namespace quarn {
 
@@ -41,6 +42,28 @@ void readMetadata(const fs::path& directory, ModelMetadata& metadata, std::vecto
     if (beyond != map.end())
         problems.push_back("metadata.json drives vertex " + std::to_string(*beyond) + ", and its mesh has " +
                            std::to_string(metadata.fullCount) + " vertices");
+}
+
+ModelKnowledge readKnowledge(const fs::path& directory) {
+    ModelKnowledge knowledge;
+    try {
+        knowledge.certificate = neuralWarp::readCertificate(directory / "metadata.json");
+    } catch (const std::runtime_error& error) {
+        knowledge.why = "its certificate is of no use: " + std::string(error.what());
+        return knowledge;
+    }
+    if (!knowledge.certificate) {
+        knowledge.why = "it has no certificate: which poses it was trained on is not known";
+        return knowledge;
+    }
+    try {
+        knowledge.poses = neuralWarp::TrainedPoses::read(directory, *knowledge.certificate);
+        if (knowledge.poses.isEmpty())
+            knowledge.why = "it names no trained poses: only the ranges of its controls are known";
+    } catch (const std::runtime_error& error) {
+        knowledge.why = "only the ranges of its controls are known: " + std::string(error.what());
+    }
+    return knowledge;
 }
 
 ShapeSizes readShapeSizes(const fs::path& directory, std::vector<std::string>& problems) {

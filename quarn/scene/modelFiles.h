@@ -2,10 +2,13 @@
 // The files of a model directory beside its network, and what the deformer takes from them without a word.
 #pragma once
 
+#include "nw_model/ModelCertificate.h"
 #include "nw_model/ModelMetadata.h"
+#include "nw_model/TrainedPoses.h"
 
 #include <cstdint>
 #include <filesystem>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -27,5 +30,16 @@ struct ShapeSizes {
 
 /// The same of principal_shapes.json and what stands for it, neither of which need be there.
 ShapeSizes readShapeSizes(const std::filesystem::path& directory, std::vector<std::string>& problems);
+
+/// What a model says of itself, and of the poses that it was trained on.
+struct ModelKnowledge {
+    std::optional<neuralWarp::ModelCertificate> certificate;
+    neuralWarp::TrainedPoses poses; ///< none where there are none, or they cannot be used
+    std::string why;                ///< what is missing and why, a sentence; empty where nothing is
+};
+
+/// Reads it. What is damaged is as good as missing, and said: the deformer does not need it. Thread: any, with a
+/// directory of its own.
+ModelKnowledge readKnowledge(const std::filesystem::path& directory);
 
 } // namespace quarn

@@ -139,9 +139,9 @@ class CommandTest(unittest.TestCase):
         synthetic.make(self.place / "two", frames=60, affect=[1, 2])
         shapes = ("--principal-shapes", "--neurons", "2")
         for name, size, data, more in (
-                ("metadata.json", 500, "data", ()), ("model.onnx", 5000, "data", ()),
-                ("loss.png", 15000, "data", shapes),
-                ("principal_shapes.json", 1500, "data", shapes), ("report.json", 1250, "two", ("--neurons", "1"))):
+                ("trained_poses.npy", 500, "data", ()), ("metadata.json", 1000, "data", ()),
+                ("model.onnx", 5000, "data", ()), ("loss.png", 15000, "data", shapes),
+                ("principal_shapes.json", 3000, "data", shapes), ("report.json", 2500, "two", ("--neurons", "1"))):
             error = self.refused("train", data, *TRAIN[2:], "--quiet", "--epochs", "1", *more, largest_file=size)
             self.assertRegex(error, rf"arm\.\w+\.part/{name}: File too large")
             self.assertEqual(os.listdir(self.place / "m"), [])

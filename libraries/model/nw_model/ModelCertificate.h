@@ -37,9 +37,10 @@ public:
     ExpectedError(std::vector<double> distances, std::vector<double> millimetres);
 
     bool isEmpty() const { return distances_.empty(); }
-    /// In mm: linear between two knots, and the first one's before it. Beyond the last one nothing was measured, and it
-    /// goes on in proportion to the distance. Not for an empty one.
-    double at(double distance) const;
+    /// In mm, for a distance of TrainedPoses: linear between two knots, and the first and the last one's before and
+    /// behind them. `outside`, a ControlRanges::distance(), multiplies it by (1 + outside)^3: nothing was measured
+    /// there, and the power is that of the demo's hand (decision 0193). Not for an empty one.
+    double at(double distance, double outside) const;
     /// The distance of the last knot. Not for an empty one.
     double measuredTo() const { return distances_.back(); }
 

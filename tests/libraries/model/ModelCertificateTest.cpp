@@ -91,10 +91,10 @@ TEST(ModelCertificate, ReadsWhatItKnows) {
     EXPECT_EQ(errors.network.p9999 + errors.network.max + errors.skin.value().mean, 12.0);
     EXPECT_FALSE(errors.basis || errors.zeroDeltas);
     EXPECT_EQ(certificate->mesh + certificate->dataSet + certificate->trainedPosesSum, "sha256:1fsha256:2eSUM");
-    // before the first knot, between, on, and beyond the last one
-    const double expected[][2] = {{0, 0.5}, {1, 0.5}, {1.5, 1}, {3, 2.5}, {6, 5}};
-    for (const auto& [distance, millimetres] : expected)
-        EXPECT_DOUBLE_EQ(certificate->expected.at(distance), millimetres) << distance;
+    // before the first knot, between, on, and beyond the last one; and outside of the ranges by a whole one
+    const double expected[][3] = {{0, 0, 0.5}, {1, 0, 0.5}, {1.5, 0, 1}, {3, 0, 2.5}, {6, 0, 2.5}, {1.5, 1, 8}};
+    for (const auto& [distance, outside, millimetres] : expected)
+        EXPECT_DOUBLE_EQ(certificate->expected.at(distance, outside), millimetres) << distance;
 
     EXPECT_FALSE(read(folder, R"({"deltaCount": 3})"));
     EXPECT_FALSE(read(folder, R"({"certificate": null})"));
