@@ -11,6 +11,8 @@
 #include "json.h"
 #include "nw_model/ModelMetadata.h"
 #include "nw_model/ModelSession.h"
+#include "readers.h"
+#include "storage/readWholeFile.h"
 
 namespace neuralWarp {
 namespace {
@@ -166,8 +168,8 @@ double ExpectedError::at(double distance, double outside) const {
     return growth * (millimetres_[index - 1] + part * (millimetres_[index] - millimetres_[index - 1]));
 }
 
-std::optional<ModelCertificate> readCertificate(const std::filesystem::path& path) {
-    const json::Document root = storage::readJson(path.string(), storage::jsonRules::modelMetadata);
+std::optional<ModelCertificate> certificateIn(std::string_view text) {
+    const json::Document root = storage::parseJson(text, storage::jsonRules::modelMetadata);
     if (!root.IsObject())
         throw std::runtime_error("it holds no JSON object");
     if (memberOf(root, "certificate") == nullptr)
@@ -177,6 +179,10 @@ std::optional<ModelCertificate> readCertificate(const std::filesystem::path& pat
     } catch (const std::invalid_argument& error) {
         throw std::runtime_error("certificate: " + std::string(error.what()));
     }
+}
+
+std::optional<ModelCertificate> readCertificate(const std::filesystem::path& path) {
+    return certificateIn(storage::readWholeFile(path, storage::jsonRules::modelMetadata.mostBytes));
 }
 
 } // namespace neuralWarp

@@ -5,15 +5,21 @@
 
 #include <cstdint>
 #include <filesystem>
+#include <optional>
 #include <streambuf>
+#include <string_view>
 #include <vector>
 
+#include "nw_model/ModelCertificate.h"
 #include "nw_model/ModelMetadata.h"
 
 namespace neuralWarp {
 
 /// readMetadataFile() on the rest of `source`. May throw; `record` is unchanged then.
 bool readMetadata(ModelMetadata& record, std::streambuf& source, const std::filesystem::path& path);
+
+/// readCertificate() on the bytes of its file.
+std::optional<ModelCertificate> certificateIn(std::string_view text);
 
 /// Outputs of readPrincipalShapesFile().
 struct PrincipalShapes {

@@ -5,7 +5,9 @@
 #include <cmath>
 #include <filesystem>
 #include <fstream>
+#include <optional>
 #include <span>
+#include <stdexcept>
 #include <streambuf>
 #include <string_view>
 #include <vector>
@@ -81,6 +83,21 @@ private:
     std::filesystem::path link_;
 };
 
+// what is taken from a certificate is finite, and as long as it says
+void checkCertificate(std::string_view text) {
+    try {
+        const std::optional<ModelCertificate> certificate = certificateIn(text);
+        if (!certificate)
+            return;
+        const ControlRanges& ranges = certificate->ranges;
+        require(certificate->controlNames.size() == ranges.count());
+        require(ranges.distance(std::vector<float>(ranges.count())) >= 0.0);
+        require(certificate->expected.isEmpty() || std::isfinite(certificate->expected.at(0.5, 0.0)));
+    } catch (const std::runtime_error&) {
+        return; // refused
+    }
+}
+
 } // namespace
 
 bool fuzzMetadata(const std::uint8_t* data, std::size_t size) {
@@ -91,6 +108,7 @@ bool fuzzMetadata(const std::uint8_t* data, std::size_t size) {
     require(record.loaded == accepted);
     require(accepted || record.fullCount == 123456789);
     require(record.affectMap.size() <= size); // an index takes a byte at least
+    checkCertificate({reinterpret_cast<const char*>(data), size});
     return accepted;
 }
 
