@@ -106,7 +106,7 @@ TEST_F(ModelReports, SayWhereTheShapesAreRead) {
     spec.shapes = {std::vector<float>(12)};
     EXPECT_THAT(modelText(read(spec), {}),
                 HasSubstr("1 principal shapes of 4 vertices, read from principal_shapes.json"));
-    EXPECT_THAT(modelText(read(spec), {}), Not(HasSubstr("note")));
+    EXPECT_THAT(modelText(read(spec), {}), Not(HasSubstr("note: principal")));
     writeFile(folder_.path() / "m.nwrp/principal_shapes.npz", "no archive");
     const ModelAnswer damaged = readModelApart(folder_.path() / "m.nwrp", {});
     EXPECT_THAT(damaged.model.problems, IsEmpty());
