@@ -443,6 +443,7 @@ private:
         if (std::find(own.begin(), own.end(), "--direct") == own.end())
             step.words.emplace_back("--principal-shapes");
         append(step.words, {"--activation", "SiLU", "--linear-path", "--local-neurons"});
+        step.words.emplace_back("--resume-if-fits"); // of a training of the same that was interrupted
         append(step.words, own);
         return step;
     }

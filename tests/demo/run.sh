@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # run.sh QUARN: quarn run from the hand's file to a report on a reduced set, its targets by a program in two parts; the
-# report is computed once more from the files, and a second run does nothing.
+# report is computed once more from the files, and a second run does nothing. Its training is interrupted, and goes on.
 set -euo pipefail
 cd "$(dirname "$0")/../.."
 quarn=$1
@@ -12,14 +12,22 @@ python=$(scripts/find_python.sh) || {
 }
 scripts/fetch_hand.sh
 run=("$quarn" run build/deps/hand/left.glb -o "$work/hand" --parents examples/hand/parents.json
-  --limits examples/hand/limits.json --import-option=--smoothing --import-option=5 --samples 40 --held-out 8 --epochs 3
+  --limits examples/hand/limits.json --import-option=--smoothing --import-option=5 --samples 40 --held-out 8 --epochs 600
   --target-part 30 --render-option=--view --render-option=90,20
-  --target-command "$python" examples/hand/target_command.py)
+  --train-option=--checkpoint-every --train-option=0 --target-command "$python" examples/hand/target_command.py)
+NW_PYTHON=$python "${run[@]}" >/dev/null 2>&1 &
+while [[ ! -e $work/hand/models/l_handMeshNode.checkpoint ]]; do
+  kill -0 $! || { echo "the run ended before its training had a checkpoint"; exit 1; }
+  sleep 0.05
+done
+kill -TERM $!
+wait $! && { echo "the run did not end"; exit 1; }
 NW_PYTHON=$python "${run[@]}" | tee "$work/said"
 grep -qE '^surface, principal +\|' "$work/said" && grep -qx "report $work/hand/report.html" "$work/said"
 for file in report.html pictures/l_handMeshNode.0041.png models/l_handMeshNode.nwrp/principal_shapes.json; do
   [[ -s $work/hand/$file ]] || { echo "the run made no $file"; exit 1; }
 done
+grep -rq 'going on from .*l_handMeshNode\.checkpoint' "$work/hand/log" || { echo "the training began anew"; exit 1; }
 # pictures and the loss curve are in the page
 [[ $(grep -o 'data:image/png;base64,' "$work/hand/report.html" | wc -l) == 5 ]] || {
   echo "the page lacks pictures"
