@@ -23,8 +23,9 @@ namespace fs = std::filesystem;
 // stands in a data set that is about to be replaced, and then in FOLDER.part: what is there is nothing to go on from
 constexpr const char* supersededFile = "superseded";
 constexpr std::array ourFiles = {
-    datasetFile::controls, datasetFile::deltas,           datasetFile::frames, descriptionFile, setupFile,
-    datasetFile::progress, storage::FolderLock::fileName, supersededFile};
+    datasetFile::controls, datasetFile::deltas, datasetFile::frames,   datasetFile::skin,
+    descriptionFile,       setupFile,           datasetFile::progress, storage::FolderLock::fileName,
+    supersededFile};
 constexpr std::uint64_t roomForTexts = 1U << 20U; // the JSON files, and what the file system needs for itself
 
 bool isOneOf(const std::string& name, const char* file) {
@@ -176,7 +177,9 @@ std::uintmax_t bytesOfDataset(const fs::path& folder) {
     std::uintmax_t bytes = 0;
     for (const char* file : {datasetFile::controls, datasetFile::deltas, datasetFile::frames, descriptionFile})
         bytes += fs::file_size(folder / file);
-    return bytes;
+    std::error_code none; // a data set of an earlier version has no distances of the skin
+    const std::uintmax_t skin = fs::file_size(folder / datasetFile::skin, none);
+    return none ? bytes : bytes + skin;
 }
 
 } // namespace quarn

@@ -17,7 +17,7 @@ constexpr auto saveAfter = std::chrono::seconds(1);
 
 struct ProgressRecord {
     std::size_t rows = 0;
-    std::array<std::string, 3> sums;
+    std::array<std::string, 4> sums;
 };
 
 std::string textOf(const ProgressRecord& record) {
@@ -63,10 +63,11 @@ DatasetWriter::DatasetWriter(const std::filesystem::path& folder, const DatasetS
     , controls_(folder / datasetFile::controls, {"<f4", {shape.rows, shape.controls}})
     , deltas_(folder / datasetFile::deltas, {"<f4", {shape.rows, shape.deltas, 3}})
     , frames_(folder / datasetFile::frames, {"<i4", {shape.rows}})
+    , skin_(folder / datasetFile::skin, {"<f4", {shape.rows, shape.deltas}})
     , saved_(std::chrono::steady_clock::now()) {}
 
 void DatasetWriter::begin() {
-    for (storage::NpyRows* file : {&controls_, &deltas_, &frames_})
+    for (storage::NpyRows* file : {&controls_, &deltas_, &frames_, &skin_})
         file->begin();
     isOpen_ = true;
     rows_ = 0;
@@ -86,18 +87,23 @@ std::string DatasetWriter::resume() {
         return std::string(datasetFile::deltas) + " is damaged";
     if (!frames_.resume(record->rows, record->sums[2]))
         return std::string(datasetFile::frames) + " is damaged";
+    if (!skin_.resume(record->rows, record->sums[3]))
+        return std::string(datasetFile::skin) + " is damaged";
     isOpen_ = true;
     rows_ = savedRows_ = record->rows;
     return {};
 }
 
-void DatasetWriter::append(int frame, std::span<const float> controls, std::span<const float> deltas) {
-    if (controls.size() != shape_.controls || deltas.size() != 3 * shape_.deltas || rows_ == shape_.rows)
+void DatasetWriter::append(int frame, std::span<const float> controls, std::span<const float> deltas,
+                           std::span<const float> skin) {
+    if (controls.size() != shape_.controls || deltas.size() != 3 * shape_.deltas || skin.size() != shape_.deltas ||
+        rows_ == shape_.rows)
         throw std::logic_error("a row that the data set has no place for");
     isOpen_ = false; // a part of a row is nothing to record
     controls_.append(std::as_bytes(controls));
     deltas_.append(std::as_bytes(deltas));
     frames_.append(std::as_bytes(std::span(&frame, 1)));
+    skin_.append(std::as_bytes(skin));
     isOpen_ = true;
     ++rows_;
     if (rows_ - savedRows_ >= saveAfterRows || std::chrono::steady_clock::now() - saved_ >= saveAfter)
@@ -107,9 +113,9 @@ void DatasetWriter::append(int frame, std::span<const float> controls, std::span
 void DatasetWriter::save() {
     if (!isOpen_)
         return;
-    for (storage::NpyRows* file : {&controls_, &deltas_, &frames_})
+    for (storage::NpyRows* file : {&controls_, &deltas_, &frames_, &skin_})
         file->sync();
-    storage::writeWhole(progress_, textOf({rows_, {controls_.sum(), deltas_.sum(), frames_.sum()}}));
+    storage::writeWhole(progress_, textOf({rows_, {controls_.sum(), deltas_.sum(), frames_.sum(), skin_.sum()}}));
     savedRows_ = rows_;
     saved_ = std::chrono::steady_clock::now();
 }

@@ -129,6 +129,7 @@ void FrameSampler::sample(int frame) {
         evaluateInputs();
         evaluate(geometry_.output);
         takeDeltas();
+        takeSkin();
     });
 }
 
@@ -147,14 +148,30 @@ void FrameSampler::takeDeltas() {
         requirePlausible(affected);
 }
 
+void FrameSampler::takeSkin() {
+    readPoints(geometry_.input, skinPoints_);
+    readPoints(geometry_.target, targetPoints_);
+    skin_.resize(map_.affectCount());
+    for (unsigned affected = 0; affected < map_.affectCount(); ++affected) {
+        const std::size_t first = 3 * std::size_t{vertexOf(affected)};
+        const auto apart = [&](std::size_t axis) {
+            return skinPoints_.at(first + axis) - targetPoints_.at(first + axis);
+        };
+        skin_[affected] = static_cast<float>(std::hypot(apart(0), apart(1), apart(2)));
+    }
+}
+
+unsigned FrameSampler::vertexOf(unsigned affected) const {
+    return map_.isIdentityMap() ? affected : map_.affectMap()[affected];
+}
+
 // a frame of the deformer that has collapsed gives deltas of any size, and one of them spoils a whole training
 void FrameSampler::requirePlausible(unsigned affected) const {
     const float* delta = &deltas_[3 * std::size_t{affected}];
     const double length = std::hypot(double{delta[0]}, double{delta[1]}, double{delta[2]});
     if (length <= longestDelta_)
         return;
-    const unsigned vertex = map_.isIdentityMap() ? affected : map_.affectMap()[affected];
-    const std::string which = "the delta of vertex " + std::to_string(vertex) + " of " + geometry_.name;
+    const std::string which = "the delta of vertex " + std::to_string(vertexOf(affected)) + " of " + geometry_.name;
     if (!std::isfinite(length))
         fail(which + " is no finite number");
     std::string advice = "; is the target where the mesh is?";

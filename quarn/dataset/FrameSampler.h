@@ -39,10 +39,12 @@ public:
     const HIndexMapper& map() const { return map_; }
     const std::vector<std::string>& names() const { return controls_.names(); }
 
-    /// Afterwards controls() and deltas() are those of the frame; all of them are numbers.
+    /// Afterwards controls(), deltas() and skin() are those of the frame; all of them are numbers.
     void sample(int frame);
     const std::vector<float>& controls() const { return controls_.values(); } ///< as many as names()
     const std::vector<float>& deltas() const { return deltas_; } ///< x, y, z of each affected vertex, in their order
+    /// How far each of these vertices of the skin is from the target, in units of the scene.
+    const std::vector<float>& skin() const { return skin_; }
 
 private:
     void startExport();
@@ -50,6 +52,8 @@ private:
     void evaluateInputs();
     void readMap();
     void takeDeltas();
+    void takeSkin();
+    unsigned vertexOf(unsigned affected) const; ///< its index in the whole mesh
     void requirePlausible(unsigned affected) const;
     std::string targetSizes() const;
     std::string command(const std::string& flags) const;
@@ -61,7 +65,8 @@ private:
     double longestDelta_ = 0.0; ///< that is taken for one, in units of the scene
     HIndexMapper map_;
     ControlReader controls_;
-    std::vector<float> deltas_;
+    std::vector<float> deltas_, skin_;
+    std::vector<double> skinPoints_, targetPoints_; ///< of the frame
 };
 
 } // namespace quarn

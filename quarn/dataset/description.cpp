@@ -159,12 +159,24 @@ void writeFit(JsonWriter& writer, const TargetFit& fit) {
     writer.EndObject();
 }
 
+// a list of spans
+void writeDrawnFrames(JsonWriter& writer, const FrameRange& drawn) {
+    writer.Key("drawnFrames");
+    writer.StartArray();
+    writer.StartArray();
+    writer.Int(drawn.first);
+    writer.Int(drawn.last);
+    writer.EndArray();
+    writer.EndArray();
+}
+
 void writeFiles(JsonWriter& writer) {
     writer.Key("files");
     writer.StartObject();
     writeText(writer, "controls", datasetFile::controls);
     writeText(writer, "deltas", datasetFile::deltas);
     writeText(writer, "frames", datasetFile::frames);
+    writeText(writer, "skin", datasetFile::skin);
     writer.EndObject();
 }
 
@@ -200,6 +212,8 @@ std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, cons
     writeNumber(writer, facts.diagonal);
     if (facts.fit && std::isfinite(facts.fit->asItIs.mean))
         writeFit(writer, *facts.fit);
+    if (facts.drawn)
+        writeDrawnFrames(writer, *facts.drawn);
     writeTrain(writer, warp, geometry);
     writeFiles(writer);
     writer.EndObject();

@@ -5,6 +5,7 @@
 #include "quarn/dataset/DatasetWriter.h"
 #include "quarn/dataset/FrameSampler.h"
 #include "quarn/fit/targetFit.h"
+#include "quarn/scene/frames.h"
 
 #include <filesystem>
 #include <optional>
@@ -18,6 +19,8 @@ struct DatasetFacts {
     DatasetShape shape;
     std::string restSum;          ///< meshSum() of the rest mesh
     std::optional<TargetFit> fit; ///< none where the target was not compared with the skin
+    std::optional<FrameRange>
+        drawn; ///< the first and the last frame whose pose was drawn; none where none is known to be
 };
 
 /// The text of dataset.json; docs/dataset.md lists what is in it. `controls` the complete controls.npy, whose ranges it

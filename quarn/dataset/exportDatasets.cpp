@@ -4,6 +4,7 @@
 #include "quarn/console/Log.h"
 #include "quarn/dataset/DatasetFolder.h"
 #include "quarn/dataset/description.h"
+#include "quarn/dataset/drawnFrames.h"
 #include "quarn/dataset/exportFrames.h"
 #include "quarn/dataset/sceneSetup.h"
 #include "quarn/scene/meshSum.h"
@@ -110,6 +111,7 @@ public:
         facts_.scene = sceneFile_.filename().string();
         facts_.diagonal = diagonalOf(geometry.original);
         facts_.restSum = meshSum(geometry.original);
+        facts_.drawn = drawnFrames(frames_);
         facts_.shape = {frames_.count(), sampler_.names().size(), sampler_.map().affectCount()};
     }
 
@@ -214,7 +216,7 @@ private:
             const int frame = frames_.frame(writer.rows());
             sampler_.sample(frame);
             repeats_.look(frame, sampler_.controls(), sampler_.deltas());
-            writer.append(frame, sampler_.controls(), sampler_.deltas());
+            writer.append(frame, sampler_.controls(), sampler_.deltas(), sampler_.skin());
             progress.advance();
         }
     }

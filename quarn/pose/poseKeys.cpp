@@ -155,6 +155,8 @@ void putPoseKeys(const HPlug& plug, const PoseKeys& keys) {
         setList(plugOf(curve, "keyOutTangents"), keys.slopes);
     }
     setNumber(plugOf(curve, "interpolation"), static_cast<double>(keys.kind));
+    if (keys.drawn > 0)
+        setNumber(plugOf(curve, "drawnKeys"), static_cast<double>(keys.drawn));
     connect(findPlug("time1.outTime"), plugOf(curve, "time"));
     connect(plugOf(curve, "output"), plug);
 }

@@ -14,6 +14,7 @@ struct PoseKeys {
     std::vector<double> values;                                 ///< one for each time
     std::vector<double> slopes;                                 ///< for spline: in and out of each key, per frame
     Kind kind = Kind::step;
+    std::size_t drawn = 0; ///< the first so many were drawn, each for itself
     bool isMotion = false; ///< somebody's motion, which poses can be taken from; else sampled poses
 };
 

@@ -179,6 +179,7 @@ RefineReport refinePoses(const Warp& warp, const RefineOptions& options, const C
     const double active = activationRate(collector, options);
     PoseSet poses = posesOf(controls, frames);
     RefineReport report{nodeName(collector), controls.size(), poses.count(), 0, 0.0, {}, frames.first, frames.last};
+    const std::size_t drawn = drawnPoses(controls); // those that are added are no motion either
     Asked asked(warp, controls, models);
     for (std::size_t kind = 0; kind < kinds; ++kind) {
         // a seed of their own, or they were the known poses again; and others in the next round
@@ -197,7 +198,7 @@ RefineReport refinePoses(const Warp& warp, const RefineOptions& options, const C
     }
     requireAll(report, options);
     report.candidatesMm /= static_cast<double>(report.candidates);
-    putSampledPoses(warp, poses, controls, report.firstFrame, console);
+    putSampledPoses(warp, poses, drawn == report.known ? poses.count() : drawn, controls, report.firstFrame, console);
     stage.result([&] { return std::to_string(report.added.size()) + " poses added"; });
     return report;
 }

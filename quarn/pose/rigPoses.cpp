@@ -4,6 +4,7 @@
 #include "quarn/pose/poseKeys.h"
 #include "quarn/scene/plugs.h"
 
+#include <algorithm>
 #include <numeric>
 #include <stdexcept>
 
@@ -12,9 +13,10 @@ namespace {
 
 constexpr std::size_t mostNumbers = 100'000'000; // 800 MB
 
-void putKeys(const PoseSet& poses, const std::vector<PoseControl>& controls, int firstFrame) {
+void putKeys(const PoseSet& poses, std::size_t drawn, const std::vector<PoseControl>& controls, int firstFrame) {
     removePoseKeys();
     PoseKeys keys;
+    keys.drawn = drawn;
     keys.times.resize(poses.count());
     std::iota(keys.times.begin(), keys.times.end(), static_cast<double>(firstFrame));
     for (std::size_t i = 0; i < controls.size(); ++i) {
@@ -48,9 +50,16 @@ void requireRoomForPoses(std::size_t poses, std::size_t values) {
                                  std::to_string(mostNumbers) + " numbers can be made");
 }
 
-void putSampledPoses(const Warp& warp, const PoseSet& poses, const std::vector<PoseControl>& controls, int firstFrame,
-                     const Console& console) {
-    putKeys(poses, controls, firstFrame);
+std::size_t drawnPoses(const std::vector<PoseControl>& controls) {
+    for (const PoseControl& control : controls)
+        if (const HPlug source = control.plug.source(); !source.isNull() && isSampledCurve(source.node()))
+            return static_cast<std::size_t>(std::max(0, wholeNumberOf(plugOf(source.node(), "drawnKeys"))));
+    return 0;
+}
+
+void putSampledPoses(const Warp& warp, const PoseSet& poses, std::size_t drawn,
+                     const std::vector<PoseControl>& controls, int firstFrame, const Console& console) {
+    putKeys(poses, drawn, controls, firstFrame);
     setNumber(warp.plug("exportStartFrame"), firstFrame);
     setNumber(warp.plug("exportEndFrame"), firstFrame + static_cast<int>(poses.count()) - 1);
     noteWhatStillMoves(console);

@@ -18,9 +18,13 @@ std::vector<ValueLimits> limitsOf(const std::vector<PoseControl>& controls);
 /// Throws std::runtime_error for more poses of so many values, 1 or more, than are made.
 void requireRoomForPoses(std::size_t poses, std::size_t values);
 
-/// Puts the poses on the controls, one a frame, in place of all that quarn pose has put on the rig before, and sets the
-/// frames that the deformer exports. Says what still moves. Throws std::runtime_error, naming the plug. Thread: main.
-void putSampledPoses(const Warp& warp, const PoseSet& poses, const std::vector<PoseControl>& controls, int firstFrame,
-                     const Console& console);
+/// Of the sampled poses that are on the rig, how many were drawn, each for itself: the first ones. Thread: main.
+std::size_t drawnPoses(const std::vector<PoseControl>& controls);
+
+/// Puts the poses, of which the first `drawn` were drawn, on the controls, one a frame, in place of all that quarn pose
+/// has put on the rig before, and sets the frames that the deformer exports. Says what still moves. Throws
+/// std::runtime_error, naming the plug. Thread: main.
+void putSampledPoses(const Warp& warp, const PoseSet& poses, std::size_t drawn,
+                     const std::vector<PoseControl>& controls, int firstFrame, const Console& console);
 
 } // namespace quarn

@@ -116,7 +116,8 @@ SampleReport samplePoses(const Warp& warp, const SampleOptions& options, const C
     report.fromAnimation = report.poses - report.fromLimits;
     report.lastFrame = report.firstFrame + static_cast<int>(report.poses) - 1;
     // keys go on only when all is known, so that an error changes nothing
-    putSampledPoses(warp, poses, controls, report.firstFrame, console);
+    const std::size_t drawn = options.fromLimits ? report.fromLimits : 0;
+    putSampledPoses(warp, poses, drawn, controls, report.firstFrame, console);
     stage.result(
         [&] { return std::to_string(report.poses) + " poses of " + std::to_string(report.values) + " values"; });
     return report;

@@ -14,6 +14,7 @@ const HTypeId animCurveNode::id(0x6e770012);
 const HString animCurveNode::typeName("animCurve");
 
 KeyAttributes animCurveNode::keys;
+HObject animCurveNode::drawnKeys;
 HObject animCurveNode::output;
 
 animCurveNode::animCurveNode() = default;
@@ -27,7 +28,8 @@ HStatus animCurveNode::initialize() {
     AttributeMaker make;
     keys.make(make);
     output = make.real("output", "o", 0.0, outputFlags);
-    make.add({output});
+    drawnKeys = make.number("drawnKeys", "dk", HFnNumericData::kInt, 0);
+    make.add({drawnKeys, output});
     make.affects(
         {keys.keyTimes, keys.keyValues, keys.keyInTangents, keys.keyOutTangents, keys.interpolation, keys.time},
         {output}, true);

@@ -25,6 +25,7 @@ public:
     HStatus compute(const HPlug& plug, HDataBlock& block) override;
 
     static KeyAttributes keys;
+    static HObject drawnKeys; ///< a note for readers of the scene: affects nothing
     static HObject output;
 
 private:

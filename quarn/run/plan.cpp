@@ -406,7 +406,8 @@ private:
     }
 
     static std::vector<fs::path> setFiles(const std::string& folder) {
-        return {folder + "/dataset.json", folder + "/controls.npy", folder + "/deltas.npy", folder + "/frames.npy"};
+        return {folder + "/dataset.json", folder + "/controls.npy", folder + "/deltas.npy", folder + "/frames.npy",
+                folder + "/skin.npy"};
     }
 
     Step& exportFrames(const char* name, const MeshFacts& mesh, const std::string& scene, const FrameSpan& frames,

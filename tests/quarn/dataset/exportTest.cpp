@@ -71,12 +71,18 @@ TEST_F(ExportTest, DeltasLeadToTheTargetInBothModes) {
         const quarn::ExportAnswer answer = quarn::exportDatasets(flags).at(0);
         EXPECT_EQ(answer.rows, frames);
         const std::vector<float> deltas = numbersOf<float>(answer.folder / "deltas.npy");
+        const std::vector<float> skin = numbersOf<float>(answer.folder / "skin.npy");
         ASSERT_EQ(deltas.size(), frames * vertexCount * 3);
+        ASSERT_EQ(skin.size(), frames * vertexCount);
         for (std::size_t frame = 0; frame < frames; ++frame) {
             const auto row = std::span(deltas).subspan(frame * restPoints().size(), restPoints().size());
             const std::vector<float> reached =
                 mode == "Surface" ? turned(sum(restPoints(), row), frame) : sum(turned(restPoints(), frame), row);
             EXPECT_THAT(reached, Pointwise(FloatNear(2e-6F), targetAt(frame)));
+            for (std::size_t vertex = 0; vertex < vertexCount; ++vertex) { // the strip turns as a whole
+                const auto* delta = &row[3 * vertex];
+                EXPECT_NEAR(skin[frame * vertexCount + vertex], std::hypot(delta[0], delta[1], delta[2]), 2e-6);
+            }
         }
         EXPECT_EQ(described(answer.folder, "/deltaType"), mode == "Surface" ? "dos" : "dbp");
     }
@@ -89,7 +95,7 @@ TEST_F(ExportTest, SaysWhatIsInIt) {
     flags.frames = "2-5x3";
     const quarn::ExportAnswer answer = quarn::exportDatasets(flags).at(0);
     EXPECT_EQ(answer.folder, std::filesystem::canonical(data()));
-    EXPECT_EQ(answer.bytes, 3 * 128 + 2 * (4 + 8 * 4 + 36 * 4) + contentOf(data() / "dataset.json").size());
+    EXPECT_EQ(answer.bytes, 4 * 128 + 2 * (4 + 8 * 4 + 36 * 4 + 12 * 4) + contentOf(data() / "dataset.json").size());
     EXPECT_THAT(numbersOf<int>(data() / "frames.npy"), ElementsAre(2, 5));
     const auto angle = [](int frame) { return static_cast<float>(turn * (frame - 1)); };
     const float c = std::cos(angle(5)), s = std::sin(angle(5));
@@ -118,6 +124,22 @@ TEST_F(ExportTest, SaysWhatIsInIt) {
     };
     for (const auto& [place, text] : expected)
         EXPECT_EQ(described(data(), place), text) << place;
+}
+
+TEST_F(ExportTest, SaysWhichPosesWereDrawn) {
+    writeTarget(5);
+    const std::string keys = "setAttr swing.keyTimes 1 3 6; setAttr swing.keyValues 0 0.1 0.25; ";
+    for (const auto& [more, drawn] : {std::pair("", "(none)"), std::pair("setAttr swing.drawnKeys 2", "[[2,3]]"),
+                                      std::pair("setAttr swing.drawnKeys 9", "[[2,5]]"),
+                                      std::pair("setAttr swing.drawnKeys 1", "(none)")}) { // its frame is not exported
+        SCOPED_TRACE(more);
+        save(5, keys + more);
+        quarn::ExportOptions flags = options();
+        flags.frames = "2-5";
+        flags.overwrite = true;
+        quarn::exportDatasets(flags);
+        EXPECT_EQ(described(data(), "/drawnFrames"), drawn);
+    }
 }
 
 // a target that does not go with the joint is told of before anything is written, and again by what was written anyway
@@ -159,6 +181,7 @@ TEST_F(ExportTest, DeformedVerticesKeepTheirOrder) {
     ASSERT_EQ(deltas.size(), 12U);
     EXPECT_FLOAT_EQ(deltas[0], targetAt(0)[21] - restPoints()[21]);
     EXPECT_FLOAT_EQ(deltas[3], targetAt(0)[9] - restPoints()[9]);
+    EXPECT_FLOAT_EQ(numbersOf<float>(data() / "skin.npy").at(1), std::hypot(deltas[3], deltas[4], deltas[5]));
 }
 
 TEST_F(ExportTest, SeveralGeometriesHaveAFolderEach) {

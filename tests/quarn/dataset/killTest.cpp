@@ -50,7 +50,7 @@ TEST_F(KillTest, ResumesToTheSameBytes) {
     const fs::path whole = folder.path() / "whole", output = folder.path() / "killed";
     ASSERT_EQ(ended(start(whole)), 0);
     const auto expected = contentsOf(whole);
-    ASSERT_EQ(expected.size(), 5U);
+    ASSERT_EQ(expected.size(), 6U);
 
     std::mt19937 random(20);
     for (int kill = 0; kill < 20; ++kill) {
@@ -90,7 +90,7 @@ void replaceDataset(const fs::path& output, const std::string& value) {
     }
     if (writer.rows() == 0) {
         const std::vector<float> numbers(3, std::stof(value));
-        writer.append(1, std::span(numbers).first(1), numbers);
+        writer.append(1, std::span(numbers).first(1), numbers, std::span(numbers).first(1));
     }
     writer.save();
     storage::writeWhole(folder.part() / quarn::descriptionFile, value);
@@ -105,7 +105,7 @@ TEST_F(KillTest, ADataSetThatIsReplacedIsThereAtAnyMoment) {
     for (const char* value : {"1", "2"}) {
         replaceDataset(output, value);
         whole[value] = contentsOf(output);
-        ASSERT_EQ(whole[value].size(), 5U);
+        ASSERT_EQ(whole[value].size(), 6U);
     }
     std::mt19937 random(6);
     for (int kill = 0; kill < 60; ++kill) {

@@ -51,11 +51,12 @@ protected:
         writer.begin();
         const std::vector<float> controls = numbersOf<float>(folder.path() / "whole" / "controls.npy");
         const std::vector<float> deltas = numbersOf<float>(folder.path() / "whole" / "deltas.npy");
+        const std::vector<float> skin = numbersOf<float>(folder.path() / "whole" / "skin.npy");
         for (std::size_t row = 0; row <= rows; ++row) {
             if (row == rows)
                 writer.save();
             writer.append(static_cast<int>(row) + 1, std::span(controls).subspan(row * 8, 8),
-                          std::span(deltas).subspan(row * 36, 36));
+                          std::span(deltas).subspan(row * 36, 36), std::span(skin).subspan(row * 12, 12));
         }
         if (rows + 1 < frames)
             std::ofstream(part() / "deltas.npy", std::ios::binary | std::ios::app) << "half a row";
@@ -68,7 +69,7 @@ protected:
 };
 
 TEST_F(ResumeTest, GoesOnFromTheRecordedRows) {
-    EXPECT_EQ(expected_.size(), 5U);
+    EXPECT_EQ(expected_.size(), 6U);
     for (const std::size_t rows : {0U, 1U, 5U, 7U}) {
         leavePart(rows);
         EXPECT_EQ(exported(), expected_) << rows;
@@ -93,11 +94,12 @@ TEST_F(ResumeTest, BeginsAgainWhereItIsDamaged) {
         [&] { fs::resize_file(deltas, 1U << 20U); },
         [&] { flip(part() / "controls.npy", 3); },
         [&] { fs::remove(part() / "frames.npy"); },
+        [&] { flip(part() / "skin.npy", 130); },
         [&] { fs::remove(deltas), fs::create_directory(deltas); },
         [&] { fs::remove(progress); },
-        [&] { put(progress, "{\"rows\": 99, \"sums\": [\"\", \"\", \"\"]}"); },
+        [&] { put(progress, "{\"rows\": 99, \"sums\": [\"\", \"\", \"\", \"\"]}"); },
         [&] { put(progress, "{\"rows\": -1, \"sums\": 3}"); },
-        [&] { put(progress, "{\"rows\": 2, \"sums\": [1, 2, 3]}"); },
+        [&] { put(progress, "{\"rows\": 2, \"sums\": [1, 2, 3, 4]}"); },
         [&] { put(progress, std::string(1U << 20U, '[')); },
         [&] { put(setup, "{\"frames\": 3}"); },
         [&] { put(setup, contentOf(setup).substr(0, 50)); },
@@ -164,11 +166,11 @@ TEST_F(ResumeTest, AFullDiskIsSaidAndGoneOnFrom) {
     fs::create_directory(disk);
     if (::mount("tmpfs", disk.c_str(), "tmpfs", 0, "size=4m") != 0)
         GTEST_SKIP() << "no small disk to fill: mounting one was refused: " << std::strerror(errno);
-    constexpr quarn::DatasetShape shape{300, 4, 500}; // 1.8 MB
-    const std::vector<float> controls(4, 1.0F), deltas(1500, 2.0F);
+    constexpr quarn::DatasetShape shape{300, 4, 500}; // 2.4 MB
+    const std::vector<float> controls(4, 1.0F), deltas(1500, 2.0F), skin(500, 3.0F);
     const auto appendAll = [&](quarn::DatasetWriter& writer) {
         while (writer.rows() < shape.rows)
-            writer.append(1, controls, deltas);
+            writer.append(1, controls, deltas, skin);
         writer.save();
     };
     quarn::DatasetWriter stopped(disk, shape);
@@ -190,7 +192,7 @@ TEST_F(ResumeTest, AFullDiskIsSaidAndGoneOnFrom) {
     quarn::ExportOptions flags = options();
     flags.output = disk / "data";
     flags.frames = "1-20000";
-    EXPECT_THAT(errorOf(flags), AllOf(HasSubstr("bytes free"), HasSubstr("needs 4648576")));
+    EXPECT_THAT(errorOf(flags), AllOf(HasSubstr("bytes free"), HasSubstr("needs 5608576")));
     ::umount2(disk.c_str(), MNT_DETACH);
 }
 

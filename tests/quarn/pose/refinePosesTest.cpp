@@ -5,6 +5,8 @@
 #include "plugin/deformer/support/modelFolder.h"
 #include "quarn/pose/ModelEnsemble.h"
 #include "quarn/pose/farthestPoses.h"
+#include "quarn/pose/rigPoses.h"
+#include "quarn/scene/plugs.h"
 
 #include <rapidjson/document.h>
 
@@ -127,6 +129,7 @@ TEST_F(RefinePosesTest, AddsPosesWhereModelsDisagreeAndKeepsThoseThatAreThere) {
                 before.push_back({at(*session, frame, one.plug)});
     }
     auto session = open("refined.json");
+    EXPECT_EQ(quarn::drawnPoses(quarn::poseControls(quarn::findNode("poses"))), 50U); // the new ones are drawn as well
     std::size_t i = 0;
     for (int frame = 5; frame < 35; ++frame)
         for (const auto& one : sampled)

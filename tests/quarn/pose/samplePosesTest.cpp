@@ -160,6 +160,7 @@ TEST_F(SamplePosesTest, FramesOfTheAnimationFollowDrawnPoses) {
     EXPECT_THAT(pose({"--from", "both", "--samples", "6", "--frames", "3-13x5", "--json"}),
                 AllOf(HasSubstr("\"poses\": 9,"), HasSubstr("\"fromLimits\": 6,"), HasSubstr("\"fromAnimation\": 3,")));
     EXPECT_NEAR(at(*open(), 8, "tip.rotateZ"), 1.25, 1e-12);
+    EXPECT_EQ(at(*open(), 1, "tip_rotateZ_pose.drawnKeys"), 6.0);
     std::filesystem::rename(path("posed.json"), scene());
     EXPECT_THAT(poseFailure({"--from", "animation"}), HasSubstr("earlier quarn pose"));
 }
