@@ -6,6 +6,7 @@ import json
 import os
 import signal
 import sys
+from functools import partial
 from pathlib import Path
 from types import FrameType
 from typing import TYPE_CHECKING, Any, Callable, NoReturn, Optional, Union
@@ -38,6 +39,7 @@ def parser() -> Parser:
     evaluate.add_argument("model", metavar="MODEL.nwrp")
     add_quarn(evaluate)
     evaluate.add_argument("--json", action="store_true", help="write the errors as JSON")
+    evaluate.add_argument("--certify", action="store_true", help="add the errors to the model's certificate")
     evaluate.add_argument("--report", metavar="FOLDER", help="write the errors there as well, and those of every frame "
                           "and vertex as .npy")
 
@@ -274,7 +276,7 @@ def speaker(options: argparse.Namespace) -> Callable[[str], None]:
 def command_evaluate(options: argparse.Namespace) -> int:
     import numpy as np
 
-    from . import evaluator, files, report
+    from . import certificate, evaluator, files, report
     from .dataset import load_dataset
     from .measure import as_lines, measured
 
@@ -284,7 +286,10 @@ def command_evaluate(options: argparse.Namespace) -> int:
         raise TrainerError(f"{options.dataset} has no deltas to compare with")
     model = evaluator.ModelDirectory(options.model, quarn)
     model.check_fits(dataset)
-    found = measured(dataset, np.arange(dataset.frame_count), model.deltas, model.shapes)
+    measure = partial(measured, dataset, deltas_of=model.deltas, shapes=model.shapes)
+    found = measure(np.arange(dataset.frame_count))
+    if options.certify:
+        certificate.add_errors(Path(options.model), dataset, found, measure)
     errors = {**found.errors, "ranWith": "quarn" if quarn else "numpy"}
     if options.report:
         with files.whole_folder(Path(options.report), report.ERROR_NAMES) as part:

@@ -3,6 +3,8 @@
 far from the poses that it was trained on, and of which mesh and data it is (decision 0193)."""
 
 import io
+import json
+import os
 from pathlib import Path
 from typing import Any, Callable, Optional
 
@@ -10,6 +12,7 @@ import numpy as np
 import xxhash
 
 from .dataset import Dataset
+from .errors import TrainerError
 from .files import write_bytes
 from .guard import units_of
 from .measure import Measured
@@ -44,7 +47,7 @@ def write(folder: Path, dataset: Dataset, split: Split, errors: Measured,
     return {
         "trainingFrames": len(split.train),
         "controls": {"minima": numbers(trained.min(axis=0)), "maxima": numbers(trained.max(axis=0))},
-        "errors": rows_of(dataset, split, errors, measure),
+        "errors": rows_of(dataset, f"{WAYS[split.how]}; {PARTS[split.measured()[0]]}", errors, measure),
         "expectedError": expected_error(distances(dataset.controls[errors.rows], poses, units),
                                         errors.by_frame[:, 0]) if held else None,
         "trainedPoses": {"count": len(poses), "xxh3_128": digits},
@@ -68,11 +71,10 @@ def write_poses(path: Path, poses: np.ndarray) -> str:
 
 # --- errors ---
 
-def rows_of(dataset: Dataset, split: Split, errors: Measured,
+def rows_of(dataset: Dataset, heldout: str, errors: Measured,
             measure: Callable[[np.ndarray], Measured]) -> list[dict[str, Any]]:
     """One row for each kind of frames that was measured: motions are harder than poses that are drawn."""
     drawn = dataset.drawn[errors.rows]
-    heldout = f"{WAYS[split.how]}; {PARTS[split.measured()[0]]}"
     if not drawn.any() or drawn.all():
         return [row_of("drawn" if drawn.any() else "motion", heldout, errors)]
     return [row_of(kind, heldout, measure(errors.rows[chosen]))
@@ -85,6 +87,24 @@ def row_of(kind: str, heldout: str, measured: Measured) -> dict[str, Any]:
 
     return {"frames": len(measured.rows), "poses": kind, "heldOut": heldout,
             "mm": {name: figures(measured.errors[stage]) for name, stage in STAGES.items()}}
+
+
+def add_errors(folder: Path, dataset: Dataset, errors: Measured, measure: Callable[[np.ndarray], Measured]) -> None:
+    """Into the certificate of a published model: its errors on all rows of another data set. Those that it has of the
+    same one are replaced."""
+    path, source = folder / "metadata.json", f"sha256:{dataset.digest}"
+    metadata = json.loads(path.read_bytes())
+    found = metadata.get("certificate") if isinstance(metadata, dict) else None
+    if not isinstance(found, dict) or not isinstance(found.get("errors"), list):
+        raise TrainerError(f"{folder} has no certificate that errors could be added to: train it again")
+    if found.get("dataSet") == source:
+        raise TrainerError(f"{folder} was trained on {dataset.folder}: its errors there promise nothing")
+    rows = rows_of(dataset, f"all of the data set {dataset.folder.resolve().name}", errors, measure)
+    found["errors"] = [row for row in found["errors"] if not isinstance(row, dict) or row.get("dataSet") != source]
+    found["errors"] += [{**row, "dataSet": source} for row in rows]
+    part = path.with_name("metadata.json.part")
+    write_bytes(part, (json.dumps(metadata, indent=1, allow_nan=False) + "\n").encode())
+    os.replace(part, path)
 
 
 # --- how far from what is known ---

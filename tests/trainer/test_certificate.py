@@ -8,7 +8,7 @@ import tempfile
 import unittest
 from dataclasses import replace
 from pathlib import Path
-from typing import Any
+from typing import Any, Callable
 
 import numpy as np
 import xxhash
@@ -16,9 +16,10 @@ import xxhash
 import synthetic
 from trainer import certificate, pipeline
 from trainer.dataset import Dataset, load_dataset
+from trainer.errors import TrainerError
 from trainer.evaluator import ModelDirectory, find_quarn, run_with_quarn
 from trainer.guard import units_of
-from trainer.measure import measure
+from trainer.measure import Measured, measure, measured
 from trainer.split import split_rows
 
 
@@ -35,6 +36,13 @@ class CertificateTest(unittest.TestCase):
         pipeline.train(pipeline.Job(dataset, replace(dataset.settings, **changes), 1, 1, model,
                                     self.place / "model.report", None, lambda line: None, False, validation))
         return json.loads((model / "metadata.json").read_text())["certificate"], model
+
+    @staticmethod
+    def measured(model: Path, dataset: Dataset) -> tuple[Measured, Callable[[np.ndarray], Measured]]:
+        """Over all rows, and what measures others."""
+        directory = ModelDirectory(model, None)
+        return (measured(dataset, np.arange(dataset.frame_count), directory.deltas),
+                lambda rows: measured(dataset, rows, directory.deltas))
 
     def test_other_frames_of_the_same_kind_have_the_errors_that_it_states(self) -> None:
         found, model = self.train(load_dataset(synthetic.make(self.place / "data", frames=1500, meshSum="xxh3_128:1f")),
@@ -83,7 +91,16 @@ class CertificateTest(unittest.TestCase):
                 self.assertEqual([row["poses"] for row in found["errors"]], kinds)
                 self.assertTrue(all(30 / len(kinds) - 4 < row["frames"] <= 30 for row in found["errors"]))
                 self.assertEqual(found["trainingFrames"], 80)
-        found, _ = self.train(drawn, epochs=1, validationRatio=0.0)
+        # what another data set gives is added, once; what was trained on promises nothing
+        found, model = self.train(drawn, epochs=1, validationRatio=0.0)
+        for _ in range(2):
+            certificate.add_errors(model, motion, *self.measured(model, motion))
+        added = json.loads((model / "metadata.json").read_text())["certificate"]
+        self.assertEqual([(row["poses"], row["frames"]) for row in added["errors"]], [("drawn", 80), ("motion", 60)])
+        self.assertEqual({**added, "errors": found["errors"]}, found)
+        with self.assertRaisesRegex(TrainerError, "was trained on"):
+            certificate.add_errors(model, drawn, *self.measured(model, drawn))
+        self.assertEqual(sorted(os.listdir(model)), ["metadata.json", "model.onnx", certificate.POSES_NAME])
         self.assertIn("they were trained on", found["errors"][0]["heldOut"])
         self.assertIsNone(found["expectedError"])
 
