@@ -11,6 +11,7 @@
 #include "nw_model/ModelSession.h"
 #include "nw_model/PrincipalBasisFiles.h"
 #include "nw_model/PrincipalShapes.h"
+#include "storage/byteOrder.h"
 #include "storage/fileSum.h"
 #include "support/TemporaryFolder.h"
 #include "support/npzBytes.h"
@@ -148,19 +149,52 @@ void writeShapes(const fs::path& folder, std::size_t shapes, std::size_t vertice
           shapesArchive(storage::sumOfFile(json, UINT64_MAX, 0).digits, values, shapes));
 }
 
+// The archive that a budget makes, beside the same text, which is not compared: small numbers mostly, of five bits or
+// so, and a tenth of the shapes in two bytes.
+void writeWholeNumbers(const fs::path& folder, const fs::path& json, std::size_t shapes, std::size_t vertices) {
+    std::string large, small;
+    double value = 0.1234567890123456;
+    for (std::size_t i = 0; i < 3 * shapes * vertices; ++i) {
+        value = value * 3.9 * (1.0 - value);
+        const double part = 2 * (value - 0.5);
+        if (i / 3 % shapes < shapes / 10)
+            storage::putLittle(large, static_cast<std::int16_t>(2000 * part * part * part));
+        else
+            small += static_cast<char>(127 * part * part * part);
+    }
+    std::string scales;
+    for (std::size_t s = 0; s < shapes; ++s)
+        storage::putLittle(scales, 0.001F);
+    fs::create_directory(folder);
+    fs::copy_file(json, folder / "principal_shapes.json");
+    const std::string digits = storage::sumOfFile(json, UINT64_MAX, 0).digits;
+    write(folder / "principal_shapes.npz",
+          npzBytes({{"json_xxh3_128", npyBytes("|S32", {}, digits)},
+                    {"shapes_int16", npyBytes("<i2", {vertices, shapes / 10, 3}, large)},
+                    {"shapes_int8", npyBytes("|i1", {vertices, shapes - shapes / 10, 3}, small)},
+                    {"scales", npyBytes("<f4", {shapes}, scales)}},
+                   true));
+}
+
 class BasisSink final : public neuralWarp::PrincipalShapesSink {
 public:
-    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float>) override {
-        basis_.resize(vertCount, shapeCount);
+    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float> scales) override {
+        if (scales.empty())
+            basis_.resize(vertCount, shapeCount);
+        else
+            basis_.resizeHalves(vertCount, scales);
         filled_ = 0;
     }
-    void append(std::span<const float> values) override {
+    void append(std::span<const float> values) override { put(values); }
+    void append(std::span<const std::uint16_t> halves) override { put(halves); }
+
+private:
+    template <class Number>
+    void put(std::span<const Number> values) {
         basis_.set(filled_, values);
         filled_ += values.size() / 3 / basis_.shapeCount();
     }
-    void append(std::span<const std::uint16_t>) override {}
 
-private:
     neuralWarp::PrincipalBasis basis_;
     std::size_t filled_ = 0;
 };
@@ -172,13 +206,18 @@ std::vector<Phase> openingShapes(const fs::path& folder, std::size_t vertices, c
     writeShapes(folder, shapes, vertices);
     const fs::path json = folder / "principal_shapes.json";
     const std::size_t numbers = 3 * shapes * vertices;
-    Phase all{"open shapes", name, numbers, fs::file_size(json)};
-    all.ours = [folder] {
+    const auto open = [](const fs::path& from) {
         BasisSink sink;
         neuralWarp::PrincipalShapesAnswer answer;
-        if (!neuralWarp::readPrincipalBasis(folder, sink, answer) || !answer.isFromArchive)
+        if (!neuralWarp::readPrincipalBasis(from, sink, answer) || !answer.isFromArchive)
             throw std::runtime_error("the shapes cannot be opened: " + answer.whyNotArchive);
     };
+    Phase all{"open shapes", name, numbers, fs::file_size(json)};
+    all.ours = [open, folder] { open(folder); };
+    const fs::path ofBudget = folder / "budget";
+    writeWholeNumbers(ofBudget, json, shapes, vertices);
+    Phase wholes{"open shapes: whole numbers", name, numbers, fs::file_size(ofBudget / "principal_shapes.npz")};
+    wholes.ours = [open, ofBudget] { open(ofBudget); };
     Phase sum{"open shapes: sum of text", name, numbers, fs::file_size(json)};
     sum.ours = [json] { storage::sumOfFile(json, UINT64_MAX, 0); };
     Phase text{"open shapes: by text", name, numbers, fs::file_size(json)};
@@ -189,7 +228,7 @@ std::vector<Phase> openingShapes(const fs::path& folder, std::size_t vertices, c
     };
     Phase layOut{"open shapes: lay out", name, numbers, numbers * sizeof(float)};
     layOut.ours = [values = std::vector<float>(numbers)] { neuralWarp::PrincipalBasis().assign(values, shapes); };
-    return {all, sum, layOut, text};
+    return {all, wholes, sum, layOut, text};
 }
 
 // The sum that a frame makes, of halves held against that of floats.

@@ -113,7 +113,7 @@ SETTING_FLAGS = {
     "validationRatio": "--validation-ratio", "hiddenLayerCount": "--hidden-layers", "neuronsPerLayer": "--neurons",
     "activationFunction": "--activation", "dropoutRatio": "--dropout", "principalShapesLimit": "--principal-limit",
     "principalShapesAccuracy": "--principal-accuracy", "patience": "--patience",
-    "guard": "--guard", "guardWidth": "--guard-width",
+    "guard": "--guard", "guardWidth": "--guard-width", "principalShapesBudget": "--basis-budget",
 }
 
 

@@ -20,10 +20,12 @@ from .dataset import Dataset
 from .errors import TrainerError
 from .files import write_bytes
 from .guard import Guard, add_clamp, add_fade
-from .halves import Halves
+from .budget import WholeNumbers
+from .halves import Halves, by_vertex
 from .network import Network, Normalisation
 from .settings import WITHOUT_EFFECT, Settings
 
+Packed = Union[Halves, WholeNumbers]
 OPSET = 16
 IR_VERSION = 8
 METADATA_LIMIT, SHAPES_LIMIT = 64 << 20, 1 << 30  # bytes that the deformer reads
@@ -152,8 +154,8 @@ def check_shapes_size(shape_count: int, delta_count: int) -> None:
 
 
 def write_model(folder: Path, model: onnx.ModelProto, metadata_: dict[str, Any],
-                shapes: Optional[np.ndarray] = None, halves: Optional[Halves] = None) -> None:
-    """Writes the files into an existing folder. shapes: float32 [S, 3 * D], in scene units, or none; halves: what they
+                shapes: Optional[np.ndarray] = None, packed: Optional[Packed] = None) -> None:
+    """Writes the files into an existing folder. shapes: float32 [S, 3 * D], in scene units, or none; packed: what they
     are decoded from."""
     text = json.dumps(metadata_, indent=1, allow_nan=False) + "\n"
     if len(text) > METADATA_LIMIT:
@@ -162,10 +164,10 @@ def write_model(folder: Path, model: onnx.ModelProto, metadata_: dict[str, Any],
     write_bytes(folder / "metadata.json", text.encode())
     write_bytes(folder / "model.onnx", model.SerializeToString(deterministic=True))
     if shapes is not None:
-        write_shapes(folder, shapes, halves)
+        write_shapes(folder, shapes, packed)
 
 
-def write_shapes(folder: Path, shapes: np.ndarray, halves: Optional[Halves] = None) -> None:
+def write_shapes(folder: Path, shapes: np.ndarray, packed: Optional[Packed] = None) -> None:
     shapes = shapes + np.float32(0)  # readers take "-0" for 0
     # nine digits give a float32 back, also where a reader errs in a double's last places
     numbers = ",".join(["%.9g"] * shapes.shape[1])
@@ -173,19 +175,13 @@ def write_shapes(folder: Path, shapes: np.ndarray, halves: Optional[Halves] = No
     text = (f'{{"principalShapeCount": {len(shapes)}, "principalVertCount": {shapes.shape[1] // 3}, '
             f'"principalShapes": [\n{rows}\n]}}\n').encode()
     write_bytes(folder / "principal_shapes.json", text)
-    write_bytes(folder / "principal_shapes.npz", shapes_archive(text, shapes, halves))
+    write_bytes(folder / "principal_shapes.npz", shapes_archive(text, shapes, packed))
 
 
-def shapes_archive(text: bytes, shapes: np.ndarray, halves: Optional[Halves]) -> bytes:
+def shapes_archive(text: bytes, shapes: np.ndarray, packed: Optional[Packed]) -> bytes:
     """The numbers of that JSON for readers in a hurry: they count while the JSON is the one of that sum."""
-    arrays = {"json_xxh3_128": np.array(xxhash.xxh3_128_hexdigest(text).encode()), "shapes": by_vertex(shapes, "<f4")}
-    if halves is not None:
-        arrays.update(shapes=by_vertex(halves.numbers, "<f2"), scales=halves.scales.astype("<f4"))
+    numbers = packed.arrays() if packed else {"shapes": by_vertex(shapes, "<f4")}
     archive = io.BytesIO()
-    np.savez(archive, **arrays)
+    write = np.savez_compressed if packed and packed.compressed else np.savez
+    write(archive, json_xxh3_128=np.array(xxhash.xxh3_128_hexdigest(text).encode()), **numbers)
     return archive.getvalue()
-
-
-def by_vertex(shapes: np.ndarray, kind: str) -> np.ndarray:
-    """[D, S, 3] of [S, 3 * D]"""
-    return np.ascontiguousarray(shapes.reshape(len(shapes), -1, 3).transpose(1, 0, 2), kind)

@@ -20,10 +20,20 @@ SMALLEST = -100  # of a scale's exponents: then no product of scale and number i
 class Halves:
     numbers: np.ndarray  # float16 [S, 3 * D]
     scales: np.ndarray   # float32 [S]
+    compressed = False   # it would gain little
 
     def decoded(self) -> np.ndarray:
         """float32 [S, 3 * D]"""
         return self.scales[:, None] * self.numbers.astype(np.float32)
+
+    def arrays(self) -> dict[str, np.ndarray]:
+        """As an archive has them."""
+        return {"shapes": by_vertex(self.numbers, "<f2"), "scales": self.scales.astype("<f4")}
+
+
+def by_vertex(shapes: np.ndarray, kind: str) -> np.ndarray:
+    """[D, S, 3] of [S, 3 * D]"""
+    return np.ascontiguousarray(shapes.reshape(len(shapes), shapes.shape[1] // 3, 3).transpose(1, 0, 2), kind)
 
 
 def to_halves(shapes: np.ndarray) -> Halves:

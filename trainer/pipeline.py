@@ -9,12 +9,13 @@ from typing import Any, Callable, Optional
 import numpy as np
 
 from . import certificate, evaluator, export, files, limits, memory, plausible, progress, report, resume, warm
+from .budget import budgeted, check_budget, say_size
 from .checkpoint import Checkpoints
 from .dataset import Dataset
 from .device import Device
 from .errors import TrainerError
 from .guard import guard_of
-from .halves import Halves, rounding, to_halves
+from .halves import rounding, to_halves
 from .line import Line, best_line
 from .measure import Measured, measured
 from .neighbourhoods import plugs_of, seen_by_neurons, shares
@@ -62,8 +63,9 @@ class Targets:
     unit: float                             # by which the network's last layer is scaled
     shapes: Optional[np.ndarray] = None     # float32 [S, 3 * D] that the scaled outputs are coefficients of
     explained: Optional[float] = None
-    halves: Optional[Halves] = None         # what the shapes are decoded from
-    rounding: Optional[dict[str, Any]] = None  # what that costs, over all rows
+    packed: Optional[export.Packed] = None  # what the shapes are decoded from
+    rounding: Optional[dict[str, Any]] = None  # what halves cost, over all rows
+    budget: Optional[dict[str, Any]] = None  # what came of --basis-budget
 
     def deltas(self, outputs: np.ndarray) -> np.ndarray:
         """float32 [n, 3 * D] in scene units, of scaled outputs [n, count]."""
@@ -79,6 +81,7 @@ def train(job: Job) -> dict[str, Any]:
     if settings.principalShapesHalf and not settings.principalShapesEnabled:
         raise TrainerError("half precision is for principal shapes, and this model has none: give --principal-shapes "
                            "as well, or leave --half-shapes away")
+    check_budget(settings)
     check_size(settings, dataset.control_count, 1 if settings.principalShapesEnabled else 3 * dataset.delta_count)
     make_deterministic(job.seed, job.threads)
     memory.warn_of_slow_blas(job.say)
@@ -155,6 +158,8 @@ def principal_targets(job: Job, rows: np.ndarray) -> Targets:
     coefficients *= np.float32(1 / unit)
     shapes = (basis.shapes.astype(np.float64) * unit).astype(np.float32)
     targets = Targets(len(shapes), lambda rows: coefficients[rows], 1.0, shapes, basis.explained)
+    if settings.principalShapesBudget > 0:
+        return replace(targets, **budgeted(dataset, rows, shapes, targets.of, settings.principalShapesBudget, job.say))
     return halved(job, targets, shapes) if settings.principalShapesHalf else targets
 
 
@@ -165,7 +170,7 @@ def halved(job: Job, targets: Targets, shapes: np.ndarray) -> Targets:
     lost = rounding(job.dataset, np.arange(job.dataset.frame_count), targets.of, decoded - shapes)
     job.say(f"in half precision the shapes put vertices off by {lost['mean']['mm']:.2g} mm in the mean and "
             f"{lost['max']['mm']:.2g} mm at most")
-    return replace(targets, shapes=decoded, halves=halves, rounding=lost)
+    return replace(targets, shapes=decoded, packed=halves, rounding=lost)
 
 
 # --- training and export ---
@@ -231,7 +236,9 @@ def export_and_verify(job: Job, part: Path, trained: Trained, targets: Targets, 
     if job.first:
         metadata["firstNetwork"] = warm.digest_of(job.first)
     metadata["certificate"] = knowledge
-    export.write_model(part, model, metadata, targets.shapes, targets.halves)
+    export.write_model(part, model, metadata, targets.shapes, targets.packed)
+    if targets.budget is not None:
+        say_size(targets.budget, part / "principal_shapes.npz", job.say)
     rows = split.measured()[1][:VERIFIED_ROWS]
     controls = job.dataset.controls[rows]
     wanted = predict(network, normalisation, controls, guard)
@@ -287,7 +294,7 @@ def summarise(job: Job, trained: Trained, targets: Targets, split: Split, errors
         "verifiedWithQuarn": job.quarn is not None, "heldOut": split.how != "none",
         "split": {**split.facts(), "validationSet": held}, "errors": errors.errors,
         "principalShapes": None if targets.shapes is None else len(targets.shapes), "explained": targets.explained,
-        "halfPrecision": targets.rounding,
+        "halfPrecision": targets.rounding, "basisBudget": targets.budget,
         "parameters": sum(p.numel() for p in network.parameters()),
         "epochs": len(history.train), "bestEpoch": history.best_epoch, "bestLoss": history.best_loss,
         "interrupted": history.interrupted, "firstNetwork": None if job.first is None else job.first.name,

@@ -34,6 +34,7 @@ class Settings:
     linearPath: bool = False  # not an attribute of the node
     localNeurons: bool = False  # not an attribute of the node
     principalShapesHalf: bool = False  # not an attribute of the node
+    principalShapesBudget: float = 0.0  # mm, 0 for none; not an attribute of the node
     guard: str = "none"  # not an attribute of the node
     guardWidth: float = 1.0  # not an attribute of the node
     patience: int = 50  # epochs without a better validation loss until the last phase; not an attribute of the node
@@ -56,6 +57,8 @@ MEANINGS = {
     "linearPath": "a straight line from the controls to the outputs beside the hidden layers, learned with them",
     "localNeurons": "three of four neurons of the first layer see only joints and sliders that move the same vertices",
     "principalShapesHalf": "keep principal shapes in half precision: half the size, and off by what is then said",
+    "principalShapesBudget": "keep principal shapes as coarse, and as few, as an error of so many mm in the mean "
+                             "allows, on the training rows; 0 keeps them as they are",
     "guard": "what becomes of controls beyond the ranges of the training rows, one of " + ", ".join(GUARDS),
     "guardWidth": "of --guard fade: how far beyond, in parts of a control's range, the outputs are 0",
     "preloadData": "hold the deltas in memory; the model is the same without",
@@ -66,7 +69,7 @@ LIMITS: dict[str, tuple[float, float]] = {
     "batchSize": (1, 100000), "epochs": (1, 100000), "learningRate": (0, 1), "validationRatio": (0, 0.99),
     "hiddenLayerCount": (1, 100), "neuronsPerLayer": (1, 100000), "dropoutRatio": (0, 1),
     "principalShapesLimit": (1, 500), "principalShapesAccuracy": (0, 1), "patience": (1, 100000),
-    "guardWidth": (0.001, 1000),
+    "guardWidth": (0.001, 1000), "principalShapesBudget": (0, 1000),
 }
 KINDS: dict[str, type] = {field.name: field.type for field in fields(Settings)}
 WORDS = {bool: "true or false", int: "a whole number", float: "a number", str: "a text"}

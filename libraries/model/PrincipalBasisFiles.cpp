@@ -2,10 +2,13 @@
 #include "nw_model/PrincipalBasisFiles.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
+#include <cstdlib>
 #include <fstream>
 #include <optional>
 #include <stdexcept>
+#include <utility>
 #include <vector>
 
 #include "json.h"
@@ -57,21 +60,37 @@ std::string sumIn(const storage::NpzFile& archive) {
     return text;
 }
 
-/// How the numbers of an archive lie in it.
-struct Layout {
+/// Numbers of some shapes, as they lie in an archive: none of them read.
+struct Numbers {
+    storage::NpzArray array;
     Counts counts;
-    bool hasHalves = false;
 };
 
-Layout layoutOf(const storage::NpzArray& shapes) {
-    const storage::NpyArray& head = shapes.head();
-    const bool hasHalves = head.descr == "<f2";
-    if ((head.descr != "<f4" && !hasHalves) || head.shape.size() != 3 || head.shape.back() != 3)
-        throw std::runtime_error("its shapes are '" + head.descr + "' " + storage::npyShapeText(head.shape) +
-                                 ", where '<f4' or '<f2' [vertices, shapes, 3] are to be");
-    shapes.requireSize(hasHalves ? sizeof(std::uint16_t) : sizeof(float));
-    return {{head.shape[1], head.shape[0]}, hasHalves};
+/// `kinds` the descr that it may have, in quotation marks.
+Numbers numbersIn(const storage::NpzFile& archive, const std::string& name, const std::string& kinds) {
+    storage::NpzArray array = archive.array(name);
+    const storage::NpyArray& head = array.head();
+    if (kinds.find("'" + head.descr + "'") == std::string::npos || head.shape.size() != 3 || head.shape.back() != 3)
+        throw std::runtime_error("its " + name + " are '" + head.descr + "' " + storage::npyShapeText(head.shape) +
+                                 ", where " + kinds + " [vertices, shapes, 3] are to be");
+    array.requireSize(static_cast<std::size_t>(head.descr.back() - '0'));
+    const Counts counts{head.shape[1], head.shape[0]};
+    return {std::move(array), counts};
 }
+
+/// Shapes of whole numbers: first those of two bytes a number.
+struct WholeNumbers {
+    explicit WholeNumbers(const storage::NpzFile& archive)
+        : large(numbersIn(archive, "shapes_int16", "'<i2'"))
+        , small(numbersIn(archive, "shapes_int8", "'|i1'")) {
+        if (large.counts.vertices != small.counts.vertices)
+            throw std::runtime_error("its shapes_int16 have " + std::to_string(large.counts.vertices) +
+                                     " vertices, and its shapes_int8 " + std::to_string(small.counts.vertices));
+    }
+    Counts counts() const { return {large.counts.shapes + small.counts.shapes, small.counts.vertices}; }
+
+    Numbers large, small;
+};
 
 std::vector<float> scalesIn(const storage::NpzFile& archive, std::uint64_t shapeCount) {
     storage::NpzArray array = archive.array("scales");
@@ -100,9 +119,10 @@ std::optional<std::size_t> firstNotFinite(std::span<const std::uint16_t> halves)
     return bad == halves.end() ? std::nullopt : std::optional<std::size_t>(bad - halves.begin());
 }
 
-/// `counts` those of the array, whose size is that of the file.
-template <class Number>
-void passOn(PrincipalShapesSink& sink, storage::NpzArray& shapes, const Counts& counts) {
+/// Passes on what `next` fills a block of whole vertices with.
+///   counts  those of the numbers, of which there are as many as the file says that holds them; no shape, no block
+template <class Number, class Next>
+void passOn(PrincipalShapesSink& sink, const Counts& counts, Next next) {
     constexpr std::size_t blockBytes = 1U << 18U; // stays in the second cache until it is passed on
     const std::size_t perVertex = 3 * static_cast<std::size_t>(counts.shapes);
     const std::size_t perBlock = std::max<std::size_t>(blockBytes / sizeof(Number) / perVertex, 1);
@@ -110,39 +130,100 @@ void passOn(PrincipalShapesSink& sink, storage::NpzArray& shapes, const Counts& 
     for (std::uint64_t vertex = 0; vertex < counts.vertices; vertex += perBlock) {
         const auto values =
             std::span(block).first(perVertex * std::min<std::uint64_t>(perBlock, counts.vertices - vertex));
-        shapes.read(std::as_writable_bytes(values));
-        if (const auto bad = firstNotFinite(values))
+        next(values);
+        if (const auto bad = firstNotFinite(std::span<const Number>(values)))
             throw std::runtime_error("its shapes have a number that is not finite, of vertex " +
                                      std::to_string(vertex + *bad / perVertex));
         sink.append(std::span<const Number>(values));
     }
-    shapes.finish();
 }
 
-/// Throws, with the reason, when the archive is of no use.
-Counts readArchive(const fs::path& archivePath, const fs::path& jsonPath, PrincipalShapesSink& sink) {
+template <class Number>
+void passOn(PrincipalShapesSink& sink, Numbers& numbers) {
+    passOn<Number>(sink, numbers.counts,
+                   [&](std::span<Number> values) { numbers.array.read(std::as_writable_bytes(values)); });
+    numbers.array.finish();
+}
+
+/// The half (IEEE 754 binary16) that a whole number is. Throws when it is none.
+std::uint16_t halfOf(int number) {
+    constexpr unsigned fractionBits = 10, bias = 15;
+    const unsigned magnitude = static_cast<unsigned>(std::abs(number)), sign = number < 0 ? 0x8000U : 0U;
+    if (magnitude == 0)
+        return 0;
+    const unsigned exponent = static_cast<unsigned>(std::bit_width(magnitude)) - 1U;
+    const unsigned fraction = magnitude << fractionBits >> exponent; // with the leading bit
+    if (fraction << exponent >> fractionBits != magnitude)
+        throw std::runtime_error("its shapes_int16 have a " + std::to_string(number) +
+                                 ", which has more than eleven significant bits");
+    return static_cast<std::uint16_t>(sign | (((exponent + bias - 1U) << fractionBits) + fraction));
+}
+
+/// Reads numbers of vertices [n][shapes][3] and puts them as halves into `out` [n][stride], from `start` of each on.
+template <class Whole>
+void readHalves(Numbers& numbers, std::vector<Whole>& block, std::span<std::uint16_t> out, std::size_t start,
+                std::size_t stride) {
+    const std::size_t perVertex = 3 * static_cast<std::size_t>(numbers.counts.shapes);
+    block.resize(out.size() / stride * perVertex);
+    numbers.array.read(std::as_writable_bytes(std::span(block)));
+    const Whole* next = block.data();
+    for (std::size_t vertex = start; vertex < out.size(); vertex += stride)
+        for (std::size_t i = 0; i < perVertex; ++i)
+            out[vertex + i] = halfOf(*next++);
+}
+
+void passOn(PrincipalShapesSink& sink, WholeNumbers& numbers) {
+    const std::size_t inLarge = 3 * static_cast<std::size_t>(numbers.large.counts.shapes);
+    const std::size_t perVertex = inLarge + 3 * static_cast<std::size_t>(numbers.small.counts.shapes);
+    std::vector<std::int16_t> large;
+    std::vector<std::int8_t> small;
+    passOn<std::uint16_t>(sink, numbers.counts(), [&](std::span<std::uint16_t> halves) {
+        readHalves(numbers.large, large, halves, 0, perVertex);
+        readHalves(numbers.small, small, halves, inLarge, perVertex);
+    });
+    numbers.large.array.finish();
+    numbers.small.array.finish();
+}
+
+/// Throws unless the JSON beside the archive is that of its sum, and begins with its counts.
+void requireJson(const fs::path& path, const std::string& sum, const Counts& counts) {
     constexpr std::size_t headSize = 4096;
-    const storage::NpzFile archive(archivePath);
-    const std::string wanted = sumIn(archive);
-    storage::NpzArray shapes = archive.array("shapes");
-    const auto [counts, hasHalves] = layoutOf(shapes);
-    const storage::FileSum found = storage::sumOfFile(jsonPath, principalShapesFileLimit, headSize);
-    if (found.digits != wanted)
+    const storage::FileSum found = storage::sumOfFile(path, principalShapesFileLimit, headSize);
+    if (found.digits != sum)
         throw std::runtime_error("it was made of another principal_shapes.json than the one that is there");
     const Counts told = countsOf(found.head);
     if (told.shapes == 0 || told.vertices == 0)
         throw std::runtime_error("principal_shapes.json does not begin with principalShapeCount and "
                                  "principalVertCount, by which it would be checked");
+    if (counts == told && 6 * counts.shapes * counts.vertices > fs::file_size(path)) // "0," and the like
+        throw std::runtime_error("principal_shapes.json is too short for so many numbers");
     if (counts != told)
         throw std::runtime_error("it has " + std::to_string(counts.shapes) + " shapes of " +
                                  std::to_string(counts.vertices) + " vertices, and principal_shapes.json begins with " +
                                  std::to_string(told.shapes) + " of " + std::to_string(told.vertices));
-    const std::vector<float> scales = hasHalves ? scalesIn(archive, counts.shapes) : std::vector<float>();
-    sink.begin(counts.shapes, counts.vertices, scales);
+}
+
+/// Throws, with the reason, when the archive is of no use.
+Counts readArchive(const fs::path& archivePath, const fs::path& jsonPath, PrincipalShapesSink& sink) {
+    const storage::NpzFile archive(archivePath);
+    const std::string sum = sumIn(archive);
+    if (!archive.contains("shapes") && archive.contains("shapes_int8")) {
+        WholeNumbers numbers(archive);
+        const Counts counts = numbers.counts();
+        requireJson(jsonPath, sum, counts);
+        sink.begin(counts.shapes, counts.vertices, scalesIn(archive, counts.shapes));
+        passOn(sink, numbers);
+        return counts;
+    }
+    Numbers numbers = numbersIn(archive, "shapes", "'<f4' or '<f2'");
+    const Counts counts = numbers.counts;
+    const bool hasHalves = numbers.array.head().descr == "<f2";
+    requireJson(jsonPath, sum, counts);
+    sink.begin(counts.shapes, counts.vertices, hasHalves ? scalesIn(archive, counts.shapes) : std::vector<float>());
     if (hasHalves)
-        passOn<std::uint16_t>(sink, shapes, counts);
+        passOn<std::uint16_t>(sink, numbers);
     else
-        passOn<float>(sink, shapes, counts);
+        passOn<float>(sink, numbers);
     return counts;
 }
 

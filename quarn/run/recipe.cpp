@@ -67,13 +67,13 @@ private:
 // knows then that it does not either; others need --allow-commands.
 const std::set<std::string> harmless = {
     // clang-format off
-    "--activation", "--align", "--animation", "--anyway", "--axes", "--batch-size", "--checkpoint-every", "--controls",
-    "--delta-mode", "--device", "--direct", "--dropout", "--epochs", "--fps", "--frame-offset", "--frames", "--guard",
-    "--guard-width", "--half-shapes", "--hidden-layers", "--learning-rate", "--limits-from", "--limits-margin",
-    "--linear-path", "--local-neurons", "--meters-per-unit", "--neurons", "--no-animation", "--no-preload", "--order",
-    "--patience", "--preload", "--principal-accuracy", "--principal-limit", "--principal-shapes", "--range",
-    "--rest-frame", "--scale", "--seed", "--size", "--smoothing", "--start", "--start-frame", "--threads",
-    "--tolerance", "--up", "--validation-ratio", "--view", "--with-roots",
+    "--activation", "--align", "--animation", "--anyway", "--axes", "--basis-budget", "--batch-size",
+    "--checkpoint-every", "--controls", "--delta-mode", "--device", "--direct", "--dropout", "--epochs", "--fps",
+    "--frame-offset", "--frames", "--guard", "--guard-width", "--half-shapes", "--hidden-layers", "--learning-rate",
+    "--limits-from", "--limits-margin", "--linear-path", "--local-neurons", "--meters-per-unit", "--neurons",
+    "--no-animation", "--no-preload", "--order", "--patience", "--preload", "--principal-accuracy", "--principal-limit",
+    "--principal-shapes", "--range", "--rest-frame", "--scale", "--seed", "--size", "--smoothing", "--start",
+    "--start-frame", "--threads", "--tolerance", "--up", "--validation-ratio", "--view", "--with-roots",
     // clang-format on
 };
 

@@ -246,7 +246,8 @@ class CommandTest(unittest.TestCase):
             self.skipTest("the quarn of this build cannot run models")
         for more in (("--activation", "Sigmoid"), ("--activation", "Tanh"), ("--activation", "ReLU"),
                      ("--activation", "Linear"), ("--activation", "SiLU", "--linear-path", "--guard", "fade"),
-                     ("--principal-shapes",), ("--principal-shapes", "--half-shapes")):
+                     ("--principal-shapes",), ("--principal-shapes", "--half-shapes"),
+                     ("--principal-shapes", "--basis-budget", "2")):
             out, _ = self.run_trainer("train", "data", "-o", "m/arm", "--quarn", quarn, "--json", *more)
             self.assertTrue(json.loads(out)["verifiedWithQuarn"])
         found = json.loads(subprocess.run([quarn, "info", self.place / "m/arm.nwrp", "--json"], capture_output=True,

@@ -33,11 +33,14 @@ struct PrincipalShapesAnswer {
 
 /// Reads the basis of principal shapes of a model, "principal_shapes.json", or the same numbers from the archive
 /// "principal_shapes.npz" beside it, which takes a tenth of the time, and a block of memory beside what the
-/// sink takes. The archive is one of NumPy, stored, with
+/// sink takes. The archive is one of NumPy, stored or compressed, with
 ///   "json_xxh3_128"  '|S32' []                     XXH3-128 of all bytes of the JSON, as hexadecimal digits
 ///   "shapes"         '<f4' [vertices, shapes, 3]   the numbers that the JSON gives, to the bit
 /// or, of a model in half precision, with "shapes" as '<f2' of the same shape, and
 ///   "scales"         '<f4' [shapes]                by which they are multiplied to give those numbers
+/// or, of a model with a budget, with "scales" and, in the place of "shapes", whole numbers that become such halves,
+///   "shapes_int16"   '<i2' [vertices, n, 3]        of the first n shapes, none of more than eleven significant bits
+///   "shapes_int8"    '|i1' [vertices, m, 3]        of the others
 /// It counts while it is sound, finite, of the JSON that is there, and of the two counts that the JSON begins with;
 /// else the JSON is read as readPrincipalShapesFile() does, with its messages.
 ///

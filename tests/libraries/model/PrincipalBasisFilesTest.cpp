@@ -128,6 +128,22 @@ std::string bytesOf(const std::vector<Number>& numbers) {
     return {reinterpret_cast<const char*>(numbers.data()), numbers.size() * sizeof(Number)};
 }
 
+/// However an archive is damaged.
+void expectSameBits(const Model& model, const std::string& sound) {
+    std::size_t refused = 0;
+    for (std::size_t place = 0; place < 2 * sound.size(); place += place < sound.size() ? 5U : 1U) {
+        std::string bytes = sound.substr(0, place); // first all that is cut short, then a changed byte
+        if (place >= sound.size())
+            (bytes = sound)[place - sound.size()] ^= 0x11;
+        model.folder.write("principal_shapes.npz", bytes);
+        const Reading reading = read(model.folder.path());
+        ASSERT_TRUE(reading.ok && reading.bits == model.bits()) << "at " << place;
+        ASSERT_EQ(reading.answer.isFromArchive, reading.answer.whyNotArchive.empty()) << "at " << place;
+        refused += reading.answer.isFromArchive ? 0 : 1;
+    }
+    EXPECT_GT(refused, sound.size() / 2) << "all but what an archive says twice, or of its time";
+}
+
 } // namespace
 
 TEST(PrincipalBasisFiles, BothWaysGiveTheSameBits) {
@@ -178,21 +194,65 @@ TEST(PrincipalBasisFiles, HalvesAreTheNumbersOfTheText) {
     EXPECT_THAT(reading(halves, scales).whyNotArchive, HasSubstr("not finite, of vertex 6000"));
 }
 
-TEST(PrincipalBasisFiles, NoDamageOfTheArchiveChangesABit) {
-    const Model model(2, 1);
-    const std::string sound = model.archive();
-    std::size_t refused = 0;
-    for (std::size_t place = 0; place < 2 * sound.size(); place += place < sound.size() ? 5U : 1U) {
-        std::string bytes = sound.substr(0, place); // first all that is cut short, then a changed byte
-        if (place >= sound.size())
-            (bytes = sound)[place - sound.size()] ^= 0x11;
-        model.folder.write("principal_shapes.npz", bytes);
-        const Reading reading = read(model.folder.path());
-        ASSERT_TRUE(reading.ok && reading.bits == model.bits()) << "at " << place;
-        ASSERT_EQ(reading.answer.isFromArchive, reading.answer.whyNotArchive.empty()) << "at " << place;
-        refused += reading.answer.isFromArchive ? 0 : 1;
+TEST(PrincipalBasisFiles, WholeNumbersAreTheNumbersOfTheText) {
+    Model model(7, 6500);
+    std::mt19937 random(3);
+    const std::vector<float> scales{1, 0.125F, 3e30F, 1e-30F, 0.3F, 65536, 7};
+    for (const std::uint64_t largeCount : {0U, 3U, 7U}) {
+        std::vector<std::int16_t> large;
+        std::string small;
+        for (std::size_t i = 0; i < model.values.size(); ++i) {
+            int number = static_cast<std::int8_t>(random());
+            if (i / 3 % 7 < largeCount) {
+                number = (static_cast<int>(random() % 4097) - 2048) * (1 << random() % 4);
+                large.push_back(static_cast<std::int16_t>(number));
+            } else {
+                small.push_back(static_cast<char>(number));
+            }
+            model.values[i] = scales[i / 3 % 7] * static_cast<float>(number);
+        }
+        model.writeText();
+        for (const bool isDeflated : {false, true}) {
+            SCOPED_TRACE(testing::Message() << largeCount << " large ones, deflated: " << isDeflated);
+            model.folder.write("principal_shapes.npz",
+                               npzBytes({{"json_xxh3_128", npyBytes("|S32", {}, model.digits())},
+                                         {"shapes_int16", npyBytes("<i2", {6500, largeCount, 3}, bytesOf(large))},
+                                         {"shapes_int8", npyBytes("|i1", {6500, 7 - largeCount, 3}, small)},
+                                         {"scales", npyBytes("<f4", {7}, bytesOf(scales))}},
+                                        isDeflated));
+            const Reading reading = read(model.folder.path());
+            EXPECT_EQ(reading.answer.whyNotArchive, "");
+            EXPECT_TRUE(reading.answer.isFromArchive && reading.bits == model.bits());
+        }
     }
-    EXPECT_GT(refused, sound.size() / 2) << "all but what an archive says twice, or of its time";
+}
+
+/// A few bytes of an archive can be a thousand times as many numbers, a text cannot.
+TEST(PrincipalBasisFiles, AnArchiveHasNoMoreNumbersThanTheTextHasRoomFor) {
+    const TestFolder folder;
+    const auto json = folder.write("principal_shapes.json",
+                                   R"({"principalShapeCount": 9, "principalVertCount": 999, "principalShapes": []})");
+    folder.write("principal_shapes.npz",
+                 npzBytes({{"json_xxh3_128", npyBytes("|S32", {}, storage::sumOfFile(json, UINT64_MAX, 0).digits)},
+                           {"shapes", npyBytes("<f4", {999, 9, 3}, std::string(std::size_t{999} * 9 * 12, '\0'))}},
+                          true));
+    const Reading reading = read(folder.path());
+    EXPECT_FALSE(reading.ok);
+    EXPECT_THAT(reading.answer.whyNotArchive, HasSubstr("principal_shapes.json is too short for so many numbers"));
+}
+
+TEST(PrincipalBasisFiles, NoDamageOfTheArchiveChangesABit) {
+    Model model(2, 1);
+    model.values = {1, 2, 3, -4, 5, 6};
+    model.writeText();
+    const std::string floats = model.archive();
+    const std::string wholes = npzBytes({{"json_xxh3_128", npyBytes("|S32", {}, model.digits())},
+                                         {"shapes_int16", npyBytes("<i2", {1, 1, 3}, {"\1\0\2\0\3\0", 6})},
+                                         {"shapes_int8", npyBytes("|i1", {1, 1, 3}, "\xFC\5\6")},
+                                         {"scales", npyBytes("<f4", {2}, bytesOf(std::vector<float>{1, 1}))}},
+                                        true);
+    for (const std::string& sound : {floats, wholes})
+        expectSameBits(model, sound);
 }
 
 TEST(PrincipalBasisFiles, WhatIsWrongWithTheArchiveIsSaid) {
@@ -205,10 +265,24 @@ TEST(PrincipalBasisFiles, WhatIsWrongWithTheArchiveIsSaid) {
     const auto shapes = [&](const std::vector<std::uint64_t>& shape) { return npyBytes("<f4", shape, numbers); };
     std::vector<float> infinite = model.values;
     infinite[20] = -HUGE_VALF;
+    const auto wholes = [&](const std::vector<std::uint64_t>& largeShape, const std::vector<std::uint64_t>& smallShape,
+                            std::int16_t first = 1) {
+        std::vector<std::int16_t> large(largeShape[0] * largeShape[1] * 3);
+        if (!large.empty())
+            large.back() = first;
+        return npzBytes(
+            {{"json_xxh3_128", text(digits)},
+             {"shapes_int16", npyBytes("<i2", largeShape, bytesOf(large))},
+             {"shapes_int8", npyBytes("|i1", smallShape, std::string(smallShape[0] * smallShape[1] * 3, 1))},
+             {"scales", npyBytes("<f4", {3}, bytesOf(std::vector<float>(3, 1)))}});
+    };
     std::string fortran = shapes({4, 3, 3});
     fortran.replace(fortran.find("False"), 5, "True ");
     std::string compressed = model.archive();
     compressed[compressed.rfind("PK\1\2") + 10] = 8; // shapes: the method in the directory
+    std::string endless = compressed;
+    for (unsigned i = 0; i < 4; ++i)
+        endless[endless.rfind("PK\1\2") + 24 + i] = static_cast<char>(1000000 >> 8 * i);
     const std::pair<std::string, std::string> rows[] = {
         {"", "it is no archive of NumPy, or cut short"},
         {"PK no", "it is no archive of NumPy, or cut short"},
@@ -216,7 +290,15 @@ TEST(PrincipalBasisFiles, WhatIsWrongWithTheArchiveIsSaid) {
         {npzBytes({{"json_xxh3_128", text(digits)}}), "it has no array 'shapes'"},
         {npzBytes({{"json_xxh3_128", text(digits)}, {"shapes", shapes({4, 3, 3})}, {"shapes", shapes({4, 3, 3})}}),
          "2 members shapes.npy"},
-        {compressed, "its arrays are compressed"},
+        {compressed, "its array cannot be unpacked"},
+        {endless, "bytes are to unpack to 1000000"},
+        {npzBytes({{"json_xxh3_128", text(digits)}, {"shapes_int8", npyBytes("|i1", {4, 3, 3}, numbers.substr(108))}}),
+         "it has no array 'shapes_int16'"},
+        {npzBytes({{"json_xxh3_128", text(digits)}, {"shapes_int16", npyBytes("<i2", {4, 3, 3}, numbers.substr(72))}}),
+         "it has no array 'shapes'"},
+        {wholes({4, 1, 3}, {3, 2, 3}), "its shapes_int16 have 4 vertices, and its shapes_int8 3"},
+        {wholes({4, 1, 3}, {4, 1, 3}), "2 shapes of 4 vertices, and principal_shapes.json begins with 3 of 4"},
+        {wholes({4, 1, 3}, {4, 2, 3}, 4097), "shapes_int16 have a 4097, which has more than eleven significant bits"},
         {with(npyBytes("|S31", {}, digits.substr(1)), shapes({4, 3, 3})), "json_xxh3_128 is no text of 32 digits"},
         {with(npyBytes("|S32", {2}, digits + digits), shapes({4, 3, 3})), "json_xxh3_128 is no text of 32 digits"},
         {with(text("0" + digits.substr(1)), shapes({4, 3, 3})), "made of another principal_shapes.json"},
