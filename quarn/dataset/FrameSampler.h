@@ -2,6 +2,7 @@
 // The deformer in export mode, and what it gives frame by frame.
 #pragma once
 
+#include "quarn/dataset/DeltaKind.h"
 #include "quarn/scene/ControlReader.h"
 #include "quarn/scene/Warp.h"
 
@@ -15,13 +16,6 @@ class Session;
 }
 
 namespace quarn {
-
-/// Which of the training deltas are taken, as export[i] says.
-struct DeltaKind {
-    int mode = 1; ///< 0 Offset, 1 Surface
-    int smoothingIterations = 0;
-    std::string code() const { return mode == 0 ? "dbp" : "dos"; } ///< of the command -vertexDeltas
-};
 
 /// Steps a scene through frames and takes control values and training deltas of one geometry. The geometry is in export
 /// mode as long as this lives. One frame is held. Errors are std::runtime_error with a sentence that begins with the

@@ -31,6 +31,7 @@ void printJson(const std::vector<ExportAnswer>& answers) {
         FitContext context;
         context.metersPerUnit = answer.metersPerUnit;
         writeFit(writer, answer.fit, context, false);
+        writeChoice(writer, answer.choice, answer.metersPerUnit);
         writer.EndObject();
     }
     writer.EndArray();
@@ -39,6 +40,8 @@ void printJson(const std::vector<ExportAnswer>& answers) {
 
 void printText(const std::vector<ExportAnswer>& answers) {
     for (const ExportAnswer& answer : answers) {
+        if (answer.choice)
+            std::cout << choiceText(*answer.choice, answer.geometry, answer.metersPerUnit);
         std::cout << answer.geometry << ": " << answer.rows << " rows of " << answer.controls << " controls and "
                   << answer.vertices << " vertices, " << answer.bytes << " bytes, in " << answer.folder.string()
                   << '\n';
@@ -94,9 +97,21 @@ void addExportCommand(CLI::App& app) {
         ->type_name("INDEX|NAME");
     command->add_option("--frames", options->frames, "[exportStartFrame to exportEndFrame of the deformer]")
         ->type_name("A-B[xS]");
-    command->add_flag("--controls-only", options->controlsOnly,
-                      "No deltas: controls.npy, frames.npy and the names, before there are targets "
-                      "[trainingDataRoot/DEFORMER.controls]");
+    CLI::Option* smoothing =
+        command
+            ->add_option("--smoothing", options->smoothing,
+                         "auto: compare kinds of deltas on the frames, and take the best [deltaMode and "
+                         "smoothingIterations of export[i]]")
+            ->type_name("auto")
+            ->check(CLI::IsMember({"auto"}));
+    command->add_option("--like", options->like, "Deltas of the same kind as those of this data set")
+        ->type_name("FOLDER")
+        ->excludes(smoothing);
+    command
+        ->add_flag("--controls-only", options->controlsOnly,
+                   "No deltas: controls.npy, frames.npy and the names, before there are targets "
+                   "[trainingDataRoot/DEFORMER.controls]")
+        ->excludes(smoothing);
     command->add_flag("--anyway", options->anyway, "Export a target that does not fit the skin as well");
     command->add_flag("--overwrite", options->overwrite, "Replace another data set, or give up a begun one");
     addConsoleOptions(*command, options->console, true);

@@ -7,6 +7,7 @@
 #include "quarn/dataset/drawnFrames.h"
 #include "quarn/dataset/exportFrames.h"
 #include "quarn/dataset/sceneSetup.h"
+#include "quarn/dataset/settledKind.h"
 #include "quarn/scene/meshSum.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
@@ -124,6 +125,8 @@ public:
         if (folder_.isDone(setup_)) // by now, by another process
             return alreadyDone();
         compare();
+        if (options_.like.empty() && options_.smoothing.empty())
+            warnOfJumps(session_.host(), warp_, geometry_, sampler_, frames_, options_.console);
         const std::size_t before = write();
         folder_.publish(lock);
         warnOfRepeats();
@@ -274,8 +277,12 @@ std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
         for (std::size_t i = 0; i < geometries.size(); ++i)
             options.console.note("exporting " + geometries[i].name + " to " + folders[i].string() +
                                  ", as the scene says");
-    for (std::size_t i = 0; i < geometries.size(); ++i)
+    for (std::size_t i = 0; i < geometries.size(); ++i) {
+        std::optional<KindChoice> choice =
+            settleKind(session.host(), warp, geometries[i], exportFrames(warp, options.frames), options);
         answers.push_back(GeometryExport(session, warp, geometries[i], folders[i], options).run());
+        answers.back().choice = std::move(choice);
+    }
     return answers;
 }
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "quarn/console/Console.h"
+#include "quarn/dataset/smoothingChoice.h"
 #include "quarn/fit/targetFit.h"
 #include "quarn/scene/SceneSession.h"
 
@@ -22,6 +23,8 @@ struct ExportOptions {
     std::string deformer;         ///< empty: the only one
     std::string geometry;         ///< index or name; empty: all of them that have a target
     std::string frames;           ///< as frameRange() reads them; empty: exportStartFrame to exportEndFrame
+    std::string smoothing;        ///< "auto": deltas are of the kind that a study speaks for; empty: as the scene says
+    std::filesystem::path like;   ///< a data set, of whose kind deltas are; empty: as the scene says
     bool overwrite = false;
     bool anyway = false; ///< a target that does not fit the skin is exported as well
     Console console;
@@ -39,6 +42,7 @@ struct ExportAnswer {
     std::size_t controls = 0;
     std::size_t vertices = 0;
     std::uintmax_t bytes = 0;
+    std::optional<KindChoice> choice = {}; ///< of the kind of deltas; none where nothing was compared
 };
 
 /// Opens the scene and writes a complete data set for each geometry; of several those without target are noted and left

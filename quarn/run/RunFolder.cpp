@@ -162,13 +162,16 @@ void RunFolder::perform(const Step& step) {
     }
 }
 
-// what a user has to know of a step that went well: its warnings, and how far targets are from the skin
+// what a user has to know of a step that went well: its warnings, the kind of deltas that it chose, and how far targets
+// are from the skin
 void RunFolder::tellOf(const Step& step) const {
     constexpr std::string_view mark = "warning: ";
     std::istringstream said(storage::readWholeFile(logOf(step), mostOfAnAnswer));
     for (std::string line; std::getline(said, line);)
         if (line.rfind(mark, 0) == 0)
             console_.warn(step.label() + ": " + line.substr(mark.size()));
+        else if (line.rfind("chosen: ", 0) == 0)
+            console_.note("  " + line);
     const RunFacts all = facts();
     const auto target = all.targets.find(step.answer.string());
     if (target != all.targets.end() && target->second.meanMm && target->second.largestMm)

@@ -47,6 +47,13 @@ Words withoutFlags(const Words& words, const Words& flags) {
     return kept;
 }
 
+// whether one of these flags is among the words, as "--flag" or "--flag=VALUE"
+bool hasFlag(const Words& words, const Words& flags) {
+    return std::any_of(words.begin(), words.end(), [&](const std::string& word) {
+        return std::find(flags.begin(), flags.end(), word.substr(0, word.find('='))) != flags.end();
+    });
+}
+
 // of one mesh: whole paths by its name, or one without a name that is for the only mesh there is
 std::map<std::string, fs::path> filesByMesh(const Words& targets, const CharacterFacts& character) {
     Words names;
@@ -405,6 +412,18 @@ private:
         report();
     }
 
+    // what nobody has said is measured, on poses that are trained; frames held out get the same
+    void addKind(Step& step, const MeshFacts& mesh) const {
+        if (hasFlag(settings_.importOptions, {"--delta-mode", "--smoothing"}) ||
+            hasFlag(settings_.exportOptions, {"--smoothing", "--like"}))
+            return;
+        if (step.name != "held-out")
+            return append(step.words, {"--smoothing", "auto"});
+        const std::string set = dataOf(mesh) + "/set";
+        append(step.words, {"--like", set});
+        step.inputs.emplace_back(set + "/dataset.json");
+    }
+
     static std::vector<fs::path> setFiles(const std::string& folder) {
         return {folder + "/dataset.json", folder + "/controls.npy", folder + "/deltas.npy", folder + "/frames.npy",
                 folder + "/skin.npy"};
@@ -419,6 +438,7 @@ private:
                 {"export", file, "--geometry", mesh.name, "--frames", framesText(frames), "-o", folder,
                  "--overwrite"}, // the ledger knows whether it is to be made again; what was begun is gone on with
                 {file, targetOf(scene, mesh)->cache}, setFiles(folder));
+        addKind(step, mesh);
         if (settings_.anyway)
             step.words.emplace_back("--anyway");
         append(step.words, settings_.exportOptions);

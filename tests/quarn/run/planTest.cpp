@@ -172,6 +172,31 @@ TEST(Plan, RoundsTrainOnAllAndAskForWhatIsNew) {
     EXPECT_EQ(seeds, (std::set<std::string>{"2", "3"}));
 }
 
+// by measurement where nobody has said one, and always the same of what is trained and what is held out
+TEST(Plan, ChoosesAKindOfDeltasOnce) {
+    const Kind& kind = kinds().back();
+    for (const auto& [imports, exporting, isChosen] : {std::tuple<Words, Words, bool>{{"--with-roots"}, {}, true},
+                                                       {{"--delta-mode", "offset"}, {}, false},
+                                                       {{"--smoothing=5"}, {}, false},
+                                                       {{}, {"--like", "other"}, false}}) {
+        RunSettings settings = settingsWith(kind.change);
+        settings.importOptions = imports;
+        settings.exportOptions = exporting;
+        for (const Step& step : planOf(settings, factsOf(kind.meshes))) {
+            const auto has = [&, &words = step.words](const std::string& word) {
+                return std::find(words.begin(), words.end(), word) != words.end();
+            };
+            const std::string set = "data/" + step.mesh + "/set";
+            EXPECT_EQ(has("auto"), isChosen && step.name == "export") << step.label();
+            const bool isLike = step.name == "held-out" && has("--like") && has(set);
+            EXPECT_EQ(isLike, isChosen && step.name == "held-out") << step.label();
+            if (isLike) {
+                EXPECT_THAT(step.inputs, Contains(set + "/dataset.json"));
+            }
+        }
+    }
+}
+
 TEST(Plan, NamesAMeshByItsPlaceInTheDeformer) {
     const Kind& kind = kinds().back(); // arm, behind eye
     Words words;
