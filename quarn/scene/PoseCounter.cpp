@@ -63,7 +63,7 @@ PoseCounts PoseCounter::counts() const {
         counts.controls.push_back(std::move(control));
     if (errors_.empty())
         return counts;
-    PoseCounts::Expected& expected = counts.expected.emplace();
+    ExpectedErrors& expected = counts.expected.emplace();
     expected.beyond = beyond_;
     for (const FrameError& error : errors_)
         expected.mean += error.millimetres / static_cast<double>(errors_.size());

@@ -28,18 +28,18 @@ struct FrameError {
     double millimetres = 0.0; ///< mean over the vertices
 };
 
+struct ExpectedErrors {
+    double mean = 0.0;             ///< over the frames, in mm
+    std::size_t beyond = 0;        ///< frames outside, or further from the trained poses than any that was measured
+    std::vector<FrameError> worst; ///< at most five, the worst first
+};
+
 struct PoseCounts {
     std::size_t frames = 0;
     std::size_t outside = 0;              ///< frames with a control that is
     double distance = 0.0;                ///< the largest ControlRanges::distance()
     std::vector<OutsideControl> controls; ///< those that are furthest out in units of their ranges first
-
-    struct Expected {
-        double mean = 0.0;             ///< over the frames, in mm
-        std::size_t beyond = 0;        ///< frames outside, or further from the trained poses than any that was measured
-        std::vector<FrameError> worst; ///< at most five, the worst first
-    };
-    std::optional<Expected> expected; ///< none without trained poses, or a curve of errors
+    std::optional<ExpectedErrors> expected; ///< none without trained poses, or a curve of errors
 };
 
 /// Is shown frame after frame. Thread: one at a time.

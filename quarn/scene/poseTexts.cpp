@@ -36,7 +36,7 @@ std::string outsideText(const PoseCounts& counts) {
     return text;
 }
 
-std::string expectedText(const PoseCounts::Expected& expected) {
+std::string expectedText(const ExpectedErrors& expected) {
     std::string text = "expected error, in the mean of a frame's vertices: " + roughText(expected.mean) + " mm; worst";
     for (const FrameError& error : expected.worst)
         text += (&error == expected.worst.data() ? " " : ", ") + roughText(error.millimetres) + " mm in frame " +
@@ -70,7 +70,7 @@ void writeControl(JsonWriter& json, const OutsideControl& control) {
     json.EndObject();
 }
 
-void writeExpected(JsonWriter& json, const PoseCounts::Expected& expected) {
+void writeExpected(JsonWriter& json, const ExpectedErrors& expected) {
     json.StartObject();
     number(json, "meanMm", expected.mean);
     writeCount(json, "framesBeyondMeasured", expected.beyond);
