@@ -125,11 +125,14 @@ void check(const RunSettings& settings) {
     requireOneOf("order", settings.order, {"scene", "file", "rest"});
     if (settings.scale && !(std::isfinite(*settings.scale) && *settings.scale > 0.0))
         throw UsageError("scale is " + numberText(*settings.scale) + ", not a number above 0");
-    const double rate = settings.activationRate.value_or(0.0);
-    if (!std::isfinite(rate) || rate < 0.0 || rate > 1.0)
-        throw UsageError("activation-rate is " + numberText(rate) + ", not a number from 0 to 1");
-    if (settings.from == "animation" && (settings.samples || settings.activationRate))
-        throw UsageError("samples and activation-rate are for poses from limits: from is \"animation\"");
+    for (const auto& [name, given] :
+         {std::pair("activation-rate", settings.activationRate), std::pair("limit-rate", settings.limitRate)}) {
+        const double rate = given.value_or(0.0);
+        if (!std::isfinite(rate) || rate < 0.0 || rate > 1.0)
+            throw UsageError(name + (" is " + numberText(rate)) + ", not a number from 0 to 1");
+    }
+    if (settings.from == "animation" && (settings.samples || settings.activationRate || settings.limitRate))
+        throw UsageError("samples, activation-rate and limit-rate are for poses from limits: from is \"animation\"");
     if (!settings.targets.empty() && !settings.targetCommand.empty())
         throw UsageError("targets come from --targets or from --target-command, not from both");
     if (!settings.motion.empty() && settings.heldOut)

@@ -13,6 +13,7 @@ namespace {
 
 namespace fs = std::filesystem;
 
+constexpr double goodLimitRate = 0.3;    // of active values, at one of their limits: docs/quality.md
 constexpr std::int64_t leastHeldOut = 3; // a second difference is the least that can be said of a motion
 
 std::string decimal(double value) {
@@ -220,7 +221,8 @@ private:
         if (!settings_.from.empty())
             append(step.words, {"--from", settings_.from});
         if (settings_.from != "animation")
-            append(step.words, {"--samples", std::to_string(count)});
+            append(step.words, {"--samples", std::to_string(count), "--limit-rate",
+                                decimal(settings_.limitRate.value_or(goodLimitRate))});
         if (settings_.activationRate)
             append(step.words, {"--activation-rate", decimal(*settings_.activationRate)});
         if (seed)

@@ -36,9 +36,9 @@ struct ExpectedErrors {
 
 struct PoseCounts {
     std::size_t frames = 0;
-    std::size_t outside = 0;              ///< frames with a control that is
-    double distance = 0.0;                ///< the largest ControlRanges::distance()
-    std::vector<OutsideControl> controls; ///< those that are furthest out in units of their ranges first
+    std::size_t outside = 0;                ///< frames with a control that is
+    double distance = 0.0;                  ///< the largest ControlRanges::distance()
+    std::vector<OutsideControl> controls;   ///< those that are furthest out in units of their ranges first
     std::optional<ExpectedErrors> expected; ///< none without trained poses, or a curve of errors
 };
 

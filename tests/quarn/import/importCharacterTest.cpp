@@ -102,9 +102,11 @@ TEST_F(ImportCharacter, AFolderWithTheSceneCanBeMoved) {
     EXPECT_EQ(numberOf(findPlug("character.framesPerSecond")), 10.0);
     EXPECT_THAT(readVertexMap("arm"), ElementsAre(0, 1, 2, 3, 1, 4, 5, 2)) << "and the digest is that of the map";
     EXPECT_EQ(numberOf(findPlug("warp.exportEndFrame")), 11.0) << "a second";
-    for (const auto& [attribute, value] : {std::pair("principalShapesLimit", 200.0), {"batchSize", 32.0},
+    for (const auto& [attribute, value] : {std::pair("principalShapesLimit", 200.0),
+                                           {"batchSize", 32.0},
                                            {"principalShapesAccuracy", static_cast<double>(0.99999F)},
-                                           {"learningRate", 0.003}, {"validationRatio", static_cast<double>(0.1F)}})
+                                           {"learningRate", 0.003},
+                                           {"validationRatio", static_cast<double>(0.1F)}})
         EXPECT_EQ(numberOf(findPlug(std::string("warp.train[0].") + attribute)), value) << attribute;
 
     // all of it in another folder, the pattern that stands for the maps of several meshes as well

@@ -277,6 +277,7 @@ TEST(Settings, ThatNoRunCanHaveAreRefusedWithTheirValue) {
         {[](RunSettings& s) { s.samples = 1; }, "samples is 1, not a whole number from 2"},
         {[](RunSettings& s) { s.heldOut = 2; }, "held-out is 2"},
         {[](RunSettings& s) { s.activationRate = 1.5; }, "activation-rate is 1.5"},
+        {[](RunSettings& s) { s.limitRate = -0.5; }, "limit-rate is -0.5"},
         {[](RunSettings& s) { s.order = "files"; }, "order is \"files\", not one of scene, file, rest"},
         {[](RunSettings& s) { s.scale = 0.0; }, "scale is 0, not a number above 0"},
         {[](RunSettings& s) { s.order = "rest", s.targetCommand = {"x"}; }, "are for --targets"},
