@@ -176,7 +176,7 @@ demo_row() {
   NW_PYTHON=$python "$QUARN" run build/deps/hand/left.glb -o "$data/$row" --until "$last" \
     --parents examples/hand/parents.json --limits examples/hand/limits.json \
     --import-option=--delta-mode --import-option="${row%_*}" --import-option=--smoothing --import-option="$smoothing" \
-    --samples "$demo_samples" --activation-rate "$activation_rate" --seed 1 --motion examples/hand/motion.json \
+    --samples "$demo_samples" --activation-rate "$activation_rate" --limit-rate 0.3 --seed 1 --motion examples/hand/motion.json \
     --epochs "$demo_epochs" "${kind[@]}" "$@"
 }
 

@@ -44,7 +44,7 @@ void visitSettings(const Visit& visit) {
           "Poses that follow these and are never trained, 3 or more [a tenth of the samples; none with --motion]");
     visit("from", &Settings::from, "limits|animation|both", "Where poses come from [limits]");
     visit("activation-rate", &Settings::activationRate, "R", "How likely a value leaves its default, 0 to 1");
-    visit("limit-rate", &Settings::limitRate, "R", "How likely such a value stands at one of its limits, 0 to 1 [0.3]");
+    visit("limit-rate", &Settings::limitRate, "R", "How likely such a value stands at one of its limits, 0 to 1 [0]");
     visit("seed", &Settings::seed, "S", "Of poses and training; another one gives others [1]");
     visit("refine-to", &Settings::refineTo, "N", "Poses in the end: those added stand where models disagree most");
     visit("refine-step", &Settings::refineStep, "N", "Poses added in a round [a third of those to add]");

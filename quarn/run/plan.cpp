@@ -13,7 +13,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-constexpr double goodLimitRate = 0.3;    // of active values, at one of their limits: docs/quality.md
 constexpr std::int64_t leastHeldOut = 3; // a second difference is the least that can be said of a motion
 
 std::string decimal(double value) {
@@ -221,10 +220,11 @@ private:
         if (!settings_.from.empty())
             append(step.words, {"--from", settings_.from});
         if (settings_.from != "animation")
-            append(step.words, {"--samples", std::to_string(count), "--limit-rate",
-                                decimal(settings_.limitRate.value_or(goodLimitRate))});
+            append(step.words, {"--samples", std::to_string(count)});
         if (settings_.activationRate)
             append(step.words, {"--activation-rate", decimal(*settings_.activationRate)});
+        if (settings_.limitRate)
+            append(step.words, {"--limit-rate", decimal(*settings_.limitRate)});
         if (seed)
             append(step.words, {"--seed", std::to_string(*seed)});
         append(step.words, settings_.poseOptions);

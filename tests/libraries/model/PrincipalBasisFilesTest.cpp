@@ -202,7 +202,7 @@ TEST(PrincipalBasisFiles, WholeNumbersAreTheNumbersOfTheText) {
         std::vector<std::int16_t> large;
         std::string small;
         for (std::size_t i = 0; i < model.values.size(); ++i) {
-            int number = static_cast<std::int8_t>(random());
+            int number = static_cast<int>(random() % 256) - 128;
             if (i / 3 % 7 < largeCount) {
                 number = (static_cast<int>(random() % 4097) - 2048) * (1 << random() % 4);
                 large.push_back(static_cast<std::int16_t>(number));

@@ -71,7 +71,8 @@ TEST(ControlFit, PredictsPlanesAndCurvesAndSurvivesStillControls) {
         return std::pair(3.0 + 20.0 * a - 0.01 * b, std::sin(4.0 * a) + 0.0001 * b * b);
     };
     for (int i = 0; i < 64; ++i) {
-        const float a = static_cast<float>(i % 8) / 7.0F, b = 100.0F * static_cast<float>(i / 8) / 7.0F;
+        const int row = i / 8;
+        const float a = static_cast<float>(i % 8) / 7.0F, b = 100.0F * static_cast<float>(row) / 7.0F;
         rows.push_back({a, 7.0F, b}); // the second never moves
         plane.push_back(valuesAt(a, b).first);
         curve.push_back(valuesAt(a, b).second);
@@ -134,8 +135,8 @@ connectAttr -force fold.outMesh warp.input[0].inputGeometry
         quill::IndexMapper map;
         map.setIdentity(vertexCount);
         const int before = quarn::wholeNumberOf(quarn::findPlug("swing.interpolation"));
-        const SmoothingStudy study = quarn::studySmoothing(session.host(), warp, warp.geometry(""), map,
-                                                           quarn::exportFrames(warp, ""), kinds, options().console);
+        SmoothingStudy study = quarn::studySmoothing(session.host(), warp, warp.geometry(""), map,
+                                                     quarn::exportFrames(warp, ""), kinds, options().console);
         EXPECT_EQ(quarn::wholeNumberOf(quarn::findPlug("swing.interpolation")), before);
         return study;
     }
@@ -184,7 +185,7 @@ TEST_F(SmoothingTest, CarriesDeltasAsTheDeformerDoes) {
             const quill::val3<float> delta = carriers.of(1)[k].deltaTo(target[k]);
             const quill::val3<float> placed = carriers.of(1)[k].place(delta);
             for (std::size_t axis = 0; axis < 3; ++axis) {
-                EXPECT_NEAR(delta[axis], sampler.deltas()[3 * vertices[k] + axis], 1e-5F);
+                EXPECT_NEAR(delta[axis], sampler.deltas()[std::size_t{3} * vertices[k] + axis], 1e-5F);
                 EXPECT_NEAR(placed[axis], target[k][axis], 1e-5F);
             }
         }

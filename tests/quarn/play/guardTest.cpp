@@ -51,7 +51,7 @@ protected:
         rig_->addGeometry(1, {.mesh = grid_, .modelName = "narrow", .modelOn = false});
         rig_->setModelRoot(folder_.path());
     }
-    ~Guard() override { OpenQuarn::setMessageSink({}); }
+    void TearDown() override { OpenQuarn::setMessageSink({}); }
 
     std::filesystem::path path(const std::string& model) const { return folder_.path() / (model + ".nwrp"); }
     AppliedModels models() const { return AppliedModels({rig_->output(0), rig_->output(1)}); }

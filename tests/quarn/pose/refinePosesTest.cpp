@@ -21,8 +21,6 @@ using quarn::ChosenPose;
 using quarn::ModelEnsemble;
 using quarn::ValueLimits;
 using stripScene::sampled;
-using ::testing::AllOf;
-using ::testing::Each;
 using ::testing::HasSubstr;
 
 // each chosen one has the largest product of those that were left, told by comparing all with all
@@ -213,11 +211,11 @@ TEST_F(RefinePosesTest, TheDisagreementIsThatOfTheDeltas) {
             spec.fullCount = spec.affectCount = static_cast<std::uint32_t>(vertices);
             spec.bias = offsets;
             std::for_each(spec.bias.begin(), spec.bias.end(), [&](float& value) { value *= factor; });
-            direct.push_back(path("direct" + std::to_string(factor)));
+            direct.emplace_back(path("direct" + std::to_string(factor)));
             writeModel(direct.back(), spec);
             spec.shapes = {offsets, std::vector<float>(3 * vertices, 7.0F)};
             spec.bias = {factor, 2.0F};
-            shaped.push_back(path("shaped" + std::to_string(factor)));
+            shaped.emplace_back(path("shaped" + std::to_string(factor)));
             writeModel(shaped.back(), spec);
         }
         const float control = 0.0F;
