@@ -14,7 +14,7 @@ usage: ./run demo [--all] [--output FOLDER] [--samples N] [--epochs N]
                     steps that would come out the same
   --samples N       training poses of the hand, 10 or more (default 3000); the arm, which has fewer joints, gets a fifth
                     of them, 40 at least
-  --epochs N        passes over them (default 250)
+  --epochs N        passes over them (default 150)
 
 The hand's report is report.html. The arm takes about a minute of the demo; its report is arm/report.html, and its
 picture, in which one sees what was learned, arm.png.
@@ -28,7 +28,7 @@ demo_number() {
 }
 
 demo_options() {
-  demo_out=demo-out demo_samples=3000 demo_epochs=250 demo_kinds=(principal)
+  demo_out=demo-out demo_samples=3000 demo_epochs=150 demo_kinds=(principal)
   while (($#)); do
     case $1 in
       -h | --help)
@@ -255,7 +255,7 @@ command_demo() {
   demo_pictures
   demo_arm
   # fewer poses or passes than these are for trying the commands: they cannot keep the limits
-  ((demo_samples >= 3000 && demo_epochs >= 250)) && judge=(--judge)
+  ((demo_samples >= 3000 && demo_epochs >= 150)) && judge=(--judge)
   local rows=("${demo_kinds[@]/#/surface_}" "${demo_kinds[@]/#/offset_}")
   say "the hand"
   "$python" examples/hand/report.py "$demo_out" "${rows[@]}" "${judge[@]}"
