@@ -174,14 +174,15 @@ def measured(dataset: Dataset, rows: np.ndarray, deltas_of: Callable[[np.ndarray
     """
     skin, base, basis, network = (Stage(dataset) for _ in range(4))
     if shapes is not None:
-        shapes = np.linalg.qr(shapes.T.astype(np.float64))[0].T.astype(np.float32)  # orthonormal rows
+        shapes = np.linalg.qr(shapes.T.astype(np.float64))[0].T  # orthonormal rows
     for part, deltas in dataset.blocks(rows):
         base.add(part, deltas)
         network.add(part, deltas_of(dataset.controls[part]) - deltas)
         if dataset.skin is not None:
             skin.distances.add(part, dataset.skin[part].astype(np.float64))
         if shapes is not None:
-            basis.add(part, deltas @ shapes.T @ shapes - deltas)  # nearest that the shapes can make
+            exact = deltas.astype(np.float64)
+            basis.add(part, exact @ shapes.T @ shapes - exact)  # nearest that the shapes can make
     if dataset.skin is None and dataset.description["deltaMode"] == 0:
         skin = base  # offsets of zero are the skin
     errors: dict[str, Any] = {

@@ -42,8 +42,7 @@ for number, row in enumerate(report["rows"]):
         for figure, value in (("mean", np.mean(errors)), ("p99", np.quantile(errors, 0.99)),
                               ("p9999", np.quantile(errors, 0.9999)), ("max", np.max(errors))):
             compared += 1
-            rounding = 1e-5 if stage == "basis" else 1e-6  # the trainer projects on shapes in single precision
-            if not abs(row[stage][f"{figure}_mm"] - value) <= rounding:
+            if not abs(row[stage][f"{figure}_mm"] - value) <= 1e-6:
                 sys.exit(f"{name}: {stage} {figure}: the report says {row[stage][f'{figure}_mm']}, the files {value}")
     apart = np.sqrt(np.sum(np.square((np.load(place["gpu"]) - on_cpu) * mm), axis=2)).max()
     if not abs(row["gpu"]["difference"]["max_mm"] - apart) <= 1e-6 or not apart < 1e-2:
