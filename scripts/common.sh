@@ -47,6 +47,8 @@ declare -A probe_of=(
   [llvm-14]=llvm-symbolizer-14
   [clang-format-14]=clang-format-14
   [clang-tidy-14]=clang-tidy-14
+  [pybind11-dev]=/usr/include/pybind11/pybind11.h
+  [python3-dev]=/usr/include/python3*/Python.h
   [python3-torch]=/usr/lib/python3/dist-packages/torch/__init__.py
   [python3-onnx]=/usr/lib/python3/dist-packages/onnx/__init__.py
   [python3-numpy]=/usr/lib/python3/dist-packages/numpy/__init__.py
@@ -73,7 +75,7 @@ declare -A probe_of=(
 # shellcheck disable=SC2034
 build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-dev libgtest-dev libgmock-dev libeigen3-dev
   libassimp-dev libmeshoptimizer-dev libpugixml-dev zlib1g-dev libxxhash-dev libembree-dev libstb-dev
-  ocl-icd-opencl-dev pocl-opencl-icd)
+  ocl-icd-opencl-dev pocl-opencl-icd pybind11-dev python3-dev)
 python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
   python3-xxhash python3-pil libopenblas0-pthread)
 # what a wheel of the trainer is made with, and installed in a place of its own

@@ -1,0 +1,6 @@
+# SPDX-License-Identifier: Apache-2.0
+"""Neural mesh deformation with NumPy in and out: the arithmetic is that of the plug-in, to the bit."""
+
+from ._core import version as __version__
+
+__all__ = ["__version__"]
