@@ -4,7 +4,7 @@ set(_nw_data_dir "${CMAKE_INSTALL_DATADIR}/neuralWarp")
 
 file(GLOB _trainer_sources CONFIGURE_DEPENDS trainer/*.py)
 install(FILES ${_trainer_sources} DESTINATION "${_nw_data_dir}/trainer")
-install(FILES pyproject.toml VERSION LICENSE DESTINATION "${_nw_data_dir}")
+install(FILES pyproject.toml setup.py VERSION LICENSE DESTINATION "${_nw_data_dir}")
 install(PROGRAMS scripts/neuralwarp-train DESTINATION "${CMAKE_INSTALL_BINDIR}")
 install(DIRECTORY examples/hand examples/arm examples/blender DESTINATION "${_nw_data_dir}/examples"
   PATTERN __pycache__ EXCLUDE)

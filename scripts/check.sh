@@ -52,7 +52,7 @@ check_python() {
   local python
   python=$(scripts/find_python.sh 2>/dev/null)
   say "python: types, style"
-  mypy --python-executable "$python" --cache-dir build/mypy && flake8 trainer examples tests host bench clients scripts/neuralwarp-train
+  mypy --python-executable "$python" --cache-dir build/mypy && flake8 trainer examples tests host bench clients scripts scripts/neuralwarp-train setup.py
 }
 
 check_tidy() {

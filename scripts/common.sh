@@ -68,6 +68,7 @@ declare -A probe_of=(
   [gdb]=gdb
   [dpkg-dev]=dpkg-source
   [file]=file # by which CPack sees what is a program
+  [patchelf]=patchelf # by which libraries of a wheel find each other
   [git]=git
 )
 
@@ -78,9 +79,9 @@ build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-d
   ocl-icd-opencl-dev pocl-opencl-icd pybind11-dev python3-dev)
 python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
   python3-xxhash python3-pil libopenblas0-pthread)
-# what a wheel of the trainer is made with, and installed in a place of its own
+# what a wheel is made with, and installed in a place of its own
 wheel_packages=(python3-setuptools python3-wheel python3-venv)
-package_packages=(dpkg-dev file)
+package_packages=(dpkg-dev file patchelf)
 # tools that tests go to and come back from; what misses them is skipped, except in continuous integration
 client_packages=(blender python3-numpy nodejs)
 check_packages=(git clang-format-14 clang-tidy-14 mypy flake8)

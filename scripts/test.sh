@@ -37,8 +37,8 @@ read_test_words() {
 }
 
 # needed_targets PRESET FOLDER: what Ninja has to build for the tests of a folder: its own programs, and what the
-# command lines of its tests name of the build tree, as CMake has written them down; everything for a test of the whole
-# tree
+# command lines of its tests name of the build tree, as CMake has written them down, of a folder that is built all of it;
+# everything for a test of the whole tree
 needed_targets() {
   local tree=$PWD/build/$1 place=$PWD/build/$1/tests/$2 paths
   paths=$(find "$place" -name CTestTestfile.cmake -exec grep -hE '^ *(add_test|set_tests_properties)\(' {} + |
@@ -49,7 +49,7 @@ needed_targets() {
   fi
   printf '%s\n' "tests/$2/all"
   # of these only what Ninja makes: a folder that a test works in is none of it
-  comm -12 <(sed "s,^$tree/,," <<<"$paths" | sort -u) <(ninja -C "$tree" -t targets all | sed 's/: [^:]*$//' | sort -u)
+  comm -12 <(sed "s,^$tree/,,; p; s,/*$,/all," <<<"$paths" | sort -u) <(ninja -C "$tree" -t targets all | sed 's/: [^:]*$//' | sort -u)
 }
 
 # test_the_folders PRESET: builds what the tests of `folders` need, no more, and runs them, with `ctest_words`

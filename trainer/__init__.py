@@ -13,4 +13,4 @@ from pathlib import Path
 os.environ.setdefault("ORT_DISABLE_TELEMETRY", "1")
 
 BESIDE = Path(__file__).resolve().parent.parent / "VERSION"  # in a checkout, and where the package has installed it
-__version__ = BESIDE.read_text().strip() if BESIDE.is_file() else metadata.version("neuralwarp-trainer")
+__version__ = BESIDE.read_text().strip() if BESIDE.is_file() else metadata.version("neuralwarp")
