@@ -3,7 +3,7 @@
 """pack_python.py PREFIX OUTPUT: from the tree that cmake --install made in PREFIX, a wheel and the add-on for Blender.
 
 Both carry every library that the module needs and that is not a part of the C or C++ runtime, beside it, each with its
-licence. The interpreter that runs this has to be of the version that the module was built for.
+licence (decision 0200). The interpreter that runs this has to be of the version that the module was built for.
 """
 
 import os

@@ -11,7 +11,7 @@ bad=0
 only_at() {
   local what=$1 pattern=$2 found
   shift 2
-  found=$(grep -rnE --include='*.cpp' --include='*.h' "$pattern" libraries host plugin quarn | sed 's|//.*||' |
+  found=$(grep -rnE --include='*.cpp' --include='*.h' "$pattern" libraries host plugin quarn clients | sed 's|//.*||' |
     grep -E "$pattern") || [[ -z $found ]]
   [[ $(cut -d: -f1 <<<"$found" | sort) == "$(printf '%s\n' "$@")" ]] && return
   printf '%s, which belongs into %s alone:\n%s\n' "$what" "$*" "$found"
@@ -20,7 +20,7 @@ only_at() {
 
 # "namespace::Type file" of each type that a file defines, those of unnamed namespaces aside
 types() {
-  find libraries host plugin quarn -name '*.h' -o -name '*.cpp' | sort | xargs awk '
+  find libraries host plugin quarn clients -name '*.h' -o -name '*.cpp' | sort | xargs awk '
     FNR == 1 { space = ""; isUnnamed = 0 }
     /^namespace [{]/ { isUnnamed = 1 }
     /^[}] \/\/ namespace$/ { isUnnamed = 0 }

@@ -5,7 +5,7 @@ root=$(cd "$1" && pwd)
 
 copy() {
   rm -rf "${tree:?}"/*
-  (cd "$root" && find libraries host plugin quarn -name '*.cpp' -o -name '*.h' | tar -cf - -T -) | tar -xf - -C "$tree"
+  (cd "$root" && find libraries host plugin quarn clients -name '*.cpp' -o -name '*.h' | tar -cf - -T -) | tar -xf - -C "$tree"
 }
 
 copy

@@ -27,7 +27,8 @@ or_tell() {
 }
 
 or_tell cmake --install "$build" --prefix "$work/prefix"
-or_tell "$python" scripts/pack_python.py "$work/prefix" "$work/packages"
+mv "$work/prefix" "$work/moved"
+or_tell "$python" scripts/pack_python.py "$work/moved" "$work/packages"
 version=$(<VERSION)
 wheel=$work/packages/neuralwarp-$version-$("$python" -c '
 import sys; print("cp%d%d" % sys.version_info[:2])')
@@ -76,9 +77,9 @@ elsewhere "$work/env/bin/neuralwarp-train" --version
 elsewhere "$work/env/bin/python" "$source/tests/house/packed_module.py" "$work/env" "$work/wave"
 
 # --- and as it is installed ---
-elsewhere env PYTHONPATH="$work/prefix/lib/python3" "$python" "$source/tests/house/packed_module.py" \
-  "$work/prefix" "$work/wave"
-elsewhere env PYTHONPATH="$work/prefix/lib/python3" "$python" -m neuralwarp_trainer --help
+elsewhere env PYTHONPATH="$work/moved/lib/python3" "$python" "$source/tests/house/packed_module.py" \
+  "$work/moved" "$work/wave"
+elsewhere env PYTHONPATH="$work/moved/lib/python3" "$python" -m neuralwarp_trainer --help
 
 # --- the add-on ---
 . tests/clients/blender/needs_blender.sh
