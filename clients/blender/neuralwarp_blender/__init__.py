@@ -6,7 +6,7 @@ thing to do; `module.py` finds the module, and everything that has to be made kn
 `unregister()`, in the order of COMPONENTS.
 """
 
-from . import preferences
+from . import live, panel, preferences, properties, use_operators
 
 bl_info = {
     "name": "neuralWarp",
@@ -18,7 +18,7 @@ bl_info = {
     "category": "Rigging",
 }
 
-COMPONENTS = (preferences,)
+COMPONENTS = (preferences, properties, live, use_operators, panel)
 
 
 def register() -> None:

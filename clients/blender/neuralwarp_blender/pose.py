@@ -1,0 +1,97 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The joints of a scene, set from an armature's evaluated pose: constraints and drivers count.
+
+Matrices here are of row vectors, as the scene has them: p' = p * M. A joint's matrix is S * R * JO * T, with S and R
+the identity at rest (Shear, which a pose may have by constraints, a joint has not: it is left out).
+"""
+
+from typing import Any, List, Sequence, Tuple
+
+import numpy as np
+from numpy.typing import NDArray
+
+from .model_folder import NotUsable
+
+Array = NDArray[np.float64]
+
+ATTRIBUTES = [kind + axis for kind in ("translate", "rotate", "scale") for axis in "XYZ"]
+
+
+class JointSetter:
+    """Sets the joints that bones stand for; all others stay at rest."""
+
+    def __init__(self, scene: Any, bones: Sequence[Tuple[str, str]]) -> None:
+        """scene: neuralwarp.Scene. bones: the name of a bone and of its joint."""
+        joints = {joint["name"]: (number, joint) for number, joint in enumerate(scene.joints())}
+        for bone, name in bones:
+            if name not in joints:
+                raise NotUsable(f"the scene of the model has no joint {name}, which the bone {bone} is to set")
+        chosen = [joints[name] for _, name in bones]
+        self.bones = [bone for bone, _ in bones]
+        self._numbers = np.array([number for number, _ in chosen], dtype=np.intp)
+        self._parents = np.array([joint["parent"] for _, joint in chosen], dtype=np.intp)
+        self._orders = [joint["rotateOrder"] for _, joint in chosen]
+        # one more for joints without a parent: the last, which -1 is
+        worlds = [np.asarray(scene.get(f"{name}.worldMatrix")).reshape(4, 4) for name in joints]
+        self._worlds = np.stack([*worlds, np.eye(4)])
+        rest = np.stack([np.asarray(scene.get(f"{name}.restMatrix")).reshape(4, 4) for _, name in bones])
+        self._unoriented = split(rest)[1].transpose(0, 2, 1)  # the inverse of JO
+        self._plugs = scene.plugs([f"{name}.{attribute}" for _, name in bones for attribute in ATTRIBUTES])
+        self._values = np.empty((len(bones), 3, 3))  # translate, rotate, scale
+        self._names: List[str] = []  # of all bones of the armature, as they were found
+        self._matrices = np.empty(0, dtype=np.float32)
+        self._rows = np.empty(0, dtype=np.intp)
+
+    def set(self, thing: Any, armature: Any) -> None:
+        """thing, armature: the evaluated objects. NotUsable where a bone is missing."""
+        bones = armature.pose.bones
+        if len(bones) != len(self._names) or bones.keys() != self._names:
+            self.find_bones(armature)
+        bones.foreach_get("matrix", self._matrices)  # column by column, which is a row vector's matrix row by row
+        place = np.array(armature.matrix_world.transposed()) @ np.array(thing.matrix_world.inverted().transposed())
+        self._worlds[self._numbers] = self._matrices.reshape(-1, 4, 4)[self._rows] @ place
+        local = self._worlds[self._numbers] @ np.linalg.inv(self._worlds[self._parents])
+        scale, rotation = split(local)
+        self._values[:, 0] = local[:, 3, :3]
+        self._values[:, 1] = angles(rotation @ self._unoriented, self._orders)
+        self._values[:, 2] = scale
+        self._plugs.set(self._values.ravel())
+
+    def find_bones(self, armature: Any) -> None:
+        """NotUsable where the armature lacks one."""
+        names = armature.pose.bones.keys()
+        missing = [bone for bone in self.bones if bone not in names]
+        if missing:
+            raise NotUsable(f"{armature.name} has no bone {missing[0]}, which the model was made with"
+                            + (f", nor {len(missing) - 1} more" if len(missing) > 1 else ""))
+        self._rows = np.array([names.index(bone) for bone in self.bones], dtype=np.intp)
+        self._matrices = np.empty(16 * len(names), dtype=np.float32)
+        self._names = names
+
+
+def split(matrices: Array) -> Tuple[Array, Array]:
+    """Of [J, 4, 4] the scales, [J, 3], and the rotations, [J, 3, 3]: S * R. A mirrored one has its x scaled by less
+    than 0."""
+    axes = matrices[:, :3, :3]
+    scale = np.linalg.norm(axes, axis=2)
+    scale[np.linalg.det(axes) < 0.0, 0] *= -1.0
+    return scale, axes / np.where(scale == 0.0, 1.0, scale)[:, :, None]
+
+
+def angles(rotations: Array, orders: Sequence[str]) -> Array:
+    """[J, 3] in radians, x, y, z: of rotations [J, 3, 3] that turn about the axes in these orders ("xyz": x first).
+    The middle angle lies between -90 and 90 degrees."""
+    result = np.empty((len(rotations), 3))
+    for order in set(orders):
+        rows = np.array([number for number, other in enumerate(orders) if other == order], dtype=np.intp)
+        first, middle, last = ("xyz".index(axis) for axis in order)
+        sign = 1.0 if order in ("xyz", "yzx", "zxy") else -1.0
+        m = rotations[rows]
+        cosine = np.hypot(m[:, first, first], m[:, first, middle])
+        # where the middle angle is a right one, the last axis lies on the first: all of the turn is the first's
+        locked = cosine < 1e-9
+        result[rows, first] = np.where(locked, np.arctan2(-sign * m[:, last, middle], m[:, middle, middle]),
+                                       np.arctan2(sign * m[:, middle, last], m[:, last, last]))
+        result[rows, middle] = np.arctan2(-sign * m[:, first, last], cosine)
+        result[rows, last] = np.where(locked, 0.0, np.arctan2(sign * m[:, first, middle], m[:, first, first]))
+    return result
