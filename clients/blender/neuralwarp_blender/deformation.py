@@ -158,6 +158,9 @@ class Deformation:
 def check_mesh(rig: Rig, thing: Any) -> None:
     """NotUsable where the object has not the mesh of the training."""
     mesh = thing.data
+    if mesh.library is not None:  # Blender would not write into its evaluated copies, and say nothing
+        raise NotUsable(f"{mesh.name}, the mesh of {thing.name}, is linked from {mesh.library.filepath}: make a "
+                        "library override of the mesh as well")
     if len(mesh.vertices) != rig.vertices:
         raise NotUsable(f"{rig.folder.name} is for a mesh of {rig.vertices} vertices, and {thing.name} has "
                         f"{len(mesh.vertices)}")

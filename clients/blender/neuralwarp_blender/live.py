@@ -37,9 +37,11 @@ def use(thing: Any, model: str) -> None:
     check_object(thing)
     module.find()
     rig = model_folder.read_rig(model_folder.find(model))
-    if rig.shape_keys and thing.data.users > 1:
-        raise NotUsable(f"{thing.data.name} is the mesh of {thing.data.users} objects, whose shape keys would all be "
-                        "off: make it a single-user copy first")
+    others = [other.name for other in bpy.data.objects
+              if other.data == thing.data and other != thing and other.library is None]
+    if rig.shape_keys and others:
+        raise NotUsable(f"{thing.data.name} is the mesh of {others[0]}, too, whose shape keys would be off as well: "
+                        "make it a single-user copy first")
     made = Deformation(rig, thing)
     made.joints.find_bones(find_armature(thing, rig))
     stop(thing)
@@ -237,8 +239,8 @@ def on_file(*_: Any) -> None:
     """Another file: nothing that is known holds."""
     forget()
     _problems.clear()
-    on_undo()
-    look_at_new_data()
+    bpy.context.view_layer.update()  # the first evaluation of a file calls no handlers
+    on_registered()
 
 
 @persistent
@@ -285,13 +287,14 @@ def check_meshes(changed: Set[str]) -> None:
 
 
 def register() -> None:
-    on_undo()
+    on_undo()  # at the first handler, or by the timer where there is a window
     for name, handler in HANDLERS:
         getattr(bpy.app.handlers, name).append(handler)
     bpy.app.timers.register(on_registered, first_interval=0.0)  # until then Blender shows no data
 
 
 def on_registered() -> None:
+    on_undo()
     look_at_new_data()
     for thing in things_in_use():
         refresh(thing)

@@ -44,7 +44,9 @@ def find(model: str) -> Path:
         if (place / "metadata.json").is_file():
             return place
         looked.append(place)
-    raise NotUsable(f"there is no model {Path(model).name}; looked for " + ", ".join(map(str, dict.fromkeys(looked))))
+    places = ", ".join(map(str, dict.fromkeys(looked)))
+    raise NotUsable(f"there is no model {Path(model).name}; looked for {places}" if places else
+                    f"{model} counts from the .blend file, which was never saved")
 
 
 def _places(model: str) -> Iterator[Path]:
