@@ -11,20 +11,22 @@ double moved(double p, float c, double f) {
 }
 
 // What most frames are: every vertex goes to the model's position, by the same part of the way.
-void blendTowardsModel(const double* from, double* to, const Points& model, double f) {
+template <class Coordinate>
+void blendTowardsModel(const Coordinate* from, Coordinate* to, const Points& model, double f) {
     const float* const c = &model.front().x; // x, y and z follow each other, as in the positions
     quill::parallelForRange(
         model.size(),
         [=](int begin, int end) {
             for (std::ptrdiff_t i = std::ptrdiff_t{3} * begin; i < std::ptrdiff_t{3} * end; ++i)
-                to[i] = moved(from[i], c[i], f);
+                to[i] = static_cast<Coordinate>(moved(static_cast<double>(from[i]), c[i], f));
         },
         quill::copyGrain);
 }
 
-void blendEach(const MovedPoints& points, const float* weights, const Blend& blend, std::size_t i) {
+template <class Coordinate>
+void blendEach(const MovedPointsOf<Coordinate>& points, const float* weights, const Blend& blend, std::size_t i) {
     const std::size_t at = 3 * std::size_t{points.vertices ? points.vertices[i] : i};
-    const double* const p = points.from + at;
+    const Coordinate* const p = points.from + at;
     quill::val3<float> c{static_cast<float>(p[0]), static_cast<float>(p[1]), static_cast<float>(p[2])};
     if (blend.model && blend.driven.contains(i))
         c = (*blend.model)[i];
@@ -32,12 +34,11 @@ void blendEach(const MovedPoints& points, const float* weights, const Blend& ble
         c = c + ((*blend.target)[i] - c) * blend.targetWeight;
     const auto f = static_cast<double>(weights ? weights[i] * blend.envelope : blend.envelope);
     for (std::size_t axis = 0; axis < 3; ++axis)
-        points.to[at + axis] = moved(p[axis], c[axis], f);
+        points.to[at + axis] = static_cast<Coordinate>(moved(static_cast<double>(p[axis]), c[axis], f));
 }
 
-} // namespace
-
-void blendPositions(const MovedPoints& points, const float* weights, const Blend& blend) {
+template <class Coordinate>
+void blendAll(const MovedPointsOf<Coordinate>& points, const float* weights, const Blend& blend) {
     if (points.count == 0)
         return;
     if (blend.model && !blend.target && !blend.driven.slots && !weights && !points.vertices)
@@ -45,6 +46,16 @@ void blendPositions(const MovedPoints& points, const float* weights, const Blend
     else
         quill::parallelFor(
             points.count, [&](std::size_t i) { blendEach(points, weights, blend, i); }, quill::copyGrain);
+}
+
+} // namespace
+
+void blendPositions(const MovedPoints& points, const float* weights, const Blend& blend) {
+    blendAll(points, weights, blend);
+}
+
+void blendPositions(const MovedPointsOf<float>& points, const float* weights, const Blend& blend) {
+    blendAll(points, weights, blend);
 }
 
 } // namespace neuralWarp

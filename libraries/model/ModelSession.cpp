@@ -2,10 +2,10 @@
 #include "nw_model/ModelSession.h"
 
 #include "OnnxScan.h"
+#include "printLine.h"
 
 #include <algorithm>
 #include <cmath>
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <exception>
@@ -159,7 +159,7 @@ void checkInputs(std::span<const float> inputs, std::size_t count) {
 }
 
 void printUnsupportedType() {
-    std::fputs("[NEURAL WARP] WARNING, unsupported ml model type\n", stdout);
+    printLine("[NEURAL WARP] WARNING, unsupported ml model type\n");
 }
 
 /// An environment of the runtime. All of them stand for one object of the process, which the runtime takes down with
@@ -305,7 +305,7 @@ void ModelSession::buildSession(bool regularFile) {
 }
 
 void ModelSession::reportLoadFailure(const char* reason) noexcept {
-    std::printf("[NEURAL WARP] ERROR, Failed to load the ONNX model %s\n", modelPath_.c_str());
+    printLine({"[NEURAL WARP] ERROR, Failed to load the ONNX model ", modelPath_.c_str(), "\n"});
     keepError(reason);
 }
 

@@ -3,11 +3,11 @@
 
 #include <algorithm>
 #include <cmath>
-#include <cstdio>
 #include <limits>
 #include <string>
 
 #include "json.h"
+#include "printLine.h"
 #include "readers.h"
 
 namespace neuralWarp {
@@ -52,7 +52,7 @@ bool readShapes(PrincipalShapes& shapes, const json::Value& root, const std::fil
     const json::Value* list = json::find(root, "principalShapes");
     const std::uint64_t found = list != nullptr && list->IsArray() ? list->Size() : 0;
     if (found != shapes.shapeCount) {
-        std::fputs("Error: principalShapeCount does not match the number of principal shapes\n", stdout);
+        printLine("Error: principalShapeCount does not match the number of principal shapes\n");
         return false;
     }
     const std::uint64_t coordinates = 3 * shapes.vertCount;

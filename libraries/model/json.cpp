@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "json.h"
 
-#include <cstdio>
+#include "printLine.h"
+
 #include <exception>
 #include <ios>
 
@@ -11,7 +12,7 @@ bool open(std::filebuf& file, const std::filesystem::path& path, const storage::
     std::error_code error;
     // A pipe would wait for a writer, and a directory opens on Linux but cannot be read.
     if (!std::filesystem::is_regular_file(path, error) || !file.open(path, std::ios::in)) {
-        std::fputs("Failed to open metadata file stream\n", stdout);
+        printLine("Failed to open metadata file stream\n");
         return false;
     }
     const std::uintmax_t size = std::filesystem::file_size(path, error);
@@ -24,14 +25,14 @@ bool open(std::filebuf& file, const std::filesystem::path& path, const storage::
 bool parseObject(Document& document, std::streambuf& source, const std::filesystem::path& path,
                  const storage::JsonRules& rules) {
     if (!storage::parseJson(document, source, rules)) {
-        std::fputs("Parse error\n", stdout);
+        printLine("Parse error\n");
         return false;
     }
     return document.IsObject() || refuse(path, "it holds no JSON object");
 }
 
 bool refuse(const std::filesystem::path& path, const char* reason) noexcept {
-    std::printf("Error: %s: %s\n", path.c_str(), reason);
+    printLine({"Error: ", path.c_str(), ": ", reason, "\n"});
     return false;
 }
 

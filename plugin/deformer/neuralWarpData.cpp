@@ -1,24 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "deformer/neuralWarpData.h"
 
+#include "nw_deform/Model.h"
+
 #include <utility>
 
 namespace neuralWarp {
-namespace {
-
-/// The vertices that a model drives, by its slots.
-quill::IndexMapper slotsOf(const ModelMetadata& metadata) {
-    quill::IndexMapper map;
-    if (metadata.subsetState == SubsetState::Complete)
-        map.setIdentity(metadata.fullCount);
-    else if (metadata.subsetState == SubsetState::Partial)
-        map.set(metadata.affectMap, metadata.fullCount);
-    else
-        map.set({}, metadata.fullCount);
-    return map;
-}
-
-} // namespace
 
 const HTypeId neuralWarpData::id{0x58000972};
 const HString neuralWarpData::typeName("neuralWarpData");
@@ -148,7 +135,7 @@ void neuralWarpData::buildAffectMap() {
     bump(affectMapCache);
     if (!modelValid)
         return;
-    SlotMap map = mapSlots(slotsOf(metadata), componentMap);
+    SlotMap map = mapSlots(trainedVertices(metadata), componentMap);
     useAffectMap = !map.isIdentity;
     affectMap = std::move(map.slots);
     affectedVertices = std::move(map.vertices);

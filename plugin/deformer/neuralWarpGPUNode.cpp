@@ -3,7 +3,6 @@
 #include "deformer/neuralWarpGPUNode.h"
 
 #include "deformer/ProfiledFrame.h"
-#include "deformer/SessionNetwork.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
 #include "frame/FrameCheck.h"
@@ -12,6 +11,7 @@
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
+#include "nw_deform/SessionNetwork.h"
 
 #include <algorithm>
 #include <cmath>

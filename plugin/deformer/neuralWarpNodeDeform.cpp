@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The evaluation of one geometry.
 #include "deformer/ProfiledFrame.h"
-#include "deformer/SessionNetwork.h"
 #include "deformer/framePlan.h"
 #include "deformer/neuralWarpNode.h"
 #include "deformer/neuralWarpUtils.h"
@@ -11,6 +10,7 @@
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
+#include "nw_deform/SessionNetwork.h"
 #include "openquarn/HIndexMapper.h"
 #include "openquarn/HItGeometry.h"
 #include "openquarn/HLongWork.h"

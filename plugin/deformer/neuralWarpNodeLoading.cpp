@@ -7,13 +7,12 @@
 #include "messages/guard.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
-#include "nw_model/PrincipalBasisFiles.h"
+#include "nw_deform/BasisSink.h"
 #include "openquarn/HGlobal.h"
 #include "openquarn/HItGeometry.h"
 #include "openquarn/HLongWork.h"
 #include "openquarn/Instrumenter.h"
 
-#include <span>
 #include <system_error>
 
 namespace neuralWarp {
@@ -121,33 +120,6 @@ HStatus loadNetwork(neuralWarpData& data) {
         return HStatus::kFailure;
     return reported({HStatus::kFailure, "'" + file.string() + "' cannot be used: " + reason}, sourceUnit::node);
 }
-
-/// Puts shapes where frames read them, as they come from their file.
-class BasisSink final : public PrincipalShapesSink {
-public:
-    explicit BasisSink(PrincipalBasis& basis)
-        : basis_(basis) {}
-    void begin(std::uint64_t shapeCount, std::uint64_t vertCount, std::span<const float> scales) override {
-        const auto slots = static_cast<std::size_t>(vertCount);
-        if (scales.empty())
-            basis_.resize(slots, static_cast<std::size_t>(shapeCount));
-        else
-            basis_.resizeHalves(slots, scales);
-        filled_ = 0;
-    }
-    void append(std::span<const float> values) override { put(values); }
-    void append(std::span<const std::uint16_t> halves) override { put(halves); }
-
-private:
-    template <class Number>
-    void put(std::span<const Number> values) {
-        basis_.set(filled_, values);
-        filled_ += values.size() / (3 * basis_.shapeCount());
-    }
-
-    PrincipalBasis& basis_;
-    std::size_t filled_ = 0; ///< slots
-};
 
 /// None when the directory has no such file, or a bad one.
 HStatus loadPrincipalShapes(neuralWarpData& data) {

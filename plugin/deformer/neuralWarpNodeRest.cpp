@@ -6,6 +6,7 @@
 #include "messages/displayErrorGated.h"
 #include "messages/messageText.h"
 #include "messages/sourceUnits.h"
+#include "nw_deform/RestTables.h"
 #include "openquarn/HFnMesh.h"
 #include "openquarn/HProfilingScope.h"
 #include "quill/parallelFor.h"
@@ -22,10 +23,7 @@ HStatus invalidRest() {
 }
 
 void rebuildConnections(neuralWarpData& data, const quill::MeshTopology& topology) {
-    data.vertexConnections.build(topology, data.componentMap, 0, false);
-    std::vector<float> weights;
-    data.vertexConnections.calculateConnectionWeights(weights, data.restPoints, 1.0, 0.0);
-    data.connectionWeights = std::move(weights);
+    buildConnections(data.vertexConnections, data.connectionWeights, topology, data.componentMap, data.restPoints);
     data.connectionsDirty = false;
     data.restFramesDirty = true;
     data.bump(neuralWarpData::connectionsCache);
