@@ -37,9 +37,9 @@ class Status:
     said: str = ""  # of a job that runs, how far it is; of one that failed, why
 
 
-def start(folder: RunFolder, with_report: bool = True) -> None:
-    """Starts the training of what was sampled, or goes on with it; the report with its pictures can be left out. Refused
-    where it cannot."""
+def start(folder: RunFolder, epochs: int = 0, with_report: bool = True) -> None:
+    """Starts the training of what was sampled, or goes on with it: 0 epochs are as many as usual, and the report with
+    its pictures can be left out. Refused where it cannot."""
     if not folder.is_sampled:
         raise Refused(f"{folder.path.name} has no samples: sample first")
     if status(folder).state == "runs":
@@ -49,6 +49,8 @@ def start(folder: RunFolder, with_report: bool = True) -> None:
         raise Refused("the program quarn was not found: say where it is in the add-on's preferences")
     folder.ended.unlink(missing_ok=True)
     words = [paths.quarn, "run", "--recipe", str(folder.recipe), "-o", str(folder.run)]
+    if epochs:
+        words += ["--epochs", str(epochs)]
     if not with_report:
         words += ["--until", "evaluate"]
     with open(folder.log, "wb") as log:

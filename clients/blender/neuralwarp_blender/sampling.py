@@ -45,7 +45,6 @@ class Settings:
     activation_rate: float = 0.5
     seed: int = 1
     hold: int = 24  # frames for which a pose is held, for modifiers with a memory
-    epochs: int = 0  # 0: quarn's own number
 
 
 @dataclass(frozen=True)
@@ -61,6 +60,8 @@ class Rig:
 def sample(thing: Any, settings: Settings, say: Callable[[str], None]) -> Iterator[Progress]:
     """Samples a mesh object into its folder (run_folder.folder_of). say: gets notes, sentences for the user. Raises
     Refused, before anything was changed or after it was put back."""
+    if getattr(thing, "neuralwarp", None) is not None and thing.neuralwarp.in_use:
+        raise Refused(f"{thing.name} uses a model: stop that first")
     stack = read_stack(thing)
     for note in stack.notes:
         say(note)
@@ -123,8 +124,6 @@ def recipe(rig: Rig) -> Dict[str, Any]:
         content["motion"] = "motion.json"
     else:
         content["held-out"] = settings.held_out
-    if settings.epochs:
-        content["epochs"] = settings.epochs
     return content
 
 
