@@ -6,7 +6,8 @@ thing to do; `module.py` finds the module, and everything that has to be made kn
 `unregister()`, in the order of COMPONENTS.
 """
 
-from . import live, panel, preferences, properties, use_operators
+from . import (live, panel, preferences, properties, sample_operators, sample_panel, sample_settings, use_operators,
+               watch)
 
 bl_info = {
     "name": "neuralWarp",
@@ -18,7 +19,8 @@ bl_info = {
     "category": "Rigging",
 }
 
-COMPONENTS = (preferences, properties, live, use_operators, panel)
+COMPONENTS = (preferences, properties, live, use_operators, panel, sample_settings, sample_operators, sample_panel,
+              watch)
 
 
 def register() -> None:
