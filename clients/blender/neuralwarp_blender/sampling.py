@@ -324,7 +324,7 @@ class JointTrack:
 
 def sample_all(thing: Any, settings: Settings, say: Callable[[str], None] = print) -> None:
     """In one go, for scripts."""
-    shown = 0.0
+    shown = time.monotonic()
     for doing, done, total in sample(thing, settings, say):
         if time.monotonic() - shown > 5.0:
             shown = time.monotonic()

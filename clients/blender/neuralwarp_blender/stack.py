@@ -125,6 +125,7 @@ def read_stack(thing: Any) -> Stack:
     shown = [modifier for modifier in thing.modifiers if modifier.show_viewport]
     skins = [modifier for modifier in shown if modifier.type == "ARMATURE"]
     armature = check_armatures(thing, skins)
+    check_switches(thing)
     behind = shown[shown.index(skins[-1]) + 1:]
     kept = shown[:shown.index(skins[-1])]
     left_out = changing_vertices(thing, [modifier.name for modifier in kept], [modifier.name for modifier in behind])
@@ -181,6 +182,14 @@ def check_armatures(thing: Any, skins: Sequence[Any]) -> Any:
     if armature.data.pose_position == "REST":
         raise Refused(f"{armature.name} shows its rest position: switch to its pose position first")
     return armature
+
+
+def check_switches(thing: Any) -> None:
+    for curve in thing.animation_data.drivers if thing.animation_data else ():
+        for modifier in thing.modifiers:
+            if curve.data_path == f"{modifier.path_from_id()}.show_viewport" and not curve.mute:
+                raise Refused(f"{thing.name}: a driver switches the modifier {modifier.name} on and off: remove it, or "
+                              "mute it")
 
 
 def changing_vertices(thing: Any, kept: Sequence[str], behind: Sequence[str]) -> List[str]:
