@@ -72,13 +72,13 @@ class Deformation:
         NotUsable names what does not fit."""
         mesh = evaluated.data
         self._check_evaluated(thing, mesh)
-        copy = self._copies.get(graph)
-        if copy is None:
-            copy = self._copies[graph] = Copy.unseen(self.count)
         self.joints.set(evaluated, armature)
         controls = self.scene.controls()
         envelope, weights = evaluated.neuralwarp.envelope, self._vertex_weights(thing)
         settings = (envelope, self._group)
+        copy = self._copies.get(graph)
+        if copy is None:
+            copy = self._copies[graph] = Copy.unseen(self.count)
         mesh.vertices.foreach_get("co", self._flat)
         points = self._flat.reshape(-1, 3)
         is_ours = np.array_equal(points, copy.result)
@@ -119,6 +119,8 @@ class Deformation:
             raise NotUsable(f"the scene of {self.rig.folder.name} has a mesh of {count} vertices"
                             + (f", and a map of {len(joined)}" if joined is not None else "") + f", not {self.count}")
         self._joined = np.asarray(joined, dtype=np.intp)
+        if count == self.count and np.array_equal(self._joined, np.arange(count)):
+            return
         found, first = np.unique(self._joined, return_index=True)
         if len(found) != count or found[0] != 0 or found[-1] != count - 1:
             raise NotUsable(f"the vertex map of {self.rig.folder.name} leaves out vertices of its scene")

@@ -50,7 +50,7 @@ class JointSetter:
         bones.foreach_get("matrix", self._matrices)  # column by column, which is a row vector's matrix row by row
         place = np.array(armature.matrix_world.transposed()) @ np.array(thing.matrix_world.inverted().transposed())
         self._worlds[self._numbers] = self._matrices.reshape(-1, 4, 4)[self._rows] @ place
-        local = self._worlds[self._numbers] @ np.linalg.inv(self._worlds[self._parents])
+        local = self._worlds[self._numbers] @ inverses(self._worlds[self._parents])
         scale, rotation = split(local)
         self._values[:, 0] = local[:, 3, :3]
         self._values[:, 1] = angles(rotation @ self._unoriented, self._orders)
@@ -69,12 +69,28 @@ class JointSetter:
         self._names = names
 
 
+def cofactors(axes: Array) -> Array:
+    """Of [J, 3, 3]: the cross products of the two other rows, in turn."""
+    return np.cross(axes[:, (1, 2, 0)], axes[:, (2, 0, 1)])
+
+
+def inverses(matrices: Array) -> Array:
+    """Of [J, 4, 4] that move, turn, scale and shear. (That of NumPy asks threads of a BLAS for each of them.)"""
+    axes, result = matrices[:, :3, :3], np.zeros_like(matrices)
+    around = cofactors(axes)
+    determinants = np.einsum("jk,jk->j", axes[:, 0], around[:, 0])
+    result[:, :3, :3] = around.transpose(0, 2, 1) / determinants[:, None, None]
+    result[:, 3, :3] = -np.einsum("jk,jkl->jl", matrices[:, 3, :3], result[:, :3, :3])
+    result[:, 3, 3] = 1.0
+    return result
+
+
 def split(matrices: Array) -> Tuple[Array, Array]:
     """Of [J, 4, 4] the scales, [J, 3], and the rotations, [J, 3, 3]: S * R. A mirrored one has its x scaled by less
     than 0."""
     axes = matrices[:, :3, :3]
-    scale = np.linalg.norm(axes, axis=2)
-    scale[np.linalg.det(axes) < 0.0, 0] *= -1.0
+    scale = np.sqrt(np.einsum("jkl,jkl->jk", axes, axes))
+    scale[np.einsum("jk,jk->j", axes[:, 0], cofactors(axes)[:, 0]) < 0.0, 0] *= -1.0
     return scale, axes / np.where(scale == 0.0, 1.0, scale)[:, :, None]
 
 
