@@ -45,9 +45,10 @@ void printText(const std::vector<ExportAnswer>& answers) {
         std::cout << answer.geometry << ": " << answer.rows << " rows of " << answer.controls << " controls and "
                   << answer.vertices << " vertices, " << answer.bytes << " bytes, in " << answer.folder.string()
                   << '\n';
+        FitContext context;
+        context.metersPerUnit = answer.metersPerUnit;
         if (answer.fit)
-            std::cout << "its target is "
-                      << distanceText(answer.fit->asItIs, answer.fit->diagonal, answer.metersPerUnit) << '\n';
+            std::cout << "its target is " << distanceText(answer.fit->asItIs, answer.fit->diagonal, context) << '\n';
     }
 }
 

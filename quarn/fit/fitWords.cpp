@@ -86,8 +86,8 @@ std::string axesText(const AxisTurn& axes) {
 
 std::string placeText(const CacheChange& change, const FitContext& context) {
     if (change.offset != FitPoint{})
-        return "it lay " + length(fitDistance(change.offset, {}), context) +
-               " beside the skin, as in the space of another node";
+        return "it lay " + length(fitDistance(change.offset, {}), context) + " beside " + context.reference() +
+               ", as in the space of another node";
     std::string text = change.axes.isNone() ? "" : axesText(change.axes);
     if (change.scale != 1.0)
         text += (text.empty() ? "" : ", and as if ") + scaleText(change.scale);
@@ -127,8 +127,8 @@ std::string orderFlags(const TargetFit& fit, const FitContext& context) {
 std::string remedyText(const TargetFit& fit, const FitContext& context) {
     const std::string flags = flagText(fit, context);
     const std::string with = flags.empty() ? "With that mended" : "With " + flags;
-    return with + " it would be " + length(fit.mended.mean, context) + " from the skin in the mean; " +
-           (context.canAlign ? "--align" : "quarn target --align") + " does that";
+    return with + " it would be " + length(fit.mended.mean, context) + " from " + context.reference() +
+           " in the mean; " + (context.canAlign ? "--align" : "quarn target --align") + " does that";
 }
 
 std::string notFiniteText(const FitDistance& distance, const FitContext& context) {
@@ -137,8 +137,8 @@ std::string notFiniteText(const FitDistance& distance, const FitContext& context
 }
 
 std::string beyondText(const FitDistance& distance, double diagonal, const FitContext& context) {
-    std::string text = context.what + " is " + length(distance.mean, context) + " from the skin in the mean, " +
-                       share(distance.mean, diagonal);
+    std::string text = context.what + " is " + length(distance.mean, context) + " from " + context.reference() +
+                       " in the mean, " + share(distance.mean, diagonal);
     if (distance.mean <= fitLimit::mean * diagonal)
         text += ", but up to " + length(*distance.largestAtRest, context) + ", " +
                 share(*distance.largestAtRest, diagonal) + ", where the skin is at rest";
@@ -159,8 +159,19 @@ std::string matterText(const TargetFit& fit, const FitContext& context, bool isM
         return strangersText(fit);
     if (!isBeyond)
         return "";
+    if (context.isSkin)
+        return fit.motion.following == Following::yes
+                   ? "it goes with the poses, but further from it than other skins of the same joints use to be"
+                   : "whether these frames belong to these poses cannot be told";
     return fit.motion.following == Following::yes ? "it goes with the poses, but too far from them for a correction"
                                                   : strangersText(fit);
+}
+
+// a skin of another kind is none the worse for its distance, as long as it is not another character's, or in other
+// poses
+bool isRefused(const TargetFit& fit, const FitDistance& distance, const FitContext& context, bool isMended) {
+    return !context.isSkin || isBeyondAtRest(distance, fit.diagonal) || fit.motion.following == Following::no ||
+           (!isMended && !fit.causes.empty());
 }
 
 std::string untoldNote(const TargetFit& fit, const FitDistance& distance) {
@@ -179,17 +190,16 @@ std::string slowNote(const TargetFit& fit, const FitContext& context) {
         hint = "; with --start-frame " + numberText(*context.startFrame - static_cast<double>(fit.nearerShift)) +
                " it would be " + length(fit.nearerMean, context) + " from it";
     return "from frame to frame the skin moves " + length(*fit.motion.ofAStep, context) +
-           " in the mean, too slow to tell whether the target is a frame early or late" + hint;
+           " in the mean, too slow to tell whether the " + (context.isSkin ? "cache" : "target") +
+           " is a frame early or late" + hint;
 }
 
 } // namespace
 
-std::string distanceText(const FitDistance& distance, double diagonal, double metersPerUnit) {
-    FitContext context;
-    context.metersPerUnit = metersPerUnit;
-    return length(distance.mean, context) + " from the skin in the mean (" + share(distance.mean, diagonal) + "), " +
-           length(distance.largest, context) + " at most, in " + std::to_string(distance.frames) +
-           (distance.frames == 1 ? " frame" : " frames");
+std::string distanceText(const FitDistance& distance, double diagonal, const FitContext& context) {
+    return length(distance.mean, context) + " from " + context.reference() + " in the mean (" +
+           share(distance.mean, diagonal) + "), " + length(distance.largest, context) + " at most, in " +
+           std::to_string(distance.frames) + (distance.frames == 1 ? " frame" : " frames");
 }
 
 std::string causeText(const TargetFit& fit, const FitContext& context) {
@@ -229,8 +239,10 @@ FitVerdict verdictOf(const TargetFit& fit, const FitContext& context, bool isMen
     FitVerdict verdict;
     if (!std::isfinite(distance.mean))
         verdict.refusal = notFiniteText(distance, context);
-    else if (isBeyond)
+    else if (isBeyond && isRefused(fit, distance, context, isMended))
         verdict.refusal = beyondText(distance, fit.diagonal, context) + ": " + matter + "; --anyway takes it as it is";
+    else if (isBeyond)
+        verdict.warning = beyondText(distance, fit.diagonal, context) + ": " + matter;
     else if (!matter.empty() || distance.notFinite)
         verdict.warning = matter.empty() ? notFiniteText(distance, context) : context.what + ": " + matter;
     if (!verdict.refusal.empty() || !verdict.warning.empty())

@@ -17,10 +17,14 @@ struct FitContext {
     AxisTurn axes;                    ///< what the axes have been turned by, and the scale, on the way into the scene
     double scale = 1.0;
     bool canAlign = false; ///< the command that asks has --align; else `quarn target` is named, which has it
+    /// It is another skin of the same joints, and is compared with the one that the scene computes: it may be as far
+    /// from that as it likes where they bend, and is where the mesh is at rest.
+    bool isSkin = false;
+    std::string reference() const { return isSkin ? "quarn's own skin" : "the skin"; }
 };
 
 /// "0.4 mm from the skin in the mean (0.15 % of the mesh), 26 mm at most, in 12 frames".
-std::string distanceText(const FitDistance& distance, double diagonal, double metersPerUnit);
+std::string distanceText(const FitDistance& distance, double diagonal, const FitContext& context);
 
 /// What is the matter, as the end of "it looks as if ": "its numbers were 100 times too large (centimetres against
 /// metres)". Empty without a cause.

@@ -74,8 +74,11 @@ bool isTooSlow(const TargetFit& fit, const SkinFrames& skin) {
 } // namespace
 
 bool isBeyondLimits(const FitDistance& distance, double diagonal) {
-    return distance.mean > fitLimit::mean * diagonal ||
-           distance.largestAtRest.value_or(0.0) > fitLimit::atRest * diagonal;
+    return distance.mean > fitLimit::mean * diagonal || isBeyondAtRest(distance, diagonal);
+}
+
+bool isBeyondAtRest(const FitDistance& distance, double diagonal) {
+    return distance.largestAtRest.value_or(0.0) > fitLimit::atRest * diagonal;
 }
 
 TargetFit fitTarget(const FitInput& input) {

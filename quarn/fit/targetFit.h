@@ -30,7 +30,8 @@ struct TargetFit {
 /// what the reading functions of `input` throw. Memory: twelve frames in single precision.
 TargetFit fitTarget(const FitInput& input);
 
-/// Beyond one of the limits.
+/// Beyond one of the limits; beyond that of frames at rest.
 bool isBeyondLimits(const FitDistance& distance, double diagonal);
+bool isBeyondAtRest(const FitDistance& distance, double diagonal);
 
 } // namespace quarn

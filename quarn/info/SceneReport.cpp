@@ -10,6 +10,7 @@
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/modelDirectory.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/replacedSkins.h"
 #include "quarn/scene/units.h"
 
 #include <algorithm>
@@ -40,6 +41,8 @@ DeformedGeometry describe(const Warp& warp, const WarpGeometry& geometry) {
     DeformedGeometry report;
     report.facts = factsOf(warp, geometry);
     report.index = geometry.index;
+    if (!skinReplacedBy(geometry.input).isNull())
+        report.skinCache = textOf(plugOf(geometry.input.node(), "cacheFile"));
     report.modelName = textOf(warp.plug("models", geometry, "modelName"));
     report.modelDirectory = modelDirectory(warp, geometry).string();
     report.isModelActive = isModelActive(warp, geometry);
@@ -84,6 +87,8 @@ std::string geometryLine(const DeformedGeometry& geometry) {
     std::string line = "  geometry " + std::to_string(geometry.index) + " (" + facts.name +
                        "): " + std::to_string(facts.vertices) + " vertices, " + std::to_string(facts.affected.size()) +
                        " affected, " + std::to_string(facts.controls) + " controls, ";
+    if (!geometry.skinCache.empty())
+        line += "skin " + geometry.skinCache + ", ";
     if (geometry.modelName.empty())
         return line + "no model";
     return line + "model " + geometry.modelName + (geometry.isModelActive ? " On" : " Off") +
@@ -102,6 +107,7 @@ void writeGeometry(JsonWriter& json, const DeformedGeometry& geometry) {
     writeInteger(json, "vertices", static_cast<std::int64_t>(geometry.facts.vertices));
     writeInteger(json, "affected", static_cast<std::int64_t>(geometry.facts.affected.size()));
     writeInteger(json, "controls", static_cast<std::int64_t>(geometry.facts.controls));
+    writeText(json, "skinCache", geometry.skinCache);
     writeText(json, "modelName", geometry.modelName);
     writeText(json, "modelDirectory", geometry.modelDirectory);
     writeBool(json, "modelActive", geometry.isModelActive);

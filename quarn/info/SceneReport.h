@@ -16,6 +16,7 @@ struct WarpGeometry;
 struct DeformedGeometry {
     GeometryFacts facts;
     unsigned index = 0;
+    std::string skinCache; ///< the file that stands in for its skin, as the scene names it; empty without one
     std::string modelName;
     std::string modelDirectory; ///< empty while the model has no name
     bool isModelActive = false;

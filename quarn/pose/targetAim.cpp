@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/targetAim.h"
 
+#include "quarn/pose/skinCache.h"
 #include "quarn/pose/targetCache.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
@@ -21,8 +22,9 @@ void chooseFrames(TargetFrames& chosen, const Warp& warp, double startFrame) {
     chosen.last = hasSome ? static_cast<std::size_t>(std::min(last, end)) : chosen.count - 1;
 }
 
-FitContext contextOf(const SceneFrames& frames, const TargetFile& file) {
+FitContext contextOf(const SceneFrames& frames, const TargetFile& file, CacheRole role) {
     FitContext context;
+    context.isSkin = role == CacheRole::skin;
     context.what = file.cache.filename().string();
     context.metersPerUnit = metersPerUnit();
     context.startFrame = file.startFrame;
@@ -34,10 +36,10 @@ FitContext contextOf(const SceneFrames& frames, const TargetFile& file) {
 
 } // namespace
 
-TargetAim aimTarget(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, SceneFrames& frames,
-                    const TargetFile& file, const AimOptions& options, const Console& console) {
+TargetAim aimCache(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, SceneFrames& frames,
+                   const TargetFile& file, CacheRole role, const AimOptions& options, const Console& console) {
     TargetAim aim;
-    aim.context = contextOf(frames, file);
+    aim.context = contextOf(frames, file, role);
     aim.startFrame = file.startFrame;
     TargetFrames compared;
     compared.count = frames.frameCount();
@@ -45,7 +47,12 @@ TargetAim aimTarget(OpenQuarn::Session& host, const Warp& warp, const WarpGeomet
     compared.read = [&](std::size_t frame, std::vector<double>& xyz) { frames.read(frame, xyz); };
     compared.time = [&](std::size_t frame) { return file.startFrame + static_cast<double>(frame); };
     chooseFrames(compared, warp, file.startFrame);
-    aim.fit = compareWithSkin(host, geometry, restMesh(geometry), compared, console);
+    WarpGeometry skinned = geometry;
+    if (role == CacheRole::skin) {
+        skinned.input = ownSkin(geometry);
+        compared.role = "skin";
+    }
+    aim.fit = compareWithSkin(host, skinned, restMesh(geometry), compared, console);
     if (!aim.fit)
         return aim;
     aim.isAligned = options.align && !aim.fit->causes.empty();
@@ -61,7 +68,7 @@ std::string aimText(const TargetAim& aim) {
     if (!aim.fit)
         return "";
     const FitDistance& distance = aim.isAligned ? aim.fit->mended : aim.fit->asItIs;
-    const std::string text = "it is " + distanceText(distance, aim.fit->diagonal, aim.context.metersPerUnit) + "\n";
+    const std::string text = "it is " + distanceText(distance, aim.fit->diagonal, aim.context) + "\n";
     return aim.isAligned ? "it was aligned, since it looked as if " + causeText(*aim.fit, aim.context) + "\n" + text
                          : text;
 }

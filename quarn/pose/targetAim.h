@@ -26,11 +26,15 @@ struct TargetAim {
     double startFrame = 1.0; ///< of the first frame, an alignment included
 };
 
-/// Compares `frames`, which are those of `file`, with the geometry's skin in the frames that the deformer exports, or
-/// in all of the cache where it exports none of them; tells what is the matter. Aligned, `frames` are changed. Throws
-/// std::runtime_error for a cache that fits neither way, unless `anyway`. Thread: main.
-TargetAim aimTarget(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, SceneFrames& frames,
-                    const TargetFile& file, const AimOptions& options, const Console& console);
+/// What the frames of a cache are to be of a geometry.
+enum class CacheRole { target, skin };
+
+/// Compares `frames`, which are those of `file`, with the geometry's skin, a skin with that which it is to replace
+/// (ownSkin()), in the frames that the deformer exports, or in all of the cache where it exports none of them; tells
+/// what is the matter. Aligned, `frames` are changed. Throws std::runtime_error for a cache that fits neither way,
+/// unless `anyway`. Thread: main.
+TargetAim aimCache(OpenQuarn::Session& host, const Warp& warp, const WarpGeometry& geometry, SceneFrames& frames,
+                   const TargetFile& file, CacheRole role, const AimOptions& options, const Console& console);
 
 /// How far it is, and what was mended: sentences, each with a new line.
 std::string aimText(const TargetAim& aim);

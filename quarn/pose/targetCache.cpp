@@ -33,6 +33,8 @@ HObject earlierCache(const Targets& targets) {
     return {};
 }
 
+} // namespace
+
 void connectInto(const HPlug& source, const HPlug& destination) {
     if (destination.source() == source)
         return;
@@ -40,17 +42,22 @@ void connectInto(const HPlug& source, const HPlug& destination) {
     connect(source, destination);
 }
 
-} // namespace
+void playCache(const HObject& cache, const HPlug& mesh, const std::string& file, double startFrame) {
+    setText(plugOf(cache, "cacheFile"), file);
+    setNumber(plugOf(cache, "startFrame"), startFrame);
+    connectInto(mesh, plugOf(cache, "inMesh"));
+    connectInto(findPlug("time1.outTime"), plugOf(cache, "time"));
+}
 
 HPlug restMesh(const WarpGeometry& geometry) {
     const HPlug rest = geometry.original.source();
     return rest.isNull() ? geometry.input : rest;
 }
 
-TargetReport connectTarget(const Warp& warp, const WarpGeometry& geometry, const std::string& cacheFile,
-                           std::optional<double> startFrame) {
+CacheReport connectTarget(const Warp& warp, const WarpGeometry& geometry, const std::string& cacheFile,
+                          std::optional<double> startFrame) {
     const Targets targets = targetsOf(warp, geometry);
-    TargetReport report;
+    CacheReport report;
     report.replaced =
         std::any_of(targets.begin(), targets.end(), [](const HPlug& plug) { return plug.isDestination(); });
     HObject cache = earlierCache(targets);
@@ -58,10 +65,7 @@ TargetReport connectTarget(const Warp& warp, const WarpGeometry& geometry, const
         cache = createNode("pointCache", geometry.name + "_target");
     report.node = nodeName(cache);
     report.startFrame = startFrame ? *startFrame : numberOf(warp.plug("exportStartFrame"));
-    setText(plugOf(cache, "cacheFile"), cacheFile);
-    setNumber(plugOf(cache, "startFrame"), report.startFrame);
-    connectInto(restMesh(geometry), plugOf(cache, "inMesh"));
-    connectInto(findPlug("time1.outTime"), plugOf(cache, "time"));
+    playCache(cache, restMesh(geometry), cacheFile, report.startFrame);
     for (const HPlug& target : targets)
         connectInto(plugOf(cache, "outMesh"), target);
     return report;

@@ -13,17 +13,24 @@ namespace quarn {
 /// deforms. Thread: main.
 HPlug restMesh(const WarpGeometry& geometry);
 
-struct TargetReport {
+/// How a cache was connected.
+struct CacheReport {
     std::string node;      ///< the pointCache
-    bool replaced = false; ///< an earlier target of the geometry
+    bool replaced = false; ///< an earlier one of the geometry
     double startFrame = 1.0;
 };
+
+/// Has the pointCache play a mesh's file, named as the scene is to name it, from that frame on.
+void playCache(const HObject& cache, const HPlug& mesh, const std::string& file, double startFrame);
+
+/// Connects, in the place of what is connected. Both: std::runtime_error, naming the plug. Thread: main.
+void connectInto(const HPlug& source, const HPlug& destination);
 
 /// Makes the target of the geometry a node MESH_target that plays the cache from `startFrame` on, or from the first
 /// frame that the deformer exports. `cacheFile` as the scene is to name it. A pointCache that is the target and nothing
 /// else is set to the new cache; any other target is disconnected. Throws std::runtime_error, naming the plug.
 /// Thread: main.
-TargetReport connectTarget(const Warp& warp, const WarpGeometry& geometry, const std::string& cacheFile,
-                           std::optional<double> startFrame);
+CacheReport connectTarget(const Warp& warp, const WarpGeometry& geometry, const std::string& cacheFile,
+                          std::optional<double> startFrame);
 
 } // namespace quarn

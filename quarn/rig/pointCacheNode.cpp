@@ -29,6 +29,7 @@ HObject pointCacheNode::time;
 HObject pointCacheNode::startFrame;
 HObject pointCacheNode::interpolate;
 HObject pointCacheNode::inMesh;
+HObject pointCacheNode::replacedMesh;
 HObject pointCacheNode::outMesh;
 
 pointCacheNode::pointCacheNode() = default;
@@ -46,7 +47,8 @@ HStatus pointCacheNode::initialize() {
     interpolate = make.boolean("interpolate", "ip", true, {.keyable = false});
     inMesh = make.data("inMesh", "inm", HFnData::kMesh);
     outMesh = make.data("outMesh", "outm", HFnData::kMesh, outputFlags);
-    make.add({cacheFile, time, startFrame, interpolate, inMesh, outMesh});
+    replacedMesh = make.data("replacedMesh", "rm", HFnData::kMesh);
+    make.add({cacheFile, time, startFrame, interpolate, inMesh, outMesh, replacedMesh});
     make.affects({cacheFile, time, startFrame, interpolate, inMesh}, {outMesh});
     return make.status();
 }

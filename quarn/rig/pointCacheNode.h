@@ -41,6 +41,7 @@ public:
     static HObject interpolate;
     static HObject inMesh;
     static HObject outMesh;
+    static HObject replacedMesh; ///< affects nothing and is never evaluated: what the cache stands in for
 
 private:
     HStatus moveToCache(HDataBlock& block, HObject& mesh);

@@ -65,14 +65,22 @@ fs::path besideScene(const fs::path& file, const fs::path& scene) {
 }
 
 std::optional<double> lengthIn(const JsonValue& answer, const char* name) {
-    const bool isThere = answer.HasMember("fit") && answer["fit"].IsObject() && answer["fit"].HasMember(name) &&
-                         answer["fit"][name].IsNumber();
+    const bool isThere = answer.IsObject() && answer.HasMember("fit") && answer["fit"].IsObject() &&
+                         answer["fit"].HasMember(name) && answer["fit"][name].IsNumber();
     return isThere ? std::optional(answer["fit"][name].GetDouble()) : std::nullopt;
 }
 
+CacheFacts cacheIn(const JsonValue& object, const char* node, const std::string& scene) {
+    return {textOf(object, node), besideScene(textOf(object, "cache"), scene), lengthIn(object, "meanMm"),
+            lengthIn(object, "largestMm")};
+}
+
 TargetFacts targetIn(const JsonValue& answer) {
-    return {textOf(answer, "target"), besideScene(textOf(answer, "cache"), textOf(answer, "scene")),
-            lengthIn(answer, "meanMm"), lengthIn(answer, "largestMm")};
+    const std::string scene = textOf(answer, "scene");
+    TargetFacts facts{cacheIn(answer, "target", scene), {}};
+    if (answer.HasMember("skin"))
+        facts.skin = cacheIn(answer["skin"], "node", scene);
+    return facts;
 }
 
 FrameSpan framesIn(const JsonValue& answer) {

@@ -27,11 +27,15 @@ struct FrameSpan {
     int count() const { return last - first + 1; }
 };
 
-/// A target as it is connected: its node, the cache that the scene plays, and how far that is from the skin.
-struct TargetFacts {
+/// A cache as it is connected: its node, the file that the scene plays, and how far that is from the skin.
+struct CacheFacts {
     std::string node;
     std::filesystem::path cache;
     std::optional<double> meanMm, largestMm; ///< where they were compared
+};
+
+struct TargetFacts : CacheFacts {
+    std::optional<CacheFacts> skin; ///< what stands in for quarn's own, and how far from that it is
 };
 
 struct RunFacts {

@@ -174,9 +174,16 @@ void RunFolder::tellOf(const Step& step) const {
             console_.note("  " + line);
     const RunFacts all = facts();
     const auto target = all.targets.find(step.answer.string());
-    if (target != all.targets.end() && target->second.meanMm && target->second.largestMm)
-        console_.note("  the targets are " + numberText(*target->second.meanMm) + " mm from the skin in the mean, " +
-                      numberText(*target->second.largestMm) + " mm at most");
+    if (target == all.targets.end())
+        return;
+    const auto tellDistance = [&](const CacheFacts& cache, const char* what, const char* from) {
+        if (cache.meanMm && cache.largestMm)
+            console_.note(std::string("  ") + what + numberText(*cache.meanMm) + " mm from " + from + " in the mean, " +
+                          numberText(*cache.largestMm) + " mm at most");
+    };
+    if (target->second.skin)
+        tellDistance(*target->second.skin, "the skin is ", "quarn's own");
+    tellDistance(target->second, "the targets are ", "the skin");
 }
 
 double RunFolder::doStep(const Step& step, const std::string& why) {

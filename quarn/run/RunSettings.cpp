@@ -29,9 +29,9 @@ std::string wholeFile(const std::string& word, const fs::path& base) {
     return word.substr(0, begin) + (base / word.substr(begin)).lexically_normal().string();
 }
 
-// of targets each word names a file, whether it is there or not
-void makeWhole(Words& targets, const fs::path& base) {
-    for (std::string& word : targets)
+// of caches each word names a file, whether it is there or not
+void makeWhole(Words& caches, const fs::path& base) {
+    for (std::string& word : caches)
         word = wholeFile(word, base);
 }
 
@@ -79,6 +79,22 @@ void checkRefining(const RunSettings& settings) {
                          std::to_string(settings.rounds()) + " rounds: at most 100 are made");
 }
 
+void checkSkins(const RunSettings& settings) {
+    const bool hasMotion = !settings.motion.empty();
+    if (settings.skins.empty() && settings.motionSkins.empty())
+        return;
+    if (settings.refines())
+        throw UsageError("--skin is not for --refine-to: what is added is not known before, and the skin of it is "
+                         "quarn's own");
+    if (settings.skins.empty())
+        throw UsageError("--motion-skin is the skin of a motion: give that of the poses as well, with --skin");
+    if (hasMotion == settings.motionSkins.empty())
+        throw UsageError(hasMotion ? "--motion has to have a skin as well: give it with --motion-skin"
+                                   : "--motion-skin is the skin of a motion: give it with --motion");
+    if (!settings.hasTargets())
+        throw UsageError("--skin is what corrections are learned on: give it with --targets or a --target-command");
+}
+
 } // namespace
 
 std::int64_t RunSettings::rounds() const {
@@ -103,8 +119,8 @@ void resolve(RunSettings& settings, const fs::path& base) {
     for (fs::path* path : {&settings.character, &settings.parents, &settings.limits, &settings.motion})
         if (!path->empty())
             *path = (base / *path).lexically_normal();
-    makeWhole(settings.targets, base);
-    makeWhole(settings.motionTargets, base);
+    for (Words* caches : {&settings.targets, &settings.motionTargets, &settings.skins, &settings.motionSkins})
+        makeWhole(*caches, base);
     for (Words* words :
          {&settings.importOptions, &settings.poseOptions, &settings.targetOptions, &settings.exportOptions,
           &settings.trainOptions, &settings.renderOptions, &settings.targetCommand})
@@ -119,6 +135,7 @@ void check(const RunSettings& settings) {
     requireRange("seed", settings.seed, 0);
     requireRange("epochs", settings.epochs, 1);
     checkRefining(settings);
+    checkSkins(settings);
     requireRange("target-timeout", settings.targetTimeout, 1);
     requireRange("target-part", settings.targetPart, 1);
     requireOneOf("from", settings.from, {"limits", "animation", "both"});

@@ -20,7 +20,7 @@ struct RunSettings {
     std::optional<double> activationRate, limitRate, scale;
     std::string from, order, axes;
     bool align = false, anyway = false;
-    Words targets, motionTargets; ///< FILE, or MESH=FILE
+    Words targets, motionTargets, skins, motionSkins; ///< FILE, or MESH=FILE
     Words targetCommand;
     Words importOptions, poseOptions, targetOptions, exportOptions, trainOptions,
         renderOptions; ///< words for these commands
@@ -53,6 +53,8 @@ void visitSettings(const Visit& visit) {
     visit("motion", &Settings::motion, "KEYS", "A motion that is never trained, as for quarn pose --keys");
     visit("targets", &Settings::targets, "[MESH=]FILE", "The shapes of the poses, a point cache; may be repeated");
     visit("motion-targets", &Settings::motionTargets, "[MESH=]FILE", "The shapes of the motion, likewise");
+    visit("skin", &Settings::skins, "[MESH=]FILE", "The skin of the poses in the place of quarn's own, likewise");
+    visit("motion-skin", &Settings::motionSkins, "[MESH=]FILE", "That of the motion, likewise");
     visit("target-timeout", &Settings::targetTimeout, "SECONDS", "How long a target command may take [without end]");
     visit("target-part", &Settings::targetPart, "N", "Frames that a target command is asked for at once [all]");
     visit("order", &Settings::order, "scene|file|rest", "Whose vertices targets, and the skins for them, have [scene]");

@@ -54,23 +54,24 @@ bool hasFlag(const Words& words, const Words& flags) {
     });
 }
 
-// of one mesh: whole paths by its name, or one without a name that is for the only mesh there is
-std::map<std::string, fs::path> filesByMesh(const Words& targets, const CharacterFacts& character) {
+// of one mesh: whole paths by its name, or one without a name that is for the only mesh there is; `what` they hold
+std::map<std::string, fs::path> filesByMesh(const Words& caches, const CharacterFacts& character,
+                                            const std::string& what) {
     Words names;
     for (const MeshFacts& mesh : character.meshes)
         names.push_back(mesh.name);
     std::map<std::string, fs::path> files;
-    for (const std::string& word : targets) {
+    for (const std::string& word : caches) {
         const std::size_t equals = word.front() == '/' ? std::string::npos : word.find('=');
         const std::string mesh = equals == std::string::npos ? names.front() : word.substr(0, equals);
         if (equals == std::string::npos && names.size() > 1)
-            throw std::runtime_error("the character has several meshes, " + joined(names) + ": whose targets are in " +
-                                     word + "? Give them as MESH=FILE");
+            throw std::runtime_error("the character has several meshes, " + joined(names) + ": whose " + what +
+                                     " are in " + word + "? Give them as MESH=FILE");
         if (std::find(names.begin(), names.end(), mesh) == names.end())
-            throw std::runtime_error("there are targets of \"" + mesh + "\", and no mesh of that name that " +
+            throw std::runtime_error("there are " + what + " of \"" + mesh + "\", and no mesh of that name that " +
                                      "something moves; there is " + joined(names));
         if (!files.emplace(mesh, equals == std::string::npos ? word : word.substr(equals + 1)).second)
-            throw std::runtime_error("there are two files with targets of " + mesh);
+            throw std::runtime_error("there are two files with " + what + " of " + mesh);
     }
     return files;
 }
@@ -264,17 +265,17 @@ private:
 
     void targets() {
         makeTargets("targets", "poses", settings_.targets, posed_.frames, {});
-        connectTargets("target", "poses");
+        connectTargets("target", "poses", settings_.skins);
         if (!hasHeldScene())
             return;
         makeTargets("motion-targets", "motion", settings_.motionTargets, *facts_.motion, {});
-        connectTargets("motion-target", "motion");
+        connectTargets("motion-target", "motion", settings_.motionSkins);
     }
 
     // `frames` are those that are made; those of the scene `known` are there
     void makeTargets(const char* name, const std::string& scene, const Words& given, const FrameSpan& frames,
                      const std::string& known) {
-        const std::map<std::string, fs::path> files = filesByMesh(given, *facts_.character);
+        const std::map<std::string, fs::path> files = filesByMesh(given, *facts_.character, "targets");
         eachChosen([&](const MeshFacts& mesh) {
             const auto file = files.find(mesh.name);
             if (file == files.end() && settings_.targetCommand.empty())
@@ -289,8 +290,9 @@ private:
         return dataOf(mesh) + "/" + scene + "_target.npy";
     }
 
-    // those that were made
-    void connectTargets(const char* name, const std::string& scene) {
+    // those that were made, and skins that were given
+    void connectTargets(const char* name, const std::string& scene, const Words& skins) {
+        const std::map<std::string, fs::path> skinOf = filesByMesh(skins, *facts_.character, "skins");
         eachChosen([&](const MeshFacts& mesh) {
             const fs::path& cache = caches_.at(mesh.name);
             const std::string output = scene + "." + mesh.name + ".json";
@@ -298,6 +300,8 @@ private:
                                       {"target", scene + ".json", "--cache", cache.string(), "--geometry", mesh.name,
                                        "--order", settings_.order.empty() ? "scene" : settings_.order, "-o", output},
                                       {scene + ".json", cache}, {output}, posed_.round);
+            if (const auto skin = skinOf.find(mesh.name); skin != skinOf.end())
+                appendFile(step, "--skin", skin->second);
             if (!settings_.axes.empty())
                 append(step.words, {"--axes", settings_.axes});
             if (settings_.scale)
@@ -350,6 +354,20 @@ private:
         return isKnown;
     }
 
+    // the files that such a scene plays
+    std::vector<fs::path> playedBy(const std::string& scene, const MeshFacts& mesh) const {
+        const TargetFacts& facts = *targetOf(scene, mesh);
+        std::vector<fs::path> files{scene + "." + mesh.name + ".json", facts.cache};
+        if (facts.skin)
+            files.push_back(facts.skin->cache);
+        return files;
+    }
+    // what is learned on, in such a scene
+    std::string skinPlug(const std::string& scene, const MeshFacts& mesh) const {
+        const TargetFacts& facts = *targetOf(scene, mesh);
+        return facts.skin ? facts.skin->node + ".outMesh" : mesh.skin + ".outputGeom[0]";
+    }
+
     // --- rounds that add poses where models disagree ---
 
     // false where no more can be told
@@ -375,7 +393,7 @@ private:
         const FrameSpan added{before.frames.last + 1, posed_.frames.last};
         skins("skin", scene, added);
         makeTargets("targets", scene, {}, added, before.scene);
-        connectTargets("target", scene);
+        connectTargets("target", scene, {});
         return true;
     }
 
@@ -439,7 +457,7 @@ private:
             add(name, &mesh,
                 {"export", file, "--geometry", mesh.name, "--frames", framesText(frames), "-o", folder,
                  "--overwrite"}, // the ledger knows whether it is to be made again; what was begun is gone on with
-                {file, targetOf(scene, mesh)->cache}, setFiles(folder));
+                playedBy(scene, mesh), setFiles(folder));
         addKind(step, mesh);
         if (settings_.anyway)
             step.words.emplace_back("--anyway");
@@ -474,19 +492,23 @@ private:
     void measure(const MeshFacts& mesh, const FrameSpan& held) {
         const std::string scene = heldScene() + "." + mesh.name + ".json";
         const std::string data = dataOf(mesh) + "/";
-        const TargetFacts& target = *targetOf(heldScene(), mesh);
-        addPoints("held-out-skin", mesh, scene, mesh.skin + ".outputGeom[0]", held, data + "heldOut_skin.npy", "scene");
-        addPoints("held-out-target", mesh, scene, target.node + ".outMesh", held, data + "heldOut_target.npy", "scene")
-            .inputs.push_back(target.cache);
+        const std::string model = "models/" + mesh.name + ".nwrp";
+        const std::vector<fs::path> played = playedBy(heldScene(), mesh);
+        addPoints("held-out-skin", mesh, scene, skinPlug(heldScene(), mesh), held, data + "heldOut_skin.npy", "scene")
+            .inputs = played;
+        addPoints("held-out-target", mesh, scene, targetOf(heldScene(), mesh)->node + ".outMesh", held,
+                  data + "heldOut_target.npy", "scene")
+            .inputs = played;
         for (const char* evaluator : {"cpu", "gpu"}) {
             const std::string points = data + "heldOut_" + evaluator + ".npy";
             addAnswering(std::string(evaluator) == "cpu" ? "play" : "play-gpu", &mesh,
                          {"play", scene, "--geometry", mesh.name, "--model", mesh.name, "--against", "target",
                           "--frames", framesText(held), "--repeat", "3", "--evaluator", evaluator, "-o", points},
-                         {scene, target.cache, "models/" + mesh.name + ".nwrp"}, {points});
+                         {}, {points})
+                .inputs = played;
+            plan_.back().inputs.emplace_back(model);
         }
         const std::string set = dataOf(mesh) + "/heldOut";
-        const std::string model = "models/" + mesh.name + ".nwrp";
         std::vector<fs::path> inputs = setFiles(set);
         inputs.emplace_back(model);
         addAnswering("evaluate", &mesh, {"evaluate", set, model}, inputs, {}).program = Program::trainer;
@@ -512,13 +534,14 @@ private:
     void draw(const char* name, const MeshFacts& mesh, const FrameSpan& held, int step, const char* size,
               const std::string& file) {
         const std::string scene = heldScene() + "." + mesh.name + ".json";
-        const TargetFacts& facts = *targetOf(heldScene(), mesh);
         const auto& meshes = facts_.character->meshes;
         const auto isThis = [&](const MeshFacts& other) { return other.name == mesh.name; };
         const auto index = std::find_if(meshes.begin(), meshes.end(), isThis) - meshes.begin();
         const std::string result = "warp.outputGeom[" + std::to_string(index) + "]";
-        const std::string skin = mesh.skin + ".outputGeom[0]";
-        const std::string target = facts.node + ".outMesh";
+        const std::string skin = skinPlug(heldScene(), mesh);
+        const std::string target = targetOf(heldScene(), mesh)->node + ".outMesh";
+        std::vector<fs::path> inputs = playedBy(heldScene(), mesh);
+        inputs.emplace_back("models/" + mesh.name + ".nwrp");
         std::vector<fs::path> files;
         for (const int frame : drawnFrames(held, step))
             files.push_back(pictureFile(file, frame));
@@ -533,7 +556,7 @@ private:
                                           "--heat",     "before=" + skin + ":" + target,
                                           "--heat",     "after=" + result + ":" + target,
                                           "-o",         file + ".####.png"},
-                            {scene, facts.cache, "models/" + mesh.name + ".nwrp"}, files);
+                            std::move(inputs), files);
         append(drawing.words, settings_.renderOptions);
     }
 
@@ -595,7 +618,7 @@ const Words& stepNames() {
 }
 
 MeshChoice chooseMeshes(const RunSettings& settings, const CharacterFacts& character) {
-    const std::map<std::string, fs::path> files = filesByMesh(settings.targets, character);
+    const std::map<std::string, fs::path> files = filesByMesh(settings.targets, character, "targets");
     MeshChoice choice;
     for (const MeshFacts& mesh : character.meshes)
         (!settings.targetCommand.empty() || files.count(mesh.name) > 0 ? choice.chosen : choice.leftOut)

@@ -55,9 +55,12 @@ HObject meshBehind(const HPlug& geometry) {
         HObject node = plug.node();
         if (nodeType(node) == "mesh" || nodeType(node) == "polyGrid")
             return node;
-        if (!plug.isElement())
+        if (nodeType(node) == "pointCache")
+            plug = sourceOf(node, "inMesh");
+        else if (plug.isElement())
+            plug = sourceOf(node, element("input", plug.logicalIndex()) + ".inputGeometry");
+        else
             break;
-        plug = sourceOf(node, element("input", plug.logicalIndex()) + ".inputGeometry");
     }
     return {};
 }

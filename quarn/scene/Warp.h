@@ -40,7 +40,7 @@ struct Warp {
 };
 
 /// The mesh node that a chain of deformers begins with, which gives out this plug: upwards by the geometry that each
-/// one gets. Null when there is none. Thread: main.
+/// one gets, through point caches as well. Null when there is none. Thread: main.
 HObject meshBehind(const HPlug& geometry);
 
 } // namespace quarn

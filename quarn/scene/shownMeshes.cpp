@@ -2,6 +2,7 @@
 #include "quarn/scene/shownMeshes.h"
 
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/replacedSkins.h"
 
 #include "openquarn/HPxGeometryFilter.h"
 
@@ -10,7 +11,8 @@ namespace {
 
 constexpr int longestChain = 1000;
 
-// What the deformer that the plug goes into gives out, the last one where there are several; null without one.
+// What the deformer that the plug goes into gives out, or the cache that stands in for it; the last one where there are
+// several, null without one.
 // `serves` is set when something else takes it.
 HPlug deformedOf(const HPlug& geometry, bool& serves) {
     HPlugArray destinations;
@@ -20,6 +22,8 @@ HPlug deformedOf(const HPlug& geometry, bool& serves) {
         if (destination == HPxGeometryFilter::inputGeometry)
             deformed = HPlug(destination.node(), HPxGeometryFilter::outputGeom)
                            .elementByLogicalIndex(destination.parent().logicalIndex());
+        else if (const HPlug cached = replacementAt(destination); !cached.isNull())
+            deformed = cached;
         else
             serves = true;
     }

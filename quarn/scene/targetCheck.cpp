@@ -91,7 +91,8 @@ std::size_t affordableReach(std::size_t vertices) {
 
 std::optional<TargetFit> compareWithSkin(OpenQuarn::Session& host, const WarpGeometry& geometry, const HPlug& rest,
                                          const TargetFrames& frames, const Console& console) {
-    const Stage stage([&] { return "comparing the target of " + geometry.name + " with its skin"; });
+    const Stage stage(
+        [&] { return std::string("comparing the ") + frames.role + " of " + geometry.name + " with its skin"; });
     const AtOtherTimes later(host);
     const HostErrors errors;
     std::string problem;
@@ -108,7 +109,8 @@ std::optional<TargetFit> compareWithSkin(OpenQuarn::Session& host, const WarpGeo
     } catch (const std::exception& error) {
         problem = errors.text().empty() ? error.what() : errors.text();
     }
-    console.warn("the target of " + geometry.name + " was not compared with the skin: " + problem);
+    console.warn(std::string("the ") + frames.role + " of " + geometry.name +
+                 " was not compared with the skin: " + problem);
     return {};
 }
 

@@ -27,14 +27,15 @@ struct TargetFrames {
     FitInput::Read read;                           ///< x, y, z of each vertex of the mesh
     std::function<double(std::size_t frame)> time; ///< of the scene
     std::vector<std::size_t> vertices;             ///< that count, each below those of the mesh; empty: all
+    const char* role = "target";                   ///< what they are of the geometry, for the log and warnings
 };
 
 /// So many frames early or late can be tried in a second or two: 50 for most meshes, 3 at least.
 std::size_t affordableReach(std::size_t vertices);
 
-/// Compares, with the scene at other times meanwhile. None, and a warning with the reason, when the skin or the target
-/// cannot be had in one of these frames, or the skin has another number of vertices than `rest`, the mesh at rest.
-/// Throws Interrupted. Thread: main.
+/// Compares with geometry.input, with the scene at other times meanwhile. None, and a warning with the reason, when the
+/// skin or the target cannot be had in one of these frames, or the skin has another number of vertices than `rest`, the
+/// mesh at rest. Throws Interrupted. Thread: main.
 std::optional<TargetFit> compareWithSkin(OpenQuarn::Session& host, const WarpGeometry& geometry, const HPlug& rest,
                                          const TargetFrames& frames, const Console& console);
 

@@ -207,7 +207,7 @@ TEST_F(SmoothingTest, ChoosesSurfaceForWhatTurnsWithTheSkinAndOffsetForWhatFolds
     save(frames, foldScript);
     flags = to("fold");
     exported(flags);
-    EXPECT_THAT(said, HasSubstr("warning: Surface deltas with 0 smoothing passes move geometry0 in jumps"));
+    EXPECT_THAT(said, HasSubstr("warning: Surface deltas with 0 smoothing passes move strip in jumps"));
     EXPECT_FALSE(answer.choice);
     flags = to("chosen");
     flags.smoothing = "auto";

@@ -2,7 +2,9 @@
 // quarn target: caches with a mistake in them, of the posed strip.
 #include "PoseTest.h"
 
+#include "quarn/pose/skinCache.h"
 #include "quarn/scene/meshes.h"
+#include "quarn/scene/shownMeshes.h"
 #include "storage/NpyFile.h"
 #include "support/rawCache.h"
 
@@ -46,8 +48,10 @@ protected:
         return path("cache.npy");
     }
     std::string target(const std::string& flags) const {
-        std::vector<std::string> arguments{"target", path("posed.json"), "--cache", path("cache.npy"),
-                                           "-o",     path("aimed.json"), "--json"};
+        return connected("--cache " + path("cache.npy") + " " + flags);
+    }
+    std::string connected(const std::string& flags) const {
+        std::vector<std::string> arguments{"target", path("posed.json"), "-o", path("aimed.json"), "--json"};
         std::istringstream words(flags);
         for (std::string word; words >> word;)
             arguments.push_back(word);
@@ -157,6 +161,59 @@ TEST_F(TargetAimTest, WhatCannotBeComparedIsTaken) {
                       "createNode mesh -name none; connectAttr -force none.outMesh warp.input[0].inputGeometry");
     EXPECT_THAT(target("--align"), HasSubstr("\"fit\": null"));
     EXPECT_THAT(bytes(path("aimed.json")), HasSubstr("_target"));
+}
+
+// a skin of another kind may be far from quarn's own, but is that of this character in these poses; targets are
+// compared with it from then on
+TEST_F(TargetAimTest, SkinsTakeThePlaceOfTheScenesOwn) {
+    Frames swollen = right_; // but for its first frame, at rest
+    for (std::size_t frame = 1; frame < poses; ++frame)
+        for (std::size_t i = 0; i < swollen[frame].size(); ++i)
+            swollen[frame][i] += 1.5F * std::sin(static_cast<float>(7 * i));
+    const auto place = [&](const Frames& frames, const std::string& name) {
+        writeRawCache(path(name), frames);
+        return "--skin " + path(name);
+    };
+    cache(right_);
+    const std::string far = place(swollen, "far.npy");
+    ::testing::internal::CaptureStderr();
+    const std::string first = connected(far);
+    EXPECT_THAT(::testing::internal::GetCapturedStderr(), HasSubstr("mm from quarn's own skin in the mean"));
+    EXPECT_THAT(first, AllOf(HasSubstr("\"node\": \"strip_skinCache\""), HasSubstr("\"replaced\": false")));
+    EXPECT_THAT(first, ::testing::Not(HasSubstr("\"target\"")));
+
+    std::filesystem::copy_file(path("aimed.json"), path("posed.json"),
+                               std::filesystem::copy_options::overwrite_existing);
+    const std::string both = connected(place(right_, "near.npy") + " --cache " + path("cache.npy"));
+    EXPECT_THAT(both, AllOf(HasSubstr("\"replaced\": true"), HasSubstr("\"meanMm\": 0.0,")));
+    {
+        const auto session = open("aimed.json");
+        const quarn::Warp warp = quarn::Warp::find();
+        const quarn::WarpGeometry& strip = warp.geometry("strip");
+        EXPECT_EQ(quarn::nodesOfType("pointCache").size(), 2U);
+        EXPECT_EQ(quarn::textOf(quarn::findPlug("strip_skinCache.cacheFile")), "near.npy");
+        EXPECT_EQ(strip.original.source(), quarn::findPlug("strip.outMesh"));
+        EXPECT_EQ(quarn::ownSkin(strip), quarn::findPlug("strip_skin.outputGeom[0]"));
+        EXPECT_EQ(quarn::shownMeshes(), std::vector<HPlug>{strip.output});
+        session->host().setTime(7.0);
+        Frame input;
+        quarn::readPoints(strip.input, input);
+        EXPECT_EQ(input, right_[6]);
+    }
+    const std::string before = bytes(path("aimed.json"));
+    Frames elsewhere = right_;
+    for (Frame& frame : elsewhere)
+        for (std::size_t i = 0; i < frame.size(); i += 3)
+            frame[i] += 0.9F * static_cast<float>(i % 2);
+    Frames less = right_;
+    for (Frame& frame : less)
+        frame.resize(frame.size() - 3);
+    for (const auto& [skin, says] : {std::pair(place(elsewhere, "elsewhere.npy"), "where the skin is at rest"),
+                                     std::pair(place(posed("other.json", "2"), "other.npy"), "do not belong"),
+                                     std::pair(place(mixed(right_), "mixed.npy"), "--order rest"),
+                                     std::pair(place(less, "less.npy"), "has 17 vertices, and strip has 18")})
+        EXPECT_THAT(failureOf([&, &flags = skin] { connected(flags); }), HasSubstr(says));
+    EXPECT_EQ(bytes(path("aimed.json")), before);
 }
 
 } // namespace

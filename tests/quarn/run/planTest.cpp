@@ -24,7 +24,8 @@ RunFacts factsOf(const std::vector<std::string>& meshes) {
     for (const std::string& mesh : meshes) {
         facts.character->meshes.push_back({mesh, mesh + "_skin", 10, 12});
         for (const char* step : {"target", "target-1", "target-2", "motion-target"})
-            facts.targets[answerFile(step, mesh).string()] = {mesh + "_target", "/caches/" + mesh + ".npy", {}, {}};
+            facts.targets[answerFile(step, mesh).string()] = {{mesh + "_target", "/caches/" + mesh + ".npy", {}, {}},
+                                                              {}};
     }
     facts.poses = {1, 44};
     facts.motion = {1, 120};
@@ -55,6 +56,13 @@ void addInRounds(RunSettings& settings) {
     settings.ensemble = 2;
 }
 
+void giveSkins(RunSettings& settings) {
+    settings.motion = "/rigs/keys.json";
+    settings.targetCommand = {"make"};
+    settings.skins = {"arm=/caches/dual.npy"};
+    settings.motionSkins = {"arm=/caches/motion_dual.npy"};
+}
+
 const std::vector<Kind>& kinds() {
     static const std::vector<Kind> all = {
         {"no targets", {"arm"}, [](RunSettings&) {}},
@@ -67,6 +75,7 @@ const std::vector<Kind>& kinds() {
              s.targetCommand = {"make"};
          }},
         {"rounds", {"arm", "eye"}, addInRounds},
+        {"skins", {"arm", "eye"}, giveSkins},
         {"caches of one of two", {"eye", "arm"}, [](RunSettings& s) {
              s.motion = "/rigs/keys.json";
              s.targets = {"arm=/caches/arm.npy"};
@@ -142,6 +151,33 @@ TEST(Plan, HoldsTheLastPosesOut) {
                 EXPECT_EQ(framesOf(step), isTrained ? set : held);
             }
         }
+    }
+}
+
+// whatever plays a scene with a skin depends on its file, and is of that skin; a target command gets quarn's own
+TEST(Plan, SkinsThatAreGivenAreLearnedOn) {
+    RunFacts facts = factsOf({"arm", "eye"});
+    for (const char* step : {"target", "motion-target"})
+        facts.targets[answerFile(step, "arm").string()].skin = {"arm_skinCache", "caches/arm.npy", {}, {}};
+    const auto has = [](const auto& list, const std::string& word) {
+        return std::find(list.begin(), list.end(), word) != list.end();
+    };
+    for (const Step& step : planOf(settingsWith(giveSkins), facts)) {
+        SCOPED_TRACE(step.label());
+        const bool isArm = step.mesh == "arm";
+        EXPECT_EQ(has(step.words, "/caches/dual.npy"), isArm && step.name == "target");
+        EXPECT_EQ(has(step.inputs, "/caches/motion_dual.npy"), isArm && step.name == "motion-target");
+        const std::set<std::string> playing = {"export", "held-out", "held-out-skin",  "held-out-target",
+                                               "play",   "play-gpu", "moving-picture", "pictures"};
+        EXPECT_EQ(has(step.inputs, "caches/arm.npy"), isArm && playing.count(step.name) > 0);
+        if (step.name == "held-out-skin") {
+            EXPECT_TRUE(has(step.words, isArm ? "arm_skinCache.outMesh" : "eye_skin.outputGeom[0]"));
+        }
+        if (step.name == "pictures") {
+            EXPECT_TRUE(has(step.words, isArm ? "skin=arm_skinCache.outMesh" : "skin=eye_skin.outputGeom[0]"));
+        }
+        EXPECT_EQ(has(step.words, "arm_skin.outputGeom[0]"),
+                  isArm && (step.name == "skin" || step.name == "motion-skin"));
     }
 }
 
@@ -286,6 +322,11 @@ TEST(Settings, ThatNoRunCanHaveAreRefusedWithTheirValue) {
         {[](RunSettings& s) { s.motion = "/k", s.targets = {"/x"}; }, "--motion has to have targets as well"},
         {[](RunSettings& s) { s.motion = "/k", s.heldOut = 9; }, "not both"},
         {[](RunSettings& s) { s.motionTargets = {"/x"}; }, "give it with --motion"},
+        {[](RunSettings& s) { s.skins = {"/x"}; }, "give it with --targets"},
+        {[](RunSettings& s) { giveSkins(s), s.motionSkins.clear(); }, "--motion has to have a skin as well"},
+        {[](RunSettings& s) { giveSkins(s), s.motion.clear(); }, "--motion-skin is the skin of a motion: give it with"},
+        {[](RunSettings& s) { giveSkins(s), s.skins.clear(); }, "give that of the poses as well"},
+        {[](RunSettings& s) { addInRounds(s), s.skins = {"/x"}; }, "--skin is not for --refine-to"},
         {[](RunSettings& s) { s.targetPart = 9; }, "are for a --target-command"},
         {[](RunSettings& s) { s.refineTo = 60; }, "--refine-to needs a --target-command"},
         {[](RunSettings& s) { addInRounds(s), s.refineTo = 44; }, "refine-to is 44, and there are 44 samples"},

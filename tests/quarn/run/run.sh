@@ -16,7 +16,7 @@ set -e
 field() { sed -n "s/.*\"$1\": \"\(.*\)\".*/\1/p" "$request"; }
 request=$1
 echo "asked for $(tr -d ' \n' <"$request" | grep -o '"frames":[^]]*]')"
-[ ! -e "$(dirname "$0")/wait" ] || { echo waiting; sleep 1000; }
+[ ! -e "$(dirname "$0")/wait" ] || { echo waiting; exec sleep 1000; }
 [ -e "$(dirname "$0")/go" ] || { echo "not yet"; exit 5; }
 # the file of the skin is what is to be written, as long as all is asked for
 sed -n '/"skin"/,/}/s/.*"file": "\(.*\)",/\1/p' "$request" | xargs -I{} cp {} "$(field write)"
@@ -109,6 +109,16 @@ sed 's|"targets": .*|"target-command": ["true"]}|' recipes/bone.json >recipes/co
 expect 1 '' 'command\.json would start a program .*: --allow-commands lets it' run --recipe recipes/command.json -o file
 expect 1 '' 'targets ended with status 0, and has not written the file' \
   run --recipe recipes/command.json -o other --allow-commands
+
+# --- a skin in a file: what is learned on, and compared with; it counts as targets do ---
+cp cache.npy dual.npy
+skinned=(run --recipe recipes/bone.json --skin dual.npy --until held-out -o skinned)
+expect 0 '' 'target .*\n(  the skin is .*)?(.|\n)*held-out .*s\n$' "${skinned[@]}"
+expect 0 'mesh\): .* skin .*dual\.npy, ' '' info skinned/poses.mesh.json
+expect 0 '' '^7 of 7 steps were done already\n$' "${skinned[@]}"
+cp moved/data/mesh/rest.npy dual.npy
+expect 0 'target: to do, as its input .*/dual\.npy has changed' '' "${skinned[@]}" --explain
+expect 1 '' 'target ended with status 1\n(.|\n)*the skin is at rest in all of them' "${skinned[@]}"
 
 # --- targets in a file a frame: each of them counts ---
 expect 0 '' 'wrote 9 frames' bake moved/poses.mesh.json mesh_target.outMesh --frames 1-9 -o 'seq.##.obj'
