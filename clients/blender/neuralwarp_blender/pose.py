@@ -14,6 +14,8 @@ from .model_folder import NotUsable
 
 Array = NDArray[np.float64]
 
+# row and column one and two further on, around a matrix of 3 x 3
+ONE_ON, TWO_ON = (np.ix_(turn, turn) for turn in ((1, 2, 0), (2, 0, 1)))
 ATTRIBUTES = [kind + axis for kind in ("translate", "rotate", "scale") for axis in "XYZ"]
 
 
@@ -70,8 +72,9 @@ class JointSetter:
 
 
 def cofactors(axes: Array) -> Array:
-    """Of [J, 3, 3]: the cross products of the two other rows, in turn."""
-    return np.cross(axes[:, (1, 2, 0)], axes[:, (2, 0, 1)])
+    """Of [J, 3, 3]: the cross products of the two other rows, in turn. (np.cross takes four times as long.)"""
+    (row, column), (next_row, next_column) = ONE_ON, TWO_ON
+    return axes[:, row, column] * axes[:, next_row, next_column] - axes[:, row, next_column] * axes[:, next_row, column]
 
 
 def inverses(matrices: Array) -> Array:

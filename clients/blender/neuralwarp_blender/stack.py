@@ -152,6 +152,8 @@ def check_object(thing: Any) -> None:
         raise Refused(f"{thing.name} is linked from {thing.library.filepath}: make a library override of it first")
     if thing.mode == "EDIT":
         raise Refused(f"{thing.name} is in edit mode: leave it first")
+    if hasattr(thing, "neuralwarp") and thing.neuralwarp.in_use:  # what there is to learn is off
+        raise Refused(f"{thing.name} is in use with {thing.neuralwarp.model}: stop that first")
     if thing.show_only_shape_key:
         raise Refused(f"{thing.name} shows one shape key alone: switch this off first")
     if not thing.data.polygons:
