@@ -9,7 +9,7 @@ import bpy
 
 from . import live, module, muting
 
-LINE = 46  # characters that a sidebar of the usual width shows
+MARGIN, LETTER = 65.0, 6.4  # pixels of a region that no text has, with an icon; and of a letter, at a scale of 1
 
 
 class SidebarPanel:
@@ -19,9 +19,11 @@ class SidebarPanel:
 
 
 def write(layout: Any, text: str, icon: str = "NONE") -> None:
-    """A text of any length: a panel breaks no lines by itself."""
+    """A text of any length: a panel breaks no lines by itself, and leaves out the middle of long ones."""
+    region, scale = bpy.context.region, bpy.context.preferences.system.ui_scale
+    letters = int((region.width / scale - MARGIN) / LETTER) if region else 0
     column = layout.column(align=True)
-    for number, line in enumerate(textwrap.wrap(text, LINE)):
+    for number, line in enumerate(textwrap.wrap(text, max(letters, 20))):
         column.label(text=line, icon=icon if number == 0 else "BLANK1" if icon != "NONE" else "NONE")
 
 

@@ -9,6 +9,7 @@ import sys
 from pathlib import Path
 from typing import Any
 
+import neuralwarp
 import numpy as np
 
 ROOT = Path(__file__).resolve().parents[3]
@@ -32,7 +33,7 @@ def network(weights: np.ndarray) -> bytes:
 
 
 def publish_arm(thing: Any, folder: Path, quarn: str) -> None:
-    """Writes folder, NAME.nwrp, for the object of rebuild_arm()."""
+    """Writes folder, NAME.nwrp, for the object of rebuild_arm(), or what became of it."""
     looked = stack.read_stack(thing)
     armature = next(modifier.object for modifier in thing.modifiers if modifier.type == "ARMATURE")
     with stack.Switches(thing) as switches:
@@ -46,9 +47,11 @@ def publish_arm(thing: Any, folder: Path, quarn: str) -> None:
         "vertices": len(made.points), "topology": stack.topology(thing.data), "metersPerUnit": 1.0,
         "bones": [{"bone": joint.bone, "joint": joint.name} for joint in made.joints],
         "muted": {"modifiers": list(looked.muted_modifiers), "shapeKeys": list(looked.shape_keys)}}))
-    controls, count = 12, len(made.points)  # two axes each of forearm and hand
+    with neuralwarp.Scene.open(folder / "rig" / "scene.json") as scene:
+        controls, rest = len(scene.controls()), scene.points(f"{made.mesh}.outMesh")
+    count = len(rest)  # without those that the scene has joined
     weights = np.full((controls, SHAPES), 0.25) * [1.0, -1.0]
-    outwards = made.points * [0.0, 0.2, 0.2]
+    outwards = rest * [0.0, 0.2, 0.2]
     shapes = np.stack([outwards, np.tile([0.0, 0.0, 0.01], (count, 1))]).reshape(SHAPES, -1)
     (folder / "model.onnx").write_bytes(network(weights))
     (folder / "principal_shapes.json").write_text(json.dumps(

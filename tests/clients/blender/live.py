@@ -22,7 +22,7 @@ sys.path[:0] = [str(HERE), str(ROOT / "clients" / "blender"), str(MODULE)]
 import arm_model  # noqa: E402
 import neuralwarp  # noqa: E402
 import neuralwarp_blender  # noqa: E402
-from neuralwarp_blender import bake, live, module, pose, stack  # noqa: E402
+from neuralwarp_blender import bake, deformation, live, module, pose, stack  # noqa: E402
 from neuralwarp_blender.deformation import Points  # noqa: E402
 from rebuilt_arm import arm_points, rebuild_arm  # noqa: E402
 
@@ -124,6 +124,26 @@ def test_result() -> None:
     arm().neuralwarp.vertex_group = "none"
     points()
     assert "no vertex group none" in live.problem(arm())
+
+
+def test_seams() -> None:
+    """Vertices that the scene joins, as they lie at one place with one skin, move as one."""
+    open_arm()
+    whole = points()
+    bpy.ops.neuralwarp.stop()
+    count = len(whole)
+    cut = bmesh.new()
+    cut.from_mesh(arm().data)
+    bmesh.ops.split_edges(cut, edges=[edge for edge in cut.edges if edge.calc_face_angle() > 0.15])
+    cut.to_mesh(arm().data)
+    folder = FOLDER / "seam.nwrp"
+    arm_model.publish_arm(arm(), folder, str(QUARN))
+    bpy.ops.neuralwarp.use(model=str(folder))
+    found = points()
+    assert len(found) > count + 100 and not live.problem(arm()), live.problem(arm())
+    _, twin = np.unique(np.round(deformation.rest_points(arm()), 6), axis=0, return_inverse=True)
+    _, wanted = np.unique(np.round(arm_points(), 6), axis=0, return_inverse=True)
+    assert np.abs(found - whole[np.argsort(wanted)][twin]).max() < 1e-6
 
 
 def test_render() -> None:
