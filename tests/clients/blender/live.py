@@ -121,6 +121,17 @@ def test_result() -> None:
     rest = np.empty(3 * len(weights), dtype=np.float32)
     arm().data.vertices.foreach_get("co", rest)
     assert np.array_equal(rest.reshape(-1, 3), arm_points().astype(np.float32))  # the original mesh
+    arm().neuralwarp.vertex_group = ""
+    for frame, envelope in ((1, 0.0), (3, 1.0)):  # nothing else moves
+        arm().neuralwarp.envelope = envelope
+        arm().keyframe_insert("neuralwarp.envelope", frame=frame)
+    arm().animation_data.action.fcurves[0].keyframe_points[0].interpolation = "LINEAR"
+    go_to(2)
+    half = points()
+    assert np.array_equal(expected(shown("ARMATURE"), envelope=0.5), half)
+    shown("NEURAL")
+    go_to(3)
+    assert np.array_equal(points(), by_hand)
     arm().neuralwarp.vertex_group = "none"
     points()
     assert "no vertex group none" in live.problem(arm())
@@ -210,8 +221,11 @@ def test_refusals() -> None:
     assert "model.onnx" in refused(lambda: bpy.ops.neuralwarp.use(model=str(bad)))
     other = bpy.data.objects.new("other", arm().data)
     assert "too, whose shape keys" in refused(lambda: bpy.ops.neuralwarp.use(model="arm.nwrp")) and other
-    said = module.explanation(ImportError("no"))
-    assert "CPython 3." in said and "no" in said, said
+    assert "is not installed for this Python (CPython 3." in module.explanation(ImportError("no"))
+    (FOLDER / "neuralwarp").mkdir()
+    (FOLDER / "neuralwarp" / "_core.cpython-399-x86_64-linux-gnu.so").touch()
+    module.LIBRARY = FOLDER
+    assert "is for cpython-399-x86_64-linux-gnu; this Blender has CPython 3." in module.explanation(ImportError("no"))
 
 
 def test_life() -> None:
