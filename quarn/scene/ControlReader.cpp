@@ -8,36 +8,41 @@
 
 #include <cmath>
 #include <stdexcept>
+#include <utility>
 
 namespace quarn {
-namespace {
-
-float narrowed(double value, const std::string& what) {
-    const auto number = static_cast<float>(value);
-    if (!std::isfinite(number))
-        throw std::runtime_error(what + " is " + std::to_string(value) + ", which is no number to train with");
-    return number;
-}
-
-} // namespace
 
 void ControlReader::read() {
-    const HPlug values = warp_.plug("controlValues");
+    if (array_.isNull())
+        array_ = warp_.plug("controlValues");
     // elements that come along a connection are there afterwards
-    if (const HStatus status = OpenQuarn::evaluate(values); status.error())
-        throw std::runtime_error(std::string(values.name().asChar()) +
+    if (const HStatus status = OpenQuarn::evaluate(array_); status.error())
+        throw std::runtime_error(std::string(array_.name().asChar()) +
                                  " could not be evaluated: " + status.errorString().asChar());
-    const std::vector<unsigned> indices = indicesOf(values);
-    if (!names_.empty() && indices.size() != names_.size())
-        throw std::runtime_error(warp_.name + ".controlValues has " + std::to_string(indices.size()) +
+    if (std::vector<unsigned> indices = indicesOf(array_); indices != indices_ || plugs_.empty())
+        takeElements(std::move(indices));
+    if (!names_.empty() && plugs_.size() != names_.size())
+        throw std::runtime_error(warp_.name + ".controlValues has " + std::to_string(plugs_.size()) +
                                  " values, and had " + std::to_string(names_.size()) + " in the first frame");
     values_.clear();
-    values_.reserve(indices.size());
-    for (std::size_t i = 0; i < indices.size(); ++i) {
-        const HPlug value = values.elementByLogicalIndex(indices[i]);
-        const std::string name = value.name().asChar();
-        values_.push_back(narrowed(numberOf(value), names_.empty() ? name : name + " (" + names_[i] + ")"));
+    for (const HPlug& plug : plugs_) {
+        values_.push_back(static_cast<float>(numberOf(plug)));
+        if (!std::isfinite(values_.back()))
+            refuse(values_.size() - 1);
     }
+}
+
+void ControlReader::takeElements(std::vector<unsigned> indices) {
+    plugs_.clear();
+    for (const unsigned index : indices)
+        plugs_.push_back(array_.elementByLogicalIndex(index));
+    indices_ = std::move(indices);
+}
+
+void ControlReader::refuse(std::size_t place) const {
+    const HPlug& plug = plugs_[place];
+    throw std::runtime_error(plug.name().asStdString() + (names_.empty() ? "" : " (" + names_[place] + ")") + " is " +
+                             std::to_string(numberOf(plug)) + ", which is no number to train with");
 }
 
 void ControlReader::readNames() {

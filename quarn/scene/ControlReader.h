@@ -4,6 +4,7 @@
 
 #include "quarn/scene/Warp.h"
 
+#include <cstddef>
 #include <string>
 #include <vector>
 
@@ -25,7 +26,13 @@ public:
     const std::vector<float>& values() const { return values_; }     ///< as many as names()
 
 private:
+    void takeElements(std::vector<unsigned> indices);
+    [[noreturn]] void refuse(std::size_t place) const;
+
     const Warp& warp_;
+    HPlug array_;                   ///< controlValues
+    std::vector<unsigned> indices_; ///< of its elements
+    std::vector<HPlug> plugs_;      ///< these
     std::vector<std::string> names_;
     std::vector<float> values_;
 };

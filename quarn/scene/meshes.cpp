@@ -41,16 +41,26 @@ private:
     HDataHandle handle_;
 };
 
-template <class Number>
-void read(const HPlug& mesh, std::vector<Number>& xyz) {
+// `room(count)` where that many numbers go
+template <class Number, class Room>
+void read(const HPlug& mesh, const Room& room) {
     const EvaluatedData data(mesh);
     HStatus status;
     const HItGeometry geometry(data.handle(), &status);
     require(status, mesh);
     const double* from = geometry.rawPositions(&status);
     require(status, mesh);
-    xyz.resize(3 * static_cast<std::size_t>(geometry.count()));
-    std::transform(from, from + xyz.size(), xyz.begin(), [](double value) { return static_cast<Number>(value); });
+    const std::size_t count = 3 * static_cast<std::size_t>(geometry.count());
+    Number* to = room(count);
+    std::transform(from, from + count, to, [](double value) { return static_cast<Number>(value); });
+}
+
+template <class Number>
+void read(const HPlug& mesh, std::vector<Number>& xyz) {
+    read<Number>(mesh, [&](std::size_t count) {
+        xyz.resize(count);
+        return xyz.data();
+    });
 }
 
 void readUvs(const HFnMesh& mesh, const HPlug& plug, MeshPolygons& polygons) {
@@ -104,6 +114,15 @@ void readPoints(const HPlug& mesh, std::vector<double>& xyz) {
 
 void readPoints(const HPlug& mesh, std::vector<float>& xyz) {
     read(mesh, xyz);
+}
+
+void readPoints(const HPlug& mesh, std::span<float> xyz) {
+    read<float>(mesh, [&](std::size_t count) {
+        if (count != xyz.size())
+            throw std::runtime_error(std::string(mesh.name().asChar()) + " has " + std::to_string(count / 3) +
+                                     " vertices, not " + std::to_string(xyz.size() / 3));
+        return xyz.data();
+    });
 }
 
 std::size_t vertexCountOf(const HPlug& plug) {

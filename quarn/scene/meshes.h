@@ -29,6 +29,8 @@ MeshPolygons polygonsOf(const HPlug& mesh);
 /// is resized to 3 times the vertices. Throws as polygonsOf() does. Thread: main.
 void readPoints(const HPlug& mesh, std::vector<double>& xyz);
 void readPoints(const HPlug& mesh, std::vector<float>& xyz);
+/// The same into an array of that size; throws for another size, too.
+void readPoints(const HPlug& mesh, std::span<float> xyz);
 
 /// Evaluates a plug that should hold a mesh. 0 when it holds none, or fails. Thread: main.
 std::size_t vertexCountOf(const HPlug& mesh);

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/scene/vertexMap.h"
 
+#include "openquarn/HFileObject.h"
 #include "quarn/scene/plugs.h"
 #include "storage/Fnv64.h"
 #include "storage/npyArray.h"
@@ -26,7 +27,10 @@ std::filesystem::path vertexMapFile(const std::string& meshName) {
     constexpr std::string_view place = "{mesh}";
     if (const std::size_t at = path.find(place); at != std::string::npos)
         path.replace(at, place.size(), meshName);
-    return std::filesystem::absolute(path);
+    HFileObject file;
+    file.setResolveMethod(HFileObject::kSceneFolder | HFileObject::kKeepMissing);
+    file.setRawFullName(path.c_str());
+    return file.resolvedFullName().asStdString();
 }
 
 std::string vertexMapDigest(std::span<const std::int32_t> map) {

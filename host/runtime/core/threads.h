@@ -38,6 +38,19 @@ extern std::atomic<const ThreadWork*> mainWork;
 /// Makes the calling thread the main one.
 void setMainThread();
 
+/// Makes the calling thread the main one for as long as this lives.
+class MainThreadScope {
+public:
+    MainThreadScope() noexcept
+        : previous_(detail::mainWork.exchange(&detail::work)) {}
+    ~MainThreadScope() { detail::mainWork = previous_; }
+    MainThreadScope(const MainThreadScope&) = delete;
+    MainThreadScope& operator=(const MainThreadScope&) = delete;
+
+private:
+    const ThreadWork* previous_;
+};
+
 inline bool isMainThread() noexcept {
     return detail::mainWork.load(std::memory_order_relaxed) == &detail::work;
 }

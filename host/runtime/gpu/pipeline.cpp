@@ -147,12 +147,10 @@ void Pipeline::evaluatedOnCpu(NodeData& data, HDataBlock& block, unsigned index,
 } // namespace
 
 void takeFromDevice(const std::string& nodeType) {
-    Graph* graph = Graph::current();
-    if (!graph)
-        return;
-    for (const std::shared_ptr<Node>& node : graph->nodes())
-        if (node->data()->filterState && (nodeType.empty() || node->type().name == nodeType))
-            filterStateOf(*node->data()).takeFromDevice();
+    for (const Graph* graph : Graph::all())
+        for (const std::shared_ptr<Node>& node : graph->nodes())
+            if (node->data()->filterState && (nodeType.empty() || node->type().name == nodeType))
+                filterStateOf(*node->data()).takeFromDevice();
 }
 
 void Gpu::setEnabled(bool enabled) {

@@ -8,11 +8,14 @@
 
 #include <algorithm>
 #include <stdexcept>
+#include <utility>
 
 namespace OpenQuarn {
 namespace {
 
 Graph* theGraph = nullptr;
+std::vector<Graph*> allGraphs; // in order of creation
+HCallbackId nextCallback = 1;   // of all graphs: the one who takes it back need not know whose it is
 
 constexpr const char* timeNodeName = "time1";
 
@@ -37,25 +40,41 @@ Graph* Graph::current() {
     return theGraph;
 }
 
+Graph* Graph::setCurrent(Graph* graph) noexcept {
+    return std::exchange(theGraph, graph);
+}
+
+const std::vector<Graph*>& Graph::all() {
+    return allGraphs;
+}
+
 Graph& currentGraph() {
     if (!theGraph)
         throw std::runtime_error("there is no scene: no session has been started");
     return *theGraph;
 }
 
+void removeCallback(HCallbackId id) {
+    currentGraph();
+    for (Graph* graph : allGraphs)
+        if (graph->removeCallback(id))
+            return;
+    throw std::invalid_argument("there is no callback " + std::to_string(id));
+}
+
 Graph::Graph() {
-    if (theGraph)
-        throw std::runtime_error("there can be only one session at a time");
     registerBaseNodes();
-    theGraph = this;
     timeNode_ = createNode(timeClass(), timeNodeName);
     setTimeIn(*timeNode_->data(), time_);
+    allGraphs.push_back(this);
 }
 
 Graph::~Graph() {
     clear(time_);
     timeNode_->bury();
-    theGraph = nullptr;
+    allGraphs.erase(std::find(allGraphs.begin(), allGraphs.end(), this));
+    if (theGraph == this)
+        theGraph = nullptr;
 }
 
 // --- nodes ---
@@ -442,21 +461,22 @@ void Graph::notify(Slot& slot, int mask, const Slot* other) {
 // --- callbacks ---
 
 HCallbackId Graph::addCallback(Node& node, HNodeMessage::HAttributeChangedFunction function, void* clientData) {
-    const HCallbackId id = nextCallback_++;
+    const HCallbackId id = nextCallback++;
     node.callbacks.push_back({id, function, clientData});
     callbackNodes_[id] = std::static_pointer_cast<Node>(node.shared_from_this());
     return id;
 }
 
-void Graph::removeCallback(HCallbackId id) {
+bool Graph::removeCallback(HCallbackId id) {
     const auto found = callbackNodes_.find(id);
     if (found == callbackNodes_.end())
-        throw std::invalid_argument("there is no callback " + std::to_string(id));
+        return false;
     if (const std::shared_ptr<Node> node = found->second.lock())
         node->callbacks.erase(std::remove_if(node->callbacks.begin(), node->callbacks.end(),
                                              [&](const Node::Callback& callback) { return callback.id == id; }),
                               node->callbacks.end());
     callbackNodes_.erase(found);
+    return true;
 }
 
 // --- time ---

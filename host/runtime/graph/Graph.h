@@ -35,8 +35,12 @@ public:
     Graph(const Graph&) = delete;
     Graph& operator=(const Graph&) = delete;
 
-    /// The scene that is open: there is one a process. Null before the first session.
+    /// The scene that everything works on which names no other. Null without a session.
     static Graph* current();
+    /// Makes it that one; null for none. Answers with the one of before.
+    static Graph* setCurrent(Graph* graph) noexcept;
+    /// All that there are: a process has several when scenes lie side by side.
+    static const std::vector<Graph*>& all();
 
     // --- nodes ---
     /// `name` empty: the type's name and the first number that is free. With a name that is taken, a number is added.
@@ -83,8 +87,10 @@ public:
     void notify(Slot& slot, int mask, const Slot* other = nullptr);
 
     // --- callbacks ---
+    /// No two scenes give the same number.
     HCallbackId addCallback(Node& node, HNodeMessage::HAttributeChangedFunction function, void* clientData);
-    void removeCallback(HCallbackId id);
+    /// False when it is not one of this scene.
+    bool removeCallback(HCallbackId id);
 
     // --- time ---
     double time() const { return time_; }
@@ -120,7 +126,6 @@ private:
     std::unordered_map<const NodeClass*, std::size_t> typeCounts_;
     std::uint64_t nextOrder_ = 1;
     std::unordered_map<HCallbackId, std::weak_ptr<Node>> callbackNodes_;
-    HCallbackId nextCallback_ = 1;
     std::shared_ptr<Node> timeNode_;
     double time_ = 1.0;
     std::vector<std::string>* dirtyPlugs_ = nullptr;
@@ -130,5 +135,9 @@ private:
 
 /// Throws std::runtime_error when there is no scene.
 Graph& currentGraph();
+
+/// Of whichever scene the callback is. Throws std::invalid_argument when it is of none, std::runtime_error without a
+/// scene.
+void removeCallback(HCallbackId id);
 
 } // namespace OpenQuarn

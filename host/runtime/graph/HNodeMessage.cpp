@@ -9,7 +9,7 @@ using OpenQuarn::Operation;
 
 HStatus HMessage::removeCallback(HCallbackId id) {
     return OpenQuarn::apiCall(Operation::HMessage_removeCallback, [&]() -> HStatus {
-        OpenQuarn::currentGraph().removeCallback(id);
+        OpenQuarn::removeCallback(id);
         return HStatus::kSuccess;
     });
 }

@@ -19,16 +19,24 @@ std::string counted(std::size_t count, const std::string& thing) {
     return std::to_string(count) + " " + thing + (count == 1 ? "" : "s");
 }
 
+std::string firstOf(const Graph& graph, const NodeClass& type) {
+    const std::vector<std::shared_ptr<Node>> nodes = graph.nodes();
+    const auto first = std::find_if(nodes.begin(), nodes.end(),
+                                    [&](const std::shared_ptr<Node>& node) { return &node->type() == &type; });
+    return first == nodes.end() ? std::string() : (*first)->name();
+}
+
 std::string nodeUsers(const Registration& registration) {
     const std::shared_ptr<const NodeClass> type = findNodeClass(registration.id);
-    const Graph* graph = Graph::current();
-    const std::size_t count = type && graph ? graph->nodeCount(*type) : 0;
-    if (count == 0)
-        return {};
-    const std::vector<std::shared_ptr<Node>> nodes = graph->nodes();
-    const auto first = std::find_if(nodes.begin(), nodes.end(),
-                                    [&](const std::shared_ptr<Node>& node) { return &node->type() == type.get(); });
-    return counted(count, "node") + " of type '" + type->name + "', such as '" + (*first)->name() + "'";
+    std::size_t count = 0;
+    std::string first;
+    for (const Graph* graph : type ? Graph::all() : std::vector<Graph*>()) {
+        if (first.empty() && graph->nodeCount(*type) > 0)
+            first = firstOf(*graph, *type);
+        count += graph->nodeCount(*type);
+    }
+    return count == 0 ? std::string()
+                      : counted(count, "node") + " of type '" + type->name + "', such as '" + first + "'";
 }
 
 std::string dataUsers(const Registration& registration) {
@@ -39,13 +47,13 @@ std::string dataUsers(const Registration& registration) {
 }
 
 void deleteNodesOf(HTypeId id) {
-    Graph* graph = Graph::current();
     const std::shared_ptr<const NodeClass> type = findNodeClass(id);
-    if (!graph || !type)
+    if (!type)
         return;
-    for (const std::shared_ptr<Node>& node : graph->nodes())
-        if (&node->type() == type.get())
-            graph->deleteNode(*node);
+    for (Graph* graph : Graph::all())
+        for (const std::shared_ptr<Node>& node : graph->nodes())
+            if (&node->type() == type.get() && node->isAlive()) // one may have deleted others
+                graph->deleteNode(*node);
 }
 
 } // namespace

@@ -31,14 +31,14 @@ PluginEntryPoint entryPoint(const Library& library, const char* name) {
 }
 
 std::size_t removeCallbacksInto(const Library& library) {
-    Graph* const graph = Graph::current();
     std::vector<HCallbackId> found;
-    for (const std::shared_ptr<Node>& node : graph ? graph->nodes() : std::vector<std::shared_ptr<Node>>())
-        for (const Node::Callback& callback : node->callbacks)
-            if (library.contains(reinterpret_cast<const void*>(callback.function)))
-                found.push_back(callback.id);
+    for (const Graph* graph : Graph::all())
+        for (const std::shared_ptr<Node>& node : graph->nodes())
+            for (const Node::Callback& callback : node->callbacks)
+                if (library.contains(reinterpret_cast<const void*>(callback.function)))
+                    found.push_back(callback.id);
     for (const HCallbackId id : found)
-        graph->removeCallback(id);
+        removeCallback(id);
     return found.size();
 }
 

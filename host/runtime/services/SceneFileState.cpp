@@ -14,8 +14,7 @@ namespace {
 
 struct SceneFile {
     std::mutex mutex;
-    std::string path;
-    std::string folder;
+    SceneFileNames names;
     SceneFolderSink folderSink;
 };
 
@@ -30,7 +29,7 @@ std::atomic<int> versionBeingRead{-1};
 
 std::string currentSceneFile() {
     const std::scoped_lock lock(sceneFile().mutex);
-    return sceneFile().path;
+    return sceneFile().names.path;
 }
 
 std::string folderOfScene(const std::string& file) {
@@ -39,14 +38,14 @@ std::string folderOfScene(const std::string& file) {
 
 std::string currentSceneFolder() {
     const std::scoped_lock lock(sceneFile().mutex);
-    return sceneFile().folder;
+    return sceneFile().names.folder;
 }
 
 void setCurrentSceneFile(std::string path) {
     const std::string folder = path.empty() ? std::string() : folderOfScene(path);
     {
         const std::scoped_lock lock(sceneFile().mutex);
-        sceneFile().path = std::move(path);
+        sceneFile().names.path = std::move(path);
     }
     setCurrentSceneFolder(folder);
 }
@@ -55,11 +54,27 @@ void setCurrentSceneFolder(const std::string& folder) {
     SceneFolderSink sink;
     {
         const std::scoped_lock lock(sceneFile().mutex);
-        sceneFile().folder = folder;
+        sceneFile().names.folder = folder;
         sink = sceneFile().folderSink;
     }
     if (sink)
         sink(folder);
+}
+
+SceneFileNames exchangeSceneFile(SceneFileNames names) {
+    std::string folder;
+    SceneFolderSink sink;
+    {
+        const std::scoped_lock lock(sceneFile().mutex);
+        std::swap(sceneFile().names, names);
+        if (sceneFile().names.folder != names.folder) {
+            folder = sceneFile().names.folder;
+            sink = sceneFile().folderSink;
+        }
+    }
+    if (sink)
+        sink(folder);
+    return names;
 }
 
 SceneFolderSink setSceneFolderSink(SceneFolderSink sink) {

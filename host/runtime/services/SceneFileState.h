@@ -18,6 +18,15 @@ void setCurrentSceneFile(std::string path);
 /// The scene goes to another folder before its file does; empty for none. Tells the application. Thread: main.
 void setCurrentSceneFolder(const std::string& folder);
 
+/// What the functions above answer of one scene.
+struct SceneFileNames {
+    std::string path;
+    std::string folder;
+};
+/// Another scene becomes the current one: its names take the place of the present ones, which are given back. Tells the
+/// application of a folder that is another. Thread: main.
+SceneFileNames exchangeSceneFile(SceneFileNames names);
+
 /// Version of the scene file that is being read; -1 when none is. Thread: any.
 int readingFileVersion() noexcept;
 

@@ -8,50 +8,68 @@
 #include "plugins/PluginTable.h"
 #include "services/SceneFileState.h"
 
+#include <stdexcept>
+
 namespace OpenQuarn {
 namespace {
 
 constexpr double firstFrame = 1.0;
 
+// in the order in which they were made, the session's own at last: it is the one that plug-ins are left with
+void emptyAll(Graph& own) {
+    for (Graph* graph : Graph::all())
+        if (graph != &own)
+            graph->clear(firstFrame);
+    own.clear(firstFrame);
+}
+
+bool isOpen = false;
+
 } // namespace
 
 struct Session::Impl {
+    Impl() { Graph::setCurrent(&graph); }
     Graph graph;
 };
 
 Session::Session() {
+    if (isOpen)
+        throw std::runtime_error("there can be only one session at a time");
     setMainThread();
     registerGeometryNodes();
     impl_ = std::make_unique<Impl>();
+    isOpen = true;
 }
 
 Session::~Session() {
-    newScene();
+    emptyAll(impl_->graph);
+    setCurrentSceneFile({});
     PluginTable::instance().unloadAll();
     closeDevice();
+    isOpen = false;
 }
 
 void Session::newScene() {
-    impl_->graph.clear(firstFrame);
+    currentGraph().clear(firstFrame);
     setCurrentSceneFile({});
 }
 
 std::vector<HObject> Session::nodes() const {
     std::vector<HObject> objects;
     objects.reserve(nodeCount());
-    for (const std::shared_ptr<Node>& node : impl_->graph.nodes())
+    for (const std::shared_ptr<Node>& node : currentGraph().nodes())
         objects.push_back(Access::object(node));
     return objects;
 }
 
 std::size_t Session::nodeCount() const {
-    return impl_->graph.nodeCount();
+    return currentGraph().nodeCount();
 }
 double Session::time() const {
-    return impl_->graph.time();
+    return currentGraph().time();
 }
 void Session::setTime(double frame) {
-    impl_->graph.setTime(frame);
+    currentGraph().setTime(frame);
 }
 
 } // namespace OpenQuarn

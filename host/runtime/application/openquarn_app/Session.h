@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // The scene, as an application drives it. Nodes, plugs and values are reached through the H-API (HFnDependencyNode,
-// HPlug, HSelectionList); commands, files, plug-ins and messages have headers of their own beside this one.
+// HPlug, HSelectionList); commands, files, plug-ins, messages and further scenes (Scene.h) have headers of their own
+// beside this one.
 #pragma once
 
 #include "openquarn/HApi.h"
@@ -13,12 +14,13 @@
 namespace OpenQuarn {
 
 /// An open host with an empty scene. There is one at a time in a process; the thread that makes it is the main one.
+/// "The scene" below is the current one: the session's own, unless an application has made another current.
 /// Thread: main.
 class OPENQUARN_API Session {
 public:
     /// Throws std::runtime_error while there is another.
     Session();
-    /// Empties the scene, then unloads the plug-ins that are still loaded.
+    /// Empties the scene, and all others that there still are, then unloads the plug-ins that are still loaded.
     ~Session();
     Session(const Session&) = delete;
     Session& operator=(const Session&) = delete;
