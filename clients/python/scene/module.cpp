@@ -233,7 +233,8 @@ For what is set and read in every frame: a number takes well under a microsecond
         .def("get", &Plugs::get, R"(The numbers, evaluated: float64 [n].
 
 Raises RuntimeError, naming the plug, when one cannot be evaluated.)")
-        .def("set", &Plugs::set, py::arg("values"), R"(Sets the numbers; those that have the value already stay untouched.
+        .def("set", &Plugs::set, py::arg("values"),
+             R"(Sets the numbers; those that have the value already stay untouched.
 
 values: [n], any numbers; one beyond the limits of its attribute becomes the limit.
 Raises ValueError for another shape and a number that is not finite, when nothing is set, and for a plug that cannot be
@@ -260,8 +261,8 @@ with the deformer is not found. What could not be understood is in `warnings`.)"
         .def("__enter__", [](const Shared& scene) { return scene; })
         .def("__exit__", [](OpenScene& scene, const py::args&) { scene.close(); })
         .def("__repr__", &shown)
-        .def_property_readonly("path", [](const OpenScene& scene) { return scene.path().string(); },
-                               "The file, absolute.")
+        .def_property_readonly(
+            "path", [](const OpenScene& scene) { return scene.path().string(); }, "The file, absolute.")
         .def_property_readonly("closed", &OpenScene::isClosed)
         .def_property_readonly("warnings", &OpenScene::warnings, "What the host warned of when it opened the file.")
         .def("messages", &OpenScene::takeMessages,
@@ -278,9 +279,9 @@ Raises ValueError when there is no such plug or it holds nothing of these, Runti
 A choice may be set by its label. Numbers beyond the limits of the attribute become the limit.
 Raises ValueError when there is no such plug, it cannot be set or does not take the value, TypeError for a value of
 another kind.)")
-        .def("plugs", [](const Shared& scene, std::vector<std::string> names) {
-            return Plugs(scene, std::move(names));
-        }, py::arg("names"), R"(Plugs that hold a number each, found once, to be set and read many times.
+        .def(
+            "plugs", [](const Shared& scene, std::vector<std::string> names) { return Plugs(scene, std::move(names)); },
+            py::arg("names"), R"(Plugs that hold a number each, found once, to be set and read many times.
 
 Raises ValueError, naming the plug, when there is none of the name or it does not hold one number.)")
         .def("points", &points, py::arg("plug"), py::arg("out") = py::none(),
@@ -304,7 +305,8 @@ Raises ValueError when it is not clear which is meant, RuntimeError when one can
         .def("joints", &joints, R"(The joints, parents before their children.
 
 A dict for each: "name", "parent" (an index, -1 for a root) and "rotateOrder" ("xyz").)")
-        .def("vertex_map", &vertexMap, py::arg("mesh") = "", R"(The scene's vertex of each vertex of the character's file: int32.
+        .def("vertex_map", &vertexMap, py::arg("mesh") = "",
+             R"(The scene's vertex of each vertex of the character's file: int32.
 
 mesh: the name of its node; "" for the only one. None when the scene does not come from a character's file.
 Raises ValueError, with the reason, when the file with the map cannot be read.)")

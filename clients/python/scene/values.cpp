@@ -261,8 +261,9 @@ FloatArray writable(const py::array& array, const std::vector<py::ssize_t>& shap
                       std::equal(shape.begin(), shape.end(), array.shape()) && array.writeable();
     if (fits)
         return py::reinterpret_borrow<FloatArray>(array);
-    throw std::invalid_argument(std::string(name) + " has to be float32 " + std::string(py::str(py::tuple(py::cast(shape)))) +
-                                ", C-contiguous and writable, not " + shapeText(array));
+    throw std::invalid_argument(std::string(name) + " has to be float32 " +
+                                std::string(py::str(py::tuple(py::cast(shape)))) + ", C-contiguous and writable, not " +
+                                shapeText(array));
 }
 
 FloatArray pointsOf(Visit& visit, const HPlug& plug, const std::optional<py::array>& out) {

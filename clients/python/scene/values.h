@@ -27,13 +27,14 @@ bool isReal(const HPlug& plug);
 void setReal(const HPlug& plug, double number);
 
 /// Evaluates it. A number is int, float or bool as its attribute is, a text str, a matrix float64 [4, 4] for row
-/// vectors, a mesh its points, a list and an array of numbers or texts a list, a compound the list of its children; None
-/// where there is no value. Throws std::invalid_argument for a kind that Python has nothing for, std::runtime_error
-/// when it cannot be evaluated.
+/// vectors, a mesh its points, a list and an array of numbers or texts a list, a compound the list of its children;
+/// None where there is no value. Throws std::invalid_argument for a kind that Python has nothing for,
+/// std::runtime_error when it cannot be evaluated.
 pybind11::object valueOf(Visit& visit, const HPlug& plug);
 
-/// Sets it from such a value; arrays and compounds part by part, an array from element 0 on. Throws pybind11::type_error, naming the type, when it is
-/// of another kind, std::invalid_argument when the plug does not take it.
+/// Sets it from such a value; arrays and compounds part by part, an array from element 0 on. Throws
+/// pybind11::type_error, naming the type, when it is of another kind, std::invalid_argument when the plug does not take
+/// it.
 void setValue(OpenScene& scene, const HPlug& plug, const pybind11::handle& value);
 
 /// Evaluates a plug that holds a mesh: x, y, z of each vertex, float32 [vertices, 3], in the scene's unit and the

@@ -15,7 +15,7 @@ namespace {
 
 Graph* theGraph = nullptr;
 std::vector<Graph*> allGraphs; // in order of creation
-HCallbackId nextCallback = 1;   // of all graphs: the one who takes it back need not know whose it is
+HCallbackId nextCallback = 1;  // of all graphs: the one who takes it back need not know whose it is
 
 constexpr const char* timeNodeName = "time1";
 
