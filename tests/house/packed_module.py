@@ -6,10 +6,16 @@ import importlib
 import sys
 from pathlib import Path
 
+import numpy as np
+
 
 def mapped() -> "set[Path]":
     lines = Path("/proc/self/maps").read_text().splitlines()
     return {Path(line.split(maxsplit=5)[5]) for line in lines if ".so" in line}
+
+
+def stem(file: Path) -> str:
+    return file.name.partition(".so")[0]
 
 
 def enabled_add_on() -> None:
@@ -31,3 +37,16 @@ if "--" in sys.argv:
 import neuralwarp  # noqa: E402
 
 assert place in Path(neuralwarp.__file__).resolve().parents, neuralwarp.__file__
+model = neuralwarp.Model.load(wave / "models" / "wave.nwrp")
+with neuralwarp.Scene.open(wave / "wave.json") as scene:
+    rest = scene.points("strip.outMesh")
+    deformer = neuralwarp.Deformer(model, scene.faces("strip.outMesh"), rest)
+    scene.set("controls.inputList[0].input[0]", 1.0)
+    deformed = deformer.evaluate(rest, scene.controls())
+    assert np.array_equal(deformed, scene.points("wave.outputGeom[0]"))
+assert np.abs(deformed - rest).max() > 0.1, "the wave is flat"
+
+# no library is loaded from elsewhere that is carried along, but for those that were loaded before
+carried = {stem(file) for file in Path(neuralwarp.__file__).parent.glob("*.so*")} - {stem(file) for file in before}
+foreign = [file for file in mapped() - before if stem(file) in carried and place not in file.parents]
+assert not foreign, foreign

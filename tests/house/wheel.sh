@@ -43,7 +43,7 @@ judge() {
   for name in $(readelf -dW "$1"/*.so* | sed -n 's/.*(NEEDED).*\[\(.*\)\]$/\1/p' | sort -u); do
     [[ -s $1/$name || $name =~ $runtime ]] || fail "$name is needed and not there"
   done
-  for file in _core.*.so neuralWarp.so libOpenQuarn.so libonnxruntime.so.1 libtbb.so.12 resources/*/kernels/*.cl; do
+  for file in _core.*.so _scene.*.so neuralWarp.so resources/*/kernels/*.cl; do
     [[ -s $(compgen -G "$1/$file" | head -n 1) ]] || fail "$file is not there"
   done
   for name in '' .onnxruntime .libtbb12 .ocl-icd-libopencl1 .zlib1g .pybind11-dev .rapidjson-dev; do
