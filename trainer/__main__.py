@@ -88,6 +88,8 @@ def add_train(commands: "argparse._SubParsersAction[Parser]") -> None:
     add_going_on(train)
     train.add_argument("--quiet", action="store_true", help="only errors")
     train.add_argument("--json", action="store_true", help="write the report to standard output as well")
+    train.add_argument("--progress", metavar="FILE",
+                       help="keep this file at what is done, as JSON, for programs that look on")
     add_settings(train.add_argument_group("settings", SETTINGS_RULE))
 
 
@@ -192,7 +194,8 @@ def train_one(options: argparse.Namespace, folder: Union[str, Path], validation_
     report = Path(wanted_report) if wanted_report else model.with_suffix(".report")
     result = pipeline.train(pipeline.Job(dataset, settings, options.seed, options.threads, model, report, quarn, say,
                                          not options.quiet, validation, options.resume,
-                                         options.checkpoint_every, device, first))
+                                         options.checkpoint_every, device, first,
+                                         Path(options.progress) if options.progress else None))
     for line in [*as_lines(result["errors"]), sentence(result["split"]),
                  *limits.sentences(result), *advice(result["errors"])]:
         say(line)

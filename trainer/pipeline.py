@@ -52,6 +52,7 @@ class Job:
     checkpoint_every: float = resume.EVERY  # seconds
     device: Device = field(default_factory=lambda: Device("cpu"))
     first: Optional[Path] = None            # model directory whose network this one begins as
+    progress_file: Optional[Path] = None    # that says how far it is
 
 
 @dataclass(frozen=True)
@@ -196,7 +197,7 @@ def train_network(job: Job, targets: Targets, split: Split) -> tuple[Trained, Li
             job.say(f"beginning as {job.first}: rows that are held out may be among those that it was trained on, and "
                     "their errors flatter then")
         checkpoints = open_checkpoints(job, inputs, targets, split)
-        with progress.counted(settings.epochs, job.say, job.progress) as on_epoch:
+        with progress.counted(settings.epochs, job.say, job.progress, job.progress_file) as on_epoch:
             history = fit(network, inputs, targets.of, split, settings, job.seed, on_epoch, ended_by, job.device,
                           checkpoints)
     job.say(f"{len(history.train)} epochs, the best is {history.best_epoch} with a loss of {history.best_loss:.3e}")

@@ -1,27 +1,74 @@
 # SPDX-License-Identifier: Apache-2.0
 """What a user sees of a training while it runs, and how it is ended: epochs counted, and Ctrl-C."""
 
+import contextlib
+import json
+import os
 import signal
 import sys
+import time
 from contextlib import contextmanager
+from pathlib import Path
 from types import FrameType
 from typing import Callable, Iterator, Optional
 
 from tqdm import tqdm
 
+from .files import sibling, write_bytes
 from .state import History
 
-LINES = 20  # where there is no terminal to draw a bar on
+LINES = 20    # where there is no terminal to draw a bar on
+APART = 0.5   # seconds between two states of a file of progress
 
 
 @contextmanager
-def counted(epochs: int, say: Callable[[str], None], shown: bool) -> Iterator[Callable[[History], None]]:
-    """Gives what fit() calls after each epoch: it moves a bar on a terminal; where there is none it says some lines."""
-    if shown and sys.stderr.isatty():
-        with tqdm(total=epochs, unit="epoch", leave=False) as bar:
-            yield lambda history: move(bar, history)
-    else:
-        yield lambda history: say_line(len(history.train), epochs, history, say)
+def counted(epochs: int, say: Callable[[str], None], shown: bool,
+            file: Optional[Path] = None) -> Iterator[Callable[[History], None]]:
+    """Gives what fit() calls after each epoch: it moves a bar on a terminal; where there is none it says some lines.
+    file: is kept at what is done, for programs that look on"""
+    kept = ProgressFile(file, epochs) if file else None
+    with contextlib.ExitStack() as stack:
+        is_bar = shown and sys.stderr.isatty()
+        bar = stack.enter_context(tqdm(total=epochs, unit="epoch", leave=False)) if is_bar else None
+
+        def on_epoch(history: History) -> None:
+            if kept:
+                kept.keep(len(history.train))
+            if bar is None:
+                say_line(len(history.train), epochs, history, say)
+            else:
+                move(bar, history)
+
+        yield on_epoch
+
+
+class ProgressFile:
+    """A file of JSON that says how far a training is, as those of quarn: written anew as a whole, twice a second at
+    most."""
+
+    def __init__(self, path: Path, epochs: int) -> None:
+        self.path, self.epochs = path, epochs
+        self.begin = self.written = time.monotonic()
+        self.before: Optional[int] = None  # epochs that were there already: of a training that goes on
+        self.write(0, None)
+
+    def keep(self, done: int) -> None:
+        """done: epochs, 1 or more. What cannot be written is nothing that a training should end for."""
+        now = time.monotonic()
+        if self.before is None:
+            self.before = done - 1
+        if now - self.written < APART and done < self.epochs:
+            return
+        self.written = now
+        with contextlib.suppress(OSError):
+            self.write(done, (now - self.begin) / (done - self.before) * (self.epochs - done))
+
+    def write(self, done: int, left: Optional[float]) -> None:
+        part = sibling(self.path, ".part")
+        state = {"what": "epochs", "done": done, "total": self.epochs, "seconds": time.monotonic() - self.begin,
+                 "secondsLeft": left}
+        write_bytes(part, (json.dumps(state, indent=1) + "\n").encode())
+        os.replace(part, self.path)
 
 
 def move(bar: tqdm, history: History) -> None:

@@ -5,6 +5,7 @@
 #include "quarn/console/interrupt.h"
 #include "quarn/console/printable.h"
 
+#include <algorithm>
 #include <cmath>
 #include <iostream>
 #include <sstream>
@@ -17,8 +18,11 @@ namespace {
 constexpr std::size_t barWidth = 30;
 constexpr auto redrawAfter = std::chrono::milliseconds(100);
 
-std::string timeText(double seconds) {
-    const long whole = std::lround(seconds);
+} // namespace
+
+std::string durationText(double seconds) {
+    constexpr double most = 1e9; // of what somebody else's file says
+    const long whole = std::lround(std::clamp(seconds, 0.0, most));
     std::ostringstream text;
     text.imbue(std::locale::classic());
     if (whole >= 60)
@@ -26,8 +30,6 @@ std::string timeText(double seconds) {
     text << whole % 60 << " s";
     return text.str();
 }
-
-} // namespace
 
 void Console::note(const std::string& sentence) const {
     if (!quiet)
@@ -43,6 +45,7 @@ void Console::warn(const std::string& sentence) const {
 Progress::Progress(const Console& console, std::string what, std::size_t total)
     : what_(std::move(what))
     , total_(total)
+    , file_(console.progress, what_, total)
     , shown_(!console.quiet && !Log::isVerbose() && ::isatty(STDERR_FILENO) == 1)
     , started_(std::chrono::steady_clock::now())
     , drawn_(started_ - redrawAfter) {}
@@ -55,6 +58,7 @@ Progress::~Progress() {
 void Progress::advance(std::size_t steps) {
     throwIfInterrupted();
     done_ += steps;
+    file_.count(done_);
     if (shown_ && std::chrono::steady_clock::now() - drawn_ >= redrawAfter)
         draw();
 }
@@ -68,7 +72,7 @@ void Progress::draw() {
         "\r\033[K" + what_ + " [" + std::string(filled, '#') + std::string(barWidth - filled, '.') + "] ";
     line += std::to_string(done_) + "/" + std::to_string(total_);
     if (done_ > 0)
-        line += ", " + timeText(elapsed / part - elapsed) + " left";
+        line += ", " + durationText(elapsed / part - elapsed) + " left";
     std::cerr << line << std::flush;
 }
 

@@ -13,6 +13,14 @@ void addConsoleOptions(CLI::App& command, Console& console, bool hasAnswer) {
         command.add_flag("--json", console.json, "Answer in JSON");
 }
 
+void addProgressOption(CLI::App& command, Console& console) {
+    command
+        .add_option("--progress", console.progress,
+                    "Keep this file at what is done, as JSON, for programs that look on")
+        ->type_name("FILE")
+        ->transform([](const std::string& file) { return std::filesystem::absolute(file).string(); });
+}
+
 void addLogOptions(CLI::App& command, LogOptions& options) {
     CLI::Option* verbose =
         command.add_flag("-v,--verbose", options.verbose, "Say on standard error what is done, and how long it takes");

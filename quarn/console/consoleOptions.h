@@ -14,6 +14,8 @@ struct Console;
 
 /// Adds --quiet, and --json where the command has an answer that a program may read. `console` must outlive `command`.
 void addConsoleOptions(CLI::App& command, Console& console, bool hasAnswer);
+/// --progress FILE, of commands that show a Progress.
+void addProgressOption(CLI::App& command, Console& console);
 
 /// What --verbose and --log say.
 struct LogOptions {

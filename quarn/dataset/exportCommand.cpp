@@ -116,6 +116,7 @@ void addExportCommand(CLI::App& app) {
     command->add_flag("--anyway", options->anyway, "Export a target that does not fit the skin as well");
     command->add_flag("--overwrite", options->overwrite, "Replace another data set, or give up a begun one");
     addConsoleOptions(*command, options->console, true);
+    addProgressOption(*command, options->console);
     command->callback([options] { execute(*options); });
 }
 

@@ -255,6 +255,7 @@ void addPlayCommand(CLI::App& app) {
     addFrameOptions(*command, *options);
     addMeasureOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);
+    addProgressOption(*command, options->console);
     command->callback([options] { play(*options); });
 }
 
@@ -272,6 +273,7 @@ void addBakeCommand(CLI::App& app) {
     addGuardOptions(*command, options->guard);
     addFrameOptions(*command, *options);
     addConsoleOptions(*command, options->console, false);
+    addProgressOption(*command, options->console);
     command->callback([options] { bake(*options); });
 }
 

@@ -343,6 +343,7 @@ void addPoseCommand(CLI::App& app) {
     addRefineOptions(*command, *options, *output, *keys);
     addWriteOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);
+    addProgressOption(*command, options->console);
     command->callback([options] { pose(*options); });
 }
 

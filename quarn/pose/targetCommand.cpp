@@ -251,6 +251,7 @@ void addTargetCommand(CLI::App& app) {
         "Mend what a cache looks like that does not fit the skin: frames early or late, axes, unit, order");
     command->add_flag("--anyway", options->aim.anyway, "Take a cache that does not fit the skin as it is");
     addConsoleOptions(*command, options->console, true);
+    addProgressOption(*command, options->console);
     command->callback([options] { target(*options); });
 }
 

@@ -443,6 +443,7 @@ void addRenderCommand(CLI::App& app) {
     command->add_flag("--joints", options->hasJoints, "Draw the joints over every panel");
     command->add_option("--up", options->up, "The axis that points up: x, y or z")->capture_default_str();
     addConsoleOptions(*command, options->console, true);
+    addProgressOption(*command, options->console);
     command->callback([options] { render(*options); });
 }
 

@@ -34,7 +34,8 @@ void requireOwn(const fs::path& folder) {
     if (fs::exists(folder / Ledger::fileName, error))
         return;
     // of one whose first step failed
-    const std::set<std::string> left = {storage::FolderLock::fileName, "log", "answers", "data", "scratch"};
+    const std::set<std::string> left = {
+        storage::FolderLock::fileName, RunProgress::fileName, "log", "answers", "data", "scratch"};
     for (const fs::directory_entry& entry : fs::directory_iterator(folder, error))
         if (const std::string name = entry.path().filename().string(); left.count(name) == 0)
             throw storage::FileError(folder,
@@ -58,6 +59,12 @@ std::string endOf(const std::string& text) {
     return shown;
 }
 
+// what has something to count, and a flag for where
+bool sayHowFar(const Step& step) {
+    const bool isQuarn = step.program == Program::quarn && step.words.front() != "import";
+    return isQuarn || (step.program == Program::trainer && step.words.front() == "train");
+}
+
 bool isNamed(const Step& step, const std::string& until) {
     return step.name == until;
 }
@@ -74,7 +81,8 @@ RunFolder::RunFolder(const RunSettings& settings, const fs::path& folder, const 
     : settings_(settings)
     , folder_(folder)
     , console_(console)
-    , ledger_((requireOwn(folder), folder)) {}
+    , ledger_((requireOwn(folder), folder))
+    , progress_(folder) {}
 
 RunFacts RunFolder::known() {
     RunFacts all = facts();
@@ -113,7 +121,8 @@ void RunFolder::prepare(const Step& step) const {
 
 void RunFolder::start(const Step& step) {
     const storage::Descriptor log = storage::openToAppend(logOf(step), "");
-    StepLine line(console_, step.label(), logOf(step));
+    const fs::path counted = logOf(step).string() + ".progress";
+    StepLine line(console_, progress_, step.label(), {counted, logOf(step)});
     if (step.request)
         return runTargetProgram(step, {folder_, log.number(), ledger_.digestOf(step, versionOf(step)),
                                        std::chrono::seconds(10), [&] { line.draw(); }});
@@ -127,6 +136,8 @@ void RunFolder::start(const Step& step) {
     ProgramCall call;
     call.words = found.words;
     call.words.insert(call.words.end(), step.words.begin(), step.words.end());
+    if (sayHowFar(step))
+        call.words.insert(call.words.end(), {"--progress", counted.string()});
     call.folder = folder_;
     call.environment = found.environment;
     call.log = log.number();
@@ -189,6 +200,7 @@ void RunFolder::tellOf(const Step& step) const {
 double RunFolder::doStep(const Step& step, const std::string& why) {
     const auto begin = std::chrono::steady_clock::now();
     const Stage stage([&] { return step.label() + ", as " + why; });
+    progress_.count({});
     ledger_.begin(step, versionOf(step));
     perform(step);
     ledger_.finish(step);
@@ -200,6 +212,20 @@ double RunFolder::doStep(const Step& step, const std::string& why) {
 
 std::vector<StepState> RunFolder::run(const std::string& until) {
     const storage::FolderLock lock(folder_, "another quarn run");
+    try {
+        std::vector<StepState> states = runSteps(until);
+        progress_.end("done");
+        return states;
+    } catch (const Interrupted&) {
+        progress_.end("interrupted");
+        throw;
+    } catch (const std::exception& error) {
+        progress_.end("failed", error.what());
+        throw;
+    }
+}
+
+std::vector<StepState> RunFolder::runSteps(const std::string& until) {
     std::vector<StepState> states;
     for (;;) {
         // with what the last step has answered
@@ -209,6 +235,7 @@ std::vector<StepState> RunFolder::run(const std::string& until) {
         throwIfInterrupted();
         const Step& step = plan[states.size()];
         StepState state{step.label(), true, ledger_.whyToDo(step, versionOf(step)), 0.0, false};
+        progress_.begin(state.label, states.size() + 1, countUntil(plan, until));
         if (state.why.empty())
             log([&] { return step.label() + " was done already"; });
         else

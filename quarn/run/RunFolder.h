@@ -4,6 +4,7 @@
 
 #include "quarn/console/Console.h"
 #include "quarn/run/Ledger.h"
+#include "quarn/run/RunProgress.h"
 #include "quarn/run/plan.h"
 #include "quarn/run/programs.h"
 
@@ -40,6 +41,7 @@ private:
     const FoundProgram& program(const Step& step);
     std::string versionOf(const Step& step);
     std::filesystem::path logOf(const Step& step) const;
+    std::vector<StepState> runSteps(const std::string& until);
     void prepare(const Step& step) const;
     void start(const Step& step);
     void perform(const Step& step);
@@ -51,6 +53,7 @@ private:
     std::filesystem::path folder_;
     const Console& console_;
     Ledger ledger_;
+    RunProgress progress_;
     std::map<Program, FoundProgram> programs_;
 };
 

@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
-// The line of a step: on a terminal it counts while the step is at work.
+// What can be seen of a step while it is at work: a line on a terminal, and the progress of the run.
 #pragma once
 
 #include "quarn/console/Console.h"
+#include "quarn/run/RunProgress.h"
 
 #include <chrono>
 #include <filesystem>
@@ -10,28 +11,31 @@
 
 namespace quarn {
 
-/// While it lives, a line on standard error with the seconds, and the last "N of M" that the step's log has. Nothing
-/// where that is no terminal, or the console is quiet. Thread: main.
+/// While it lives, a line on standard error with the seconds and what the step counts; none where that is no terminal,
+/// or the console is quiet. The run's progress has the same. The step's file of progress goes with it. Thread: main.
 class StepLine {
 public:
-    StepLine(const Console& console, std::string label, std::filesystem::path log);
+    /// What the step counts stands in one of these files, if anywhere; see countsIn().
+    struct Files {
+        std::filesystem::path progress, log;
+    };
+
+    StepLine(const Console& console, RunProgress& run, std::string label, Files files);
     ~StepLine();
     StepLine(const StepLine&) = delete;
     StepLine& operator=(const StepLine&) = delete;
 
-    /// Once a second at most, however often it is called.
+    /// Twice a second at most, however often it is called.
     void draw();
     /// The line that stays, of a step that is done: "train        12 s".
     static void finish(const Console& console, const std::string& label, double seconds);
 
 private:
+    RunProgress& run_;
     std::string label_;
-    std::filesystem::path log_;
+    Files files_;
     bool isShown_;
     std::chrono::steady_clock::time_point begin_, drawn_;
 };
-
-/// The last "N of M" in a text; empty without one.
-std::string lastCount(const std::string& text);
 
 } // namespace quarn

@@ -16,10 +16,11 @@ import time
 import unittest
 from pathlib import Path
 from typing import Any
+from unittest import mock
 
 import numpy as np
 import synthetic
-from trainer import report
+from trainer import progress, report
 from trainer.settings import KINDS, described
 
 ROOT = Path(__file__).resolve().parents[2]
@@ -36,6 +37,25 @@ if os.environ.get("WRONG") == "crash":
 outputs = NumpyModel(sys.argv[2] + "/model.onnx").run(np.load(sys.argv[4]))
 np.save(sys.argv[6], outputs + np.float32(os.environ.get("WRONG", "0")))
 """
+
+
+class ProgressTest(unittest.TestCase):
+    # of a training that goes on, what is left is told by the epochs of this time
+    def test_tells_what_is_left(self) -> None:
+        with tempfile.TemporaryDirectory() as place, mock.patch("trainer.progress.time.monotonic") as clock:
+            clock.return_value = 100.0
+            file = progress.ProgressFile(Path(place) / "p.json", 20)
+            states = []
+            for now, done in (100.1, 11), (108.0, 14), (108.1, 15), (120.0, 20):
+                clock.return_value = now
+                file.keep(done)
+                states.append(json.loads(file.path.read_text()))
+            self.assertEqual([state["done"] for state in states], [0, 14, 14, 20])
+            self.assertEqual([state["secondsLeft"] for state in states], [None, 12.0, 12.0, 0.0])
+            self.assertEqual({state["total"] for state in states}, {20})
+            file.path = Path(place) / "none" / "p.json"
+            clock.return_value = 130.0
+            file.keep(20)  # goes on
 
 
 class CommandTest(unittest.TestCase):
@@ -86,7 +106,9 @@ class CommandTest(unittest.TestCase):
                 digests.append(self.digest())
             self.assertEqual(digests[0], digests[1])
             self.assertNotEqual(digests[0], digests[2])
-        self.run_trainer(*TRAIN, "--direct")
+        self.run_trainer(*TRAIN, "--direct", "--progress", "p.json")
+        state = json.loads((self.place / "p.json").read_text())
+        self.assertEqual([state[key] for key in ("what", "done", "total")], ["epochs", 4, 4])
         self.assertEqual(sorted(os.listdir(self.place / "m")), ["arm.nwrp", "arm.report"])
         self.assertFalse((self.place / "m/arm.nwrp/principal_shapes.json").exists())
 

@@ -33,10 +33,15 @@ others='its arguments are others: --samples 11, was --samples 9'
 expect 0 "import: done\nposes: to do, as $others\nrest: done\nskin: done, but" '' \
   run bone.gltf -o made --import-option=--with-roots --samples 8 --held-out 3 --explain
 
+# state FOLDER PATTERN: what the run's progress.json says, on one line
+state() { tr -d ' \n' <"$1/progress.json" | grep -qE "$2" || fail "$1 says of its progress: $(cat "$1/progress.json")"; }
+state made '"state":"done","error":"","step":"skin","number":4,"of":4,'
+
 # --- a target command that fails, is killed, and works ---
 said='  \| asked for "frames":\[1,.*,9\]\n  \| not yet\n'
 expect 1 '' "targets ended with status 5\n${said}all that it said is in .*/made/log/targets\.log" \
   run bone.gltf -o made "${with_targets[@]}"
+state made '"state":"failed","error":"targetsendedwithstatus5.*,"step":"targets","number":5,'
 # interrupt SIGNAL: while the command is at work; the status goes to $status
 interrupt() {
   touch wait
@@ -53,17 +58,22 @@ interrupt() {
 interrupt TERM
 [[ $status == 130 ]] && grep -q 'what was done before targets is kept .*: the same command goes on' errors.txt ||
   { fail "interrupted: status $status"; cat errors.txt; }
+state made '"state":"interrupted","error":"","step":"targets"'
 interrupt KILL
+state made '"process":[0-9]+,"state":"running"' # and there is no such process
 touch go
 expect 0 '' 'targets +\d.*\ntarget .*\n(  the targets are 0 mm .*\n)?export .*\nheld-out .*\n4 of 8 steps were done' \
   run bone.gltf -o made --until held-out "${with_targets[@]}"
 [[ ! -e made/scratch && -s $(find made/data -name dataset.json | head -n 1) ]] ||
   fail "no data set, or a scratch folder"
 
-# --- on a terminal the line of a step counts: what its log says last ---
+# --- on a terminal the line of a step counts, and the run's progress always: what its log says last ---
 cat >count.sh <<SCRIPT
 printf '10 of 30\n20 of 30\n'
-for i in \$(seq 300); do ! grep -q '20 of 30' "$work/terminal" || exit 7; sleep 0.1; done
+for i in \$(seq 300); do
+  ! { grep -q '20 of 30' "$work/terminal" && grep -q '"done": 20' "$work/counted/progress.json"; } || exit 7
+  sleep 0.1
+done
 SCRIPT
 counted="'$quarn' run bone.gltf -o counted ${options[*]} --target-command sh count.sh"
 ! script -qfec "$counted" terminal >/dev/null </dev/null || fail "a target command that fails is taken"
@@ -121,7 +131,12 @@ expect 0 'target: to do, as its input .*/dual\.npy has changed' '' "${skinned[@]
 expect 1 '' 'target ended with status 1\n(.|\n)*the skin is at rest in all of them' "${skinned[@]}"
 
 # --- targets in a file a frame: each of them counts ---
-expect 0 '' 'wrote 9 frames' bake moved/poses.mesh.json mesh_target.outMesh --frames 1-9 -o 'seq.##.obj'
+expect 0 '' 'wrote 9 frames' bake moved/poses.mesh.json mesh_target.outMesh --frames 1-9 -o 'seq.##.obj' \
+  --progress baked.json
+tr -d ' \n' <baked.json | grep -q '^{"what":"[^"]*","done":9,"total":9,"seconds":[^,]*,"secondsLeft":0.0}$' ||
+  fail "not all frames are done: $(cat baked.json)"
+expect 1 '' 'none/baked\.json' bake moved/poses.mesh.json mesh_target.outMesh --frames 1-9 -o other.npy \
+  --progress /proc/none/baked.json
 sequence=(run bone.gltf -o sequence "${options[@]}" --targets 'seq.##.obj' --until target)
 expect 0 '' 'target .*s\n(.|\n)*' "${sequence[@]}"
 expect 0 '' '^5 of 5 steps were done already\n$' "${sequence[@]}"
