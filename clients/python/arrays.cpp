@@ -20,35 +20,36 @@ std::string textOf(const Shape& shape) {
     return text + "]";
 }
 
-std::string shapeTextOf(const py::array& array) {
-    return textOf({array.shape(), array.shape() + array.ndim()});
-}
-
-std::string typeTextOf(const py::array& array) {
-    return py::str(static_cast<py::object>(array.dtype()));
+/// "float64 [3, 2]"
+std::string textOf(const py::array& array) {
+    return std::string(py::str(static_cast<py::object>(array.dtype()))) + " " +
+           textOf({array.shape(), array.shape() + array.ndim()});
 }
 
 [[noreturn]] void refuse(const std::string& name, const std::string& expected, const std::string& got) {
     throw py::value_error(name + ": expected " + expected + ", got " + got);
 }
 
-void checkShape(const py::array& array, const std::string& name, const Shape& shape) {
-    bool fits = array.ndim() == static_cast<py::ssize_t>(shape.size());
-    for (std::size_t i = 0; fits && i < shape.size(); ++i)
-        fits = shape[i] == anyLength || shape[i] == array.shape(static_cast<py::ssize_t>(i));
-    if (!fits)
-        refuse(name, "the shape " + textOf(shape), shapeTextOf(array));
+bool fits(const py::array& array, const Shape& shape) {
+    if (array.ndim() != static_cast<py::ssize_t>(shape.size()))
+        return false;
+    for (std::size_t i = 0; i < shape.size(); ++i)
+        if (shape[i] != anyLength && shape[i] != array.shape(static_cast<py::ssize_t>(i)))
+            return false;
+    return true;
 }
 
-/// `kinds` of types, as NumPy's dtype.kind has them.
+/// `kinds` of types, as NumPy's dtype.kind has them, any of which becomes `expected`.
 py::array arrayOf(py::handle value, const std::string& name, const Shape& shape, std::string_view kinds,
-                  const std::string& expected) {
+                  const char* expected) {
     py::array array = py::array::ensure(value);
+    const auto wanted = [&] { return std::string(expected) + " " + textOf(shape); };
     if (!array)
-        refuse(name, expected + " " + textOf(shape), "a " + std::string(py::str(py::type::of(value).attr("__name__"))));
-    if (kinds.find(array.dtype().kind()) == std::string_view::npos && array.size() != 0)
-        refuse(name, expected, typeTextOf(array));
-    checkShape(array, name, shape);
+        refuse(name, wanted(), "a " + typeNameOf(value));
+    // a list of nothing is of floats
+    const bool isOfKind = kinds.find(array.dtype().kind()) != std::string_view::npos || array.size() == 0;
+    if (!isOfKind || !fits(array, shape))
+        refuse(name, wanted(), textOf(array));
     return array;
 }
 
@@ -56,7 +57,7 @@ template <class Array>
 Array converted(const py::array& array, const std::string& name) {
     Array own = Array::ensure(array);
     if (!own)
-        refuse(name, "numbers that can be converted", typeTextOf(array));
+        refuse(name, "numbers that can be converted", textOf(array));
     if ((own.flags() & alignedFlag) == 0)
         own = Array::ensure(own.attr("copy")());
     return own;
@@ -64,8 +65,12 @@ Array converted(const py::array& array, const std::string& name) {
 
 } // namespace
 
+std::string typeNameOf(py::handle value) {
+    return py::str(py::type::of(value).attr("__name__"));
+}
+
 FloatArray floatsOf(py::handle value, const std::string& name, const Shape& shape) {
-    return converted<FloatArray>(arrayOf(value, name, shape, "fiu", "real numbers (float32)"), name);
+    return converted<FloatArray>(arrayOf(value, name, shape, "fiu", "float32"), name);
 }
 
 IndexArray indicesOf(py::handle value, const std::string& name, const Shape& shape) {
@@ -75,15 +80,20 @@ IndexArray indicesOf(py::handle value, const std::string& name, const Shape& sha
 FloatArray resultIn(py::handle out, const std::string& name, const Shape& shape) {
     if (out.is_none())
         return FloatArray(shape);
-    const std::string expected = "None or a writable C-contiguous float32 array " + textOf(shape);
+    const auto refuseOut = [&](const std::string& got) {
+        refuse(name, "a writable C-contiguous float32 " + textOf(shape), got);
+    };
     if (!py::isinstance<py::array>(out))
-        refuse(name, expected, "a " + std::string(py::str(py::type::of(out).attr("__name__"))));
+        refuseOut("a " + typeNameOf(out));
     const auto array = py::reinterpret_borrow<py::array>(out);
-    if (!FloatArray::check_(array))
-        refuse(name, expected, "one of " + typeTextOf(array) + (array.flags() & py::array::c_style ? "" : ", strided"));
-    checkShape(array, name, shape);
-    if (!array.writeable() || (array.flags() & alignedFlag) == 0)
-        refuse(name, expected, array.writeable() ? "one that is not aligned" : "one that is read-only");
+    if (!py::isinstance<py::array_t<float>>(array) || !fits(array, shape))
+        refuseOut(textOf(array));
+    if ((array.flags() & py::array::c_style) == 0)
+        refuseOut("one with gaps or of another order");
+    if (!array.writeable())
+        refuseOut("one that is read-only");
+    if ((array.flags() & alignedFlag) == 0)
+        refuseOut("one that is not aligned");
     return py::reinterpret_borrow<FloatArray>(out);
 }
 
@@ -98,7 +108,8 @@ void checkApart(const std::vector<NamedArray>& arrays) {
             const auto begin = reinterpret_cast<std::uintptr_t>(named.array.data());
             extents.push_back({begin, begin + static_cast<std::uintptr_t>(named.array.nbytes()), &named});
         }
-    std::sort(extents.begin(), extents.end(), [](const Extent& a, const Extent& b) { return a.begin < b.begin; });
+    std::stable_sort(extents.begin(), extents.end(),
+                     [](const Extent& a, const Extent& b) { return a.begin < b.begin; });
     // whoever begins before the furthest end so far lies in that one
     const Extent* furthest = nullptr;    // of all
     const Extent* furthestOut = nullptr; // of the results

@@ -5,6 +5,7 @@
 
 #include <pybind11/numpy.h>
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
@@ -24,6 +25,9 @@ IndexArray indicesOf(pybind11::handle value, const std::string& name, const Shap
 
 /// Where a result goes: a new array for None, else `out` itself, which must be float32, C-contiguous and writable.
 FloatArray resultIn(pybind11::handle out, const std::string& name, const Shape& shape);
+
+/// Name of the type of an object, for a message.
+std::string typeNameOf(pybind11::handle value);
 
 /// An argument, for checkApart().
 struct NamedArray {

@@ -33,8 +33,7 @@ void checkLength(const char* argument, const py::sequence& values, std::size_t c
 
 py::sequence listOf(const char* argument, const py::object& values, std::size_t count) {
     if (!py::isinstance<py::sequence>(values))
-        throw py::value_error(std::string(argument) + ": expected a list, got a " +
-                              std::string(py::str(py::type::of(values).attr("__name__"))));
+        throw py::value_error(std::string(argument) + ": expected a list, got a " + typeNameOf(values));
     const auto list = py::reinterpret_borrow<py::sequence>(values);
     checkLength(argument, list, count);
     return list;
@@ -45,8 +44,7 @@ std::vector<Deformer*> deformersOf(const py::sequence& list) {
     for (std::size_t i = 0; i < list.size(); ++i) {
         const py::object item = list[i];
         if (!py::isinstance<Deformer>(item))
-            throw py::value_error(place("deformers", i) + ": expected a Deformer, got a " +
-                                  std::string(py::str(py::type::of(item).attr("__name__"))));
+            throw py::value_error(place("deformers", i) + ": expected a Deformer, got a " + typeNameOf(item));
         deformers.push_back(item.cast<Deformer*>());
     }
     return deformers;

@@ -18,8 +18,12 @@ namespace py = pybind11;
 
 namespace {
 
+py::ssize_t lengthOf(std::size_t count) {
+    return static_cast<py::ssize_t>(count);
+}
+
 std::unique_ptr<Deformer> make(const std::shared_ptr<Model>& model, const py::object& faces, const py::object& rest) {
-    const FloatArray points = floatsOf(rest, "rest", {anyLength, 3});
+    const FloatArray points = floatsOf(rest, "rest", {lengthOf(model->metadata().fullCount), 3});
     const auto count = static_cast<std::size_t>(points.shape(0));
     const quill::MeshTopology topology = topologyOf(faces, count);
     std::unique_ptr<Deformer> deformer;
@@ -29,10 +33,6 @@ std::unique_ptr<Deformer> make(const std::shared_ptr<Model>& model, const py::ob
         deformer = std::make_unique<Deformer>(model, topology, pointsOf(points), watch);
     });
     return deformer;
-}
-
-py::ssize_t lengthOf(std::size_t count) {
-    return static_cast<py::ssize_t>(count);
 }
 
 /// Weights [N], or none at all.
