@@ -234,13 +234,11 @@ def take_both(rig: Rig, caches: Caches, frame: int, switches: Switches) -> None:
 
 
 def come_to_rest(rig: Rig) -> None:
-    """Starts the memory of the modifiers anew, and holds the pose."""
-    held = [rig.thing.modifiers[name] for name in rig.stack.held]
-    scene, start = bpy.context.scene, min(modifier.point_cache.frame_start for modifier in held)
-    for modifier in held:  # a setting that is set again drops what the cache holds of the pose before
-        modifier.point_cache.frame_start = modifier.point_cache.frame_start
+    """Starts the memory of the modifiers anew, and holds the pose. At its first frame a simulation drops what it knows,
+    as the pose is another."""
+    start = min(rig.thing.modifiers[name].point_cache.frame_start for name in rig.stack.held)
     for frame in range(start, start + rig.settings.hold + 1):
-        scene.frame_set(frame)
+        bpy.context.scene.frame_set(frame)
 
 
 def sample_poses(rig: Rig, character: Character, posed: Sequence[str], switches: Switches) -> Iterator[Progress]:

@@ -148,8 +148,10 @@ def read_stack(thing: Any) -> Stack:
 def check_object(thing: Any) -> None:
     if thing is None or thing.type != "MESH":
         raise Refused("the active object is " + ("none" if thing is None else f"{thing.name}, which is no mesh"))
-    if thing.library is not None:
-        raise Refused(f"{thing.name} is linked from {thing.library.filepath}: make a library override of it first")
+    for block in (thing, thing.data):
+        if block.library is not None:
+            raise Refused(f"{block.name} is linked from {block.library.filepath}: make a library override of object "
+                          "and mesh first")
     if thing.mode == "EDIT":
         raise Refused(f"{thing.name} is in edit mode: leave it first")
     if hasattr(thing, "neuralwarp") and thing.neuralwarp.in_use:  # what there is to learn is off

@@ -162,6 +162,28 @@ def test_what_is_learned() -> None:
     assert found.muted_modifiers == ["Corrective Smooth", "Sub", "Solid"]
 
 
+def test_a_linked_rig_is_refused_and_its_override_sampled() -> None:
+    thing, armature = new_arm()
+    collection = bpy.data.collections.new("Arm")
+    for one in (thing, armature):
+        collection.objects.link(one)
+    bpy.data.libraries.write(str(FOLDER / "library.blend"), {collection})
+    bpy.ops.wm.read_factory_settings(use_empty=True)
+    bpy.ops.wm.save_as_mainfile(filepath=str(FOLDER / "shot.blend"))
+    with bpy.data.libraries.load("//library.blend", link=True, relative=True) as (_, wanted):
+        wanted.collections = ["Arm"]
+    bpy.context.scene.collection.children.link(wanted.collections[0])
+    bpy.context.view_layer.update()
+    linked = wanted.collections[0].objects["arm"]
+    said = refused(lambda: stack.read_stack(linked))
+    assert said == "arm is linked from //library.blend: make a library override of object and mesh first", said
+    wanted.collections[0].override_hierarchy_create(bpy.context.scene, bpy.context.view_layer)
+    thing = next(one for one in bpy.data.objects if one.type == "MESH" and one.override_library)
+    sampling.sample_all(thing, sampling.Settings(samples=4, held_out=3), lambda text: None)
+    folder = run_folder.folder_of(thing)
+    assert folder.is_sampled and difference(folder.skin, folder.targets) > 0.01
+
+
 def with_follower(armature: Any) -> None:
     without_limits(armature)
     copy = armature.pose.bones["hand"].constraints.new("COPY_ROTATION")
