@@ -17,7 +17,7 @@ import subprocess
 import time
 from dataclasses import dataclass
 from pathlib import Path
-from typing import Any, Dict, List, Optional, Sequence
+from typing import Any, Dict, List, Optional
 
 from . import preferences
 from .run_folder import RunFolder, read_json, write_json
@@ -53,6 +53,7 @@ def start(folder: RunFolder, epochs: int = 0, with_report: bool = True) -> None:
         words += ["--epochs", str(epochs)]
     if not with_report:
         words += ["--until", "evaluate"]
+    began = time.time()
     with open(folder.log, "wb") as log:
         try:
             child = subprocess.Popen(["/bin/sh", "-c", KEEPER, str(folder.ended), *words], stdin=subprocess.DEVNULL,
@@ -61,7 +62,7 @@ def start(folder: RunFolder, epochs: int = 0, with_report: bool = True) -> None:
         except OSError as error:
             raise Refused(f"the training cannot be started: {error.strerror}") from None
     _children[child.pid] = child
-    write_json(folder.job, {"pid": child.pid, "born": born(child.pid), "began": time.time()})
+    write_json(folder.job, {"pid": child.pid, "born": born(child.pid), "began": began})
 
 
 def trainer(paths: preferences.Paths, folder: RunFolder) -> Dict[str, str]:
@@ -128,7 +129,8 @@ def status(folder: RunFolder) -> Status:
         return Status("done")
     if code in CANCELLED:
         return Status("cancelled", "the training was cancelled; started again it goes on")
-    return Status("failed", " / ".join(log_lines(folder)[-TAIL:]) or f"quarn run ended with status {code}")
+    said = run_says(folder).get("error") or " / ".join(log_lines(folder)[-TAIL:])
+    return Status("failed", said or f"quarn run ended with status {code}")
 
 
 def cancel(folder: RunFolder, patience: float = 15.0) -> None:
@@ -162,6 +164,27 @@ def log_lines(folder: RunFolder) -> List[str]:
 
 
 def progress(folder: RunFolder) -> str:
-    """The last of what the job said."""
-    lines: Sequence[Any] = log_lines(folder)
-    return str(lines[-1]) if lines else "the training begins"
+    """How far the run is, by what quarn writes of it: "train, step 7 of 15, epochs: 120 of 400, 2 minutes left"."""
+    now = run_says(folder)
+    if now.get("state") != "running":
+        return "the training begins"
+    text = f"{now.get('step')}, step {now.get('number')} of {now.get('of')}"
+    if now.get("total"):
+        text += f", {now.get('what')}: {now.get('done')} of {now.get('total')}"
+    left = now.get("secondsLeft")
+    return text + (f", {minutes(left)} left" if isinstance(left, (int, float)) else "")
+
+
+def run_says(folder: RunFolder) -> Dict[str, Any]:
+    """The run's progress.json, unless it is of an earlier run."""
+    file = folder.run / "progress.json"
+    try:
+        is_of_now = file.stat().st_mtime >= float(read_json(folder.job).get("began", 0.0))
+    except OSError:
+        return {}
+    return read_json(file) if is_of_now else {}
+
+
+def minutes(seconds: float) -> str:
+    whole = round(seconds / 60)
+    return "less than a minute" if seconds < 60 else f"{whole} minute{'s' if whole > 1 else ''}"

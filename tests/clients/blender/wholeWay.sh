@@ -1,8 +1,9 @@
 #!/usr/bin/env bash
-# wholeWay.sh QUARN MODULES: the arm in Blender, from the rig to a neural deformation: sampled and trained in one session,
-# which ends while the training runs, and used in another. MODULES is the folder in which the module neuralwarp lies.
+# wholeWay.sh QUARN: the arm in Blender, from the rig to a neural deformation: sampled in one session, which ends while
+# the training runs, trained in another, and used in a third.
 set -euo pipefail
-quarn=$1 modules=$2
+quarn=$1
+modules=$(dirname "$quarn")/../clients/python
 here=$(dirname "$0")
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
