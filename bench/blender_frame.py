@@ -5,7 +5,7 @@
 
 QUARN is the program, MODULE the folder with neuralwarp/. The mesh is a tube with a chain of bones that all turn; the
 model has the size of a trained one, two layers of 512, 50 principal shapes, Surface with 10 smoothing passes; its
-numbers mean nothing.
+numbers mean nothing. As the trainer writes it, the network asks for one thread.
 """
 
 import json
@@ -122,7 +122,9 @@ def write_network(path: Path, controls: int) -> None:
             name = f"layer{layer}"
     graph = helper.make_graph(nodes, "tube", [helper.make_tensor_value_info("controls", 1, [controls])],
                               [helper.make_tensor_value_info(name, 1, [SHAPES])], tensors)
-    onnx.save(helper.make_model(graph, opset_imports=[helper.make_opsetid("", 13)], ir_version=7), str(path))
+    model = helper.make_model(graph, opset_imports=[helper.make_opsetid("", 13)], ir_version=7)
+    helper.set_model_props(model, {"ort_config": json.dumps({"session_options": {"intra_op_num_threads": 1}})})
+    onnx.save(model, str(path))
 
 
 def measure(thing: Any) -> Dict[str, float]:

@@ -10,6 +10,7 @@ from typing import Any, List, Sequence, Tuple
 import numpy as np
 from numpy.typing import NDArray
 
+from .character import to_mesh
 from .model_folder import NotUsable
 
 Array = NDArray[np.float64]
@@ -40,6 +41,8 @@ class JointSetter:
         self._unoriented = split(rest)[1].transpose(0, 2, 1)  # the inverse of JO
         self._plugs = scene.plugs([f"{name}.{attribute}" for _, name in bones for attribute in ATTRIBUTES])
         self._values = np.empty((len(bones), 3, 3))  # translate, rotate, scale
+        self._places: Any = None  # of mesh and armature, of the last frame
+        self._to_mesh = np.eye(4)
         self._names: List[str] = []  # of all bones of the armature, as they were found
         self._matrices = np.empty(0, dtype=np.float32)
         self._rows = np.empty(0, dtype=np.intp)
@@ -50,8 +53,10 @@ class JointSetter:
         if len(bones) != len(self._names) or bones.keys() != self._names:
             self.find_bones(armature)
         bones.foreach_get("matrix", self._matrices)  # column by column, which is a row vector's matrix row by row
-        place = np.array(armature.matrix_world.transposed()) @ np.array(thing.matrix_world.inverted().transposed())
-        self._worlds[self._numbers] = self._matrices.reshape(-1, 4, 4)[self._rows] @ place
+        places = (thing.matrix_world.copy(), armature.matrix_world.copy())
+        if places != self._places:  # to read one takes as long as all bones together
+            self._places, self._to_mesh = places, to_mesh(thing, armature).T
+        self._worlds[self._numbers] = self._matrices.reshape(-1, 4, 4)[self._rows] @ self._to_mesh
         local = self._worlds[self._numbers] @ inverses(self._worlds[self._parents])
         scale, rotation = split(local)
         self._values[:, 0] = local[:, 3, :3]
