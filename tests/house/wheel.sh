@@ -65,7 +65,7 @@ grep -qx "version = \"$version\"" "$work/scripts/addons/neuralwarp_blender/blend
 
 # --- the wheel, without a network, and used from another folder ---
 or_tell "$python" -m venv --system-site-packages "$work/env"
-or_tell "$work/env/bin/python" -m pip install -q --no-index --no-deps "$wheel"
+PIP_FIND_LINKS= or_tell "$work/env/bin/python" -m pip install -q --no-index "$wheel[train]"
 cp -r examples/wave "$work/wave"
 mkdir "$work/elsewhere"
 # elsewhere COMMAND...: with no other environment than a user's
