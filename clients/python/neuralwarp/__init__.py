@@ -5,11 +5,13 @@ from typing import TYPE_CHECKING, Any
 
 from ._core import Deformer, Model, evaluate_characters, smooth, vertex_frames
 from ._core import version as __version__
+from .training import train
 
 if TYPE_CHECKING:
     from ._scene import Plugs, Scene
 
-__all__ = ["Deformer", "Model", "Plugs", "Scene", "__version__", "evaluate_characters", "smooth", "vertex_frames"]
+__all__ = ["Deformer", "Model", "Plugs", "Scene", "__version__", "evaluate_characters", "smooth", "train",
+           "vertex_frames"]
 
 
 def __getattr__(name: str) -> Any:

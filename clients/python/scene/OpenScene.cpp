@@ -75,15 +75,18 @@ void OpenScene::open() {
 }
 
 void OpenScene::placeModelRoots() {
-    for (const HObject& node : quarn::nodesOfType("neuralWarp")) {
-        HPlug root = quarn::plugOf(node, "modelRoot");
-        if (root.isDestination())
-            continue;
-        const bool isLocked = root.isLocked();
-        root.setLocked(false);
-        quarn::setText(root, textFor(root, quarn::textOf(root)));
-        root.setLocked(isLocked);
-    }
+    for (const HObject& node : quarn::nodesOfType("neuralWarp"))
+        placeModelRoot(node);
+}
+
+void OpenScene::placeModelRoot(const HObject& deformer) const {
+    HPlug root = quarn::plugOf(deformer, "modelRoot");
+    if (root.isDestination())
+        return;
+    const bool isLocked = root.isLocked();
+    root.setLocked(false);
+    quarn::setText(root, textFor(root, quarn::textOf(root)));
+    root.setLocked(isLocked);
 }
 
 std::string OpenScene::textFor(const HPlug& plug, const std::string& text) const {
@@ -152,7 +155,12 @@ void Visit::requireNoErrors(const HPlug& plug) {
     if (text.empty())
         return;
     host_.errors().clear();
-    OpenQuarn::makeDirty(plug); // else what was left there would be taken for its value next time
+    // else what was left there would be taken for its value next time, and a deformer that has looked for its model
+    // would not look again
+    OpenQuarn::makeDirty(plug);
+    for (const HObject& node : quarn::nodesOfType("neuralWarp"))
+        if (node == plug.node())
+            scene_.placeModelRoot(node);
     throw std::runtime_error(std::string(plug.name().asChar()) + ": " + text);
 }
 

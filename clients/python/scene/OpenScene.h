@@ -58,6 +58,8 @@ private:
     Deformer& keptDeformer(const std::string& name);
     void open();
     void placeModelRoots();
+    /// Sets modelRoot, whereupon the deformer opens its models.
+    void placeModelRoot(const HObject& deformer) const;
 
     std::filesystem::path path_;
     std::unique_ptr<OpenQuarn::Scene> scene_;

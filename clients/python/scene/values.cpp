@@ -159,6 +159,8 @@ void setOtherNumber(const HPlug& plug, const py::handle& value) {
 }
 
 std::vector<double> numbersFrom(const HPlug& plug, const py::handle& value, const char* expected) {
+    if (value.is_none()) // NumPy makes a number of it
+        refuseType(plug, expected, value);
     const auto array = py::array_t<double, py::array::c_style | py::array::forcecast>::ensure(value);
     if (!array) {
         PyErr_Clear();
@@ -200,7 +202,14 @@ void setParts(OpenScene& scene, const HPlug& plug, const py::handle& value) {
         setValue(scene, isArray ? plug.elementByLogicalIndex(i) : plug.child(i), py::object(parts[i]));
 }
 
-std::string shapeText(const py::array& array) {
+std::string shapeText(const std::vector<py::ssize_t>& shape) {
+    py::tuple sizes(shape.size());
+    for (std::size_t i = 0; i < shape.size(); ++i)
+        sizes[i] = shape[i];
+    return py::str(sizes);
+}
+
+std::string describe(const py::array& array) {
     return std::string(py::str(array.attr("dtype"))) + " " + std::string(py::str(array.attr("shape")));
 }
 
@@ -261,9 +270,8 @@ FloatArray writable(const py::array& array, const std::vector<py::ssize_t>& shap
                       std::equal(shape.begin(), shape.end(), array.shape()) && array.writeable();
     if (fits)
         return py::reinterpret_borrow<FloatArray>(array);
-    throw std::invalid_argument(std::string(name) + " has to be float32 " +
-                                std::string(py::str(py::tuple(py::cast(shape)))) + ", C-contiguous and writable, not " +
-                                shapeText(array));
+    throw std::invalid_argument(std::string(name) + " has to be float32 " + shapeText(shape) +
+                                ", C-contiguous and writable, not " + describe(array));
 }
 
 FloatArray pointsOf(Visit& visit, const HPlug& plug, const std::optional<py::array>& out) {
