@@ -65,6 +65,7 @@ import json, sys
 errors = json.load(open(sys.argv[1]))
 if errors["ranWith"] != "quarn" or not errors["network"]["mean"]["mm"] < 0.9 * errors["base"]["mean"]["mm"]:
     sys.exit(f"the model is no better than none: {errors}")' "$work/said"
+installed env PYTHONPATH=moved/lib/python3 "$python" -c "import neuralwarp; neuralwarp.Scene"
 for program in quarn neuralwarp-train env/bin/neuralwarp-train; do
   installed "$program" --version
   [[ $(<"$work/said") == *" $(<VERSION)" ]] || fail "$program is not of version $(<VERSION)"

@@ -1,9 +1,9 @@
 #!/usr/bin/env bash
-# wholeWay.sh QUARN: the arm in Blender, from the rig to a neural deformation: sampled in one session, which ends while
-# the training runs, trained in another, and used in a third.
+# wholeWay.sh QUARN MODULE: the arm in Blender, from the rig to a neural deformation: sampled in one session, which ends
+# while the training runs, trained in another, and used in a third.
 set -euo pipefail
 quarn=$1
-modules=$(dirname "$quarn")/../clients/python
+modules=$2
 here=$(dirname "$0")
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
