@@ -21,7 +21,7 @@ command_coverage() {
   if [[ -d $tree ]]; then find "$tree" -name '*.gcda' -delete; fi # what earlier runs have counted
   test_as_said coverage || failed=1
   say "coverage: lines that the tests have reached, by folder; file by file in $tree/coverage.csv"
-  gcovr --root . --object-directory "$tree" --filter '(libraries|host|plugin|quarn)/' --exclude-throw-branches \
+  gcovr --root . --object-directory "$tree" --filter '(libraries|host|plugin|quarn|clients)/' --exclude-throw-branches \
     -j "$(job_count)" --csv "$tree/coverage.csv" "$tree" 2>"$tree/gcovr.log" || {
     tail -n 5 "$tree/gcovr.log" >&2
     return 1

@@ -17,6 +17,7 @@ for program in apt-get npm cmake ctest; do
 done
 # where something is missing, installing it would show among the calls as well
 printf '#!/bin/sh\nexec "$@"\n' >"$work/bin/sudo"
+printf '#!/bin/sh\nprintf "%%s: phony\\n" all clients/python/all quarn/quarn tests/plugin/gpu/all\n' >"$work/bin/ninja"
 chmod +x "$work"/bin/*
 
 failures=0
@@ -72,6 +73,14 @@ run_row 2 "$work/file: no folder" nothing demo --output file # which is in the c
 run_row 0 'testing libraries/geometry' '^cmake --build .* --target tests/libraries/geometry/all$' test geometry
 run_row 0 'testing plugin/gpu' '^ctest --test-dir build/release/tests/plugin/gpu .* -R one$' \
   test tests/host/graph/ gpu -R one
+# and with them what their command lines name: a program, a folder of which all is built, one that is only worked in
+mkdir -p "$place/build/release/tests/plugin/gpu"
+cat >"$place/build/release/tests/plugin/gpu/CTestTestfile.cmake" <<TESTS
+add_test([=[one]=] "one.sh" "$place/build/release/quarn/quarn")
+set_tests_properties([=[one]=] PROPERTIES ENVIRONMENT "PYTHONPATH=$place/build/release/clients/python;A=b"
+  WORKING_DIRECTORY "$place/build/release/work")
+TESTS
+run_row 0 'testing plugin/gpu' '^cmake --build .* --target tests/plugin/gpu/all clients/python/all quarn/quarn$' test gpu
 run_row 0 'testing release' '^ctest --preset release .* -R geometry$' test -R geometry
 
 # --- a demo says what is coming ---
