@@ -162,6 +162,8 @@ class DeformerTest(Core):
             (lambda: evaluate(points, CONTROLS, points), "out: expected memory of its own, got some of points"),
             (lambda: evaluate(many.ravel()[3:3 * N + 3].reshape(N, 3), CONTROLS, many[0]), "got some of points"),
             (lambda: evaluate(POINTS, many.ravel()[:2], many[0]), "got some of controls"),
+            (lambda: evaluate(many.ravel()[2:3 * N + 2].reshape(N, 3), many.ravel()[:2],
+                              many.ravel()[5:3 * N + 5].reshape(N, 3)), "got some of points"),
             (lambda: evaluate(POINTS, CONTROLS, many[0], weights=many[0, :, 0].ravel()[:0]), "weights: expected"),
             (lambda: evaluate(POINTS, CONTROLS, many), writable + f"float32 [4, {N}, 3]"),
             (lambda: evaluate(POINTS, CONTROLS, POINTS.astype(float)), writable + f"float64 [{N}, 3]"),
