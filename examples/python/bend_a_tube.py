@@ -81,7 +81,8 @@ def plot(path: Path, shapes: dict[str, np.ndarray]) -> None:
 
     figure = pyplot.figure(figsize=(4 * len(shapes), 4))
     for place, (title, points) in enumerate(shapes.items()):
-        axes = figure.add_subplot(1, len(shapes), place + 1, projection="3d", title=title)
+        axes = figure.add_subplot(1, len(shapes), place + 1, projection="3d")
+        axes.set_title(title, y=0.9)
         rings = points.reshape(RINGS, SIDES, 3)[:, [*range(SIDES), 0]]
         axes.plot_surface(*rings.transpose(2, 0, 1), rstride=1, cstride=1, color="lightsteelblue", edgecolor="grey",
                           linewidth=0.2)
@@ -112,7 +113,8 @@ def main() -> None:
 
     pose = np.radians([90, 80]).astype(np.float32)
     plot(folder / "tube.png", {"linear blend skinning": skinned(pose),
-                               "with the model": deformer.evaluate(skinned(pose), pose), "as it should be": wanted(pose)})
+                               "with the model": deformer.evaluate(skinned(pose), pose),
+                               "as it should be": wanted(pose)})
     print(f"{folder / 'tube.png'}")
 
 
