@@ -108,9 +108,9 @@ def limits_of_actions(armature: Any, joints: List[Joint]) -> Limits:
     """How far the actions turn these joints, constraints and drivers included."""
     ranges: Dict[str, Dict[str, Range]] = {joint.name: {} for joint in joints}
     actions = actions_of(armature)
-    if not actions:
+    if not actions or not joints:
         return {}
-    with playing(armature) as data:
+    with playing(armature, actions) as data:
         for action in actions:
             data.action = action
             first, last = action.frame_range

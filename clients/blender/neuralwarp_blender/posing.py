@@ -97,17 +97,35 @@ def keep_pose(restorer: Restorer, armature: Any) -> None:
         restorer.keep(data, "action")
 
 
+def keep_path(restorer: Restorer, owner: Any, path: str) -> None:
+    """What an f-curve's path leads to; nothing where it leads nowhere."""
+    try:
+        if path.endswith('"]'):  # a custom property
+            base, _, name = path[:-2].rpartition('["')
+            holder, name = owner.path_resolve(base) if base else owner, bpy.utils.unescape_identifier(name)
+            value = holder[name]
+            restorer.then(lambda: holder.__setitem__(name, value))
+        else:
+            base, _, name = path.rpartition(".")
+            restorer.keep(owner.path_resolve(base) if base else owner, name)
+    except (ValueError, KeyError, AttributeError):
+        return
+
+
 @contextmanager
-def playing(armature: Any, action: Any = None) -> Iterator[Any]:
-    """The armature's animation data, for actions to be put in and played; all is put back afterwards."""
+def playing(armature: Any, actions: Sequence[Any]) -> Iterator[Any]:
+    """The armature's animation data, with the first of these actions in it; all of them may be played. What they move
+    is put back afterwards, whatever it is."""
     with Restorer() as restorer:
         if armature.animation_data is None:
             armature.animation_data_create()
             restorer.then(armature.animation_data_clear)
+        for path in {curve.data_path for action in actions for curve in action.fcurves}:
+            keep_path(restorer, armature, path)
         keep_pose(restorer, armature)
         keep_frame(restorer, bpy.context.scene)
         data: Any = armature.animation_data
-        data.use_nla, data.action = False, action
+        data.use_nla, data.action = False, actions[0]
         yield data
 
 

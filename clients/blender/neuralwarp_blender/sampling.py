@@ -261,7 +261,7 @@ def sample_motion(rig: Rig, character: Character, switches: Switches) -> Iterato
     count = last - first + 1
     files = (rig.folder.motion_skin, rig.folder.motion_targets)
     track = JointTrack(character)
-    with playing(rig.armature, action), Caches(files, count, len(character.points)) as caches:
+    with playing(rig.armature, [action]), Caches(files, count, len(character.points)) as caches:
         for frame in range(count):
             bpy.context.scene.frame_set(first + frame)
             graph = bpy.context.evaluated_depsgraph_get()

@@ -131,7 +131,9 @@ def read_stack(thing: Any) -> Stack:
     left_out = changing_vertices(thing, [modifier.name for modifier in kept], [modifier.name for modifier in behind])
     learned = [modifier for modifier in behind if modifier.name not in left_out and modifier.type not in HARMLESS]
     keys = tuple(driven_keys(thing))
-    check_time(thing, kept)
+    for name in check_time(thing, kept):
+        raise Refused(f"{thing.name}: the modifier {name} has a memory, and stands before the armature, whose mesh a "
+                      "model builds on: move it behind, or switch it off")
     held = check_time(thing, learned)
     if not learned and not keys:
         raise Refused(f"{thing.name} has no modifier behind its armature and no shape key with a driver: "

@@ -73,7 +73,8 @@ def state(thing: Any, armature: Any) -> List[Any]:
              for bone in armature.pose.bones],
             [constraint.mute for bone in armature.pose.bones for constraint in bone.constraints],
             [curve.mute for curve in data.drivers], data.action, data.use_nla, scene.frame_current,
-            scene.frame_subframe, [modifier.show_viewport for modifier in thing.modifiers],
+            scene.frame_subframe, armature.matrix_world.copy(), armature["switch"],
+            [modifier.show_viewport for modifier in thing.modifiers],
             [key.mute for key in thing.data.shape_keys.key_blocks], stack.evaluated_points(thing).tobytes()]
 
 
@@ -81,7 +82,12 @@ def test_all_is_put_back() -> None:
     thing, armature = new_arm()
     bpy.context.scene.frame_set(20, subframe=0.25)
     armature.pose.bones["hand"].driver_add("location", 1).driver.expression = "0.01"
+    armature["switch"] = 2
+    other = bpy.data.actions.new("other")  # is looked at for limits, and moves more than bones
+    for path, index in (("location", 1), ('["switch"]', 0), ('pose.bones["upperArm"].rotation_euler', 1)):
+        other.fcurves.new(path, index=index).keyframe_points.insert(1, 5)
     hand = armature.pose.bones["hand"]
+    hand.constraints.remove(hand.constraints[0])
     hand.rotation_mode = "AXIS_ANGLE"
     hand.rotation_axis_angle = (0.5, 0.6, 0.0, 0.8)  # by hand, without a key
     bpy.context.view_layer.update()
@@ -125,6 +131,8 @@ REFUSED: Dict[str, Tuple[Callable[[Any, Any], Any], str]] = {
                       "arm: the modifier Mirror makes 7\\d+ vertices of 3682 before the armature: .*"),
     "learned behind": (lambda thing, _: [thing.modifiers.new("Sub", "SUBSURF"), thing.modifiers.new("Cast", "CAST")],
                        "arm: the modifier Sub changes the number of vertices, and Cast stands behind it: .*"),
+    "cloth before": (lambda thing, _: to_front(thing.modifiers.new("Cloth", "CLOTH")),
+                     "arm: the modifier Cloth has a memory, and stands before the armature, .*"),
     "time": (lambda thing, _: thing.modifiers.new("Wave", "WAVE"), "arm: the modifier Wave depends on the frame, .*"),
     "switch": (lambda thing, _: thing.modifiers[1].driver_add("show_viewport"),
                "arm: a driver switches the modifier Corrective Smooth .*"),
