@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 """The add-on's settings: where models, `quarn` and a Python for trainings are."""
 
+import os
 import shutil
 from typing import NamedTuple
 
@@ -40,9 +41,11 @@ def paths() -> Paths:
 
     def setting(name: str) -> str:
         text = getattr(settings, name, "") if settings else ""
-        return bpy.path.abspath(text) if text else ""
+        return os.path.abspath(bpy.path.abspath(text)) if text else ""
 
-    return Paths(setting("models_path"), setting("quarn_path") or shutil.which("quarn") or "", setting("python_path"))
+    found = shutil.which("quarn")  # as the PATH has it, which may be relative
+    return Paths(setting("models_path"), setting("quarn_path") or (os.path.abspath(found) if found else ""),
+                 setting("python_path"))
 
 
 def register() -> None:

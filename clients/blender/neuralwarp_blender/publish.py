@@ -63,8 +63,12 @@ def write_scene(folder: RunFolder, scene: Path) -> None:
     if words[:1] != ["import"] or "-o" not in words:
         raise Refused(f"{folder.run / 'run.json'} does not say how the character was imported")
     words[words.index("-o") + 1] = str(scene)
-    answer = subprocess.run([preferences.paths().quarn, *words, "--model-root", "../.."], cwd=folder.run,
-                            capture_output=True, text=True, errors="replace")
+    quarn = preferences.paths().quarn
+    try:
+        answer = subprocess.run([quarn, *words, "--model-root", "../.."], cwd=folder.run, capture_output=True,
+                                text=True, errors="replace")
+    except OSError as error:
+        raise Refused(f"{quarn or 'quarn'} cannot be started: {error.strerror}") from None
     if answer.returncode != 0:
         raise Refused("quarn import: " + " / ".join(answer.stderr.strip().splitlines()[-3:]))
 

@@ -89,7 +89,8 @@ def test_all_is_put_back() -> None:
     hand = armature.pose.bones["hand"]
     hand.constraints.remove(hand.constraints[0])
     hand.rotation_mode = "AXIS_ANGLE"
-    hand.rotation_axis_angle = (0.5, 0.6, 0.0, 0.8)  # by hand, without a key
+    hand.rotation_axis_angle = (0.5, 0.6, 0.0, 0.8)
+    armature.pose.bones["forearm"].rotation_euler = (0.3, 0.0, 0.0)  # by hand, where the action has another
     bpy.context.view_layer.update()
     before = state(thing, armature)
     settings = sampling.Settings(samples=4, held_out=3, motion="motion")
