@@ -267,19 +267,14 @@ def driven_keys(thing: Any) -> Iterator[str]:
     for curve in keys.animation_data.drivers:
         for key in keys.key_blocks:
             if curve.data_path == f'{key.path_from_id()}.value' and not key.mute and not curve.mute:
-                if not runs(curve.driver):
+                if not curve.driver.is_valid:
                     raise Refused(f"{thing.name}: Blender does not run the driver of the shape key {key.name}"
                                   f"{why_not(curve.driver)}")
                 yield key.name
 
 
-def runs(driver: Any) -> bool:
-    """A Python expression is not run while a file may not run scripts."""
-    blocked = bpy.app.autoexec_fail and driver.type == "SCRIPTED" and not driver.is_simple_expression
-    return bool(driver.is_valid) and not blocked
-
-
 def why_not(driver: Any) -> str:
+    """Of a driver that Blender has given up: a file that may not run scripts still runs simple expressions."""
     if bpy.app.autoexec_fail and driver.type == "SCRIPTED" and not driver.is_simple_expression:
         return f": {driver.expression} is Python, and the file may not run scripts (Auto Run Python Scripts)"
     return f": {driver.expression} is not valid"
@@ -289,4 +284,4 @@ def drivers_not_run(thing: Any, armature: Any) -> List[str]:
     """A sentence for each other driver of mesh and armature that is not run."""
     return [f"{owner.name}: Blender does not run the driver of {curve.data_path}{why_not(curve.driver)}"
             for owner in (thing, armature, armature.data) if owner.animation_data
-            for curve in owner.animation_data.drivers if not curve.mute and not runs(curve.driver)]
+            for curve in owner.animation_data.drivers if not curve.mute and not curve.driver.is_valid]
