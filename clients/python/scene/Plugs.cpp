@@ -13,7 +13,7 @@ namespace {
 
 namespace py = pybind11;
 
-// nothing that depends on it has to be computed anew; a plug that cannot be set is not dirty-free of that
+// then nothing that depends on it has to be computed anew
 bool hasAlready(const HPlug& plug, double value) {
     HStatus status;
     const double present = plug.asDouble(&status);
@@ -49,8 +49,8 @@ py::array_t<double> Plugs::get() const {
 
 void Plugs::set(const py::array_t<double, py::array::c_style | py::array::forcecast>& values) {
     if (values.ndim() != 1 || static_cast<std::size_t>(values.size()) != places_.size())
-        throw std::invalid_argument("values has to have shape (" + std::to_string(places_.size()) + ",), not " +
-                                    std::string(py::str(values.attr("shape"))));
+        throw std::invalid_argument("values: expected [" + std::to_string(places_.size()) +
+                                    "] numbers, got an array of " + std::string(py::str(values.attr("shape"))));
     const double* from = values.data();
     for (std::size_t i = 0; i < places_.size(); ++i)
         if (!std::isfinite(from[i]))
@@ -61,7 +61,7 @@ void Plugs::set(const py::array_t<double, py::array::c_style | py::array::forcec
         const Place& place = places_[i];
         if (!place.isReal)
             setValue(*scene_, place.plug, py::float_(from[i]));
-        else if (!hasAlready(place.plug, from[i]) || place.plug.isDestination())
+        else if (!hasAlready(place.plug, from[i]))
             setReal(place.plug, from[i]);
     }
 }

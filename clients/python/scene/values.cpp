@@ -202,15 +202,12 @@ void setParts(OpenScene& scene, const HPlug& plug, const py::handle& value) {
         setValue(scene, isArray ? plug.elementByLogicalIndex(i) : plug.child(i), py::object(parts[i]));
 }
 
-std::string shapeText(const std::vector<py::ssize_t>& shape) {
-    py::tuple sizes(shape.size());
-    for (std::size_t i = 0; i < shape.size(); ++i)
-        sizes[i] = shape[i];
-    return py::str(sizes);
-}
-
-std::string describe(const py::array& array) {
-    return std::string(py::str(array.attr("dtype"))) + " " + std::string(py::str(array.attr("shape")));
+template <class Sizes>
+std::string shapeText(const Sizes& sizes, std::size_t count) {
+    std::string text;
+    for (std::size_t i = 0; i < count; ++i)
+        text += (i > 0 ? ", " : "") + std::to_string(sizes[i]);
+    return "[" + text + "]";
 }
 
 } // namespace
@@ -270,8 +267,12 @@ FloatArray writable(const py::array& array, const std::vector<py::ssize_t>& shap
                       std::equal(shape.begin(), shape.end(), array.shape()) && array.writeable();
     if (fits)
         return py::reinterpret_borrow<FloatArray>(array);
-    throw std::invalid_argument(std::string(name) + " has to be float32 " + shapeText(shape) +
-                                ", C-contiguous and writable, not " + describe(array));
+    const auto dimensions = static_cast<std::size_t>(array.ndim());
+    const bool isInOrder = (array.flags() & py::array::c_style) != 0;
+    throw std::invalid_argument(std::string(name) + ": expected float32 " + shapeText(shape, shape.size()) +
+                                ", C-contiguous and writable, got " + std::string(py::str(array.dtype())) + " " +
+                                shapeText(array.shape(), dimensions) + (isInOrder ? "" : ", not C-contiguous") +
+                                (array.writeable() ? "" : ", read-only"));
 }
 
 FloatArray pointsOf(Visit& visit, const HPlug& plug, const std::optional<py::array>& out) {

@@ -42,6 +42,7 @@ Session::Session() {
 }
 
 Session::~Session() {
+    setMainThread();
     emptyAll(impl_->graph);
     setCurrentSceneFile({});
     PluginTable::instance().unloadAll();

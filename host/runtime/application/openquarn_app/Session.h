@@ -21,6 +21,7 @@ public:
     /// Throws std::runtime_error while there is another.
     Session();
     /// Empties the scene, and all others that there still are, then unloads the plug-ins that are still loaded.
+    /// Thread: any, while no other is in the host.
     ~Session();
     Session(const Session&) = delete;
     Session& operator=(const Session&) = delete;
