@@ -1,5 +1,5 @@
-"""packed_module.py PLACE WAVE, by a Python or, behind "--", by Blender, which has it from the add-on: the module
-neuralwarp is that of PLACE, with its libraries, and computes what the host computes on the example of the wave."""
+"""packed_module.py [ZIP] PLACE WAVE: the module neuralwarp is that of PLACE, with its libraries, and computes what the
+host computes on the example of the wave. In Blender the add-on ZIP is installed first, and brings the module."""
 
 import ast
 import importlib
@@ -18,12 +18,14 @@ def stem(file: Path) -> str:
     return file.name.partition(".so")[0]
 
 
-def enabled_add_on() -> None:
+def install_add_on(path: str) -> None:
     import addon_utils
+    import bpy
 
     def refuse(error: Exception) -> None:
         raise error
 
+    bpy.ops.preferences.addon_install(filepath=path)
     add_on = addon_utils.enable("neuralwarp_blender", handle_error=refuse)
     version = ast.literal_eval((Path(__file__).parents[2] / "VERSION").read_text().strip().replace(".", ","))
     assert add_on.bl_info["version"] == version, add_on.bl_info
@@ -33,7 +35,7 @@ def enabled_add_on() -> None:
 place, wave = (Path(name).resolve() for name in sys.argv[-2:])
 before = mapped()
 if "--" in sys.argv:
-    enabled_add_on()
+    install_add_on(sys.argv[-3])
 import neuralwarp  # noqa: E402
 
 assert place in Path(neuralwarp.__file__).resolve().parents, neuralwarp.__file__

@@ -1,6 +1,6 @@
 #!/usr/bin/env bash
 # wheel.sh BUILD: packs the Python module and the add-on of Blender from what is installed, looks at what they carry, and
-# tries both as a user has them: the wheel in an environment of its own, the zip among a user's add-ons.
+# tries both as a user has them: the wheel in an environment of its own, the zip installed by Blender.
 set -euo pipefail
 build=$1
 cd "$(dirname "$0")/../.."
@@ -56,11 +56,10 @@ judge() {
   ! grep -rlF -e "$source" -e "$build" -e "$work" "$1" || fail "these files name the source, the build or the work"
 }
 "$python" -m zipfile -e "$wheel" "$work/wheel"
-"$python" -m zipfile -e "$add_on" "$work/scripts/addons"
-blender_module=$work/scripts/addons/neuralwarp_blender/lib/neuralwarp
+"$python" -m zipfile -e "$add_on" "$work/zip"
 judge "$work/wheel/neuralwarp"
-diff -r "$work/wheel/neuralwarp" "$blender_module" || fail "the wheel and the add-on carry different modules"
-grep -qx "version = \"$version\"" "$work/scripts/addons/neuralwarp_blender/blender_manifest.toml" ||
+diff -r "$work/wheel/neuralwarp" "$work/zip/neuralwarp_blender/lib/neuralwarp" || fail "the wheel and the add-on carry different modules"
+grep -qx "version = \"$version\"" "$work/zip/neuralwarp_blender/blender_manifest.toml" ||
   fail "blender_manifest.toml is not of version $version"
 
 # --- the wheel, without a network, and used from another folder ---
@@ -86,4 +85,4 @@ elsewhere env PYTHONPATH="$work/moved/lib/python3" "$python" -m neuralwarp_train
 # --- the add-on ---
 . tests/clients/blender/needs_blender.sh
 elsewhere blender -b --factory-startup --python-exit-code 1 --python "$source/tests/house/packed_module.py" -- \
-  "$blender_module" "$work/wave"
+  "$add_on" "$work/scripts" "$work/wave"
