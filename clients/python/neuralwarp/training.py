@@ -25,6 +25,7 @@ START = (f"import runpy, sys; sys.path[:] = [p for p in sys.path if p] + [sys.ar
          f"runpy.run_module('{PACKAGE}', run_name='__main__', alter_sys=True)")
 EPOCH = re.compile(r"epoch (\d+) of (\d+): ")
 KEPT_LINES = 20
+PATIENCE = 10  # seconds
 
 
 def train(dataset: StrPath, output: StrPath, *, interpreter: Optional[StrPath] = None, epochs: Optional[int] = None,
@@ -51,8 +52,7 @@ def train(dataset: StrPath, output: StrPath, *, interpreter: Optional[StrPath] =
         try:
             answer, said = _follow(child, progress)
         except BaseException:
-            if child.poll() is None:
-                os.killpg(child.pid, SIGKILL)  # with the quarn that it may have started
+            _end(child)
             raise
     return _outcome(child.returncode, answer, said)
 
@@ -114,6 +114,18 @@ def _follow(child: "subprocess.Popen[str]", progress: Optional[Progress]) -> tup
     if interrupted:
         raise interrupted
     return answer[0], list(said)
+
+
+def _end(child: "subprocess.Popen[str]") -> None:
+    """At once: without a model, and without the parts of one."""
+    try:
+        child.terminate()
+        child.wait(PATIENCE)
+    except subprocess.TimeoutExpired:
+        pass
+    finally:
+        if child.poll() is None:
+            os.killpg(child.pid, SIGKILL)  # with the quarn that it may have started
 
 
 class _Clock:
