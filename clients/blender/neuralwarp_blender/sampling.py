@@ -23,7 +23,7 @@ import numpy as np
 from mathutils import Euler, Matrix
 from numpy.typing import NDArray
 
-from . import preferences
+from . import jobs, preferences
 from .character import Character, read_character, to_mesh, write_character
 from .limits import actions_of, find_limits
 from .posing import Angles, Posing, playing, rotation
@@ -91,6 +91,8 @@ def sample(thing: Any, settings: Settings, say: Callable[[str], None]) -> Iterat
 def check_settings(rig: Rig) -> None:
     if not preferences.paths().quarn:
         raise Refused("the program quarn was not found: say where it is in the add-on's preferences")
+    if jobs.status(rig.folder).state == "runs":
+        raise Refused(f"the training of {rig.thing.name} runs: cancel it before sampling again")
     if rig.settings.motion:
         action = bpy.data.actions.get(rig.settings.motion)
         if action is None or action not in actions_of(rig.armature):
@@ -105,7 +107,8 @@ def check_settings(rig: Rig) -> None:
 
 def begin_folder(folder: RunFolder) -> None:
     folder.path.mkdir(parents=True, exist_ok=True)
-    for old in (folder.rig, folder.recipe, folder.motion):  # what is half sampled is not trained
+    # what is half sampled is not trained, and what was trained of other samples is not published
+    for old in (folder.rig, folder.recipe, folder.motion, folder.job, folder.ended):
         old.unlink(missing_ok=True)
 
 

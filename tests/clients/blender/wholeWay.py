@@ -55,6 +55,7 @@ def sample(folder: Path) -> None:
     fails(bpy.ops.neuralwarp.publish, "it was not trained")
     bpy.ops.neuralwarp.train()
     fails(bpy.ops.neuralwarp.train, "runs already")
+    fails(bpy.ops.neuralwarp.sample, "the training of arm runs: cancel it")
     bpy.ops.wm.save_mainfile()
     say(f"sampled; {jobs.status(run_folder.folder_of(thing)).said}")
 

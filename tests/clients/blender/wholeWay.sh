@@ -8,7 +8,11 @@ here=$(dirname "$0")
 work=$(mktemp -d)
 trap 'rm -rf "$work"' EXIT
 source "$here/needs_blender.sh"
-scripts/find_python.sh >/dev/null 2>&1 || { echo "skipped: no Python with what the trainer needs"; exit 77; }
+scripts/find_python.sh >/dev/null 2>&1 || {
+  [[ ${NW_ALL_CLIENTS:-} ]] && echo "failed: no Python with what the trainer needs" && exit 1
+  echo "skipped: no Python with what the trainer needs"
+  exit 77
+}
 
 # session PART: what PART of wholeWay.py does, in a Blender of its own
 session() {
