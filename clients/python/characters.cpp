@@ -34,7 +34,7 @@ void checkLength(const char* argument, const py::sequence& values, std::size_t c
 py::sequence listOf(const char* argument, const py::object& values, std::size_t count) {
     if (!py::isinstance<py::sequence>(values))
         throw py::value_error(std::string(argument) + ": expected a list, got a " + typeNameOf(values));
-    const auto list = py::reinterpret_borrow<py::sequence>(values);
+    auto list = py::reinterpret_borrow<py::sequence>(values);
     checkLength(argument, list, count);
     return list;
 }

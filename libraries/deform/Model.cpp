@@ -27,7 +27,7 @@ std::shared_ptr<const Model> Model::load(const fs::path& directory) {
     for (int i = 0; i < attempts; ++i) {
         const DirectoryState state = DirectoryState::atRest(folder);
         try {
-            const std::shared_ptr<const Model> model(new Model(folder, state));
+            std::shared_ptr<const Model> model(new Model(folder, state));
             if (state.isStillThatOf(folder))
                 return model;
         } catch (const std::bad_alloc&) {

@@ -11,6 +11,7 @@ import threading
 import time
 import tracemalloc
 import unittest
+from concurrent.futures import ThreadPoolExecutor
 from pathlib import Path
 from typing import Any, Callable, Optional, Union
 
@@ -120,6 +121,9 @@ class DeformerTest(Core):
         found = neuralwarp.evaluate_characters(deformers, points, controls, list(out), 0.5, [weights] * 5)
         np.testing.assert_array_equal(found, expected)
         np.testing.assert_array_equal(out, expected)
+        with ThreadPoolExecutor(5) as threads:
+            beside = list(threads.map(lambda i: deformers[i].evaluate(points[i], controls[i], **half), range(5)))
+        np.testing.assert_array_equal(beside, expected)
         plain = deformers[0].evaluate(POINTS, CONTROLS)
         np.testing.assert_array_equal(deformers[0].evaluate(POINTS, CONTROLS, envelope=0.0), POINTS)
         np.testing.assert_allclose(deformers[0].evaluate(POINTS, CONTROLS, **half),
