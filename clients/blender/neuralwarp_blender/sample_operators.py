@@ -40,7 +40,7 @@ class Sample(ForMesh):
         thing = context.object
         # set before, as sampling may not change the file once it has begun
         thing.neuralwarp_sampling.is_sampled = True
-        return sample(thing, settings_of(thing), lambda text: self.report({"WARNING"}, text))
+        return sample(thing, settings_of(thing), lambda kind, text: self.report({kind}, text))
 
     def execute(self, context: Any) -> Set[str]:
         try:

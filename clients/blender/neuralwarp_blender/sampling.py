@@ -31,6 +31,7 @@ from .run_folder import RunFolder, folder_of, write_json
 from .stack import Refused, Stack, Switches, evaluated_points, read_stack, topology
 
 Progress = Tuple[str, int, int]  # what is done, how much of it, of how much
+Say = Callable[[str, str], None]  # "INFO" or "WARNING", and a sentence
 Array = NDArray[np.float32]
 
 STILL = 1e-6  # a joint's value that moves by less than this (radians, or parts of 1) has no keys
@@ -54,17 +55,17 @@ class Rig:
     stack: Stack
     settings: Settings
     folder: RunFolder
-    say: Callable[[str], None]
+    say: Say
 
 
-def sample(thing: Any, settings: Settings, say: Callable[[str], None]) -> Iterator[Progress]:
-    """Samples a mesh object into its folder (run_folder.folder_of). say: gets notes, sentences for the user. Raises
+def sample(thing: Any, settings: Settings, say: Say) -> Iterator[Progress]:
+    """Samples a mesh object into its folder (run_folder.folder_of). say: gets sentences for the user. Raises
     Refused, before anything was changed or after it was put back."""
     if getattr(thing, "neuralwarp", None) is not None and thing.neuralwarp.in_use:
         raise Refused(f"{thing.name} uses a model: stop that first")
     stack = read_stack(thing)
     for note in stack.notes:
-        say(note)
+        say("WARNING", note)
     rig = Rig(thing, bpy.data.objects[stack.armature], stack, settings, folder_of(thing), say)
     check_settings(rig)
     yield "looking at the rig", 0, 1
@@ -72,7 +73,7 @@ def sample(thing: Any, settings: Settings, say: Callable[[str], None]) -> Iterat
     with Switches(thing) as switches:
         character = character_at_rest(rig, switches)
         limits, source = find_limits(rig.armature, character)
-        rig.say(f"{thing.name}: {source}")
+        rig.say("INFO", f"{thing.name}: {source}")
         write_character(character, rig.folder.character)
         rig.folder.limits.write_text(json.dumps(limits, indent=1) + "\n", encoding="utf-8")
         if settings.motion:
@@ -101,8 +102,8 @@ def check_settings(rig: Rig) -> None:
             raise Refused(f"{rig.thing.name}: {rig.stack.held[0]} is learned at rest, pose by pose; a motion of it "
                           "would be another shape. Hold out drawn poses instead")
     for name in rig.stack.held:
-        rig.say(f"{rig.thing.name}: {name} is learned as it comes to rest: each pose is held for {rig.settings.hold} "
-                "frames")
+        rig.say("INFO", f"{rig.thing.name}: {name} is learned as it comes to rest: each pose is held for "
+                f"{rig.settings.hold} frames")
 
 
 def begin_folder(folder: RunFolder) -> None:
@@ -323,7 +324,7 @@ class JointTrack:
         return found
 
 
-def sample_all(thing: Any, settings: Settings, say: Callable[[str], None] = print) -> None:
+def sample_all(thing: Any, settings: Settings, say: Say = print) -> None:
     """In one go, for scripts."""
     shown = time.monotonic()
     for doing, done, total in sample(thing, settings, say):

@@ -69,12 +69,11 @@ class Switches:
 
     def __init__(self, thing: Any) -> None:
         self.thing = thing
-        self.modifiers: Dict[str, Tuple[bool, bool]] = {}
+        self.modifiers: Dict[str, bool] = {}
         self.keys: Dict[str, bool] = {}
 
     def __enter__(self) -> "Switches":
-        self.modifiers = {modifier.name: (modifier.show_viewport, modifier.show_in_editmode)
-                          for modifier in self.thing.modifiers}
+        self.modifiers = {modifier.name: modifier.show_viewport for modifier in self.thing.modifiers}
         self.keys = {key.name: key.mute for key in key_blocks(self.thing)}
         return self
 
@@ -83,7 +82,7 @@ class Switches:
 
     def shown(self) -> List[str]:
         """The modifiers that were on."""
-        return [name for name, (is_on, _) in self.modifiers.items() if is_on]
+        return [name for name, is_on in self.modifiers.items() if is_on]
 
     def switch(self, modifiers: Sequence[str], muted_keys: Sequence[str]) -> None:
         """These modifiers are on, and no others; these keys are mute beside those that were."""

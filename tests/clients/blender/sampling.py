@@ -53,7 +53,7 @@ def test_the_skin_is_quarns_and_targets_are_the_stacks() -> None:
         thing, _, action = random_rig.make_rig(seed)
         bpy.ops.wm.save_as_mainfile(filepath=str(FOLDER / f"random{seed}.blend"))
         os.rename(FOLDER / f"random{seed}.blend", FOLDER / "random.blend")
-        sampling.sample_all(thing, sampling.Settings(samples=12, motion=action.name, seed=seed), lambda text: None)
+        sampling.sample_all(thing, sampling.Settings(samples=12, motion=action.name, seed=seed), lambda *_: None)
         folder, name = run_folder.folder_of(thing), "_1_mesh___skin.outputGeom[0]"
         quarn("bake", folder.run / "poses.json", name, "--frames", "1-12", "--order", "file", "-o", FOLDER / "p.npy")
         quarn("pose", folder.run / "character.json", "--keys", folder.motion, "-o", folder.path / "m.json")
@@ -94,10 +94,10 @@ def test_all_is_put_back() -> None:
     bpy.context.view_layer.update()
     before = state(thing, armature)
     settings = sampling.Settings(samples=4, held_out=3, motion="motion")
-    sampling.sample_all(thing, settings, lambda text: None)
+    sampling.sample_all(thing, settings, lambda *_: None)
     assert state(thing, armature) == before, "after all of it"
     for stop in (("sampling motion", 40), ("sampling poses", 3)):
-        work = sampling.sample(thing, settings, lambda text: None)
+        work = sampling.sample(thing, settings, lambda *_: None)
         assert any((doing, done) == stop for doing, done, _ in work), f"there is no {stop}"
         work.close()  # type: ignore[attr-defined]
         assert state(thing, armature) == before, f"closed while {stop}"
@@ -109,7 +109,7 @@ def test_all_is_put_back() -> None:
     mask.driver_add("threshold").driver.expression = "frame > 30"
     bpy.context.view_layer.update()
     before = state(thing, armature)
-    said = refused(lambda: sampling.sample_all(thing, settings, lambda text: None))
+    said = refused(lambda: sampling.sample_all(thing, settings, lambda *_: None))
     assert re.fullmatch(r"arm: in frame 31 the modifiers make 0 vertices, and there are 3682: .*", said), said
     assert state(thing, armature) == before, "refused in the middle"
 
@@ -187,7 +187,7 @@ def test_a_linked_rig_is_refused_and_its_override_sampled() -> None:
     assert said == "arm is linked from //library.blend: make a library override of object and mesh first", said
     wanted.collections[0].override_hierarchy_create(bpy.context.scene, bpy.context.view_layer)
     thing = next(one for one in bpy.data.objects if one.type == "MESH" and one.override_library)
-    sampling.sample_all(thing, sampling.Settings(samples=4, held_out=3), lambda text: None)
+    sampling.sample_all(thing, sampling.Settings(samples=4, held_out=3), lambda *_: None)
     folder = run_folder.folder_of(thing)
     assert folder.is_sampled and difference(folder.skin, folder.targets) > 0.01
 
