@@ -4,6 +4,8 @@
 #include "openquarn_app/Plugins.h"
 #include "rig/registration.h"
 
+#include <pybind11/pybind11.h>
+
 #include <cstdlib>
 #include <filesystem>
 #include <memory>
@@ -42,9 +44,14 @@ fs::path deformerPlugin() {
 
 } // namespace
 
-std::recursive_mutex& Host::mutex() {
+std::unique_lock<std::recursive_mutex> Host::lock() {
     static auto& theMutex = *new std::recursive_mutex; // other threads may come while the process ends
-    return theMutex;
+    std::unique_lock lock(theMutex, std::try_to_lock);
+    if (!lock.owns_lock()) {
+        const pybind11::gil_scoped_release released;
+        lock.lock();
+    }
+    return lock;
 }
 
 Host& Host::instance() {

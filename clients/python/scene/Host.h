@@ -13,12 +13,12 @@
 
 namespace python {
 
-/// Started with the first scene, ended when the interpreter ends. Thread: one that holds Host::mutex().
+/// Started with the first scene, ended when the interpreter ends. Thread: one that has the lock.
 class Host {
 public:
-    /// Taken by whoever works in the host; a thread that has it may take it again. A thread that waits for it does not
-    /// hold the interpreter's lock, so that the one inside can get that.
-    static std::recursive_mutex& mutex();
+    /// For whoever works in the host; a thread that has it may take it again. Meanwhile the calling thread, which has
+    /// the interpreter's lock, gives that up, so that the one inside can get it. Thread: any.
+    static std::unique_lock<std::recursive_mutex> lock();
     /// Starts the host when there is none. Throws std::runtime_error, naming the places, when the deformer is not found
     /// or cannot be loaded, and after end().
     static Host& instance();

@@ -14,15 +14,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-std::unique_lock<std::recursive_mutex> lockOfHost() {
-    std::unique_lock lock(Host::mutex(), std::try_to_lock);
-    if (!lock.owns_lock()) {
-        const pybind11::gil_scoped_release released;
-        lock.lock();
-    }
-    return lock;
-}
-
 bool isModelRoot(const HPlug& plug) {
     return std::string(plug.partialName().asChar()) == "modelRoot" && quarn::nodeType(plug.node()) == "neuralWarp";
 }
@@ -31,7 +22,7 @@ bool isModelRoot(const HPlug& plug) {
 
 OpenScene::OpenScene(const fs::path& path)
     : path_(path.lexically_normal()) {
-    const auto lock = lockOfHost();
+    const auto lock = Host::lock();
     Host::instance();
     scene_ = std::make_unique<OpenQuarn::Scene>();
     try {
@@ -50,7 +41,7 @@ OpenScene::~OpenScene() {
 void OpenScene::close() {
     if (isClosed())
         return;
-    const auto lock = lockOfHost();
+    const auto lock = Host::lock();
     if (isClosed()) // by another thread, while this one waited
         return;
     deformers_.clear();
@@ -95,6 +86,7 @@ std::string OpenScene::textFor(const HPlug& plug, const std::string& text) const
 }
 
 std::vector<std::string> OpenScene::takeMessages() {
+    const auto lock = Host::lock(); // an evaluation on another thread may add some
     return std::exchange(messages_, {});
 }
 
@@ -123,7 +115,7 @@ const std::vector<float>& OpenScene::controls(const std::string& deformer) {
 }
 
 Visit::Visit(OpenScene& scene)
-    : lock_(lockOfHost())
+    : lock_(Host::lock())
     , scene_(scene)
     , host_(Host::instance())
     , current_(scene.isClosed() ? throw std::runtime_error("the scene " + scene.path().string() + " is closed")

@@ -39,11 +39,10 @@ py::array_t<double> Plugs::get() const {
     py::array_t<double> values(static_cast<py::ssize_t>(places_.size()));
     double* to = values.mutable_data();
     Visit visit(*scene_);
-    if (!places_.empty())
-        visit.evaluating(places_.front().plug, [&] {
-            for (const Place& place : places_)
-                *to++ = quarn::numberOf(place.plug);
-        });
+    for (const Place& place : places_) {
+        visit.evaluate(place.plug);
+        *to++ = quarn::numberOf(place.plug);
+    }
     return values;
 }
 

@@ -21,9 +21,9 @@ public:
     const std::vector<std::string>& names() const { return names_; }
     /// float64 [names]: evaluated. Throws std::runtime_error, naming the plug, when one cannot be.
     pybind11::array_t<double> get() const;
-    /// Sets those that have another value now, and leaves the others alone. `values` [names]. Throws std::invalid_argument, and sets nothing, for
-    /// another number of values and for one that is not finite; naming the plug, for a plug that cannot be set, when
-    /// those before it are set.
+    /// Sets those that have another value now, and leaves the others alone. `values` [names]. Throws
+    /// std::invalid_argument, and sets nothing, for another number of values and for one that is not finite; naming the
+    /// plug, for a plug that cannot be set, when those before it are set.
     void set(const pybind11::array_t<double, pybind11::array::c_style | pybind11::array::forcecast>& values);
 
 private:

@@ -193,13 +193,27 @@ std::vector<double> framesOf(const py::iterable& frames) {
     return list;
 }
 
+// goes back to the time that the current scene has now
+class TimeOfBefore {
+public:
+    TimeOfBefore() = default;
+    ~TimeOfBefore() { sessionOf().setTime(time_); }
+    TimeOfBefore(const TimeOfBefore&) = delete;
+    TimeOfBefore& operator=(const TimeOfBefore&) = delete;
+
+private:
+    double time_ = sessionOf().time();
+};
+
 FloatArray play(OpenScene& scene, const std::string& name, const py::iterable& frameList,
                 const std::optional<py::array>& out) {
     const std::vector<double> frames = framesOf(frameList);
     Visit visit(scene);
     const HPlug plug = plugNamed(name);
-    const double before = sessionOf().time();
+    const TimeOfBefore after;
     const auto count = static_cast<py::ssize_t>(frames.size());
+    if (count > 0)
+        sessionOf().setTime(frames.front());
     const py::ssize_t vertices = pointsOf(visit, plug, std::nullopt).shape(0);
     FloatArray all = out ? writable(*out, {count, vertices, 3}, "out") : FloatArray({count, vertices, py::ssize_t{3}});
     for (py::ssize_t i = 0; i < count; ++i) {
@@ -209,7 +223,6 @@ FloatArray play(OpenScene& scene, const std::string& name, const py::iterable& f
         const FloatArray frame = all[py::int_(i)].cast<FloatArray>();
         pointsOf(visit, plug, frame);
     }
-    sessionOf().setTime(before);
     return all;
 }
 
@@ -220,7 +233,7 @@ std::string shown(const OpenScene& scene) {
 void closeAll() {
     while (!OpenScene::allOpen().empty())
         OpenScene::allOpen().back()->close();
-    const std::scoped_lock lock(Host::mutex());
+    const auto lock = Host::lock();
     Host::end();
 }
 

@@ -152,6 +152,9 @@ class Points(SceneTest):
                 np.testing.assert_array_equal(points, moving.points(OUTPUT))
             self.assertGreater(np.abs(frames[0] - frames[1]).max(), 0.1)
             self.assertIs(moving.play(OUTPUT, [1, 2, 3], out=frames), frames)
+            moving.set("wave.modelRoot", "elsewhere")
+            self.refused(lambda: moving.play(OUTPUT, [7]), RuntimeError, "elsewhere")
+            self.assertEqual(moving.time, 1.5)
 
 
 class SideBySide(SceneTest):
