@@ -34,7 +34,7 @@ fs::path besideThisModule() {
 fs::path deformerPlugin() {
     const char* given = std::getenv("NEURALWARP_PLUGIN");
     const bool isGiven = given != nullptr && *given != '\0';
-    const fs::path path = isGiven ? fs::path(given) : besideThisModule();
+    fs::path path = isGiven ? fs::path(given) : besideThisModule();
     std::error_code error;
     if (!fs::exists(path, error))
         throw std::runtime_error("the plug-in neuralWarp.so was not found; looked at: " + path.string() +

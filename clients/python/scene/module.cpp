@@ -220,7 +220,7 @@ FloatArray play(OpenScene& scene, const std::string& name, const py::iterable& f
         if (PyErr_CheckSignals() != 0)
             throw py::error_already_set();
         sessionOf().setTime(frames[static_cast<std::size_t>(i)]);
-        const FloatArray frame = all[py::int_(i)].cast<FloatArray>();
+        const auto frame = all[py::int_(i)].cast<FloatArray>();
         pointsOf(visit, plug, frame);
     }
     return all;
