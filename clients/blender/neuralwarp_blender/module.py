@@ -2,7 +2,6 @@
 """The module `neuralwarp`: Python's own where it is installed, else the one that the add-on brings along in lib/."""
 
 import importlib
-import os
 import platform
 import sys
 import sysconfig
@@ -10,8 +9,6 @@ from pathlib import Path
 from types import ModuleType
 from typing import Optional
 
-# the threads that a network asks for in its file count: without it a thread of the runtime's keeps a core busy
-OPTIONS_OF_MODELS = "ORT_LOAD_CONFIG_FROM_MODEL"
 LIBRARY = Path(__file__).resolve().parent / "lib"
 
 _module: Optional[ModuleType] = None
@@ -61,7 +58,6 @@ def explanation(error: Exception) -> str:
 
 
 def _load() -> ModuleType:
-    os.environ.setdefault(OPTIONS_OF_MODELS, "1")
     try:
         return importlib.import_module("neuralwarp")
     except ModuleNotFoundError as error:

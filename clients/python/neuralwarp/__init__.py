@@ -1,11 +1,15 @@
 # SPDX-License-Identifier: Apache-2.0
 """Neural mesh deformation with NumPy in and out: the arithmetic is that of the plug-in, to the bit."""
 
+import os
 from typing import TYPE_CHECKING, Any
 
-from ._core import Deformer, Model, evaluate_characters, smooth, vertex_frames
-from ._core import version as __version__
-from .training import train
+# a network runs on as many threads as its trainer found right; it counts at the load of each model (docs/installed.md)
+os.environ.setdefault("ORT_LOAD_CONFIG_FROM_MODEL", "1")
+
+from ._core import Deformer, Model, evaluate_characters, smooth, vertex_frames  # noqa: E402
+from ._core import version as __version__  # noqa: E402
+from .training import train  # noqa: E402
 
 if TYPE_CHECKING:
     from ._scene import Plugs, Scene
