@@ -242,7 +242,7 @@ HStatus neuralWarpNode::loadWholeModel(HDataBlock& block, neuralWarpData& data) 
             break;
         if (!updateModelSettings(block, data))
             return HStatus::kSuccess;
-        if (const HStatus status = prepareRestState(data, block, data.multiIndex); status.error())
+        if (HStatus status = prepareRestState(data, block, data.multiIndex); status.error())
             return status;
     }
     raiseMessage<Text::kErrorMLModelInit>(displayErrorGated, data.multiIndex);
