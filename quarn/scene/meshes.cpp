@@ -82,7 +82,7 @@ HStatus setUvs(HFnMesh mesh, const MeshPolygons& polygons, HObject& data) {
     HIntArray corners(static_cast<unsigned>(polygons.uvCorners.size()));
     for (unsigned corner = 0; corner < corners.length(); ++corner)
         corners[corner] = static_cast<int>(polygons.uvCorners[corner]);
-    const HStatus status = mesh.setUVs(us, vs, corners);
+    HStatus status = mesh.setUVs(us, vs, corners);
     data = mesh.object();
     return status;
 }
