@@ -12,7 +12,7 @@ import numpy as np
 from numpy.typing import NDArray
 
 from . import live, muting
-from .model_folder import NotUsable
+from .refused import Refused
 
 Points = NDArray[np.float32]
 
@@ -25,9 +25,9 @@ GENERATORS = {"ARRAY", "BEVEL", "BOOLEAN", "DECIMATE", "EDGE_SPLIT", "MASK", "MI
 
 def played(thing: Any, first: int, last: int) -> Iterator[Tuple[int, Points]]:
     """Frames and points, [N, 3] in object space, as Blender shows them. The scene's frame is as it was afterwards.
-    NotUsable where the object was not deformed in a frame."""
+    Refused where the object was not deformed in a frame."""
     if last < first:
-        raise NotUsable(f"frames {first} to {last} are none")
+        raise Refused(f"frames {first} to {last} are none")
     scene = bpy.context.scene
     before, subframe = scene.frame_current, scene.frame_subframe
     flat = np.empty(3 * len(thing.data.vertices), dtype=np.float32)
@@ -37,7 +37,7 @@ def played(thing: Any, first: int, last: int) -> Iterator[Tuple[int, Points]]:
             mesh = thing.evaluated_get(bpy.context.evaluated_depsgraph_get()).data
             problem = live.problem(thing)
             if problem:
-                raise NotUsable(f"frame {frame}: {problem}")
+                raise Refused(f"frame {frame}: {problem}")
             mesh.vertices.foreach_get("co", flat)
             yield frame, flat.reshape(-1, 3)
     finally:
@@ -68,10 +68,10 @@ def to_mesh_cache(thing: Any, path: Path, first: int, last: int) -> None:
 
 def show_cache(thing: Any, path: Path, first: int) -> None:
     """Has a Mesh Cache modifier play a PC2 file with the vertices of the object, whose first frame is `first`. Blender
-    says nothing where the numbers of vertices differ: NotUsable does."""
+    says nothing where the numbers of vertices differ: Refused does."""
     count = vertices_of_pc2(path)
     if count != len(thing.data.vertices):
-        raise NotUsable(f"{path.name} has {count} vertices, and {thing.name} has {len(thing.data.vertices)}")
+        raise Refused(f"{path.name} has {count} vertices, and {thing.name} has {len(thing.data.vertices)}")
     if thing.modifiers.get(MODIFIER):
         thing.modifiers.remove(thing.modifiers[MODIFIER])
     place = first_generator(thing)  # behind all that moves vertices; a Subdivision Surface stays on top
@@ -89,12 +89,12 @@ def vertices_of_pc2(path: Path) -> int:
             head = file.read(32)
             size = os.fstat(file.fileno()).st_size
     except OSError as error:
-        raise NotUsable(f"{path}: {error.strerror}") from None
+        raise Refused(f"{path}: {error.strerror}") from None
     if len(head) < 32 or head[:12] != PC2_MAGIC:
-        raise NotUsable(f"{path} is no PC2 file")
+        raise Refused(f"{path} is no PC2 file")
     _, _, count, _, _, frames = struct.unpack("<12siiffi", head)
     if count < 1 or frames < 1 or size != 32 + 12 * count * frames:
-        raise NotUsable(f"{path} is damaged: it says {frames} frames of {count} vertices, and has {size} bytes")
+        raise Refused(f"{path} is damaged: it says {frames} frames of {count} vertices, and has {size} bytes")
     return int(count)
 
 
@@ -138,6 +138,6 @@ def to_shape_keys(thing: Any, first: int, last: int) -> Any:
 
 def check(thing: Any) -> None:
     if thing is None or thing.type != "MESH" or not thing.neuralwarp.in_use:
-        raise NotUsable((thing.name if thing else "no object") + " is not in use: nothing can be baked")
+        raise Refused((thing.name if thing else "no object") + " is not in use: nothing can be baked")
     if thing.neuralwarp.show != "NEURAL":
-        raise NotUsable(f"{thing.name} shows {thing.neuralwarp.show.lower()}: switch it to Neural before baking")
+        raise Refused(f"{thing.name} shows {thing.neuralwarp.show.lower()}: switch it to Neural before baking")

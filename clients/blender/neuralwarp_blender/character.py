@@ -18,7 +18,8 @@ from typing import Any, Dict, List, Sequence, Tuple
 import numpy as np
 from numpy.typing import NDArray
 
-from .stack import Refused, Stack, Switches, evaluated_points
+from .refused import Refused
+from .stack import Stack, Switches, evaluated_points
 
 FLOAT, SHORT, INT = 5126, 5123, 5125  # component types
 DTYPES = {FLOAT: "<f4", SHORT: "<u2", INT: "<u4"}

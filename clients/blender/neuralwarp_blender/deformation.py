@@ -13,9 +13,10 @@ import numpy as np
 from numpy.typing import NDArray
 
 from . import module
-from .model_folder import NotUsable, Rig
+from .model_folder import Rig
 from .pose import JointSetter
-from .stack import topology
+from .refused import Refused
+from .stack import check_own_mesh, topology
 
 Points = NDArray[np.float32]
 
@@ -43,7 +44,7 @@ class Deformation:
     """Made for the mesh of an object as it is; another mesh needs another one."""
 
     def __init__(self, rig: Rig, thing: Any) -> None:
-        """NotUsable, module.Missing, and the module's own errors, which name a file and the reason."""
+        """Refused, module.Missing, and the module's own errors, which name a file and the reason."""
         neuralwarp = module.find()
         self.rig = rig
         check_mesh(rig, thing)
@@ -69,7 +70,7 @@ class Deformation:
 
     def deform(self, thing: Any, evaluated: Any, armature: Any, graph: Hashable) -> None:
         """Writes the result into the mesh of the evaluated object. graph: which dependency graph that is of.
-        NotUsable names what does not fit."""
+        Refused names what does not fit."""
         mesh = evaluated.data
         self._check_evaluated(thing, mesh)
         self.joints.set(evaluated, armature)
@@ -116,22 +117,22 @@ class Deformation:
         if joined is None and count == self.count:
             return
         if joined is None or len(joined) != self.count:
-            raise NotUsable(f"the scene of {self.rig.folder.name} has a mesh of {count} vertices"
-                            + (f", and a map of {len(joined)}" if joined is not None else "") + f", not {self.count}")
+            raise Refused(f"the scene of {self.rig.folder.name} has a mesh of {count} vertices"
+                          + (f", and a map of {len(joined)}" if joined is not None else "") + f", not {self.count}")
         self._joined = np.asarray(joined, dtype=np.intp)
         if count == self.count and np.array_equal(self._joined, np.arange(count)):
             return
         found, first = np.unique(self._joined, return_index=True)
         if len(found) != count or found[0] != 0 or found[-1] != count - 1:
-            raise NotUsable(f"the vertex map of {self.rig.folder.name} leaves out vertices of its scene")
+            raise Refused(f"the vertex map of {self.rig.folder.name} leaves out vertices of its scene")
         self._representatives = first.astype(np.intp)
 
     def _check_evaluated(self, thing: Any, mesh: Any) -> None:
         if len(mesh.vertices) != self.count:
-            raise NotUsable(f"the modifiers of {thing.name} make {len(mesh.vertices)} vertices of {self.count}: "
-                            "what changes their number has to be off")
+            raise Refused(f"the modifiers of {thing.name} make {len(mesh.vertices)} vertices of {self.count}: "
+                          "what changes their number has to be off")
         if mesh.vertices[0].as_pointer() == thing.data.vertices[0].as_pointer():
-            raise NotUsable(f"no modifier of {thing.name} is on: its Armature modifier is what a model builds on")
+            raise Refused(f"no modifier of {thing.name} is on: its Armature modifier is what a model builds on")
 
     def _vertex_weights(self, thing: Any) -> Optional[Points]:
         """[N] of the vertex group that was chosen; read once, until the mesh changes."""
@@ -142,7 +143,7 @@ class Deformation:
             if name:
                 group = thing.vertex_groups.get(name)
                 if group is None:
-                    raise NotUsable(f"{thing.name} has no vertex group {name}")
+                    raise Refused(f"{thing.name} has no vertex group {name}")
                 self._weights = group_weights(thing, group.index)
             self._group = name
         return self._weights
@@ -158,17 +159,15 @@ class Deformation:
 
 
 def check_mesh(rig: Rig, thing: Any) -> None:
-    """NotUsable where the object has not the mesh of the training."""
+    """Refused where the object has not the mesh of the training."""
+    check_own_mesh(thing)
     mesh = thing.data
-    if mesh.library is not None:  # Blender would not write into its evaluated copies, and say nothing
-        raise NotUsable(f"{mesh.name}, the mesh of {thing.name}, is linked from {mesh.library.filepath}: make a "
-                        "library override of the mesh as well")
     if len(mesh.vertices) != rig.vertices:
-        raise NotUsable(f"{rig.folder.name} is for a mesh of {rig.vertices} vertices, and {thing.name} has "
-                        f"{len(mesh.vertices)}")
+        raise Refused(f"{rig.folder.name} is for a mesh of {rig.vertices} vertices, and {thing.name} has "
+                      f"{len(mesh.vertices)}")
     if topology(mesh) != rig.topology:
-        raise NotUsable(f"{rig.folder.name} is for a mesh of other polygons than {thing.name} has: vertices or faces "
-                        "were made or put in another order after the training")
+        raise Refused(f"{rig.folder.name} is for a mesh of other polygons than {thing.name} has: vertices or faces "
+                      "were made or put in another order after the training")
 
 
 def rest_points(thing: Any) -> Points:

@@ -20,8 +20,8 @@ from pathlib import Path
 from typing import Any, Dict, List, Optional
 
 from . import preferences
+from .refused import Refused
 from .run_folder import RunFolder, read_json, write_json
-from .stack import Refused
 
 # waits for the program, also when both get a signal, and writes down how it ended
 KEEPER = 'trap : TERM INT HUP; "$@"; echo $? >"$0.part"; mv "$0.part" "$0"'

@@ -12,7 +12,7 @@ import bpy
 
 from .character import Character, Joint
 from .posing import is_follower, playing, turned
-from .stack import Refused
+from .refused import Refused
 
 Limits = Dict[str, Dict[str, List[float]]]  # joint, rotateX and so on, least and largest
 Range = Tuple[float, float]

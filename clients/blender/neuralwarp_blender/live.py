@@ -14,8 +14,8 @@ from bpy.app.handlers import persistent
 
 from . import model_folder, module, muting
 from .deformation import Deformation
-from .model_folder import NotUsable
-from .stack import topology
+from .refused import Refused
+from .stack import check_mesh_object, topology
 
 NOT_DEFORMED = ("EDIT", "SCULPT")  # modes that work on the original mesh
 
@@ -33,15 +33,15 @@ _problems: Dict[str, str] = {}  # by object
 # --- what operators, properties and the panel ask for ---
 
 def use(thing: Any, model: str) -> None:
-    """Puts a mesh object in use. NotUsable, module.Missing or an error of the module's: nothing has changed then."""
-    check_object(thing)
+    """Puts a mesh object in use. Refused, module.Missing or an error of the module's: nothing has changed then."""
+    check_mesh_object(thing)
     module.find()
     rig = model_folder.read_rig(model_folder.find(model))
     others = [other.name for other in bpy.data.objects
               if other.data == thing.data and other != thing and other.library is None]
     if rig.shape_keys and others:
-        raise NotUsable(f"{thing.data.name} is the mesh of {others[0]}, too, whose shape keys would be off as well: "
-                        "make it a single-user copy first")
+        raise Refused(f"{thing.data.name} is the mesh of {others[0]}, too, whose shape keys would be off as well: "
+                      "make it a single-user copy first")
     made = Deformation(rig, thing)
     made.joints.find_bones(find_armature(thing, rig))
     stop(thing)
@@ -88,20 +88,11 @@ def state(thing: Any) -> Optional[Deformation]:
     return found[2] if found and isinstance(found[2], Deformation) else None
 
 
-def check_object(thing: Any) -> None:
-    if thing is None or thing.type != "MESH":
-        raise NotUsable("the active object is " + ("none" if thing is None else f"{thing.name}, which is no mesh"))
-    if thing.library is not None:
-        raise NotUsable(f"{thing.name} is linked from {thing.library.filepath}: make a library override of it first")
-    if thing.mode == "EDIT":
-        raise NotUsable(f"{thing.name} is in edit mode: leave it first")
-
-
 def find_armature(thing: Any, rig: model_folder.Rig) -> Any:
     """The armature that deforms the object; of several the first that has all bones of the rig."""
     armatures = [modifier.object for modifier in thing.modifiers if modifier.type == "ARMATURE" and modifier.object]
     if not armatures:
-        raise NotUsable(f"{thing.name} has no Armature modifier with an armature")
+        raise Refused(f"{thing.name} has no Armature modifier with an armature")
     if len(armatures) == 1:
         return armatures[0]
     wanted = {bone for bone, _ in rig.bones}
@@ -198,7 +189,7 @@ def _mute(thing: Any) -> None:
     """Also where the model has gone: then it is told, and the stack stays as it is."""
     try:
         muting.mute(thing, model_folder.read_rig(model_folder.find(thing.neuralwarp.model)))
-    except NotUsable as error:
+    except Refused as error:
         _tell(thing.name, str(error))
 
 

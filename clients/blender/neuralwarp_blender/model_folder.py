@@ -10,12 +10,9 @@ from typing import Any, Iterator, List, Tuple
 import bpy
 
 from . import preferences
+from .refused import Refused
 
 FORMAT, VERSION = "neuralWarp Blender rig", 1
-
-
-class NotUsable(Exception):
-    """A sentence for the user that names the thing, and what is wrong with it."""
 
 
 @dataclass(frozen=True)
@@ -36,17 +33,17 @@ class Rig:
 
 def find(model: str) -> Path:
     """The folder of a model: as it is said, relative to the .blend file; by its name beside that file; in the folder of
-    the preferences. NotUsable where it is in none of them."""
+    the preferences. Refused where it is in none of them."""
     if not model:
-        raise NotUsable("no model is chosen: choose a folder NAME.nwrp")
+        raise Refused("no model is chosen: choose a folder NAME.nwrp")
     looked: List[Path] = []
     for place in _places(model):
         if (place / "metadata.json").is_file():
             return place
         looked.append(place)
     places = ", ".join(map(str, dict.fromkeys(looked)))
-    raise NotUsable(f"there is no model {Path(model).name}; looked for {places}" if places else
-                    f"{model} counts from the .blend file, which was never saved")
+    raise Refused(f"there is no model {Path(model).name}; looked for {places}" if places else
+                  f"{model} counts from the .blend file, which was never saved")
 
 
 def _places(model: str) -> Iterator[Path]:
@@ -65,23 +62,23 @@ def _places(model: str) -> Iterator[Path]:
 
 
 def read_rig(folder: Path) -> Rig:
-    """NotUsable where the folder was not published from Blender, or its blender.json is damaged."""
+    """Refused where the folder was not published from Blender, or its blender.json is damaged."""
     path = folder / "rig" / "blender.json"
     try:
         with open(path, encoding="utf-8") as file:
             content = json.load(file)
     except FileNotFoundError:
-        raise NotUsable(f"{folder.name} was not made in Blender: it has no {path.relative_to(folder)}") from None
+        raise Refused(f"{folder.name} was not made in Blender: it has no {path.relative_to(folder)}") from None
     except (OSError, ValueError, RecursionError) as error:
-        raise NotUsable(f"{path} cannot be read: {error}") from None
+        raise Refused(f"{path} cannot be read: {error}") from None
     if not isinstance(content, dict) or content.get("format") != FORMAT:
-        raise NotUsable(f"{path} is no file of a {FORMAT}")
+        raise Refused(f"{path} is no file of a {FORMAT}")
     if content.get("version") != VERSION:
-        raise NotUsable(f"{path} has version {content.get('version')}; this add-on reads version {VERSION}")
+        raise Refused(f"{path} has version {content.get('version')}; this add-on reads version {VERSION}")
     try:
         return _rig(folder, content)
     except (KeyError, TypeError, AttributeError) as error:
-        raise NotUsable(f"{path} is damaged: {error!r}") from None
+        raise Refused(f"{path} is damaged: {error!r}") from None
 
 
 def _rig(folder: Path, content: Any) -> Rig:

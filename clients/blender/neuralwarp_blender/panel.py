@@ -89,12 +89,4 @@ def draw_state(layout: Any, thing: Any) -> None:
 
 CLASSES = (UsePanel,)
 
-
-def register() -> None:
-    for each in CLASSES:
-        bpy.utils.register_class(each)
-
-
-def unregister() -> None:
-    for each in reversed(CLASSES):
-        bpy.utils.unregister_class(each)
+register, unregister = bpy.utils.register_classes_factory(CLASSES)

@@ -11,13 +11,14 @@ import numpy as np
 from numpy.typing import NDArray
 
 from .character import to_mesh
-from .model_folder import NotUsable
+from .refused import Refused
 
 Array = NDArray[np.float64]
 
 # row and column one and two further on, around a matrix of 3 x 3
 ONE_ON, TWO_ON = (np.ix_(turn, turn) for turn in ((1, 2, 0), (2, 0, 1)))
-ATTRIBUTES = [kind + axis for kind in ("translate", "rotate", "scale") for axis in "XYZ"]
+KINDS = ("translate", "rotate", "scale")
+ATTRIBUTES = [kind + axis for kind in KINDS for axis in "XYZ"]
 
 
 class JointSetter:
@@ -28,7 +29,7 @@ class JointSetter:
         joints = {joint["name"]: (number, joint) for number, joint in enumerate(scene.joints())}
         for bone, name in bones:
             if name not in joints:
-                raise NotUsable(f"the scene of the model has no joint {name}, which the bone {bone} is to set")
+                raise Refused(f"the scene of the model has no joint {name}, which the bone {bone} is to set")
         chosen = [joints[name] for _, name in bones]
         self.bones = [bone for bone, _ in bones]
         self._numbers = np.array([number for number, _ in chosen], dtype=np.intp)
@@ -38,7 +39,7 @@ class JointSetter:
         worlds = [np.asarray(scene.get(f"{name}.worldMatrix")).reshape(4, 4) for name in joints]
         self._worlds = np.stack([*worlds, np.eye(4)])
         rest = np.stack([np.asarray(scene.get(f"{name}.restMatrix")).reshape(4, 4) for _, name in bones])
-        self._unoriented = split(rest)[1].transpose(0, 2, 1)  # the inverse of JO
+        self._unoriented = unoriented(rest)
         self._plugs = scene.plugs([f"{name}.{attribute}" for _, name in bones for attribute in ATTRIBUTES])
         self._values = np.empty((len(bones), 3, 3))  # translate, rotate, scale
         self._places: Any = None  # of mesh and armature, of the last frame
@@ -48,7 +49,7 @@ class JointSetter:
         self._rows = np.empty(0, dtype=np.intp)
 
     def set(self, thing: Any, armature: Any) -> None:
-        """thing, armature: the evaluated objects. NotUsable where a bone is missing."""
+        """thing, armature: the evaluated objects. Refused where a bone is missing."""
         bones = armature.pose.bones
         if len(bones) != len(self._names) or bones.keys() != self._names:
             self.find_bones(armature)
@@ -58,22 +59,33 @@ class JointSetter:
             self._places, self._to_mesh = places, to_mesh(thing, armature).T
         self._worlds[self._numbers] = self._matrices.reshape(-1, 4, 4)[self._rows] @ self._to_mesh
         local = self._worlds[self._numbers] @ inverses(self._worlds[self._parents])
-        scale, rotation = split(local)
-        self._values[:, 0] = local[:, 3, :3]
-        self._values[:, 1] = angles(rotation @ self._unoriented, self._orders)
-        self._values[:, 2] = scale
+        joint_values(local, self._unoriented, self._orders, self._values)
         self._plugs.set(self._values.ravel())
 
     def find_bones(self, armature: Any) -> None:
-        """NotUsable where the armature lacks one."""
+        """Refused where the armature lacks one."""
         names = armature.pose.bones.keys()
         missing = [bone for bone in self.bones if bone not in names]
         if missing:
-            raise NotUsable(f"{armature.name} has no bone {missing[0]}, which the model was made with"
-                            + (f", nor {len(missing) - 1} more" if len(missing) > 1 else ""))
+            raise Refused(f"{armature.name} has no bone {missing[0]}, which the model was made with"
+                          + (f", nor {len(missing) - 1} more" if len(missing) > 1 else ""))
         self._rows = np.array([names.index(bone) for bone in self.bones], dtype=np.intp)
         self._matrices = np.empty(16 * len(names), dtype=np.float32)
         self._names = names
+
+
+def unoriented(rest: Array) -> Array:
+    """[J, 3, 3]: the inverses of JO, of joints whose matrices at rest are these, [J, 4, 4]."""
+    return split(rest)[1].transpose(0, 2, 1)
+
+
+def joint_values(local: Array, unorient: Array, orders: Sequence[str], values: Array) -> None:
+    """Of joints with these matrices, [J, 4, 4], translate, rotate and scale: values, [J, 3, 3]. unorient: as
+    unoriented() gives it."""
+    scale, rotation = split(local)
+    values[:, 0] = local[:, 3, :3]
+    values[:, 1] = angles(rotation @ unorient, orders)
+    values[:, 2] = scale
 
 
 def cofactors(axes: Array) -> Array:

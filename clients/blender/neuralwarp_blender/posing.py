@@ -15,7 +15,7 @@ import numpy as np
 from mathutils import Euler, Matrix
 
 from .character import Joint
-from .stack import Refused
+from .refused import Refused
 
 Angles = Tuple[float, float, float]  # radians, about x, y and z
 

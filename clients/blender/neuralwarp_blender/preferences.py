@@ -48,9 +48,4 @@ def paths() -> Paths:
                  setting("python_path"))
 
 
-def register() -> None:
-    bpy.utils.register_class(Preferences)
-
-
-def unregister() -> None:
-    bpy.utils.unregister_class(Preferences)
+register, unregister = bpy.utils.register_classes_factory((Preferences,))

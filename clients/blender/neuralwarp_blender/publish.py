@@ -13,8 +13,9 @@ from typing import Any, Dict, List
 
 from . import jobs, preferences
 from .character import node_names
+from .refused import Refused
 from .run_folder import RunFolder, base_folder, folder_of, read_json, write_json
-from .stack import Refused, topology
+from .stack import topology
 
 
 def publish(thing: Any) -> Path:

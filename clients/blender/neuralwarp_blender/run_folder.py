@@ -13,7 +13,7 @@ import bpy
 
 from . import preferences
 from .character import node_names
-from .stack import Refused
+from .refused import Refused
 
 
 class RunFolder:

@@ -5,28 +5,20 @@ nothing has changed then."""
 from __future__ import annotations
 
 import time
+from collections import deque
 from typing import Any, Iterator, Optional, Set
 
 import bpy
 
 from . import jobs, watch
+from .operators import CANCELLED, ERRORS, FINISHED, ForMesh, refuse, reported
+from .refused import Refused
 from .run_folder import folder_of
 from .sample_settings import settings_of
 from .sampling import Progress, sample
-from .stack import Refused
 
-FINISHED, CANCELLED, RUNNING = {"FINISHED"}, {"CANCELLED"}, {"RUNNING_MODAL"}
+RUNNING = {"RUNNING_MODAL"}
 SLICE = 0.1  # seconds of work between two looks at the keyboard
-
-
-class ForMesh(bpy.types.Operator):
-    @classmethod
-    def poll(cls, context: Any) -> bool:
-        return context.object is not None and context.object.type == "MESH"
-
-    def refuse(self, error: Exception) -> Set[str]:
-        self.report({"ERROR"}, str(error))
-        return CANCELLED
 
 
 class Sample(ForMesh):
@@ -43,12 +35,7 @@ class Sample(ForMesh):
         return sample(thing, settings_of(thing), lambda kind, text: self.report({kind}, text))
 
     def execute(self, context: Any) -> Set[str]:
-        try:
-            for _ in self.begin(context):
-                pass
-        except (Refused, OSError) as error:
-            return self.refuse(error)
-        return FINISHED
+        return reported(self, lambda: deque(self.begin(context), maxlen=0))
 
     def invoke(self, context: Any, event: Any) -> Set[str]:
         self._work = self.begin(context)
@@ -73,9 +60,9 @@ class Sample(ForMesh):
             self.end(context)
             self.report({"INFO"}, f"{context.object.name} is sampled")
             return FINISHED
-        except (Refused, OSError) as error:
+        except ERRORS as error:
             self.end(context)
-            return self.refuse(error)
+            return refuse(self, error)
         return RUNNING
 
     def show(self, context: Any, doing: str, done: int, total: int) -> None:
@@ -108,22 +95,20 @@ class Train(ForMesh):
     }
 
     def execute(self, context: Any) -> Set[str]:
-        thing = context.object
-        try:
-            folder = folder_of(thing)
-            watch.set_outcome(folder, "")
-            settings = thing.neuralwarp_sampling
-            jobs.start(folder, settings.epochs, settings.with_report)
-            if not self.wait:
-                watch.begin()
-                return FINISHED
-            now = jobs.wait(folder)
-            if now.state != "done":
-                raise Refused(f"the training of {thing.name} ended: {now.said}")
-            watch.set_outcome(folder, f"published as {watch.publish_into(thing).name}")
-        except (Refused, OSError) as error:
-            return self.refuse(error)
-        return FINISHED
+        return reported(self, lambda: self.train(context.object))
+
+    def train(self, thing: Any) -> None:
+        folder = folder_of(thing)
+        watch.set_outcome(folder, "")
+        settings = thing.neuralwarp_sampling
+        jobs.start(folder, settings.epochs, settings.with_report)
+        if not self.wait:
+            watch.begin()
+            return
+        now = jobs.wait(folder)
+        if now.state != "done":
+            raise Refused(f"the training of {thing.name} ended: {now.said}")
+        watch.publish_into(thing)
 
 
 class Cancel(ForMesh):
@@ -132,11 +117,7 @@ class Cancel(ForMesh):
     bl_description = "Ends the training of the active mesh; started again it goes on where it was"
 
     def execute(self, context: Any) -> Set[str]:
-        try:
-            jobs.cancel(folder_of(context.object))
-        except (Refused, OSError) as error:
-            return self.refuse(error)
-        return FINISHED
+        return reported(self, lambda: jobs.cancel(folder_of(context.object)))
 
 
 class Publish(ForMesh):
@@ -145,24 +126,9 @@ class Publish(ForMesh):
     bl_description = "Puts the trained model of the active mesh beside the file, for use"
 
     def execute(self, context: Any) -> Set[str]:
-        thing = context.object
-        try:
-            place = watch.publish_into(thing)
-            watch.set_outcome(folder_of(thing), f"published as {place.name}")
-        except (Refused, OSError) as error:
-            return self.refuse(error)
-        self.report({"INFO"}, f"published as {place}")
-        return FINISHED
+        return reported(self, lambda: self.report({"INFO"}, f"published as {watch.publish_into(context.object)}"))
 
 
 CLASSES = (Sample, Train, Cancel, Publish)
 
-
-def register() -> None:
-    for one in CLASSES:
-        bpy.utils.register_class(one)
-
-
-def unregister() -> None:
-    for one in reversed(CLASSES):
-        bpy.utils.unregister_class(one)
+register, unregister = bpy.utils.register_classes_factory(CLASSES)

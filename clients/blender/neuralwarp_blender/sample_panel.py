@@ -9,8 +9,8 @@ import bpy
 
 from . import jobs, watch
 from .panel import SidebarPanel, write
+from .refused import Refused
 from .run_folder import RunFolder, folder_of
-from .stack import Refused
 
 
 class SamplePanel(SidebarPanel, bpy.types.Panel):
@@ -68,9 +68,4 @@ def draw_state(layout: Any, folder: RunFolder, now: jobs.Status) -> None:
         layout.operator("neuralwarp.publish", icon="EXPORT")
 
 
-def register() -> None:
-    bpy.utils.register_class(SamplePanel)
-
-
-def unregister() -> None:
-    bpy.utils.unregister_class(SamplePanel)
+register, unregister = bpy.utils.register_classes_factory((SamplePanel,))

@@ -16,19 +16,21 @@ import subprocess
 import time
 from dataclasses import dataclass
 from pathlib import Path
-from typing import Any, Callable, Dict, Iterator, List, Mapping, Optional, Sequence, Tuple
+from typing import Any, Callable, Dict, Iterator, List, Mapping, Sequence, Tuple
 
 import bpy
 import numpy as np
-from mathutils import Euler, Matrix
+from mathutils import Euler
 from numpy.typing import NDArray
 
 from . import jobs, preferences
 from .character import Character, read_character, to_mesh, write_character
 from .limits import actions_of, find_limits
-from .posing import Angles, Posing, playing, rotation
+from .pose import KINDS, inverses, joint_values, unoriented
+from .posing import Angles, Posing, playing
+from .refused import Refused
 from .run_folder import RunFolder, folder_of, write_json
-from .stack import Refused, Stack, Switches, evaluated_points, read_stack, topology
+from .stack import Stack, Switches, evaluated_points, read_stack, topology
 
 Progress = Tuple[str, int, int]  # what is done, how much of it, of how much
 Say = Callable[[str, str], None]  # "INFO" or "WARNING", and a sentence
@@ -279,49 +281,54 @@ def sample_motion(rig: Rig, character: Character, switches: Switches) -> Iterato
 
 
 class JointTrack:
-    """What joints do over frames, as quarn's attributes have it."""
+    """What joints do over frames, as quarn's attributes have it. Matrices here are of row vectors, as in pose.py."""
 
     def __init__(self, character: Character) -> None:
         self.joints = character.joints
-        self.rest = [Matrix(self._local([joint.rest for joint in self.joints], index))
-                     for index, joint in enumerate(self.joints)]
-        self.frames: List[List[List[float]]] = []  # frame, joint, nine values
+        self._parents = np.array([joint.parent for joint in self.joints], dtype=np.intp)
+        # one more for joints without a parent: the last, which -1 is
+        self._worlds = np.stack([*(joint.rest.T for joint in self.joints), np.eye(4)])
+        self._unoriented = unoriented(self._local())
+        self._rest = self._values()
+        self.frames: List[NDArray[np.float64]] = []  # [joints, 3, 3]: translate, rotate, scale
 
-    def _local(self, places: Sequence[NDArray[np.float64]], index: int) -> NDArray[np.float64]:
-        parent = self.joints[index].parent
-        return places[index] if parent < 0 else np.asarray(np.linalg.inv(places[parent]) @ places[index])
+    def _local(self) -> NDArray[np.float64]:
+        return np.asarray(self._worlds[:-1] @ inverses(self._worlds[self._parents]))
+
+    def _values(self) -> NDArray[np.float64]:
+        values = np.empty((len(self.joints), 3, 3))
+        joint_values(self._local(), self._unoriented, ["xyz"] * len(self.joints), values)
+        return values
 
     def take(self, thing: Any, armature: Any) -> None:
         """thing, armature: evaluated."""
-        place = to_mesh(thing, armature)
-        places = [place @ np.array(armature.pose.bones[joint.bone].matrix) for joint in self.joints]
-        self.frames.append([self._values(Matrix(self._local(places, index)), index)
-                            for index in range(len(self.joints))])
-
-    def _values(self, local: Matrix, index: int) -> List[float]:
-        turn = rotation(self.rest[index]).inverted() @ rotation(local)
-        before = self._before(index)
-        angles = turn.to_euler("XYZ", before) if before else turn.to_euler("XYZ")
-        return [*local.to_translation(), *angles, *local.to_scale()]
-
-    def _before(self, index: int) -> Optional[Any]:
-        """The angles in the frame before, which those of the next are to be near."""
-        if not self.frames:
-            return None
-        return Euler(self.frames[-1][index][3:6], "XYZ")
+        place = to_mesh(thing, armature).T
+        for number, joint in enumerate(self.joints):
+            self._worlds[number] = np.array(armature.pose.bones[joint.bone].matrix).T @ place
+        values = self._values()
+        if self.frames:
+            bring_near(values[:, 1], self.frames[-1][:, 1])
+        self.frames.append(values)
 
     def keys(self) -> Mapping[str, List[List[float]]]:
-        values = np.array(self.frames)
+        values = np.stack(self.frames)
         found = {}
         for index, joint in enumerate(self.joints):
-            rest = np.array([*self.rest[index].to_translation(), 0.0, 0.0, 0.0, *self.rest[index].to_scale()])
-            for column, kind in enumerate(("translate", "rotate", "scale")):
-                for axis in range(3):
-                    curve = values[:, index, 3 * column + axis]
-                    if np.abs(curve - rest[3 * column + axis]).max() > STILL * max(1.0, float(np.abs(rest).max())):
-                        found[f"{joint.name}.{kind}{'XYZ'[axis]}"] = [[1.0 + frame, float(value)]
-                                                                      for frame, value in enumerate(curve)]
+            still = STILL * max(1.0, float(np.abs(self._rest[index]).max()))
+            for kind, axis in np.ndindex(3, 3):
+                curve = values[:, index, kind, axis]
+                if np.abs(curve - self._rest[index, kind, axis]).max() > still:
+                    found[f"{joint.name}.{KINDS[kind]}{'XYZ'[axis]}"] = [[1.0 + frame, float(value)]
+                                                                         for frame, value in enumerate(curve)]
         return found
+
+
+def bring_near(angles: NDArray[np.float64], before: NDArray[np.float64]) -> None:
+    """[joints, 3], x first: takes of the angles that turn alike those nearest to the ones of the frame before."""
+    for angle, of_before in zip(angles, before):
+        turn = Euler(angle, "XYZ")
+        turn.make_compatible(Euler(of_before, "XYZ"))
+        angle[:] = turn
 
 
 def sample_all(thing: Any, settings: Settings, say: Say = print) -> None:

@@ -16,16 +16,14 @@ import bpy
 import numpy as np
 from numpy.typing import NDArray
 
+from .refused import Refused
+
 # modifiers whose shape depends on the frames before, or on the frame itself
 MEMORY = {"CLOTH", "SOFT_BODY", "DYNAMIC_PAINT", "FLUID", "OCEAN", "WAVE", "BUILD", "EXPLODE", "PARTICLE_INSTANCE",
           "MESH_CACHE", "MESH_SEQUENCE_CACHE"}
 HELD = {"CLOTH", "SOFT_BODY"}  # those that come to rest when a pose is held
 HARMLESS = {"PARTICLE_SYSTEM", "COLLISION", "SURFACE"}  # move no vertex
 SIMULATION_NODE = "GeometryNodeSimulationInput"  # of Blender 3.6 and later
-
-
-class Refused(Exception):
-    """A sentence for the user that names the object, the modifier or key, and the reason."""
 
 
 @dataclass(frozen=True)
@@ -146,17 +144,29 @@ def read_stack(thing: Any) -> Stack:
                  tuple(modifier.name for modifier in learned), keys, tuple(left_out), tuple(held), tuple(notes))
 
 
-def check_object(thing: Any) -> None:
+def check_mesh_object(thing: Any) -> None:
+    """Refused where it is no mesh object of this file, or its mesh is being edited."""
     if thing is None or thing.type != "MESH":
         raise Refused("the active object is " + ("none" if thing is None else f"{thing.name}, which is no mesh"))
-    for block in (thing, thing.data):
-        if block.library is not None:
-            raise Refused(f"{block.name} is linked from {block.library.filepath}: make a library override of object "
-                          "and mesh first")
+    if thing.library is not None:
+        raise Refused(f"{thing.name} is linked from {thing.library.filepath}: make a library override of object and "
+                      "mesh first")
     if thing.mode == "EDIT":
         raise Refused(f"{thing.name} is in edit mode: leave it first")
-    if hasattr(thing, "neuralwarp") and thing.neuralwarp.in_use:  # what there is to learn is off
-        raise Refused(f"{thing.name} is in use with {thing.neuralwarp.model}: stop that first")
+
+
+def check_own_mesh(thing: Any) -> None:
+    """Refused where the mesh of an object is linked: Blender would not write into its evaluated copies, and say
+    nothing."""
+    mesh = thing.data
+    if mesh.library is not None:
+        raise Refused(f"{mesh.name}, the mesh of {thing.name}, is linked from {mesh.library.filepath}: make a library "
+                      "override of the mesh as well")
+
+
+def check_object(thing: Any) -> None:
+    check_mesh_object(thing)
+    check_own_mesh(thing)
     if thing.show_only_shape_key:
         raise Refused(f"{thing.name} shows one shape key alone: switch this off first")
     if not thing.data.polygons:

@@ -3,38 +3,22 @@
 changed then."""
 
 from pathlib import Path
-from typing import Any, Callable, Set
+from typing import Any, Set
 
 import bpy
 
 from . import bake, live, module
-from .model_folder import NotUsable
+from .operators import FINISHED, ForMesh, reported
+from .refused import Refused
 
-FINISHED, CANCELLED = {"FINISHED"}, {"CANCELLED"}
-
-
-def reported(operator: Any, work: Callable[[], Any]) -> Set[str]:
-    """The operator's answer: an error is one of its reports (which raise a RuntimeError in a script)."""
-    try:
-        work()
-    except (NotUsable, module.Missing, OSError, ValueError, RuntimeError) as error:
-        operator.report({"ERROR"}, str(error))
-        return CANCELLED
-    return FINISHED
-
-
-class ForMesh(bpy.types.Operator):
-    bl_options = {"REGISTER", "UNDO"}
-
-    @classmethod
-    def poll(cls, context: Any) -> bool:
-        return context.object is not None and context.object.type == "MESH"
+UNDO = {"REGISTER", "UNDO"}
 
 
 class Use(ForMesh):
     bl_idname = "neuralwarp.use"
     bl_label = "Use"
     bl_description = "Deforms the active mesh with a model, in the viewport and in renders"
+    bl_options = UNDO
     __annotations__ = {
         "model": bpy.props.StringProperty(
             name="Model", description="A folder NAME.nwrp; empty: the one that the object has been used with"),
@@ -49,6 +33,7 @@ class Stop(ForMesh):
     bl_idname = "neuralwarp.stop"
     bl_label = "Stop"
     bl_description = "Shows the active mesh as the rigger built it"
+    bl_options = UNDO
 
     def execute(self, context: Any) -> Set[str]:
         return reported(self, lambda: live.stop(context.object))
@@ -71,6 +56,7 @@ class Bake(ForMesh):
     bl_idname = "neuralwarp.bake"
     bl_label = "Bake"
     bl_description = "Writes down what the model does, for somebody without this add-on, and takes the model out of use"
+    bl_options = UNDO
     __annotations__ = {
         "kind": bpy.props.EnumProperty(name="To", items=(
             ("PC2", "Mesh Cache", "A PC2 file, which a Mesh Cache modifier plays"),
@@ -95,7 +81,7 @@ class Bake(ForMesh):
 
     def _path(self, thing: Any) -> Path:
         if not self.filepath and not bpy.data.filepath:
-            raise NotUsable("the file was never saved: save it, or say where the PC2 is to be")
+            raise Refused("the file was never saved: save it, or say where the PC2 is to be")
         return Path(bpy.path.abspath(self.filepath or f"//{bpy.path.clean_name(thing.name)}.pc2"))
 
 
@@ -103,6 +89,7 @@ class ShowCache(ForMesh):
     bl_idname = "neuralwarp.show_cache"
     bl_label = "Show a PC2"
     bl_description = "Has a Mesh Cache modifier play a PC2 file that was baked elsewhere: it needs no module"
+    bl_options = UNDO
     __annotations__ = {
         "filepath": bpy.props.StringProperty(name="File", subtype="FILE_PATH"),
         "filter_glob": bpy.props.StringProperty(default="*.pc2", options={"HIDDEN"}),
@@ -120,12 +107,4 @@ class ShowCache(ForMesh):
 
 CLASSES = (Use, Stop, Reload, Bake, ShowCache)
 
-
-def register() -> None:
-    for each in CLASSES:
-        bpy.utils.register_class(each)
-
-
-def unregister() -> None:
-    for each in reversed(CLASSES):
-        bpy.utils.unregister_class(each)
+register, unregister = bpy.utils.register_classes_factory(CLASSES)

@@ -12,8 +12,8 @@ from bpy.app.handlers import persistent
 
 from . import jobs
 from .publish import publish
+from .refused import Refused
 from .run_folder import RunFolder, folder_of
-from .stack import Refused
 
 SECONDS = 2.0
 
@@ -62,7 +62,7 @@ def tick() -> Optional[float]:
 def finish(thing: Any, folder: RunFolder, now: jobs.Status) -> None:
     if now.state == "done":
         try:
-            set_outcome(folder, f"published as {publish_into(thing).name}")
+            publish_into(thing)
         except Refused as error:
             set_outcome(folder, str(error))
             popup(f"{thing.name}: {error}")
@@ -71,8 +71,9 @@ def finish(thing: Any, folder: RunFolder, now: jobs.Status) -> None:
 
 
 def publish_into(thing: Any) -> Path:
-    """Publishes, and has the object know its model."""
+    """Publishes, says so, and has the object know its model."""
     place = publish(thing)
+    set_outcome(folder_of(thing), f"published as {place.name}")
     if hasattr(thing, "neuralwarp"):
         thing.neuralwarp.model = bpy.path.relpath(str(place)) if bpy.data.filepath else str(place)
         if thing.neuralwarp.in_use:

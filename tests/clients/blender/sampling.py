@@ -17,6 +17,7 @@ sys.path[:0] = [str(HERE), str(HERE.parents[2] / "clients" / "blender")]
 
 import random_rig  # noqa: E402
 from neuralwarp_blender import jobs, limits, posing, run_folder, sampling, stack  # noqa: E402
+from neuralwarp_blender.refused import Refused  # noqa: E402
 from rebuilt_arm import JOINTS, make_armature, rebuild_arm  # noqa: E402
 
 FOLDER, QUARN = (Path(word) for word in sys.argv[sys.argv.index("--") + 1:])
@@ -33,7 +34,7 @@ def new_arm() -> Tuple[Any, Any]:
 def refused(work: Callable[[], Any]) -> str:
     try:
         work()
-    except stack.Refused as error:
+    except Refused as error:
         return str(error)
     return "not refused"
 
