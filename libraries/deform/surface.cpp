@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "nw_deform/surface.h"
 
-#include "nw_deform/RestTables.h"
+#include "frame/RestTables.h"
 
 namespace neuralWarp {
 

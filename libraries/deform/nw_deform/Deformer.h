@@ -4,10 +4,10 @@
 
 #include "frame/FrameModel.h"
 #include "frame/FrameWorkspace.h"
+#include "frame/RestTables.h"
 #include "frame/SlotMap.h"
 #include "frame/smoothing.h"
 #include "nw_deform/Model.h"
-#include "nw_deform/RestTables.h"
 #include "quill/MeshTopology.h"
 #include "quill/WorkWatch.h"
 

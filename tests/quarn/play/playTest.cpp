@@ -1,9 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // Statistics against a plain computation, and files read back.
-#include "quarn/play/Distances.h"
 #include "quarn/play/FrameFiles.h"
 #include "quarn/play/VertexOrder.h"
 #include "quarn/play/meshFiles.h"
+#include "quarn/scene/Distances.h"
 #include "storage/PointCache.h"
 #include "support/TemporaryFolder.h"
 #include "support/failureOf.h"

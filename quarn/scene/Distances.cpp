@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/play/Distances.h"
+#include "quarn/scene/Distances.h"
 
 #include <algorithm>
 #include <bit>

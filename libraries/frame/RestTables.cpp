@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "nw_deform/RestTables.h"
+#include "frame/RestTables.h"
 
 #include <utility>
 

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/play/FramePlayer.h"
+#include "quarn/scene/FramePlayer.h"
 
 #include "openquarn_app/Evaluation.h"
 #include "quarn/scene/EnvelopeGuard.h"

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/play/FrameTimes.h"
+#include "quarn/scene/FrameTimes.h"
 
 #include <algorithm>
 #include <cmath>
