@@ -43,6 +43,10 @@ declare -A probe_of=(
   [npm]=npm
   [nodejs]=node
   [clang-14]=clang++-14
+  [lld-14]=wasm-ld-14
+  [wasi-libc]=/usr/include/wasm32-wasi/stdio.h
+  [libc++-14-dev-wasm32]=/usr/include/wasm32-wasi/c++/v1/vector
+  [libclang-rt-14-dev-wasm32]=/usr/lib/llvm-14/lib/clang/*/lib/wasi/libclang_rt.builtins-wasm32.a
   [libclang-rt-14-dev]=/usr/lib/llvm-14/lib/clang/*/include/sanitizer/asan_interface.h
   [llvm-14]=llvm-symbolizer-14
   [clang-format-14]=clang-format-14
@@ -59,6 +63,7 @@ declare -A probe_of=(
   [python3-pil]=/usr/lib/python3/dist-packages/PIL/__init__.py
   [libopenblas0-pthread]=/usr/lib/*/openblas-pthread/libblas.so.3 # ten times as fast as the reference one
   [blender]=blender
+  [chromium]=chromium
   [python3-setuptools]=/usr/lib/python3/dist-packages/setuptools/__init__.py
   [python3-wheel]=/usr/lib/python3/dist-packages/wheel/__init__.py
   [python3-venv]=/usr/lib/python3*/ensurepip/__init__.py
@@ -79,11 +84,13 @@ build_packages=(g++ cmake ninja-build ccache libtbb-dev rapidjson-dev libcli11-d
   ocl-icd-opencl-dev pocl-opencl-icd pybind11-dev python3-dev)
 python_packages=(python3-torch python3-onnx python3-numpy python3-scipy python3-tqdm python3-matplotlib
   python3-xxhash python3-pil libopenblas0-pthread)
+# by which clang compiles for a browser
+viewer_packages=(clang-14 lld-14 wasi-libc libc++-14-dev-wasm32 libclang-rt-14-dev-wasm32)
 # what a wheel is made with, and installed in a place of its own
 wheel_packages=(python3-setuptools python3-wheel python3-venv)
 package_packages=(dpkg-dev file patchelf)
 # tools that tests go to and come back from; what misses them is skipped, except in continuous integration
-client_packages=(blender python3-numpy nodejs)
+client_packages=(blender chromium python3-numpy python3-pil nodejs)
 check_packages=(git clang-format-14 clang-tidy-14 mypy flake8)
 clang_packages=(clang-14 libclang-rt-14-dev llvm-14)
 

@@ -84,5 +84,6 @@ command_test() {
   # for the trainer's tests, the demo, the package and the debugger's test
   need_packages gdb "${python_packages[@]}" "${wheel_packages[@]}" "${package_packages[@]}"
   [[ -d ../shared/cases ]] || say "the reference cases were not there (../shared/cases): replay_cases is skipped"
+  have chromium || say "chromium was not there (./run deps): the tests of pages in a browser are skipped"
   test_as_said release
 }

@@ -83,6 +83,9 @@ TESTS
 run_row 0 'testing plugin/gpu' '^cmake --build .* --target tests/plugin/gpu/all clients/python/all quarn/quarn$' test gpu
 run_row 0 'testing release' '^ctest --preset release .* -R geometry$' test -R geometry
 
+# --- a build goes on without the parts of the page ---
+run_row 0 'the page of quarn view is left out' '^cmake --build' build
+
 # --- a demo says what is coming ---
 run_row 1 'posed 40 times.*its results go to .*/here' 'npm pack' demo --output here --samples 40 --epochs 3
 for said in 'about 2 min .*to build it first' 'to be loaded: .*the hand \(94 MB\)'; do
