@@ -81,7 +81,8 @@ class Chromium:
             shutil.rmtree(self.folder, ignore_errors=True)
 
     def failure(self, sentence: str) -> BrowserError:
-        said = (self.folder / "stderr").read_text(errors="replace").splitlines()
+        lines = (self.folder / "stderr").read_text(errors="replace").splitlines()
+        said = [line for line in lines if "dbus/" not in line]  # there is none in a container
         return BrowserError("\n".join([sentence, *(["the browser's last words:"] + said[-15:] if said else [])]))
 
     def call(self, method: str, session: Optional[str] = None, /, **arguments: Any) -> Any:
@@ -200,10 +201,10 @@ class Page:
         """A PNG of what is seen."""
         return base64.b64decode(self.call("Page.captureScreenshot", format="png")["data"])
 
-    def press(self, key: str, code: str = "") -> None:
+    def press(self, key: str) -> None:
         """A key, down and up: " ", "ArrowRight", "h"."""
         text = {"text": key} if len(key) == 1 else {}
-        stroke = {"key": key, "code": code or (f"Key{key.upper()}" if key.isalpha() and len(key) == 1 else key)}
+        stroke = {"key": key, "code": "Space" if key == " " else f"Key{key.upper()}" if text else key}
         self.call("Input.dispatchKeyEvent", type="keyDown" if text else "rawKeyDown", **stroke, **text)
         self.call("Input.dispatchKeyEvent", type="keyUp", **stroke)
 
