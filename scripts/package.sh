@@ -6,7 +6,7 @@ command_package() {
   local folder=build/release/packages installed=build/release/installed python
   need_packages "${package_packages[@]}" "${wheel_packages[@]}"
   configure release
-  build_targets release quarn neuralWarp quarnRig quill clients/python/all # what is installed
+  build_targets release quarn neuralWarp quarnRig quill clients/python/all clients/viewer/all # what is installed
   say "packing"
   rm -rf "$folder"
   cpack --config build/release/CPackConfig.cmake >build/package.log 2>&1 || {

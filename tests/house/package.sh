@@ -65,6 +65,13 @@ import json, sys
 errors = json.load(open(sys.argv[1]))
 if errors["ranWith"] != "quarn" or not errors["network"]["mean"]["mm"] < 0.9 * errors["base"]["mean"]["mm"]:
     sys.exit(f"the model is no better than none: {errors}")' "$work/said"
+if [[ -e $build/clients/viewer/viewer.html ]]; then
+  installed quarn view work/poses.json -o work/hand.html --frames 1-5
+  grep -q 'id="block-basis.values"' "$work/work/hand.html" || fail "quarn view has written no page of the hand"
+  grep -q 'Permission is hereby granted' "$work/moved/share/doc/neuralWarp/LICENSE.three" || fail "three.js has no licence"
+else
+  echo "the page of quarn view was not built: that part is not tried"
+fi
 installed env PYTHONPATH=moved/lib/python3 "$python" -c "import neuralwarp; neuralwarp.Scene"
 for program in quarn neuralwarp-train env/bin/neuralwarp-train; do
   installed "$program" --version

@@ -18,7 +18,7 @@ from PIL import Image
 from chromium import Chromium, Page
 from small_arm import FRAMES, HOSTILE, ROOT, SHAPES, TITLE, SmallArm
 
-READY = "neuralWarp.ready.then(() => true, (error) => String(error))"
+READY = "neuralWarp.ready.then(() => neuralWarp.error ?? true)"
 HACKED = "window.hacked === undefined && !document.querySelector('img, [onmouseover]')"
 
 
@@ -66,8 +66,7 @@ def points(page: Page, shape: str) -> np.ndarray:
 
 def drawn(page: Page) -> np.ndarray:
     """What is drawn of the character alone, [height, width, 4], without what the page shows on top."""
-    canvas = page.evaluate("(neuralWarp.draw(), Array.from(document.querySelectorAll('canvas'))"
-                           ".filter((canvas) => canvas.offsetWidth > 200)[0].toDataURL())")
+    canvas = page.evaluate("(neuralWarp.draw(), document.querySelector('#canvas canvas').toDataURL())")
     return np.asarray(Image.open(io.BytesIO(base64.b64decode(canvas.partition(",")[2]))).convert("RGBA")).astype(int)
 
 
@@ -227,12 +226,16 @@ class SameTest(PageTest):
 class ProofTest(PageTest):
     def verdict(self, page: Page) -> Any:
         verdict = page.evaluate("neuralWarp.verdict")
-        self.assertIn(verdict["text"], page.evaluate("document.body.textContent"))
+        for sentence in ("native", "deformer"):
+            self.assertIn(verdict[sentence], page.evaluate("document.body.innerText"))
         return verdict
 
     def test_says_that_it_is_whole(self) -> None:
-        verdict = self.verdict(self.ready())
+        page = self.ready()
+        verdict = self.verdict(page)
         self.assertEqual((verdict["same"], verdict["checks"], verdict["damagedBlocks"]), (True, [True] * 5, []))
+        limit = page.evaluate("neuralWarp.manifest.difference.limitMm")
+        self.assertAlmostEqual(float(re.findall(r"([\d.e-]+) mm", verdict["deformer"])[-1]), limit, delta=limit / 100)
 
     def test_finds_a_bit_where_no_frame_looks(self) -> None:
         def in_unused_shape(content: bytearray) -> bytes:
@@ -277,7 +280,7 @@ class ProofTest(PageTest):
                    "cut off": text[:text.index('id="block-skin.weights"') + 200]}
         for what, damaged in damages.items():
             page = self.open(self.changed(lambda _, damaged=damaged: damaged))  # type: ignore[misc]
-            page.evaluate(f"Promise.race([{READY}, new Promise((done) => setTimeout(done, 2000))])")
+            page.evaluate("window.neuralWarp?.ready")
             shown = page.evaluate("document.body.innerText")
             self.assertRegex(shown, r"(?i)(block|file|page)[^.]*\b(damaged|incomplete|missing|cut|not there)\b", what)
             self.assertGreater(len(np.unique(seen(page).reshape(-1, 3), axis=0)), 5, what)
@@ -324,7 +327,7 @@ class DrawingTest(PageTest):
                 self.look_at(pictures[mode])
             page.evaluate("(neuralWarp.setMode('split'), neuralWarp.setSplit(0.5), 0)")
             split, middle = drawn(page), pictures["skin"].shape[1] // 2
-            halves = {"neural": np.s_[:, :middle - 3], "skin": np.s_[:, middle + 3:]}
+            halves = {"skin": np.s_[:, :middle - 3], "neural": np.s_[:, middle + 3:]}
             for mode, half in halves.items():
                 self.assertEqual(np.abs(split[half] - pictures[mode][half]).max(), 0, f"{address} {mode}")
                 self.assertGreater((pictures["skin"][half] != pictures["neural"][half]).mean(), 0.002)
