@@ -5,7 +5,7 @@
 #include "openquarn/HQuaternion.h"
 #include "openquarn/HVector.h"
 #include "quarn/console/Console.h"
-#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/PoseControls.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/joints.h"
 

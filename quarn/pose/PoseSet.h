@@ -2,19 +2,14 @@
 // Poses that differ from each other.
 #pragma once
 
+#include "quarn/scene/ValueLimits.h"
+
 #include <cstddef>
 #include <map>
 #include <span>
 #include <vector>
 
 namespace quarn {
-
-/// What is known of a value that is sampled. All finite, least <= most, and most - least finite.
-struct ValueLimits {
-    double least = 0.0;
-    double most = 1.0;
-    double rest = 0.0; ///< its default; may lie outside of the limits
-};
 
 /// Collects poses, each a number for every value, and refuses those that are near one that it has: the largest
 /// difference over the values, each divided by most - least, is below the tolerance. A value whose limits are equal

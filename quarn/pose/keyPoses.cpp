@@ -1,7 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/pose/keyPoses.h"
 
-#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/PoseControls.h"
 #include "quarn/scene/plugs.h"
 
 #include <algorithm>

@@ -6,7 +6,7 @@
 #include "openquarn/HFnDependencyNode.h"
 #include "openquarn/HMatrix.h"
 #include "openquarn/HTransformationMatrix.h"
-#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/PoseControls.h"
 #include "quarn/scene/plugs.h"
 
 #include <algorithm>

@@ -2,8 +2,8 @@
 #include "quarn/pose/readKeys.h"
 
 #include "openquarn/HFnAttribute.h"
-#include "quarn/pose/PoseControls.h"
 #include "quarn/pose/smoothSlopes.h"
+#include "quarn/scene/PoseControls.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/sliders.h"
 #include "storage/Json.h"

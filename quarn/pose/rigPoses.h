@@ -3,7 +3,7 @@
 #pragma once
 
 #include "quarn/console/Console.h"
-#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/PoseControls.h"
 #include "quarn/scene/Warp.h"
 
 #include <vector>

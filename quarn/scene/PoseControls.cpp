@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/pose/PoseControls.h"
+#include "quarn/scene/PoseControls.h"
 
 #include "openquarn/HFnAttribute.h"
 #include "openquarn_app/Evaluation.h"

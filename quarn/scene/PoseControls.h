@@ -3,10 +3,11 @@
 // they come from.
 #pragma once
 
-#include "quarn/pose/PoseSet.h"
+#include "quarn/scene/ValueLimits.h"
 #include "quarn/scene/Warp.h"
 
 #include <string>
+#include <vector>
 
 namespace quarn {
 
