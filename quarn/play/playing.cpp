@@ -9,8 +9,6 @@
 #include "quarn/scene/AppliedModels.h"
 #include "quarn/scene/FramePlayer.h"
 #include "quarn/scene/SceneSession.h"
-#include "quarn/scene/Warp.h"
-#include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 #include "storage/WholeFile.h"
 
@@ -187,16 +185,6 @@ private:
 
 PlayResult playFrames(SceneSession& session, PlayPlan plan, const Console& console) {
     return Playing(session, std::move(plan), console).play();
-}
-
-FrameRange framesToPlay(const std::string& text, const Warp* warp) {
-    if (!text.empty())
-        return frameRange(text);
-    if (warp == nullptr)
-        throw std::runtime_error(
-            "the scene has no neuralWarp deformer that says which frames: give --frames, as 1-100");
-    return frameRange(std::to_string(wholeNumberOf(warp->plug("exportStartFrame"))) + "-" +
-                      std::to_string(wholeNumberOf(warp->plug("exportEndFrame"))));
 }
 
 } // namespace quarn

@@ -24,7 +24,6 @@ namespace quarn {
 
 struct Console;
 class SceneSession;
-struct Warp;
 
 /// What is played.
 struct PlayPlan {
@@ -68,9 +67,5 @@ struct PlayResult {
 
 /// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. Thread: main.
 PlayResult playFrames(SceneSession& session, PlayPlan plan, const Console& console);
-
-/// The frames that the text says; with an empty one exportStartFrame to exportEndFrame of the deformer. Throws
-/// std::runtime_error when there is neither, or they are in the wrong order.
-FrameRange framesToPlay(const std::string& text, const Warp* warp);
 
 } // namespace quarn

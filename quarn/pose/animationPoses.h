@@ -2,6 +2,7 @@
 // Poses out of the scene's own animation.
 #pragma once
 
+#include "quarn/pose/PoseSet.h"
 #include "quarn/scene/PoseControls.h"
 #include "quarn/scene/frames.h"
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "quarn/console/Console.h"
+#include "quarn/pose/PoseSet.h"
 #include "quarn/scene/PoseControls.h"
 #include "quarn/scene/Warp.h"
 

@@ -2,6 +2,8 @@
 #include "quarn/scene/frames.h"
 
 #include "quarn/console/UsageError.h"
+#include "quarn/scene/Warp.h"
+#include "quarn/scene/plugs.h"
 
 #include <charconv>
 #include <optional>
@@ -43,6 +45,16 @@ FrameRange frameRange(const std::string& text) {
         throw UsageError("\"" + text +
                          "\" is no range of frames: the last is not before the first, and steps are at least 1");
     return {*first, *last, *step};
+}
+
+FrameRange framesToPlay(const std::string& text, const Warp* warp) {
+    if (!text.empty())
+        return frameRange(text);
+    if (warp == nullptr)
+        throw std::runtime_error(
+            "the scene has no neuralWarp deformer that says which frames: give --frames, as 1-100");
+    return frameRange(std::to_string(wholeNumberOf(warp->plug("exportStartFrame"))) + "-" +
+                      std::to_string(wholeNumberOf(warp->plug("exportEndFrame"))));
 }
 
 } // namespace quarn

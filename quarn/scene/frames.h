@@ -7,6 +7,8 @@
 
 namespace quarn {
 
+struct Warp;
+
 /// Whole frames from `first` to `last`, both included, each `step`-th.
 struct FrameRange {
     int first = 1;
@@ -20,5 +22,9 @@ struct FrameRange {
 /// "5", "1-100" or "1-100x5"; frames may be negative ("-10--1"). Throws std::runtime_error, quoting the text, for
 /// anything else and where the last frame is before the first.
 FrameRange frameRange(const std::string& text);
+
+/// The frames that the text says; with an empty one exportStartFrame to exportEndFrame of the deformer. Throws
+/// std::runtime_error when there is neither, or they are in the wrong order.
+FrameRange framesToPlay(const std::string& text, const Warp* warp);
 
 } // namespace quarn

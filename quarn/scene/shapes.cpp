@@ -47,10 +47,7 @@ SceneShapes::Shape shapeOf(const HObject& node, unsigned geometry, unsigned inde
         shape.control = valueOf(slider);
         shape.restWeight = numberOf(findPlug(std::string(slider.name().asChar()) + ".defaultValue"));
     }
-    const std::string lists = element("shapes", geometry) + ".shape";
-    const std::vector<unsigned> known = indicesOf(plugOf(node, lists));
-    if (std::find(known.begin(), known.end(), index) != known.end())
-        readDeltas(node, lists + "[" + std::to_string(index) + "]", vertices, shape.deltas);
+    shape.deltas = shapeDeltas(node, geometry, index, vertices);
     return shape;
 }
 
@@ -79,6 +76,15 @@ std::vector<SceneShapes> sceneShapes() {
             for (const unsigned geometry : indicesOf(plugOf(node, "input")))
                 addShapes(node, geometry, all);
     return all;
+}
+
+rig::ShapeDeltas shapeDeltas(const HObject& node, unsigned geometry, unsigned index, std::size_t vertices) {
+    rig::ShapeDeltas deltas;
+    const std::string lists = element("shapes", geometry) + ".shape";
+    const std::vector<unsigned> known = indicesOf(plugOf(node, lists));
+    if (std::find(known.begin(), known.end(), index) != known.end())
+        readDeltas(node, lists + "[" + std::to_string(index) + "]", vertices, deltas);
+    return deltas;
 }
 
 } // namespace quarn

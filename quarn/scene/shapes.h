@@ -2,6 +2,7 @@
 // The morph targets of a scene: geometries that a blendShape moves, each shape by a weight of its own.
 #pragma once
 
+#include "openquarn/HObject.h"
 #include "openquarn/HPlug.h"
 #include "rig/ShapeDeltas.h"
 
@@ -29,5 +30,9 @@ struct SceneShapes {
 /// Those whose weights are all there is to say of them, and that nothing else moves before: no combinations, and a
 /// plain mesh as input. Throws std::runtime_error, naming node and shape, for lists that are damaged. Thread: main.
 std::vector<SceneShapes> sceneShapes();
+
+/// What the shape `index` of a blendShape does to a geometry of `vertices` vertices; nothing where it has no lists.
+/// Throws the same. Thread: main.
+rig::ShapeDeltas shapeDeltas(const HObject& node, unsigned geometry, unsigned index, std::size_t vertices);
 
 } // namespace quarn
