@@ -1,0 +1,2 @@
+/** What went wrong, as a plain sentence for whoever looks at the page. */
+export class Failure extends Error {}

@@ -1,0 +1,45 @@
+// The scale of the heat map, and a pin at a vertex that is pointed at.
+import { Vector3 } from 'three';
+import { byId, make, say } from './elements.js';
+import { heatGradient } from './heat.js';
+import { digits, mm } from './format.js';
+
+export class Legend {
+  constructor(view) {
+    const range = view.manifest.errors?.rangeMm;
+    if (range) {
+      byId('legend-scale').style.background = heatGradient();
+      const numbers = [0, range / 2, range].map((value, i) => make('span', { text: i < 2 ? digits(value) : mm(value) }));
+      byId('legend-numbers').append(...numbers);
+    }
+    view.onDraw.push(() => this.#follow(view));
+  }
+
+  #follow(view) {
+    byId('legend').hidden = view.heat === 'off';
+    say(byId('legend-title'), view.hasErrors ? 'Distance to the target' : 'No colours: the target is known in the poses of the motion only');
+  }
+}
+
+export class Pin {
+  #point = new Vector3();
+
+  constructor(view, camera) {
+    this.view = view;
+    this.camera = camera;
+    view.onDraw.push(() => this.#follow());
+  }
+
+  #follow() {
+    const { pin, core, shapes } = this.view;
+    const element = byId('pin');
+    const points = pin >= 0 && shapes.length === 1 && core.points(shapes[0]);
+    element.hidden = !points;
+    if (!points) return;
+    this.#point.fromArray(points, 3 * pin).project(this.camera.three);
+    element.style.left = `${50 + 50 * this.#point.x}%`;
+    element.style.top = `${50 - 50 * this.#point.y}%`;
+    const errors = this.view.hasErrors && shapes[0] !== 'target' ? core.errors(shapes[0]) : null;
+    say(element.querySelector('span'), errors ? `vertex ${pin}, ${mm(errors[pin])}` : `vertex ${pin}`);
+  }
+}
