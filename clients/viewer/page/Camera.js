@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Where the character is seen from, with or without WebGL: a camera that orbits by mouse, touch or keys.
 import { PerspectiveCamera, Sphere, Vector3 } from 'three';
 import { OrbitControls } from 'three/addons/controls/OrbitControls.js';

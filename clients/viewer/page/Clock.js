@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Which frame it is: time that runs by the seconds, whatever a frame takes to draw.
 
 export class Clock {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The core of the page: WebAssembly of the same sources that quarn is built from. It imports nothing; what it gives are
 // pointers into its memory, of which views are made here and made again when the memory has grown.
 import { decode, decodedSize, decodeInto } from './base64.js';

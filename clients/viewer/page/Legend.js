@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The scale of the heat map, and a pin at a vertex that is pointed at.
 import { Vector3 } from 'three';
 import { byId, make, say } from './elements.js';

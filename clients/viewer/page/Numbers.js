@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The figures beside the picture: distances in this frame and over the motion, and what the model is.
 import { byId, make, say } from './elements.js';
 import { digits, meanAndMax, mm, percent, size } from './format.js';

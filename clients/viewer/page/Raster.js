@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Draws the character without WebGL: the core's own z-buffer, put on a plain canvas. Slower, and without textures.
 import { clayNumber } from './surface.js';
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The controls of the rig, grouped by joint, within their limits. Angles are shown in degrees and kept in radians.
 import { byId, make, say } from './elements.js';
 import { digits } from './format.js';

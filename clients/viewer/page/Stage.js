@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Draws the character with WebGL 2: up to two shapes side by side, of which each has its own arrays on the device.
 import {
   BufferAttribute, BufferGeometry, DynamicDrawUsage, LineBasicMaterial, LineSegments, Mesh, Scene, WebGLRenderer,

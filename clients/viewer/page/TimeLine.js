@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The time line: playing, stepping, a curve of the error over the frames, and the worst of them at a click.
 import { byId, make, press, say } from './elements.js';
 import { Clock } from './Clock.js';

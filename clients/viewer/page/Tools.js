@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The row of buttons above the picture, and the names and the line in it: which shape, which colours, A against B.
 import { byId, Choice, make, press, say } from './elements.js';
 import { percent } from './format.js';

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What is shown: the frame or a pose of the user's own, of which shapes, with which colours. It computes when it draws.
 
 export const modes = ['neural', 'skin', 'target', 'split', 'flip'];

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the page offers to whoever drives it from outside, a test for example: window.neuralWarp.
 
 /** Fills `page`, which has `ready` and `timings` already. */

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The blocks of the page: read from the document, summed, handed to the core, and forgotten.
 import { decode } from './base64.js';
 import { Failure } from './Failure.js';

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The edges of the polygons, each once, between draw vertices.
 
 /** `sizes`: corners of each polygon; `corners`: the draw vertex of each corner. Two numbers for each edge. */

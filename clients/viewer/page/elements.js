@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Short words for the document. Texts go in as texts, never as markup.
 
 export const byId = (id) => document.getElementById(id);

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How numbers are written.
 
 /** At most three digits that count, without an exponent down to a millionth: "0.0312", "1.2", "128". */

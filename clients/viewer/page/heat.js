@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The colours of a distance, the same as in the pictures of `quarn render`: light grey over yellow to red, sRGB, at 0,
 // 1/4 ... 1 of the range.
 export const heatStops = [

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What each key does, and the sheet that says so.
 import { byId, make } from './elements.js';
 import { modes } from './View.js';

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The page: reads what `quarn view` wrote into it, draws the first frame, then proves itself.
 import { offer } from './api.js';
 import { loadBlocks, readManifest, takeBytes } from './blocks.js';

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Textures of the page, made of its own bytes: nothing is loaded from an address.
 import { Color, RepeatWrapping, SRGBColorSpace, Texture } from 'three';
 import { takeBytes } from './blocks.js';

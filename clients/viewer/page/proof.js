@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The page proves itself: every block has the sum that the manifest says, and the stored frames, computed anew, have the
 // bits that quarn's own build of the core found.
 import { mm } from './format.js';

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How a surface looks: the lights of `quarn render` (quarn/render/lights.h), which stand with the camera, so that all views are lit
 // alike; or the colours of distances, each pixel the colour of its own. The z-buffer of the core looks the same.
 import { ShaderMaterial, Color, DoubleSide, Vector3 } from 'three';

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Light or dark: as the system says, until the user says otherwise.
 const system = matchMedia('(prefers-color-scheme: dark)');
 let chosen = null;
