@@ -18,6 +18,7 @@ public:
         for (const std::byte byte : bytes)
             value_ = (value_ ^ std::to_integer<std::uint64_t>(byte)) * 1099511628211U;
     }
+    std::uint64_t value() const { return value_; }
     /// 16 hexadecimal digits.
     std::string text() const {
         std::string digits(16, '0');

@@ -5,6 +5,7 @@
 #include "openquarn_helpers/guard.h"
 
 #include "rig/Inputs.h"
+#include "rig/jointMatrix.h"
 
 namespace rig {
 
@@ -69,21 +70,14 @@ HStatus jointNode::initialize() {
 
 namespace {
 
-HEulerRotation angles(const HVector& vector, HEulerRotation::RotationOrder order) {
-    return {vector.x, vector.y, vector.z, order};
-}
-
-/// S * R * JO * T.
 HMatrix localMatrix(Inputs& inputs) {
-    const HVector turn = inputs.vector(Node::rotateX, Node::rotateY, Node::rotateZ);
-    const HVector orient = inputs.vector(Node::jointOrientX, Node::jointOrientY, Node::jointOrientZ);
-    const HVector size = inputs.vector(Node::scaleX, Node::scaleY, Node::scaleZ);
-    HMatrix local = angles(turn, inputs.rotationOrder(Node::rotateOrder)).asMatrix() *
-                    angles(orient, HEulerRotation::kXYZ).asMatrix();
-    for (unsigned axis = 0; axis < 3; ++axis)
-        local.setRow(axis, local.row(axis) * size[axis]);
-    local.setRow(3, inputs.vector(Node::translateX, Node::translateY, Node::translateZ));
-    return local;
+    JointChannels channels;
+    channels.rotate = inputs.vector(Node::rotateX, Node::rotateY, Node::rotateZ);
+    channels.jointOrient = inputs.vector(Node::jointOrientX, Node::jointOrientY, Node::jointOrientZ);
+    channels.scale = inputs.vector(Node::scaleX, Node::scaleY, Node::scaleZ);
+    channels.order = inputs.rotationOrder(Node::rotateOrder);
+    channels.translate = inputs.vector(Node::translateX, Node::translateY, Node::translateZ);
+    return jointMatrix(channels);
 }
 
 HStatus toRelative(HMatrix& local, const HMatrix& rest) {
