@@ -2,7 +2,7 @@
 // What a page calls. Pointers are offsets into the memory, and hold until the next call; what is not there is 0. A call
 // that traps has kept its text, which nw_error() gives; a page is done then with this instance.
 #include "lastError.h"
-#include "viewer/Character.h"
+#include "openCharacter.h"
 
 #include <algorithm>
 #include <cmath>
@@ -31,15 +31,9 @@ Page& page() {
     return only;
 }
 
-viewer::Character* character() {
-    if (!page().character)
-        viewer::keepError("no character is open");
-    return page().character.get();
-}
-
 /// The one that is open, when it has this frame: what a page can ask for wrongly is answered, and does not trap.
 viewer::Character* characterWith(std::size_t frame) {
-    viewer::Character* const open = character();
+    viewer::Character* const open = viewer::openCharacter();
     if (!open || frame < open->frameCount())
         return open;
     viewer::keepError(("frame " + std::to_string(frame) + " is none of " + std::to_string(open->frameCount())).c_str());
@@ -56,7 +50,7 @@ bool areFinite(std::span<const double> values) {
 /// The array that `pick` gives of the character; null for an empty one.
 template <class Pick>
 const void* arrayOf(const Pick& pick) {
-    const viewer::Character* const open = character();
+    const viewer::Character* const open = viewer::openCharacter();
     return open && !pick(*open).empty() ? pick(*open).data() : nullptr;
 }
 
@@ -88,6 +82,12 @@ std::size_t countOf(const viewer::Character& open, std::uint32_t what) {
 }
 
 } // namespace
+
+viewer::Character* viewer::openCharacter() {
+    if (!page().character)
+        keepError("no character is open");
+    return page().character.get();
+}
 
 NW_EXPORT(nw_allocate) void* nw_allocate(std::size_t bytes) {
     return operator new(bytes);
@@ -121,7 +121,7 @@ NW_EXPORT(nw_error) const char* nw_error() {
 }
 
 NW_EXPORT(nw_count) std::size_t nw_count(std::uint32_t what) {
-    const viewer::Character* const open = character();
+    const viewer::Character* const open = viewer::openCharacter();
     return open ? countOf(*open, what) : 0;
 }
 
@@ -141,7 +141,7 @@ NW_EXPORT(nw_show_sliders) std::uint32_t nw_show_sliders(std::size_t frame, cons
 }
 
 NW_EXPORT(nw_set_envelope) void nw_set_envelope(float factor) {
-    viewer::Character* const open = character();
+    viewer::Character* const open = viewer::openCharacter();
     if (open && std::isfinite(factor))
         open->setEnvelope(factor);
 }
@@ -175,11 +175,11 @@ NW_EXPORT(nw_controls) const void* nw_controls() {
 }
 
 NW_EXPORT(nw_sum) std::uint64_t nw_sum() {
-    const viewer::Character* const open = character();
+    const viewer::Character* const open = viewer::openCharacter();
     return open ? open->sum() : 0;
 }
 
 NW_EXPORT(nw_check) std::uint32_t nw_check(std::size_t number) {
-    viewer::Character* const open = character();
+    viewer::Character* const open = viewer::openCharacter();
     return open && number < open->checkCount() && open->check(number) ? 1 : 0;
 }
