@@ -69,9 +69,9 @@ void Wire::skip(std::uint64_t length) {
     if (length > size_ - position_)
         throwTruncated();
     constexpr std::uint64_t readRather = 4096; // moving throws the buffer away
-    if (length >= readRather)
-        source_.pubseekoff(static_cast<std::streamoff>(length), std::ios::cur, std::ios::in);
-    for (std::uint64_t i = 0; length < readRather && i < length; ++i)
+    const bool hasMoved = length >= readRather && source_.pubseekoff(static_cast<std::streamoff>(length), std::ios::cur,
+                                                                     std::ios::in) != std::streampos(-1);
+    for (std::uint64_t i = 0; !hasMoved && i < length; ++i)
         source_.sbumpc();
     position_ += length;
 }

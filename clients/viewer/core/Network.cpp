@@ -18,7 +18,7 @@ constexpr std::size_t stepWords = 7;
 constexpr std::uint32_t knownVersion = 1;
 
 [[noreturn]] void refuse(const std::string& reason) {
-    throw std::runtime_error("the network of the page " + reason);
+    throw std::runtime_error("the block \"network.words\" " + reason);
 }
 
 /// Adds `rows` rows of `w`, each times its value of `a`, to `sums`. Eight rows at a time are summed in pairs and then
