@@ -15,7 +15,8 @@ const JsonValue& at(const JsonValue& document, const char* list, std::size_t ind
     return listOf(document, list)[static_cast<rapidjson::SizeType>(index)];
 }
 
-// "data:application/octet-stream;base64,..."
+} // namespace
+
 std::string dataOfUri(const std::string& uri, const std::string& owner) {
     constexpr std::string_view code = ";base64,";
     const std::size_t begin = uri.find(code);
@@ -26,8 +27,6 @@ std::string dataOfUri(const std::string& uri, const std::string& owner) {
         throw std::runtime_error(owner + " has a URI whose data are not base 64");
     return std::move(*bytes);
 }
-
-} // namespace
 
 GltfBytes::GltfBytes(const JsonValue& document, std::string_view binary, ReadUri readUri)
     : document_(document)

@@ -15,6 +15,10 @@ namespace quarn {
 /// reason.
 using ReadUri = std::function<std::string(const std::string& uri)>;
 
+/// The data of a URI that has them in itself, as "data:application/octet-stream;base64,...". Throws std::runtime_error,
+/// which begins with `owner`. Thread: any.
+std::string dataOfUri(const std::string& uri, const std::string& owner);
+
 /// Reads buffers when they are asked for, each once. Thread: one.
 class GltfBytes {
 public:

@@ -9,14 +9,6 @@
 
 namespace quarn {
 
-/// The file that a URI in the file `path` names: the one beside it of that name, as it is written or, when there is
-/// such a file, with "%20" and the like as the bytes that they stand for.
-std::string fileOfUri(const std::string& path, const std::string& uri);
-
-/// The bytes of that file, which is `what` of the file `path`, as "buffer". Throws std::runtime_error with the reason,
-/// which names both.
-std::string readBeside(const std::string& path, const std::string& uri, const std::string& what);
-
 /// The files of the importer: `path` has the given bytes, which must live as long; all others are those of
 /// the disk, as far as they are files and no pipes or devices.
 class ImportedFile : public Assimp::DefaultIOSystem {

@@ -3,6 +3,7 @@
 
 #include "quarn/character/animations.h"
 #include "quarn/character/controlPoints.h"
+#include "quarn/character/filesBeside.h"
 #include "quarn/character/importedFile.h"
 #include "quarn/character/importerLog.h"
 #include "quarn/character/prepareGltf.h"

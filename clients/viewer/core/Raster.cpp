@@ -19,6 +19,7 @@ constexpr std::int64_t subpixels = 256;
 constexpr double guard = 32768.0;
 constexpr double leastW = 1e-20;
 constexpr std::int64_t smallSide = 64 * subpixels; // edge functions of such triangles, and one step on, are below 2^31
+constexpr float half = 0.5F;                       // to be rounded
 using Values = std::array<float, 5>;
 
 constexpr unsigned planeCount = 6;
@@ -48,16 +49,15 @@ std::array<float, 3> turned(const std::array<float, 16>& view, const float* norm
 std::uint32_t packed(float red, float green, float blue) {
     const auto byte = [](float value) {
         const float kept = value > 0.0F ? std::min(value, 255.0F) : 0.0F;
-        return static_cast<std::uint32_t>(static_cast<std::int32_t>(kept + 0.5F));
+        return static_cast<std::uint32_t>(static_cast<std::int32_t>(kept + half));
     };
     return byte(red) | byte(green) << 8U | byte(blue) << 16U | 0xFF000000U;
 }
 
-// rounded to the nearest; casts cut off, so what they get is above 0
+// to the nearest: casts cut off, so what they get is made positive
 std::int64_t subpixelOf(float pixel) {
-    constexpr double shift = 4.0 * guard * subpixels;
-    return static_cast<std::int64_t>(static_cast<double>(pixel) * subpixels + shift + 0.5) -
-           static_cast<std::int64_t>(shift);
+    constexpr double shift = 4.0 * guard * subpixels + half;
+    return static_cast<std::int64_t>(static_cast<double>(pixel) * subpixels + shift) - static_cast<std::int64_t>(shift);
 }
 
 // the first and the last pixel whose middle is not before, or behind, a place
@@ -200,7 +200,7 @@ Raster::Vertex Raster::corner(std::size_t vertex, bool isBack) {
 
 // How far inside of a plane, times something above 0. In double precision, as what is cut may be very large.
 double Raster::inside(const Vertex& vertex, unsigned plane) const {
-    const double w = static_cast<double>(vertex.w);
+    const auto w = static_cast<double>(vertex.w);
     const double sideways = 2.0 * guard / static_cast<double>(plane < 4 ? frame_.width : frame_.height) * w;
     switch (plane) {
     case 0:
