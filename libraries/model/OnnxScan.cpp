@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "OnnxScan.h"
 
+#include "Wire.h"
 #include "storage/Json.h"
 
 #include <algorithm>
@@ -17,8 +18,8 @@ namespace {
 
 // what a file may ask for: decision 0118
 constexpr std::uint64_t unbounded = std::numeric_limits<std::uint64_t>::max();
-constexpr int deepest = 100;               // as deep as the runtime reads
-constexpr std::uint64_t longestName = 512; // of what is kept to compare: the longest that matters is "Constant"
+constexpr int deepest = 100; // as deep as the runtime reads
+constexpr std::uint64_t longestName = Wire::longestText;
 
 /// The kinds of message of onnx.proto that are looked into; field numbers are those of that file.
 enum class Kind { none, model, graph, node, attribute, tensor, sparseTensor, function, training, valueInfo, entry };
@@ -86,70 +87,6 @@ void checkConfig(const std::string& text) {
         checkThreadCount(std::string(storage::viewOf(option.name)), option.value);
 }
 
-/// The wire format of protocol buffers.
-class Wire {
-public:
-    Wire(std::streambuf& source, std::uint64_t size)
-        : source_(source)
-        , size_(size) {}
-
-    std::uint64_t position() const { return position_; }
-    std::uint64_t size() const { return size_; }
-
-    std::uint64_t varint() {
-        std::uint64_t value = 0;
-        for (unsigned shift = 0; shift < 70; shift += 7) {
-            const std::uint64_t byte = next();
-            if (shift < 64)
-                value |= (byte & 127U) << shift;
-            if (byte < 128)
-                return value;
-        }
-        throw std::runtime_error("the file is damaged: a number in it has no end");
-    }
-    /// The low bytes first.
-    std::uint64_t fixed(std::uint64_t bytes) {
-        std::uint64_t value = 0;
-        for (std::uint64_t i = 0; i < bytes; ++i)
-            value |= std::uint64_t{next()} << (8 * i);
-        return value;
-    }
-    std::string text(std::uint64_t length) {
-        std::string bytes(static_cast<std::size_t>(std::min(length, longestName)), '\0');
-        for (char& byte : bytes)
-            byte = static_cast<char>(next());
-        skip(length - bytes.size());
-        return bytes;
-    }
-    void skip(std::uint64_t length) {
-        if (length > size_ - position_)
-            throwTruncated();
-        constexpr std::uint64_t readRather = 4096; // moving throws the buffer away
-        if (length >= readRather)
-            source_.pubseekoff(static_cast<std::streamoff>(length), std::ios::cur, std::ios::in);
-        for (std::uint64_t i = 0; length < readRather && i < length; ++i)
-            source_.sbumpc();
-        position_ += length;
-    }
-    [[noreturn]] static void throwTruncated() {
-        throw std::runtime_error("the file is damaged: it ends in the middle of a part");
-    }
-
-private:
-    std::uint8_t next() {
-        const auto byte = position_ < size_ ? source_.sbumpc() : Traits::eof();
-        if (Traits::eq_int_type(byte, Traits::eof()))
-            throwTruncated();
-        ++position_;
-        return static_cast<std::uint8_t>(Traits::to_char_type(byte));
-    }
-    using Traits = std::streambuf::traits_type;
-
-    std::streambuf& source_;
-    std::uint64_t position_ = 0;
-    std::uint64_t size_;
-};
-
 /// What is remembered of the message that is being read, for those in which it matters.
 struct Seen {
     std::string name;                 ///< of a tensor or a value; the operator of a node
@@ -185,28 +122,14 @@ private:
     }
 
     void field(Kind kind, std::uint64_t end, int depth, Seen& seen) {
-        const std::uint64_t key = wire_.varint();
-        if (key > std::numeric_limits<std::uint32_t>::max()) // the runtime would drop what is beyond, and see another
-            throw std::runtime_error("the file is damaged: a field in it has no number");
-        const std::uint64_t number = key >> 3U;
-        switch (key & 7U) {
-        case 0:
-            return integer(kind, number, wire_.varint(), seen);
-        case 1:
-            return wire_.skip(8);
-        case 5:
-            return wire_.skip(4);
-        case 2:
-            break;
-        default:
-            throw std::runtime_error("the file is damaged, or no ONNX file");
-        }
-        const std::uint64_t length = wire_.varint();
-        if (length > end - std::min(end, wire_.position()))
-            Wire::throwTruncated();
+        const auto [number, form, value] = wire_.field(end);
+        if (form == Wire::Form::varint)
+            return integer(kind, number, value, seen);
+        if (form != Wire::Form::bytes)
+            return;
         if (const Kind inner = kindOfField(kind, number); inner != Kind::none)
-            return part(kind, inner, wire_.position() + length, depth, seen);
-        bytes(kind, number, length, seen);
+            return part(kind, inner, wire_.position() + value, depth, seen);
+        bytes(kind, number, value, seen);
     }
 
     void integer(Kind kind, std::uint64_t number, std::uint64_t value, Seen& seen) {

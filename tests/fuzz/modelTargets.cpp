@@ -16,6 +16,7 @@
 #include <unistd.h>
 
 #include "nw_model/ModelSession.h"
+#include "nw_model/OnnxGraph.h"
 #include "nw_model/PrincipalBasisFiles.h"
 #include "readers.h"
 #include "require.h"
@@ -98,6 +99,21 @@ void checkCertificate(std::string_view text) {
     }
 }
 
+// what is read of a network's graph is whole, and is of the network that the runtime has loaded
+void checkGraph(const std::uint8_t* data, std::size_t size, const ModelSession& session) {
+    try {
+        MemoryBuffer source(data, size);
+        const OnnxGraph graph = readOnnxGraph(source, size);
+        require(!session.isLoaded() || graph.inputCount == static_cast<std::size_t>(session.inputCount()));
+        std::size_t values = 0;
+        for (const OnnxConstant& constant : graph.constants)
+            values += constant.flaw.empty() ? constant.values.size() : 0;
+        require(values <= size); // each takes four bytes at least
+    } catch (const std::runtime_error&) {
+        return; // refused
+    }
+}
+
 } // namespace
 
 bool fuzzMetadata(const std::uint8_t* data, std::size_t size) {
@@ -150,5 +166,6 @@ bool fuzzOnnxLoad(const std::uint8_t* data, std::size_t size) {
     const std::vector<float> outputs = session.run(std::vector<float>(inputCount));
     require(outputs.empty() == !session.errorText().empty());
     require(accepted || outputs.empty());
+    checkGraph(data, size, session);
     return accepted;
 }

@@ -4,11 +4,7 @@
 #include "checks.h"
 #include "frame/blend.h"
 #include "readBasis.h"
-#if __has_include("viewer/Network.h")
 #include "viewer/Network.h"
-#else
-#include "networkStandIn.h"
-#endif
 
 #include <stdexcept>
 #include <string>
