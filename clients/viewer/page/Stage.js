@@ -12,10 +12,17 @@ export class Stage {
   #sides = [];
   #pictures = null; // materials with textures, and the parts of the mesh that have them
 
-  constructor(core, camera) {
+  /** Null where the browser has no WebGL 2. */
+  static make(core, camera) {
+    const canvas = document.createElement('canvas');
+    const context = canvas.getContext('webgl2', { alpha: true, antialias: true, depth: true, powerPreference: 'high-performance' });
+    return context && new Stage(core, camera, canvas, context);
+  }
+
+  constructor(core, camera, canvas, context) {
     this.#core = core;
     this.camera = camera;
-    this.renderer = new WebGLRenderer({ antialias: true, alpha: true });
+    this.renderer = new WebGLRenderer({ canvas, context });
     this.renderer.autoClear = false;
     this.renderer.setScissorTest(true);
     this.element = this.renderer.domElement;

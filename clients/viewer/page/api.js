@@ -17,6 +17,7 @@ export function offer(page, { manifest, core, view, stage, sliders, timeLine }) 
     setMode: (mode) => view.setMode(mode),
     setHeat: (heat) => view.setHeat(heat),
     setSplit: (part) => view.setSplit(part),
+    setTextures: (isOn) => view.set({ hasTextures: Boolean(isOn) }),
     setEnvelope: (factor) => view.setEnvelope(factor),
     draw: () => view.draw(),
     memory: () => ({ wasmBytes: core.memory.buffer.byteLength, ...stage.memory }),

@@ -82,12 +82,7 @@ function makePicture(core, manifest) {
 
 // the z-buffer of the core where there is no WebGL 2, or where it is asked for
 function makeStage(core, camera) {
-  if (location.hash === '#raster') return new Raster(core, camera);
-  try {
-    return new Stage(core, camera);
-  } catch {
-    return new Raster(core, camera);
-  }
+  return (location.hash === '#raster' ? null : Stage.make(core, camera)) ?? new Raster(core, camera);
 }
 
 function makePanels(parts) {
