@@ -9,6 +9,7 @@ const fronts = {
   z: [new Vector3(1, 0, 0), new Vector3(0, 0, 1), new Vector3(0, -1, 0)],
   x: [new Vector3(0, -1, 0), new Vector3(1, 0, 0), new Vector3(0, 0, 1)],
 };
+const margin = 1.06;
 const steepest = 89.9; // degrees: above the pole there is no up
 
 export class Camera {
@@ -27,16 +28,15 @@ export class Camera {
     this.sphere = new Sphere(new Vector3(), 1);
   }
 
-  /** Turns to a sphere around `points`, [3n]; the direction is kept but for the first time. */
+  /** Goes as near as `points`, [3n], can be seen whole; the direction is kept. */
   fit(points) {
-    sphereAround(points, this.sphere);
-    const { center, radius } = this.sphere;
-    const direction = this.isPlaced ? this.three.position.clone().sub(this.orbit.target).normalize() : this.direction;
+    const { center } = measure(points, this.sphere);
+    if (this.isPlaced) this.direction.subVectors(this.three.position, this.orbit.target).normalize();
     this.isPlaced = true;
     this.orbit.target.copy(center);
-    this.three.position.copy(center).addScaledVector(direction, radius / Math.sin(this.#narrowHalfAngle()) * 1.02);
-    this.orbit.minDistance = 0.05 * radius;
-    this.orbit.maxDistance = 40 * radius;
+    this.three.position.copy(center).addScaledVector(this.direction, this.#distanceTo(points) * margin);
+    this.orbit.minDistance = 0.05 * this.sphere.radius;
+    this.orbit.maxDistance = 40 * this.sphere.radius;
     this.orbit.update();
   }
 
@@ -60,15 +60,35 @@ export class Camera {
     this.orbit.update();
   }
 
-  #narrowHalfAngle() {
-    const upright = radians(this.three.fov / 2);
-    return this.three.aspect >= 1 ? upright : Math.atan(Math.tan(upright) * this.three.aspect);
+  // how far from the middle a viewer must be, whose picture the points fit into
+  #distanceTo(points) {
+    const right = new Vector3().crossVectors(this.three.up, this.direction).normalize();
+    const up = new Vector3().crossVectors(this.direction, right);
+    const upright = Math.tan(radians(this.three.fov / 2));
+    const across = upright * this.three.aspect;
+    const point = new Vector3();
+    let distance = 0;
+    for (let i = 0; i < points.length; i += 3) {
+      point.fromArray(points, i).sub(this.sphere.center);
+      const aside = Math.max(Math.abs(point.dot(right)) / across, Math.abs(point.dot(up)) / upright);
+      distance = Math.max(distance, point.dot(this.direction) + aside);
+    }
+    return distance || 1;
   }
 }
 
 const radians = (degrees) => (degrees * Math.PI) / 180;
 
-function sphereAround(points, sphere) {
+// the middle of the points' box, and how far the box reaches from it
+function measure(points, sphere) {
+  const [least, most] = boxOf(points);
+  sphere.center.addVectors(least, most).multiplyScalar(0.5);
+  sphere.radius = sphere.center.distanceTo(most) || 1;
+  return sphere;
+}
+
+/** Least and most of the coordinates of points, [3n]. */
+export function boxOf(points) {
   const least = new Vector3(Infinity, Infinity, Infinity);
   const most = new Vector3(-Infinity, -Infinity, -Infinity);
   const point = new Vector3();
@@ -77,9 +97,12 @@ function sphereAround(points, sphere) {
     least.min(point);
     most.max(point);
   }
-  sphere.center.addVectors(least, most).multiplyScalar(0.5);
-  let farthest = 0;
-  for (let i = 0; i < points.length; i += 3)
-    farthest = Math.max(farthest, point.fromArray(points, i).distanceToSquared(sphere.center));
-  sphere.radius = Math.sqrt(farthest) || 1;
+  return [least, most];
+}
+
+/** The eight corners of a box, [24]. */
+export function cornersOf(least, most) {
+  const corners = [];
+  for (const x of [least.x, most.x]) for (const y of [least.y, most.y]) for (const z of [least.z, most.z]) corners.push(x, y, z);
+  return corners;
 }

@@ -135,22 +135,22 @@ export class Core {
 
   // a call that answers 1, or 0 and a text
   #ask(call) {
-    if (this.#guarded(call) !== 1) throw new Failure(this.#errorText());
+    if (this.#guarded(call) !== 1) throw new Failure(this.#errorText() || 'The core refuses this without a word.');
   }
 
+  // what the core throws ends it, with its text left behind
   #guarded(call) {
     try {
       return call();
     } catch (error) {
-      if (error instanceof WebAssembly.RuntimeError)
-        throw new Failure(`The core had to stop (${error.message}); reload the page to begin anew.`);
-      throw error;
+      if (!(error instanceof WebAssembly.RuntimeError)) throw error;
+      throw new Failure(this.#errorText() || `The core had to stop (${error.message}); reload the page to begin anew.`);
     }
   }
 
   #errorText() {
     const bytes = new Uint8Array(this.memory.buffer, this.#exports.nw_error());
-    return new TextDecoder().decode(bytes.subarray(0, bytes.indexOf(0))) || 'The core refuses this without a word.';
+    return new TextDecoder().decode(bytes.subarray(0, bytes.indexOf(0)));
   }
 }
 

@@ -1,8 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // The page: reads what `quarn view` wrote into it, draws the first frame, then proves itself.
+import { Vector3 } from 'three';
 import { offer } from './api.js';
 import { loadBlocks, readManifest, takeBytes } from './blocks.js';
-import { Camera } from './Camera.js';
+import { boxOf, Camera, cornersOf } from './Camera.js';
 import { Core } from './Core.js';
 import { edgesOf } from './edges.js';
 import { byId, make, say } from './elements.js';
@@ -71,13 +72,25 @@ function makePicture(core, manifest) {
   };
   byId('time').hidden = core.count.frames < 1; // has its height before the picture has
   fill();
-  view.compute();
-  camera.fit(core.points('neural'));
+  camera.fit(reachOf(core));
   new ResizeObserver(() => {
     fill();
     view.draw();
   }).observe(byId('stage'));
   return { view, camera, stage };
+}
+
+// the corners of a box around some frames of the motion
+function reachOf(core) {
+  const { frames } = core.count;
+  const [least, most] = [new Vector3(Infinity, Infinity, Infinity), new Vector3(-Infinity, -Infinity, -Infinity)];
+  for (let i = 0; i < 6; ++i) {
+    core.showFrame(Math.round((i * (frames - 1)) / 5));
+    const [from, to] = boxOf(core.points('neural'));
+    least.min(from);
+    most.max(to);
+  }
+  return cornersOf(least, most);
 }
 
 // the z-buffer of the core where there is no WebGL 2, or where it is asked for
