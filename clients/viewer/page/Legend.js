@@ -7,11 +7,12 @@ import { digits, mm } from './format.js';
 
 export class Legend {
   constructor(view) {
-    const range = view.manifest.errors?.rangeMm;
-    if (range) {
+    const { errors } = view.manifest;
+    if (errors) {
+      const range = errors.rangeMm;
+      const most = Math.max(errors.before.maxMm, errors.after.maxMm) > range ? `≥ ${mm(range)}` : mm(range);
       byId('legend-scale').style.background = heatGradient();
-      const numbers = [0, range / 2, range].map((value, i) => make('span', { text: i < 2 ? digits(value) : mm(value) }));
-      byId('legend-numbers').append(...numbers);
+      byId('legend-numbers').append(...['0', digits(range / 2), most].map((text) => make('span', { text })));
     }
     view.onDraw.push(() => this.#follow(view));
   }
