@@ -9,6 +9,7 @@ Motion::Motion(const Blocks& blocks, const Settings& settings)
     : frameCount_(settings.frames)
     , controls_(heldArrayOf<float>(blocks, "frames.controls", product({settings.frames, settings.controls}))) {
     constexpr std::size_t affine = 12;
+    checkFinite("frames.controls", controls_.values);
     if (settings.takesPoints)
         points_ = heldArrayOf<float>(blocks, "frames.points", product({settings.frames, settings.vertices, 3}));
     else

@@ -54,11 +54,13 @@ Rig::Rig(const Blocks& blocks, const Settings& settings) {
         return;
     readJoints(blocks, settings);
     values_ = heldArrayOf<double>(blocks, "rig.values", settings.freeValues);
+    checkFinite("rig.values", values_.values);
     freeValues_.resize(settings.freeValues);
     sliders_ = readPlaces(blocks, "rig.sliders", settings.sliders);
     if (blocks.has("rig.animated")) {
         animated_ = readPlaces(blocks, "rig.animated", blocks.array<std::uint32_t>("rig.animated").size() / 2);
         frames_ = heldArrayOf<double>(blocks, "frames.animated", product({settings.frames, animated_.size()}));
+        checkFinite("frames.animated", frames_.values);
     }
     readConverters(blocks, settings);
     readControls(blocks, settings);
@@ -72,6 +74,9 @@ void Rig::readJoints(const Blocks& blocks, const Settings& settings) {
     const auto rests = arrayOf<double>(blocks, "rig.rest", product({16, settings.joints}));
     const auto spaces = arrayOf<double>(blocks, "rig.space", product({16, settings.joints}));
     channels_ = heldArrayOf<double>(blocks, "rig.channels", product({channelCount, settings.joints}));
+    checkFinite("rig.rest", rests);
+    checkFinite("rig.space", spaces);
+    checkFinite("rig.channels", channels_.values);
     checkBelow("rig.orders", orders, HEulerRotation::kZYX + 1, "rotation orders");
     joints_.resize(settings.joints);
     hasRest_.resize(settings.joints);
@@ -116,6 +121,7 @@ void Rig::readControls(const Blocks& blocks, const Settings& settings) {
     const auto words = arrayOf<std::uint32_t>(blocks, "rig.controls", product({width, settings.controls}));
     const auto constants =
         blocks.has("rig.constants") ? blocks.array<double>("rig.constants") : std::span<const double>();
+    checkFinite("rig.constants", constants);
     for (std::size_t i = 0; i < settings.controls; ++i)
         controls_.push_back(readControl(words.subspan(width * i, width), constants));
 }

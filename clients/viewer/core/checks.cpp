@@ -6,6 +6,16 @@
 #include <stdexcept>
 
 namespace viewer {
+namespace {
+
+template <class T>
+void checkAllFinite(std::string_view block, std::span<const T> values) {
+    for (std::size_t i = 0; i < values.size(); ++i)
+        if (!std::isfinite(values[i]))
+            refuse(block, "number " + std::to_string(i) + " is not finite");
+}
+
+} // namespace
 
 void refuse(std::string_view block, const std::string& what) {
     throw std::runtime_error("the block \"" + std::string(block) + "\": " + what);
@@ -41,9 +51,11 @@ void checkBelow(std::string_view block, std::span<const std::uint32_t> indices, 
 }
 
 void checkFinite(std::string_view block, std::span<const double> values) {
-    for (std::size_t i = 0; i < values.size(); ++i)
-        if (!std::isfinite(values[i]))
-            refuse(block, "number " + std::to_string(i) + " is not finite");
+    checkAllFinite(block, values);
+}
+
+void checkFinite(std::string_view block, std::span<const float> values) {
+    checkAllFinite(block, values);
 }
 
 } // namespace viewer

@@ -28,6 +28,7 @@ void checkCount(std::string_view block, std::size_t has, std::uint64_t needed);
 void checkBelow(std::string_view block, std::span<const std::uint32_t> indices, std::size_t end, const char* what);
 /// Refuses the first number that is infinite or none.
 void checkFinite(std::string_view block, std::span<const double> values);
+void checkFinite(std::string_view block, std::span<const float> values);
 
 /// The numbers of a block, which have to be `count`.
 template <class T>
