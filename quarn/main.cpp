@@ -16,6 +16,7 @@
 #include "quarn/process/ownVariable.h"
 #include "quarn/render/commands.h"
 #include "quarn/run/commands.h"
+#include "quarn/view/commands.h"
 
 #include <CLI/CLI.hpp>
 
@@ -73,6 +74,7 @@ int run(int argc, char** argv) {
     quarn::addPoseCommand(app);
     quarn::addTargetCommand(app);
     quarn::addRenderCommand(app);
+    quarn::addViewCommand(app);
     quarn::addRunCommand(app, targetCommand);
 
     quarn::LogOptions log;

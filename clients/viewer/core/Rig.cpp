@@ -197,7 +197,9 @@ void Rig::readWeights(const Blocks& blocks, const Settings& settings) {
             checkIndex("rig.weights", "free value", values[i], freeValues_.size());
         } else {
             const auto of = factors.subspan(first, count);
-            const auto through = ramps.empty() ? ramps : ramps.subspan(3 * first, 3 * count);
+            const auto all = ramps.empty() ? ramps : ramps.subspan(3 * first, 3 * count);
+            const bool hasRamps = std::any_of(all.begin(), all.end(), [](double place) { return place != 0.0; });
+            const auto through = all.first(hasRamps ? all.size() : 0);
             combined_.push_back({i, {of.begin(), of.end()}, {through.begin(), through.end()}});
         }
         first += count;
