@@ -17,7 +17,7 @@ import tempfile
 import time
 from pathlib import Path
 from types import TracebackType
-from typing import Any, Optional, Type
+from typing import Any, Callable, Optional, Type
 
 DEADLINE = 60.0  # seconds that one answer may take; no test is judged by it
 
@@ -190,9 +190,10 @@ class Page:
             " for (const byte of new Uint8Array(array.buffer, array.byteOffset, array.byteLength))"
             " text += String.fromCharCode(byte); return btoa(text); })()"))
 
-    def wait_for(self, condition: str) -> None:
+    def wait_for(self, condition: "str | Callable[[], bool]") -> None:
+        """Until it holds: an expression of JavaScript, or a function, which sees what the page has told meanwhile."""
         until = time.monotonic() + self.browser.deadline
-        while not self.evaluate(condition):
+        while not (self.evaluate(condition) if isinstance(condition, str) else self.evaluate("0") or condition()):
             if time.monotonic() > until:
                 raise self.browser.failure(f"it never came to this: {condition}")
             time.sleep(0.02)

@@ -53,9 +53,10 @@ def network() -> bytes:
 
 
 def texture() -> bytes:
-    """Red towards the shoulder, green towards the hand."""
+    """Red towards the shoulder, green towards the hand; blue on the side that is away from the viewer at first."""
     picture = Image.new("RGB", (8, 8), (200, 30, 30))
-    picture.paste((30, 170, 40), (4, 0, 8, 8))
+    picture.paste((30, 170, 40), (4, 0, 8, 4))
+    picture.paste((30, 40, 200), (0, 4, 8, 8))
     file = io.BytesIO()
     picture.save(file, "PNG")
     return file.getvalue()

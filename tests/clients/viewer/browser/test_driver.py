@@ -35,11 +35,10 @@ class DriverTest(unittest.TestCase):
 
     def test_sees_requests_complaints_keys_pixels_and_memory(self) -> None:
         page = self.browser.open(self.file, width=64, height=48)
-        page.wait_for("window.performance.now() > 100")
-        for wanted in (self.file.as_uri(), "beside.png", "ws://127.0.0.1:9/socket", "of-a-fetch"):
-            self.assertTrue([url for url in page.requests if wanted in url], f"{wanted} in {page.requests}")
-        for wanted in ("thrown later", "refused.css"):
-            self.assertTrue([said for said in page.complaints if wanted in said], f"{wanted} in {page.complaints}")
+        requests = (self.file.as_uri(), "beside.png", "ws://127.0.0.1:9/socket", "of-a-fetch")
+        page.wait_for(lambda: all(any(wanted in url for url in page.requests) for wanted in requests))
+        complaints = ("thrown later", "refused.css")
+        page.wait_for(lambda: all(any(wanted in said for said in page.complaints) for wanted in complaints))
         for key, code in (("ArrowLeft", "ArrowLeft"), ("h", "KeyH"), (" ", "Space")):
             page.press(key)
             self.assertEqual(page.evaluate("window.pressed"), [key, code])
@@ -55,10 +54,10 @@ class DriverTest(unittest.TestCase):
     def test_waits_for_nothing_and_leaves_nothing(self) -> None:
         page = self.browser.open(self.file)
         self.browser.deadline = 1
+        with self.assertRaises(BrowserError):
+            page.wait_for("false")
         with self.assertRaisesRegex(BrowserError, "Runtime.evaluate: no answer within 1 s"):
             page.evaluate("(() => { for (;;); })()")
-        with self.assertRaisesRegex(BrowserError, "it never came to this: false"):
-            self.browser.open(self.file).wait_for("false")
         self.browser.close()
         self.assertIsNotNone(self.browser.process.returncode)
         self.assertFalse(self.browser.folder.exists())

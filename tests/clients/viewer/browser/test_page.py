@@ -94,8 +94,7 @@ def manifest_of(text: str) -> Any:
 
 
 def flipped(content: bytearray) -> bytes:
-    content[-1] ^= 1
-    return bytes(content)
+    return bytes(content[:-1]) + bytes([content[-1] ^ 1])
 
 
 class OpeningTest(PageTest):
@@ -109,7 +108,7 @@ class OpeningTest(PageTest):
         policy = page.evaluate("document.querySelector('meta[http-equiv=Content-Security-Policy]').content")
         self.assertIn("default-src 'none'", policy)
         page.evaluate("fetch('http://neuralwarp.invalid/').catch(() => 0)")
-        self.assertTrue([said for said in page.complaints if "Content Security Policy" in said], page.complaints)
+        page.wait_for(lambda: any("Content Security Policy" in said for said in page.complaints))
 
     def test_shows_names_as_they_are_and_runs_none(self) -> None:
         page = self.ready()
@@ -182,7 +181,8 @@ class SameTest(PageTest):
         manifest = page.evaluate("neuralWarp.manifest")
         mm = manifest["mmPerUnit"]
         played = {"neural": (Made.arm.play(), manifest["difference"]["largestMm"]),
-                  "skin": (Made.arm.play("--plug", "arm_skin.outputGeom[0]"), 1e-9),
+                  # of which quarn's has other roundings, of a single precision's last bit
+                  "skin": (Made.arm.play("--plug", "arm_skin.outputGeom[0]"), 2e-7 * manifest["diagonalMm"]),
                   "target": (Made.arm.play("--plug", "arm_target.outMesh"), manifest["targetErrorMm"])}
         self.assertLess(manifest["difference"]["largestMm"], 1e-6 * manifest["diagonalMm"])
         for frame in range(FRAMES):
@@ -249,7 +249,7 @@ class ProofTest(PageTest):
         self.assertIn("basis.values", verdict["text"])
 
     def test_finds_a_bit_in_every_block(self) -> None:
-        names = [block["name"] for block in manifest_of(Made.page.read_text())["blocks"]]
+        names = [block["name"] for block in manifest_of(Made.page.read_text())["blocks"] if block["bytes"]]
         self.assertGreater(len(names), 30)
 
         def spoilt(text: str) -> str:
@@ -279,11 +279,12 @@ class ProofTest(PageTest):
                    "a block that is not there": text.replace('id="block-skin.points"', 'id="block-skin.pints"'),
                    "cut off": text[:text.index('id="block-skin.weights"') + 200]}
         for what, damaged in damages.items():
-            page = self.open(self.changed(lambda _, damaged=damaged: damaged))  # type: ignore[misc]
+            Made.page.with_name("damaged.html").write_text(damaged)
+            page = self.open(Made.page.with_name("damaged.html"))
             page.evaluate("window.neuralWarp?.ready")
             shown = page.evaluate("document.body.innerText")
             self.assertRegex(shown, r"(?i)(block|file|page)[^.]*\b(damaged|incomplete|missing|cut|not there)\b", what)
-            self.assertGreater(len(np.unique(seen(page).reshape(-1, 3), axis=0)), 5, what)
+            self.assertGreater(seen(page).std(), 5, what)
 
 
 def fnv64(content: bytes) -> str:
@@ -300,8 +301,10 @@ class DrawingTest(PageTest):
         self.assertEqual(page.evaluate("neuralWarp.renderer"), "webgl2")
         plain = drawn(page)
         self.look_at(plain)
-        red, green = plain[..., 0] - plain[..., 1] > 60, plain[..., 1] - plain[..., 0] > 60
+        red, green, blue = ((np.argmax(plain[..., :3], axis=2) == colour) & (np.ptp(plain[..., :3], axis=2) > 60)
+                            for colour in range(3))
         self.assertGreater(min(red.mean(), green.mean()), 0.005, "the texture is not seen")
+        self.assertLess(blue.mean(), min(red.mean(), green.mean()), "the texture is upside down")
         self.assertGreater(seen(page).std(), 5)
         light = seen(page).mean()
         self.assertGreater(light - seen(self.ready(dark=True)).mean(), 60)
@@ -309,7 +312,7 @@ class DrawingTest(PageTest):
     def look_at(self, picture: np.ndarray) -> None:
         """The subject is large enough, in the middle, and shaded."""
         subject = silhouette(picture)
-        self.assertTrue(0.03 < subject.mean() < 0.8, f"{subject.mean():.1%} of the picture")
+        self.assertTrue(0.02 < subject.mean() < 0.8, f"{subject.mean():.1%} of the picture")
         rows, columns = np.nonzero(subject)
         for place, size in ((rows, subject.shape[0]), (columns, subject.shape[1])):
             self.assertTrue(0.3 * size < (place.min() + place.max()) / 2 < 0.7 * size, f"from {place.min()} on")
@@ -318,8 +321,9 @@ class DrawingTest(PageTest):
 
     def test_modes_and_heat(self) -> None:
         for address in ("", "#raster"):
-            page = self.ready(Made.page.as_uri() + address, width=700, height=500)
-            page.evaluate("(neuralWarp.showFrame(4), 0)")
+            page = self.ready(Made.page.as_uri() + address, width=1000, height=700)
+            page.evaluate("(neuralWarp.showFrame(4), neuralWarp.draw(), 0)")
+            page.press("a")  # fits it into the picture
             pictures = {}
             for mode in ("skin", "target", "neural"):
                 page.evaluate(f"(neuralWarp.setMode('{mode}'), 0)")
@@ -344,6 +348,7 @@ class DrawingTest(PageTest):
         webgl = self.ready(width=700, height=500)
         none = "HTMLCanvasElement.prototype.getContext = ((of) => function (kind, ...more) { return" \
                " /webgl/.test(kind) ? null : of.call(this, kind, ...more); })(HTMLCanvasElement.prototype.getContext)"
+        webgl.evaluate("(neuralWarp.setTextures(false), 0)")  # which the processor does not draw
         pictures = [drawn(webgl)]
         for how in ({"file": Made.page.as_uri() + "#raster"}, {"script": none}):
             page = self.ready(width=700, height=500, **how)
