@@ -28,9 +28,9 @@ export function decodePlainly(text, target) {
   let seen = 0; // all values: 255 among them sets the highest bits
   for (let from = 0, to = 0; to < target.length; from += 4) {
     for (let i = 0; i < 4; ++i) {
-      const isPadding = to + i > target.length; // the first digits of the last group are none
+      const isPadding = to + i > target.length; // as decodedSize has counted it
       const code = text.charCodeAt(from + i);
-      const value = isPadding ? (code === 61 ? 0 : 255) : code < 128 ? valueOf[code] : 255;
+      const value = isPadding ? 0 : code < 128 ? valueOf[code] : 255;
       seen |= value;
       bits = (bits << 6) | value;
     }

@@ -54,7 +54,7 @@ function openCore(core, damaged) {
   } catch (error) {
     if (!(error instanceof Failure)) throw error;
     page.verdict = noVerdict(damaged, error.message);
-    throw new Failure(damaged.length ? `This page is damaged: ${page.verdict.text}` : error.message);
+    throw new Failure(page.verdict.text);
   }
 }
 
@@ -186,8 +186,9 @@ function sentenceOf(error) {
 function fail(error) {
   console.error(error);
   const sentence = sentenceOf(error);
-  page.verdict ??= noVerdict([], sentence);
+  page.verdict ??= { ...noVerdict([], ''), native: sentence, text: sentence };
   page.error = sentence;
+  document.body.dataset.failed = '';
   byId('stage').append(make('p', { className: 'failure', text: sentence }));
   byId('seal').dataset.state = byId('same-native').dataset.state = 'bad';
   say(byId('seal'), 'Not shown');

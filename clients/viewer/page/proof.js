@@ -15,7 +15,8 @@ export function verdictOf(core, manifest, damagedBlocks) {
 
 /** For a page whose core cannot open what is there. */
 export function noVerdict(damagedBlocks, reason) {
-  const text = damagedBlocks.length ? `${damage(damagedBlocks)} ${reason}` : reason;
+  const text = damagedBlocks.length ? `This page is damaged: ${damage(damagedBlocks)} The core says: ${reason}`
+    : `This page cannot be shown: ${reason}`;
   return { same: false, checks: [], damagedBlocks, native: text, deformer: '', text };
 }
 
