@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/view/proof.h"
 
+#include "quarn/console/interrupt.h"
+
 #include <cmath>
 #include <set>
 
@@ -22,20 +24,23 @@ void compare(std::span<const float> points, std::span<const float> expected, std
 
 } // namespace
 
-Farthest farthestFrom(viewer::Character& character, viewer::Shape shape, ShownBy by, const PageContent& content,
-                      const std::vector<float>& expected, const std::function<void()>& step) {
-    Farthest farthest;
+PageProof compareWithScene(viewer::Character& character, ShownBy by, const PageContent& content,
+                           const std::function<void()>& step) {
+    PageProof proof;
     const PageFrames& frames = content.frames;
     for (std::size_t frame = 0; frame < frames.count(); ++frame) {
+        throwIfInterrupted();
         if (by == ShownBy::frame)
             character.showFrame(frame);
         else
             character.showSliders(frame, frames.of(frames.sliders, frame));
-        compare(character.points(shape), frames.of(expected, frame), frame, farthest);
+        compare(character.points(viewer::Shape::skin), frames.of(frames.input, frame), frame, proof.skin);
+        compare(character.points(viewer::Shape::neural), frames.of(frames.output, frame), frame, proof.neural);
         step();
     }
-    farthest.distance *= content.mmPerUnit;
-    return farthest;
+    proof.skin.distance *= content.mmPerUnit;
+    proof.neural.distance *= content.mmPerUnit;
+    return proof;
 }
 
 PageChecks checksOf(viewer::Character& character, std::size_t worst) {

@@ -20,11 +20,15 @@ struct Farthest {
 /// How a frame is shown: from the time line, or by the values of sliders that it has.
 enum class ShownBy { frame, sliders };
 
-/// `expected` [frames][vertices][3] what the shape should be. `step` is called after each frame. Throws
-/// std::runtime_error where a frame cannot be shown.
-Farthest farthestFrom(
-    viewer::Character& character, viewer::Shape shape, ShownBy by, const PageContent& content,
-    const std::vector<float>& expected, const std::function<void()>& step = [] {});
+/// How far the page is from the scene, over all frames.
+struct PageProof {
+    Farthest skin;   ///< from what comes into the deformer
+    Farthest neural; ///< from what it gives out
+};
+
+/// `step` is called after each frame. Throws std::runtime_error where a frame cannot be shown, and Interrupted.
+PageProof compareWithScene(
+    viewer::Character& character, ShownBy by, const PageContent& content, const std::function<void()>& step = [] {});
 
 /// First, last, `worst` and two in between, fewer where there are fewer, with the sums of their points.
 PageChecks checksOf(viewer::Character& character, std::size_t worst);

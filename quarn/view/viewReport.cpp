@@ -8,8 +8,9 @@ namespace quarn {
 namespace {
 
 std::string sizeText(std::uint64_t bytes) {
-    constexpr double kilobyte = 1e3;
-    return roughText(static_cast<double>(bytes) / kilobyte) + " kB";
+    constexpr double kilobyte = 1e3, megabyte = 1e6;
+    const auto size = static_cast<double>(bytes);
+    return size < megabyte ? roughText(size / kilobyte) + " kB" : roughText(size / megabyte) + " MB";
 }
 
 std::string partsText(const ViewResult& result) {

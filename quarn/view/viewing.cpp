@@ -205,28 +205,19 @@ private:
     void prove() {
         const Stage stage([] { return std::string("comparing the page with the scene"); });
         facts_.limitMm = plan_.limitMm.value_or(std::max(0.01, 1e-5 * facts_.diagonalMm));
-        if (!source_.chain || !proveChain())
-            openWithoutRig();
-        Progress progress(console_, "comparing", content_.frames.count());
-        facts_.difference = farthestFrom(*character_, viewer::Shape::neural, ShownBy::frame, content_,
-                                         content_.frames.output, [&] { progress.advance(); });
-        if (facts_.difference.distance > allowed())
-            throw std::runtime_error(differenceText(facts_.difference, "the page is not what quarn play shows: it is"));
+        PageProof proof = openAndCompare();
+        if (source_.chain && proof.skin.distance > facts_.limitMm) {
+            takePoints(differenceText(proof.skin, "what blend shapes and skin make there is", 0.0));
+            proof = openAndCompare();
+        }
+        facts_.difference = proof.neural;
+        if (proof.neural.distance > facts_.limitMm + facts_.basisErrorMm)
+            throw std::runtime_error(
+                differenceText(proof.neural, "the page is not what quarn play shows: it is", facts_.basisErrorMm));
         if (content_.rig)
             proveSliders();
         const std::size_t worst = content_.target.neural ? content_.target.neural->worstFrame : facts_.difference.frame;
         content_.checks = checksOf(*character_, worst);
-    }
-
-    double allowed() const { return facts_.limitMm + facts_.basisErrorMm; }
-
-    std::string differenceText(const Farthest& farthest, const std::string& begin) const {
-        const std::string packing =
-            facts_.basisErrorMm > 0.0 ? " and " + roughText(facts_.basisErrorMm) + " mm for the packed basis" : "";
-        return begin + " " + roughText(farthest.distance) + " mm off in frame " +
-               std::to_string(content_.frames.numbers[farthest.frame]) + ", at vertex " +
-               std::to_string(farthest.vertex) + ", where " + roughText(facts_.limitMm) + " mm" + packing +
-               " are allowed";
     }
 
     void open() {
@@ -234,55 +225,52 @@ private:
         content_.rig = source_.rig;
         character_.emplace(blocksOf(content_).opened());
     }
-
-    // whether the page's own skin is the scene's
-    bool proveChain() {
+    PageProof openAndCompare() {
         open();
-        const Farthest skin =
-            farthestFrom(*character_, viewer::Shape::skin, ShownBy::frame, content_, content_.frames.input);
-        if (skin.distance <= facts_.limitMm)
-            return true;
-        takePoints(differenceText(skin, "what blend shapes and skin make there is"));
-        return false;
-    }
-    void openWithoutRig() {
-        source_.rig.reset();
-        open();
+        Progress progress(console_, "comparing", content_.frames.count());
+        return compareWithScene(*character_, ShownBy::frame, content_, [&] { progress.advance(); });
     }
 
+    // with the values that its sliders have in a frame, the page shows that frame
     void proveSliders() {
-        const auto far = [&](viewer::Shape shape, const std::vector<float>& expected) {
-            return farthestFrom(*character_, shape, ShownBy::sliders, content_, expected);
-        };
-        std::string why;
         try {
-            Farthest farthest = far(viewer::Shape::neural, content_.frames.output);
-            facts_.slidersMm = farthest.distance;
-            if (farthest.distance > allowed())
-                why = differenceText(farthest, "a pose by the values of its sliders is");
-        } catch (const std::runtime_error& error) {
-            why = error.what();
+            const PageProof proof = compareWithScene(*character_, ShownBy::sliders, content_);
+            facts_.slidersMm = proof.neural.distance;
+            if (proof.skin.distance > facts_.limitMm)
+                throw NotInPage(differenceText(proof.skin, "the skin by the values of the sliders is", 0.0));
+            if (proof.neural.distance > facts_.limitMm + facts_.basisErrorMm)
+                throw NotInPage(
+                    differenceText(proof.neural, "a pose by the values of the sliders is", facts_.basisErrorMm));
+        } catch (const Interrupted&) {
+            throw;
+        } catch (const std::runtime_error& why) {
+            facts_.whyNoSliders = why.what();
+            source_.rig.reset();
+            open();
         }
-        if (why.empty())
-            return;
-        facts_.whyNoSliders = why;
-        openWithoutRig();
+    }
+
+    std::string differenceText(const Farthest& farthest, const std::string& begin, double ofBasis) const {
+        const std::string packing = ofBasis > 0.0 ? " and " + roughText(ofBasis) + " mm for the packed basis" : "";
+        return begin + " " + roughText(farthest.distance) + " mm off in frame " +
+               std::to_string(content_.frames.numbers[farthest.frame]) + ", at vertex " +
+               std::to_string(farthest.vertex) + ", where " + roughText(facts_.limitMm) + " mm" + packing +
+               " are allowed";
     }
 
     // --- the file ---
 
     ViewResult write() {
-        const PageTemplate page;
         const PageBlocks blocks = blocksOf(content_);
         const std::string manifest = manifestOf(content_, facts_, blocks);
         ViewResult result;
-        std::map<std::string, std::uint64_t> parts = {{"page", page.bytes() + manifest.size()}};
+        std::map<std::string, std::uint64_t> parts = {{"page", page_.bytes() + manifest.size()}};
         for (const PageBlock& block : blocks.all())
             parts[partOf(block.name)] += bytesInFile(block);
         for (const auto& [name, bytes] : parts)
             result.bytes += bytes;
         requireAtMost(result.bytes, "fewer frames, --basis i8, --target none or --no-textures");
-        page.write(plan_.output, manifest, blocks);
+        page_.write(plan_.output, manifest, blocks);
         result.bytes = std::filesystem::file_size(plan_.output);
         result.parts.assign(parts.begin(), parts.end());
         result.facts = facts_;
@@ -297,6 +285,7 @@ private:
         return result;
     }
 
+    const PageTemplate page_; // found, or not, before anything is played
     const ViewPlan& plan_;
     const Console& console_;
     AppliedModels models_;

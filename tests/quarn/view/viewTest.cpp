@@ -6,7 +6,7 @@
 #include "quarn/scene/Warp.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
-#include "quarn/scene/sliders.h"
+#include "quarn/view/PageContent.h"
 
 #include <cmath>
 #include <random>
@@ -17,7 +17,6 @@ using namespace quarn;
 using ::testing::ContainsRegex;
 using ::testing::ElementsAre;
 using ::testing::HasSubstr;
-using ::testing::IsEmpty;
 using ::testing::Not;
 
 // of the deformed mesh, in mm
@@ -289,6 +288,38 @@ TEST_F(ViewScene, APageWithoutJointsMovesShapesByItsSliders) {
     set("face.slider[0].value", 0.75);
     character.showSliders(0, std::vector{0.75, -0.5});
     EXPECT_LE(farthest(character.points(viewer::Shape::neural), Warp::find().geometry("").output), 1e-4);
+}
+
+// each texture coordinate of a vertex is drawn by a vertex of its own, and moves with it
+TEST_F(ViewScene, VerticesAreSplitWhereTheirTextureCoordinatesAreOthers) {
+    save();
+    view();
+    PageContent content;
+    content.polygons = {.vertexCount = vertexCount,
+                        .sizes = {4, 3},
+                        .corners = {0, 1, 10, 9, 1, 2, 10},
+                        .uvs = {0, 0, 0.5, 0, 0.5, 1, 0, 1, 0.75, 0},
+                        .uvCorners = {0, 1, 2, 3, 4, 0, 2}};
+    content.rest.resize(3 * vertexCount);
+    content.model = readPageModel(folder.path() / "models" / "arm.nwrp", vertexCount, BasisKind::f32);
+    content.frames.vertexCount = vertexCount;
+    content.frames.numbers = {1};
+    for (std::size_t i = 0; i < 3 * vertexCount; ++i)
+        content.frames.input.push_back(static_cast<float>(i));
+    content.frames.controls.resize(controlCount);
+    content.frames.envelope = {0.0F};
+    content.textures.materials.resize(1);
+    viewer::Character character(blocksOf(content).opened());
+    character.showFrame(0);
+    EXPECT_THAT(std::vector(character.triangles().begin(), character.triangles().end()),
+                ElementsAre(0, 1, 2, 0, 2, 3, 4, 5, 2));
+    const std::span<const float> drawn = character.drawPoints(viewer::Shape::skin);
+    std::vector<int> vertices;
+    for (std::size_t i = 0; i < drawn.size(); i += 3)
+        vertices.push_back(static_cast<int>(drawn[i]) / 3);
+    EXPECT_THAT(vertices, ElementsAre(0, 1, 10, 9, 1, 2));
+    const auto uvs = blocksOf(content).opened();
+    EXPECT_THAT(uvs.array<float>("draw.uvs"), ElementsAre(0, 0, 0.5, 0, 0.5, 1, 0, 1, 0.75, 0, 0, 0));
 }
 
 } // namespace
