@@ -6,9 +6,8 @@ import { digits, meanAndMax, mm, percent, size } from './format.js';
 const refreshEvery = 100; // milliseconds, while the motion plays
 
 export class Numbers {
-  constructor(view, timings) {
+  constructor(view) {
     this.view = view;
-    this.timings = timings;
     this.refreshed = 0;
     const { errors } = view.manifest;
     byId('numbers').hidden = !errors;
@@ -41,12 +40,19 @@ export class Numbers {
       return;
     }
     this.refreshed = now;
-    const { core, hasErrors } = this.view;
     ['skin', 'neural'].forEach((shape, column) => {
-      const found = hasErrors ? meanAndMax(core.errors(shape)) : null;
+      const found = this.#ofThisFrame(shape);
       say(this.cells[0][column], digits(found?.mean));
       say(this.cells[1][column], digits(found?.max));
     });
+  }
+
+  // what quarn has measured where that is what is shown: the page's own target is packed
+  #ofThisFrame(shape) {
+    const { core, frame, envelope, hasErrors, manifest } = this.view;
+    if (!hasErrors) return null;
+    const measured = manifest.frameErrors?.[shape === 'skin' ? 'before' : 'after'][frame];
+    return measured && envelope === 1 ? measured : meanAndMax(core.errors(shape));
   }
 }
 
@@ -57,7 +63,7 @@ function addRow(name, before, after) {
 
 const bases = { f32: 'single precision', i16: '16 bits', i8: '8 bits, a preview' };
 
-/** What the model and the page are. `pageBytes`: of the blocks as they lie in the page. */
+/** What the model and the page are. */
 export function showFacts({ manifest, core, timings, stage, view }) {
   const { model = {}, blocks } = manifest;
   const bytes = blocks.reduce((sum, block) => sum + block.bytes, 0);
@@ -74,6 +80,8 @@ export function showFacts({ manifest, core, timings, stage, view }) {
     ['Network', model.networkBytes ? `${model.controls} controls, ${size(model.networkBytes)}` : `${model.controls} controls`],
     ['Basis', manifest.basis ? `${bases[manifest.basis] ?? manifest.basis}, ${mm(manifest.basisErrorMm)} at most` : undefined],
     ['Target', manifest.target === 'points' && manifest.targetErrorMm ? `stored within ${mm(manifest.targetErrorMm)}` : undefined],
+    ['Input', manifest.whyPoints],
+    ['Poses by controls', manifest.slidersDifferenceMm ? `within ${mm(manifest.slidersDifferenceMm)} of quarn` : undefined],
     ['Diagonal', manifest.diagonalMm ? mm(manifest.diagonalMm) : undefined],
     ['Data', size(bytes)],
     ['A frame', `${digits(view.frameMs)} ms to compute, here`],

@@ -4,6 +4,7 @@ import { byId, make, say } from './elements.js';
 import { digits } from './format.js';
 
 const degrees = 180 / Math.PI;
+const fewSliders = 12; // of which all are seen at once
 const followEvery = 100; // milliseconds, while the motion plays
 
 export class Sliders {
@@ -62,7 +63,7 @@ export class Sliders {
     const groups = grouped(this.all);
     for (const [group, numbers] of groups) {
       const rows = numbers.map((i) => this.#row(i));
-      const details = make('details', { open: groups.size === 1 }, make('summary', { text: group || 'Others' }), ...rows);
+      const details = make('details', { open: this.all.length <= fewSliders }, make('summary', { text: group || 'Others' }), ...rows);
       byId('sliders').append(details);
     }
     byId('search').addEventListener('input', () => this.#search(byId('search').value));

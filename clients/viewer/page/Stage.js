@@ -24,8 +24,8 @@ export class Stage {
     this.camera = camera;
     this.renderer = new WebGLRenderer({ canvas, context });
     this.renderer.autoClear = false;
-    this.renderer.setScissorTest(true);
     this.element = this.renderer.domElement;
+    this.element.addEventListener('webglcontextrestored', () => this.onTurn());
     this.triangles = new BufferAttribute(core.triangles().slice(), 1);
     this.plain = surfaceMaterial();
     this.lines = new LineBasicMaterial({ color: 0x202226, transparent: true, opacity: 0.45 });
@@ -60,6 +60,8 @@ export class Stage {
     if (side === 0) this.camera.update();
     const [width, height] = this.size;
     const left = Math.round(from * width);
+    this.renderer.setScissorTest(true); // both each time: a context that was lost comes back without
+    this.renderer.setClearColor(0, 0);
     this.renderer.setScissor(left, 0, Math.round(to * width) - left, height);
     this.renderer.clear();
     if (to > from) this.renderer.render(it.scene, this.camera.three);

@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Puts the page of `quarn view` together: one file of markup, style, bundled script and core, with the licence of what is
-bundled. Python of the system; nothing but its standard library.
+"""Puts the page of `quarn view` together: one file of markup, style, bundled script and core, with the licence of what
+is bundled. Python of the system; nothing but its standard library.
 
 usage: pack.py PAGE STYLE SCRIPT CORE LICENCE -o FILE
 """
