@@ -88,7 +88,7 @@ HPlug takeShapes(const HPlug& output, InputChain& chain) {
     const HObject node = output.node();
     const unsigned geometry = output.logicalIndex();
     requireWhole(node, geometry);
-    const HPlug input = inputOf(node, geometry);
+    HPlug input = inputOf(node, geometry);
     const std::size_t vertices = vertexCountOf(input);
     std::map<unsigned, std::uint32_t> places;
     for (const unsigned index : weightsOf(node))

@@ -44,7 +44,7 @@ std::optional<std::uint32_t> placeIn(const std::array<const char*, size>& names,
 // what is connected into the plug, or into a whole that it is a part of
 HPlug sourceInto(const HPlug& plug) {
     for (HPlug place = plug; !place.isNull(); place = wholeOf(place))
-        if (const HPlug source = place.source(); !source.isNull())
+        if (HPlug source = place.source(); !source.isNull())
             return source;
     return {};
 }
@@ -269,7 +269,7 @@ private:
                     open.push_back(source);
                 continue;
             }
-            const std::string node = nodeName(plug.node());
+            std::string node = nodeName(plug.node());
             if (sliderNodes_.count(node) > 0)
                 return node;
             if (!visited.insert(node).second)

@@ -89,7 +89,9 @@ void writeTarget(JsonWriter& json, const PageTarget& target, double mmPerUnit) {
     constexpr const char* kinds[] = {"points", "errors", "none"};
     writeBool(json, "hasTarget", target.kind == TargetKind::points);
     writeText(json, "target", kinds[static_cast<std::size_t>(target.kind)]);
-    writeNumber(json, "targetErrorMm", target.points.error * mmPerUnit);
+    constexpr double halfSteps = 2.0 * 255.0;
+    const double error = target.kind == TargetKind::errors ? target.range / halfSteps : target.points.error * mmPerUnit;
+    writeNumber(json, "targetErrorMm", error);
     json.Key("errors");
     if (!target.skin) {
         json.Null();

@@ -7,9 +7,11 @@
 #include "quarn/console/numberText.h"
 #include "quarn/scene/AppliedModels.h"
 #include "quarn/scene/FramePlayer.h"
+#include "quarn/scene/PoseWatch.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/modelDirectory.h"
 #include "quarn/scene/plugs.h"
+#include "quarn/scene/poseTexts.h"
 #include "quarn/scene/units.h"
 #include "quarn/view/NotInPage.h"
 #include "quarn/view/PageFile.h"
@@ -47,6 +49,7 @@ public:
         , console_(console)
         , models_({plan.geometry.output, targetKind() == TargetKind::none ? HPlug() : plan.geometry.target})
         , player_(session, plan.geometry.output, nullptr)
+        , poses_(AppliedModels({plan.geometry.output}))
         , source_{plan.warp, plan.geometry, targetKind() != TargetKind::none, 0, {}, {}} {
         facts_.title = plan.title;
         facts_.mesh = plan.geometry.name;
@@ -100,8 +103,10 @@ private:
             if (i == 0)
                 takeFirst();
             readFrame(source_, frame, content_.frames);
+            poses_.look(frame);
             progress.advance();
         }
+        notePoses(console_, poses_.reports());
     }
 
     // what is known of the scene once a frame has been evaluated
@@ -290,6 +295,7 @@ private:
     const Console& console_;
     AppliedModels models_;
     FramePlayer player_;
+    PoseWatch poses_;
     FrameSource source_;
     PageContent content_;
     PageFacts facts_;
