@@ -45,13 +45,24 @@ std::array<float, 3> turned(const std::array<float, 16>& view, const float* norm
     return {n[0] / length, n[1] / length, n[2] / length};
 }
 
+Colour scaled(const Colour& colour, float factor) {
+    return {colour[0] * factor, colour[1] * factor, colour[2] * factor};
+}
+
 // each 0 to 255; what is no number is 0
-std::uint32_t packed(float red, float green, float blue) {
+std::uint32_t packed(const Colour& seen, bool isHeat) {
+    const auto [red, green, blue] = isHeat ? scaled(heatColour(seen[0]), seen[1]) : seen;
     const auto byte = [](float value) {
         const float kept = value > 0.0F ? std::min(value, 255.0F) : 0.0F;
         return static_cast<std::uint32_t>(static_cast<std::int32_t>(kept + half));
     };
     return byte(red) | byte(green) << 8U | byte(blue) << 16U | 0xFF000000U;
+}
+
+// 0 for what is no number, and such that it can be multiplied
+float shareOf(float error, float range) {
+    const float share = error / range;
+    return share > 0.0F ? std::min(share, 1e6F) : 0.0F;
 }
 
 // to the nearest: casts cut off, so what they get is made positive
@@ -170,7 +181,7 @@ void Raster::place(const RasterCamera& camera, const RasterSurface& surface) {
         const auto clip = times(camera.projection, times(camera.view, {point[0], point[1], point[2], 1.0F}));
         Placed& placed = placed_[v];
         placed.normal = turned(camera.view, &surface.normals[3 * v]);
-        placed.heat = isHeat_ ? surface.errors[v] / surface.range : 0.0F;
+        placed.heat = isHeat_ ? shareOf(surface.errors[v], surface.range) : 0.0F;
         placed.vertex = {clip[0], clip[1], clip[2], clip[3], colourOf(placed, 1.0F)};
         placed.hasBack = false;
         placed.outside = areFinite(clip) ? 0 : notFinite;
@@ -180,10 +191,11 @@ void Raster::place(const RasterCamera& camera, const RasterSurface& surface) {
     }
 }
 
-// `side` 1: the one that the normal is on; -1: the other
+// `side` 1: the one that the normal is on; -1: the other. Of heat what each pixel has its colour from: the share of the
+// range, and the light.
 Colour Raster::colourOf(const Placed& placed, float side) const {
     const std::array<float, 3> normal{side * placed.normal[0], side * placed.normal[1], side * placed.normal[2]};
-    return isHeat_ ? RasterLight::litHeat(normal, placed.heat) : light_.lit(normal, albedo_);
+    return isHeat_ ? Colour{placed.heat, RasterLight::ofHeat(normal), 0.0F} : light_.lit(normal, albedo_);
 }
 
 Raster::Vertex Raster::corner(std::size_t vertex, bool isBack) {
@@ -356,7 +368,7 @@ void Raster::fillBox(const std::array<Projected, 3>& p, std::int64_t area, const
                 if (const float depth = value(0); depth < depths[column]) {
                     const float w = 1.0F / value(1);
                     depths[column] = depth;
-                    pixels[column] = packed(value(2) * w, value(3) * w, value(4) * w);
+                    pixels[column] = packed({value(2) * w, value(3) * w, value(4) * w}, isHeat_);
                 }
             }
             ea += right[0];

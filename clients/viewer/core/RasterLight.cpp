@@ -91,11 +91,8 @@ Colour RasterLight::lit(const std::array<float, 3>& normal, const Colour& albedo
     return colour;
 }
 
-Colour RasterLight::litHeat(const std::array<float, 3>& normal, float share) {
-    Colour colour = heatColour(share);
-    for (float& channel : colour)
-        channel *= 255.0F * (0.8F + 0.2F * std::clamp(normal[2], 0.0F, 1.0F));
-    return colour;
+float RasterLight::ofHeat(const std::array<float, 3>& normal) {
+    return 255.0F * (0.8F + 0.2F * std::clamp(normal[2], 0.0F, 1.0F));
 }
 
 Colour RasterLight::linear(const Colour& srgb) {

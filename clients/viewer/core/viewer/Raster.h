@@ -59,7 +59,7 @@ private:
     template <class T>
     using Memory = std::unique_ptr<T[], Free>;
 
-    /// In clip space, with its colour in sRGB, 0 to 255.
+    /// In clip space, with its colour in sRGB, 0 to 255; see colourOf().
     struct Vertex {
         float x, y, z, w;
         Colour colour;

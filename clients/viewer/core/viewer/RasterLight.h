@@ -20,8 +20,8 @@ public:
     /// sRGB, 0 to 255, of a surface whose own colour is `albedo` (linear, 0 to 1). `normal` in camera space, of length
     /// 1; on a surface that is seen its z is above 0.
     Colour lit(const std::array<float, 3>& normal, const Colour& albedo) const;
-    /// The same of heat, which light changes little, so that it can be read.
-    static Colour litHeat(const std::array<float, 3>& normal, float share);
+    /// What colours of heat, 0 to 1, are multiplied by: light changes them little, so that they can be read.
+    static float ofHeat(const std::array<float, 3>& normal);
     /// Linear, of sRGB from 0 to 1.
     static Colour linear(const Colour& srgb);
 

@@ -161,12 +161,12 @@ TEST(Raster, PlanesCutOffAndColoursAreInPerspective) {
     constexpr float nearPlane = 0.9F, farPlane = 8.0F, below = -0.5F;
     Mesh floor;
     for (const auto& [x, z] : {std::pair{-30.0F, 20.0F}, {30.0F, 20.0F}, {30.0F, -20.0F}, {-30.0F, -20.0F}})
-        floor.addPoint({x, below, z}, -z);
+        floor.addPoint({x, below, z}, 20.0F - z);
     floor.triangles = {0, 1, 2, 0, 2, 3};
     for (std::size_t i = 1; i < floor.normals.size(); i += 3)
         floor.normals[i] = 1.0F, floor.normals[i + 1] = 0.0F;
     Picture picture(size);
-    picture.draw(floor.heat(farPlane), perspective(nearPlane, farPlane));
+    picture.draw(floor.heat(30.0F), perspective(nearPlane, farPlane));
     std::size_t seen = 0;
     for (std::uint32_t y = 0; y < size; ++y)
         for (std::uint32_t x = 0; x < size; ++x) {
@@ -178,12 +178,10 @@ TEST(Raster, PlanesCutOffAndColoursAreInPerspective) {
             if (!isIn)
                 continue;
             ++seen;
-            // straight from the colour at one end of the floor to that at the other; light from ahead does not reach it
-            const auto share = static_cast<float>((distance + 20.0) / 40.0);
-            Colour expected{};
-            for (std::size_t channel = 0; channel < 3; ++channel)
-                expected[channel] =
-                    0.8F * (heatColour(0.0F)[channel] * (1.0F - share) + heatColour(1.0F)[channel] * share);
+            // light from ahead does not reach it
+            Colour expected = heatColour((20.0F + static_cast<float>(distance)) / 30.0F);
+            for (float& channel : expected)
+                channel *= 0.8F;
             expectColour(picture.at(x, y), expected, 1.0, where);
         }
     EXPECT_GT(seen, size * size / 6);
