@@ -15,6 +15,7 @@
 #include "quarn/pose/commands.h"
 #include "quarn/process/ownVariable.h"
 #include "quarn/render/commands.h"
+#include "quarn/report/commands.h"
 #include "quarn/run/commands.h"
 #include "quarn/view/commands.h"
 
@@ -75,6 +76,7 @@ int run(int argc, char** argv) {
     quarn::addTargetCommand(app);
     quarn::addRenderCommand(app);
     quarn::addViewCommand(app);
+    quarn::addReportCommand(app);
     quarn::addRunCommand(app, targetCommand);
 
     quarn::LogOptions log;

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/play/evaluator.h"
+#include "quarn/scene/evaluator.h"
 
 #include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
