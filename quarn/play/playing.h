@@ -5,12 +5,12 @@
 #include "openquarn/HPlug.h"
 #include "quarn/play/AnimatedFile.h"
 #include "quarn/play/VertexOrder.h"
-#include "quarn/play/evaluator.h"
 #include "quarn/scene/CacheSpace.h"
 #include "quarn/scene/Distances.h"
 #include "quarn/scene/EnvelopeGuard.h"
 #include "quarn/scene/FrameTimes.h"
 #include "quarn/scene/PoseWatch.h"
+#include "quarn/scene/evaluator.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/useModel.h"
 
