@@ -48,13 +48,6 @@ def parser() -> Parser:
     zero.add_argument("-o", "--output", required=True, metavar="MODEL.nwrp")
     zero.add_argument("--quiet", action="store_true")
 
-    report = commands.add_parser("report", help="a page and a table on models, from what quarn run has made",
-                                 allow_abbrev=False)
-    report.add_argument("rows", metavar="ROWS.json", help="what there is, version 1; docs/run.md describes it")
-    report.add_argument("-o", "--output", required=True, metavar="FOLDER",
-                        help="gets report.json, report.html and table.txt")
-    report.add_argument("--quiet", action="store_true", help="no table on standard output")
-
     info = commands.add_parser("info", help="check a data set and say what is in it", allow_abbrev=False)
     add_dataset(info)
     info.add_argument("--json", action="store_true", help="write dataset.json without its long lists, and the digest")
@@ -319,16 +312,6 @@ def command_zero(options: argparse.Namespace) -> int:
     return 0
 
 
-def command_report(options: argparse.Namespace) -> int:
-    from . import page, rows
-
-    report = rows.read_report(Path(options.rows))
-    figures = [rows.figures(row, report.is_motion, report.first_frame) for row in report.rows]
-    page.write(report, figures, Path(options.output))
-    speaker(options)(page.table(figures).rstrip("\n"))
-    return 0
-
-
 def command_info(options: argparse.Namespace) -> int:
     from .dataset import load_dataset
 
@@ -350,8 +333,7 @@ def command_info(options: argparse.Namespace) -> int:
 
 INTERRUPTED = 130  # 128 + SIGINT
 COMMANDS: dict[str, Callable[[argparse.Namespace], int]] = {
-    "train": command_train, "evaluate": command_evaluate, "zero": command_zero, "report": command_report,
-    "info": command_info}
+    "train": command_train, "evaluate": command_evaluate, "zero": command_zero, "info": command_info}
 
 
 def on_terminate(number: int, frame: Optional[FrameType]) -> None:

@@ -64,7 +64,7 @@ class Legend {
 public:
     void add(const std::string& name, const std::string& kind) {
         text_ += line(x_, 36, x_ + 20, 36, kind) + textAt(x_ + 25, 40, "start", name);
-        x_ += 40 + 6.4 * static_cast<double>(name.size());
+        x_ += 37 + 6.0 * static_cast<double>(name.size());
     }
     const std::string& text() const { return text_; }
 
@@ -127,7 +127,7 @@ std::vector<double> Scale::ticks() const {
     if (!isLog) {
         const double step = stepOf(last - first);
         for (double number = std::ceil(first / step - slack); number * step <= last + slack * step; ++number)
-            ticks.push_back(number * step);
+            ticks.push_back(number * step + 0.0); // never -0
         return ticks;
     }
     const double decades = std::log10(last / first);

@@ -37,16 +37,23 @@ Words wordsOf(const char* command, const Row& row, const FrameRange& frames, con
     return words;
 }
 
+// what a quarn that failed says of it: one line, whatever stands around it
+std::string sentenceIn(const ProgramAnswer& answer) {
+    const std::string mark = "quarn: ", text = "\n" + answer.text;
+    const std::size_t found = text.rfind("\n" + mark);
+    if (found == std::string::npos)
+        return answer.text.empty() ? "it " + answer.end.text() : answer.lastLine();
+    const std::size_t begin = found + 1 + mark.size();
+    return text.substr(begin, text.find('\n', begin) - begin);
+}
+
 // why it failed; empty when it did not
 std::string failureOf(Words words) {
     ProgramCall call;
     call.words = std::move(words);
     try {
         const ProgramAnswer answer = askProgram(std::move(call));
-        if (answer.end.isGood())
-            return {};
-        const std::string line = answer.lastLine();
-        return line.empty() ? "it " + answer.end.text() : line;
+        return answer.end.isGood() ? "" : sentenceIn(answer);
     } catch (const Interrupted&) {
         throw;
     } catch (const std::runtime_error& error) {

@@ -104,7 +104,7 @@ std::string timesOf(const Row& row) {
                        "</tr>\n" +
                        cells("CPU", "", row.measured.cpu);
     if (const auto& gpu = row.measured.gpu; gpu && gpu->deformations > 0)
-        text += cells("GPU", gpu->device + ", at most " + numberText(gpu->difference.largest()) + " mm from the CPU",
+        text += cells("GPU", gpu->device + ", at most " + roughText(gpu->difference.largest()) + " mm from the CPU",
                       gpu->times);
     return text + "</table>\n";
 }
@@ -131,7 +131,7 @@ std::string sectionOf(const Report& report, const Row& row) {
     const bool hasSeveral = report.rows.size() > 1;
     return "<section>\n" + said("h2", hasSeveral ? row.label() : "Figures") + "\n" +
            (hasSeveral ? leadOf(row, false) : "") + stages(row) + timesOf(row) + said("h3", "Where the error is") +
-           chartsOf(row) + pictures(row) + said("h3", "About this row") + factsOf(report, row) + "</section>\n";
+           chartsOf(row) + pictures(row) + said("h3", "About the model") + factsOf(report, row) + "</section>\n";
 }
 
 std::string leads(const Report& report) {

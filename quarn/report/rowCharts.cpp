@@ -39,9 +39,9 @@ std::string overFrames(const MeasuredRow& row) {
     const double last = frames.count() > 1 ? frames.frame(frames.count() - 1) : frames.first + 1;
     return chartOf("Error over the frames", {{static_cast<double>(frames.first), last}, "frame"},
                    {{"before, largest", "before", true, valuesOf(before, &MeanAndMax::max)},
-                    {"mean", "before", false, valuesOf(before, &MeanAndMax::mean)},
+                    {"before, mean", "before", false, valuesOf(before, &MeanAndMax::mean)},
                     {"after, largest", "after", true, valuesOf(after, &MeanAndMax::max)},
-                    {"mean", "after", false, valuesOf(after, &MeanAndMax::mean)}},
+                    {"after, mean", "after", false, valuesOf(after, &MeanAndMax::mean)}},
                    4);
 }
 
@@ -49,9 +49,9 @@ std::string overVertices(const MeasuredRow& row) {
     const auto before = row.before.vertices(), after = row.after.vertices();
     return chartOf("Error over the vertices, the worst first", {{0.0, 100.0}, "% of the vertices"},
                    {{"before, largest", "before", true, descending(valuesOf(before, &MeanAndMax::max))},
-                    {"mean", "before", false, descending(valuesOf(before, &MeanAndMax::mean))},
+                    {"before, mean", "before", false, descending(valuesOf(before, &MeanAndMax::mean))},
                     {"after, largest", "after", true, descending(valuesOf(after, &MeanAndMax::max))},
-                    {"mean", "after", false, descending(valuesOf(after, &MeanAndMax::mean))}},
+                    {"after, mean", "after", false, descending(valuesOf(after, &MeanAndMax::mean))}},
                    4);
 }
 

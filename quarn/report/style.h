@@ -24,9 +24,10 @@ a { color: var(--after); }
 .weak, figcaption { font-size: .875rem; }
 table { border-collapse: collapse; width: 100%; font-variant-numeric: tabular-nums; font-size: .9rem; }
 th, td { padding: .35rem .6rem; text-align: right; border-bottom: 1px solid var(--line); vertical-align: top; }
-th { font-weight: 600; }
+th { font-weight: 600; overflow-wrap: normal; }
 th:first-child, td:first-child { text-align: left; }
 td small { display: block; }
+table + table { margin-top: 1.25rem; }
 tr.best td { font-weight: 600; }
 tr.best td small { font-weight: 400; }
 .charts { display: grid; grid-template-columns: repeat(auto-fit, minmax(min(100%, 480px), 1fr)); gap: 1rem; }
@@ -59,6 +60,7 @@ summary { cursor: pointer; color: var(--weak); }
     -webkit-print-color-adjust: exact; }
   .charts { grid-template-columns: 1fr 1fr; }
   .chart { border: 1px solid var(--line); }
+  table { font-size: 9pt; }
   figure, .chart, table, dl { break-inside: avoid; }
   h2, h3 { break-after: avoid; }
   section + section { break-before: page; }

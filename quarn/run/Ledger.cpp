@@ -19,12 +19,6 @@ using Sums = std::map<std::string, std::string>;
 constexpr const char* format = "quarn run";
 constexpr std::int64_t formatVersion = 1;
 
-std::string sumOfText(const std::string& text) {
-    storage::Fnv64 sum;
-    sum.add(std::as_bytes(std::span(text)));
-    return sum.text();
-}
-
 // "--samples 40, was --samples 20": the first word that differs, with the flag before it
 std::string differenceOf(const Words& now, const Words& before) {
     const auto [a, b] = std::mismatch(now.begin(), now.end(), before.begin(), before.end());
@@ -148,8 +142,7 @@ void Ledger::read() {
         reader.fail();
     reader.each(reader.member(document, "steps"), [&](const std::string& label, const JsonValue& value) {
         entries_[label] = {reader.words(reader.member(value, "words")), reader.text(reader.member(value, "program")),
-                           reader.sums(reader.member(value, "inputs")), reader.sums(reader.member(value, "outputs")),
-                           reader.sums(reader.member(value, "written"))};
+                           reader.sums(reader.member(value, "inputs")), reader.sums(reader.member(value, "outputs"))};
     });
     reader.each(reader.member(document, "files"), [&](const std::string& path, const JsonValue& value) {
         sums_.seen[path] = {reader.text(reader.member(value, "sum")),
@@ -179,7 +172,6 @@ void Ledger::save() const {
         writeText(writer, "program", entry.version);
         writeSums(writer, "inputs", entry.inputs);
         writeSums(writer, "outputs", entry.outputs);
-        writeSums(writer, "written", entry.written);
         writer.EndObject();
     }
     writer.EndObject();
@@ -200,16 +192,13 @@ void Ledger::save() const {
 }
 
 Ledger::Entry Ledger::entryOf(const Step& step, const std::string& version) {
-    Entry entry{step.words, version, {}, {}, {}};
+    Entry entry{step.words, version, {}, {}};
     for (const fs::path& input : step.inputs)
-        if (step.written.count(input.string()) == 0)
-            entry.inputs[input.string()] = sums_.of(input);
+        entry.inputs[input.string()] = sums_.of(input);
     // files that arguments name, as a script, are as much part of what a step makes as the arguments
     for (const std::string& word : step.words)
         if (const std::string file = fileOf(word); !file.empty())
             entry.inputs[file] = sums_.of(file);
-    for (const auto& [file, text] : step.written)
-        entry.written[file] = sumOfText(text);
     return entry;
 }
 
@@ -226,8 +215,6 @@ std::string Ledger::whyToDo(const Step& step, const std::string& version) {
     if (now.words != before.words)
         return "its arguments are others: " + differenceOf(now.words, before.words);
     if (std::string difference = differenceOf(now.inputs, before.inputs, "its input"); !difference.empty())
-        return difference;
-    if (std::string difference = differenceOf(now.written, before.written, "its input"); !difference.empty())
         return difference;
     Sums outputs;
     for (const fs::path& output : step.outputs)
@@ -271,11 +258,10 @@ std::string Ledger::digestOf(const Step& step, const std::string& version) {
     const auto add = [&](const std::string& text) { sum.add(std::as_bytes(std::span(text.c_str(), text.size() + 1))); };
     add(entry.version);
     std::for_each(entry.words.begin(), entry.words.end(), add);
-    for (const Sums* sums : {&entry.inputs, &entry.written})
-        for (const auto& [file, value] : *sums) {
-            add(file);
-            add(value);
-        }
+    for (const auto& [file, value] : entry.inputs) {
+        add(file);
+        add(value);
+    }
     return sum.text();
 }
 

@@ -33,7 +33,7 @@ private:
     struct Entry {
         Words words;
         std::string version;
-        Sums inputs, outputs, written; ///< written: texts, not files
+        Sums inputs, outputs;
         bool isDone() const { return !outputs.empty(); }
     };
 

@@ -109,8 +109,6 @@ fs::path RunFolder::logOf(const Step& step) const {
 }
 
 void RunFolder::prepare(const Step& step) const {
-    for (const auto& [file, text] : step.written)
-        storage::writeWhole(folder_ / file, text);
     for (const fs::path& output : step.outputs)
         storage::makeFolders((folder_ / output).parent_path(), folder_ / output);
     std::error_code error;

@@ -123,7 +123,7 @@ void resolve(RunSettings& settings, const fs::path& base) {
         makeWhole(*caches, base);
     for (Words* words :
          {&settings.importOptions, &settings.poseOptions, &settings.targetOptions, &settings.exportOptions,
-          &settings.trainOptions, &settings.renderOptions, &settings.targetCommand})
+          &settings.trainOptions, &settings.renderOptions, &settings.reportOptions, &settings.targetCommand})
         *words = withWholePaths(*words, base);
 }
 

@@ -22,8 +22,8 @@ struct RunSettings {
     bool align = false, anyway = false;
     Words targets, motionTargets, skins, motionSkins; ///< FILE, or MESH=FILE
     Words targetCommand;
-    Words importOptions, poseOptions, targetOptions, exportOptions, trainOptions,
-        renderOptions; ///< words for these commands
+    Words importOptions, poseOptions, targetOptions, exportOptions, trainOptions, renderOptions,
+        reportOptions; ///< words for these commands
 
     std::int64_t sampleCount() const { return samples.value_or(1000); }
     bool refines() const { return refineTo.has_value(); }
@@ -69,6 +69,7 @@ void visitSettings(const Visit& visit) {
     visit("export-option", &Settings::exportOptions, "WORD", "A word more for quarn export; may be repeated");
     visit("train-option", &Settings::trainOptions, "WORD", "A word more for trainer train; may be repeated");
     visit("render-option", &Settings::renderOptions, "WORD", "A word more for quarn render; may be repeated");
+    visit("report-option", &Settings::reportOptions, "WORD", "A word more for quarn report; may be repeated");
 }
 
 /// The same words, those that name a file, and those like --flag=FILE, with the whole path of it. `base` is the folder

@@ -5,7 +5,6 @@
 #include "quarn/run/RunSettings.h"
 
 #include <filesystem>
-#include <map>
 #include <optional>
 #include <string>
 #include <utility>
@@ -39,9 +38,8 @@ struct Step {
     std::vector<std::filesystem::path> inputs;
     std::vector<std::filesystem::path> outputs;  ///< files, or folders of files
     std::vector<std::filesystem::path> replaced; ///< of these, those that it would not write over: removed before
-    std::filesystem::path answer;               ///< where its standard output goes, one of `outputs`; empty for the log
-    std::optional<TargetRequest> request;       ///< of a target command
-    std::map<std::string, std::string> written; ///< texts that it reads, by the names of their files: written before
+    std::filesystem::path answer;         ///< where its standard output goes, one of `outputs`; empty for the log
+    std::optional<TargetRequest> request; ///< of a target command
 
     std::string label() const { return joined(' '); }
     std::string joined(char between) const {

@@ -2,7 +2,6 @@
 #include "quarn/run/plan.h"
 
 #include "quarn/run/characterFiles.h"
-#include "quarn/run/reportRows.h"
 
 #include <algorithm>
 #include <charconv>
@@ -148,7 +147,6 @@ private:
                   std::move(words),
                   std::move(inputs),
                   std::move(outputs),
-                  {},
                   {},
                   {},
                   {}};
@@ -362,11 +360,6 @@ private:
             files.push_back(facts.skin->cache);
         return files;
     }
-    // what is learned on, in such a scene
-    std::string skinPlug(const std::string& scene, const MeshFacts& mesh) const {
-        const TargetFacts& facts = *targetOf(scene, mesh);
-        return facts.skin ? facts.skin->node + ".outMesh" : mesh.skin + ".outputGeom[0]";
-    }
 
     // --- rounds that add poses where models disagree ---
 
@@ -427,9 +420,8 @@ private:
         eachChosen([&](const MeshFacts& mesh) { exportFrames("export", mesh, posed_.scene, trained, "set"); });
         eachChosen([&](const MeshFacts& mesh) { exportFrames("held-out", mesh, heldScene(), held, "heldOut"); });
         eachChosen([&](const MeshFacts& mesh) { train(mesh); });
-        eachChosen([&](const MeshFacts& mesh) { measure(mesh, held); });
-        eachChosen([&](const MeshFacts& mesh) { pictures(mesh, held); });
-        report();
+        eachChosen([&](const MeshFacts& mesh) { evaluate(mesh); });
+        report(held);
     }
 
     // what nobody has said is measured, on poses that are trained; frames held out get the same
@@ -489,109 +481,38 @@ private:
         return step;
     }
 
-    void measure(const MeshFacts& mesh, const FrameSpan& held) {
-        const std::string scene = heldScene() + "." + mesh.name + ".json";
-        const std::string data = dataOf(mesh) + "/";
-        const std::string model = "models/" + mesh.name + ".nwrp";
-        const std::vector<fs::path> played = playedBy(heldScene(), mesh);
-        addPoints("held-out-skin", mesh, scene, skinPlug(heldScene(), mesh), held, data + "heldOut_skin.npy", "scene")
-            .inputs = played;
-        addPoints("held-out-target", mesh, scene, targetOf(heldScene(), mesh)->node + ".outMesh", held,
-                  data + "heldOut_target.npy", "scene")
-            .inputs = played;
-        for (const char* evaluator : {"cpu", "gpu"}) {
-            const std::string points = data + "heldOut_" + evaluator + ".npy";
-            addAnswering(std::string(evaluator) == "cpu" ? "play" : "play-gpu", &mesh,
-                         {"play", scene, "--geometry", mesh.name, "--model", mesh.name, "--against", "target",
-                          "--frames", framesText(held), "--repeat", "3", "--evaluator", evaluator, "-o", points},
-                         {}, {points})
-                .inputs = played;
-            plan_.back().inputs.emplace_back(model);
-        }
+    void evaluate(const MeshFacts& mesh) {
         const std::string set = dataOf(mesh) + "/heldOut";
+        const std::string model = "models/" + mesh.name + ".nwrp";
         std::vector<fs::path> inputs = setFiles(set);
         inputs.emplace_back(model);
         addAnswering("evaluate", &mesh, {"evaluate", set, model}, inputs, {}).program = Program::trainer;
     }
 
-    // --- what is looked at ---
-
-    void pictures(const MeshFacts& mesh, const FrameSpan& held) {
-        constexpr int stills = 5, moving = 60; // of a motion
-        const std::string still = "pictures/" + mesh.name;
-        const int step = (held.count() + stills - 1) / stills;
-        draw("pictures", mesh, held, step, "480x480", still);
-        for (const int frame : drawnFrames(held, step))
-            rows_.pictures.push_back({pictureFile(still, frame), mesh.name + ", frame " + std::to_string(frame)});
+    // a row for each mesh that has a model
+    void report(const FrameSpan& held) {
+        Words words{"report"}, more;
+        std::vector<fs::path> inputs;
+        eachChosen([&](const MeshFacts& mesh) {
+            const std::string scene = heldScene() + "." + mesh.name + ".json";
+            const std::string training = dataOf(mesh) + "/training";
+            const std::string evaluation = answerFile("evaluate", mesh.name).string();
+            words.push_back(mesh.name + "=" + scene);
+            for (const auto& [flag, value] : {std::pair("--geometry", mesh.name), std::pair("--model", mesh.name),
+                                              std::pair("--training", training), std::pair("--evaluate", evaluation)})
+                append(more, {flag, mesh.name + "=" + value});
+            for (const fs::path& file : playedBy(heldScene(), mesh))
+                inputs.push_back(file);
+            inputs.insert(inputs.end(), {"models/" + mesh.name + ".nwrp", training, evaluation});
+        });
+        append(words, {"-o", ".", "--title", settings_.character.stem().string(), "--frames", framesText(held)});
+        append(words, more);
         if (!hasMotion())
-            return;
-        draw("moving-picture", mesh, held, (held.count() + moving - 1) / moving, "300x300",
-             dataOf(mesh) + "/preview/frame");
-        const std::vector<fs::path>& frames = plan_.back().outputs;
-        rows_.preview.insert(rows_.preview.end(), frames.begin(), frames.end());
-    }
-
-    void draw(const char* name, const MeshFacts& mesh, const FrameSpan& held, int step, const char* size,
-              const std::string& file) {
-        const std::string scene = heldScene() + "." + mesh.name + ".json";
-        const auto& meshes = facts_.character->meshes;
-        const auto isThis = [&](const MeshFacts& other) { return other.name == mesh.name; };
-        const auto index = std::find_if(meshes.begin(), meshes.end(), isThis) - meshes.begin();
-        const std::string result = "warp.outputGeom[" + std::to_string(index) + "]";
-        const std::string skin = skinPlug(heldScene(), mesh);
-        const std::string target = targetOf(heldScene(), mesh)->node + ".outMesh";
-        std::vector<fs::path> inputs = playedBy(heldScene(), mesh);
-        inputs.emplace_back("models/" + mesh.name + ".nwrp");
-        std::vector<fs::path> files;
-        for (const int frame : drawnFrames(held, step))
-            files.push_back(pictureFile(file, frame));
-        Step& drawing = add(name, &mesh, {"render",     scene,
-                                          "--geometry", mesh.name,
-                                          "--model",    mesh.name,
-                                          "--frames",   framesText(held) + "x" + std::to_string(step),
-                                          "--size",     size,
-                                          "--panel",    "skin=" + skin,
-                                          "--panel",    "target=" + target,
-                                          "--panel",    "neural=" + result,
-                                          "--heat",     "before=" + skin + ":" + target,
-                                          "--heat",     "after=" + result + ":" + target,
-                                          "-o",         file + ".####.png"},
-                            std::move(inputs), files);
-        append(drawing.words, settings_.renderOptions);
-    }
-
-    static std::vector<int> drawnFrames(const FrameSpan& frames, int step) {
-        std::vector<int> drawn;
-        for (int frame = frames.first; frame <= frames.last; frame += step)
-            drawn.push_back(frame);
-        return drawn;
-    }
-    static fs::path pictureFile(const std::string& file, int frame) {
-        std::string digits = std::to_string(frame);
-        digits.insert(0, digits.size() < 4 ? 4 - digits.size() : 0, '0');
-        return file + "." + digits + ".png";
-    }
-
-    // what the report is made of
-    bool isReported(const Step& step) const {
-        const auto& named = {"export", "held-out", "train",    "held-out-skin", "held-out-target",
-                             "play",   "play-gpu", "evaluate", "pictures",      "moving-picture"};
-        return std::find(named.begin(), named.end(), step.name) != named.end();
-    }
-
-    void report() {
-        rows_.title = settings_.character.stem().string();
-        rows_.isMotion = hasMotion();
-        rows_.firstFrame = heldFrames().first;
-        eachChosen([&](const MeshFacts& mesh) { rows_.meshes.push_back(mesh.name); });
-        std::vector<fs::path> inputs{"rows.json"};
-        for (const Step& step : plan_)
-            if (isReported(step))
-                inputs.insert(inputs.end(), step.outputs.begin(), step.outputs.end());
-        Step& step = add("report", nullptr, {"report", "rows.json", "-o", "."}, std::move(inputs),
-                         {"report.json", "report.html", "table.txt"});
-        step.program = Program::trainer;
-        step.written["rows.json"] = textOf(rows_);
+            words.emplace_back("--poses");
+        for (const std::string& word : settings_.renderOptions)
+            words.push_back("--render-option=" + word);
+        append(words, settings_.reportOptions);
+        add("report", nullptr, std::move(words), std::move(inputs), {"report.json", "report.html", "table.txt"});
     }
 
     const RunSettings& settings_;
@@ -599,7 +520,6 @@ private:
     Plan plan_;
     Posed posed_;
     std::map<std::string, fs::path> caches_; ///< of targets, by mesh: those that were planned last
-    ReportRows rows_;                        ///< as far as pictures are planned
 };
 
 } // namespace
@@ -609,11 +529,9 @@ Plan planOf(const RunSettings& settings, const RunFacts& facts) {
 }
 
 const Words& stepNames() {
-    static const Words names = {"import",       "poses",         "motion",          "rest",           "skin",
-                                "motion-skin",  "targets",       "target",          "motion-targets", "motion-target",
-                                "ensemble-set", "ensemble",      "refine",          "export",         "held-out",
-                                "train",        "held-out-skin", "held-out-target", "play",           "play-gpu",
-                                "evaluate",     "pictures",      "moving-picture",  "report"};
+    static const Words names = {"import",  "poses",  "motion",         "rest",          "skin",         "motion-skin",
+                                "targets", "target", "motion-targets", "motion-target", "ensemble-set", "ensemble",
+                                "refine",  "export", "held-out",       "train",         "evaluate",     "report"};
     return names;
 }
 

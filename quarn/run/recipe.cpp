@@ -69,11 +69,12 @@ const std::set<std::string> harmless = {
     // clang-format off
     "--activation", "--align", "--animation", "--anyway", "--axes", "--basis-budget", "--batch-size",
     "--checkpoint-every", "--controls", "--delta-mode", "--device", "--direct", "--dropout", "--epochs", "--fps",
-    "--frame-offset", "--frames", "--guard", "--guard-width", "--half-shapes", "--hidden-layers", "--learning-rate",
-    "--limits-from", "--limits-margin", "--linear-path", "--local-neurons", "--meters-per-unit", "--neurons",
-    "--no-animation", "--no-preload", "--order", "--patience", "--preload", "--principal-accuracy", "--principal-limit",
-    "--principal-shapes", "--range", "--rest-frame", "--scale", "--seed", "--size", "--smoothing", "--start",
-    "--start-frame", "--threads", "--tolerance", "--up", "--validation-ratio", "--view", "--with-roots",
+    "--frame-offset", "--frames", "--guard", "--guard-width", "--half-shapes", "--hidden-layers", "--judge",
+    "--learning-rate", "--limit-max", "--limit-mean", "--limits-from", "--limits-margin", "--linear-path",
+    "--local-neurons", "--meters-per-unit", "--neurons", "--no-animation", "--no-preload", "--no-viewer", "--order",
+    "--patience", "--pictures", "--preload", "--principal-accuracy", "--principal-limit", "--principal-shapes",
+    "--range", "--repeat", "--rest-frame", "--scale", "--seed", "--size", "--smoothing", "--start", "--start-frame",
+    "--threads", "--title", "--tolerance", "--up", "--validation-ratio", "--view", "--with-roots",
     // clang-format on
 };
 
