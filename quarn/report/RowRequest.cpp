@@ -65,7 +65,7 @@ void give(std::vector<RowRequest>& rows, const char* flag, const std::vector<std
 } // namespace
 
 std::string Limit::text() const {
-    return isMillimetres ? numberText(value) + " mm" : numberText(100.0 * value) + " %";
+    return isMillimetres ? numberText(value) + " mm" : numberText(std::round(1e4 * value) / 100.0) + " %";
 }
 
 Limit limitOf(const std::string& text) {

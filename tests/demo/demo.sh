@@ -21,11 +21,13 @@ python=$(scripts/find_python.sh) || {
   exit 77
 }
 command_demo --all --output "$work/demo" --samples 40 --epochs 3
-for file in report.html preview.webp table.txt pictures/motion.0060.png pictures/offset.0060.png arm.png \
-  arm/report.html; do
+pages=()
+if [[ -s $(dirname "$quarn")/../clients/viewer/viewer.html ]]; then pages=({hand,hand-offset,hand-direct,arm}.html); fi
+for file in report.html table.txt arm.png arm/report.html "${pages[@]}"; do
   [[ -s $work/demo/$file ]] || fail "the demo made no $file"
 done
-"$python" tests/demo/recompute.py "$work/demo"
+compgen -G "$work/demo/pictures/hand-offset.*.png" >/dev/null || fail "the demo drew no picture of offsets"
+"$python" tests/demo/recompute.py "$work/demo" "$quarn"
 
 # zero_errors MODE FIGURE: what a model of zeros leaves
 for mode in surface offset; do

@@ -54,6 +54,8 @@ def check_stage(stage: dict, lists: dict, errors: list[list[float]], diagonal: f
         near(stage[f"{name}_mm"], flat[math.ceil(part * len(flat)) - 1], name, 1 / 1024)
     worst = errors[stage["worst"]["frame"] - 1][stage["worst"]["vertex"]]
     near(worst, flat[-1], "the worst vertex's")
+    if stage["worst"]["joint"] != ("left", "right")[stage["worst"]["vertex"] % 2]:
+        sys.exit(f"the worst vertex is not at {stage['worst']['joint']}")
     for rows, key in ((errors, "frameErrors"), (list(zip(*errors)), "vertexErrors")):
         for name, of in (("mean_mm", lambda row: sum(row) / len(row)), ("max_mm", max)):
             for number, row in enumerate(rows):
