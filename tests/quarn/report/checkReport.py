@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-"""checkReport.py make FOLDER | check FOLDER REPORT NAME TITLE: the target of the test's scene; and whether a report says what
-the files say, by other arithmetic, and is a page that a foreign parser takes."""
+"""checkReport.py make FOLDER | check FOLDER REPORT NAME TITLE: the target of the test's scene; and whether a report
+says what the files say, by other arithmetic, and is a page that a foreign parser takes."""
 
 import array
 import json
@@ -56,10 +56,10 @@ def check_stage(stage: dict, lists: dict, errors: list[list[float]], diagonal: f
     near(worst, flat[-1], "the worst vertex's")
     if stage["worst"]["joint"] != ("left", "right")[stage["worst"]["vertex"] % 2]:
         sys.exit(f"the worst vertex is not at {stage['worst']['joint']}")
-    for rows, key in ((errors, "frameErrors"), (list(zip(*errors)), "vertexErrors")):
-        for name, of in (("mean_mm", lambda row: sum(row) / len(row)), ("max_mm", max)):
-            for number, row in enumerate(rows):
-                near(lists[key][name][number], of(row), f"{key} {name} {number}")
+    for rows, key in ((errors, "frameErrors"), ([list(vertex) for vertex in zip(*errors)], "vertexErrors")):
+        for number, row in enumerate(rows):
+            near(lists[key]["mean_mm"][number], sum(row) / len(row), f"{key} mean {number}")
+            near(lists[key]["max_mm"][number], max(row), f"{key} max {number}")
 
 
 class Page(HTMLParser):
@@ -91,7 +91,8 @@ def check_page(text: str, name: str, title: str) -> None:
     tags = [tag for tag, _ in page.seen]
     if page.open or "script" in tags or "b" in tags or "link" in tags:
         sys.exit(f"the page is left open at {page.open}, or has elements of the name")
-    if page.texts.count(title) != 2 or name not in "".join(page.texts) or "".join(page.texts).count("There is no page") != 1:
+    text_of_all = "".join(page.texts)
+    if page.texts.count(title) != 2 or name not in text_of_all or text_of_all.count("There is no page") != 1:
         sys.exit("the page does not say names as they are, or why there is no viewer")
     if (tags.count("svg"), tags.count("img")) != (4, 2):
         sys.exit("there are not four charts and two pictures")
@@ -124,7 +125,7 @@ def check(folder: Path, report: Path, name: str, title: str) -> None:
     facts = {key: said[key] for key in ("format", "version", "title", "isMotion", "kept")}
     if facts != {"format": "neuralWarp report", "version": 2, "title": title, "isMotion": True, "kept": False}:
         sys.exit(f"the report says of itself {facts}")
-    if row["limits"]["mean"]["kept"] is not True or row["limits"]["max"]["kept"] is not False or row["base"] is not None:
+    if [row["limits"][what]["kept"] for what in ("mean", "max")] != [True, False] or row["base"] is not None:
         sys.exit(f"limits: {row['limits']}")
     if (row["epochs"], row["training"]["seed"], row["training"]["settings"]) != (3, 7, {"neurons": "32"}):
         sys.exit(f"training: {row['training']}")

@@ -44,7 +44,7 @@ printf 'epoch,training,validation\n1,0.5,0.6\n2,0.25,0.3\n3,0.2,0.4\n' >"$work/t
 
 # figures, files, and what is to be sent: against other arithmetic and a foreign parser
 name='<b onload>&"wave' title='</script><b onload="x">a wave'
-expect 0 'takes away 75 % of the error at .* worst 80 mm at (left|right) \(vertex .*\), frame 11\.' "There is no page " \
+expect 0 'takes away 75 % of the error at .* worst 80 mm at (left|right) \(vertex .*\), frame 11\.' "There is no page .*none\.html" \
   report "$name=$scene" -o "$work/made/deep" --frames 1-11 --training "$work/training" --limit-mean 30% --limit-max 70mm \
   --pictures 2 --title "$title"
 "$quarn" play "$scene" --frames 1-11 --against target --json >"$work/played.json"
