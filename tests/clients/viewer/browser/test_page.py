@@ -370,12 +370,12 @@ class DrawingTest(PageTest):
             neuralWarp.setHeat(['off', 'before', 'after'][i %% 3]);
             neuralWarp.draw();
         } })()"""
-        page.evaluate(play % 24)
+        page.evaluate(play % 240)  # until the browser has compiled what it will
         before, heap = page.evaluate("neuralWarp.memory()"), page.heap_bytes()
         self.assertGreater(min(before.values()), 0)
         page.evaluate(play % 1000)
         self.assertEqual(page.evaluate("neuralWarp.memory()"), before)
-        self.assertLess(page.heap_bytes() - heap, 1e6)
+        self.assertLess(page.heap_bytes() - heap, 5e5)
 
 
 if __name__ == "__main__":
