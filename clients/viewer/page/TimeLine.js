@@ -13,7 +13,6 @@ export class TimeLine {
     new ErrorCurve(byId('curve'), view.manifest.frameErrors);
     this.scrub = byId('scrub');
     this.scrub.max = String(this.frames - 1);
-    byId('time').hidden = this.frames < 1;
     this.#listen();
     this.#nameTheWorst(showWorst);
     view.onDraw.push(() => this.#follow());

@@ -70,7 +70,8 @@ function makePicture(core, manifest) {
     const { clientWidth, clientHeight } = byId('stage');
     stage.resize(Math.max(1, clientWidth), Math.max(1, clientHeight), Math.min(2, devicePixelRatio || 1));
   };
-  byId('time').hidden = core.count.frames < 1; // has its height before the picture has
+  byId('time').hidden = core.count.frames < 1; // these have their heights before the picture has its own
+  byId('track').toggleAttribute('data-plain', !manifest.frameErrors);
   fill();
   camera.fit(reachOf(core));
   new ResizeObserver(() => {
