@@ -30,6 +30,8 @@ SumShapes sumShapes([[maybe_unused]] quill::InstructionSet set) {
 #if defined(__x86_64__)
     if (set >= quill::InstructionSet::avx)
         return sumShapesAvx;
+#elif defined(__wasm_simd128__)
+    return sumShapesSimd128;
 #endif
     return sumShapesPlain;
 }

@@ -15,6 +15,8 @@ using SumShapes = void (*)(float* sums, const float* block, const float* coeffic
 void sumShapesPlain(float* sums, const float* block, const float* coefficients, std::size_t shapes);
 // Only on x86-64, and only to be called where the processor has AVX.
 void sumShapesAvx(float* sums, const float* block, const float* coefficients, std::size_t shapes);
+// Only for WebAssembly with vectors.
+void sumShapesSimd128(float* sums, const float* block, const float* coefficients, std::size_t shapes);
 
 // The same of halves, each multiplied by the scale of its shape first, in single precision: the sums that the floats
 // have which are stored for them. scales [shapes]; all halves finite.

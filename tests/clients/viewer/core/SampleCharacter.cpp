@@ -21,7 +21,8 @@ constexpr std::uint32_t none = 0xFFFFFFFF;
 SampleCharacter::SampleCharacter(const SampleOptions& options)
     : options_(options)
     , state_(options.seed)
-    , mesh_(shuffled(makeIcosphere(options.subdivisions), options.seed))
+    , mesh_(shuffled(options.grid != 0 ? makeGrid(options.grid, options.grid) : makeIcosphere(options.subdivisions),
+                     options.seed))
     , n_(mesh_.vertexCount())
     , slots_(options.isPartial ? n_ / 3 : n_) {
     const bool hasRig = options.hasRig && !options.takesPoints;

@@ -17,6 +17,7 @@
 struct SampleOptions {
     std::uint32_t seed = 1;
     std::size_t subdivisions = 2; ///< of the icosphere that it is
+    std::size_t grid = 0;         ///< or, above 0, quads along each side of the grid
     std::uint32_t frames = 4;
     std::uint32_t controls = 9;
     std::uint32_t shapes = 7;    ///< principal shapes; 0: the network gives deltas
