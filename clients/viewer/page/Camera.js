@@ -13,8 +13,8 @@ const margin = 1.06;
 const steepest = 89.9; // degrees: above the pole there is no up
 
 export class Camera {
-  /** `element` is dragged on; `view` has azimuth and elevation in degrees, and up. `onTurn` is called after each change. */
-  constructor(element, view, onTurn) {
+  /** `element` is dragged on; `view` has azimuth and elevation in degrees, and up. */
+  constructor(element, view) {
     const [right, up, viewer] = fronts[view?.up] ?? fronts.y;
     const azimuth = radians(view?.azimuth ?? 30);
     const elevation = radians(Math.max(-steepest, Math.min(steepest, view?.elevation ?? 15)));
@@ -24,7 +24,6 @@ export class Camera {
     this.three.up.copy(up);
     this.orbit = new OrbitControls(this.three, element);
     this.orbit.zoomToCursor = true;
-    this.orbit.addEventListener('change', onTurn);
     this.sphere = new Sphere(new Vector3(), 1);
   }
 

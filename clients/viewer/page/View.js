@@ -155,7 +155,12 @@ export class View {
       this.onFailure.forEach((tell) => tell(error));
       return;
     }
-    this.onDraw.forEach((tell) => tell(this));
+    this.tell();
+  }
+
+  /** Tells who follows what is shown. */
+  tell() {
+    this.onDraw.forEach((follow) => follow(this));
   }
 
   #drawSides() {

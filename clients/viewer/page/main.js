@@ -42,7 +42,7 @@ async function start() {
 
   const parts = { manifest, core, view, camera, stage, timings: page.timings };
   makePanels(parts);
-  view.draw();
+  view.tell();
   await shown();
   prove(parts, damaged);
   await addTextures(stage, manifest, view);
@@ -59,26 +59,33 @@ function openCore(core, damaged) {
 }
 
 function makePicture(core, manifest) {
-  let stage;
-  let view;
-  const camera = new Camera(byId('canvas'), manifest.view, () => view?.ask());
-  stage = makeStage(core, camera);
-  view = new View(core, manifest, stage);
-  view.onFailure.push(tellLater);
-  byId('canvas').append(stage.element);
-  const fill = () => {
-    const { clientWidth, clientHeight } = byId('stage');
-    stage.resize(Math.max(1, clientWidth), Math.max(1, clientHeight), Math.min(2, devicePixelRatio || 1));
-  };
   byId('time').hidden = core.count.frames < 1; // these have their heights before the picture has its own
   byId('track').toggleAttribute('data-plain', !manifest.frameErrors);
-  fill();
+  const camera = new Camera(byId('canvas'), manifest.view);
+  const stage = makeStage(core, camera);
+  const view = new View(core, manifest, stage);
+  view.onFailure.push(tellLater);
+  byId('canvas').append(stage.element);
+  followSize(stage, () => view.draw());
   camera.fit(reachOf(core));
-  new ResizeObserver(() => {
-    fill();
-    view.draw();
-  }).observe(byId('stage'));
+  camera.orbit.addEventListener('change', () => view.ask());
   return { view, camera, stage };
+}
+
+// gives the stage its size, and again whenever it changes
+function followSize(stage, onChange) {
+  let [width, height] = [0, 0];
+  const isNew = () => {
+    const { clientWidth, clientHeight } = byId('stage');
+    if (clientWidth === width && clientHeight === height) return false;
+    [width, height] = [clientWidth, clientHeight];
+    stage.resize(Math.max(1, width), Math.max(1, height), Math.min(2, devicePixelRatio || 1));
+    return true;
+  };
+  isNew();
+  new ResizeObserver(() => {
+    if (isNew()) onChange();
+  }).observe(byId('stage'));
 }
 
 // the corners of a box around some frames of the motion
@@ -141,8 +148,8 @@ function giveEdges(core, stage) {
 
 function prove({ core, manifest, view, stage, timings }, damaged) {
   page.verdict = verdictOf(core, manifest, damaged);
-  view.forget();
-  view.draw();
+  view.forget(); // the picture is still that of the first frame
+  view.compute();
   timings.toVerdictMs = performance.now();
   timings.frameMs = view.frameMs;
   showVerdict(page.verdict);
