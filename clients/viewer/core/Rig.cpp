@@ -195,9 +195,10 @@ void Rig::readWeights(const Blocks& blocks, const Settings& settings) {
         const std::size_t count = hasFactors ? counts[i] : 0;
         if (values[i] != none) {
             checkIndex("rig.weights", "free value", values[i], freeValues_.size());
-        } else {
+        } else if (count != 0) { // else there is no weight: it moves nothing
             const auto of = factors.subspan(first, count);
             const auto all = ramps.empty() ? ramps : ramps.subspan(3 * first, 3 * count);
+            // a page has ramps for all or for none, and those of 0 stand for none
             const bool hasRamps = std::any_of(all.begin(), all.end(), [](double place) { return place != 0.0; });
             const auto through = all.first(hasRamps ? all.size() : 0);
             combined_.push_back({i, {of.begin(), of.end()}, {through.begin(), through.end()}});

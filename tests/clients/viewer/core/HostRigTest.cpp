@@ -87,7 +87,7 @@ protected:
             setList("b.shapes[0].shape" + at + "deltas",
                     {deltas.begin() + static_cast<std::ptrdiff_t>(3 * first),
                      deltas.begin() + static_cast<std::ptrdiff_t>(3 * (first + counts[i]))});
-            if (weightValues[i] == none)
+            if (factorCounts[i] != 0)
                 run("setAttr b.combination" + at + "factors" + listOf(factors, factor, factorCounts[i]) +
                     "; setAttr b.combination" + at + "ramps" + listOf(ramps, 3 * factor, 3 * factorCounts[i]));
         }

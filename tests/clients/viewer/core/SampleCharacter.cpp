@@ -13,7 +13,7 @@ namespace {
 
 using Words = std::vector<std::uint32_t>;
 
-constexpr std::uint32_t matrices_ = 6, joints_ = 5, sliders_ = 6, blendShapes_ = 4, freeValues_ = 3, converters_ = 4;
+constexpr std::uint32_t matrices_ = 6, joints_ = 5, sliders_ = 6, blendShapes_ = 5, freeValues_ = 3, converters_ = 4;
 constexpr std::uint32_t none = 0xFFFFFFFF;
 
 } // namespace
@@ -210,8 +210,8 @@ void SampleCharacter::addRig() {
         for (std::size_t word = 0; word < 5; ++word)
             controls.push_back(first[(5 * i + word) % first.size()]);
     put("rig.controls", controls);
-    put("rig.weights", Words{0, none, 1, none});
-    put("rig.factorCounts", Words{0, 2, 0, 1});
+    put("rig.weights", Words{0, none, 1, none, none}); // products, and one of no weight
+    put("rig.factorCounts", Words{0, 2, 0, 1, 0});
     put("rig.factors", Words{0, 2, 2});
     put("rig.ramps", std::vector<double>{0.0, 0.5, 1.5, -0.5, 0.25, 2.0, -1.0, 1.0, 1.0});
     put("skin.joints", Words{2, 0, none, 1, 4, 3});
