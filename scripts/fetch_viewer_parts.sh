@@ -22,7 +22,7 @@ unpack() {
 
 [[ -e $target/stamp && $(<"$target/stamp") == "$stamp" ]] && exit 0
 if [[ ${1:-} == --what ]]; then # what would be loaded, and how much
-  say_what_to_load "three.js" 9 "${three[@]:0:2}"
+  say_what_to_load "three.js" 5 "${three[@]:0:2}"
   say_what_to_load "esbuild" 5 "${esbuild[@]:0:2}"
   exit 0
 fi
