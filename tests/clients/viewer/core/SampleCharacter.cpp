@@ -126,14 +126,15 @@ void SampleCharacter::addModel() {
 }
 
 void SampleCharacter::addNetwork(std::size_t outputs) {
-    constexpr std::uint32_t matmul = 1, add = 2, relu = 10;
+    constexpr std::uint32_t matmul = 1, add = 2, tanh = 11, sigmoid = 12;
+    const std::uint32_t curve = options_.hidden % 2 == 0 ? tanh : sigmoid;
     const auto c = options_.controls, hidden = options_.hidden, out = static_cast<std::uint32_t>(outputs);
     if (hidden != 0) {
         const std::vector<double> weights = randoms(std::size_t{hidden} * (c + outputs), -0.5, 0.5);
         put("network.constants", std::vector<float>(weights.begin(), weights.end()));
         put("network.words",
             Words{1,      4, c,      out, 3,    3,          c,          hidden,       hidden, out, // widths
-                  matmul, 0, none,   1,   0,    c * hidden, 0,          relu,         1,      none, 2, 0,
+                  matmul, 0, none,   1,   0,    c * hidden, 0,          curve,        1,      none, 2, 0,
                   0,      0, matmul, 2,   none, 3,          c * hidden, hidden * out, 0});
         return;
     }

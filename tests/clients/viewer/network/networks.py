@@ -27,7 +27,8 @@ def numbers(*shape: int) -> np.ndarray:
     return RANDOM.uniform(-1, 1, shape).astype(np.float32)
 
 
-def trained(name: str, outputs: int, guard: str = "none", controls: int = 23, local: bool = False, **changes: Any) -> None:
+def trained(name: str, outputs: int, guard: str = "none", controls: int = 23, local: bool = False,
+            **changes: Any) -> None:
     """A network as it is before the training, with its normalisation."""
     settings = Settings(**changes)
     torch.manual_seed(len(name))
@@ -69,7 +70,7 @@ def write_trained() -> None:
 
 
 def write_others() -> None:
-    row, one, square, w = numbers(1, 5), numbers(1), numbers(5, 5), numbers(5, 7)
+    row, square, w = numbers(1, 5), numbers(5, 5), numbers(5, 7)
     begin = node("Add", "x", "row", output="r")  # of one row
     for number, (turned, alpha, beta, c) in enumerate(itertools.product(
             (0, 1), (1.0, -2.5), (1.0, 0.75, 0.0), (None, numbers(7), numbers(1, 7), numbers(1), numbers(1, 1)))):
@@ -81,15 +82,17 @@ def write_others() -> None:
     single = [node("MatMul", "x", "w", output="one")]  # one value that is combined with many
     for kind in ("Add", "Sub", "Mul"):
         for order, pair in enumerate((("x", "one"), ("one", "x"), ("x", "c"), ("c", "x"), ("one", "c"), ("x", "s"))):
-            written(f"{kind}{order}", [*single, node(kind, *pair)], {"w": numbers(5, 1), "c": numbers(5), "s": numbers()})
-    bounds = {"low": np.float32(-0.4), "high": np.float32(0.3)}
+            written(f"{kind}{order}", [*single, node(kind, *pair)],
+                    {"w": numbers(5, 1), "c": numbers(5), "s": numbers()})
+    bounds = {"low": np.array(-0.4, np.float32), "high": np.array(0.3, np.float32)}
     for name, ends in (("both", ("low", "high")), ("low", ("low",)), ("high", ("", "high")), ("free", ())):
         written(f"clip_{name}", [node("Clip", "x", *ends)], bounds)
     written("max", [node("Max", "c", "x")], {"c": numbers(5)})
     written("leaky", [node("LeakyRelu", "x")], {})
     values = numpy_helper.from_array(numbers(5))
     written("constant", [node("Constant", output="c", value=values), node("Constant", output="s", value_float=0.3),
-                         node("Identity", "s", output="t"), node("Add", "x", "c", output="z"), node("Mul", "z", "t")], {})
+                         node("Identity", "s", output="t"), node("Add", "x", "c", output="z"),
+                         node("Mul", "z", "t")], {})
     written("unused", [node("Softmax", "x", output="z"), node("Tanh", "x")], {})
 
 
@@ -97,7 +100,8 @@ def write_refused() -> None:
     w, row = numbers(5, 5), numbers(1, 5)
     for kind, inputs in (("Gather", ("x", "w")), ("Softmax", ("x",)), ("Div", ("x", "w")), ("Pow", ("x", "w")),
                          ("Exp", ("x",)), ("Reshape", ("x", "w")), ("If", ("x",)), ("Constant", ())):
-        written(f"no_{kind}", [node(kind, *inputs)], {"w": w}, f'the operator "{kind}" of node "the {kind}" is none that')
+        written(f"no_{kind}", [node(kind, *inputs)], {"w": w},
+                f'the operator "{kind}" of node "the {kind}" is none that')
     written("no_domain", [node("Tanh", "x", domain="com.example")], {}, '"com.example.Tanh" of node "the Tanh" is none')
     written("two", [node("MatMul", "x", "x")], {}, "multiplies two vectors")
     written("long", [node("MatMul", "x", "w")], {"w": numbers(6, 5)}, "multiplies 5 numbers by a matrix of 6 rows")
@@ -106,10 +110,12 @@ def write_refused() -> None:
     written("int64", [node("Add", "x", "c")], {"c": np.arange(5)}, '"c", which is of int64 numbers and not of float32')
     written("attribute", [node("Add", "x", "c", axis=1)], {"c": numbers(5)}, '"axis", of which a page knows nothing')
     written("kind", [node("LeakyRelu", "x", alpha=1)], {}, '"alpha" of a kind that is not known')
-    written("turned", [node("Add", "x", "r", output="z"), node("Gemm", "z", "w", transA=1)], {"r": row, "w": w}, "column")
-    written("outer", [node("Add", "x", "r", output="z"), node("MatMul", "w", "z")], {"r": row, "w": w}, "one of one row")
+    written("turned", [node("Add", "x", "r", output="z"), node("Gemm", "z", "w", transA=1)], {"r": row, "w": w},
+            "column")
+    written("outer", [node("Add", "x", "r", output="z"), node("MatMul", "w", "z")], {"r": row, "w": w},
+            "one of one row")
     written("bounds", [node("Clip", "x", "x")], {}, "computed bounds")
-    written("nan", [node("Clip", "x", "c")], {"c": np.float32(np.nan)}, "bound that is no number")
+    written("nan", [node("Clip", "x", "c")], {"c": np.array(np.nan, np.float32)}, "bound that is no number")
     written("early", [node("Add", "x", "z")], {}, 'takes "z", which nothing before it gives')
     written("twice", [node("Tanh", "x"), node("Relu", "x")], {}, 'the name "y" stands for two things')
     written("still", [node("Identity", "w")], {"w": w}, 'the output "y" does not come from the controls')
