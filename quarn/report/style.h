@@ -24,8 +24,10 @@ a { color: var(--after); }
 .weak, figcaption { font-size: .875rem; }
 table { border-collapse: collapse; width: 100%; font-variant-numeric: tabular-nums; font-size: .9rem; }
 th, td { padding: .35rem .6rem; text-align: right; border-bottom: 1px solid var(--line); vertical-align: top; }
-th { font-weight: 600; overflow-wrap: normal; }
-th:first-child, td:first-child { text-align: left; }
+th { font-weight: 600; }
+th, td { overflow-wrap: normal; }
+th:first-child, td:first-child { text-align: left; min-width: 5.5em; overflow-wrap: anywhere; }
+td small { overflow-wrap: anywhere; }
 td small { display: block; }
 table + table { margin-top: 1.25rem; }
 tr.best td { font-weight: 600; }
@@ -51,7 +53,7 @@ dt { color: var(--weak); }
 dd { margin: 0; white-space: pre-line; }
 details { font-size: .9rem; margin: .5rem 0; }
 summary { cursor: pointer; color: var(--weak); }
-@media (max-width: 640px) { table.wide .more { display: none; } dl { grid-template-columns: 1fr; } dd { margin: 0 0 .4rem; } }
+@media (max-width: 640px) { table { font-size: .78rem; } th, td { padding: .3rem .25rem; } table.wide .more { display: none; } dl { grid-template-columns: 1fr; } dd { margin: 0 0 .4rem; } }
 @page { margin: 14mm; }
 @media print {
   :root { color-scheme: light; --ground: #fff; --text: #000; --weak: #444; --line: #bbb; --card: #fff; --before: #b35c00;
