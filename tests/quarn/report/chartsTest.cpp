@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Charts are XML, and what is drawn lies in the picture, whatever the values are.
 #include "quarn/report/charts.h"
+#include "quarn/report/escaped.h"
 
 #include <gmock/gmock.h>
 #include <pugixml.hpp>
@@ -65,6 +66,11 @@ TEST(Charts, DrawWhateverTheyAreGiven) {
         heights.push_back(bar.attribute("height").as_double());
     ASSERT_EQ(heights.size(), 2U);
     EXPECT_NEAR(heights[1], 2 * heights[0], 0.2);
+}
+
+TEST(Charts, TextsAreNoMarkup) {
+    EXPECT_EQ(escaped("<b a='x' c=\"y\">&amp;\x1b\xff</b>"),
+              "&lt;b a=&#39;x&#39; c=&quot;y&quot;&gt;&amp;amp;\\u001b\\u00ff&lt;/b&gt;");
 }
 
 TEST(Charts, ScalesHaveRoundNumbers) {
