@@ -8,6 +8,7 @@
 #include <cmath>
 #include <cstdlib>
 #include <limits>
+#include <tuple>
 #include <utility>
 
 namespace viewer {
@@ -66,9 +67,9 @@ float shareOf(float error, float range) {
 }
 
 // to the nearest: casts cut off, so what they get is made positive
-std::int64_t subpixelOf(float pixel) {
+std::int32_t subpixelOf(float pixel) {
     constexpr double shift = 4.0 * guard * subpixels + half;
-    return static_cast<std::int64_t>(static_cast<double>(pixel) * subpixels + shift) - static_cast<std::int64_t>(shift);
+    return static_cast<std::int32_t>(static_cast<double>(pixel) * subpixels + shift) - static_cast<std::int32_t>(shift);
 }
 
 // the first and the last pixel whose middle is not before, or behind, a place
@@ -87,17 +88,11 @@ T* allocated(std::size_t count) {
 
 } // namespace
 
-// Subpixels, y down; what is linear between them on the screen: depth, 1 / w, and the colour divided by w.
-struct Raster::Projected {
-    std::int64_t x = 0, y = 0;
-    Values values{};
-};
-
 // Twice the area of a, b and a place: above 0 where it is to the right of the way from a to b as one sees it.
 struct Raster::Edge {
     Edge(const Projected& a, const Projected& b)
-        : dx(b.x - a.x)
-        , dy(b.y - a.y)
+        : dx(std::int64_t{b.x} - a.x)
+        , dy(std::int64_t{b.y} - a.y)
         , x(a.x)
         , y(a.y)
         // what lies on an edge belongs to the triangle that has it on its left or on its top
@@ -188,6 +183,8 @@ void Raster::place(const RasterCamera& camera, const RasterSurface& surface) {
         for (unsigned plane = 0; plane < planeCount; ++plane)
             if (!(inside(placed.vertex, plane) >= 0.0))
                 placed.outside |= static_cast<std::uint8_t>(1U << plane);
+        if (placed.outside == 0 && !project(placed.vertex, placed.projected))
+            placed.outside = notFinite;
     }
 }
 
@@ -198,16 +195,11 @@ Colour Raster::colourOf(const Placed& placed, float side) const {
     return isHeat_ ? Colour{placed.heat, RasterLight::ofHeat(normal), 0.0F} : light_.lit(normal, albedo_);
 }
 
-Raster::Vertex Raster::corner(std::size_t vertex, bool isBack) {
-    Placed& placed = placed_[vertex];
-    if (!isBack)
-        return placed.vertex;
+const Colour& Raster::backOf(Placed& placed) const {
     if (!placed.hasBack)
         placed.back = colourOf(placed, -1.0F);
     placed.hasBack = true;
-    Vertex corner = placed.vertex;
-    corner.colour = placed.back;
-    return corner;
+    return placed.back;
 }
 
 // How far inside of a plane, times something above 0. In double precision, as what is cut may be very large.
@@ -230,12 +222,16 @@ double Raster::inside(const Vertex& vertex, unsigned plane) const {
     }
 }
 
-// whether the corners go round with the clock: the volume that they span with the viewer is below 0
+// whether the corners go round with the clock
 bool Raster::isBack(const std::uint32_t* corners) const {
-    const Vertex& a = placed_[corners[0]].vertex;
-    const Vertex& b = placed_[corners[1]].vertex;
-    const Vertex& c = placed_[corners[2]].vertex;
-    const auto part = [](const Vertex& u, const Vertex& v, const Vertex& w) {
+    const Placed& a = placed_[corners[0]];
+    const Placed& b = placed_[corners[1]];
+    const Placed& c = placed_[corners[2]];
+    if ((a.outside | b.outside | c.outside) == 0)
+        return Edge(a.projected, b.projected).at(c.projected.x, c.projected.y) > 0;
+    // the volume that they span with the viewer is below 0
+    const auto part = [](const Placed& one, const Placed& two, const Placed& three) {
+        const auto [u, v, w] = std::tie(one.vertex, two.vertex, three.vertex);
         return static_cast<double>(u.w) * (static_cast<double>(v.x) * static_cast<double>(w.y) -
                                            static_cast<double>(v.y) * static_cast<double>(w.x));
     };
@@ -243,28 +239,37 @@ bool Raster::isBack(const std::uint32_t* corners) const {
 }
 
 void Raster::drawTriangle(const std::uint32_t* corners, bool isBack) {
-    const unsigned a = placed_[corners[0]].outside;
-    const unsigned b = placed_[corners[1]].outside;
-    const unsigned c = placed_[corners[2]].outside;
-    if (((a | b | c) & notFinite) != 0 || (a & b & c) != 0)
+    const std::array<Placed*, 3> placed{&placed_[corners[0]], &placed_[corners[1]], &placed_[corners[2]]};
+    const unsigned any = placed[0]->outside | placed[1]->outside | placed[2]->outside;
+    if ((any & notFinite) != 0 || (placed[0]->outside & placed[1]->outside & placed[2]->outside) != 0)
         return;
-    const std::array<Vertex, 3> triangle{corner(corners[0], isBack), corner(corners[1], isBack),
-                                         corner(corners[2], isBack)};
-    if ((a | b | c) == 0)
-        fill(triangle[0], triangle[1], triangle[2]);
-    else
-        drawClipped(triangle, a | b | c);
+    if (any != 0) {
+        Polygon polygon;
+        for (Placed* corner : placed) {
+            polygon.add(corner->vertex);
+            if (isBack)
+                polygon.corners[polygon.count - 1].colour = backOf(*corner);
+        }
+        return drawClipped(polygon, any);
+    }
+    std::array<Projected, 3> seen{placed[0]->projected, placed[1]->projected, placed[2]->projected};
+    for (std::size_t i = 0; isBack && i < seen.size(); ++i) {
+        const Colour back = scaled(backOf(*placed[i]), seen[i].values[1]);
+        std::copy(back.begin(), back.end(), &seen[i].values[2]);
+    }
+    fill(seen);
 }
 
-void Raster::drawClipped(const std::array<Vertex, 3>& corners, unsigned planes) {
-    Polygon polygon;
-    for (const Vertex& corner : corners)
-        polygon.add(corner);
+void Raster::drawClipped(Polygon polygon, unsigned planes) {
     for (unsigned plane = 0; plane < planeCount; ++plane)
         if ((planes >> plane & 1U) != 0)
             polygon = clipped(polygon, plane);
-    for (std::size_t i = 2; i < polygon.count; ++i)
-        fill(polygon.corners[0], polygon.corners[i - 1], polygon.corners[i]);
+    for (std::size_t i = 2; i < polygon.count; ++i) {
+        std::array<Projected, 3> seen{};
+        if (project(polygon.corners[0], seen[0]) && project(polygon.corners[i - 1], seen[1]) &&
+            project(polygon.corners[i], seen[2]))
+            fill(seen);
+    }
 }
 
 Raster::Polygon Raster::clipped(const Polygon& polygon, unsigned plane) const {
@@ -306,10 +311,7 @@ bool Raster::project(const Vertex& vertex, Projected& projected) const {
     return true;
 }
 
-void Raster::fill(const Vertex& a, const Vertex& b, const Vertex& c) {
-    std::array<Projected, 3> p;
-    if (!project(a, p[0]) || !project(b, p[1]) || !project(c, p[2]))
-        return;
+void Raster::fill(std::array<Projected, 3> p) {
     std::int64_t area = Edge(p[0], p[1]).at(p[2].x, p[2].y);
     if (area == 0)
         return;

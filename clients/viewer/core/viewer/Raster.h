@@ -64,9 +64,16 @@ private:
         float x, y, z, w;
         Colour colour;
     };
+    /// Where it is on the screen: subpixels, y down; and what is linear between corners there: depth, 1 / w, and the
+    /// colour divided by w.
+    struct Projected {
+        std::int32_t x, y;
+        std::array<float, 5> values;
+    };
     /// A vertex of the surface. Its far side has no colour until it is asked for.
     struct Placed {
         Vertex vertex;
+        Projected projected; ///< where it is beyond no plane
         Colour back;
         std::array<float, 3> normal; ///< in camera space, of length 1
         float heat;                  ///< share of the range
@@ -74,7 +81,6 @@ private:
         bool hasBack;
     };
     struct Polygon;
-    struct Projected;
     struct Edge;
     struct Box;
 
@@ -82,15 +88,15 @@ private:
     void clear();
     void place(const RasterCamera& camera, const RasterSurface& surface);
     Colour colourOf(const Placed& placed, float side) const;
-    Vertex corner(std::size_t vertex, bool isBack);
+    const Colour& backOf(Placed& placed) const;
     double inside(const Vertex& vertex, unsigned plane) const;
     bool isBack(const std::uint32_t* corners) const;
     void drawTriangle(const std::uint32_t* corners, bool isBack);
-    void drawClipped(const std::array<Vertex, 3>& corners, unsigned planes);
+    void drawClipped(Polygon polygon, unsigned planes);
     Polygon clipped(const Polygon& polygon, unsigned plane) const;
     static Vertex between(const Vertex& from, const Vertex& to, double share);
     bool project(const Vertex& vertex, Projected& projected) const;
-    void fill(const Vertex& a, const Vertex& b, const Vertex& c);
+    void fill(std::array<Projected, 3> corners);
     template <class Number>
     void fillBox(const std::array<Projected, 3>& corners, std::int64_t area, const Box& box);
 

@@ -226,28 +226,36 @@ TEST(Raster, HeatEndsAtBothEndsOfTheRange) {
 
 // the side that the normals are not on is lit as if it had its own
 TEST(Raster, BothSidesAreLit) {
-    Mesh front, back;
+    Mesh front;
     for (const auto& [x, y] : {std::pair{-8.0, -8.0}, std::pair{-8.0, 40.0}, std::pair{40.0, -8.0}})
-        front.add(x, y, 0.0F, 8);
-    back = front;
-    std::swap(back.triangles[1], back.triangles[2]);
-    for (std::size_t v = 0; v < 3; ++v) {
-        const std::array<float, 3> normal{0.3F, 0.8F, 0.6F};
-        for (std::size_t axis = 0; axis < 3; ++axis) {
-            front.normals[3 * v + axis] = normal[axis];
-            back.normals[3 * v + axis] = -2.0F * normal[axis];
-        }
-    }
+        front.add(x, y, -1.0F, 8);
+    front.normals = {0.3F, 0.8F, 0.6F, 0.3F, 0.8F, 0.6F, -0.6F, 0.0F, 0.8F};
     Picture one(8), other(8);
-    one.draw(front.surface());
-    other.draw(back.surface());
-    EXPECT_EQ(one.bytes(), other.bytes());
     RasterCamera moved = straight; // which turns no normal
     moved.view[12] = -0.25F;
+    // straight on, in perspective, and cut by the near plane
+    for (const auto& [depth, camera] :
+         {std::pair{-1.0F, moved}, {-2.0F, perspective(0.1F, 9.0F)}, {1.0F, perspective(0.1F, 9.0F)}}) {
+        front.points[8] = depth;
+        Mesh back = front;
+        std::swap(back.triangles[1], back.triangles[2]);
+        for (float& number : back.normals)
+            number *= -2.0F;
+        one.draw(front.surface(), camera);
+        other.draw(back.surface(), camera);
+        EXPECT_THAT(other.bytes(), testing::Pointwise(testing::Truly([](const auto& both) {
+                                                          return std::abs(std::get<0>(both) - std::get<1>(both)) <= 1;
+                                                      }),
+                                                      one.bytes()))
+            << depth;
+    }
+    front.normals = {0.3F, 0.8F, 0.6F, 0.3F, 0.8F, 0.6F, 0.3F, 0.8F, 0.6F};
+    front.points[8] = -1.0F;
+    one.draw(front.surface());
     other.draw(front.surface(), moved);
     EXPECT_EQ(one.bytes(), other.bytes());
-    std::fill(back.normals.begin(), back.normals.end(), nan);
-    other.draw(back.surface());
+    std::fill(front.normals.begin(), front.normals.end(), nan);
+    other.draw(front.surface());
     EXPECT_NE(one.bytes(), other.bytes());
     EXPECT_EQ(other.at(4, 4)[3], 255);
 }
