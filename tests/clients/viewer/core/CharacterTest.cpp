@@ -147,7 +147,7 @@ TEST(ViewerCharacter, DrawsASphereWithSeams) {
     for (std::size_t i = 0; i < drawn.size(); ++i) {
         EXPECT_EQ(errors[i], character.errors(Shape::skin)[drawn[i]]);
         for (std::size_t axis = 0; axis < 3; ++axis) {
-            EXPECT_EQ(points[3 * i + axis], sphere[3 * drawn[i] + axis]);
+            EXPECT_EQ(points[3 * i + axis], sphere[std::size_t{3} * drawn[i] + axis]);
             EXPECT_NEAR(normals[3 * i + axis], 1e3F * points[3 * i + axis], 0.02F); // outwards
         }
     }
@@ -249,7 +249,7 @@ TEST(ViewerCharacter, RefusesDamagedBlocksByName) {
     auto controls = singular.get<std::uint32_t>("rig.controls");
     controls[28] = 0; // of the relative matrix
     singular.put("rig.controls", controls);
-    singular.put("rig.rest", std::vector<double>(5 * 16, 0.0));
+    singular.put("rig.rest", std::vector<double>(80, 0.0));
     EXPECT_THAT(problemOf(singular), testing::ContainsRegex("rig.rest.*joint . is singular"));
 }
 

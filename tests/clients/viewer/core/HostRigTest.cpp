@@ -89,7 +89,8 @@ protected:
                      deltas.begin() + static_cast<std::ptrdiff_t>(3 * (first + counts[i]))});
             if (factorCounts[i] != 0)
                 run("setAttr b.combination" + at + "factors" + listOf(factors, factor, factorCounts[i]) +
-                    "; setAttr b.combination" + at + "ramps" + listOf(ramps, 3 * factor, 3 * factorCounts[i]));
+                    "; setAttr b.combination" + at + "ramps" +
+                    listOf(ramps, 3 * factor, std::size_t{3} * factorCounts[i]));
         }
     }
 
@@ -133,9 +134,11 @@ protected:
                 continue;
             run("connectAttr j" + std::to_string(control[1]) + '.' + matrices[control[3]] + ' ' + name + ".input[0]");
             for (std::size_t bit = 0; control[0] == 2 && bit < 12; ++bit)
-                run("setAttr " + name + '.' + switches[bit] + (words[2 * control[4]] >> bit & 1U ? " on" : " off"));
+                run("setAttr " + name + '.' + switches[bit] +
+                    (words[std::size_t{2} * control[4]] >> bit & 1U ? " on" : " off"));
             if (control[0] == 2)
-                run("setAttr " + name + ".rotationConversion " + std::to_string(words[2 * control[4] + 1]));
+                run("setAttr " + name + ".rotationConversion " +
+                    std::to_string(words[std::size_t{2} * control[4] + 1]));
         }
     }
 

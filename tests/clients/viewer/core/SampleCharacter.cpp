@@ -13,7 +13,8 @@ namespace {
 
 using Words = std::vector<std::uint32_t>;
 
-constexpr std::uint32_t matrices_ = 6, joints_ = 5, sliders_ = 6, blendShapes_ = 5, freeValues_ = 3, converters_ = 4;
+constexpr std::uint32_t matrixCount = 6, jointCount = 5, sliderCount = 6, blendShapeCount = 5, freeValueCount = 3,
+                        converterCount = 4;
 constexpr std::uint32_t none = 0xFFFFFFFF;
 
 } // namespace
@@ -29,8 +30,8 @@ SampleCharacter::SampleCharacter(const SampleOptions& options)
     put("settings",
         Words{1, static_cast<std::uint32_t>(n_), options.deltaMode, options.passes, options.shapes,
               static_cast<std::uint32_t>(slots_), options.controls, options.frames, options.takesPoints ? 1U : 0U,
-              options.takesPoints ? 0 : matrices_, hasRig ? joints_ : 0, hasRig ? sliders_ : 0,
-              options.takesPoints ? 0 : blendShapes_, hasRig ? freeValues_ : 0, hasRig ? converters_ : 0, 0});
+              options.takesPoints ? 0 : matrixCount, hasRig ? jointCount : 0, hasRig ? sliderCount : 0,
+              options.takesPoints ? 0 : blendShapeCount, hasRig ? freeValueCount : 0, hasRig ? converterCount : 0, 0});
     addMesh();
     addModel();
     if (!options.takesPoints)
@@ -153,7 +154,8 @@ void SampleCharacter::addSkin() {
     for (std::size_t v = 0; v < n_; ++v) {
         counts.push_back(v % 17 == 0 ? 0 : 1 + below(4));
         for (const double weight : randoms(counts.back(), 0.1, 1.0)) {
-            influences.push_back((below(matrices_ - 4) + static_cast<std::uint32_t>(influences.size())) % matrices_);
+            influences.push_back((below(matrixCount - 4) + static_cast<std::uint32_t>(influences.size())) %
+                                 matrixCount);
             weights.push_back(weight / counts.back());
         }
     }
@@ -162,7 +164,7 @@ void SampleCharacter::addSkin() {
     put("skin.influences", influences);
     put("skin.weights", weights);
     Words shapeCounts, vertices;
-    for (std::uint32_t shape = 0; shape < blendShapes_; ++shape) {
+    for (std::uint32_t shape = 0; shape < blendShapeCount; ++shape) {
         const std::size_t before = vertices.size();
         for (std::uint32_t v = 0; v < n_; ++v)
             if (below(3) == 0)
@@ -177,7 +179,7 @@ void SampleCharacter::addSkin() {
 void SampleCharacter::addRig() {
     std::vector<std::int32_t> parents;
     std::vector<double> channels, spaces;
-    for (std::size_t i = 0; i < joints_; ++i) {
+    for (std::size_t i = 0; i < jointCount; ++i) {
         parents.push_back(i == 0 ? -1 : static_cast<std::int32_t>(below(i + 1)) - 1);
         const std::vector<double> moved = randoms(9, -1.5, 1.5), scaled = randoms(3, 0.5, 1.5);
         channels.insert(channels.end(), moved.begin(), moved.end());
@@ -189,13 +191,13 @@ void SampleCharacter::addRig() {
     put("rig.parents", parents);
     put("rig.orders", Words{below(6), below(6), below(6), below(6), below(6)});
     put("rig.channels", channels);
-    put("rig.rest", matrices(joints_));
+    put("rig.rest", matrices(jointCount));
     put("rig.space", spaces);
-    put("rig.values", randoms(freeValues_, 0.0, 1.0));
-    put("rig.sliders", Words{0, 3, 1, 4, joints_ - 1, 5, none, 0, none, 1, 2, 0});
-    put("rig.limits", randoms(3 * sliders_, -1.0, 1.0));
+    put("rig.values", randoms(freeValueCount, 0.0, 1.0));
+    put("rig.sliders", Words{0, 3, 1, 4, jointCount - 1, 5, none, 0, none, 1, 2, 0});
+    put("rig.limits", randoms(std::size_t{3} * sliderCount, -1.0, 1.0));
     put("rig.animated", Words{3, 5, none, 2});
-    put("frames.animated", randoms(2 * options_.frames, 0.1, 1.0));
+    put("frames.animated", randoms(std::size_t{2} * options_.frames, 0.1, 1.0));
     put("rig.constants", std::vector<double>{0.25});
     // Euler, a quaternion, two axes and scales, three axes and places; the switches of axes at random
     Words converters;
@@ -216,7 +218,7 @@ void SampleCharacter::addRig() {
     put("rig.factors", Words{0, 2, 2});
     put("rig.ramps", std::vector<double>{0.0, 0.5, 1.5, -0.5, 0.25, 2.0, -1.0, 1.0, 1.0});
     put("skin.joints", Words{2, 0, none, 1, 4, 3});
-    put("skin.binds", matrices(matrices_));
+    put("skin.binds", matrices(matrixCount));
 }
 
 void SampleCharacter::addMotion() {
@@ -231,10 +233,10 @@ void SampleCharacter::addMotion() {
     if (options_.takesPoints) {
         floats("frames.points", 3 * frames * n_, -1.0, 1.0);
     } else {
-        floats("frames.matrices", 12 * frames * matrices_, -1.0, 1.0);
-        put("frames.weights", randoms(frames * blendShapes_, 0.0, 1.0));
+        floats("frames.matrices", 12 * frames * matrixCount, -1.0, 1.0);
+        put("frames.weights", randoms(frames * blendShapeCount, 0.0, 1.0));
         if (options_.hasRig)
-            put("frames.sliders", randoms(frames * sliders_, -1.0, 1.0));
+            put("frames.sliders", randoms(frames * sliderCount, -1.0, 1.0));
     }
     const std::vector<double> target = randoms(3 * frames * n_, -32768.0, 32767.0);
     if (options_.hasTargetPoints) {
