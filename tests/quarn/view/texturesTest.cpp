@@ -224,7 +224,7 @@ TEST_F(TexturesTest, PicturesAreMadeSmallAndKeepTheirAlpha) {
         {300, 100, 3, false, false, 64, 21, 3, "image/jpeg"}, {300, 100, 4, false, true, 64, 21, 4, "image/png"},
         {10, 400, 4, false, false, 2, 64, 3, "image/png"},    {400, 1, 1, true, false, 64, 1, 3, "image/png"},
         {64, 64, 3, true, false, 64, 64, 3, "image/jpeg"},    {64, 64, 4, false, false, 64, 64, 3, "image/jpeg"},
-        {64, 64, 4, false, true, 64, 64, 4, "image/png"}};
+        {64, 64, 4, false, true, 64, 64, 4, "image/png"},     {8, 8, 4, false, false, 8, 8, 3, "image/png"}};
     for (const auto& row : rows) {
         Card card;
         card.picture = written(clouds(row.width, row.height, row.channels), row.isJpeg);
