@@ -11,14 +11,14 @@ import bpy
 import numpy as np
 
 HERE = Path(__file__).resolve().parent
-sys.path[:0] = [str(HERE), str(HERE.parents[2] / "clients" / "blender"), str(HERE.parents[2] / "examples" / "hand")]
+sys.path[:0] = [str(HERE), str(HERE.parents[2] / "clients" / "blender")]
 
 import neuralwarp_blender  # noqa: E402
 from neuralwarp_blender import jobs, live, run_folder, stack  # noqa: E402
 from rebuilt_arm import rebuild_arm  # noqa: E402
-from report import LIMITS  # noqa: E402
 
 FRAMES = 96
+WANTED = 1 / 16, 1 / 4  # of the plain armature's mean and largest error, as of the demo's hand (decision 0089)
 SAME = 1e-5  # of the diagonal: what single precision makes of a pose that goes through other numbers
 
 
@@ -139,8 +139,7 @@ def compare_with_targets(neural: np.ndarray, skins: np.ndarray, targets: np.ndar
     (mean, largest), (skin_mean, skin_largest) = errors(neural, targets), errors(skins, targets)
     say(f"left is 1/{skin_mean / mean:.1f} of the plain armature's mean error, 1/{skin_largest / largest:.1f} of its "
         "largest")
-    wanted_mean, wanted_largest = min(LIMITS.values())
-    assert mean < wanted_mean * skin_mean and largest < wanted_largest * skin_largest
+    assert mean < WANTED[0] * skin_mean and largest < WANTED[1] * skin_largest
 
 
 def refuse_another_mesh(folder: Path, thing: Any) -> None:

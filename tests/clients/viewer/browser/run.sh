@@ -15,5 +15,6 @@ if [[ $missing ]]; then
   exit 77
 fi
 python=$(scripts/find_python.sh)
-export NW_TEST_QUARN=$1 PYTHONPATH=$(cd "$here" && pwd) PYTHONDONTWRITEBYTECODE=1
+here=$(cd "$here" && pwd)
+export NW_TEST_QUARN=$1 PYTHONPATH=$here PYTHONDONTWRITEBYTECODE=1
 exec "$python" -W error::UserWarning -m unittest "$3"
