@@ -2,9 +2,9 @@
 #include "quarn/character/sourceGltf.h"
 
 #include "quarn/character/GltfBytes.h"
+#include "quarn/character/filesBeside.h"
 #include "quarn/character/gltfContainer.h"
 #include "quarn/character/gltfTypes.h"
-#include "quarn/character/filesBeside.h"
 #include "quarn/character/readApart.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/process/answerBytes.h"
