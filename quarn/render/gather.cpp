@@ -133,7 +133,8 @@ PixelSight Tracer::pixel(int x, int y) const {
         sight.position += place.position;
         sight.normal += place.normal;
         if (!surface_.heat.empty()) {
-            sight.albedo += decoded(place.heat == unmeasured ? unmeasuredColour : heatColour(place.heat));
+            // three weights of a hit make 1 up to rounding alone, which differs from processor to processor
+            sight.albedo += decoded(place.heat < unmeasured / 2 ? unmeasuredColour : heatColour(place.heat));
             continue;
         }
         sight.albedo += lights::clay;
