@@ -13,7 +13,11 @@ export function digits(value) {
 
 export const mm = (value) => `${digits(value)} mm`;
 
-export const percent = (part) => `${Math.round(100 * part)} %`;
+/** "93 %"; 100 % is all of it, and nothing less: "99.7 %". */
+export function percent(part) {
+  const value = 100 * part;
+  return value > 99 && value < 100 ? `${(Math.floor(10 * value) / 10).toFixed(1)} %` : `${Math.round(value)} %`;
+}
 
 /** "1.8 MB" of bytes, in thousands. */
 export function size(bytes) {

@@ -4,7 +4,7 @@ import assert from 'node:assert/strict';
 import { decodedSize, decodePlainly } from '../../../../clients/viewer/page/base64.js';
 import { Clock } from '../../../../clients/viewer/page/Clock.js';
 import { edgesOf } from '../../../../clients/viewer/page/edges.js';
-import { digits } from '../../../../clients/viewer/page/format.js';
+import { digits, percent } from '../../../../clients/viewer/page/format.js';
 
 const decoded = (text) => {
   const bytes = new Uint8Array(decodedSize(text));
@@ -38,3 +38,5 @@ assert.deepEqual(edgesOf([3, 4], [0, 1, 2, 2, 1, 4, 3], 5), Uint32Array.of(0, 1,
 for (const [value, text] of [[0, '0'], [128.4, '128'], [1000, '1000'], [100, '100'], [1.5, '1.5'], [0.03125, '0.0313'],
   [0.000248, '0.000248'], [9.999, '10'], [1e-5, '0.00001'], [2.5e-9, '2.5e-9'], [-0.5, '-0.5'], [NaN, '—'], [undefined, '—']])
   assert.equal(digits(value), text);
+for (const [part, text] of [[0, '0 %'], [0.934, '93 %'], [0.99, '99 %'], [0.9976, '99.7 %'], [0.99999, '99.9 %'], [1, '100 %'], [1.2, '120 %']])
+  assert.equal(percent(part), text);
