@@ -29,16 +29,6 @@ std::vector<double> distances(std::span<const double> xyz, std::span<const doubl
     return result;
 }
 
-double roundedUp(double value) {
-    if (!(value > 0.0))
-        return 1.0;
-    const double power = std::pow(10.0, std::floor(std::log10(value)));
-    for (const double step : {1.0, 2.0, 5.0})
-        if (value <= step * power * (1.0 + 1e-9))
-            return step * power;
-    return 10.0 * power;
-}
-
 Vec3 heatColour(float heat) {
     constexpr float last = stops.size() - 1;
     const float at = heat > 0.0F ? std::min(heat, 1.0F) * last : 0.0F;

@@ -12,9 +12,6 @@ namespace quarn {
 /// The distance of each vertex from its counterpart. `xyz` and `reference` x, y, z of as many vertices, in one unit.
 std::vector<double> distances(std::span<const double> xyz, std::span<const double> reference);
 
-/// The next of 1, 2 or 5 times a power of ten that is not below `value`; 1 for a value that is not above 0.
-double roundedUp(double value);
-
 /// sRGB, for 0 to 1; what is outside of it, and is not a number, has the colour of the nearer end.
 Vec3 heatColour(float heat);
 

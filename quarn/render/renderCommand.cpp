@@ -8,6 +8,7 @@
 #include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
+#include "quarn/console/numberText.h"
 #include "quarn/render/Subject.h"
 #include "quarn/render/drawJoints.h"
 #include "quarn/render/drawPanel.h"

@@ -7,7 +7,7 @@
 #include "quarn/process/askProgram.h"
 
 #include <algorithm>
-#include <cmath>
+#include <cstdlib>
 
 namespace quarn {
 namespace {
@@ -75,16 +75,6 @@ std::string valueOf(const Words& words, const std::string& flag) {
             return word[1];
     }
     return {};
-}
-
-double roundedUp(double value) {
-    if (!(value > 0.0))
-        return 1.0;
-    const double power = std::pow(10.0, std::floor(std::log10(value)));
-    for (const double factor : {1.0, 2.0, 5.0})
-        if (value <= factor * power * (1.0 + 1e-9))
-            return factor * power;
-    return 10.0 * power;
 }
 
 // one vertex in ten thousand may have the last colour though it is further away
