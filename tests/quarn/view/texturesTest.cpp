@@ -33,7 +33,8 @@ struct Pixels {
     int width = 0, height = 0, channels = 0;
     std::vector<unsigned char> values;
     std::array<int, 3> at(int x, int y) const {
-        const unsigned char* pixel = &values[static_cast<std::size_t>(channels * (y * width + x))];
+        const unsigned char* pixel =
+            &values[static_cast<std::size_t>(channels) * static_cast<std::size_t>(y * width + x)];
         return {pixel[0], pixel[1], pixel[2]};
     }
 };
@@ -56,7 +57,7 @@ Pixels read(const PageTexture& texture) {
                                                   static_cast<int>(texture.bytes.size()), &pixels.width, &pixels.height,
                                                   &pixels.channels, 0);
     if (values != nullptr)
-        pixels.values.assign(values, values + pixels.width * pixels.height * pixels.channels);
+        pixels.values.assign(values, values + std::ptrdiff_t{pixels.width} * pixels.height * pixels.channels);
     stbi_image_free(values);
     return pixels;
 }
@@ -240,7 +241,7 @@ TEST_F(TexturesTest, PicturesAreMadeSmallAndKeepTheirAlpha) {
         EXPECT_EQ(picture.channels, row.expected) << where;
         EXPECT_EQ(made.textures[0].mime, row.mime) << where;
         const std::array<int, 3> middle = picture.at(picture.width / 2, picture.height / 2);
-        EXPECT_NEAR(middle[0], 104 + row.width / 8, 10) << where;
+        EXPECT_NEAR(middle[0], 104 + row.width / 8.0, 10) << where;
         if (row.isJpeg && row.mime == "image/jpeg") {
             EXPECT_EQ(made.textures[0].bytes, card.picture);
         }

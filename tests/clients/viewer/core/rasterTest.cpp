@@ -48,9 +48,13 @@ public:
     void draw(const RasterSurface& surface, const RasterCamera& camera = straight) {
         ASSERT_TRUE(raster_.draw({size_, size_, 0, size_}, camera, surface));
     }
-    const std::uint8_t* at(std::uint32_t x, std::uint32_t y) const { return raster_.rgba() + 4 * (y * size_ + x); }
+    const std::uint8_t* at(std::uint32_t x, std::uint32_t y) const {
+        return raster_.rgba() + 4 * (std::size_t{y} * size_ + x);
+    }
     bool isCovered(std::uint32_t x, std::uint32_t y) const { return at(x, y)[3] != 0; }
-    std::vector<std::uint8_t> bytes() const { return {raster_.rgba(), raster_.rgba() + 4 * size_ * size_}; }
+    std::vector<std::uint8_t> bytes() const {
+        return {raster_.rgba(), raster_.rgba() + std::size_t{4} * size_ * size_};
+    }
     Raster& raster() { return raster_; }
 
 private:
@@ -112,7 +116,7 @@ TEST(Raster, PixelsOnSharedEdgesBelongToOneTriangle) {
             };
             grid[row][column] = {shifted(column), shifted(row)};
         }
-    std::vector<int> times(size * size);
+    std::vector<int> times(std::size_t{size} * size);
     for (std::uint32_t row = 0; row < cells; ++row)
         for (std::uint32_t column = 0; column < cells; ++column)
             for (const auto& corners : {std::array{0U, 1U, 2U}, std::array{3U, 2U, 1U}}) {
@@ -206,8 +210,9 @@ TEST(Raster, ColumnsOutsideStayAsTheyWere) {
             ASSERT_EQ(both.at(i % size, i / size)[channel], expected.at(i % size, i / size)[channel]) << i;
     }
     ASSERT_TRUE(both.raster().draw({size + 1, size, 0, 0}, straight, left.heat()));
-    EXPECT_THAT(std::vector<std::uint8_t>(both.raster().rgba(), both.raster().rgba() + 4 * (size + 1) * size),
-                testing::Each(0));
+    EXPECT_THAT(
+        std::vector<std::uint8_t>(both.raster().rgba(), both.raster().rgba() + std::size_t{4} * (size + 1) * size),
+        testing::Each(0));
 }
 
 TEST(Raster, HeatEndsAtBothEndsOfTheRange) {
