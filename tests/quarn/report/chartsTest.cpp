@@ -62,7 +62,8 @@ TEST(Charts, DrawWhateverTheyAreGiven) {
     bars.x.scale = {1.0, 100.0, true};
     bars.bars = {{"a", "before", {0.0, 5.0, 10.0}}, {"b", "after", {0, 0, 0}}};
     std::vector<double> heights;
-    for (const pugi::xml_node& bar : parsed(svgOf(bars)).child("svg").children("rect"))
+    const pugi::xml_document drawn = parsed(svgOf(bars));
+    for (const pugi::xml_node& bar : drawn.child("svg").children("rect"))
         heights.push_back(bar.attribute("height").as_double());
     ASSERT_EQ(heights.size(), 2U);
     EXPECT_NEAR(heights[1], 2 * heights[0], 0.2);

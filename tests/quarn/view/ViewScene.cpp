@@ -13,7 +13,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
-#include <cstring>
+#include <span>
 #include <sstream>
 
 namespace {
@@ -144,8 +144,8 @@ Page::Page(const std::filesystem::path& file)
         EXPECT_EQ(bytes.size(), block["bytes"].GetUint64()) << name;
         const std::uint64_t each = type == "bytes" ? 1 : std::stoul(type.substr(1)) / 8;
         EXPECT_EQ(bytes.size(), each * block["count"].GetUint64()) << name;
-        std::vector<std::byte> raw(bytes.size());
-        std::memcpy(raw.data(), bytes.data(), bytes.size());
+        const auto all = std::as_bytes(std::span(bytes));
+        std::vector<std::byte> raw(all.begin(), all.end());
         storage::Fnv64 sum;
         sum.add(raw);
         EXPECT_EQ(sum.text(), block["sum"].GetString()) << name;
