@@ -18,7 +18,7 @@ grep -qx 'samples=100 epochs=60' "$work/commands" || { echo "the tutorial has lo
 (($(grep -c '^\$quarn' "$work/commands") >= 10)) || { echo "the tutorial has lost its commands"; exit 1; }
 QUARN=$quarn bash -euo pipefail "$work/commands" | tee "$work/said"
 
-[[ -s $work/frame.png && -s $work/report/loss.png && -s $work/motion_neural.npy && -s $work/said/report.html ]]
+[[ -s $work/frame.png && -s $work/report/loss.png && -s $work/motion_neural.npy && -s $work/result/report.html ]]
 grep -q 'joined to 1159' "$work/said"
 # mean and p99 in mm, of what is left and of what was there before
 mapfile -t left < <(sed -n 's/^distance[^:]*: mean \([0-9.]*\) mm .*, p99 \([0-9.]*\) mm .*, p99\.99.*/\1 \2/p' "$work/said")
