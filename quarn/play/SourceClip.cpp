@@ -15,15 +15,6 @@ namespace {
 
 constexpr double millimetresPerMeter = 1000.0;
 
-HMatrix matrixOf(const HPlug& plug) {
-    HStatus status;
-    const HMatrix matrix = plug.asMatrix(&status);
-    if (status.error())
-        throw std::runtime_error(std::string(plug.name().asChar()) +
-                                 " could not be evaluated: " + status.errorString().asChar());
-    return matrix;
-}
-
 } // namespace
 
 SourceClip::SourceClip(const std::filesystem::path& path, MeshPolygons polygons, ClipMotion motion)

@@ -10,7 +10,6 @@
 #include <array>
 #include <cmath>
 #include <optional>
-#include <stdexcept>
 #include <string>
 
 namespace quarn {
@@ -61,10 +60,7 @@ void drawStick(Picture& picture, const Layout& layout, int left, Pixel a, float 
 std::vector<ShownJoint> shownJoints() {
     std::vector<ShownJoint> shown;
     for (const SceneJoint& joint : sceneJoints()) {
-        HStatus status;
-        const HMatrix matrix = plugOf(joint.node, "worldMatrix").asMatrix(&status);
-        if (status.error())
-            throw std::runtime_error(joint.name + ".worldMatrix: " + status.errorString().asChar());
+        const HMatrix matrix = matrixOf(plugOf(joint.node, "worldMatrix"));
         shown.push_back({HPoint(matrix(3, 0), matrix(3, 1), matrix(3, 2)), joint.parent});
     }
     return shown;

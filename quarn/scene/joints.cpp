@@ -35,10 +35,7 @@ Found found(const HObject& node) {
         return result;
     if (!source.isNull())
         result.joint.held = source.name().asChar();
-    HStatus status;
-    result.joint.space = matrix.asMatrix(&status);
-    if (status.error())
-        throw std::runtime_error(std::string(matrix.name().asChar()) + ": " + status.errorString().asChar());
+    result.joint.space = matrixOf(matrix);
     return result;
 }
 

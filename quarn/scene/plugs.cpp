@@ -130,6 +130,13 @@ double numberOf(const HPlug& plug) {
     return value;
 }
 
+HMatrix matrixOf(const HPlug& plug) {
+    HStatus status;
+    const HMatrix value = plug.asMatrix(&status);
+    requireRead(status, plug);
+    return value;
+}
+
 int wholeNumberOf(const HPlug& plug) {
     HStatus status;
     const int value = plug.asInt(&status);

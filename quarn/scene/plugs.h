@@ -4,6 +4,7 @@
 #pragma once
 
 #include "openquarn/HDoubleArray.h"
+#include "openquarn/HMatrix.h"
 #include "openquarn/HObject.h"
 #include "openquarn/HPlug.h"
 
@@ -44,6 +45,7 @@ void setList(const HPlug& plug, const std::vector<double>& values);
 double numberOf(const HPlug& plug);
 int wholeNumberOf(const HPlug& plug);
 std::string textOf(const HPlug& plug);
+HMatrix matrixOf(const HPlug& plug);
 /// Of an array of numbers: the elements that exist, in order of index.
 std::vector<double> numbersOf(const HPlug& array);
 std::vector<unsigned> indicesOf(const HPlug& array);

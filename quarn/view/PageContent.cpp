@@ -6,7 +6,6 @@
 #include <algorithm>
 #include <array>
 #include <map>
-#include <stdexcept>
 
 namespace quarn {
 namespace {
@@ -117,14 +116,6 @@ void addShapes(const std::vector<InputChain::Shape>& shapes, PageBlocks& blocks)
 void append(std::vector<double>& numbers, const HMatrix& matrix) {
     for (unsigned i = 0; i < 16; ++i)
         numbers.push_back(matrix[i / 4][i % 4]);
-}
-
-HMatrix matrixOf(const HPlug& plug) {
-    HStatus status;
-    const HMatrix matrix = plug.asMatrix(&status);
-    if (status.error())
-        throw std::runtime_error(std::string(plug.name().asChar()) + ": " + status.errorString().asChar());
-    return matrix;
 }
 
 void addJoints(const RigChain& rig, PageBlocks& blocks) {

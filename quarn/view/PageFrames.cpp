@@ -51,14 +51,6 @@ void addControls(const FrameSource& source, int frame, PageFrames& frames) {
     }
 }
 
-HMatrix matrixOf(const HPlug& plug) {
-    HStatus status;
-    const HMatrix matrix = plug.asMatrix(&status);
-    if (status.error())
-        throw std::runtime_error(std::string(plug.name().asChar()) + ": " + status.errorString().asChar());
-    return matrix;
-}
-
 void addChain(const InputChain& chain, PageFrames& frames) {
     for (const InputChain::Influence& influence : chain.influences)
         for (const double number : rig::affineOf(matrixOf(influence.bind) * matrixOf(influence.matrix)))
