@@ -70,6 +70,7 @@ void drawJoints(Picture& picture, const Layout& layout, int left, const Camera& 
                 const std::vector<ShownJoint>& joints) {
     const float size = static_cast<float>(std::min(layout.width, layout.height)) / 480.0F;
     std::vector<std::optional<Pixel>> pixels;
+    pixels.reserve(joints.size());
     for (const ShownJoint& joint : joints)
         pixels.push_back(seenAt(joint.place, camera, layout));
     for (std::size_t joint = 0; joint < joints.size(); ++joint)
