@@ -2,7 +2,7 @@
 // Where a training data set goes: FOLDER when it is complete, and FOLDER.part until then.
 #pragma once
 
-#include "quarn/dataset/Setup.h"
+#include "quarn/scene/Setup.h"
 
 #include <cstdint>
 #include <filesystem>

@@ -1,53 +1,20 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/dataset/sceneSetup.h"
 
-#include "quarn/scene/plugs.h"
+#include "quarn/scene/sceneFiles.h"
 
-#include "openquarn_app/SceneFile.h"
-#include "storage/FileIdentity.h"
 #include "storage/Fnv64.h"
 
-#include <fstream>
-#include <stdexcept>
+#include <span>
 
 namespace quarn {
 namespace {
-
-std::string sumOfFile(const std::filesystem::path& path) {
-    std::ifstream file(path, std::ios::binary);
-    std::vector<char> block(1U << 18U);
-    storage::Fnv64 sum;
-    while (file) {
-        file.read(block.data(), static_cast<std::streamsize>(block.size()));
-        sum.add(std::as_bytes(std::span(block).first(static_cast<std::size_t>(file.gcount()))));
-    }
-    if (!file.eof())
-        throw std::runtime_error(path.string() + " could not be read");
-    return sum.text();
-}
 
 std::string sumOf(const HUintArray& numbers) {
     storage::Fnv64 sum;
     for (const unsigned number : numbers)
         sum.add(std::as_bytes(std::span(&number, 1)));
     return sum.text();
-}
-
-std::string stateOfFile(const std::string& path) {
-    const auto identity = storage::identityOf(path);
-    if (!identity)
-        return "(not there)";
-    return std::to_string(identity->size) + " bytes of " + std::to_string(identity->seconds) + " s " +
-           std::to_string(identity->nanoseconds) + " ns";
-}
-
-// what deformers read are models, which have no part in training data
-void addFiles(Setup& setup) {
-    for (const OpenQuarn::ExternalContent& file : OpenQuarn::externalContent()) {
-        const std::string path = file.resolved.empty() ? file.unresolved : file.resolved;
-        if (!path.empty() && file.role != OpenQuarn::filePatternRole && nodeType(findNode(file.node)) != "neuralWarp")
-            setup.add("file " + file.unresolved + " of " + file.node + "." + file.key, stateOfFile(path));
-    }
 }
 
 std::string textOf(const FrameRange& frames) {
@@ -71,7 +38,7 @@ Setup sceneSetup(const std::filesystem::path& sceneFile, const Warp& warp, const
     setup.add("deformed vertices", sampler.map().affectCount());
     setup.add("sum of deformed vertices", sumOf(sampler.map().affectMap()));
     setup.add("target", geometry.target.name().asChar());
-    addFiles(setup);
+    addSceneFiles(setup, ReadFiles::withoutModels);
     setup.add("controls", sampler.names().size());
     for (std::size_t i = 0; i < sampler.names().size(); ++i)
         setup.add("control " + std::to_string(i), sampler.names()[i]);

@@ -2,7 +2,7 @@
 #pragma once
 
 #include "quarn/dataset/FrameSampler.h"
-#include "quarn/dataset/Setup.h"
+#include "quarn/scene/Setup.h"
 #include "quarn/scene/frames.h"
 
 #include <filesystem>

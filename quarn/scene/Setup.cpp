@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "quarn/dataset/Setup.h"
+#include "quarn/scene/Setup.h"
 
 #include "quarn/console/json.h"
 #include "storage/Json.h"

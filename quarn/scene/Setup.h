@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Everything that decides what is in a training data set: rows of two exports go together when all of it agrees.
+// Everything that decides what rows are, of a training data set or a point cache: they go together when all agrees.
 #pragma once
 
 #include <filesystem>
