@@ -38,7 +38,7 @@ Setup sceneSetup(const std::filesystem::path& sceneFile, const Warp& warp, const
     setup.add("deformed vertices", sampler.map().affectCount());
     setup.add("sum of deformed vertices", sumOf(sampler.map().affectMap()));
     setup.add("target", geometry.target.name().asChar());
-    addSceneFiles(setup, ReadFiles::withoutModels);
+    addFiles(setup, sceneFiles()); // models have no part in training data
     setup.add("controls", sampler.names().size());
     for (std::size_t i = 0; i < sampler.names().size(); ++i)
         setup.add("control " + std::to_string(i), sampler.names()[i]);

@@ -13,6 +13,7 @@
 #include "quarn/info/JointReport.h"
 #include "quarn/info/LineList.h"
 #include "quarn/info/ModelReport.h"
+#include "quarn/info/SceneFilesReport.h"
 #include "quarn/info/SceneReport.h"
 #include "quarn/info/SliderReport.h"
 #include "quarn/scene/SceneSession.h"
@@ -144,7 +145,7 @@ std::string summaryText(const SceneSummary& summary, const OpenedScene& opened) 
 struct Options {
     fs::path path, scene, controls, outputs;
     std::string deformer, geometry, frames;
-    bool json = false, devices = false, joints = false;
+    bool json = false, devices = false, joints = false, files = false;
 };
 
 void showDevices(bool asJson) {
@@ -201,10 +202,24 @@ void showJoints(const Options& options) {
     std::cout << printable(buffer.GetString()) << '\n';
 }
 
+void showFiles(const Options& options) {
+    SceneFilesReport report;
+    {
+        const Silence silence;
+        const StdoutAside aside;
+        SceneSession session;
+        session.open(options.path);
+        report = describeFiles(absolutePath(options.path), options.deformer);
+    }
+    std::cout << printable(options.json ? filesJson(report) : filesText(report));
+}
+
 void showScene(const Options& options) {
     requireNoCharacter(options.path);
     if (options.joints)
         return showJoints(options);
+    if (options.files)
+        return showFiles(options);
     const Stage stage([&] { return "looking into scene " + options.path.string(); });
     const SceneSummary summary = OpenQuarn::readSummary(absolutePath(options.path));
     if (!summary.outcome)
@@ -286,8 +301,9 @@ void showInfo(const Options& options) {
         return showDevices(options.json);
     if (options.path.empty())
         throw UsageError("quarn info needs the path of a scene file or a model directory, or --devices");
-    if (fs::is_directory(options.path) && options.joints)
-        throw UsageError(options.path.string() + " is a model directory, and --joints is for a scene");
+    if (fs::is_directory(options.path) && (options.joints || options.files))
+        throw UsageError(options.path.string() + " is a model directory, and " +
+                         (options.joints ? "--joints" : "--files") + " is for a scene");
     if (!options.frames.empty() && options.scene.empty())
         throw UsageError("--frames goes with --scene: the frames of it that the model is to know");
     if (fs::is_directory(options.path))
@@ -307,6 +323,10 @@ void addInfoCommand(CLI::App& app) {
     info->add_flag("--joints", options->joints,
                    "Of a scene: each joint, its parent, what is posed and how far, and "
                    "how many vertices it moves; and the sliders that are posed");
+    info->add_flag(
+        "--files", options->files,
+        "Of a scene: each file that it reads for its frames, those that are not there, and the frames of its "
+        "export range");
     info->add_option("--scene", options->scene, "Tell whether the model fits the deformer of this scene");
     info->add_option("--deformer", options->deformer, "The neuralWarp node, where there are several");
     info->add_option("--geometry", options->geometry, "Index or name of the mesh, where it deforms several");

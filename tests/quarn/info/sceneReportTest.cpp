@@ -2,17 +2,21 @@
 // What is said of a scene: its deformers, what they affect, and what is missing of it.
 #include "quarn/info/SceneReport.h"
 #include "openquarn/HFnDependencyNode.h"
+#include "openquarn_app/Commands.h"
 #include "openquarn_app/Messages.h"
 #include "openquarn_app/Plugins.h"
 #include "openquarn_app/Session.h"
 #include "plugin/deformer/support/warpRig.h"
 #include "quarn/info/LineList.h"
+#include "quarn/info/SceneFilesReport.h"
 #include "rig/registration.h"
 #include "support/TemporaryFolder.h"
 
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <rapidjson/document.h>
+
+#include <fstream>
 
 namespace {
 
@@ -117,6 +121,37 @@ TEST(LineLists, KeepTwentyLinesAndCountTheRest) {
     one.add(std::string(1000, 'a'));
     one.add(std::string(1001, 'b'));
     EXPECT_EQ(one.text(), std::string(1000, 'a') + "\n" + std::string(1000, 'b') + "...\n");
+}
+
+// what a farm takes along: the scene first, each file once, and the files of the models that are on
+TEST_F(SceneReports, NameEachFileThatTheFramesNeed) {
+    const std::filesystem::path scene = folder_.path() / "scene.json", model = root() / "model.nwrp";
+    const std::filesystem::path cache = folder_.path() / "cache.npy";
+    for (const char* node : {"one", "two"})
+        ASSERT_TRUE(OpenQuarn::runScript(std::string("createNode pointCache -name ") + node + "; setAttr " + node +
+                                             ".cacheFile " + cache.string() + "; createNode character -name of" + node +
+                                             "; setAttr of" + node + ".sourceFile gone.fbx",
+                                         "files"));
+    SceneFilesReport report = describeFiles(scene, "");
+    EXPECT_THAT(report.files, ElementsAre(scene, cache, model)) << "nothing is made of the character's file";
+    EXPECT_THAT(report.missing, ElementsAre(cache, model));
+    std::filesystem::create_directories(model);
+    for (const std::filesystem::path& file : {cache, model / "model.onnx", model / "metadata.json"})
+        std::ofstream(file) << "a";
+    report = describeFiles(scene, "warp1");
+    EXPECT_THAT(report.files, ElementsAre(scene, cache, model / "metadata.json", model / "model.onnx"));
+    EXPECT_THAT(report.missing, IsEmpty());
+    EXPECT_EQ(report.frames, "1-1000");
+    rapidjson::Document json;
+    ASSERT_FALSE(json.Parse(filesJson(report).c_str()).HasParseError());
+    EXPECT_EQ(json["geometries"].Size(), 3U);
+    EXPECT_STREQ(json["geometries"][1].GetString(), "warp1in2");
+
+    rig_->plug("models[0].modelActive").setBool(false);
+    rig_->plug("exportStartFrame").setInt(1001);
+    EXPECT_THAT(filesJson(describeFiles(scene, "")), HasSubstr("\"frames\": null"));
+    EXPECT_THAT(describeFiles(scene, "").files, ElementsAre(scene, cache));
+    EXPECT_THROW(describeFiles(scene, "warp2"), std::runtime_error);
 }
 
 } // namespace
