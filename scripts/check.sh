@@ -52,7 +52,8 @@ check_python() {
   local python
   python=$(scripts/find_python.sh 2>/dev/null)
   say "python: types, style"
-  mypy --python-executable "$python" --cache-dir build/mypy && flake8 trainer examples tests host bench clients scripts scripts/neuralwarp-train setup.py
+  mypy --python-executable "$python" --cache-dir build/mypy && \
+    flake8 trainer examples tests host bench clients clients/farm/neuralwarp-farm scripts scripts/neuralwarp-train setup.py
 }
 
 check_tidy() {

@@ -1,0 +1,125 @@
+# SPDX-License-Identifier: Apache-2.0
+"""Arguments that several kinds of plans have, and what is made of them."""
+
+import argparse
+import math
+import os
+import re
+from pathlib import Path
+from typing import Optional
+
+from ..errors import UsageError
+from ..facts import Timing
+from ..parts import Frames, count_for, cut, frames_of
+from ..plan import ID, Resources
+
+MINUTES = 15.0           # of a part, where nothing was said
+ROOM, SPARE_MB = 1.5, 500  # memory of a task: so many times what was seen, and that much more
+MERGING = Resources(cpus=1, memory_mb=2000)
+
+
+def add_folder(parser: argparse.ArgumentParser) -> None:
+    parser.add_argument("-o", "--output", required=True, metavar="FOLDER", help="the folder of the plan, to be made")
+    parser.add_argument("--name", help="how queues show it, if not as SCENE.KIND")
+    parser.add_argument("--overwrite", action="store_true",
+                        help="replace another plan, and remove what it has made in its folder")
+    parser.add_argument("--quarn", metavar="PATH", help="the quarn of all nodes; if not given: $QUARN, "
+                        "build/release/quarn/quarn of this checkout, the PATH")
+
+
+def add_resources(parser: argparse.ArgumentParser) -> None:
+    parser.add_argument("--cpus", type=positive, default=2, metavar="N", help="of a task, and its threads (default 2)")
+    parser.add_argument("--memory", type=megabytes, dest="memory_mb", metavar="SIZE", help="of a task in MiB, or with "
+                        "a unit as in 16G; if not given: half as much again as the timing took and 500, or 4000")
+    parser.add_argument("--gpus", type=whole, default=0, metavar="N", help="of a task (default 0)")
+
+
+def add_cutting(parser: argparse.ArgumentParser) -> None:
+    parser.add_argument("--frames", metavar="A-B[xS]", help="the whole; if not given: the deformer's export range")
+    how = parser.add_mutually_exclusive_group()
+    how.add_argument("--minutes", type=above_zero, metavar="M", help="how long a part is to take, by the time of the "
+                     f"first frames, which are run here for that (default {MINUTES:g})")
+    how.add_argument("--parts", type=positive, metavar="N", help="how many parts; nothing is timed")
+    parser.add_argument("--preroll", type=whole, default=0, metavar="N",
+                        help="frames that are evaluated before each part, and not written (default 0)")
+
+
+# --- what they mean ---
+
+def folder_of(arguments: argparse.Namespace) -> Path:
+    return Path(os.path.abspath(arguments.output))
+
+
+def name_of(arguments: argparse.Namespace, default: str) -> str:
+    """A name that can stand in a queue."""
+    name: str = arguments.name or re.sub(r"[^A-Za-z0-9._-]+", "_", default).lstrip("._-")[:100]
+    if not ID.fullmatch(name):
+        raise UsageError(f"--name is {name!r}: it takes letters, digits, '.', '_' and '-', and begins with one of the "
+                         "first two")
+    return name
+
+
+def path_in(folder: Path, wanted: Optional[str], default: str) -> str:
+    """A path as plan.json has it: from the plan's folder where it lies in it, else absolute."""
+    if wanted is None:
+        return default
+    path = os.path.abspath(wanted)
+    return os.path.relpath(path, folder) if path.startswith(f"{folder}{os.sep}") else path
+
+
+def whole_of(arguments: argparse.Namespace, export_range: Optional[str]) -> Frames:
+    text = arguments.frames or export_range
+    if not text:
+        raise UsageError(f"{arguments.scene} has no deformer with an export range: say --frames A-B")
+    return frames_of(text)
+
+
+def parts_of(arguments: argparse.Namespace, whole: Frames, timing: Optional[Timing]) -> list[Frames]:
+    """`timing` is there unless --parts is."""
+    if timing is None:
+        if arguments.parts > whole.count:
+            raise UsageError(f"--parts is {arguments.parts}, and there are {whole.count} frames")
+        return cut(whole, arguments.parts)
+    # a part has to evaluate what rolls up to it, and the frame behind it
+    before = timing.seconds(arguments.preroll + 1)
+    return cut(whole, count_for(whole, arguments.minutes or MINUTES, before, timing.seconds_a_frame))
+
+
+def resources_of(arguments: argparse.Namespace, timing: Optional[Timing], frames: int) -> Resources:
+    """`frames`: that are evaluated."""
+    memory = arguments.memory_mb
+    if memory is None:
+        memory = 100 * math.ceil((timing.memory_mb * ROOM + SPARE_MB) / 100) if timing else Resources.memory_mb
+    minutes = round(timing.seconds(frames) / 60, 3) if timing else 0
+    return Resources(arguments.cpus, memory, arguments.gpus, minutes)
+
+
+# --- numbers ---
+
+def whole(text: str) -> int:
+    if not (text.isascii() and text.isdigit() and len(text) < 10):
+        raise argparse.ArgumentTypeError(f"{text!r} is no whole number from 0")
+    return int(text)
+
+
+def positive(text: str) -> int:
+    if whole(text) == 0:
+        raise argparse.ArgumentTypeError("it is 0, not 1 at least")
+    return int(text)
+
+
+def above_zero(text: str) -> float:
+    try:
+        value = float(text)
+    except ValueError:
+        value = math.nan
+    if not 0 < value <= 1e6:
+        raise argparse.ArgumentTypeError(f"{text!r} is no number above 0")
+    return value
+
+
+def megabytes(text: str) -> int:
+    found = re.fullmatch(r"([0-9]{1,9})([MGT]?)", text.upper())
+    if not found:
+        raise argparse.ArgumentTypeError(f"{text!r} is no size: write 4000, or 4G")
+    return positive(found[1]) * {"": 1, "M": 1, "G": 1024, "T": 1024**2}[found[2]]
