@@ -1,0 +1,62 @@
+# SPDX-License-Identifier: Apache-2.0
+"""The script that Slurm runs on a node for one task of an array."""
+
+import shlex
+from typing import Mapping, Sequence
+
+MOST_RESTARTS = 5
+
+
+def script(title: str, command: Sequence[str], tasks: Sequence[str], environment: Mapping[str, str]) -> str:
+    """`command` with the id of the task behind it, for the task at the index of the array.
+
+    bash, and not the program itself, is what Slurm's signals reach. Of these USR1 says that the time limit is near and
+    TERM that the job was cancelled: the program ends on TERM in both cases and keeps what it has, and only the first
+    begins again. So does a task that another holds (75). Both count as restarts, as does a node that was lost.
+    """
+    variables = "".join(f"export {name}={shlex.quote(value)}\n" for name, value in environment.items())
+    return TEMPLATE.format(title=title.replace("\n", " "), variables=variables, tasks=" ".join(map(shlex.quote, tasks)),
+                           command=shlex.join(command), restarts=MOST_RESTARTS)
+
+
+TEMPLATE = """\
+#!/bin/bash
+# {title}: one of these tasks, by the index in the array. Written by neuralwarp-farm submit.
+tasks=({tasks})
+{variables}\
+unset SLURM_EXPORT_ENV  # "NONE" is meant for this script, and not for what a task may start by srun
+umask 002
+
+task=${{tasks[${{SLURM_ARRAY_TASK_ID:-0}}]}}
+job=${{SLURM_ARRAY_JOB_ID:+${{SLURM_ARRAY_JOB_ID}}_$SLURM_ARRAY_TASK_ID}}
+job=${{job:-$SLURM_JOB_ID}}
+restarts=${{SLURM_RESTART_COUNT:-0}}
+say() {{ echo "$(date '+%Y-%m-%d %H:%M:%S') ${{SLURMD_NODENAME:-$(hostname)}} job $job, start $((restarts + 1)): $*"; }}
+
+child= limit= stopped=
+pass_on() {{ stopped=yes; [ -z "$child" ] || kill -TERM "$child" 2>/dev/null; }}
+trap 'limit=yes; say "the time limit is near"; pass_on' USR1
+trap 'say "asked to end"; limit=; pass_on' TERM INT
+
+say "$task begins"
+{command} "$task" &
+child=$!
+[ -z "$stopped" ] || pass_on
+while :; do  # a signal ends wait before the program has ended
+  wait "$child"
+  kill -0 "$child" 2>/dev/null || break
+done
+wait "$child"
+code=$?
+say "$task ended with $code"
+
+if {{ [ "$code" = 75 ] || [ -n "$limit" ]; }} && [ "$code" != 0 ]; then
+  if [ "$restarts" -lt {restarts} ]; then
+    say "$task begins again"
+    scontrol requeue "$job" || say "scontrol requeue $job failed"
+  else
+    say "$task was started $((restarts + 1)) times: given up"
+  fi
+fi
+exit "$code"
+"""
