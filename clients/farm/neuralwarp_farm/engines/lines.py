@@ -16,7 +16,7 @@ class Lines:
     """
 
     name = "list"
-    options = ("cpus",)
+    options: tuple[str, ...] = ("cpus",)
 
     def submit(self, plan: Plan, tasks: Sequence[Task], options: Options) -> str:
         one_line(plan)

@@ -13,7 +13,7 @@ class Make:
     """Writes FOLDER/farm.mk: a phony target a task, since the result on disk is the truth and a stamp could lie."""
 
     name = "make"
-    options = ("cpus",)
+    options: tuple[str, ...] = ("cpus",)
 
     def submit(self, plan: Plan, tasks: Sequence[Task], options: Options) -> str:
         text = makefile(plan, options)

@@ -20,7 +20,7 @@ class OpenJobDescription:
     """Writes FOLDER/farm.template.json: a step for each kind of tasks that are alike, with the tasks as a parameter."""
 
     name = "openjd"
-    options = ("cpus", "memory_mb", "gpus", "constraint", "time")
+    options: tuple[str, ...] = ("cpus", "memory_mb", "gpus", "constraint", "time")
 
     def submit(self, plan: Plan, tasks: Sequence[Task], options: Options) -> str:
         text = json.dumps(template(plan, tasks, options), indent=2) + "\n"

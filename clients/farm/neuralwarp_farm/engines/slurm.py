@@ -23,6 +23,7 @@ ANSWER_SECONDS = 120.0  # the longest that a tool of Slurm is waited for; they g
 WARNING_SECONDS = 60  # before its time limit a task is asked to end
 RUNNING = {"RUNNING", "COMPLETING", "STAGE_OUT", "SUSPENDED", "STOPPED", "SIGNALING", "RESIZING"}
 PENDING = {"PENDING", "CONFIGURING", "REQUEUED", "REQUEUE_FED", "REQUEUE_HOLD", "RESV_DEL_HOLD", "SPECIAL_EXIT"}
+NOT_FAILED = {"COMPLETED", "CANCELLED", "PREEMPTED", "REVOKED"}
 ALIVE = ("running", "pending")
 OF_CLUSTER = ("SLURM_CONF", "SLURM_CLUSTERS", "SLURM_JWT")  # which cluster, and who one is there
 OF_USER = ("PATH", "HOME", "USER", "LOGNAME", "SHELL", "LANG", "TZ")
@@ -31,7 +32,7 @@ CONTRADICTING = ("SBATCH_MEM_PER_", "SBATCH_WAIT")  # of the user's defaults for
 
 class Slurm:
     name = "slurm"
-    options = ("partition", "cpus", "memory_mb", "gpus", "constraint", "time", "account")
+    options: tuple[str, ...] = ("partition", "cpus", "memory_mb", "gpus", "constraint", "time", "account")
 
     def submit(self, plan: Plan, tasks: Sequence[Task], options: Options) -> str:
         one_line(plan)
@@ -117,12 +118,12 @@ def squeue(names: Sequence[str]) -> list[Line]:
 
 
 def plain_state(state: str) -> str:
-    """A job that Slurm calls COMPLETED is "gone": whether its result is there is seen on the disk."""
+    """What has ended and has not failed by itself is "gone": whether its result is there is seen on the disk."""
     if state in RUNNING:
         return "running"
     if state in PENDING:
         return "pending"
-    return "gone" if state == "COMPLETED" else "failed"
+    return "gone" if state in NOT_FAILED else "failed"
 
 
 def to_send(tasks: Sequence[Task], states: dict[str, str]) -> list[Task]:

@@ -48,6 +48,7 @@ while :; do  # a signal ends wait before the program has ended
 done
 wait "$child"
 code=$?
+trap '' USR1 TERM INT  # what is requeued is asked to end, and has
 say "$task ended with $code"
 
 if {{ [ "$code" = 75 ] || [ -n "$limit" ]; }} && [ "$code" != 0 ]; then
