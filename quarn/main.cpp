@@ -4,6 +4,7 @@
 #include "openquarn_app/Messages.h"
 #include "quarn/console/Log.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/build.h"
 #include "quarn/console/consoleOptions.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/printable.h"
@@ -86,6 +87,10 @@ int run(int argc, char** argv) {
         neuralWarp::checkModelOptionsVariable();
         if (log.verbose || !log.file.empty())
             quarn::Log::begin(log.verbose, log.file, allWords, argv);
+        quarn::log([] {
+            return "quarn " QUARN_VERSION ", built from " + quarn::buildId() + ", instruction set " +
+                   quarn::instructionSet();
+        });
     });
 
     requireCommand(app, argc, argv);
@@ -104,6 +109,7 @@ int run(int argc, char** argv) {
 
 int main(int argc, char** argv) {
     try {
+        quarn::setBuildId(quarn::commit);
         quarn::setOwnVariable(neuralWarp::modelOptionsVariable, "1"); // decision 0060
         OpenQuarn::setMessageSink(print);
         return run(argc, argv);

@@ -7,6 +7,7 @@
 #include "quarn/console/Log.h"
 #include "quarn/console/StdoutAside.h"
 #include "quarn/console/UsageError.h"
+#include "quarn/console/build.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/json.h"
 #include "quarn/console/printable.h"
@@ -145,8 +146,24 @@ std::string summaryText(const SceneSummary& summary, const OpenedScene& opened) 
 struct Options {
     fs::path path, scene, controls, outputs;
     std::string deformer, geometry, frames;
-    bool json = false, devices = false, joints = false, files = false;
+    bool json = false, build = false, devices = false, joints = false, files = false;
 };
+
+void showBuild(bool asJson) {
+    if (!asJson) {
+        std::cout << "quarn " QUARN_VERSION ", built from " << buildId() << "\ninstruction set " << instructionSet()
+                  << '\n';
+        return;
+    }
+    rapidjson::StringBuffer buffer;
+    JsonWriter writer(buffer);
+    writer.StartObject();
+    writeText(writer, "version", QUARN_VERSION);
+    writeText(writer, "build", buildId());
+    writeText(writer, "instructionSet", instructionSet());
+    writer.EndObject();
+    std::cout << buffer.GetString() << '\n';
+}
 
 void showDevices(bool asJson) {
     const std::vector<OpenQuarn::GpuDevice> devices = OpenQuarn::Gpu::devices();
@@ -297,10 +314,12 @@ void showModel(const Options& options) {
 
 void showInfo(const Options& options) {
     watchForInterrupt();
+    if (options.build)
+        return showBuild(options.json);
     if (options.devices)
         return showDevices(options.json);
     if (options.path.empty())
-        throw UsageError("quarn info needs the path of a scene file or a model directory, or --devices");
+        throw UsageError("quarn info needs the path of a scene file or a model directory, --devices or --build");
     if (fs::is_directory(options.path) && (options.joints || options.files))
         throw UsageError(options.path.string() + " is a model directory, and " +
                          (options.joints ? "--joints" : "--files") + " is for a scene");
@@ -319,6 +338,9 @@ void addInfoCommand(CLI::App& app) {
     const auto options = std::make_shared<Options>();
     CLI::App* info = app.add_subcommand("info", "Show what is in a scene file or a model directory");
     info->add_option("PATH", options->path, "The scene file, or the directory NAME.nwrp of a model");
+    info->add_flag(
+        "--build", options->build,
+        "The version of quarn, the commit that it was built from, and the instruction set that it uses here");
     info->add_flag("--devices", options->devices, "List the OpenCL devices that quarn play --evaluator gpu can use");
     info->add_flag("--joints", options->joints,
                    "Of a scene: each joint, its parent, what is posed and how far, and "

@@ -14,6 +14,10 @@ expect 1 '' 'plug-in .*/none\.so. cannot be loaded: there is no such file' exec 
 expect 1 '' 'none\.txt' exec /none.txt
 expect 0 'exec (.|\n)*info ' '' --help
 expect 0 '^quarn [0-9.]+\n$' '' --version
+commit=$(git -c safe.directory="$PWD" rev-parse HEAD 2>/dev/null) || commit=unknown
+expect 0 "^quarn [0-9.]+, built from ${commit:0:12}\+?\ninstruction set (scalar|AVX.*)\n$" '' info --build
+expect 0 "^\{\s+\"version\": \"[0-9.]+\",\s+\"build\": \"${commit:0:12}\+?\",\s+\"instructionSet\": \"\w" '' \
+  info --build --json
 
 echo 'createNode' >"$work/in"
 expect 1 '' 'standard input, line 1: createNode' exec -
