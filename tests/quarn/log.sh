@@ -25,7 +25,8 @@ says() {
   while [[ $1 != -- ]]; do command+=("$1") && shift; done
   shift
   [[ (${command[0]} == info && ${command[1]} != *.json) || ${command[0]} == run ]] && patterns=()
-  patterns+=("$stamps"'quarn [\d.]+, built from \w+\+?, instruction set (scalar|AVX\S*)$' "${@/#/$stamps}" "$stamps"'done$')
+  patterns+=("$stamps"'quarn [\d.]+, built from \w+\+?, instruction set (scalar|AVX\S*)$')
+  patterns+=("${@/#/$stamps}" "$stamps"'done$')
   rm -f log
   "$quarn" "${command[@]}" >plain 2>err || fail "quarn ${command[*]}: failed"
   "$quarn" "${command[@]}" --log log >out 2>err || fail "quarn ${command[*]} --log: failed"
