@@ -49,6 +49,12 @@ def parser() -> Parser:
     add_place(merge)
     add_threads(merge)
     merge.set_defaults(run=command_task, id="merge")
+
+    table = commands.add_parser("table", help="show the models of a plan that are there, best first",
+                                allow_abbrev=False)
+    add_place(table)
+    table.add_argument("--write", action="store_true", help="write it into the plan's folder, when all are there")
+    table.set_defaults(run=command_table)
     return main
 
 
@@ -90,6 +96,12 @@ def command_status(arguments: argparse.Namespace) -> int:
 def command_task(arguments: argparse.Namespace) -> int:
     the_plan = plan.read(arguments.plan)
     return task.run(the_plan, the_plan.task(arguments.id), arguments.threads)
+
+
+def command_table(arguments: argparse.Namespace) -> int:
+    from .kinds import training_table
+
+    return training_table.show(plan.read(arguments.plan), arguments.write)
 
 
 def main(words: Optional[list[str]] = None) -> int:

@@ -62,8 +62,9 @@ def find_quarn(wanted: Optional[str] = None) -> str:
 
 
 def find_trainer(wanted: Optional[str] = None) -> str:
-    """Absolute path of the trainer: `wanted`, $NEURALWARP_TRAINER, the PATH."""
-    return find_program(wanted, "--trainer", "NEURALWARP_TRAINER", None, "neuralwarp-train")
+    """Absolute path of the trainer: `wanted`, $NEURALWARP_TRAINER, that of a checkout, the PATH."""
+    return find_program(wanted, "--trainer", "NEURALWARP_TRAINER", CHECKOUT / "scripts" / "neuralwarp-train",
+                        "neuralwarp-train")
 
 
 def find_program(wanted: Optional[str], flag: str, variable: str, built: Optional[Path], name: str) -> str:

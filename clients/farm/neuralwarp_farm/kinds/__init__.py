@@ -16,4 +16,6 @@ KINDS = (
     Kind("bake", "frames", "a mesh plug as a point cache, in parts that are merged"),
     Kind("play", "frames", "a deformed mesh, a file a frame"),
     Kind("render", "frames", "pictures, one a frame"),
+    Kind("targets", "targets", "targets by a program of yours, in parts that are merged"),
+    Kind("train", "train", "models of many data sets, settings and seeds, and a table of them"),
 )
