@@ -64,6 +64,8 @@ declare -A probe_of=(
   [libopenblas0-pthread]=/usr/lib/*/openblas-pthread/libblas.so.3 # ten times as fast as the reference one
   [blender]=blender
   [chromium]=chromium
+  [slurm-wlm]=/usr/sbin/slurmctld
+  [munge]=/usr/sbin/munged
   [python3-setuptools]=/usr/lib/python3/dist-packages/setuptools/__init__.py
   [python3-wheel]=/usr/lib/python3/dist-packages/wheel/__init__.py
   [python3-venv]=/usr/lib/python3*/ensurepip/__init__.py
@@ -90,7 +92,7 @@ viewer_packages=(clang-14 lld-14 wasi-libc libc++-14-dev-wasm32 libclang-rt-14-d
 wheel_packages=(python3-setuptools python3-wheel python3-venv)
 package_packages=(dpkg-dev file patchelf)
 # tools that tests go to and come back from; what misses them is skipped, except in continuous integration
-client_packages=(blender chromium python3-numpy python3-pil nodejs)
+client_packages=(blender chromium python3-numpy python3-pil nodejs slurm-wlm munge)
 check_packages=(git clang-format-14 clang-tidy-14 mypy flake8)
 clang_packages=(clang-14 libclang-rt-14-dev llvm-14)
 
@@ -137,8 +139,38 @@ need_packages() {
 
   say "installing ${missing[*]} (log: build/apt.log)"
   apt_get update || fail "apt-get update failed ($(apt_error)); packages that are missing: ${missing[*]}"
-  apt_get install -y --no-install-recommends "${missing[@]}" ||
+  without_services apt_get install -y --no-install-recommends "${missing[@]}" ||
     fail "apt-get could not install ${missing[*]} ($(apt_error))"
+  disable_services "${missing[@]}"
+}
+
+# The services of packages that tests start by themselves, on their own folders.
+declare -A services_of=([slurm-wlm]="slurmctld slurmd" [munge]=munge)
+
+# without_services COMMAND...: while it runs, no package starts a service: this is what Debian's policy-rc.d decides. One
+# that says no already stays; another is put aside meanwhile.
+without_services() (
+  policy=/usr/sbin/policy-rc.d aside=/usr/sbin/policy-rc.d.neuralwarp status=0
+  if [[ -x $policy ]]; then "$policy" munge start >/dev/null 2>&1 || status=$?; fi
+  if ((status != 101)); then
+    trap 'as_root rm -f "$policy"; if [[ -e $aside ]]; then as_root mv "$aside" "$policy"; fi' EXIT
+    if [[ -e $policy ]]; then as_root mv "$policy" "$aside"; fi
+    printf '#!/bin/sh\nexit 101\n' | as_root tee "$policy" >/dev/null
+    as_root chmod 755 "$policy"
+  fi
+  "$@"
+)
+
+# disable_services PACKAGES...: nor does the machine start them when it starts. Only those of packages that were
+# installed just now: what was there before is as its owner wants it.
+disable_services() {
+  local package service
+  for package in "$@"; do
+    for service in ${services_of[$package]:-}; do
+      as_root env DPKG_MAINTSCRIPT_PACKAGE="$package" deb-systemd-helper disable "$service.service" >>build/apt.log 2>&1
+      as_root update-rc.d "$service" disable >>build/apt.log 2>&1
+    done
+  done
 }
 
 apt_get() {
