@@ -1,11 +1,12 @@
 #!/usr/bin/env python3
 # SPDX-License-Identifier: Apache-2.0
-"""keeper.py: starts programs, and ends them and all that they have started when its standard input ends.
+"""keeper.py FOLDER: starts programs, and ends them and all that they have started when its standard input ends; then
+removes their folder.
 
 Each line of its input is a JSON array, the words of a program and, before them, the file that its output goes to; the
 answer to each is a line with its process id, or with what went wrong. The input ends when whoever holds its other end
-closes it or dies, in any way: nothing is left then that was started here. Where this process is killed itself, the
-programs die with it; what those have started in their turn is an orphan then.
+closes it or dies, in any way: nothing is left then that was started here. Where this process itself is killed, the
+programs die with it; what those have started in their turn, and the folder, are left.
 
 Linux alone: orphans are handed to this process (prctl(2), PR_SET_CHILD_SUBREAPER), and the programs get a signal when
 it dies (PR_SET_PDEATHSIG)."""
@@ -13,6 +14,7 @@ it dies (PR_SET_PDEATHSIG)."""
 import ctypes
 import json
 import os
+import shutil
 import signal
 import subprocess
 import sys
@@ -39,6 +41,7 @@ def main() -> None:
     finally:
         signal.signal(signal.SIGTERM, signal.SIG_IGN)
         end_all()
+        shutil.rmtree(sys.argv[1], ignore_errors=True)
 
 
 def start(log: str, *command: str) -> str:

@@ -95,10 +95,10 @@ class PrivateSlurm:
         if missing := missing_programs():
             raise SlurmError(f"no {', '.join(missing)} here: ./run deps installs Slurm (Debian: slurm-wlm, munge)")
         with contextlib.ExitStack() as ending:
-            self.folder = Path(ending.enter_context(tempfile.TemporaryDirectory(prefix="nw-slurm-")))
+            self.folder = Path(tempfile.mkdtemp(prefix="nw-slurm-"))
             self.configuration = self.folder / "slurm.conf"
             self.environment = {**without_slurm(os.environ), "SLURM_CONF": str(self.configuration), "PATH": SEARCHED}
-            self._keeper = ending.enter_context(contextlib.closing(Keeper(self.environment)))
+            self._keeper = ending.enter_context(contextlib.closing(Keeper(self.folder, self.environment)))
             self._configure()
             self._start_munged()
             self._start("slurmctld", "-D", "-i")
@@ -184,13 +184,14 @@ class PrivateSlurm:
 
 
 class Keeper:
-    """keeper.py at work: what it starts is ended, with all that came of it, when this process closes it or dies."""
+    """keeper.py at work: when this process closes it or dies, what it has started is ended, with all that came of it,
+    and the folder is removed."""
 
-    def __init__(self, environment: Mapping[str, str]) -> None:
+    def __init__(self, folder: Path, environment: Mapping[str, str]) -> None:
         # a group of its own: the Ctrl-C that ends this process is not meant for it
-        self._process = subprocess.Popen([sys.executable, str(Path(__file__).with_name("keeper.py"))],
-                                         stdin=subprocess.PIPE, stdout=subprocess.PIPE, text=True, env=environment,
-                                         start_new_session=True)
+        self._process = subprocess.Popen(
+            [sys.executable, str(Path(__file__).with_name("keeper.py")), str(folder)], env=environment, text=True,
+            stdin=subprocess.PIPE, stdout=subprocess.PIPE, start_new_session=True)
 
     def start(self, log: Path, *command: str) -> int:
         assert self._process.stdin and self._process.stdout
@@ -229,7 +230,8 @@ def free_ports(count: int) -> list[int]:
         sockets = [held.enter_context(socket.socket()) for _ in range(count)]
         for each in sockets:
             each.bind(("127.0.0.1", 0))
-        return [each.getsockname()[1] for each in sockets]
+        ports = [each.getsockname()[1] for each in sockets]
+    return ports
 
 
 def main() -> int:
@@ -246,12 +248,11 @@ def main() -> int:
             return subprocess.run(command, env=slurm.environment).returncode
     except SlurmError as error:
         print(f"private_slurm.py: {error}", file=sys.stderr)
-        return 1
     except OSError as error:
         print(f"private_slurm.py: {error.filename}: {error.strerror}", file=sys.stderr)
-        return 1
     except KeyboardInterrupt:
         return 130
+    return 1
 
 
 if __name__ == "__main__":
