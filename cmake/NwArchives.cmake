@@ -1,4 +1,4 @@
-# What ./run package packs, besides what the targets install: the trainer, the example of the demo and the documents, as
+# What ./run package packs, besides what the targets install: the trainer, the farm, the example of the demo and the documents, as
 # an archive that can be unpacked anywhere (TGZ) and as a Debian package (DEB) in a folder of its own.
 set(_nw_data_dir "${CMAKE_INSTALL_DATADIR}/neuralWarp")
 
@@ -6,6 +6,8 @@ file(GLOB _trainer_sources CONFIGURE_DEPENDS trainer/*.py)
 install(FILES ${_trainer_sources} DESTINATION "${_nw_data_dir}/trainer")
 install(FILES pyproject.toml setup.py VERSION LICENSE DESTINATION "${_nw_data_dir}")
 install(PROGRAMS scripts/neuralwarp-train DESTINATION "${CMAKE_INSTALL_BINDIR}")
+install(DIRECTORY clients/farm/neuralwarp_farm DESTINATION "${_nw_data_dir}/clients/farm" PATTERN __pycache__ EXCLUDE)
+install(PROGRAMS clients/farm/neuralwarp-farm DESTINATION "${CMAKE_INSTALL_BINDIR}")
 install(DIRECTORY examples/hand examples/arm examples/blender DESTINATION "${_nw_data_dir}/examples"
   PATTERN __pycache__ EXCLUDE)
 install(DIRECTORY docs/ DESTINATION "${CMAKE_INSTALL_DOCDIR}")

@@ -2,7 +2,7 @@
 if(CPACK_GENERATOR STREQUAL "DEB")
   # the programs on everybody's PATH
   file(MAKE_DIRECTORY "${CPACK_TEMPORARY_DIRECTORY}/usr/bin")
-  foreach(program quarn neuralwarp-train)
+  foreach(program quarn neuralwarp-train neuralwarp-farm)
     file(CREATE_LINK "../..${CPACK_PACKAGING_INSTALL_PREFIX}/bin/${program}"
       "${CPACK_TEMPORARY_DIRECTORY}/usr/bin/${program}" SYMBOLIC)
   endforeach()

@@ -73,7 +73,7 @@ else
   echo "the page of quarn view was not built: that part is not tried"
 fi
 installed env PYTHONPATH=moved/lib/python3 "$python" -c "import neuralwarp; neuralwarp.Scene"
-for program in quarn neuralwarp-train env/bin/neuralwarp-train; do
+for program in quarn neuralwarp-train neuralwarp-farm env/bin/neuralwarp-train; do
   installed "$program" --version
   [[ $(<"$work/said") == *" $(<VERSION)" ]] || fail "$program is not of version $(<VERSION)"
 done
@@ -91,4 +91,4 @@ for package in libtbb12 libassimp5 libmeshoptimizer2d libpugixml1v5 ocl-icd-libo
   [[ $needs == *"$package"* ]] || fail "the Debian package does not need $package: $needs"
 done
 [[ $(dpkg-deb --field "${deb[0]}" Version) == "$(<VERSION)"* ]] || fail "the Debian package has another version"
-for program in quarn neuralwarp-train; do installed "$work/root/usr/bin/$program" --version; done
+for program in quarn neuralwarp-train neuralwarp-farm; do installed "$work/root/usr/bin/$program" --version; done

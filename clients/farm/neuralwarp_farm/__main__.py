@@ -9,7 +9,7 @@ import os
 import sys
 from typing import NoReturn, Optional
 
-from . import codes, plan, results, status, task
+from . import __version__, codes, plan, results, status, task
 from .errors import FarmError, LockedByAnother, UsageError
 from .kinds import KINDS
 
@@ -22,6 +22,7 @@ class Parser(argparse.ArgumentParser):
 def parser() -> Parser:
     main = Parser(prog="neuralwarp-farm", allow_abbrev=False,
                   description="Cuts work into tasks, and gives them to Slurm and other engines.")
+    main.add_argument("--version", action="version", version=f"neuralwarp-farm {__version__}")
     commands = main.add_subparsers(dest="command", required=True, metavar="COMMAND")
     add_plan(commands)
     for name, text in (("submit", "give what is left of a plan to an engine"),
@@ -48,7 +49,7 @@ def parser() -> Parser:
     merge = commands.add_parser("merge", help="put the parts of a plan together here", allow_abbrev=False)
     add_place(merge)
     add_threads(merge)
-    merge.set_defaults(run=command_task, id="merge")
+    merge.set_defaults(run=command_merge)
 
     table = commands.add_parser("table", help="show the models of a plan that are there, best first",
                                 allow_abbrev=False)
@@ -102,6 +103,13 @@ def command_table(arguments: argparse.Namespace) -> int:
     from .kinds import training_table
 
     return training_table.show(plan.read(arguments.plan), arguments.write)
+
+
+def command_merge(arguments: argparse.Namespace) -> int:
+    the_plan = plan.read(arguments.plan)
+    if all(task.id != "merge" for task in the_plan.tasks):
+        raise FarmError(f"{the_plan.folder} has nothing to merge: each of its tasks writes to where its result belongs")
+    return task.run(the_plan, the_plan.task("merge"), arguments.threads)
 
 
 def main(words: Optional[list[str]] = None) -> int:

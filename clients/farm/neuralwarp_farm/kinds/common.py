@@ -8,10 +8,10 @@ import re
 from pathlib import Path
 from typing import Optional
 
-from ..errors import UsageError
-from ..facts import Timing
+from ..errors import FarmError, UsageError
+from ..facts import Build, Timing
 from ..parts import Frames, count_for, cut, frames_of
-from ..plan import ID, Resources
+from ..plan import ID, Resources, SourceFile, read
 
 MINUTES = 15.0           # of a part, where nothing was said
 ROOM, SPARE_MB = 1.5, 500  # memory of a task: so many times what was seen, and that much more
@@ -83,6 +83,23 @@ def parts_of(arguments: argparse.Namespace, whole: Frames, timing: Optional[Timi
     # a part has to evaluate what rolls up to it, and the frame behind it
     before = timing.seconds(arguments.preroll + 1)
     return cut(whole, count_for(whole, arguments.minutes or MINUTES, before, timing.seconds_a_frame))
+
+
+def earlier(arguments: argparse.Namespace, build: Build, files: tuple[SourceFile, ...],
+            whole: Frames) -> Optional[Timing]:
+    """What was timed for the plan that is in the folder, if that is of the same: the same command, given again, makes the
+    same plan."""
+    if arguments.overwrite:
+        return None
+    try:
+        plan = read(folder_of(arguments))
+    except FarmError:
+        return None
+    if (plan.kind, plan.build, plan.files, plan.frames) != (arguments.kind, build.build, files, str(whole)):
+        return None
+    if plan.start_seconds is None or plan.seconds_a_frame is None:
+        return None
+    return Timing(plan.start_seconds, plan.seconds_a_frame, plan.tasks[0].resources.memory_mb, 0)
 
 
 def resources_of(arguments: argparse.Namespace, timing: Optional[Timing], frames: int) -> Resources:

@@ -58,15 +58,18 @@ def make_plan(arguments: argparse.Namespace) -> Plan:
                 tuple(selection(arguments)) + tuple(passed))
     result = common.path_in(folder, arguments.result, "result.npy" if arguments.kind == "bake" else "result")
     check_result(arguments.kind, result)
-    timing = None if arguments.parts else facts.timed(lambda frames, place: timed_words(work, quarn, arguments, frames,
-                                                                                        place, result), whole)
+    files = scene.files + plugins(passed)
+    timing = None
+    if not arguments.parts:
+        timing = common.earlier(arguments, build, files, whole) or facts.timed(
+            lambda frames, place: timed_words(work, quarn, arguments, frames, place, result), whole)
     pieces = common.parts_of(arguments, whole, timing)
     tasks = [task_of(work, piece, name, result, common.resources_of(arguments, timing, work.evaluated(piece)))
              for piece, name in zip(pieces, names(len(pieces)))]
     if work.is_merged:
         tasks.append(merge_of(work.kind, tasks, result))
     return Plan(folder, work.kind, common.name_of(arguments, f"{Path(scene.path).stem}.{work.kind}"), build.version,
-                build.build, {"quarn": quarn}, scene.files + plugins(passed), str(whole),
+                build.build, {"quarn": quarn}, files, str(whole),
                 timing.seconds_a_frame if timing else None, timing.start_seconds if timing else None, {}, tuple(tasks))
 
 
