@@ -82,6 +82,7 @@ def add_plan(commands: "argparse._SubParsersAction[Parser]") -> None:
 def command_plan(arguments: argparse.Namespace) -> int:
     made = importlib.import_module(f".kinds.{arguments.module}", __package__).make_plan(arguments)
     if not plan.is_there(made):
+        plan.check_replaceable(made, arguments.overwrite)
         results.make_room(made, arguments.overwrite)
     plan.write(made, arguments.overwrite)
     print(status.sentence(made))

@@ -244,18 +244,23 @@ def is_there(plan: Plan) -> bool:
         return False
 
 
+def check_replaceable(plan: Plan, overwrite: bool) -> None:
+    path = plan.folder / FILE
+    if path.exists() and not overwrite:
+        raise FarmError(f"{path} is another plan: give another folder, or --overwrite")
+
+
 def write(plan: Plan, overwrite: bool = False) -> Path:
     """Writes plan.json, as a whole, unless it is there already. Raises FarmError for another one that is there.
 
     Returns its path.
     """
     path = plan.folder / FILE
-    written = json.dumps(to_json(plan), indent=1, ensure_ascii=False) + "\n"
-    from_json(json.loads(written), path)  # what it refuses is not written either
     if is_there(plan):
         return path
-    if path.exists() and not overwrite:
-        raise FarmError(f"{path} is another plan: give another folder, or --overwrite")
+    check_replaceable(plan, overwrite)
+    written = json.dumps(to_json(plan), indent=1, ensure_ascii=False) + "\n"
+    from_json(json.loads(written), path)  # what it refuses is not written either
     write_whole(path, written)
     return path
 

@@ -9,7 +9,7 @@ from pathlib import Path
 from typing import Optional
 
 from ..errors import FarmError, UsageError
-from ..facts import Build, Timing
+from ..facts import Build, Timing, say
 from ..parts import Frames, count_for, cut, frames_of
 from ..plan import ID, Resources, SourceFile, read
 
@@ -81,13 +81,17 @@ def parts_of(arguments: argparse.Namespace, whole: Frames, timing: Optional[Timi
             raise UsageError(f"--parts is {arguments.parts}, and there are {whole.count} frames")
         return cut(whole, arguments.parts)
     # a part has to evaluate what rolls up to it, and the frame behind it
-    before = timing.seconds(arguments.preroll + 1)
-    return cut(whole, count_for(whole, arguments.minutes or MINUTES, before, timing.seconds_a_frame))
+    before, minutes = timing.seconds(arguments.preroll + 1), arguments.minutes or MINUTES
+    count = count_for(whole, minutes, before, timing.seconds_a_frame)
+    if count > 1 and before > 30 * minutes:
+        say(f"{before:.3g} s of the {60 * minutes:.3g} s of each part are spent before its first frame: longer parts "
+            "would take less in all")
+    return cut(whole, count)
 
 
 def earlier(arguments: argparse.Namespace, build: Build, files: tuple[SourceFile, ...],
             whole: Frames) -> Optional[Timing]:
-    """What was timed for the plan that is in the folder, if that is of the same: the same command, given again, makes the
+    """What was timed for the plan that is in the folder, if that is of the same: a command, given again, makes the
     same plan."""
     if arguments.overwrite:
         return None
