@@ -3,13 +3,12 @@
 
 import argparse
 import importlib
-import importlib.util
 import json
 import os
 import sys
 from typing import NoReturn, Optional
 
-from . import __version__, codes, plan, results, status, task
+from . import __version__, cancel, codes, plan, results, status, submit, task
 from .errors import FarmError, LockedByAnother, UsageError
 from .kinds import KINDS
 
@@ -25,12 +24,9 @@ def parser() -> Parser:
     main.add_argument("--version", action="version", version=f"neuralwarp-farm {__version__}")
     commands = main.add_subparsers(dest="command", required=True, metavar="COMMAND")
     add_plan(commands)
-    for name, text in (("submit", "give what is left of a plan to an engine"),
-                       ("cancel", "take back what an engine has of a plan")):
-        command = commands.add_parser(name, help=text, allow_abbrev=False)
-        if importlib.util.find_spec(f".{name}", __package__) is None:
-            continue
-        module = importlib.import_module(f".{name}", __package__)
+    for module, text in ((submit, "give what is left of a plan to an engine"),
+                         (cancel, "take back what an engine has of a plan")):
+        command = commands.add_parser(module.__name__.rpartition(".")[2], help=text, allow_abbrev=False)
         module.add_arguments(command)
         command.set_defaults(run=module.run)
 

@@ -1,14 +1,13 @@
 # SPDX-License-Identifier: Apache-2.0
 """How far a plan is: what lies on the disk first, then what an engine knows, then what logs say."""
 
-import importlib.util
 import os
 from collections import Counter
 from dataclasses import dataclass
 from pathlib import Path
 from typing import Any, Optional
 
-from . import codes, results
+from . import codes, engines, results
 from .errors import FarmError
 from .plan import Plan, Task
 from .results import State
@@ -68,17 +67,10 @@ def report_of(plan: Plan) -> Report:
     known: dict[str, str] = {}
     note = ""
     try:
-        known = engine_states(plan)
+        known = engines.states(plan)
     except FarmError as error:
         note = str(error)
     return Report(plan, tuple(line_of(plan, task, known.get(task.id)) for task in plan.tasks), note)
-
-
-def engine_states(plan: Plan) -> dict[str, str]:
-    if importlib.util.find_spec(".engines", __package__) is None:
-        return {}
-    states: dict[str, str] = importlib.import_module(".engines", __package__).states(plan)
-    return states
 
 
 def line_of(plan: Plan, task: Task, known: Optional[str]) -> Line:

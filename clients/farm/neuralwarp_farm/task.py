@@ -44,11 +44,11 @@ def run(plan: Plan, task: Task, threads: Optional[int] = None) -> int:
     if results.is_done(plan, task):
         return is_there(task)
     check_needs(plan, task)
-    with claimed(plan, task), Signals() as signals, log_of(plan, task) as log:
+    with claimed(plan, task) as number, Signals() as signals, log_of(plan, task) as log:
         if results.is_done(plan, task):
             return is_there(task)
         begin = time.monotonic()
-        write_line(log, first_line(plan, task))
+        write_line(log, first_line(task, number))
         try:
             code = attempt(plan, task, threads, signals, log)
         except FarmError as error:
@@ -89,8 +89,9 @@ def check_needs(plan: Plan, task: Task) -> None:
 
 
 @contextmanager
-def claimed(plan: Plan, task: Task) -> Iterator[None]:
-    """Keeps the task for this process; the system takes the lock from one that dies."""
+def claimed(plan: Plan, task: Task) -> Iterator[int]:
+    """Keeps the task for this process; the system takes the lock from one that dies. Gives the number of the attempt,
+    which the locked file holds."""
     path = results.lock_file(plan, task)
     path.parent.mkdir(parents=True, exist_ok=True)
     lock = os.open(path, os.O_RDWR | os.O_CREAT | os.O_NOFOLLOW | os.O_CLOEXEC, 0o664)
@@ -101,7 +102,11 @@ def claimed(plan: Plan, task: Task) -> Iterator[None]:
             raise LockedByAnother(f"another process is running {task.id} of {plan.folder}") from None
         except OSError:
             pass  # a file system without locks: programs have their own ways to notice one another
-        yield
+        before = os.pread(lock, 10, 0).decode(errors="replace")
+        number = 1 + (int(before) if before.isascii() and before.isdigit() else 0)
+        with suppress(OSError):  # a full disk
+            os.pwrite(lock, str(number).encode(), 0)
+        yield number
     finally:
         os.close(lock)
 
@@ -216,14 +221,8 @@ def write_line(log: BinaryIO, text: str) -> None:
         print(f"neuralwarp-farm: {log.name} could not be written: {error.strerror}", file=sys.stderr)
 
 
-def first_line(plan: Plan, task: Task) -> str:
+def first_line(task: Task, number: int) -> str:
     job = os.environ.get("SLURM_ARRAY_JOB_ID", os.environ.get("SLURM_JOB_ID"))
     index = os.environ.get("SLURM_ARRAY_TASK_ID")
-    number = 1 + attempts_in(plan.log(task))
     return (f"{MARK}{time.strftime('%Y-%m-%d %H:%M:%S %z')}: {task.id} on {socket.gethostname()}"
             + (f", job {job}{f'_{index}' if index else ''}" if job else "") + f", attempt {number}")
-
-
-def attempts_in(log: Path) -> int:
-    with open(log, "rb") as file:
-        return sum(line.startswith(MARK.encode()) and b", attempt " in line for line in file)

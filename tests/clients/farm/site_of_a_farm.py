@@ -1,16 +1,20 @@
 # SPDX-License-Identifier: Apache-2.0
 """A folder with a plan whose program is a small one: it does what words tell it to."""
 
+import io
 import os
 import subprocess
 import sys
 import tempfile
 import time
 import unittest
+from contextlib import redirect_stderr, redirect_stdout
 from pathlib import Path
 from typing import Callable, Optional, Union
+from unittest import mock
 
 from neuralwarp_farm import plan, sums
+from neuralwarp_farm.__main__ import main
 from neuralwarp_farm.plan import Plan, Resources, Result, SourceFile, Task
 
 # quarn FOLDER WORD...: makes a data set, after what the words say
@@ -70,15 +74,19 @@ class FarmTest(unittest.TestCase):
 
     def farm(self, *words: Union[str, Path], code: int = 0, **environment: str) -> str:
         """What the program says, on both of its channels. It must end with `code`."""
-        done = self.start(*words, **environment)
-        said = done.communicate(timeout=60)[0]
-        self.assertEqual(done.returncode, code, said)
-        self.assertNotIn("Traceback", said)
-        return said
+        said = io.StringIO()
+        with redirect_stdout(said), redirect_stderr(said), mock.patch.dict(os.environ, environment):
+            ended = main([str(word) for word in words])
+        self.assertEqual(ended, code, said.getvalue())
+        return said.getvalue()
 
-    def start(self, *words: Union[str, Path], **environment: str) -> "subprocess.Popen[str]":
-        return subprocess.Popen([sys.executable, "-m", "neuralwarp_farm", *map(str, words)], text=True,
-                                stdout=subprocess.PIPE, stderr=subprocess.STDOUT, env={**os.environ, **environment})
+    def start(self, *words: Union[str, Path]) -> "subprocess.Popen[str]":
+        """The same in a process of its own."""
+        process = subprocess.Popen([sys.executable, "-m", "neuralwarp_farm", *map(str, words)], text=True,
+                                   stdout=subprocess.PIPE, stderr=subprocess.STDOUT)
+        self.addCleanup(process.communicate)
+        self.addCleanup(process.kill)
+        return process
 
     def wait_until(self, holds: Callable[[], bool]) -> None:
         deadline = time.monotonic() + 60

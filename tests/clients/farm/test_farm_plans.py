@@ -58,7 +58,8 @@ HOSTILE: list[tuple[Change, str]] = [
 
 class PlanTest(FarmTest):
     def test_what_is_written_is_read(self) -> None:
-        shots = replace(self.task("shots"), result=Result("frames", "/somewhere", ("a.0001.obj", "ä.obj")), frames="1-2")
+        files = ("a.0001.obj", "ä.obj")
+        shots = replace(self.task("shots"), result=Result("frames", "/somewhere", files), frames="1-2")
         made = self.plan(self.task("a"), shots, self.task("merge", needs=("a",)))
         self.assertEqual(plan.read(made.folder / "plan.json"), made)
         self.assertEqual(made.task("shots"), shots)
