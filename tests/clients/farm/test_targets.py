@@ -91,8 +91,8 @@ class TargetCase(unittest.TestCase):
         return subprocess.Popen(
             [sys.executable, "-m", "neuralwarp_farm.kinds.target_part", "--quarn", str(self.place / "quarn"),
              "--scene", str(self.scene), "--deformer", "warp", "--geometry", "arm", "--order", "scene", "--first",
-             str(first), "--last", str(last), "--whole", "1", str(LAST), "--preroll", str(preroll), "--seam", "--threads", "1",
-             "--output", str(self.output(first)), "--", str(program), "--", "word"],
+             str(first), "--last", str(last), "--whole", "1", str(LAST), "--preroll", str(preroll), "--seam",
+             "--threads", "1", "--output", str(self.output(first)), "--", str(program), "--", "word"],
             stdout=subprocess.PIPE, stderr=subprocess.STDOUT, text=True)
 
     def part(self, *arguments: Any, **named: Any) -> tuple[int, str]:
@@ -193,10 +193,11 @@ class PlanTest(TargetCase):
 
     def plan(self, *words: str, scene: Any = SCENE) -> tuple[int, str]:
         self.scene.write_text(json.dumps(scene))
-        program = self.script("program", PROGRAM.format(change="open(request['write'] + '.threads', 'w')"))
+        program = self.script("program", PROGRAM.format(change="import os; assert os.environ['LICENCE'] == 'a b'; "
+                                                        "assert '--jobs=2' in sys.argv"))
         return self.farm("plan", "targets", str(self.scene), "-o", str(self.place / "night"), "--quarn",
-                         str(self.place / "quarn"), "--preroll", "2", *words, "--", os.path.relpath(program),
-                         "--jobs", "{threads}", "--", "x")
+                         str(self.place / "quarn"), "--preroll", "2", "--env", "LICENCE=a b", *words, "--",
+                         os.path.relpath(program), "--jobs={threads}", "--", "x")
 
     def test_a_plan_carried_out_gives_what_one_part_gives(self) -> None:
         for cutting, parts in ((("--parts", "5"), 5), (("--minutes", "1000"), 1)):
@@ -209,8 +210,7 @@ class PlanTest(TargetCase):
             self.output().unlink(missing_ok=True)
             self.part()
             self.assertEqual((made.folder / "result.npy").read_bytes(), self.output().read_bytes())
-        self.assertEqual(made.tasks[0].command[-5:],
-                         (str(self.place / "program"), "--jobs", "{threads}", "--", "x"))
+        self.assertEqual(made.tasks[0].command[-4:], (str(self.place / "program"), "--jobs={threads}", "--", "x"))
         (made.folder / "parts/0001.npy").unlink()
         self.script("program", "another")
         self.assertEqual(self.farm("task", str(made.folder), "part-0001")[0], 1)
@@ -221,6 +221,7 @@ class PlanTest(TargetCase):
         bare: dict[str, Any] = {**SCENE, "connections": []}
         for words, scene, status, sentence in (
                 ((), SCENE, 2, "deforms arm, hat"), (("--geometry", "leg"), SCENE, 2, "--geometry, not leg"),
+                (("--geometry", "arm", "--env", "NO_SUCH"), SCENE, 2, "no such variable"),
                 (("--geometry", "arm", "--frames", "1-9x2"), SCENE, 2, "leaves frames out"),
                 (("--geometry", "arm", "--result", "a.pc2"), SCENE, 2, "ends in .npy"),
                 (("--geometry", "arm"), cached, 1, "another tool's cache"),

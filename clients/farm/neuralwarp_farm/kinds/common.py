@@ -11,7 +11,7 @@ from typing import Optional
 from ..errors import FarmError, UsageError
 from ..facts import Build, Timing, say
 from ..parts import Frames, count_for, cut, frames_of
-from ..plan import ID, Resources, SourceFile, read
+from ..plan import ID, VARIABLE, Resources, SourceFile, read
 
 MINUTES = 15.0           # of a part, where nothing was said
 ROOM, SPARE_MB = 1.5, 500  # memory of a task: so many times what was seen, and that much more
@@ -44,7 +44,25 @@ def add_cutting(parser: argparse.ArgumentParser) -> None:
                         help="frames that are evaluated before each part, and not written (default 0)")
 
 
+def add_environment(parser: argparse.ArgumentParser) -> None:
+    parser.add_argument("--env", action="append", default=[], metavar="NAME[=VALUE]",
+                        help="a variable that tasks get, with the value that it has here if none is given; may be "
+                        "repeated")
+
+
 # --- what they mean ---
+
+def environment_of(arguments: argparse.Namespace) -> dict[str, str]:
+    result: dict[str, str] = {}
+    for text in arguments.env:
+        name, equals, value = text.partition("=")
+        if not VARIABLE.fullmatch(name):
+            raise UsageError(f"--env is {text!r}, not NAME or NAME=VALUE")
+        if not equals and name not in os.environ:
+            raise UsageError(f"--env {name}: there is no such variable here, and no value was given")
+        result[name] = value if equals else os.environ[name]
+    return result
+
 
 def folder_of(arguments: argparse.Namespace) -> Path:
     return Path(os.path.abspath(arguments.output))

@@ -32,6 +32,7 @@ def add_arguments(parser: argparse.ArgumentParser) -> None:
                         help="ask for no frame more in each part, by which the merge sees whether a part begins as the "
                         "one before went on: for a program that gives other bytes each time")
     common.add_resources(parser)
+    common.add_environment(parser)
     parser.add_argument("program", nargs="+", metavar="PROGRAM ARG",
                         help="behind --: what docs/run.md calls a target command. A word that names a file is passed "
                         "with its whole path; {threads} is the number of cores that a task has")
@@ -56,8 +57,8 @@ def make_plan(arguments: argparse.Namespace) -> Plan:
              for piece, name in zip(pieces, names(len(pieces)))]
     return Plan(folder, "targets", common.name_of(arguments, f"{Path(scene.path).stem}.targets"), build.version,
                 build.build, {"quarn": quarn}, scene.files + own_files, str(whole),
-                timing.seconds_a_frame if timing else None, timing.start_seconds if timing else None, {},
-                (*tasks, merge_of("bake", tasks, result)))
+                timing.seconds_a_frame if timing else None, timing.start_seconds if timing else None,
+                common.environment_of(arguments), (*tasks, merge_of("bake", tasks, result)))
 
 
 @dataclass(frozen=True)
@@ -94,10 +95,11 @@ def work_of(arguments: argparse.Namespace, scene: facts.Scene, whole: Frames, pr
 
 
 def timed_words(work: Work, quarn: str, arguments: argparse.Namespace, frames: Frames, place: Path) -> list[str]:
-    values = {"{python}": sys.executable, "{quarn}": quarn,
-              "{threads}": str(min(arguments.cpus, os.cpu_count() or 1))}
-    words = work.words(frames, str(place / "targets.npy"))
-    return ["env", f"PYTHONPATH={task.PACKAGES}", *(values.get(word, word) for word in words)]
+    values = {"python": sys.executable, "quarn": quarn, "threads": str(min(arguments.cpus, os.cpu_count() or 1))}
+    words = [task.PLACEHOLDER.sub(lambda found: values.get(found[1], found[0]), word)
+             for word in work.words(frames, str(place / "targets.npy"))]
+    variables = {"PYTHONPATH": str(task.PACKAGES), **common.environment_of(arguments)}
+    return ["env", *(f"{name}={value}" for name, value in variables.items()), *words]
 
 
 def chosen_geometry(scene: facts.Scene, wanted: Optional[str]) -> str:

@@ -23,6 +23,7 @@ def add_arguments(parser: argparse.ArgumentParser) -> None:
     parser.add_argument("--minutes", type=common.above_zero, metavar="M",
                         help="how long a training is expected to take; if not given, nothing is said of it")
     common.add_resources(parser)
+    common.add_environment(parser)
     parser.set_defaults(cpus=1)
 
 
@@ -38,7 +39,7 @@ def make_plan(arguments: argparse.Namespace) -> Plan:
                  tuple(model.id for model in models), Result("frames", ".", (JSON, TEXT)), common.MERGING)
     return Plan(common.folder_of(arguments), "train", common.name_of(arguments, f"{arguments.list.stem}.train"),
                 build.version, build.build, {"quarn": quarn, "train": facts.find_trainer(arguments.trainer)},
-                files_of(trainings), None, None, None, {}, (*models, table))
+                files_of(trainings), None, None, None, common.environment_of(arguments), (*models, table))
 
 
 def words_of(training: Training) -> tuple[str, ...]:

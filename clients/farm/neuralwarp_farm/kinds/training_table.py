@@ -57,7 +57,7 @@ def rows_of(plan: Plan) -> tuple[list[Row], list[str]]:
             elif report.is_file():
                 rows.append(row_of(task, report))
             else:  # killed between the two
-                raise FarmError(f"{plan.absolute(task.result.path)} has no report: remove it, and submit the plan again")
+                raise FarmError(f"{plan.absolute(task.result.path)} has no report: remove it, and submit again")
     rows.sort(key=lambda row: (row.measured, row.mean))
     firsts = [before is None or before.measured != row.measured for before, row in zip([None, *rows], rows)]
     return [row._replace(is_best=is_first) for row, is_first in zip(rows, firsts)], missing
