@@ -48,15 +48,18 @@ def make_plan(arguments: argparse.Namespace) -> Plan:
     work = work_of(arguments, scene, whole, program)
     result = common.path_in(folder, arguments.result, "result.npy")
     check_result("bake", result)
-    timing = None if arguments.parts else facts.timed(lambda frames, place: timed_words(work, quarn, arguments, frames,
-                                                                                        place), whole)
+    files = scene.files + own_files
+    timing = None
+    if not arguments.parts:
+        timing = common.earlier(arguments, build, files, whole) or facts.timed(
+            lambda frames, place: timed_words(work, quarn, arguments, frames, place), whole)
     pieces = common.parts_of(arguments, whole, timing)
     tasks = [Task(f"part-{name}", work.words(piece, f"{{folder}}/parts/{name}.npy"), (),
                   Result("cache", f"parts/{name}.npy"),
                   common.resources_of(arguments, timing, work.asked(piece)), str(piece))
              for piece, name in zip(pieces, names(len(pieces)))]
     return Plan(folder, "targets", common.name_of(arguments, f"{Path(scene.path).stem}.targets"), build.version,
-                build.build, {"quarn": quarn}, scene.files + own_files, str(whole),
+                build.build, {"quarn": quarn}, files, str(whole),
                 timing.seconds_a_frame if timing else None, timing.start_seconds if timing else None,
                 common.environment_of(arguments), (*tasks, merge_of("bake", tasks, result)))
 
