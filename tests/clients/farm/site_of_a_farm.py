@@ -25,6 +25,11 @@ if sys.argv[1:3] == ["info", "--build"]:
     print(json.dumps({"version": "1.0", "build": Path(__file__).with_name("build").read_text(),
                       "instructionSet": "none"}))
     sys.exit()
+if sys.argv[1] == "info":
+    geometries = ["arm", "hat"] if "--deformer" in sys.argv else ["arm"]
+    print(json.dumps({"files": [sys.argv[2]], "missing": [], "frames": None, "deformer": "warp",
+                      "geometries": geometries}))
+    sys.exit()
 folder, words = Path(sys.argv[1]), sys.argv[2:]
 if words[:1] == ["end"]:
     print("why it ends")

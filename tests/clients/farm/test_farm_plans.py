@@ -7,7 +7,8 @@ import os
 import resource
 import unittest
 from dataclasses import replace
-from typing import Any, Callable
+from pathlib import Path
+from typing import Any, Callable, Union
 
 from neuralwarp_farm import parts, plan
 from neuralwarp_farm.errors import FarmError, UsageError
@@ -109,6 +110,44 @@ class PlanTest(FarmTest):
             plan.write(replace(made, frames="1-4"), overwrite=True)
         self.assertEqual(os.listdir(made.folder), [plan.FILE])
         self.assertEqual(plan.read(made.folder), made)
+
+
+class RefusalTest(FarmTest):
+    def test_what_cannot_be_planned(self) -> None:
+        (self.place / "shot2.obj").touch()
+        scene, made, one = self.scene, self.place / "made", ("--frames", "1-3", "--parts", "1")
+        cases: list[tuple[int, str, tuple[Union[str, Path], ...]]] = [
+            (2, "say --frames A-B", ("export", scene)),
+            (2, "--parts is 5, and there are 3", ("export", scene, "--frames", "1-3", "--parts", "5")),
+            (2, "no range of frames", ("export", scene, "--frames", "3-1", "--parts", "1")),
+            (2, "--pass frames is the plan's own", ("export", scene, *one, "--pass", "frames=1")),
+            (2, "--pass is '--quiet'", ("export", scene, *one, "--pass=--quiet")),
+            (2, "ends in .npy", ("bake", scene, "a.outMesh", *one, "--result", "a.pc2")),
+            (2, "put ####", ("play", scene, *one, "--result", "a.glb")),
+            (2, "has 2 geometries, arm, hat", ("export", scene, *one, "--deformer", "two")),
+            (2, "above 0", ("export", scene, "--minutes", "0")),
+            (2, "no whole number", ("export", scene, "--cpus", "many")),
+            (1, "is not a program", ("export", scene, "--quarn", "/no/such")),
+            (1, "could not be read", ("export", self.place / "no.json", *one)),
+            (1, "shot2.obj is there already", ("play", scene, *one, "--result", self.place / "shot#.obj")),
+        ]
+        for code, named, words in cases:
+            with self.subTest(named=named):
+                self.assertIn(named, self.farm("plan", *words, "-o", made, code=code, QUARN=str(self.quarn)))
+                self.assertFalse(made.exists())
+
+    def test_what_another_plan_has_made_goes_only_when_that_is_asked_for(self) -> None:
+        words = ("plan", "export", self.scene, "--frames", "1-4", "--quarn", self.quarn, "-o", self.place / "farm")
+        self.farm(*words, "--parts", "2")
+        made = self.place / "farm/parts/0001"
+        made.mkdir(parents=True)
+        (made / "dataset.json").touch()
+        self.farm(*words, "--parts", "2")
+        self.assertIn("is another plan", self.farm(*words, "--parts", "3", code=1))
+        self.assertTrue(made.exists())
+        self.farm(*words, "--parts", "3", "--overwrite")
+        self.assertFalse(made.exists())
+        self.assertEqual(len(plan.read(self.place / "farm").tasks), 4)
 
 
 class PartsTest(unittest.TestCase):
