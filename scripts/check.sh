@@ -1,4 +1,5 @@
-# ./run check [--all]: sourced by ./run, whose functions it uses. Every phase runs, whatever the others said.
+# ./run check [--all]: sourced by ./run, whose functions it uses. Every phase runs, whatever the others said; tests, of what
+# is built.
 
 # The commit that the changes are counted from: where this branch left the main one, else the last commit but one.
 change_base() {
@@ -69,38 +70,19 @@ check_tidy() {
   }
 }
 
-build_and_test() {
-  build "$1"
-  run_tests "$1"
-}
-
-phase_report=()
-phase_failed=0
-
-# phase NAME COMMAND...: runs it in a shell of its own, notes seconds and outcome
-phase() {
-  local name=$1 start=$SECONDS verdict=passed
-  shift
-  # in the background, because `set -e` has no effect on what stands left of `||`
-  (set -e && "$@") &
-  wait $! || {
-    verdict=FAILED
-    phase_failed=1
-  }
-  phase_report+=("$(printf '%-16s %5d s  %s' "$name" $((SECONDS - start)) "$verdict")")
-}
-
 command_check() {
-  local scope=${1:-}
+  local scope=${1:-} preset
   [[ -z $scope || $scope == --all ]] || usage_error "check takes --all or nothing, not '$scope'"
+  . scripts/phases.sh
   need_packages "${check_packages[@]}" "${python_packages[@]}"
   need_for_preset tsan
+  begin_phases
   phase format check_format
   phase python check_python
   phase static-analysis check_tidy "${scope:-changed}"
-  phase asan build_and_test asan
-  phase tsan build_and_test tsan
-  say "check: seconds per phase"
-  printf '%s\n' "${phase_report[@]}"
-  return $phase_failed
+  for preset in asan tsan; do
+    phase "$preset-build" build "$preset"
+    ((phase_status)) || phase "$preset-tests" run_tests "$preset"
+  done
+  close_phases check
 }
