@@ -11,8 +11,8 @@ from dataclasses import dataclass
 from pathlib import Path
 from typing import Optional
 
-from ..errors import FarmError
-from ..plan import Plan, write_whole
+from ...errors import FarmError
+from ...plan import Plan, write_whole
 
 FORMAT = "neuralWarp farm slurm jobs"
 
