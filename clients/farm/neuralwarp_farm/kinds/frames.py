@@ -42,6 +42,7 @@ def add_arguments(parser: argparse.ArgumentParser) -> None:
         parser.add_argument("--geometry", metavar="INDEX|NAME",
                             help="one of the deformer's; if not given: the only one")
     common.add_resources(parser)
+    common.add_environment(parser)
     parser.add_argument("--pass", dest="passed", action="append", default=[], metavar="NAME[=VALUE]",
                         help=f"a further option of quarn {kind}, without its dashes; may be repeated")
 
@@ -70,7 +71,8 @@ def make_plan(arguments: argparse.Namespace) -> Plan:
         tasks.append(merge_of(work.kind, tasks, result))
     return Plan(folder, work.kind, common.name_of(arguments, f"{Path(scene.path).stem}.{work.kind}"), build.version,
                 build.build, {"quarn": quarn}, files, str(whole),
-                timing.seconds_a_frame if timing else None, timing.start_seconds if timing else None, {}, tuple(tasks))
+                timing.seconds_a_frame if timing else None, timing.start_seconds if timing else None,
+                common.environment_of(arguments), tuple(tasks))
 
 
 # --- one command of quarn ---
