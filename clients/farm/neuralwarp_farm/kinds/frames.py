@@ -101,10 +101,10 @@ class Work:
 
     def words(self, frames: Frames, output: str) -> tuple[str, ...]:
         plug = [self.plug] if self.plug else []
-        if self.is_merged:
-            which = ["--of", str(self.whole)] + (["--preroll", str(self.preroll)] if self.preroll else [])
-        else:
-            which = ["--skip-existing"] + (["--preroll", str(self.before(frames))] if self.before(frames) else [])
+        which = [] if self.kind == "play" else ["--of", str(self.whole)]
+        # of the whole, quarn itself rolls up to no frame before its first
+        before = self.before(frames) if self.kind == "play" else self.preroll
+        which += (["--preroll", str(before)] if before else []) + ([] if self.is_merged else ["--skip-existing"])
         return ("{quarn}", self.kind, self.scene, *plug, "-o", output, "--frames", str(frames), *which, *self.options,
                 "--threads", "{threads}")
 
