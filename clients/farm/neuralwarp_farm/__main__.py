@@ -110,6 +110,7 @@ def command_merge(arguments: argparse.Namespace) -> int:
 
 
 def main(words: Optional[list[str]] = None) -> int:
+    os.umask(0o002)  # another of the group may go on
     try:
         arguments = parser().parse_args(words)
         code: int = arguments.run(arguments)

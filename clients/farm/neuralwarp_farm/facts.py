@@ -147,7 +147,12 @@ def measure(command: Callable[[Frames, Path], Sequence[str]], frames: Frames) ->
         words = command(frames, Path(folder))
         begin = time.monotonic()
         process = subprocess.Popen(words, stdin=subprocess.DEVNULL, stdout=output, stderr=output)
-        _, status, usage = os.wait4(process.pid, 0)
+        try:
+            _, status, usage = os.wait4(process.pid, 0)
+        except BaseException:  # Ctrl-C
+            process.terminate()
+            process.wait()
+            raise
         seconds = time.monotonic() - begin
         process.returncode = os.WEXITSTATUS(status) if os.WIFEXITED(status) else -os.WTERMSIG(status)
         if process.returncode:

@@ -3,14 +3,20 @@
 
 import fcntl
 import json
+import math
 import os
 import shutil
+import time
+from contextlib import suppress
 from enum import Enum
 from pathlib import Path
 from typing import Optional
 
 from .errors import FarmError, LockedByAnother
 from .plan import FILE, Plan, Task, read
+
+FRESH = 1.0  # seconds: thousands of parts lie in a folder, which is listed once for all of them
+listed: dict[Path, float] = {}  # when
 
 
 class State(Enum):
@@ -108,10 +114,11 @@ def forget_absence(plan: Plan, task: Task) -> None:
     """A network file system remembers for a while that there was no such file. Listing the folder asks the server."""
     path = plan.absolute(task.result.path)
     for folder in (path.parent, path):
-        try:
+        if time.monotonic() - listed.get(folder, -math.inf) < FRESH:
+            continue
+        with suppress(OSError):
             os.listdir(folder)
-        except OSError:
-            pass
+            listed[folder] = time.monotonic()
 
 
 # --- room for a new plan ---

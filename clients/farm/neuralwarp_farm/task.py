@@ -39,7 +39,6 @@ def run(plan: Plan, task: Task, threads: Optional[int] = None) -> int:
 
     Raises LockedByAnother where another process is at work on it, or on what it needs.
     """
-    os.umask(0o002)  # another of the group may go on
     threads = threads_of(task, threads)
     if results.is_done(plan, task):
         return is_there(task)
