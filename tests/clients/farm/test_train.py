@@ -16,7 +16,7 @@ from neuralwarp_farm.errors import FarmError
 from neuralwarp_farm.kinds import train_list
 
 QUARN = 'import json; print(json.dumps({"version": "0.9.0", "build": "abc", "instructionSet": "AVX2"}))'
-# is killed at its first attempt, and goes on at the second; its error is neurons + seed, in mm
+# is killed at its first attempt, and goes on at the second; its error is neurons - seed, in mm
 TRAINER = """
 import json, os, sys
 from pathlib import Path
@@ -28,7 +28,7 @@ if not checkpoint.exists():
     os.kill(os.getpid(), 9)
 numbers = [int(words[words.index(flag) + 1]) if flag in words else 0 for flag in ("--neurons", "--seed")]
 mm = lambda value: {"mm": value}
-network = {"mean": mm(sum(numbers)), "p9999": mm(7), "max": mm(9)}
+network = {"mean": mm(numbers[0] - numbers[1]), "p9999": mm(7), "max": mm(9)}
 report = {"errors": {"skin": None, "network": network}, "bestEpoch": 3, "seed": numbers[1], "seconds": 1.5,
           "heldOut": True, "sizes": {"a": 5, "b": 6}, "split": {"validationSet": None}, "words": words}
 for folder, name, content in ((model, "metadata.json", {}), (model.with_suffix(".report"), "report.json", report)):
@@ -126,15 +126,15 @@ class SweepTest(SweepCase):
             self.task(name)
         code, said = self.farm("table", str(self.folder), "--write")
         self.assertEqual((code, self.names(said), "1 of 5 models are not there: hand.30.1" in said),
-                         (1, ["arm", "hand.10.1", "hand.10.2", "hand.30.2"], True), said)
+                         (1, ["arm", "hand.10.2", "hand.10.1", "hand.30.2"], True), said)
         self.assertEqual([self.task(name) for name in ("merge", "hand.30.1", "hand.30.1", "merge")], [1, 137, 0, 0])
         text = (self.folder / "table.txt").read_text()
-        self.assertEqual(self.names(text), ["arm", "hand.10.1", "hand.10.2", "hand.30.1", "hand.30.2"])
-        self.assertEqual([line.split()[0] for line in text.splitlines() if line.endswith("best")], ["arm", "hand.10.1"])
+        self.assertEqual(self.names(text), ["arm", "hand.10.2", "hand.10.1", "hand.30.2", "hand.30.1"])
+        self.assertEqual([line.split()[0] for line in text.splitlines() if line.endswith("best")], ["arm", "hand.10.2"])
         self.assertEqual(text.count("hold out different frames"), 1)
         rows = json.loads((self.folder / "table.json").read_text())["models"]
         self.assertEqual([(row["name"], row["mean"], row["best"], row["bytes"]) for row in rows[:3]],
-                         [("arm", 0, True, 11), ("hand.10.1", 11, True, 11), ("hand.10.2", 12, False, 11)])
+                         [("arm", 0, True, 11), ("hand.10.2", 8, True, 11), ("hand.10.1", 9, False, 11)])
         os.remove(self.folder / "models/arm.report/report.json")
         self.assertIn("arm.nwrp has no report", self.farm("table", str(self.folder))[1])
 
