@@ -1,6 +1,7 @@
 # shellcheck shell=bash
 # The phases of a long command: each runs whatever the others said, its output is shown and kept in build/phases/NAME.log,
-# and the command closes with where the time went and with what failed. Sourced by .ci/run and ./run check.
+# and the command closes with where the time went and with what failed. Sourced by .ci/run and ./run check, which both
+# set pipefail.
 #
 # The rows of the table are in a file, which a command that runs others hands on to them: name, seconds, verdict.
 phase_folder=$PWD/build/phases
@@ -21,7 +22,7 @@ phase() {
   phase_status=0
   printf '%s\n' "$name" >"$phase_folder/running"
   # in the background, because `set -e` has no effect on what stands left of `||`
-  (set -o pipefail && (set -e && "$@") 2>&1 | tee "$log") &
+  ( (set -e && "$@") 2>&1 | tee "$log") &
   wait $! || phase_status=$?
   ((phase_status == 0)) || verdict=FAILED
   rm -f "$phase_folder/running"
