@@ -55,7 +55,9 @@ SelectType=select/cons_tres
 SelectTypeParameters=CR_CPU_Memory
 # nodes say of themselves what is written here, not what this machine has
 SlurmdParameters=config_overrides
+# a dead node is noticed after the first, one that hangs when messages to it have timed out besides
 SlurmdTimeout=5
+MessageTimeout=4
 KillWait=5
 JobRequeue=1
 ReturnToService=2
@@ -64,7 +66,7 @@ PreemptMode=REQUEUE
 SchedulerParameters=batch_sched_delay=0,sched_interval=1,bf_interval=1
 DefMemPerCPU=100
 """
-NODE = "NodeName={name} NodeHostname={host} NodeAddr=127.0.0.1 Port={port} CPUs={cpus} RealMemory=16000\n"
+NODE = "NodeName={name} NodeHostname={host} NodeAddr=127.0.0.1 Port={port} CPUs={cpus} RealMemory=16000 Feature={name}\n"
 # what is asked of `urgent` takes the place of what runs in `farm`, which is requeued
 PARTITIONS = """\
 PartitionName=farm Nodes=ALL Default=YES PriorityTier=1 MaxTime=INFINITE DefaultTime=60 State=UP
@@ -126,6 +128,26 @@ class PrivateSlurm:
         """Starts one of `nodes`, also anew where its slurmd is dead."""
         (self.folder / name).mkdir(exist_ok=True)
         self._start("slurmd", "-D", "-N", name, name=name)
+
+    def lose_node(self, name: str) -> None:
+        """Ends one of `nodes` as a loss of power does: its slurmd, and all that runs there."""
+        os.kill(self.pids[name], signal.SIGKILL)
+        for process in self._processes_on(name):
+            with contextlib.suppress(ProcessLookupError):
+                os.kill(process, signal.SIGKILL)
+
+    def _processes_on(self, name: str) -> list[int]:
+        """The job steps of a node, then what runs in them."""
+        marks = {f"SLURMD_NODENAME={name}".encode(), f"SLURM_CONF={self.configuration}".encode()}
+        steps, tasks = set(), []
+        for folder in Path("/proc").glob("[0-9]*"):
+            with contextlib.suppress(OSError, IndexError):  # it has ended meanwhile, or is another's
+                if marks <= set((folder / "environ").read_bytes().split(b"\0")):
+                    tasks.append(int(folder.name))
+                    parent = (folder / "stat").read_text().rpartition(")")[2].split()[1]
+                    if Path("/proc", parent, "comm").read_text().startswith("slurmstepd"):
+                        steps.add(int(parent))
+        return [*steps, *tasks]
 
     # --- bringing it up ---
 

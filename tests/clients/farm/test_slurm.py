@@ -1,0 +1,162 @@
+# SPDX-License-Identifier: Apache-2.0
+"""What becomes of a task on a real Slurm: two nodes on this machine, for all of these tests. The program of a task is
+rows.py, which is met before its last row."""
+
+import contextlib
+import os
+import signal
+import subprocess
+import sys
+import tempfile
+import time
+import unittest
+from collections.abc import Callable, Iterator
+from pathlib import Path
+
+from neuralwarp_farm import plan
+from neuralwarp_farm.plan import Plan, Resources, Result, Task
+from private_slurm import PrivateSlurm
+
+HERE = Path(__file__).parent
+FARM = (sys.executable, str(HERE.parents[2] / "clients/farm/neuralwarp-farm"))
+ROWS = 10
+PATIENCE = 100.0  # seconds until something that has to come is given up
+
+
+def wait_for(what: str, is_so: Callable[[], object]) -> None:
+    until = time.monotonic() + PATIENCE
+    while not is_so():
+        if time.monotonic() > until:
+            raise AssertionError(f"no {what} in {PATIENCE:g} s")
+        time.sleep(0.1)
+
+
+class Work:
+    """A plan of tasks whose last rows wait for `finish`."""
+
+    def __init__(self, slurm: PrivateSlurm, name: str, tasks: int = 1) -> None:
+        self.slurm = slurm
+        folder = Path(tempfile.mkdtemp(dir=slurm.folder, prefix=f"{name}-"))
+        self.plan = Plan(folder, "export", name, "0", "0", {}, (), None, None, None, {}, tuple(
+            Task(f"part-{number}", ("{python}", str(HERE / "rows.py"), f"set{number}", str(ROWS), "go"), (),
+                 Result("dataset", f"set{number}"), Resources(cpus=1, memory_mb=100)) for number in range(tasks)))
+        plan.write(self.plan)
+
+    def farm(self, *words: str) -> "subprocess.CompletedProcess[str]":
+        return subprocess.run([*FARM, *words], env=self.slurm.environment, capture_output=True, text=True)
+
+    def submit(self, *options: str) -> None:
+        done = self.farm("submit", str(self.plan.folder), *options)
+        if done.returncode:
+            raise AssertionError(f"submit {self.plan.name}: {done.stderr}")
+
+    def written(self) -> list[list[int]]:
+        """Row and process of each row of the first task that is there, in a part or in the whole."""
+        for folder in ("set0.part", "set0"):
+            with contextlib.suppress(FileNotFoundError):
+                lines = (self.plan.folder / folder / "rows").read_text().splitlines()
+                return [[int(word) for word in line.split()] for line in lines]
+        return []
+
+    def wait_for_rows(self) -> None:
+        wait_for(f"rows of {self.plan.name}", lambda: len(self.written()) == ROWS - 1)
+
+    def finish(self) -> None:
+        """Lets the last rows be written, and waits for them."""
+        (self.plan.folder / "go").touch()
+        wait_for(f"end of {self.plan.name}", lambda: self.farm("status", str(self.plan.folder)).returncode == 0)
+
+    def said(self) -> str:
+        """What the scripts of jobs and the tasks have written."""
+        return "".join(log.read_text() for log in sorted((self.plan.folder / "logs").glob("*")))
+
+
+@contextlib.contextmanager
+def only(slurm: PrivateSlurm, node: str) -> Iterator[None]:
+    """Meanwhile nothing begins elsewhere."""
+    others = ",".join(name for name in slurm.nodes if name != node)
+    slurm.run("scontrol", "update", f"NodeName={others}", "State=DRAIN", "Reason=test")
+    yield
+    slurm.run("scontrol", "update", f"NodeName={others}", "State=RESUME")
+
+
+class OnSlurm(unittest.TestCase):
+    slurm: PrivateSlurm
+
+    @classmethod
+    def setUpClass(cls) -> None:
+        ending = contextlib.ExitStack()
+        cls.slurm = ending.enter_context(PrivateSlurm(cpus=4))
+        cls.addClassCleanup(ending.close)
+        # Slurm counts in minutes: this one runs beside the others
+        cls.limited = Work(cls.slurm, "limited")
+        with only(cls.slurm, "node1"):
+            cls.limited.submit("--time", "1")
+            cls.limited.wait_for_rows()
+
+    def begin(self, name: str) -> Work:
+        """Work that has begun on the second node, and which the first may take over."""
+        work = Work(self.slurm, name)
+        with only(self.slurm, "node2"):
+            work.submit()
+            work.wait_for_rows()
+        return work
+
+    def check_goes_on(self, work: Work) -> None:
+        """Another process takes over where the first was ended."""
+        wait_for(f"second start of {work.plan.name}", lambda: ", start 2: " in work.said())
+        self.check_rows(work, writers=2)
+
+    def check_rows(self, work: Work, writers: int) -> None:
+        """Each row once, in order, by so many processes one after another."""
+        work.finish()
+        rows, processes = zip(*work.written())
+        self.assertEqual(list(rows), list(range(ROWS)), work.said())
+        self.assertEqual(len(set(processes)), writers, work.said())
+
+    def test_killed(self) -> None:
+        work = self.begin("killed")
+        os.kill(work.written()[0][1], signal.SIGKILL)
+        self.check_goes_on(work)
+
+    def test_preempted(self) -> None:
+        work = self.begin("preempted")
+        self.slurm.run("sbatch", "--partition=urgent", "--nodelist=node2", "--cpus-per-task=4", "--output=/dev/null",
+                       "--wrap=sleep 1")
+        self.check_goes_on(work)
+        self.assertIn("asked to end", work.said())
+
+    def test_time_limit(self) -> None:
+        """TERM comes before the end. Slurm may warn a minute early."""
+        self.check_goes_on(self.limited)
+        self.assertRegex(self.limited.said(), r"the time limit is near(.|\n)*ended with 143(.|\n)*begins again")
+
+    def test_sent_twice(self) -> None:
+        """By two at one moment: it is sent once."""
+        work = Work(self.slurm, "twice", tasks=3)
+        senders = [subprocess.Popen([*FARM, "submit", work.plan.folder], env=self.slurm.environment,
+                                    stdout=subprocess.PIPE, text=True) for _ in range(2)]
+        said = sorted(sender.communicate()[0] for sender in senders)
+        self.assertEqual([sender.returncode for sender in senders], [0, 0])
+        self.assertRegex(said[0], "^Nothing to send")
+        self.assertRegex(said[1], r"^Sent job \d+: part-0 to part-2")
+        self.check_rows(work, writers=1)
+        self.assertEqual(work.said().count("begins"), 3, work.said())
+
+    def test_node_lost(self) -> None:
+        work = self.begin("lost")
+        self.addCleanup(self.slurm.start_node, "node2")
+        self.slurm.lose_node("node2")
+        self.check_goes_on(work)
+
+    def test_node_silent(self) -> None:
+        """A node that is only thought lost: its task goes on, and its twin elsewhere is tried again until it ends."""
+        work = self.begin("silent")
+        self.addCleanup(os.kill, self.slurm.pids["node2"], signal.SIGCONT)
+        os.kill(self.slurm.pids["node2"], signal.SIGSTOP)
+        wait_for("twin", lambda: "ended with 75" in work.said())
+        self.check_rows(work, writers=1)
+
+
+if __name__ == "__main__":
+    unittest.main()
