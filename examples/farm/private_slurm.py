@@ -66,7 +66,8 @@ PreemptMode=REQUEUE
 SchedulerParameters=batch_sched_delay=0,sched_interval=1,bf_interval=1
 DefMemPerCPU=100
 """
-NODE = "NodeName={name} NodeHostname={host} NodeAddr=127.0.0.1 Port={port} CPUs={cpus} RealMemory=16000 Feature={name}\n"
+NODE = ("NodeName={name} NodeHostname={host} NodeAddr=127.0.0.1 Port={port} CPUs={cpus} RealMemory=16000 "
+        "Feature={name}\n")
 # what is asked of `urgent` takes the place of what runs in `farm`, which is requeued
 PARTITIONS = """\
 PartitionName=farm Nodes=ALL Default=YES PriorityTier=1 MaxTime=INFINITE DefaultTime=60 State=UP

@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
-"""rows.py FOLDER ROWS GO: writes a data set of as many rows, as programs of this project do: under a lock, in FOLDER.part,
-where it goes on; all of it at once at the end. A row says who wrote it. The last one waits until there is a file GO."""
+"""rows.py FOLDER ROWS GO: writes a data set of as many rows, as programs of this project do: under a lock, in
+FOLDER.part, where it goes on; all of it at once at the end. A row says who wrote it. The last one waits until there is
+a file GO."""
 
 import fcntl
 import os

@@ -278,7 +278,7 @@ class ScriptTest(AtFakeSlurm):
         keeps = "trap 'sleep 0.3; exit 143' TERM; : > begun; while :; do sleep 0.05; done"
         ends_well = "trap 'sleep 0.3; exit 0' TERM; : > begun; while :; do sleep 0.05; done"
         table = [("exit 0", 0, None, 0, False), ("exit 3", 0, None, 3, False), ("exit 75", 0, None, 75, True),
-                 ("exit 75", 4, None, 75, True), ("exit 75", 5, None, 75, False), ("kill -9 $$", 0, None, 137, False),
+                 ("exit 75", 4, None, 75, True), ("exit 75", 5, None, 75, False), ("kill -9 $$", 0, None, 137, True),
                  (keeps, 0, signal.SIGUSR1, 143, True), (keeps, 5, signal.SIGUSR1, 143, False),
                  (keeps, 0, signal.SIGTERM, 143, False), (ends_well, 0, signal.SIGUSR1, 0, False)]
         for program, restarts, number, code, again in table:

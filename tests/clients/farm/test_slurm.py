@@ -82,13 +82,13 @@ def only(slurm: PrivateSlurm, node: str) -> Iterator[None]:
 
 class OnSlurm(unittest.TestCase):
     slurm: PrivateSlurm
+    limited: Work  # begun before all others, as Slurm counts in minutes
 
     @classmethod
     def setUpClass(cls) -> None:
         ending = contextlib.ExitStack()
         cls.slurm = ending.enter_context(PrivateSlurm(cpus=4))
         cls.addClassCleanup(ending.close)
-        # Slurm counts in minutes: this one runs beside the others
         cls.limited = Work(cls.slurm, "limited")
         with only(cls.slurm, "node1"):
             cls.limited.submit("--time", "1")

@@ -12,7 +12,8 @@ def script(title: str, command: Sequence[str], tasks: Sequence[str], environment
 
     bash, and not the program itself, is what Slurm's signals reach. Of these USR1 says that the time limit is near and
     TERM that the job was cancelled: the program ends on TERM in both cases and keeps what it has, and only the first
-    begins again. So does a task that another holds (75). Both count as restarts, as does a node that was lost.
+    begins again. So do a task that another holds (75) and one that was killed (137: for want of memory, say). All count
+    as restarts, as does a node that was lost.
     """
     variables = "".join(f"export {name}={shlex.quote(value)}\n" for name, value in environment.items())
     return TEMPLATE.format(title=title.replace("\n", " "), variables=variables, tasks=" ".join(map(shlex.quote, tasks)),
@@ -51,7 +52,7 @@ code=$?
 trap '' USR1 TERM INT  # what is requeued is asked to end, and has
 say "$task ended with $code"
 
-if {{ [ "$code" = 75 ] || [ -n "$limit" ]; }} && [ "$code" != 0 ]; then
+if {{ [ "$code" = 75 ] || [ "$code" = 137 ] || [ -n "$limit" ]; }} && [ "$code" != 0 ]; then
   if [ "$restarts" -lt {restarts} ]; then
     say "$task begins again"
     scontrol requeue "$job" || say "scontrol requeue $job failed"
