@@ -44,7 +44,8 @@ class Farm(NamedTuple):
     start: float          # seconds of a task before its first frame
     merge_start: float    # seconds of a merge beside its bytes
     merge_rate: float     # bytes a second
-    minutes: float = 20   # of a task, as planned
+    longest: float = 1200  # seconds of a task, as planned, where there is more to do than room
+    shortest: float = 60   # and where there is less
     wait: float = 30      # seconds until the scheduler has begun with the first tasks, and with the merge
 
 
@@ -68,10 +69,11 @@ def spans(frames: int, parts: int) -> List[str]:
 
 
 def wall_seconds(job: Job, farm: Farm, slots: int) -> float:
-    """Of a whole job on so many cores: the formula of docs/farm.md. A slot waits for a task's time at most."""
-    tasks = max(1, min(job.frames, math.ceil(job.frames * job.seconds / (60 * farm.minutes))))
-    waves = math.ceil(tasks / slots)
-    making = waves * (farm.start + math.ceil(job.frames / tasks) * job.seconds)
+    """Of a whole job where so many tasks run at once: the formula of docs/farm.md. Tasks are as short as fills all
+    places, within limits."""
+    length = min(max(job.frames * job.seconds / slots, farm.shortest), farm.longest)
+    tasks = max(1, min(job.frames, math.ceil(job.frames * job.seconds / length)))
+    making = math.ceil(tasks / slots) * (farm.start + math.ceil(job.frames / tasks) * job.seconds)
     return farm.wait + making + farm.wait + farm.merge_start + job.frames * job.bytes / farm.merge_rate
 
 
@@ -155,7 +157,8 @@ class Bench:
 def table(farm: Farm, jobs: List[Job]) -> List[str]:
     cores = 16
     nodes = (1, 10, 100, 1000)
-    lines = [f"15,000 poses, {cores} tasks a node, tasks of {farm.minutes:.0f} min; wall time:",
+    lines = [f"15,000 poses, {cores} tasks at once on a node, of {farm.shortest / 60:.0f} to {farm.longest / 60:.0f} "
+             "min; wall time:",
              f"{'':34}" + "".join(f"{count:>6} node{'s' if count > 1 else ' '}" for count in nodes) + "   merge alone"]
     for job in jobs:
         walls = "".join(f"{clock(wall_seconds(job, farm, cores * count)):>12}" for count in nodes)
