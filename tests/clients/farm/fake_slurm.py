@@ -37,6 +37,7 @@ def main() -> int:
     if os.path.exists(QUEUE):
         with open(QUEUE) as file:
             jobs = json.load(file)
+    assert "SQUEUE_FORMAT" not in os.environ
     if tool == "sbatch":
         time.sleep(0.2)  # two who submit at one moment would meet here
         if counted_down("refuse"):

@@ -11,6 +11,7 @@ import shlex
 import signal
 import subprocess
 import sys
+import time
 import unittest
 from pathlib import Path
 from typing import Any, Optional
@@ -25,7 +26,7 @@ from neuralwarp_farm.plan import Plan, Resources, Result, Task
 from neuralwarp_farm.submit import megabytes, minutes
 from site_of_a_farm import FarmTest
 
-FAILING = {2: "[ -e go ] || exit 3; ", 3: "[ -e go ] || kill -9 $$; "}
+FAILING = {2: "[ -e go ] || exit 3; ", 3: "[ -e go ] || kill -9 $$; sleep 1; "}
 
 
 class EnginesTest(FarmTest):
@@ -76,7 +77,7 @@ class PrintersTest(EnginesTest):
 
     def calls(self, of: Plan, engine: str) -> list[str]:
         told = self.here("submit", of.folder, "--engine", engine)
-        return [line.strip() for line in told.splitlines() if line.startswith("  ")]
+        return [re.sub(r"-([jP]) \d+", r"-\1 9", line.strip()) for line in told.splitlines() if line.startswith("  ")]
 
     def test_a_list_holds_what_is_left(self) -> None:
         of = self.parts(3)
@@ -190,7 +191,7 @@ class SlurmTest(AtFakeSlurm):
                          [["part-1", "part-2", "part-3"], ["part-4", "part-5", "part-6"], ["part-7"], ["merge"]])
         self.assertEqual([job["options"].get("array") for job in jobs], ["0-2", "0-2", None, None])
         self.assertEqual([job["options"].get("dependency") for job in jobs], [None] * 3 + ["afterany:1:2:3"])
-        self.assertEqual(jobs[0]["options"]["output"].replace("%%", "%"), f"{of.folder}/logs/slurm-%A_%a.log")
+        self.assertEqual(jobs[0]["options"]["output"], f"{of.folder}/logs".replace("%j", "%%j") + "/slurm-%A_%a.log")
         self.assertEqual([jobs[0]["options"][name] for name in ("time", "mem", "signal")], ["14", "100M", "B:USR1@60"])
         self.assertIn("SBATCH_QOS", jobs[0]["environment"])
         self.assertFalse({"SECRET", "SQUEUE_FORMAT"} & set(jobs[0]["environment"]))
@@ -214,6 +215,9 @@ class SlurmTest(AtFakeSlurm):
         self.assertEqual([job["states"] for job in jobs[1:]], [["CANCELLED"], ["PENDING"], ["PENDING"]])
         self.assertEqual([self.tasks_of(job) for job in jobs[2:]], [["part-2"], ["merge"]])
         self.assertEqual(jobs[3]["options"]["dependency"], "afterany:3:2")
+        # the old merge had begun, and the new one was taken out by hand
+        self.set_states([], ["RUNNING"], ["PENDING"], ["CANCELLED"])
+        self.assertEqual(engines.states(of)["merge"], "running")
         asked = {name: jobs[2]["options"][name] for name in ("time", "signal", "partition", "gres", "cpus-per-task")}
         self.assertEqual(list(asked.values()), ["1", "B:USR1@15", "night", "gpu:2", "4"])
 
@@ -231,6 +235,8 @@ class SlurmTest(AtFakeSlurm):
                 self.assertEqual(tasks, [task.id for task in of.tasks])
                 waits = self.jobs()[-1]["options"]["dependency"].split(":")
                 self.assertEqual((waits[0], sorted(waits[1:])), ("afterany", ["1", "2", "3"]))
+                self.assertIn("Cancelled 4 jobs", self.here("cancel", of.folder))
+                self.assertEqual({state for job in self.jobs() for state in job["states"]}, {"CANCELLED"})
 
     def test_a_job_with_the_id_of_ours_is_left_alone(self) -> None:
         of = self.parts(2)
@@ -261,7 +267,7 @@ class SlurmTest(AtFakeSlurm):
 
 class ScriptTest(AtFakeSlurm):
     def run_script(self, program: str, restarts: int, number: Optional[int] = None) -> tuple[int, str]:
-        """Its status and what it says; `number` is sent to it as soon as the program has begun."""
+        """Its status and what it says; `number` is sent to it, twice, as soon as the program has begun."""
         text = script("a\ntitle", ["sh", "-c", program], ["x", "y"], {"SHOW": "it's"})
         environment = {"PATH": os.environ["PATH"], "SLURM_CONF": str(self.place), "SLURM_RESTART_COUNT": str(restarts),
                        "SLURM_JOB_ID": "9", "SLURM_ARRAY_JOB_ID": "5", "SLURM_ARRAY_TASK_ID": "1"}
@@ -271,6 +277,8 @@ class ScriptTest(AtFakeSlurm):
             self.wait_until((self.place / "begun").exists)
             (self.place / "begun").unlink()
             process.send_signal(number)
+            time.sleep(0.1)
+            process.send_signal(number)  # while the program is ending
         said = process.communicate(timeout=60)[0]
         return process.returncode, said
 
