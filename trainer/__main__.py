@@ -12,7 +12,8 @@ from types import FrameType
 from typing import TYPE_CHECKING, Any, Callable, NoReturn, Optional, Union
 
 from . import __version__
-from .errors import Terminated, TrainerError, UsageError
+from .errors import (DONE, FAILED, INTERRUPTED, LOCKED, TERMINATED, USAGE, LockedByAnother, Terminated, TrainerError,
+                     UsageError)
 
 if TYPE_CHECKING:  # what needs NumPy is imported by the commands, behind what sets its threads
     from .folders import Work
@@ -159,7 +160,7 @@ def command_train(options: argparse.Namespace) -> int:
                        lambda settings: output_path(options, settings), options.report)
     if options.json:
         print(json.dumps(result, indent=1))
-    return INTERRUPTED if result["interrupted"] else 0
+    return INTERRUPTED if result["interrupted"] else DONE
 
 
 def train_one(options: argparse.Namespace, folder: Union[str, Path], validation_set: Union[str, Path, None],
@@ -206,7 +207,8 @@ def train_all(options: argparse.Namespace, works: "list[Work]") -> int:
         raise TrainerError(f"-o {place} is one model, and {options.dataset} has {len(works)} data sets: give the "
                            "folder that their models go to")
     say = speaker(options)
-    lines, results, failed = [], [], []
+    lines, results = [], []
+    failed: list[Exception] = []
     for number, work in enumerate(works, 1):
         say(f"{work.label}, {number} of {len(works)}")
         try:
@@ -215,7 +217,7 @@ def train_all(options: argparse.Namespace, works: "list[Work]") -> int:
         except (TrainerError, OSError, MemoryError) as error:
             why = str(error) if isinstance(error, TrainerError) else reason_of(error)
             result = {"dataSet": work.label, "error": why, "interrupted": False}
-            failed.append(work.label)
+            failed.append(error)
             lines.append(f"{work.label}: failed, as {why}")
         results.append(result)
         if result["interrupted"]:
@@ -229,8 +231,10 @@ def train_all(options: argparse.Namespace, works: "list[Work]") -> int:
         return INTERRUPTED
     if failed:
         whys = "".join(f"; {one['dataSet']}: {one['error']}" for one in results if "error" in one)
-        raise TrainerError(f"{len(failed)} of {len(works)} data sets became no model{whys}")
-    return 0
+        sentence = f"{len(failed)} of {len(works)} data sets became no model{whys}"
+        is_locked = all(isinstance(error, LockedByAnother) for error in failed)
+        raise LockedByAnother(sentence) if is_locked else TrainerError(sentence)
+    return DONE
 
 
 def train_work(options: argparse.Namespace, work: "Work", place: Path) -> dict[str, Any]:
@@ -331,7 +335,6 @@ def command_info(options: argparse.Namespace) -> int:
     return 0
 
 
-INTERRUPTED = 130  # 128 + SIGINT
 COMMANDS: dict[str, Callable[[argparse.Namespace], int]] = {
     "train": command_train, "evaluate": command_evaluate, "zero": command_zero, "info": command_info}
 
@@ -348,7 +351,9 @@ def main() -> int:
         sys.stdout.flush()
         return status
     except UsageError as error:
-        return complain(error, 2)
+        return complain(error, USAGE)
+    except LockedByAnother as error:
+        return complain(error, LOCKED)
     except TrainerError as error:
         return complain(error)
     except ModuleNotFoundError as error:
@@ -361,7 +366,7 @@ def main() -> int:
     except KeyboardInterrupt as error:
         return complain(f"interrupted {error}".strip(), INTERRUPTED)
     except Terminated:
-        return 143
+        return TERMINATED
 
 
 def reason_of(error: Union[OSError, MemoryError]) -> str:
@@ -371,7 +376,7 @@ def reason_of(error: Union[OSError, MemoryError]) -> str:
     return f"{error.filename or 'standard output'}: {error.strerror}" if error.strerror else str(error)
 
 
-def complain(error: object, status: int = 1) -> int:
+def complain(error: object, status: int = FAILED) -> int:
     print(f"trainer: {error}", file=sys.stderr)
     return status
 

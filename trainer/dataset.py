@@ -10,7 +10,8 @@ from typing import Any, Iterator, Optional, Union
 
 import numpy as np
 
-from .errors import TrainerError
+from .errors import LockedByAnother, TrainerError
+from .files import is_claimed
 from .sequence import drawn_rows
 from .settings import Settings, read_settings
 
@@ -62,6 +63,8 @@ class Dataset:
 def load_dataset(place: Union[str, Path]) -> Dataset:
     folder = Path(place)
     path = folder / "dataset.json"
+    if not path.is_file() and is_claimed(Path(f"{folder}.part")):
+        raise LockedByAnother(f"{folder} is not complete yet, and another process is writing it: wait for it")
     if not path.is_file():
         raise TrainerError(f"{folder} is not a training data set: it has no dataset.json"
                            + (" (only a complete one has)" if folder.is_dir() else ""))

@@ -1,5 +1,13 @@
 # SPDX-License-Identifier: Apache-2.0
-"""The errors that a user sees."""
+"""The errors that a user sees, and what the program ends with: docs/exitCodes.md."""
+
+DONE = 0
+FAILED = 1
+USAGE = 2
+NOT_YET = 3        # of what asks how far work is, which nothing here does
+LOCKED = 75        # another process has it; EX_TEMPFAIL of sysexits.h: try again
+INTERRUPTED = 130  # Ctrl-C
+TERMINATED = 143   # SIGTERM
 
 
 class TrainerError(Exception):
@@ -8,6 +16,10 @@ class TrainerError(Exception):
 
 class UsageError(TrainerError):
     """A command line that cannot be understood."""
+
+
+class LockedByAnother(TrainerError):
+    """Another process writes what was asked for: the same may be done when that one has ended."""
 
 
 class Terminated(BaseException):

@@ -20,7 +20,7 @@ from unittest import mock
 
 import numpy as np
 import synthetic
-from trainer import progress, report
+from trainer import files, progress, report
 from trainer.settings import KINDS, described
 
 ROOT = Path(__file__).resolve().parents[2]
@@ -156,6 +156,27 @@ class CommandTest(unittest.TestCase):
                                     for name in ("arm.report/report.json", "arm.nwrp/metadata.json"))
                 self.assertTrue(report["interrupted"] and 2000 <= report["epochs"] < 40000)
                 self.assertEqual(metadata["interruptedAfterEpochs"], report["epochs"])
+
+    def test_what_another_process_writes(self) -> None:
+        process = self.start(*TRAIN, "--epochs", "40000", "--patience", "40000", "--batch-size", "1")
+        assert process.stdout
+        while "validating on" not in process.stdout.readline():
+            self.assertIsNone(process.poll())
+        for arguments in (TRAIN, ("zero", "data", "-o", "m/arm")):
+            self.assertIn("another process is writing m/arm.", self.refused(*arguments, status=75))
+        process.send_signal(signal.SIGTERM)
+        process.communicate()
+        self.assertEqual(process.returncode, 143)
+        # a data set of quarn that is not complete; several, of which all or not all are tried again
+        (self.place / "sets").mkdir()
+        with files.whole_folder(self.place / "begun", ()), files.whole_folder(self.place / "models/grid.nwrp", ()):
+            self.assertIn("begun is not complete yet", self.refused("info", "begun", status=75))
+            shutil.copytree(self.place / "data", self.place / "sets/data")
+            self.refused("train", "sets", "--quiet", "--epochs", "1", status=75)
+            (self.place / "sets/none").mkdir()
+            (self.place / "sets/none/dataset.json").write_text("[]")
+            self.refused("train", "sets", "--quiet", "--epochs", "1", status=1)
+        self.refused("info", "begun", status=1)
 
     def test_a_full_disk_is_told_with_the_file(self) -> None:
         synthetic.make(self.place / "two", frames=60, affect=[1, 2])

@@ -1,14 +1,16 @@
 # SPDX-License-Identifier: Apache-2.0
 """Folders are whole or not there, whatever happens while they are written."""
 
+import multiprocessing
 import os
 import tempfile
 import unittest
+from contextlib import suppress
 from pathlib import Path
 from unittest import mock
 
 from trainer import files
-from trainer.errors import TrainerError
+from trainer.errors import LockedByAnother, TrainerError
 
 NAMES = ("a", "b")
 
@@ -72,9 +74,30 @@ class WholeFolderTest(unittest.TestCase):
     def test_one_writer_at_a_time(self) -> None:
         with files.whole_folder(self.target, NAMES) as part:
             (part / "a").write_text("first")
-            with self.assertRaisesRegex(TrainerError, "another process is writing"):
+            with self.assertRaisesRegex(LockedByAnother, "another process is writing"):
                 self.write("second")
         self.assertEqual(self.content(), {"a": "first"})
+
+    def test_many_writers_leave_one_whole_folder(self) -> None:
+        """Each begins anew while others finish, until it has written some; `a` and `b` are of one writer."""
+        def write_some(writer: int) -> None:
+            for number in range(25):
+                with suppress(LockedByAnother), files.whole_folder(self.target, NAMES) as part:
+                    for name in NAMES:
+                        (part / name).write_text(f"{writer} {number}")
+                    if len(set(path.read_text() for path in part.iterdir() if path.name in NAMES)) != 1:
+                        raise ValueError("another one writes here")
+
+        self.write("one")
+        writers = [multiprocessing.get_context("fork").Process(target=write_some, args=(n,)) for n in range(4)]
+        for writer in writers:
+            writer.start()
+        for writer in writers:
+            writer.join()
+        self.assertEqual([writer.exitcode for writer in writers], [0] * 4)
+        found = self.content()
+        self.assertEqual(sorted(found), ["a", "b"])
+        self.assertEqual(found["a"], found["b"])
 
     def test_names_of_models(self) -> None:
         for text, wanted in (("m/arm", "m/arm.nwrp"), ("m/arm.nwrp", "m/arm.nwrp"), ("arm.v2", "arm.v2.nwrp")):
