@@ -68,6 +68,7 @@ int run(int argc, char** argv) {
     app.require_subcommand(1);
     quarn::addImportCommand(app);
     quarn::addExportCommand(app);
+    quarn::addMergeCommand(app);
     quarn::addPlayCommand(app);
     quarn::addBakeCommand(app);
     quarn::addExecCommand(app);

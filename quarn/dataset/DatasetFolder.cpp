@@ -2,18 +2,17 @@
 #include "quarn/dataset/DatasetFolder.h"
 
 #include "quarn/dataset/DatasetWriter.h"
+#include "quarn/dataset/roomOnDisk.h"
+#include "quarn/scene/PartRecord.h"
 #include "storage/Folder.h"
 #include "storage/FolderLock.h"
 #include "storage/WholeFile.h"
 
 #include <algorithm>
 #include <array>
-#include <cerrno>
 #include <stdexcept>
 #include <system_error>
 
-#include <sys/statvfs.h>
-#include <unistd.h>
 
 namespace quarn {
 namespace {
@@ -22,18 +21,23 @@ namespace fs = std::filesystem;
 
 // stands in a data set that is about to be replaced, and then in FOLDER.part: what is there is nothing to go on from
 constexpr const char* supersededFile = "superseded";
-constexpr std::array ourFiles = {
-    datasetFile::controls, datasetFile::deltas, datasetFile::frames,   datasetFile::skin,
-    descriptionFile,       setupFile,           datasetFile::progress, storage::FolderLock::fileName,
-    supersededFile};
-constexpr std::uint64_t roomForTexts = 1U << 20U; // the JSON files, and what the file system needs for itself
+constexpr std::array ourFiles = {datasetFile::controls, datasetFile::deltas,   datasetFile::frames,
+                                 datasetFile::skin,     descriptionFile,       setupFile,
+                                 PartRecord::fileName,  datasetFile::progress, storage::FolderLock::fileName,
+                                 supersededFile};
 
 bool isOneOf(const std::string& name, const char* file) {
     return name == file || storage::TemporaryFile::isOf(name, file);
 }
 
+// NFS keeps a file that was removed while it was open under such a name, and takes it away itself
+bool isOfFileSystem(const std::string& name) {
+    return name.starts_with(".nfs");
+}
+
 bool isOurs(const std::string& name) {
-    return std::any_of(ourFiles.begin(), ourFiles.end(), [&](const char* file) { return isOneOf(name, file); });
+    return isOfFileSystem(name) ||
+           std::any_of(ourFiles.begin(), ourFiles.end(), [&](const char* file) { return isOneOf(name, file); });
 }
 
 void removeFile(const fs::path& file) {
@@ -133,13 +137,7 @@ void DatasetFolder::begin(const Setup& setup) const {
 }
 
 void DatasetFolder::requireSpace(std::uint64_t bytes) const {
-    struct statvfs disk = {};
-    if (::statvfs(part_.c_str(), &disk) != 0)
-        return; // writing will tell
-    const std::uint64_t free = std::uint64_t{disk.f_bavail} * disk.f_frsize;
-    if (free < bytes + roomForTexts)
-        throw std::runtime_error("the disk of " + part_.string() + " has " + std::to_string(free) +
-                                 " bytes free, and the data set needs " + std::to_string(bytes + roomForTexts));
+    requireRoom(part_, bytes, "the data set");
 }
 
 void DatasetFolder::publish(storage::FolderLock& lock) const {

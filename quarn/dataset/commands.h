@@ -8,8 +8,9 @@ class App;
 
 namespace quarn {
 
-/// Adds a sub-command, with a callback that does the work. What is wrong is thrown as std::runtime_error with the
+/// Each adds a sub-command, with a callback that does the work. What is wrong is thrown as std::runtime_error with the
 /// sentence that the user reads.
 void addExportCommand(CLI::App& app);
+void addMergeCommand(CLI::App& app);
 
 } // namespace quarn

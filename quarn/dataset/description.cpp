@@ -2,53 +2,19 @@
 #include "quarn/dataset/description.h"
 
 #include "quarn/console/json.h"
+#include "quarn/dataset/controlRanges.h"
+#include "quarn/dataset/exactNumbers.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
 #include "quarn/scene/units.h"
 
 #include "openquarn_app/Commands.h"
-#include "storage/npyHeader.h"
 
-#include <algorithm>
-#include <array>
-#include <charconv>
 #include <cmath>
-#include <fstream>
 #include <stdexcept>
 
 namespace quarn {
 namespace {
-
-struct Range {
-    float least = 0;
-    float largest = 0;
-};
-
-// reads the file again: rows of an earlier run count as well
-std::vector<Range> rangesOf(const std::filesystem::path& controls, const DatasetShape& shape) {
-    std::ifstream file(controls, std::ios::binary);
-    file.seekg(storage::npyHeadSize);
-    std::vector<Range> ranges(shape.controls);
-    std::vector<float> row(shape.controls);
-    for (std::size_t number = 0; number < shape.rows; ++number) {
-        file.read(reinterpret_cast<char*>(row.data()), static_cast<std::streamsize>(row.size() * sizeof(float)));
-        for (std::size_t i = 0; i < row.size(); ++i) {
-            const Range before = number == 0 ? Range{row[i], row[i]} : ranges[i];
-            ranges[i] = {std::min(before.least, row[i]), std::max(before.largest, row[i])};
-        }
-    }
-    if (!file)
-        throw std::runtime_error(controls.string() + " could not be read");
-    return ranges;
-}
-
-// in the fewest digits that make the same number
-template <class Number>
-void writeNumber(JsonWriter& writer, Number value) {
-    std::array<char, 32> text = {};
-    const auto [end, error] = std::to_chars(text.data(), text.data() + text.size(), value);
-    writer.RawValue(text.data(), static_cast<std::size_t>(end - text.data()), rapidjson::kNumberType);
-}
 
 std::string labelOf(const HPlug& plug) {
     const auto outcome = OpenQuarn::runCommand("getAttr -asString " + OpenQuarn::quotedWord(plug.name().asChar()));
@@ -124,21 +90,14 @@ void writeSubset(JsonWriter& writer, const HIndexMapper& map) {
     writer.EndArray();
 }
 
-void writeControls(JsonWriter& writer, const std::vector<std::string>& names, const std::vector<Range>& ranges) {
+void writeControls(JsonWriter& writer, const std::vector<std::string>& names, const std::vector<ControlRange>& ranges) {
     writer.Key("controlNames");
     writer.StartArray();
     for (const std::string& name : names)
         writeText(writer, name);
     writer.EndArray();
     writer.Key("controlRanges");
-    writer.StartArray();
-    for (const Range& range : ranges) {
-        writer.StartArray();
-        writeNumber(writer, range.least);
-        writeNumber(writer, range.largest);
-        writer.EndArray();
-    }
-    writer.EndArray();
+    writeRanges(writer, ranges);
 }
 
 // lengths in units of the scene
@@ -205,7 +164,7 @@ std::string datasetDescription(const DatasetFacts& facts, const Warp& warp, cons
     writeSubset(writer, sampler.map());
     writeText(writer, "meshSum", facts.restSum);
     writeText(writer, "componentTagExpression", textOf(warp.plug("input", geometry, "componentTagExpression")));
-    writeControls(writer, sampler.names(), rangesOf(controls, shape));
+    writeControls(writer, sampler.names(), controlRanges(controls, shape));
     writer.Key("metersPerUnit");
     writeNumber(writer, metersPerUnit());
     writer.Key("boundingBoxDiagonal");

@@ -98,6 +98,7 @@ void addExportCommand(CLI::App& app) {
         ->type_name("INDEX|NAME");
     command->add_option("--frames", options->frames, "[exportStartFrame to exportEndFrame of the deformer]")
         ->type_name("A-B[xS]");
+    addPartOptions(*command, options->part, true);
     CLI::Option* smoothing =
         command
             ->add_option("--smoothing", options->smoothing,
@@ -112,7 +113,9 @@ void addExportCommand(CLI::App& app) {
         ->add_flag("--controls-only", options->controlsOnly,
                    "No deltas: controls.npy, frames.npy and the names, before there are targets "
                    "[trainingDataRoot/DEFORMER.controls]")
-        ->excludes(smoothing);
+        ->excludes(smoothing)
+        ->excludes("--of")
+        ->excludes("--preroll");
     command->add_flag("--anyway", options->anyway, "Export a target that does not fit the skin as well");
     command->add_flag("--overwrite", options->overwrite, "Replace another data set, or give up a begun one");
     addConsoleOptions(*command, options->console, true);

@@ -2,12 +2,15 @@
 #include "quarn/dataset/exportDatasets.h"
 
 #include "quarn/console/Log.h"
+#include "quarn/console/interrupt.h"
 #include "quarn/dataset/DatasetFolder.h"
 #include "quarn/dataset/description.h"
 #include "quarn/dataset/drawnFrames.h"
 #include "quarn/dataset/exportFrames.h"
+#include "quarn/dataset/rowSums.h"
 #include "quarn/dataset/sceneSetup.h"
 #include "quarn/dataset/settledKind.h"
+#include "quarn/scene/PartRecord.h"
 #include "quarn/scene/meshSum.h"
 #include "quarn/scene/meshes.h"
 #include "quarn/scene/plugs.h"
@@ -104,15 +107,17 @@ public:
         , options_(options)
         , warp_(warp)
         , geometry_(geometry)
-        , frames_(exportFrames(warp, options.frames))
+        , part_(partFrames(exportFrames(warp, options.frames), options.part))
+        , frames_(part_.frames)
+        , whole_(part_.whole)
         , sceneFile_(absolutePath(options.scene.scene))
         , folder_(folder, options.overwrite)
-        , sampler_(session.host(), warp, geometry, frames_.first)
+        , sampler_(session.host(), warp, geometry, whole_.first)
         , setup_(setupNow()) {
         facts_.scene = sceneFile_.filename().string();
         facts_.diagonal = diagonalOf(geometry.original);
         facts_.restSum = meshSum(geometry.original);
-        facts_.drawn = drawnFrames(frames_);
+        facts_.drawn = drawnFrames(whole_);
         facts_.shape = {frames_.count(), sampler_.names().size(), sampler_.map().affectCount()};
     }
 
@@ -126,7 +131,7 @@ public:
             return alreadyDone();
         compare();
         if (options_.like.empty() && options_.smoothing.empty())
-            warnOfJumps(session_.host(), warp_, geometry_, sampler_, frames_, options_.console);
+            warnOfJumps(session_.host(), warp_, geometry_, sampler_, whole_, options_.console);
         const std::size_t before = write();
         folder_.publish(lock);
         warnOfRepeats();
@@ -134,7 +139,7 @@ public:
     }
 
 private:
-    Setup setupNow() const { return sceneSetup(sceneFile_, warp_, geometry_, sampler_, frames_); }
+    Setup setupNow() const { return sceneSetup(sceneFile_, warp_, geometry_, sampler_, part_); }
 
     ExportAnswer alreadyDone() {
         options_.console.note(folder_.path().string() + " is complete: there is nothing to do");
@@ -151,12 +156,12 @@ private:
     void compare() {
         const HIndexMapper& map = sampler_.map();
         TargetFrames frames;
-        frames.count = frames_.count();
+        frames.count = whole_.count();
         frames.last = frames.count - 1;
         frames.reach = 3; // each is an evaluation of whatever makes the target
-        frames.time = [this](std::size_t frame) { return frames_.frame(frame); };
+        frames.time = [this](std::size_t frame) { return whole_.frame(frame); };
         frames.read = [this](std::size_t frame, std::vector<double>& xyz) {
-            session_.host().setTime(frames_.frame(frame));
+            session_.host().setTime(whole_.frame(frame));
             readPoints(geometry_.target, xyz);
         };
         if (!map.isIdentityMap())
@@ -189,8 +194,10 @@ private:
             throw;
         }
         writer.save();
+        if (part_.isPart)
+            storage::writeWhole(folder_.part() / PartRecord::fileName, record(before).json());
         requireUnchanged();
-        session_.host().setTime(frames_.first); // whatever frame it ended with
+        session_.host().setTime(whole_.first); // whatever frame it ended with
         storage::writeWhole(
             folder_.part() / descriptionFile,
             datasetDescription(facts_, warp_, geometry_, sampler_, folder_.part() / datasetFile::controls));
@@ -215,6 +222,8 @@ private:
     void writeRows(DatasetWriter& writer) {
         Progress progress(options_.console, "exporting " + geometry_.name, facts_.shape.rows);
         progress.advance(writer.rows());
+        if (writer.rows() < facts_.shape.rows)
+            evaluateBefore(frames_.frame(writer.rows()));
         while (writer.rows() < facts_.shape.rows) {
             const int frame = frames_.frame(writer.rows());
             sampler_.sample(frame);
@@ -222,6 +231,27 @@ private:
             writer.append(frame, sampler_.controls(), sampler_.deltas(), sampler_.skin());
             progress.advance();
         }
+    }
+
+    // for what remembers the frames before
+    void evaluateBefore(int frame) {
+        for (const int earlier : part_.before(frame)) {
+            throwIfInterrupted();
+            sampler_.sample(earlier);
+        }
+    }
+
+    // the frame after the last is evaluated as the next part does it, if that part begins as if there were none
+    PartRecord record(std::size_t rowsBefore) {
+        PartRecord record = PartRecord::made(part_, setup_);
+        record.firstSum = firstRowSum(folder_.part(), facts_.shape);
+        if (const std::optional<int> next = part_.next()) {
+            if (rowsBefore == facts_.shape.rows) // and none of this was evaluated now
+                evaluateBefore(*next);
+            sampler_.sample(*next);
+            record.nextSum = rowSum(*next, sampler_.controls(), sampler_.deltas(), sampler_.skin());
+        }
+        return record;
     }
 
     void warnOfRepeats() const {
@@ -255,7 +285,8 @@ private:
     const ExportOptions& options_;
     const Warp& warp_;
     const WarpGeometry& geometry_;
-    FrameRange frames_;
+    PartFrames part_;
+    FrameRange frames_, whole_; ///< of the part, and all
     fs::path sceneFile_;
     DatasetFolder folder_;
     FrameSampler sampler_;
@@ -271,6 +302,7 @@ std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
     const Warp warp = Warp::find(options.deformer);
     const std::vector<WarpGeometry> geometries = chosenGeometries(warp, options);
     const std::vector<fs::path> folders = foldersOf(warp, geometries, options);
+    const FrameRange whole = partFrames(exportFrames(warp, options.frames), options.part).whole;
     std::vector<ExportAnswer> answers;
     answers.reserve(geometries.size());
     if (options.output.empty())
@@ -278,8 +310,7 @@ std::vector<ExportAnswer> exportDatasets(const ExportOptions& options) {
             options.console.note("exporting " + geometries[i].name + " to " + folders[i].string() +
                                  ", as the scene says");
     for (std::size_t i = 0; i < geometries.size(); ++i) {
-        std::optional<KindChoice> choice =
-            settleKind(session.host(), warp, geometries[i], exportFrames(warp, options.frames), options);
+        std::optional<KindChoice> choice = settleKind(session.host(), warp, geometries[i], whole, options);
         answers.push_back(GeometryExport(session, warp, geometries[i], folders[i], options).run());
         answers.back().choice = std::move(choice);
     }

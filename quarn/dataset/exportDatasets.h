@@ -5,6 +5,7 @@
 #include "quarn/console/Console.h"
 #include "quarn/dataset/smoothingChoice.h"
 #include "quarn/fit/targetFit.h"
+#include "quarn/scene/PartFrames.h"
 #include "quarn/scene/SceneSession.h"
 
 #include <cstddef>
@@ -23,6 +24,7 @@ struct ExportOptions {
     std::string deformer;         ///< empty: the only one
     std::string geometry;         ///< index or name; empty: all of them that have a target
     std::string frames;           ///< as frameRange() reads them; empty: exportStartFrame to exportEndFrame
+    PartOptions part;             ///< of which whole they are a part, and what comes before them
     std::string smoothing;        ///< "auto": deltas are of the kind that a study speaks for; empty: as the scene says
     std::filesystem::path like;   ///< a data set, of whose kind deltas are; empty: as the scene says
     bool overwrite = false;
@@ -47,8 +49,9 @@ struct ExportAnswer {
 
 /// Opens the scene and writes a complete data set for each geometry; of several those without target are noted and left
 /// out. Rows that an earlier run of the same set-up has
-/// left in FOLDER.part are gone on from; docs/dataset.md says when they are not. Whatever ends it early, an error or
-/// Ctrl-C, leaves FOLDER as it was. Errors are std::runtime_error with the sentence for the user. Thread: main.
+/// left in FOLDER.part are gone on from; docs/dataset.md says when they are not. A part of a whole gets a PartRecord,
+/// and everything that is said of all frames is of the whole. Whatever ends it early, an error or Ctrl-C, leaves FOLDER
+/// as it was. Errors are std::runtime_error with the sentence for the user. Thread: main.
 std::vector<ExportAnswer> exportDatasets(const ExportOptions& options);
 
 } // namespace quarn

@@ -17,21 +17,16 @@ std::string sumOf(const HUintArray& numbers) {
     return sum.text();
 }
 
-std::string textOf(const FrameRange& frames) {
-    const std::string text = std::to_string(frames.first) + "-" + std::to_string(frames.last);
-    return frames.step == 1 ? text : text + "x" + std::to_string(frames.step);
-}
-
 } // namespace
 
 Setup sceneSetup(const std::filesystem::path& sceneFile, const Warp& warp, const WarpGeometry& geometry,
-                 const FrameSampler& sampler, const FrameRange& frames) {
+                 const FrameSampler& sampler, const PartFrames& frames) {
     Setup setup;
     setup.add("quarn", QUARN_VERSION);
     setup.add("scene", sceneFile.filename().string());
     setup.add("deformer", warp.name);
     setup.add("geometry", std::to_string(geometry.index) + " " + geometry.name);
-    setup.add("frames", textOf(frames));
+    frames.addTo(setup);
     setup.add("delta type", sampler.kind().code());
     setup.add("smoothing iterations", static_cast<std::size_t>(sampler.kind().smoothingIterations));
     setup.add("vertices", sampler.map().fullCount());

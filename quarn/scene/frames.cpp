@@ -47,6 +47,11 @@ FrameRange frameRange(const std::string& text) {
     return {*first, *last, *step};
 }
 
+std::string frameText(const FrameRange& frames) {
+    const std::string text = std::to_string(frames.first) + "-" + std::to_string(frames.last);
+    return frames.step == 1 ? text : text + "x" + std::to_string(frames.step);
+}
+
 FrameRange framesToPlay(const std::string& text, const Warp* warp) {
     if (!text.empty())
         return frameRange(text);

@@ -23,6 +23,9 @@ struct FrameRange {
 /// anything else and where the last frame is before the first.
 FrameRange frameRange(const std::string& text);
 
+/// The same as text: "1-100" or "1-100x5".
+std::string frameText(const FrameRange& frames);
+
 /// The frames that the text says; with an empty one exportStartFrame to exportEndFrame of the deformer. Throws
 /// std::runtime_error when there is neither, or they are in the wrong order.
 FrameRange framesToPlay(const std::string& text, const Warp* warp);
