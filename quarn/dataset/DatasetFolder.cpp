@@ -13,7 +13,6 @@
 #include <stdexcept>
 #include <system_error>
 
-
 namespace quarn {
 namespace {
 

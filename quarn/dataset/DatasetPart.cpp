@@ -25,8 +25,11 @@ fs::path folderOfComplete(const fs::path& folder) {
     if (fs::exists(begun, none))
         throw std::runtime_error(folder.string() + " is not complete: there is " + begun.string() +
                                  ", and the export that made it goes on from there");
-    throw std::runtime_error(folder.string() +
-                             (fs::exists(folder, none) ? " is no training data set" : " does not exist"));
+    if (!fs::exists(folder, none))
+        throw std::runtime_error(folder.string() + " does not exist");
+    throw std::runtime_error(folder.string() + (fs::is_directory(folder, none)
+                                                    ? " is no training data set"
+                                                    : " is no folder of a data set, and no .npy cache"));
 }
 
 std::size_t count(const fs::path& file, const storage::JsonDocument& json, const char* key) {
@@ -60,6 +63,10 @@ FrameRange DatasetPart::frames() const {
 
 void DatasetPart::check() const {
     const std::uint64_t rows = frames().count();
+    if (shape_.rows != rows)
+        throw storage::FileError(folder_ / descriptionFile, "speaks of " + std::to_string(shape_.rows) +
+                                                                " rows, where frames " + frameText(frames()) + " are " +
+                                                                std::to_string(rows));
     requireArray(datasetFile::controls, "<f4", {rows, shape_.controls});
     requireArray(datasetFile::deltas, "<f4", {rows, shape_.deltas, 3});
     requireArray(datasetFile::frames, "<i4", {rows});

@@ -204,6 +204,13 @@ void requireOther(const MergeOptions& options) {
             throw std::runtime_error(options.output.string() + " is one of the parts; name another place with -o");
 }
 
+void noteBegun(const MergeOptions& options) {
+    const fs::path begun = options.output.string() + ".part";
+    const auto isOther = [](const auto& entry) { return entry.path().filename() != storage::FolderLock::fileName; };
+    if (std::any_of(fs::directory_iterator(begun), {}, isOther))
+        options.console.note(begun.string() + ", which a bake has begun, stays; remove it if it is not to go on");
+}
+
 } // namespace
 
 MergeAnswer mergeCaches(const MergeOptions& options) {
@@ -216,6 +223,7 @@ MergeAnswer mergeCaches(const MergeOptions& options) {
         options.console.note(options.output.string() + " is complete: there is nothing to do");
     else
         write(options, parts);
+    noteBegun(options);
     stage.result([&] { return std::to_string(parts.frames()) + " frames"; });
     return {fs::absolute(options.output), parts.frames(), parts.bytes(), wasComplete, parts.instructionSets()};
 }

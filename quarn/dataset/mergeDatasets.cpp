@@ -39,7 +39,7 @@ public:
     explicit DatasetParts(const MergeOptions& options)
         : console_(options.console) {
         for (const fs::path& folder : options.parts)
-            place(folder);
+            place(folder.has_filename() ? folder : folder.parent_path()); // "folder/" is "folder"
         if (!haveRecords_)
             placeByFrames();
         orderParts(parts_);
