@@ -14,6 +14,13 @@ namespace {
 
 namespace fs = std::filesystem;
 
+// numbers are written again as they are
+constexpr storage::JsonRules exactRules = [] {
+    storage::JsonRules rules = storage::jsonRules::dataset;
+    rules.isExact = true;
+    return rules;
+}();
+
 fs::path folderOfComplete(const fs::path& folder) {
     std::error_code none;
     const fs::path begun = folder.string() + ".part";
@@ -50,7 +57,7 @@ Setup readSetup(const fs::path& folder) {
 DatasetPart::DatasetPart(const fs::path& folder)
     : folder_(folderOfComplete(folder))
     , setup_(readSetup(folder))
-    , description_(storage::readJson(folder / descriptionFile, storage::jsonRules::dataset))
+    , description_(storage::readJson(folder / descriptionFile, exactRules))
     , record_(PartRecord::read(folder / PartRecord::fileName)) {
     const fs::path file = folder / descriptionFile;
     shape_ = {count(file, description_, "frameCount"), count(file, description_, "controlCount"),

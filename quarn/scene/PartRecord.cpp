@@ -119,7 +119,7 @@ std::string rowSum(std::initializer_list<std::span<const std::byte>> pieces) {
     storage::ByteSum sum;
     for (const std::span<const std::byte> piece : pieces)
         sum.add(piece);
-    return "xxh3_128:" + sum.digits();
+    return rowSumKind + sum.digits();
 }
 
 } // namespace quarn

@@ -37,6 +37,9 @@ struct PartRecord {
     static std::optional<PartRecord> read(const std::filesystem::path& file);
 };
 
+/// What a rowSum() begins with.
+inline constexpr const char* rowSumKind = "xxh3_128:";
+
 /// The sum of a row, whose bytes are these pieces one after the other.
 std::string rowSum(std::initializer_list<std::span<const std::byte>> pieces);
 
