@@ -15,11 +15,6 @@ namespace {
 namespace fs = std::filesystem;
 using Words = std::vector<std::string>;
 
-std::string frameText(const FrameRange& frames) {
-    return std::to_string(frames.first) + "-" + std::to_string(frames.last) +
-           (frames.step == 1 ? "" : "x" + std::to_string(frames.step));
-}
-
 void append(Words& words, const Words& more) {
     words.insert(words.end(), more.begin(), more.end());
 }
