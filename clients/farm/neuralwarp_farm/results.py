@@ -10,7 +10,6 @@ import time
 from contextlib import suppress
 from enum import Enum
 from pathlib import Path
-from typing import Optional
 
 from .errors import FarmError, LockedByAnother
 from .plan import FILE, Plan, Task, read
@@ -30,7 +29,7 @@ def state_of(plan: Plan, task: Task) -> State:
     if is_done(plan, task):
         return State.DONE
     parts = [path for path in unfinished(plan, task) if path.exists()]
-    if is_held(lock_file(plan, task)) or any(is_held(lock_of(part)) for part in parts):
+    if is_held(lock_file(plan, task)) or any(is_held(part / "lock") for part in parts):
         # it may have ended between the two looks
         return State.DONE if has_result(plan, task) else State.WRITING
     return State.BEGUN if parts or has_some_frames(plan, task) else State.MISSING
@@ -83,18 +82,10 @@ def unfinished(plan: Plan, task: Task) -> list[Path]:
     return beside
 
 
-def lock_of(part: Path) -> Optional[Path]:
-    """What the writer of an unfinished result has locked: the file in it, or the folder itself as the trainer does."""
-    if not part.is_dir():
-        return None
-    return part / "lock" if (part / "lock").is_file() else part
-
-
-def is_held(path: Optional[Path]) -> bool:
-    """Whether another process has locked a file or a folder. A lock that is shared for a moment hinders no other look,
-    and a writer that begins in this very moment answers that it is to be tried again."""
-    if path is None:
-        return False
+def is_held(path: Path) -> bool:
+    """Whether another process has locked a file, as writers of unfinished results do with the one in them. A lock that
+    is shared for a moment hinders no other look, and a writer that begins in this very moment answers that it is to be
+    tried again."""
     try:
         handle = os.open(path, os.O_RDONLY | os.O_NOFOLLOW | os.O_NONBLOCK)
     except OSError:

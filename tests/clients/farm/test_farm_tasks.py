@@ -176,11 +176,11 @@ class StateTest(FarmTest):
         self.assertEqual(results.state_of(plan, task), State.BEGUN)
 
     def test_who_writes_holds_a_lock(self) -> None:
-        for lock in ("made/a.part", "made/a.part/lock", "state/a.lock"):
+        for lock in ("made/a.part/lock", "state/a.lock"):
             plan = self.plan(self.task("a"))
             path = plan.folder / lock
-            (path if path.suffix == ".part" else path.parent).mkdir(parents=True, exist_ok=True)
-            handle = os.open(path, os.O_RDONLY if path.is_dir() else os.O_CREAT | os.O_RDWR)
+            path.parent.mkdir(parents=True, exist_ok=True)
+            handle = os.open(path, os.O_CREAT | os.O_RDWR)
             fcntl.flock(handle, fcntl.LOCK_EX)
             self.assertEqual(results.state_of(plan, plan.tasks[0]), State.WRITING)
             os.close(handle)
