@@ -6,9 +6,10 @@ import importlib
 import json
 import os
 import sys
+import time
 from typing import NoReturn, Optional
 
-from . import __version__, cancel, codes, plan, results, status, submit, task
+from . import __version__, cancel, codes, plan, results, status, submit, sums, task
 from .errors import FarmError, LockedByAnother, UsageError
 from .kinds import KINDS
 
@@ -76,11 +77,14 @@ def add_plan(commands: "argparse._SubParsersAction[Parser]") -> None:
 # --- the commands ---
 
 def command_plan(arguments: argparse.Namespace) -> int:
+    os.umask(0o002)  # another of the group may go on with it
+    begin = time.time()
     made = importlib.import_module(f".kinds.{arguments.module}", __package__).make_plan(arguments)
     if not plan.is_there(made):
         plan.check_replaceable(made, arguments.overwrite)
         results.make_room(made, arguments.overwrite)
     plan.write(made, arguments.overwrite)
+    sums.remember(made, begin)
     print(status.sentence(made))
     return codes.DONE
 

@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-"""The sums of the files that tasks read. Of what was read once, size and times are remembered on this host."""
+"""The sums of the files that tasks read. Of what was read once, size, times and inode are remembered: by who made the
+plan for all hosts that see the same file, and by each host of what it has read itself."""
 
 import hashlib
 import json
@@ -13,6 +14,7 @@ from typing import Any
 from .errors import FarmError
 from .plan import Plan, SourceFile, write_whole
 
+SHARED = "sums.json"
 BLOCK = 1 << 20
 SETTLED = 2.0  # seconds: what changed so shortly before it was read may change again within the same time of change
 
@@ -33,10 +35,27 @@ def sum_of(path: str) -> str:
     return f"sha256:{total.hexdigest()}"
 
 
+def remember(plan: Plan, since: float) -> None:
+    """For all hosts, as a hundred that read a cache of 10 GB at once have a server busy for long. A file that is
+    another has another inode or time of change. `since`: a time before the files of the plan were read; what has
+    changed after it is left out, as nobody knows what was read."""
+    looks: dict[str, Any] = {}
+    for file in plan.files:
+        with suppress(OSError):
+            state = os.stat(file.path)
+            if state.st_ctime < since - SETTLED:
+                looks[file.path] = look_of(state, file)
+    write_whole(plan.state / SHARED, json.dumps(looks))
+
+
+def look_of(state: os.stat_result, file: SourceFile) -> list[Any]:
+    return [state.st_size, state.st_mtime_ns, state.st_ctime_ns, state.st_ino, file.sum]
+
+
 def check(plan: Plan) -> None:
     """Raises FarmError, naming it, for a file that is not what it was when the plan was made."""
     place = plan.state / f"sums.{socket.gethostname()}.json"
-    known = remembered(place)
+    known = {**remembered(plan.state / SHARED), **remembered(place)}
     before = dict(known)
     for file in plan.files:
         check_file(file, known)
@@ -50,7 +69,7 @@ def check_file(file: SourceFile, known: dict[str, Any]) -> None:
         state = os.stat(file.path)
         if file.sum == "missing":
             raise FarmError(f"{file.path} has appeared since the plan was made: make another plan")
-        look = [state.st_size, state.st_mtime_ns, state.st_ctime_ns, state.st_ino, file.sum]
+        look = look_of(state, file)
         if known.get(file.path) == look:
             return
         if state.st_size != file.bytes or sum_of(file.path) != file.sum:

@@ -64,6 +64,13 @@ class TaskTest(FarmTest):
             sums.check(plan)
             with mock.patch.object(sums, "sum_of", side_effect=AssertionError("it is read")):
                 sums.check(plan)
+        with mock.patch("socket.gethostname", return_value="another"):  # host, of the same file system
+            sums.remember(plan, self.scene.stat().st_ctime)
+            with self.assertRaises(AssertionError), mock.patch.object(sums, "sum_of", side_effect=AssertionError):
+                sums.check(plan)
+            sums.remember(plan, self.scene.stat().st_ctime + 3)
+            with mock.patch.object(sums, "sum_of", side_effect=AssertionError("it is read")):
+                sums.check(plan)
         old = self.scene.stat()
         self.scene.write_text("SCENE")  # as long as it was, and, of a copy, of the same time
         os.utime(self.scene, ns=(old.st_atime_ns, old.st_mtime_ns))
