@@ -77,7 +77,6 @@ def add_plan(commands: "argparse._SubParsersAction[Parser]") -> None:
 # --- the commands ---
 
 def command_plan(arguments: argparse.Namespace) -> int:
-    os.umask(0o002)  # another of the group may go on with it
     begin = time.time()
     made = importlib.import_module(f".kinds.{arguments.module}", __package__).make_plan(arguments)
     if not plan.is_there(made):
