@@ -293,7 +293,7 @@ class ScriptTest(AtFakeSlurm):
             with self.subTest(program=program, restarts=restarts, number=number):
                 status, said = self.run_script(program, restarts, number)
                 self.assertEqual((status, "scontrol requeue 5_1\n" in said), (code, again), said)
-                self.assertIn(f"job 5_1, start {restarts + 1}: y ended with {code}\n", said)
+                self.assertIn(f"job 5_1, start {restarts + 1}: y ended with {code}", said)
 
 
 if __name__ == "__main__":

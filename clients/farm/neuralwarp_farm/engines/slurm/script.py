@@ -32,17 +32,18 @@ task=${{tasks[${{SLURM_ARRAY_TASK_ID:-0}}]}}
 job=${{SLURM_ARRAY_JOB_ID:+${{SLURM_ARRAY_JOB_ID}}_$SLURM_ARRAY_TASK_ID}}
 job=${{job:-$SLURM_JOB_ID}}
 restarts=${{SLURM_RESTART_COUNT:-0}}
-say() {{ echo "$(date '+%Y-%m-%d %H:%M:%S') ${{SLURMD_NODENAME:-$(hostname)}} job $job, start $((restarts + 1)): $*"; }}
+node=${{SLURMD_NODENAME:-$HOSTNAME}}
+say() {{ printf '%(%Y-%m-%d %H:%M:%S)T %s job %s, start %s: %s\\n' -1 "$node" "$job" "$((restarts + 1))" "$*"; }}
 
-child= limit= stopped=
-pass_on() {{ stopped=yes; [ -z "$child" ] || kill -TERM "$child" 2>/dev/null; }}
-trap 'limit=yes; say "the time limit is near"; pass_on' USR1
-trap 'say "asked to end"; limit=; pass_on' TERM INT
+# in these no $(...), and nothing that waits: bash ends in an error of its own when a second signal comes meanwhile
+child= limit= asked=
+trap 'limit=yes asked=", asked to end: the time limit is near"; [ -z "$child" ] || kill -TERM "$child" 2>&-' USR1
+trap 'limit= asked=", asked to end"; [ -z "$child" ] || kill -TERM "$child" 2>&-' TERM INT
 
 say "$task begins"
 {command} "$task" &
 child=$!
-[ -z "$stopped" ] || pass_on
+[ -z "$asked" ] || kill -TERM "$child"
 while :; do  # a signal ends wait before the program has ended
   wait "$child"
   kill -0 "$child" 2>/dev/null || break
@@ -50,7 +51,7 @@ done
 wait "$child"
 code=$?
 trap '' USR1 TERM INT  # what is requeued is asked to end, and has
-say "$task ended with $code"
+say "$task ended with $code$asked"
 
 if {{ [ "$code" = 75 ] || [ "$code" = 137 ] || [ -n "$limit" ]; }} && [ "$code" != 0 ]; then
   if [ "$restarts" -lt {restarts} ]; then
