@@ -12,6 +12,7 @@ import time
 import unittest
 from collections.abc import Callable, Iterator
 from pathlib import Path
+from typing import Optional
 
 from neuralwarp_farm import plan
 from neuralwarp_farm.plan import Plan, Resources, Result, Task
@@ -19,6 +20,8 @@ from private_slurm import PrivateSlurm
 
 HERE = Path(__file__).parent
 FARM = (sys.executable, str(HERE.parents[2] / "clients/farm/neuralwarp-farm"))
+BRINGER = str(HERE.parents[2] / "examples/farm/private_slurm.py")
+ENDS_WITH: dict[Optional[signal.Signals], int] = {None: 0, signal.SIGINT: 130, signal.SIGTERM: 143, signal.SIGKILL: -9}
 ROWS = 10
 PATIENCE = 100.0  # seconds until something that has to come is given up
 
@@ -156,6 +159,47 @@ class OnSlurm(unittest.TestCase):
         os.kill(self.slurm.pids["node2"], signal.SIGSTOP)
         wait_for("twin", lambda: "ended with 75" in work.said())
         self.check_rows(work, writers=1)
+
+
+class EndOfSlurm(unittest.TestCase):
+    def test_nothing_is_left(self) -> None:
+        """However the one ends who has brought a Slurm up: no daemon, no task, no folder."""
+        command = 'sbatch --output=$1/out --wrap "touch $1/runs; sleep 1000" && echo $SLURM_CONF >$1/conf && cat'
+        with contextlib.ExitStack() as ending:
+            begun = []
+            for number in ENDS_WITH:
+                folder = Path(ending.enter_context(tempfile.TemporaryDirectory()))
+                begun.append((number, folder, ending.enter_context(subprocess.Popen(
+                    [sys.executable, BRINGER, "--nodes", "1", "sh", "-c", command, "sh", folder],
+                    stdin=subprocess.PIPE, stdout=subprocess.DEVNULL, start_new_session=True))))
+            for number, folder, bringer in begun:
+                with self.subTest(number):
+                    self.check_end(number, folder, bringer)
+
+    def check_end(self, number: Optional[signal.Signals], folder: Path, bringer: "subprocess.Popen[bytes]") -> None:
+        wait_for("task", (folder / "runs").exists)
+        wait_for("command", lambda: (folder / "conf").exists() and (folder / "conf").read_text())
+        configuration = (folder / "conf").read_text().strip()
+        self.assertGreaterEqual(len(processes_of(configuration)), 5)
+        if number == signal.SIGINT:
+            os.killpg(bringer.pid, number)  # as a terminal does
+        elif number:
+            bringer.send_signal(number)
+        assert bringer.stdin
+        bringer.stdin.close()
+        self.assertEqual(bringer.wait(), ENDS_WITH[number])
+        wait_for("end of all", lambda: not processes_of(configuration))
+        wait_for("end of its folder", lambda: not Path(configuration).parent.exists())
+
+
+def processes_of(configuration: str) -> list[str]:
+    """Those that find this Slurm by their environment: daemons, steps and tasks."""
+    found = []
+    for folder in Path("/proc").glob("[0-9]*"):
+        with contextlib.suppress(OSError):  # it has ended meanwhile
+            if f"SLURM_CONF={configuration}".encode() in (folder / "environ").read_bytes().split(b"\0"):
+                found.append((folder / "cmdline").read_bytes().replace(b"\0", b" ").decode(errors="replace"))
+    return found
 
 
 if __name__ == "__main__":
