@@ -6,6 +6,7 @@
 #include "quarn/console/UsageError.h"
 #include "quarn/console/build.h"
 #include "quarn/console/consoleOptions.h"
+#include "quarn/console/exitCodes.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/console/printable.h"
 #include "quarn/dataset/commands.h"
@@ -19,6 +20,7 @@
 #include "quarn/report/commands.h"
 #include "quarn/run/commands.h"
 #include "quarn/view/commands.h"
+#include "storage/LockedByAnother.h"
 
 #include <CLI/CLI.hpp>
 
@@ -28,9 +30,6 @@
 #include <vector>
 
 namespace {
-
-constexpr int wrongUsage = 2;      // what shells expect of a program that was not called as it can be
-constexpr int endedBySignal = 130; // and of one that Ctrl-C has ended
 
 // the library would say that a command is missing
 void requireCommand(const CLI::App& app, int argc, char** argv) {
@@ -98,12 +97,13 @@ int run(int argc, char** argv) {
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
-        return app.exit(error) == 0 ? 0 : wrongUsage; // help and version are no failures
+        return app.exit(error) == 0 ? quarn::exitCode::done
+                                    : quarn::exitCode::usage; // help and version are no failures
     }
     if (!std::cout.flush())
         throw std::runtime_error("standard output could not be written");
     quarn::log([] { return std::string("done"); });
-    return 0;
+    return quarn::exitCode::done;
 }
 
 } // namespace
@@ -115,10 +115,12 @@ int main(int argc, char** argv) {
         OpenQuarn::setMessageSink(print);
         return run(argc, argv);
     } catch (const quarn::UsageError& error) {
-        return fail(error.what(), wrongUsage, "Run with --help for more information.\n");
+        return fail(error.what(), quarn::exitCode::usage, "Run with --help for more information.\n");
     } catch (const std::exception& error) {
         // an evaluation that was given up on request fails with a sentence of its own
-        const bool isEnded = quarn::isInterrupted();
-        return isEnded ? fail(quarn::Interrupted().what(), endedBySignal) : fail(error.what(), 1);
+        if (quarn::isInterrupted())
+            return fail(quarn::Interrupted().what(), quarn::interruptStatus());
+        const bool isLocked = dynamic_cast<const storage::LockedByAnother*>(&error) != nullptr;
+        return fail(error.what(), isLocked ? quarn::exitCode::locked : quarn::exitCode::failed);
     }
 }

@@ -2,6 +2,7 @@
 #include "storage/FolderLock.h"
 
 #include "storage/FileError.h"
+#include "storage/LockedByAnother.h"
 
 #include <cerrno>
 #include <stdexcept>
@@ -27,7 +28,7 @@ FolderLock::FolderLock(const std::filesystem::path& folder, const std::string& h
     for (int attempt = 0; attempt < attempts; ++attempt)
         if (take(holder))
             return;
-    failToLock(folder_, EAGAIN);
+    throw LockedByAnother(folder_.string() + " is made and removed by others all the time; try again");
 }
 
 // false: the file that was locked is not the folder's any more
@@ -43,19 +44,21 @@ bool FolderLock::take(const std::string& holder) {
         failToLock(folder_, errno);
     if (::flock(lock_.number(), LOCK_EX | LOCK_NB) != 0) {
         if (errno == EWOULDBLOCK)
-            throw std::runtime_error(holder + " is writing " + folder_.string() + "; wait until it is done");
+            throw LockedByAnother(holder + " is writing " + folder_.string() + "; wait until it is done");
         failToLock(folder_, errno);
     }
     return isAt(file(), lock_.number());
 }
 
+// NFS gives an exclusive lock only to who may write the file, and a shared one, which says the same here, to who reads
 bool FolderLock::isTaken(const std::filesystem::path& folder) {
     const Descriptor lock(::open((folder / fileName).c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
-    return lock.isOpen() && ::flock(lock.number(), LOCK_EX | LOCK_NB) != 0;
+    return lock.isOpen() && ::flock(lock.number(), LOCK_SH | LOCK_NB) != 0 && errno == EWOULDBLOCK;
 }
 
 FolderLock::~FolderLock() {
     ::unlink(file().c_str());
+    lock_.close();            // NFS keeps an open file in its folder
     ::rmdir(folder_.c_str()); // refused when there is more in it
 }
 

@@ -13,7 +13,7 @@ namespace storage {
 class FolderLock {
 public:
     /// Makes the folder when there is none. `holder` is who has it when it is taken, as the error names it: "another
-    /// quarn export". Throws std::runtime_error when it is taken, or cannot be made.
+    /// quarn export". Throws LockedByAnother when it is taken, std::runtime_error when it cannot be made.
     FolderLock(const std::filesystem::path& folder, const std::string& holder);
     /// Removes its file, and the folder when nothing else is in it.
     ~FolderLock();
@@ -22,7 +22,7 @@ public:
 
     /// The folder has another name now.
     void follow(const std::filesystem::path& folder) { folder_ = folder; }
-    /// Whether another process has locked the folder now.
+    /// Whether another process has locked the folder now. Also of a folder that this process may only read.
     static bool isTaken(const std::filesystem::path& folder);
 
     static constexpr const char* fileName = "lock";

@@ -69,9 +69,16 @@ fs::path nameFor(const fs::path& target, const std::string& mark, int number) {
            (beginningFor(target.filename().native()) + mark + "-" + std::to_string(number) + std::string(ending));
 }
 
+// To lock it: NFS wants a file that is open for writing; elsewhere one does that may only be read.
+Descriptor openToLock(const fs::path& name) {
+    constexpr int flags = O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC;
+    const int file = ::open(name.c_str(), O_RDWR | flags);
+    return Descriptor(file >= 0 || errno != EACCES ? file : ::open(name.c_str(), O_RDONLY | flags));
+}
+
 // takes away what a killed writer has left; a living one holds the lock
 void sweep(const fs::path& name) {
-    const Descriptor file(::open(name.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
+    const Descriptor file = openToLock(name);
     struct stat status = {};
     if (file.isOpen() && ::fstat(file.number(), &status) == 0 && S_ISREG(status.st_mode) &&
         ::flock(file.number(), LOCK_EX | LOCK_NB) == 0 && isAt(name, file.number()))

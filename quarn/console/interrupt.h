@@ -6,7 +6,8 @@
 
 namespace quarn {
 
-/// The user has asked for the end. Everything that was half done is undone on its way up; main() ends with 130.
+/// The user has asked for the end. Everything that was half done is undone on its way up; main() ends with
+/// interruptStatus().
 struct Interrupted : std::runtime_error {
     Interrupted()
         : std::runtime_error("interrupted") {}
@@ -22,6 +23,9 @@ void whenInterrupted(void (*tell)());
 
 /// SIGINT or SIGTERM has come. Thread: any.
 bool isInterrupted() noexcept;
+/// What a process ends with that either has ended, the first of them: exitCode::interrupted or exitCode::terminated.
+/// Thread: any.
+int interruptStatus() noexcept;
 /// Throws Interrupted once SIGINT or SIGTERM has come. Thread: any.
 void throwIfInterrupted();
 

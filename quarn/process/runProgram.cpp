@@ -1,10 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "quarn/process/runProgram.h"
 
+#include "quarn/console/exitCodes.h"
 #include "quarn/console/interrupt.h"
 #include "quarn/process/ownVariable.h"
 #include "storage/Descriptor.h"
 #include "storage/FileError.h"
+#include "storage/LockedByAnother.h"
 
 #include <fcntl.h>
 #include <sys/prctl.h>
@@ -148,6 +150,15 @@ std::string ProgramEnd::text() const {
     if (signal == 0)
         return "ended with status " + std::to_string(status);
     return "was ended by signal " + std::to_string(signal) + " (" + strsignal(signal) + ")"; // NOLINT: main thread
+}
+
+void ProgramEnd::require() const {
+    if (isGood())
+        return;
+    throwIfInterrupted();
+    if (signal == 0 && status == exitCode::locked)
+        throw storage::LockedByAnother(text());
+    throw std::runtime_error(text());
 }
 
 ProgramEnd runProgram(const ProgramCall& call, const std::function<void()>& meanwhile) {

@@ -37,6 +37,9 @@ struct ProgramEnd {
     bool isGood() const { return status == 0 && signal == 0; }
     /// "ended with status 3", "was ended by signal 11 (Segmentation fault)"
     std::string text() const;
+    /// Throws with that text unless the end is good: storage::LockedByAnother of one that says so with its status, 75;
+    /// otherwise std::runtime_error. Throws Interrupted where this process was asked to end too.
+    void require() const;
 };
 
 /// Runs a program to its end. Its standard input is empty; it is the first of a process group of its own, of which

@@ -10,6 +10,7 @@
 #include "storage/FileError.h"
 #include "storage/Folder.h"
 #include "storage/FolderLock.h"
+#include "storage/LockedByAnother.h"
 #include "storage/WholeFile.h"
 #include "storage/openToAppend.h"
 #include "storage/readWholeFile.h"
@@ -140,22 +141,21 @@ void RunFolder::start(const Step& step) {
     call.environment = found.environment;
     call.log = log.number();
     call.output = answer.number();
-    if (const ProgramEnd end = runProgram(call, [&] { line.draw(); }); !end.isGood())
-        throw std::runtime_error(end.text());
+    runProgram(call, [&] { line.draw(); }).require();
     if (step.answer.empty())
         return;
     storage::writeWhole(folder_ / step.answer, storage::readWholeFile(said, mostOfAnAnswer));
     fs::remove(said, error);
 }
 
-void RunFolder::fail(const Step& step, const std::string& why) const {
+std::string RunFolder::failureOf(const Step& step, const std::string& why) const {
     std::string said;
     try {
         said = endOf(storage::readWholeFile(logOf(step), mostOfAnAnswer));
     } catch (const std::exception&) { // NOLINT(bugprone-empty-catch): what the step failed for is what the user reads
     }
-    throw std::runtime_error(step.label() + " " + why + said + "\nall that it said is in " + logOf(step).string() +
-                             "; the same command goes on from there");
+    return step.label() + " " + why + said + "\nall that it said is in " + logOf(step).string() +
+           "; the same command goes on from there";
 }
 
 void RunFolder::perform(const Step& step) {
@@ -166,8 +166,10 @@ void RunFolder::perform(const Step& step) {
         console_.note("what was done before " + step.label() + " is kept in " + folder_.string() +
                       ": the same command goes on from there");
         throw;
+    } catch (const storage::LockedByAnother& error) {
+        throw storage::LockedByAnother(failureOf(step, error.what()));
     } catch (const std::exception& error) {
-        fail(step, error.what());
+        throw std::runtime_error(failureOf(step, error.what()));
     }
 }
 

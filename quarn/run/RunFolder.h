@@ -45,7 +45,7 @@ private:
     void prepare(const Step& step) const;
     void start(const Step& step);
     void perform(const Step& step);
-    [[noreturn]] void fail(const Step& step, const std::string& why) const;
+    std::string failureOf(const Step& step, const std::string& why) const;
     void tellOf(const Step& step) const;
     double doStep(const Step& step, const std::string& why);
 

@@ -146,8 +146,7 @@ private:
         call.grace = place_.grace;
         if (request_.timeout > 0)
             call.timeout = std::chrono::seconds(request_.timeout);
-        if (const ProgramEnd end = runProgram(call, place_.meanwhile); !end.isGood())
-            throw std::runtime_error(end.text());
+        runProgram(call, place_.meanwhile).require();
         take(answer, first);
     }
 

@@ -49,14 +49,17 @@ interrupt() {
   "$quarn" run bone.gltf -o made "${with_targets[@]}" >said.txt 2>errors.txt &
   local process=$!
   for ((i = 0; i < 1200; ++i)); do ! grep -qs waiting made/log/targets.log || break; sleep 0.05; done
-  expect 1 '' 'another quarn run is writing .*/made; wait' run bone.gltf -o made "${options[@]}"
+  expect 75 '' 'another quarn run is writing .*/made; wait' run bone.gltf -o made "${options[@]}"
   kill "-$1" "$process"
   status=0
   wait "$process" 2>wait.txt || status=$?
   rm wait
 }
+# what the program says with its status is passed on
+echo 'exit 75' >later.sh
+expect 75 '' "targets ended with status 75" run bone.gltf -o made "${options[@]}" --target-command sh later.sh
 interrupt TERM
-[[ $status == 130 ]] && grep -q 'what was done before targets is kept .*: the same command goes on' errors.txt ||
+[[ $status == 143 ]] && grep -q 'what was done before targets is kept .*: the same command goes on' errors.txt ||
   { fail "interrupted: status $status"; cat errors.txt; }
 state made '"state":"interrupted","error":"","step":"targets"'
 interrupt KILL
