@@ -2,6 +2,8 @@
 #include "storage/NpyRows.h"
 
 #include "storage/FileError.h"
+#include "storage/Folder.h"
+#include "storage/Target.h"
 #include "storage/npyHeader.h"
 
 #include <algorithm>
@@ -37,7 +39,7 @@ void NpyRows::begin() {
     file_ = Descriptor(::open(path_.c_str(), O_RDWR | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, 0666));
     if (!file_.isOpen())
         failToWrite(path_, errno);
-    sum_ = Fnv64();
+    sum_ = std::make_unique<ByteSum>();
     const std::string head = makeNpyHead(layout_.type, layout_.shape);
     append(std::as_bytes(std::span(head)));
 }
@@ -59,20 +61,26 @@ bool NpyRows::resume(std::uint64_t rows, const std::string& sum) {
 bool NpyRows::hasSum(std::uint64_t bytes, const std::string& sum) {
     constexpr std::uint64_t blockSize = 1U << 18U;
     std::vector<std::byte> block(std::min(bytes, blockSize));
-    sum_ = Fnv64();
+    sum_ = std::make_unique<ByteSum>();
     for (std::uint64_t done = 0; done < bytes; done += blockSize) {
         const std::span part = std::span(block).first(std::min(bytes - done, blockSize));
         if (readAt(file_.number(), done, part) != static_cast<std::ptrdiff_t>(part.size()))
             return false;
-        sum_.add(part);
+        sum_->add(part);
     }
-    return sum_.text() == sum;
+    return sum_->digits() == sum;
 }
 
 void NpyRows::append(std::span<const std::byte> row) {
-    sum_.add(row);
+    sum_->add(row);
     if (const int error = writeAll(file_.number(), row))
         failToWrite(path_, error);
+}
+
+void NpyRows::read(std::uint64_t row, std::span<std::byte> bytes) const {
+    if (readAt(file_.number(), npyHeadSize + row * layout_.rowBytes(), bytes) !=
+        static_cast<std::ptrdiff_t>(bytes.size()))
+        throw FileError(path_, "could not be read: " + textOfErrno(errno));
 }
 
 void NpyRows::cut(std::uint64_t rows) {
@@ -84,6 +92,13 @@ void NpyRows::cut(std::uint64_t rows) {
 void NpyRows::sync() {
     if (::fsync(file_.number()) != 0)
         failToWrite(path_, errno);
+}
+
+void NpyRows::publish(const std::filesystem::path& file) {
+    takePermissionsOf(file, file_.number(), file);
+    sync();
+    requireReplaceable(file, file);
+    moveFolder(path_, file);
 }
 
 } // namespace storage

@@ -3,11 +3,12 @@
 // in its place: its folder is one that nobody reads before it is published.
 #pragma once
 
+#include "storage/ByteSum.h"
 #include "storage/Descriptor.h"
-#include "storage/Fnv64.h"
 
 #include <cstdint>
 #include <filesystem>
+#include <memory>
 #include <span>
 #include <string>
 #include <vector>
@@ -34,10 +35,15 @@ public:
     bool resume(std::uint64_t rows, const std::string& sum);
     /// `row` rowBytes() bytes. After an error only destruction is left.
     void append(std::span<const std::byte> row);
+    /// Bytes of a row that was appended, or taken up. Throws FileError when it cannot be read.
+    void read(std::uint64_t row, std::span<std::byte> bytes) const;
     /// Brings the rows to the disk.
     void sync();
+    /// Brings the array, which is complete, to the disk and into the place of `file`, on the same file system; one that
+    /// is there is replaced, and its permissions stay. Only destruction is left then.
+    void publish(const std::filesystem::path& file);
     /// Of the header and all rows appended.
-    std::string sum() const { return sum_.text(); }
+    std::string sum() const { return sum_->digits(); }
 
 private:
     void cut(std::uint64_t rows);
@@ -46,7 +52,7 @@ private:
     std::filesystem::path path_;
     ArrayLayout layout_;
     Descriptor file_;
-    Fnv64 sum_;
+    std::unique_ptr<ByteSum> sum_; ///< from begin() or resume() on
 };
 
 } // namespace storage

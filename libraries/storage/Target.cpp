@@ -159,6 +159,18 @@ void requireWritable(const fs::path& path, bool inOrder) {
     requireFolder(place.path.parent_path(), path);
 }
 
+void takePermissionsOf(const fs::path& target, int descriptor, const fs::path& path) {
+    struct stat old = {};
+    if (::stat(target.c_str(), &old) != 0)
+        return;
+    struct stat own = {};
+    // where the group cannot be given, what the old group might do is not for the new one
+    const bool sameGroup = ::fstat(descriptor, &own) == 0 &&
+                           (own.st_gid == old.st_gid || ::fchown(descriptor, static_cast<uid_t>(-1), old.st_gid) == 0);
+    if (::fchmod(descriptor, old.st_mode & (sameGroup ? 0777U : 0707U)) != 0)
+        failToWrite(path, "it cannot keep its permissions: " + textOfErrno(errno));
+}
+
 void setStandardOutput(int descriptor) {
     standardOutput = descriptor;
 }

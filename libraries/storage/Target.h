@@ -32,6 +32,10 @@ void requireWritable(const std::filesystem::path& path, bool inOrder);
 /// written by this process is. `path` is what the error names.
 void requireReplaceable(const std::filesystem::path& file, const std::filesystem::path& path);
 
+/// Gives an open file the permissions of the one whose place it is going to take, and its group where the system allows
+/// it; nothing where there is none. `path` is what the error names: FileError where it cannot have them. Thread: any.
+void takePermissionsOf(const std::filesystem::path& target, int descriptor, const std::filesystem::path& path);
+
 /// Where standard output goes for findTarget(), while it is set aside for libraries that print on it; -1 for where it
 /// always goes. Thread: main.
 void setStandardOutput(int descriptor);

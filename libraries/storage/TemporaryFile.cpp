@@ -129,16 +129,7 @@ TemporaryFile::~TemporaryFile() {
 }
 
 void TemporaryFile::takePermissions() {
-    struct stat old = {};
-    if (::stat(target_.c_str(), &old) != 0)
-        return;
-    struct stat own = {};
-    // where the group cannot be given, what the old group might do is not for the new one
-    const bool sameGroup =
-        ::fstat(file_.number(), &own) == 0 &&
-        (own.st_gid == old.st_gid || ::fchown(file_.number(), static_cast<uid_t>(-1), old.st_gid) == 0);
-    if (::fchmod(file_.number(), old.st_mode & (sameGroup ? 0777U : 0707U)) != 0)
-        failToWrite(shown_, "it cannot keep its permissions: " + textOfErrno(errno));
+    takePermissionsOf(target_, file_.number(), shown_);
 }
 
 // the lock is held until the name is gone: nobody takes it for one left behind

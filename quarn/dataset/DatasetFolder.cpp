@@ -107,20 +107,9 @@ bool DatasetFolder::isDone(const Setup& setup) const {
     return true;
 }
 
-DatasetFolder::Begun DatasetFolder::begun(const Setup& setup) const {
+Begun DatasetFolder::begun(const Setup& setup) const {
     requireOursOnly(part_);
-    if (!fs::exists(part_ / setupFile) || fs::exists(part_ / supersededFile))
-        return Begun::no;
-    const std::optional<Setup> earlier = Setup::read(part_ / setupFile);
-    if (!earlier)
-        return Begun::damaged;
-    const std::string difference = setup.differenceFrom(*earlier);
-    if (difference.empty())
-        return Begun::yes;
-    if (replaces_)
-        return Begun::no;
-    throw std::runtime_error(part_.string() + " was begun with another set-up (" + difference +
-                             "); choose another place with -o, or begin again with --overwrite");
+    return fs::exists(part_ / supersededFile) ? Begun::no : begunWith(setup, part_, replaces_);
 }
 
 void DatasetFolder::discard() const {

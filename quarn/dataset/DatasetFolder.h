@@ -3,6 +3,7 @@
 #pragma once
 
 #include "quarn/scene/Setup.h"
+#include "quarn/scene/goOn.h"
 
 #include <cstdint>
 #include <filesystem>
@@ -29,7 +30,6 @@ public:
     /// is to stay: another data set without `replaces`, or no data set.
     bool isDone(const Setup& setup) const;
 
-    enum class Begun { no, yes, damaged };
     /// Whether FOLDER.part was begun with this set-up. Throws when it was begun with another, without `replaces`.
     Begun begun(const Setup& setup) const;
     /// Removes what was begun.

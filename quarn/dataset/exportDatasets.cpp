@@ -180,7 +180,7 @@ private:
     // answers how many rows there were
     std::size_t write() {
         DatasetWriter writer(folder_.part(), facts_.shape);
-        const bool resumes = resume(writer);
+        const bool resumes = goOn(writer, folder_.begun(setup_), folder_.part(), options_.console);
         folder_.requireSpace(facts_.shape.bytes() - writer.rows() * facts_.shape.rowBytes());
         if (!resumes) {
             folder_.begin(setup_);
@@ -190,7 +190,8 @@ private:
         try {
             writeRows(writer);
         } catch (...) {
-            keepRows(writer);
+            if (!keepRows(writer, folder_.part(), options_.console))
+                discard();
             throw;
         }
         writer.save();
@@ -202,21 +203,6 @@ private:
             folder_.part() / descriptionFile,
             datasetDescription(facts_, warp_, geometry_, sampler_, folder_.part() / datasetFile::controls));
         return before;
-    }
-
-    bool resume(DatasetWriter& writer) const {
-        const DatasetFolder::Begun begun = folder_.begun(setup_);
-        if (begun == DatasetFolder::Begun::no)
-            return false;
-        const std::string damage =
-            begun == DatasetFolder::Begun::damaged ? std::string(setupFile) + " cannot be read" : writer.resume();
-        if (!damage.empty())
-            options_.console.note(folder_.part().string() + " cannot be gone on from (" + damage +
-                                  "): beginning again");
-        else
-            options_.console.note("going on after " + std::to_string(writer.rows()) + " of " +
-                                  std::to_string(facts_.shape.rows) + " rows in " + folder_.part().string());
-        return damage.empty();
     }
 
     void writeRows(DatasetWriter& writer) {
@@ -263,15 +249,11 @@ private:
                                   ", leave them out");
     }
 
-    void keepRows(DatasetWriter& writer) const {
+    void discard() const {
         try {
-            writer.save();
-            if (writer.savedRows() == 0)
-                return folder_.discard(); // nothing that would be worth going on from
+            folder_.discard();
         } catch (const std::exception&) { // NOLINT(bugprone-empty-catch): what ended the rows is what the user reads
         }
-        options_.console.note(std::to_string(writer.savedRows()) + " of " + std::to_string(facts_.shape.rows) +
-                              " rows are kept in " + folder_.part().string() + "; the same command goes on from there");
     }
 
     // a cache that is written while it is read gives rows that do not go together

@@ -145,7 +145,7 @@ void writeArrays(const fs::path& folder, const DatasetParts& parts, const Consol
 
 void write(const DatasetFolder& folder, const DatasetParts& parts, const Console& console) {
     const Setup setup = parts.setup();
-    if (folder.begun(setup) != DatasetFolder::Begun::no)
+    if (folder.begun(setup) != Begun::no)
         console.note(folder.part().string() + " was begun before: beginning again, as all of it is in the parts");
     folder.discard(); // whose room is needed
     folder.requireSpace(parts.shape().bytes());

@@ -84,7 +84,7 @@ void replaceDataset(const fs::path& output, const std::string& value) {
     static_cast<void>(folder.isDone(setup));
     storage::FolderLock lock(folder.part(), quarn::anotherExport);
     quarn::DatasetWriter writer(folder.part(), {1, 1, 1});
-    if (folder.begun(setup) == quarn::DatasetFolder::Begun::no || !writer.resume().empty()) {
+    if (folder.begun(setup) == quarn::Begun::no || !writer.resume().empty()) {
         folder.begin(setup);
         writer.begin();
     }
