@@ -18,6 +18,7 @@
 #include "quarn/scene/EnvelopeGuard.h"
 #include "quarn/scene/FrameLog.h"
 #include "quarn/scene/HostErrors.h"
+#include "quarn/scene/PartFrames.h"
 #include "quarn/scene/SceneSession.h"
 #include "quarn/scene/frames.h"
 #include "quarn/scene/modelJson.h"
@@ -55,6 +56,8 @@ struct Options {
     Console console;
     std::string output;
     std::string frames;
+    PartOptions part;
+    bool skipsExisting = false;
     std::string plug;
     std::string deformer;
     std::string geometry;
@@ -73,7 +76,8 @@ struct Options {
 struct Shot {
     std::vector<Panel> panels;
     std::vector<std::vector<ModelInUse>> models; // of each panel's meshes
-    FrameRange frames;
+    PartFrames part;                             // the camera and the colours are those of the whole
+    FrameRange frames;                           // of the part
     Layout layout;
     Camera camera;
     HeatScale scale;
@@ -104,6 +108,7 @@ struct Measure {
 
 struct Answer {
     std::vector<std::filesystem::path> pictures;
+    std::size_t skipped = 0;       // frames whose picture was there
     std::vector<Measure> measures; // of each panel
     std::vector<PoseReport> poses;
 };
@@ -178,7 +183,8 @@ bool hasHeat(const std::vector<Panel>& panels) {
 
 Shot plan(const Options& options, SceneSession& session) {
     Shot shot;
-    shot.frames = framesOf(options, session);
+    shot.part = partFrames(framesOf(options, session), options.part);
+    shot.frames = shot.part.frames;
     shot.panels = panelsOf(options);
     chooseModels(shot, options);
     shot.layout.hasLabels =
@@ -214,7 +220,8 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
     Subject subject(frameOnFrom(options.frameOn),
                     Framing(view, shot.layout.width, shot.layout.height, shot.layout.margins()));
     double largest = 0.0;
-    const std::size_t count = shot.frames.count();
+    const FrameRange& frames = shot.part.whole;
+    const std::size_t count = frames.count();
     const std::size_t looks = std::min(count, mostFramesLookedAt);
     const Stage stage([] { return std::string("looking at the frames"); });
     const HostErrors errors;
@@ -222,7 +229,7 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
     Progress progress(options.console, "looking at the frames", looks);
     for (std::size_t number = 0; number < looks; ++number) {
         // with more frames than looks, spread evenly from the first to the last
-        const int frame = shot.frames.frame(looks == count ? number : number * (count - 1) / (looks - 1));
+        const int frame = frames.frame(looks == count ? number : number * (count - 1) / (looks - 1));
         const FrameLog log(frame);
         shot.setTime(session, frame);
         models.blame([&] {
@@ -236,6 +243,8 @@ void look(Shot& shot, const View& view, const Options& options, SceneSession& se
             throwIfAny(errors, frame);
         });
         models.requireSound();
+        if (shot.guard)
+            shot.guard->forget(frame);
         progress.advance();
     }
     shot.camera = subject.camera();
@@ -257,9 +266,34 @@ void warnOfEmptyPanels(const Shot& shot, const Console& console) {
                              " has no polygons: there is nothing to see of it");
 }
 
+bool isThere(const std::filesystem::path& picture, const Options& options) {
+    std::error_code none;
+    return options.skipsExisting && std::filesystem::is_regular_file(picture, none);
+}
+
+bool areAllThere(const Shot& shot, const Options& options) {
+    const std::filesystem::path pattern = absolutePath(options.output);
+    for (std::size_t number = 0; number < shot.frames.count(); ++number)
+        if (!isThere(pictureName(pattern, shot.frames.frame(number), shot.frames.count() > 1), options))
+            return false;
+    return true;
+}
+
+// for what remembers the frames before the one that is drawn
+void evaluateBefore(Shot& shot, SceneSession& session, const HostErrors& errors, int frame) {
+    throwIfInterrupted();
+    shot.setTime(session, frame);
+    for (const Panel& panel : shot.panels)
+        evaluatePanel(panel, frame);
+    throwIfAny(errors, frame);
+    if (shot.guard)
+        shot.guard->forget(frame);
+}
+
 void drawPictures(Shot& shot, const Options& options, SceneSession& session, Answer& answer) {
     const std::filesystem::path pattern = absolutePath(options.output);
     const std::size_t count = shot.frames.count();
+    std::optional<int> last; // frame that was evaluated
     const HostErrors errors;
     AppliedModels models = modelsOf(shot);
     PoseWatch poses(models);
@@ -267,6 +301,15 @@ void drawPictures(Shot& shot, const Options& options, SceneSession& session, Ans
     for (std::size_t number = 0; number < count; ++number) {
         const int frame = shot.frames.frame(number);
         const std::filesystem::path name = pictureName(pattern, frame, count > 1);
+        if (isThere(name, options)) {
+            ++answer.skipped;
+            progress.advance();
+            continue;
+        }
+        for (const int earlier : shot.part.before(frame))
+            if (!last || *last < earlier)
+                evaluateBefore(shot, session, errors, earlier);
+        last = frame;
         const Stage stage([&] { return "drawing " + name.string(); });
         shot.setTime(session, frame);
         Picture picture(shot.layout.width * static_cast<int>(shot.panels.size()), shot.layout.height);
@@ -336,6 +379,7 @@ std::string jsonOf(const Shot& shot, const Answer& answer, const Options& option
     for (const std::filesystem::path& picture : answer.pictures)
         writeText(writer, picture.string());
     writer.EndArray();
+    writeCount(writer, "skipped", answer.skipped);
     writer.Key("width");
     writer.Uint64(static_cast<std::uint64_t>(shot.layout.width) * shot.panels.size());
     writer.Key("height");
@@ -349,9 +393,9 @@ std::string jsonOf(const Shot& shot, const Answer& answer, const Options& option
 
 void tell(const Shot& shot, const Answer& answer, const Options& options) {
     const Console& console = options.console;
-    if (shot.frames.count() > mostFramesLookedAt)
+    if (const std::size_t count = shot.part.whole.count(); count > mostFramesLookedAt && !answer.pictures.empty())
         console.note("the camera and the range of colours are those of " + std::to_string(mostFramesLookedAt) +
-                     " of the " + std::to_string(shot.frames.count()) + " frames");
+                     " of the " + std::to_string(count) + " frames");
     std::set<std::string> notes; // several panels may show the same mesh
     for (const std::vector<ModelInUse>& models : shot.models)
         for (const ModelInUse& model : models)
@@ -360,6 +404,10 @@ void tell(const Shot& shot, const Answer& answer, const Options& options) {
     if (shot.guard)
         noteGuard(console, shot.guard->reports(), options.guard.width);
     notePoses(console, answer.poses);
+    if (answer.skipped > 0)
+        console.note(std::to_string(answer.skipped) + " frames were left out, whose pictures were there");
+    if (answer.pictures.empty())
+        return;
     const std::string last = answer.pictures.back().string();
     console.note(answer.pictures.size() == 1 ? "drew " + last
                                              : "drew " + std::to_string(answer.pictures.size()) + " pictures, " +
@@ -379,8 +427,10 @@ void render(const Options& options) {
         answer.measures.resize(shot.panels.size());
         if (options.guard.isOn)
             shot.guard.emplace(modelsOf(shot).geometries(), options.guard.width);
-        look(shot, view, options, session);
-        warnOfEmptyPanels(shot, options.console);
+        if (!areAllThere(shot, options)) {
+            look(shot, view, options, session);
+            warnOfEmptyPanels(shot, options.console);
+        }
         drawPictures(shot, options, session, answer);
         tell(shot, answer, options);
         told = options.console.json ? jsonOf(shot, answer, options) : "";
@@ -429,6 +479,8 @@ void addRenderCommand(CLI::App& app) {
         ->required();
     command->add_option("--frames", options->frames, "Frames to draw; by default the scene's current one")
         ->type_name("A-B[xS]");
+    addPartOptions(*command, options->part, true);
+    command->add_flag("--skip-existing", options->skipsExisting, "Leave out the frames whose picture is there");
     addWhatIsShown(*command, *options);
     command->add_option("--size", options->size, "Size of one panel in pixels")
         ->type_name("WxH")

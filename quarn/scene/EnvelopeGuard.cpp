@@ -122,6 +122,11 @@ std::optional<double> EnvelopeGuard::distanceOf(Deformer& deformer) {
     return largest;
 }
 
+void EnvelopeGuard::forget(int frame) {
+    for (auto& [name, deformer] : deformers_)
+        deformer.distances.erase(frame);
+}
+
 std::vector<GuardReport> EnvelopeGuard::reports() const {
     std::vector<GuardReport> reports;
     for (const auto& [name, deformer] : deformers_) {

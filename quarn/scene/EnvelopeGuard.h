@@ -57,6 +57,9 @@ public:
     /// be evaluated, and where an envelope is locked.
     void apply(int frame);
 
+    /// A frame that was shown for those after it alone: it does not count in the reports.
+    void forget(int frame);
+
     /// In the order of the deformers' names. A frame that was shown several times counts once.
     std::vector<GuardReport> reports() const;
 

@@ -21,9 +21,7 @@ int lastFrame(const FrameRange& range) {
 
 void addPartOptions(CLI::App& command, PartOptions& options, bool makesParts) {
     if (makesParts)
-        command
-            .add_option("--of", options.of,
-                        "The frames of the whole, of which --frames is a part; quarn merge joins the parts")
+        command.add_option("--of", options.of, "The frames of the whole, of which --frames is a part")
             ->type_name("A-B[xS]")
             ->needs("--frames");
     command
