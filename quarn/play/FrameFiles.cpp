@@ -2,6 +2,7 @@
 #include "quarn/play/FrameFiles.h"
 
 #include "quarn/console/UsageError.h"
+#include "quarn/play/GrowingCache.h"
 #include "quarn/play/meshFiles.h"
 #include "storage/CacheFormat.h"
 #include "storage/PointCacheWriter.h"
@@ -54,10 +55,16 @@ void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& f
     WholeFile::requirePossible(storage::frameFile(pattern, frames.first));
 }
 
+bool isFileOfEachFrame(const std::filesystem::path& pattern, const FrameRange& frames) {
+    return !isCache(pattern) && !isAnimatedFile(pattern, frames.count());
+}
+
 FrameFiles::FrameFiles(std::filesystem::path pattern, const MeshPolygons& polygons, FrameWriting writing)
     : pattern_(std::move(pattern))
     , writing_(std::move(writing)) {
     const FrameRange& frames = writing_.frames;
+    if (writing_.cache != nullptr)
+        return;
     if (isAnimatedFile(pattern_, frames.count())) {
         animated_ = createAnimatedFile(pattern_, writing_.order.polygons(polygons), motionOf(writing_));
         return;
@@ -84,7 +91,9 @@ std::span<const float> FrameFiles::written(std::span<const float> xyz) {
 }
 
 void FrameFiles::add(int frame, std::span<const float> xyz) {
-    if (cache_)
+    if (writing_.cache != nullptr)
+        writing_.cache->append(written(xyz));
+    else if (cache_)
         cache_->append(written(xyz));
     else if (animated_)
         animated_->add(frame, written(xyz));

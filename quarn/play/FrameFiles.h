@@ -20,9 +20,14 @@ class PointCacheWriter;
 
 namespace quarn {
 
+class GrowingCache;
+
 /// Throws std::runtime_error when the ending is none that is written, and for a mesh file without "#" where there are
 /// several frames. Before anything is played.
 void checkFramePattern(const std::filesystem::path& pattern, const FrameRange& frames);
+
+/// Whether each of these frames is written to a file of its own.
+bool isFileOfEachFrame(const std::filesystem::path& pattern, const FrameRange& frames);
 
 /// How frames are written.
 struct FrameWriting {
@@ -34,10 +39,11 @@ struct FrameWriting {
     double metersPerUnit = 1.0;              ///< of the scene
     std::optional<double> allowedError = {}; ///< as of a ClipMotion
     std::shared_ptr<ClipSource> source = {}; ///< the same; with it order and space are the scene's
+    GrowingCache* cache = nullptr;           ///< what gets the frames of a .npy; null: a file that comes as a whole
 };
 
-/// Every file is there as a whole or not at all; of those of all frames nothing is left without finish(). Thread:
-/// main.
+/// Every file is there as a whole or not at all; of those of all frames nothing is left without finish(), but for a
+/// GrowingCache, which its owner publishes. Thread: main.
 class FrameFiles {
 public:
     /// `polygons` of the scene's mesh.
@@ -51,13 +57,13 @@ public:
     /// `xyz` in the scene's order, space and unit. Throws std::runtime_error that names the file.
     void add(int frame, std::span<const float> xyz);
     void finish();
+    /// `xyz` as it is written, in the order, space and unit of the files. Valid until the next call.
+    std::span<const float> written(std::span<const float> xyz);
     /// As of an AnimatedFile.
     std::optional<ShapesOfMotion> shapes() const { return animated_ ? animated_->shapes() : std::nullopt; }
     std::vector<std::string> notes() const { return animated_ ? animated_->notes() : std::vector<std::string>(); }
 
 private:
-    std::span<const float> written(std::span<const float> xyz);
-
     std::filesystem::path pattern_;
     FrameWriting writing_;
     MeshPolygons polygons_; ///< only for mesh files

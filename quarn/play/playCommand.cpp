@@ -37,7 +37,9 @@ struct Options {
     std::string deformer, geometry, plug, frames, against;
     std::string order = "scene", evaluator = "cpu", device;
     CacheSpace space;
+    PartOptions part;
     fs::path output, trace;
+    bool overwrite = false, skipExisting = false;
     int repeats = 1;
     bool isAnySizeWritten = false;
     std::string targets = "frames";
@@ -140,7 +142,11 @@ PlayPlan planFor(const Options& options) {
     PlayPlan plan;
     plan.mesh = options.plug.empty() ? geometry->output : findPlug(options.plug);
     plan.frames = framesToPlay(options.frames, warp ? &*warp : nullptr);
+    plan.part = options.part;
+    plan.scene = absolutePath(options.scene.scene);
     plan.repeats = options.repeats;
+    plan.replacesBegun = options.overwrite;
+    plan.leavesExisting = options.skipExisting;
     plan.output = options.output;
     plan.space = options.space;
     plan.meshName = geometry != nullptr ? geometry->name : nodeName(plan.mesh.node());
@@ -184,16 +190,25 @@ void bake(Options& options) {
     SceneSession session(options.scene);
     const PlayPlan plan = planFor(options);
     const PlayResult result = playFrames(session, plan, options.console);
-    options.console.note("wrote " + std::to_string(result.times.count()) + " frames of " +
-                         std::to_string(result.vertexCount) + " vertices to " + options.output.string());
+    const std::string kept =
+        result.framesKept > 0 ? ", " + std::to_string(result.framesKept) + " of them in an earlier run" : "";
+    const std::string skipped =
+        result.framesSkipped > 0 ? "; of " + std::to_string(result.framesSkipped) + " others the files were there" : "";
+    options.console.note("wrote " + std::to_string(result.framesKept + result.times.count()) + " frames of " +
+                         std::to_string(result.vertexCount) + " vertices to " + options.output.string() + kept +
+                         skipped);
     if (!plan.model.note.empty())
         options.console.note(plan.model.note);
     noteGuard(options.console, result.guard, options.guard.width);
     notePoses(options.console, result.poses);
 }
 
-void addFrameOptions(CLI::App& command, Options& options) {
+void addFrameOptions(CLI::App& command, Options& options, bool makesParts) {
     command.add_option("--frames", options.frames, "As 5, 1-100 or 1-100x5; the deformer's export range by default");
+    addPartOptions(command, options.part, makesParts);
+    command.add_flag("--overwrite", options.overwrite, "Begin a .npy again that was begun with another set-up");
+    command.add_flag("--skip-existing", options.skipExisting,
+                     "With a file for each frame: leave out the frames whose file is there");
     command.add_option("--order", options.order, "Order of written vertices: scene, or file as they were imported")
         ->check(CLI::IsMember({"scene", "file"}))
         ->capture_default_str();
@@ -252,7 +267,7 @@ void addPlayCommand(CLI::App& app) {
                      "FILE.npy, .npz, .pc2, .mdd, .usda or .glb for all frames; FILE.####.obj, .ply, .gltf or .glb")
         ->type_name("FILE");
     addClipOptions(*command, *options);
-    addFrameOptions(*command, *options);
+    addFrameOptions(*command, *options, false);
     addMeasureOptions(*command, *options);
     addConsoleOptions(*command, options->console, true);
     addProgressOption(*command, options->console);
@@ -271,7 +286,7 @@ void addBakeCommand(CLI::App& app) {
         ->required();
     addModelOptions(*command, options->model);
     addGuardOptions(*command, options->guard);
-    addFrameOptions(*command, *options);
+    addFrameOptions(*command, *options, true);
     addConsoleOptions(*command, options->console, false);
     addProgressOption(*command, options->console);
     command->callback([options] { bake(*options); });

@@ -49,6 +49,21 @@ void printDistances(std::ostream& out, const char* what, const Comparison& compa
     out << " at vertex " << distances.worstVertex() << " in frame " << distances.worstFrame() << '\n';
 }
 
+void printFrames(std::ostream& out, const PlayResult& result) {
+    if (result.framesKept > 0)
+        out << "an earlier run has made the first " << result.framesKept << " of them; what follows is of the others\n";
+    if (result.framesSkipped > 0)
+        out << "the files of " << result.framesSkipped << " of them were there; what follows is of the others\n";
+}
+
+void printTimes(std::ostream& out, const FrameTimes& times) {
+    if (times.count() == 0)
+        return static_cast<void>(out << "no frame was timed\n");
+    out << times.count() << " frames timed: " << framesPerSecond(times) << " frames a second, median "
+        << times.median() * inMilliseconds << " ms, p99 " << times.percentile(0.99) * inMilliseconds << " ms, worst "
+        << times.percentile(1.0) * inMilliseconds << " ms in frame " << times.worstFrame() << '\n';
+}
+
 void printGpu(std::ostream& out, const GpuUse& gpu) {
     out << "GPU: " << gpu.onGpu << " deformations on " << (gpu.device.empty() ? "no device" : gpu.device) << ", "
         << gpu.onCpu << " on the CPU";
@@ -128,13 +143,11 @@ std::string playText(const PlayResult& result, const PlayPlan& plan, double mete
     std::ostringstream out;
     out.imbue(std::locale::classic());
     out.precision(4);
-    const FrameTimes& times = result.times;
     out << "played frames " << plan.frames.first << " to " << plan.frames.last << ", " << result.vertexCount
         << " vertices" << (plan.model.name.empty() ? "" : ", model " + plan.model.name) << '\n'
-        << (plan.model.note.empty() ? "" : plan.model.note + "\n") << times.count()
-        << " frames timed: " << framesPerSecond(times) << " frames a second, median " << times.median() * inMilliseconds
-        << " ms, p99 " << times.percentile(0.99) * inMilliseconds << " ms, worst "
-        << times.percentile(1.0) * inMilliseconds << " ms in frame " << times.worstFrame() << '\n';
+        << (plan.model.note.empty() ? "" : plan.model.note + "\n");
+    printFrames(out, result);
+    printTimes(out, result.times);
     if (result.gpu)
         printGpu(out, *result.gpu);
     for (const auto& [name, seconds] : result.phases)
@@ -168,6 +181,8 @@ std::string playJson(const PlayResult& result, const PlayPlan& plan, double mete
     whole(json, "step", plan.frames.step);
     writeModel(json, plan.model);
     whole(json, "vertices", static_cast<std::int64_t>(result.vertexCount));
+    whole(json, "framesKept", static_cast<std::int64_t>(result.framesKept));
+    whole(json, "framesSkipped", static_cast<std::int64_t>(result.framesSkipped));
     whole(json, "framesTimed", static_cast<std::int64_t>(result.times.count()));
     writeTimes(json, result);
     writeGpu(json, result.gpu);

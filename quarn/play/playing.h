@@ -9,6 +9,7 @@
 #include "quarn/scene/Distances.h"
 #include "quarn/scene/EnvelopeGuard.h"
 #include "quarn/scene/FrameTimes.h"
+#include "quarn/scene/PartFrames.h"
 #include "quarn/scene/PoseWatch.h"
 #include "quarn/scene/evaluator.h"
 #include "quarn/scene/frames.h"
@@ -29,8 +30,12 @@ class SceneSession;
 struct PlayPlan {
     HPlug mesh;
     FrameRange frames;
+    PartOptions part;                       ///< the whole that the frames are of, and what is evaluated before them
+    std::filesystem::path scene;            ///< its file; empty: it has none
     int repeats = 1;                        ///< above 0; the first is not timed where there are several
     std::filesystem::path output;           ///< pattern as for FrameFiles; empty: nothing is written
+    bool replacesBegun = false;             ///< a .npy that was begun with another set-up is given up
+    bool leavesExisting = false;            ///< frames whose file is there are neither evaluated nor written
     VertexOrder order;                      ///< of what is written
     CacheSpace space;                       ///< the same
     std::string meshName;                   ///< in animated files
@@ -54,6 +59,8 @@ struct Comparison {
 
 struct PlayResult {
     std::size_t vertexCount = 0;
+    std::size_t framesKept = 0;    ///< an earlier run has written: the rest of this is not about them
+    std::size_t framesSkipped = 0; ///< whose file was there, the same
     FrameTimes times;
     std::map<std::string, std::vector<double>> phases; ///< seconds; only with a trace
     std::optional<GpuUse> gpu;                         ///< none: the GPU was not asked for
@@ -65,7 +72,9 @@ struct PlayResult {
     std::vector<PoseReport> poses;        ///< of the models that were on
 };
 
-/// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. Thread: main.
+/// Throws std::runtime_error, with the frame, for what fails on the way, and Interrupted. A .npy is gone on from where
+/// an earlier run of the same set-up has left it (GrowingCache), unless all frames are to be compared, repeated or
+/// recorded. Thread: main.
 PlayResult playFrames(SceneSession& session, PlayPlan plan, const Console& console);
 
 } // namespace quarn

@@ -71,7 +71,9 @@ expect 0 'warning: so many smoothing passes' '' info "$work/slow.nwrp"
 
 # a destroyed mesh leaves with an error: by the network, and by a damaged model
 expect 1 '' 'frame 4: vertex 8 of wave' play "$work/huge.json" --frames 4 -o "$work/lost.obj"
-expect 1 '' 'frame 4: vertex 8 of wave' bake "$work/huge.json" 'wave.outputGeom[0]' --frames 1-11 -o "$work/lost.npy"
+expect 1 '' '3 of 11 rows are kept in .*huge\.npy\.part; (.|\n)*frame 4: vertex 8 of wave' \
+  bake "$work/huge.json" 'wave.outputGeom[0]' --frames 1-11 -o "$work/huge.npy"
+[[ ! -e $work/huge.npy ]] || fail "a cache of a bake that failed"
 cp -r "$work/models/wave.nwrp" "$work/models/seven.nwrp"
 sed -i 's/"deltaMode": 1/"deltaMode": 7/' "$work/models/seven.nwrp/metadata.json"
 expect 1 '' 'wave cannot apply the model .*seven\.nwrp: .* deltaMode 7' play "$scene" --frames 1 --model seven
@@ -84,12 +86,12 @@ rm -r "$work/models/wave.nwrp"
 mv "$work/kept" "$work/models/wave.nwrp"
 ! compgen -G "$work/lost.[onpu]*" >/dev/null || fail "a file of a play that failed"
 
-# the model in memory goes on while its directory is replaced under it, and Ctrl-C leaves nothing
+# the model in memory goes on while its directory is replaced under it, and Ctrl-C keeps the frames that there are
 cp -r "$work/models/wave.nwrp" "$work/next"
 "$quarn" play "$scene" --frames 1-400000 -o "$work/long.npy" >"$work/out" 2>"$work/err" &
 player=$!
 for _ in {1..600}; do
-  if compgen -G "$work/.whole-*" >/dev/null || ! kill -0 "$player"; then break; fi
+  if [[ -e $work/long.npy.part/progress.json ]] || ! kill -0 "$player"; then break; fi
   sleep 0.05
 done
 for _ in 1 2 3 4 5 6; do
@@ -102,7 +104,48 @@ kill -INT "$player"
 status=0
 wait "$player" || status=$?
 [[ $status == 130 ]] && grep -q interrupted "$work/err" || fail "interrupted: status $status"
-! compgen -G "$work/.whole-*" >/dev/null && [[ ! -e $work/long.npy ]] || fail "something is left of an interrupted play"
+grep -q 'of 400000 rows are kept in .*long\.npy\.part; the same command goes on' "$work/err" && [[ ! -e $work/long.npy ]] ||
+  fail "what is left of an interrupted play"
+
+# killed at any moment, a bake goes on to the bytes of one run; a second one of the same file is refused meanwhile
+long=(bake "$scene" 'wave.outputGeom[0]' --frames 1-12000)
+expect 0 '' 'wrote 12000 frames' "${long[@]}" -o "$work/whole.npy"
+for kill in 1 2 3 4; do
+  before=$(cat "$work/killed.npy.part/progress.json" 2>/dev/null || true)
+  "$quarn" "${long[@]}" -o "$work/killed.npy" -q >"$work/out" 2>"$work/err" &
+  player=$!
+  for _ in {1..2000}; do
+    now=$(cat "$work/killed.npy.part/progress.json" 2>/dev/null || true)
+    if [[ $now == *'"rows": '[1-9]* && $now != "$before" ]] || ! kill -0 "$player"; then break; fi
+    sleep 0.005
+  done
+  kill -STOP "$player" || true
+  [[ $kill != 1 ]] || expect 75 '' 'another quarn play or bake is writing' "${long[@]}" -o "$work/killed.npy"
+  kill -9 "$player" || true
+  wait "$player" && break || true
+done
+[[ -e $work/killed.npy.part/points.npy ]] || fail "it was over before it could be killed"
+expect 1 '' 'killed\.npy\.part was begun with another set-up \(frames 1-12000, now 1-2\); .* --overwrite' \
+  bake "$scene" 'wave.outputGeom[0]' --frames 1-2 -o "$work/killed.npy"
+expect 0 '' 'going on after [0-9]+ of 12000 rows in (.|\n)*wrote 12000 frames .*, [0-9]+ of them in an earlier run' \
+  "${long[@]}" -o "$work/killed.npy"
+cmp "$work/whole.npy" "$work/killed.npy" && [[ ! -e $work/killed.npy.part ]] || fail "not what one run makes"
+
+# a part says how it joins the next one, and files of frames that are there stay
+expect 0 '' 'wrote 4 frames' bake "$scene" 'wave.outputGeom[0]' --frames 4-7 --of 1-9 --preroll 2 -o "$work/part.npy"
+grep -q '"of": "1-9"' "$work/part.npy.part.json" || fail "no record of a part"
+expect 2 '' '4-11 is no run of the frames of --of 1-9' \
+  bake "$scene" strip.outMesh --frames 4-11 --of 1-9 -o "$work/lost.npy"
+rm "$work/a.0006.obj"
+expect 0 'the files of 2 of them were there;(.|\n)*1 frames timed' '' \
+  play "$scene" --frames 1-11x5 -o "$work/a.####.obj" --skip-existing
+expect 0 '"framesSkipped": 3' '' play "$scene" --frames 1-11x5 -o "$work/a.####.obj" --skip-existing --json
+expect 0 '' 'drew 2 pictures' render "$scene" --frames 1-2 --of 1-4 --preroll 1 -o "$work/r.####.png" --size 40x30
+expect 0 '"skipped": 2,' '2 frames were left out(.|\n)*drew 2 pictures, .*r\.0003' \
+  render "$scene" --frames 1-4 -o "$work/r.####.png" --size 40x30 --skip-existing --json
+cp "$work/r.0002.png" "$work/two.png"
+expect 0 '' 'drew 4 pictures' render "$scene" --frames 1-4 -o "$work/r.####.png" --size 40x30
+cmp "$work/r.0002.png" "$work/two.png" || fail "a part of a film has another camera than the whole"
 
 # a guard: at 1 the first control is as far beyond its range as that is wide
 expect 1 '' 'frame 1: the guard of wave fails: .*wave\.nwrp does not say which poses' play "$scene" --frames 1 --guard

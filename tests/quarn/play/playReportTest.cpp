@@ -62,11 +62,11 @@ TEST(PlayReport, SaysLengthsInMillimetresAndPartsOfTheBox) {
 TEST(PlayReport, LeavesOutWhatWasNotMeasured) {
     PlayResult result;
     result.times.add(1, 0.0); // nothing depended on the time
-    const std::string text = playText(result, {}, 1.0);
+    const std::string text = playText(result, PlayPlan(), 1.0);
     EXPECT_THAT(text, HasSubstr("0 vertices\n1 frames timed: 0 frames a second"));
     EXPECT_THAT(text, Not(HasSubstr("distance")));
     rapidjson::Document json;
-    ASSERT_FALSE(json.Parse(playJson(result, {}, 1.0).c_str()).HasParseError());
+    ASSERT_FALSE(json.Parse(playJson(result, PlayPlan(), 1.0).c_str()).HasParseError());
     for (const char* key : {"model", "gpu", "distance", "before"})
         EXPECT_TRUE(json[key].IsNull()) << key;
 }
