@@ -14,10 +14,8 @@ namespace {
 // at most so much is lost, and made again, when the program dies
 constexpr std::size_t saveAfterRows = 64;
 constexpr auto saveAfter = std::chrono::seconds(1);
-// but where the disk takes its time, saving is a twentieth of all the time at most: large rows that come fast would
-// wait for it more than they take
-constexpr auto quickSave = std::chrono::milliseconds(2);
-constexpr int workForSave = 20;
+// but saving is a small part of all the time, on any disk: rows that come fast would wait for it more than they take
+constexpr int workForSave = 40;
 
 struct ProgressRecord {
     std::size_t rows = 0;
@@ -109,8 +107,7 @@ void RecordedRows::append(std::initializer_list<std::span<const std::byte>> row)
 
 bool RecordedRows::isTimeToSave() const {
     const auto since = std::chrono::steady_clock::now() - saved_;
-    const bool isCheap = saveTook_ < quickSave || since >= workForSave * saveTook_;
-    return isCheap && (rows_ - savedRows_ >= saveAfterRows || since >= saveAfter);
+    return since >= workForSave * saveTook_ && (rows_ - savedRows_ >= saveAfterRows || since >= saveAfter);
 }
 
 void RecordedRows::save() {

@@ -175,6 +175,8 @@ TEST_F(ResumeTest, AFullDiskIsSaidAndGoneOnFrom) {
     };
     quarn::DatasetWriter stopped(disk, shape);
     stopped.begin();
+    stopped.append(1, controls, deltas, skin);
+    stopped.save();
     std::ofstream(disk / "other") << std::string(3U << 20U, 'x');
     EXPECT_THAT(failureOf([&] { appendAll(stopped); }),
                 AllOf(HasSubstr(disk.string()), HasSubstr("No space left on device")));
