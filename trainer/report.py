@@ -12,7 +12,7 @@ import numpy as np
 
 from . import __version__
 from .dataset import Dataset
-from .files import write_bytes
+from .files import LOCK, write_bytes
 from .measure import Measured
 from .state import History
 
@@ -47,8 +47,8 @@ def versions() -> dict[str, str]:
 
 
 def sizes(model: Path) -> dict[str, int]:
-    """Bytes of each file of a model directory."""
-    return {path.name: path.stat().st_size for path in sorted(model.iterdir())}
+    """Bytes of each file of a model directory, which may be locked while it is made."""
+    return {path.name: path.stat().st_size for path in sorted(model.iterdir()) if path.name != LOCK}
 
 
 def losses(history: History) -> str:

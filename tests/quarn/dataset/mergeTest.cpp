@@ -50,6 +50,7 @@ protected:
     /// Folders of parts, each named by its frames.
     std::vector<fs::path> parts(const std::vector<std::string>& ranges, const std::string& of) const {
         std::vector<fs::path> folders;
+        folders.reserve(ranges.size());
         for (const std::string& range : ranges)
             folders.push_back(exported(range, of));
         return folders;
@@ -153,7 +154,7 @@ TEST_F(MergeTest, WhatIsNoWholeIsRefused) {
     const std::vector<fs::path> good = parts({"1-5", "6-8", "9-12"}, "1-12");
     exported("4-8", "1-12");
     exported("1-5", ""), exported("6-9", "");
-    const fs::path first = good[0], middle = good[1], last = good[2];
+    const fs::path &first = good[0], &middle = good[1], &last = good[2];
     const fs::path aside = folder.path() / "aside";
     const fs::path deltas = middle / "deltas.npy", set = folder.path() / "merged";
     struct Case {
@@ -330,7 +331,7 @@ class MergeCachesTest : public MergeTest {
 protected:
     static std::string sumOf(const std::vector<float>& row) { return quarn::rowSum({std::as_bytes(std::span(row))}); }
     fs::path part(int first, int last, const std::string& setting = "1") const {
-        const fs::path file = folder.path() / (std::to_string(first) + ".npy");
+        fs::path file = folder.path() / (std::to_string(first) + ".npy");
         std::vector<std::vector<float>> rows;
         for (int frame = first; frame <= last; ++frame)
             rows.push_back(targetAt(static_cast<std::size_t>(frame)));

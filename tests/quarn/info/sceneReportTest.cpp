@@ -26,6 +26,9 @@ using ::testing::HasSubstr;
 using ::testing::IsEmpty;
 
 class SceneReports : public ::testing::Test {
+public:
+    ~SceneReports() override { OpenQuarn::setMessageSink({}); }
+
 protected:
     SceneReports() {
         OpenQuarn::setMessageSink([](const OpenQuarn::Message&) {});
@@ -39,8 +42,6 @@ protected:
         rig_->plug("input[0].componentTagExpression").setString("*");
         rig_->plug("models[5].modelName").setString("");
     }
-    ~SceneReports() override { OpenQuarn::setMessageSink({}); }
-
     std::filesystem::path root() const { return folder_.path() / "models"; }
     HPlug tag(unsigned index) { return rig_->plug("input[" + std::to_string(index) + "].componentTagExpression"); }
 

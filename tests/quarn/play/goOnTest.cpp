@@ -59,7 +59,7 @@ protected:
         seen_.clear();
         result_ = play(plan);
         EXPECT_FALSE(fs::exists(part()));
-        const std::string bytes = contentOf(output());
+        std::string bytes = contentOf(output());
         fs::remove(output());
         return bytes;
     }
