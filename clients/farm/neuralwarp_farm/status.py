@@ -19,7 +19,8 @@ WORD_OF_STATE = {State.DONE: "done", State.WRITING: "being written by another", 
                  State.MISSING: "missing"}
 TAIL = 1 << 16   # bytes of a log's end
 LISTED = 20      # tasks of one word that a text names
-NO_FAILURES = (codes.LOCKED, codes.INTERRUPTED, codes.TERMINATED)  # what goes on when it is started again
+# what goes on when it is started again; also where a result was there, and somebody has taken it away since
+NO_FAILURES = (codes.DONE, codes.LOCKED, codes.INTERRUPTED, codes.TERMINATED)
 
 
 @dataclass(frozen=True)
