@@ -7,6 +7,7 @@ from contextlib import nullcontext
 from dataclasses import fields
 
 from . import engines, plan, results
+from .counts import megabytes, positive, whole
 from .engines.base import Options, locked
 from .errors import UsageError
 from .plan import Plan, Task
@@ -21,7 +22,7 @@ def add_arguments(parser: argparse.ArgumentParser) -> None:
     parser.add_argument("--cpus", type=positive, metavar="N", help="cores of a task, instead of the plan's")
     parser.add_argument("--memory", type=megabytes, dest="memory_mb", metavar="SIZE",
                         help="memory of a task in MiB, or with a unit as in 16G, instead of the plan's")
-    parser.add_argument("--gpus", type=count, metavar="N", help="GPUs of a task, instead of the plan's")
+    parser.add_argument("--gpus", type=whole, metavar="N", help="GPUs of a task, instead of the plan's")
     parser.add_argument("--constraint", metavar="FEATURES", help="features that a node must have")
     parser.add_argument("--time", type=minutes, metavar="MINUTES",
                         help="time limit of a task: minutes, or [DAYS-]HOURS:MINUTES:SECONDS")
@@ -61,24 +62,6 @@ def left(the_plan: Plan) -> list[Task]:
 
 def results_missing(the_plan: Plan) -> bool:
     return any(results.state_of(the_plan, task) is not State.DONE for task in the_plan.tasks)
-
-
-def count(text: str) -> int:
-    if not text.isdigit():
-        raise argparse.ArgumentTypeError(f'"{text}" is not a whole number')
-    return int(text)
-
-
-def positive(text: str) -> int:
-    if count(text) == 0:
-        raise argparse.ArgumentTypeError("0 is too few")
-    return int(text)
-
-
-def megabytes(text: str) -> int:
-    units = {"M": 1, "G": 1024, "T": 1024 * 1024}
-    number, unit = (text[:-1], text[-1].upper()) if text[-1:].upper() in units else (text, "M")
-    return positive(number) * units[unit]
 
 
 def minutes(text: str) -> float:

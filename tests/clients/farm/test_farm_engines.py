@@ -93,7 +93,7 @@ class PrintersTest(EnginesTest):
         of = self.parts(1)
         for words, said in ((("--engine", "make", "--gpus", "1"), "--gpus means nothing to the engine make"),
                             (("--engine", "lsf"), 'no engine "lsf": there are slurm, make, list, openjd'),
-                            (("--memory", "4X"), '"4X" is not a whole number'), (("--cpus", "0"), "0 is too few")):
+                            (("--memory", "4X"), "'4X' is no size"), (("--cpus", "0"), "it is 0")):
             self.assertIn(said, self.here("submit", of.folder, *words, code=2))
         for text, wanted in (("90", 90.0), ("1:30", 1.5), ("2:00:30", 120.5), ("1-2:00:00", 1560.0)):
             self.assertEqual(minutes(text), wanted)

@@ -63,6 +63,16 @@ class Engine(Protocol):
         more). A task that it was never given is left out."""
 
 
+class Printer:
+    """What engines have in common that write a plan down for another program: they have sent nothing themselves."""
+
+    def cancel(self, plan: Plan) -> str:
+        return ""
+
+    def states(self, plan: Plan) -> dict[str, str]:
+        return {}
+
+
 @contextmanager
 def locked(plan: Plan) -> Iterator[None]:
     """Holds FOLDER/state/lock: of two people who submit or cancel at one moment the second waits for the first."""

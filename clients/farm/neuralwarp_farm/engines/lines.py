@@ -6,10 +6,10 @@ from pathlib import Path
 from typing import Sequence
 
 from ..plan import Plan, Task, write_whole
-from .base import Options, at_once, one_line, stages, task_command
+from .base import Options, Printer, at_once, one_line, stages, task_command
 
 
-class Lines:
+class Lines(Printer):
     """Writes FOLDER/tasks-1.txt, tasks-2.txt ...: a stage a file, a task a line, each a command of sh.
 
     A stage begins when the one before it has ended; nothing in a list of lines could say so, therefore the files.
@@ -39,12 +39,6 @@ class Lines:
         for path, text in zip(paths, texts):
             write_whole(path, text)
         return paths
-
-    def cancel(self, plan: Plan) -> str:
-        return ""
-
-    def states(self, plan: Plan) -> dict[str, str]:
-        return {}
 
 
 def call(path: Path, jobs: int) -> str:

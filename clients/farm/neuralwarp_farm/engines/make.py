@@ -6,10 +6,10 @@ from pathlib import Path
 from typing import Sequence
 
 from ..plan import Plan, Task, write_whole
-from .base import Options, at_once, one_line, task_command
+from .base import Options, Printer, at_once, one_line, task_command
 
 
-class Make:
+class Make(Printer):
     """Writes FOLDER/farm.mk: a phony target a task, since the result on disk is the truth and a stamp could lie."""
 
     name = "make"
@@ -22,12 +22,6 @@ class Make:
         path = plan.folder / "farm.mk"
         write_whole(path, text)
         return f"Wrote {path}. Run it with:\n  {call(path, at_once(tasks, options))}"
-
-    def cancel(self, plan: Plan) -> str:
-        return ""
-
-    def states(self, plan: Plan) -> dict[str, str]:
-        return {}
 
 
 def call(path: Path, jobs: int) -> str:

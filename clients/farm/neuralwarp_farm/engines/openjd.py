@@ -7,7 +7,7 @@ from typing import Any, Sequence
 
 from ..errors import FarmError, UsageError
 from ..plan import Plan, Resources, Task, write_whole
-from .base import Options, stages, task_command
+from .base import Options, Printer, stages, task_command
 
 # limits of the specification
 MOST_STEPS = 100
@@ -16,7 +16,7 @@ MOST_NAME = 64  # characters of a step's name; a job has twice as many
 MOST_TEXT = 2048  # characters of a variable's value
 
 
-class OpenJobDescription:
+class OpenJobDescription(Printer):
     """Writes FOLDER/farm.template.json: a step for each kind of tasks that are alike, with the tasks as a parameter."""
 
     name = "openjd"
@@ -29,12 +29,6 @@ class OpenJobDescription:
         path = plan.folder / "farm.template.json"
         write_whole(path, text)
         return f"Wrote {path}, a job template (jobtemplate-2023-09). Submit it with your farm's own tool."
-
-    def cancel(self, plan: Plan) -> str:
-        return ""
-
-    def states(self, plan: Plan) -> dict[str, str]:
-        return {}
 
 
 def template(plan: Plan, tasks: Sequence[Task], options: Options) -> dict[str, Any]:
