@@ -7,6 +7,7 @@
 
 #include <cstdint>
 #include <string>
+#include <vector>
 
 namespace quarn {
 
@@ -19,6 +20,25 @@ inline void writeText(JsonWriter& writer, const std::string& text) {
 inline void writeText(JsonWriter& writer, const char* key, const std::string& text) {
     writer.Key(key);
     writeText(writer, text);
+}
+
+/// null where the text is empty.
+inline void writeTextOrNull(JsonWriter& writer, const char* key, const std::string& text) {
+    writer.Key(key);
+    if (text.empty())
+        writer.Null();
+    else
+        writeText(writer, text);
+}
+
+/// A list of texts, or of paths.
+template <class Text>
+void writeTexts(JsonWriter& writer, const char* key, const std::vector<Text>& texts) {
+    writer.Key(key);
+    writer.StartArray();
+    for (const Text& text : texts)
+        writeText(writer, std::string(text));
+    writer.EndArray();
 }
 
 inline void writeBool(JsonWriter& writer, const char* key, bool value) {

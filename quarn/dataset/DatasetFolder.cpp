@@ -29,16 +29,6 @@ bool isOneOf(const std::string& name, const char* file) {
     return name == file || storage::TemporaryFile::isOf(name, file);
 }
 
-// NFS keeps a file that was removed while it was open under such a name, and takes it away itself
-bool isOfFileSystem(const std::string& name) {
-    return name.starts_with(".nfs");
-}
-
-bool isOurs(const std::string& name) {
-    return isOfFileSystem(name) ||
-           std::any_of(ourFiles.begin(), ourFiles.end(), [&](const char* file) { return isOneOf(name, file); });
-}
-
 void removeFile(const fs::path& file) {
     std::error_code error;
     fs::remove_all(file, error);
@@ -153,7 +143,7 @@ void DatasetFolder::publish(storage::FolderLock& lock) const {
 
 void DatasetFolder::requireOursOnly(const fs::path& folder) const {
     for (const fs::directory_entry& entry : fs::directory_iterator(folder))
-        if (!isOurs(entry.path().filename()))
+        if (!belongsToMaking(entry.path().filename().native(), ourFiles))
             throw std::runtime_error(entry.path().string() + " is no part of a training data set, and " +
                                      folder.string() +
                                      " is not removed with it; move it, or choose another place with -o");

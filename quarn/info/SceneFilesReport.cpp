@@ -42,22 +42,6 @@ void describeWarp(SceneFilesReport& report, const Warp& warp) {
         report.frames = std::to_string(first) + "-" + std::to_string(last);
 }
 
-template <class Text>
-void writeTexts(JsonWriter& json, const char* key, const std::vector<Text>& texts) {
-    json.Key(key);
-    json.StartArray();
-    for (const Text& text : texts)
-        writeText(json, std::string(text));
-    json.EndArray();
-}
-
-void writeTextOrNull(JsonWriter& json, const char* key, const std::string& text) {
-    if (!text.empty())
-        return writeText(json, key, text);
-    json.Key(key);
-    json.Null();
-}
-
 } // namespace
 
 SceneFilesReport describeFiles(const fs::path& scene, const std::string& deformer) {

@@ -38,14 +38,6 @@ namespace {
 namespace fs = std::filesystem;
 using OpenQuarn::SceneSummary;
 
-void writeTexts(JsonWriter& writer, const char* key, const std::vector<std::string>& texts) {
-    writer.Key(key);
-    writer.StartArray();
-    for (const std::string& text : texts)
-        writeText(writer, text);
-    writer.EndArray();
-}
-
 // a scene as far as it could be opened
 struct OpenedScene {
     std::optional<SceneReport> report;

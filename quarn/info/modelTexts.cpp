@@ -21,14 +21,6 @@ std::string deltaModeText(std::uint32_t mode) {
     return mode == 0 ? "Offset" : mode == 1 ? "Surface" : std::to_string(mode);
 }
 
-void writeTexts(JsonWriter& json, const char* key, const std::vector<std::string>& texts) {
-    json.Key(key);
-    json.StartArray();
-    for (const std::string& text : texts)
-        writeText(json, text);
-    json.EndArray();
-}
-
 void writeMetadata(JsonWriter& json, const neuralWarp::ModelMetadata& metadata) {
     json.Key("metadata");
     if (!metadata.loaded)

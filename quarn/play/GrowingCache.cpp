@@ -7,7 +7,6 @@
 #include "storage/Target.h"
 #include "storage/WholeFile.h"
 
-#include <algorithm>
 #include <array>
 #include <charconv>
 #include <stdexcept>
@@ -19,12 +18,10 @@ namespace fs = std::filesystem;
 
 constexpr const char* pointsFile = "points.npy";
 constexpr const char* verticesEntry = "vertices";
-constexpr std::array ourFiles = {pointsFile, RecordedRows::progressFile, setupFile};
+constexpr std::array ourFiles = {pointsFile, RecordedRows::progressFile, setupFile, storage::FolderLock::fileName};
 
-bool isOurs(const std::string& name) {
-    return name == storage::FolderLock::fileName || name.starts_with(".nfs") || // which NFS takes away itself
-           std::any_of(ourFiles.begin(), ourFiles.end(),
-                       [&](const char* file) { return name == file || storage::TemporaryFile::isOf(name, file); });
+bool isOurs(const fs::path& path) {
+    return belongsToMaking(path.filename().native(), ourFiles);
 }
 
 // 0 for what is no number
@@ -123,7 +120,7 @@ void GrowingCache::publish() {
 
 void GrowingCache::requireOursOnly() const {
     for (const fs::directory_entry& entry : fs::directory_iterator(part_))
-        if (!isOurs(entry.path().filename()))
+        if (!isOurs(entry.path()))
             throw std::runtime_error(entry.path().string() + " is no part of a point cache that is being made, and " +
                                      part_.string() + " is needed for one; move it, or choose another place with -o");
 }
@@ -132,7 +129,7 @@ void GrowingCache::requireOursOnly() const {
 void GrowingCache::discard() {
     std::vector<fs::path> left;
     for (const fs::directory_entry& entry : fs::directory_iterator(part_))
-        if (entry.path().filename() != storage::FolderLock::fileName && isOurs(entry.path().filename()))
+        if (entry.path().filename() != storage::FolderLock::fileName && isOurs(entry.path()))
             left.push_back(entry.path());
     std::error_code error; // what cannot be removed is found to be of no use by the next run
     for (const fs::path& path : left)

@@ -192,13 +192,6 @@ void writeTraining(JsonWriter& json, const std::optional<TrainingRecord>& traini
     json.EndObject();
 }
 
-void writeOrNull(JsonWriter& json, const char* key, const std::string& text) {
-    if (!text.empty())
-        return writeText(json, key, text);
-    json.Key(key);
-    json.Null();
-}
-
 void writeWhat(JsonWriter& json, const Row& row) {
     const MeasuredRow& measured = row.measured;
     writeText(json, "name", measured.name);
@@ -235,7 +228,7 @@ void writeRow(JsonWriter& json, const Row& row, bool isMotion) {
     writeModel(json, measured.model);
     writeTraining(json, row.training);
     object(json, "ranges", [&] { writePoses(json, measured.poses); });
-    writeOrNull(json, "viewer", row.viewer);
+    writeTextOrNull(json, "viewer", row.viewer);
     json.Key("frames");
     json.StartArray();
     for (std::size_t i = 0; i < measured.frames.count(); ++i)

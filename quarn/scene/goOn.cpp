@@ -2,7 +2,9 @@
 #include "quarn/scene/goOn.h"
 
 #include "quarn/console/Console.h"
+#include "storage/TemporaryFile.h"
 
+#include <algorithm>
 #include <optional>
 #include <stdexcept>
 
@@ -14,6 +16,12 @@ std::string countOf(std::size_t rows, const RecordedRows& all) {
 }
 
 } // namespace
+
+bool belongsToMaking(std::string_view name, std::span<const char* const> files) {
+    return name.starts_with(".nfs") || std::any_of(files.begin(), files.end(), [&](const char* file) {
+               return name == file || storage::TemporaryFile::isOf(name, file);
+           });
+}
 
 Begun begunWith(const Setup& setup, const std::filesystem::path& part, bool replaces) {
     if (!std::filesystem::exists(part / setupFile))

@@ -6,10 +6,16 @@
 #include "quarn/scene/Setup.h"
 
 #include <filesystem>
+#include <span>
+#include <string_view>
 
 namespace quarn {
 
 struct Console;
+
+/// Whether a file of this name belongs to the making of `files`: it is one of them, or what a writer of one has left,
+/// or what NFS keeps of one that was removed while it was open, and takes away itself. Thread: any.
+bool belongsToMaking(std::string_view name, std::span<const char* const> files);
 
 enum class Begun { no, yes, damaged };
 

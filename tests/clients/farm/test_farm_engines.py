@@ -109,7 +109,7 @@ class TemplateTest(EnginesTest):
         result: dict[str, Any] = json.loads(text)
         return result
 
-    def test_rules_of_the_specification(self) -> None:
+    def test_rules_of_the_format(self) -> None:
         """Those that we know of: no foreign reader of templates is to be had here."""
         of = self.parts(2500, folder="farm")
         template = self.template(of, gpus=1, memory_mb=4000, time=1.5, constraint="attr.worker.os.version=12")

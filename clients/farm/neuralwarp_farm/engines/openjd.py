@@ -9,7 +9,7 @@ from ..errors import FarmError, UsageError
 from ..plan import Plan, Resources, Task, write_whole
 from .base import Options, Printer, stages, task_command
 
-# limits of the specification
+# what Open Job Description allows at most
 MOST_STEPS = 100
 MOST_VALUES = 1024  # of one task parameter
 MOST_NAME = 64  # characters of a step's name; a job has twice as many

@@ -17,7 +17,7 @@ from pathlib import Path
 from types import FrameType
 from typing import Any, Iterator, Optional
 
-from .. import codes, npy
+from .. import codes, facts, npy
 from ..errors import FarmError, LockedByAnother
 from ..plan import write_whole
 from .target_scene import Scene, read_scene
@@ -194,10 +194,9 @@ class Part:
         setup = {"scene": npy.sum_of(options.scene.read_bytes()), "deformer": options.deformer,
                  "geometry": options.geometry, "order": options.order, "program": shlex.join(options.program),
                  "preroll": str(options.preroll)}
-        build = json.loads(subprocess.run([options.quarn, "info", "--build", "--json"], check=True,
-                                          stdout=subprocess.PIPE).stdout)
-        return {"format": "neuralWarp part", "version": 1, "build": build["build"], "quarn": build["version"],
-                "instructionSet": build["instructionSet"], "frames": f"{options.first}-{options.last}",
+        build = facts.build_of(options.quarn)
+        return {"format": "neuralWarp part", "version": 1, "build": build.build, "quarn": build.version,
+                "instructionSet": build.instruction_set, "frames": f"{options.first}-{options.last}",
                 "of": "{}-{}".format(*options.whole), "firstSum": first_sum, "nextSum": next_sum,
                 "setupSum": npy.sum_of(json.dumps(setup, sort_keys=True).encode()), "setup": setup}
 
