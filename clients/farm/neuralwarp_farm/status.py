@@ -75,7 +75,7 @@ def report_of(plan: Plan) -> Report:
 
 
 def line_of(plan: Plan, task: Task, known: Optional[str]) -> Line:
-    """`known`: what the engine says of it, "running", "pending", "failed" or "gone"."""
+    """`known`: what the engine says of it, "running", "pending", "held", "failed" or "gone"."""
     state = results.state_of(plan, task)
     if state is State.DONE:
         return Line(task, "done")
@@ -86,6 +86,8 @@ def line_of(plan: Plan, task: Task, known: Optional[str]) -> Line:
         return Line(task, WORD_OF_STATE[state], log.begun)
     if known == "pending":
         return Line(task, "queued")
+    if known == "held":
+        return Line(task, "failed", "no node has started it, and its engine holds it: submit lets it off")
     if known == "failed" or log.failed:
         return Line(task, "failed", log.why or f"its engine says so, and {log.path} says nothing")
     return Line(task, WORD_OF_STATE[state], log.why)

@@ -2,7 +2,8 @@
 """sbatch, squeue, scancel and scontrol, by the name that it is called by: a queue in a file, in which nothing runs.
 
 In the folder SLURM_CONF: jobs.json, the queue; `refuse` and `lose`, if they are there, count the sbatch calls until one
-is refused, or is taken without an answer.
+is refused, or is taken without an answer, and `hear` those of `scontrol requeue` until one is heard; `released`, the
+jobs that were.
 """
 
 import json
@@ -55,7 +56,8 @@ def main() -> int:
         for job in jobs:
             name = job["options"]["job-name"]
             for index, state in enumerate(job["states"] if name in options["name"].split(",") else ()):
-                print(f"{job['id']}|{index if 'array' in job['options'] else 'N/A'}|{name}|{state}")
+                state, _, reason = state.partition(" ")
+                print(f"{job['id']}|{index if 'array' in job['options'] else 'N/A'}|{name}|{state}|{reason or 'None'}")
     elif tool == "scancel":
         for job in jobs:
             if job["id"] == sys.argv[-1] and job["options"]["job-name"] == options["name"]:
@@ -63,6 +65,13 @@ def main() -> int:
                                  for state in job["states"]]
     elif sys.argv[1] == "show":
         print("MaxArraySize            = 4")
+    elif sys.argv[1] == "release":
+        with open(os.path.join(FOLDER, "released"), "a") as file:
+            print(*sys.argv[2:], file=file)
+        return 0
+    elif os.path.exists(os.path.join(FOLDER, "hear")) and not counted_down("hear"):
+        print("slurm_requeue error: Socket timed out on send/recv operation", file=sys.stderr)
+        return 1
     else:
         print("scontrol", *sys.argv[1:])
         return 0

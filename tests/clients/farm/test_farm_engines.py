@@ -221,6 +221,21 @@ class SlurmTest(AtFakeSlurm):
         asked = {name: jobs[2]["options"][name] for name in ("time", "signal", "partition", "gres", "cpus-per-task")}
         self.assertEqual(list(asked.values()), ["1", "B:USR1@15", "night", "gpu:2", "4"])
 
+    def test_what_a_node_did_not_start_is_released(self) -> None:
+        of = self.parts(3)
+        self.here("submit", of.folder)
+        held = "PENDING launch failed requeued held"
+        self.set_states(["PENDING", held, "PENDING JobHeldUser"], ["PENDING Dependency"])
+        self.assertEqual(list(engines.states(of).values()), ["pending", "held", "pending", "pending"])
+        self.assertIn("part-2: failed: no node has started it", self.here("status", of.folder, code=1))
+        self.assertEqual(self.here("submit", of.folder, "--dry-run"), "scontrol release 1_1\n")
+        self.assertIn("Released part-2 in job 1", self.here("submit", of.folder))
+        self.assertEqual((self.place / "released").read_text(), "1_1\n")
+        self.set_states(["PENDING"] * 3, [held])
+        self.assertIn("Released merge in job 2", self.here("submit", of.folder))
+        self.assertEqual((self.place / "released").read_text(), "1_1\n2\n")
+        self.assertIn("Cancelled 2 jobs", self.here("cancel", of.folder))
+
     def test_what_sbatch_refuses_or_takes_without_an_answer(self) -> None:
         for trouble, said in (("refuse", "invalid partition"), ("lose", "Socket timed out")):
             with self.subTest(trouble):
@@ -294,6 +309,14 @@ class ScriptTest(AtFakeSlurm):
                 status, said = self.run_script(program, restarts, number)
                 self.assertEqual((status, "scontrol requeue 5_1\n" in said), (code, again), said)
                 self.assertIn(f"job 5_1, start {restarts + 1}: y ended with {code}", said)
+
+    def test_a_busy_controller_is_asked_again(self) -> None:
+        for heard, again in [(3, True), (20, False)]:
+            (self.place / "hear").write_text(str(heard))
+            with self.subTest(heard=heard), mock.patch("neuralwarp_farm.engines.slurm.script.REQUEUE_PAUSE", 0):
+                status, said = self.run_script("exit 75", 0)
+                self.assertEqual((status, "scontrol requeue 5_1\n" in said), (75, again), said)
+                self.assertEqual(said.count("requeue 5_1 failed, try "), 2 if again else 8, said)
 
 
 if __name__ == "__main__":

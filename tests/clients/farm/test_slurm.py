@@ -27,11 +27,11 @@ ROWS = 10
 PATIENCE = 100.0  # seconds until something that has to come is given up
 
 
-def wait_for(what: str, is_so: Callable[[], object]) -> None:
+def wait_for(what: str, is_so: Callable[[], object], said: Callable[[], str] = str) -> None:
     until = time.monotonic() + PATIENCE
     while not is_so():
         if time.monotonic() > until:
-            raise AssertionError(f"no {what} in {PATIENCE:g} s")
+            raise AssertionError(f"no {what} in {PATIENCE:g} s\n{said()}")
         time.sleep(0.1)
 
 
@@ -54,6 +54,9 @@ class Work:
         if done.returncode:
             raise AssertionError(f"submit {self.plan.name}: {done.stderr}")
 
+    def wait_for(self, what: str, is_so: Callable[[], object]) -> None:
+        wait_for(f"{what} of {self.plan.name}", is_so, lambda: self.said() + self.slurm.run("scontrol", "show", "job"))
+
     def written(self) -> list[list[int]]:
         """Row and process of each row of the first task that is there, in a part or in the whole."""
         for folder in ("set0.part", "set0"):
@@ -63,12 +66,12 @@ class Work:
         return []
 
     def wait_for_rows(self) -> None:
-        wait_for(f"rows of {self.plan.name}", lambda: len(self.written()) == ROWS - 1)
+        self.wait_for("rows", lambda: len(self.written()) == ROWS - 1)
 
     def finish(self) -> None:
         """Lets the last rows be written, and waits for them."""
         (self.plan.folder / "go").touch()
-        wait_for(f"end of {self.plan.name}", lambda: self.farm("status", str(self.plan.folder)).returncode == 0)
+        self.wait_for("end", lambda: self.farm("status", str(self.plan.folder)).returncode == 0)
 
     def said(self) -> str:
         """What the scripts of jobs and the tasks have written."""
@@ -95,7 +98,7 @@ class OnSlurm(unittest.TestCase):
         cls.addClassCleanup(ending.close)
         cls.limited = Work(cls.slurm, "limited")
         with only(cls.slurm, "node1"):
-            cls.limited.submit("--time", "1")
+            cls.limited.submit("--time", "1", "--constraint", "node1")  # where no other test meets it
             cls.limited.wait_for_rows()
 
     def begin(self, name: str) -> Work:
@@ -108,7 +111,7 @@ class OnSlurm(unittest.TestCase):
 
     def check_goes_on(self, work: Work) -> None:
         """Another process takes over where the first was ended."""
-        wait_for(f"second start of {work.plan.name}", lambda: ", start 2: " in work.said())
+        work.wait_for("second start", lambda: re.search(r", start [2-9]: ", work.said()))
         self.check_rows(work, writers=2)
 
     def check_rows(self, work: Work, writers: int) -> None:
@@ -157,7 +160,7 @@ class OnSlurm(unittest.TestCase):
         work = self.begin("silent")
         self.addCleanup(os.kill, self.slurm.pids["node2"], signal.SIGCONT)
         os.kill(self.slurm.pids["node2"], signal.SIGSTOP)
-        wait_for("twin that is tried again", lambda: re.search(r"ended with 75\n.*begins again", work.said()))
+        work.wait_for("twin that is tried again", lambda: re.search(r"ended with 75\n.*begins again", work.said()))
         self.check_rows(work, writers=1)
 
 

@@ -23,7 +23,7 @@ def find(name: str) -> Engine:
 
 
 def states(plan: Plan) -> dict[str, str]:
-    """By task what the engine knows that it was sent by: "running", "pending", "failed" or "gone"."""
+    """By task what the engine knows that it was sent by: "running", "pending", "held", "failed" or "gone"."""
     result: dict[str, str] = {}
     for engine in ENGINES:
         result.update(engine.states(plan))

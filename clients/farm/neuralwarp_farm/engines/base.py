@@ -59,8 +59,8 @@ class Engine(Protocol):
         """Takes back what this engine has sent for this plan and nothing else; the answer is what to tell the user."""
 
     def states(self, plan: Plan) -> dict[str, str]:
-        """By task what this engine knows of it: "running", "pending", "failed" or "gone" (sent once, and heard of no
-        more). A task that it was never given is left out."""
+        """By task what this engine knows of it: "running", "pending", "held" (until `submit`), "failed" or "gone" (sent
+        once, and heard of no more). A task that it was never given is left out."""
 
 
 class Printer:

@@ -1,12 +1,14 @@
 # SPDX-License-Identifier: Apache-2.0
 """Slurm: the engine that is spoken to, by its command line tools and without its database (decision 0214)."""
 
+import shlex
 from typing import Sequence
 
 from ...plan import Plan, Task
 from .. import base
 from ..base import Options
 from . import jobs as job_list
+from .jobs import Job
 from .queue import ALIVE, Queue
 from .sending import Sender, groups
 from .tools import call, most_in_array
@@ -20,13 +22,14 @@ class Slurm:
         base.one_line(plan)
         jobs = job_list.read(plan)
         queue = Queue(jobs)
+        told = [release(task, queue.job_of[task.id], options) for task in tasks if queue.states.get(task.id) == "held"]
         chosen = to_send(tasks, queue.states)
-        if not chosen:
+        if not chosen and not told:
             return f"Nothing to send: {count(len(tasks), 'task')} of {plan.name} in the queue already."
         sender = Sender(plan, jobs, queue, options, base.task_command(plan, options))
         for group in groups(chosen, options, most_in_array(options.dry_run)):
             sender.send(group)
-        return "\n".join(sender.told)
+        return "\n".join(told + sender.told)
 
     def cancel(self, plan: Plan) -> str:
         """By id and name at once, so that a job that has got the id of one of these is not met."""
@@ -51,6 +54,15 @@ def to_send(tasks: Sequence[Task], states: dict[str, str]) -> list[Task]:
         if states.get(task.id) not in ALIVE or any(need in chosen for need in task.needs):
             chosen[task.id] = task
     return list(chosen.values())
+
+
+def release(task: Task, job: Job, options: Options) -> str:
+    """Has Slurm try again to start what a node did not start; the answer is what to tell the user."""
+    command = ["scontrol", "release", f"{job.id}_{job.tasks.index(task.id)}" if len(job.tasks) > 1 else str(job.id)]
+    if options.dry_run:
+        return shlex.join(command)
+    call(command)
+    return f"Released {task.id} in job {job.id}: Slurm held it, as a node did not start it."
 
 
 def count(number: int, noun: str) -> str:

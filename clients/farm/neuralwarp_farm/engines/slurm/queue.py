@@ -10,7 +10,8 @@ from .tools import call
 RUNNING = {"RUNNING", "COMPLETING", "STAGE_OUT", "SUSPENDED", "STOPPED", "SIGNALING", "RESIZING"}
 PENDING = {"PENDING", "CONFIGURING", "REQUEUED", "REQUEUE_FED", "REQUEUE_HOLD", "RESV_DEL_HOLD", "SPECIAL_EXIT"}
 NOT_FAILED = {"COMPLETED", "CANCELLED", "PREEMPTED", "REVOKED"}
-ALIVE = ("running", "pending")
+ALIVE = ("running", "pending", "held")
+LAUNCH_FAILED = "launch_failed_requeued_held"  # a node did not start it: Slurm keeps it until somebody releases it
 
 
 class Queue:
@@ -41,7 +42,7 @@ class Queue:
         self.job_of[task] = job
 
     def is_alive(self, job: Job) -> bool:
-        """Whether one of its tasks is pending or running."""
+        """Whether one of its tasks is pending, held or running."""
         return job.name in self._alive
 
 
@@ -59,20 +60,20 @@ def squeue(names: Sequence[str]) -> list[Line]:
     if not names:
         return []
     answer = call(["squeue", "--noheader", "--array", "--states=all", f"--name={','.join(names)}",
-                   "--format=%F|%K|%j|%T"])
+                   "--format=%F|%K|%j|%T|%r"])
     result = []
     for text in answer.splitlines():
         fields = text.strip().split("|")
-        if len(fields) == 4:
-            job, index, name, state = fields
-            result.append(Line(job, int(index) if index.isdigit() else None, name, plain_state(state)))
+        if len(fields) == 5:
+            job, index, name, state, reason = fields
+            result.append(Line(job, int(index) if index.isdigit() else None, name, plain_state(state, reason)))
     return result
 
 
-def plain_state(state: str) -> str:
+def plain_state(state: str, reason: str) -> str:
     """What has ended and has not failed by itself is "gone": whether its result is there is seen on the disk."""
     if state in RUNNING:
         return "running"
     if state in PENDING:
-        return "pending"
+        return "held" if reason.replace(" ", "_") == LAUNCH_FAILED else "pending"
     return "gone" if state in NOT_FAILED else "failed"

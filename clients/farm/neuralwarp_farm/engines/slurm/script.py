@@ -5,6 +5,8 @@ import shlex
 from typing import Mapping, Sequence
 
 MOST_RESTARTS = 5
+REQUEUE_TRIES = 8  # a busy controller does not answer in time; all of them fit between the warning and the time limit
+REQUEUE_PAUSE = 5  # seconds between two of them
 
 
 def script(title: str, command: Sequence[str], tasks: Sequence[str], environment: Mapping[str, str]) -> str:
@@ -17,7 +19,8 @@ def script(title: str, command: Sequence[str], tasks: Sequence[str], environment
     """
     variables = "".join(f"export {name}={shlex.quote(value)}\n" for name, value in environment.items())
     return TEMPLATE.format(title=title.replace("\n", " "), variables=variables, tasks=" ".join(map(shlex.quote, tasks)),
-                           command=shlex.join(command), restarts=MOST_RESTARTS)
+                           command=shlex.join(command), restarts=MOST_RESTARTS, tries=REQUEUE_TRIES,
+                           pause=REQUEUE_PAUSE)
 
 
 TEMPLATE = """\
@@ -56,7 +59,12 @@ say "$task ended with $code$asked"
 if {{ [ "$code" = 75 ] || [ "$code" = 137 ] || [ -n "$limit" ]; }} && [ "$code" != 0 ]; then
   if [ "$restarts" -lt {restarts} ]; then
     say "$task begins again"
-    scontrol requeue "$job" || say "scontrol requeue $job failed"
+    for ((try = 1; ; ++try)); do
+      scontrol requeue "$job" && break
+      say "scontrol requeue $job failed, try $try of {tries}"
+      [ "$try" -lt {tries} ] || break
+      sleep {pause}
+    done
   else
     say "$task was started $((restarts + 1)) times: given up"
   fi
