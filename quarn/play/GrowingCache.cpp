@@ -112,7 +112,6 @@ void GrowingCache::keep() {
 }
 
 void GrowingCache::publish() {
-    rows_->save();
     rows_->publish(0, file_);
     rows_.reset();
     discard();

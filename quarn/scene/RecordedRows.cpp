@@ -74,7 +74,7 @@ void RecordedRows::begin() {
         array.begin();
     isOpen_ = true;
     rows_ = 0;
-    save();
+    record(std::chrono::steady_clock::now()); // of no rows, so that none have to be on the disk before
 }
 
 std::string RecordedRows::resume() {
@@ -114,11 +114,15 @@ void RecordedRows::save() {
     if (!isOpen_)
         return;
     const auto begin = std::chrono::steady_clock::now();
-    ProgressRecord record{rows_, {}};
-    for (storage::NpyRows& array : arrays_) {
+    for (storage::NpyRows& array : arrays_)
         array.sync();
+    record(begin);
+}
+
+void RecordedRows::record(std::chrono::steady_clock::time_point begin) {
+    ProgressRecord record{rows_, {}};
+    for (storage::NpyRows& array : arrays_)
         record.sums.push_back(array.sum());
-    }
     storage::writeWhole(progress_, textOf(record));
     savedRows_ = rows_;
     saved_ = std::chrono::steady_clock::now();

@@ -49,6 +49,8 @@ public:
 
 private:
     bool isTimeToSave() const;
+    /// `begin`: of what it takes to save, for isTimeToSave().
+    void record(std::chrono::steady_clock::time_point begin);
 
     std::filesystem::path progress_;
     std::vector<std::string> files_;

@@ -104,6 +104,17 @@ class WholeTest(FarmTest):
                          [number != 4 for number in range(9)])
         self.assertIn("nothing to merge", self.farm("merge", self.folder, code=1))
 
+    def test_pictures_of_parts_are_those_of_one_film(self) -> None:
+        """The camera stands where it sees the motion of all frames, whatever a part has of it."""
+        self.plan_of("render", "--frames", "1-9x2", "--parts", "3", "--result", str(self.place / "film/h.##.png"),
+                     "--pass", "size=48x36")
+        for identifier in PARTS:
+            self.farm("task", self.folder, identifier)
+        self.farm("status", self.folder)
+        quarn("render", "scene.json", "--frames", "1-9x2", "--size", "48x36", "-o",
+              str(self.place / "one/h.##.png"), folder=self.work)
+        self.assert_same(self.place / "film", self.place / "one")
+
     def test_a_plan_by_the_time_of_its_first_frames(self) -> None:
         words = ("--frames", LONG, "--minutes", "0.02")
         self.plan_of("export", *words)
