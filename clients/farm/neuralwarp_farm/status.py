@@ -87,7 +87,7 @@ def line_of(plan: Plan, task: Task, known: Optional[str]) -> Line:
     if known == "pending":
         return Line(task, "queued")
     if known == "held":
-        return Line(task, "failed", "no node has started it, and its engine holds it: submit lets it off")
+        return Line(task, "failed", "no node has started it, and its engine holds it: submit releases it")
     if known == "failed" or log.failed:
         return Line(task, "failed", log.why or f"its engine says so, and {log.path} says nothing")
     return Line(task, WORD_OF_STATE[state], log.why)

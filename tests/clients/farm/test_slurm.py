@@ -49,6 +49,9 @@ class Work:
     def farm(self, *words: str) -> "subprocess.CompletedProcess[str]":
         return subprocess.run([*FARM, *words], env=self.slurm.environment, capture_output=True, text=True)
 
+    def status(self) -> "subprocess.CompletedProcess[str]":
+        return self.farm("status", str(self.plan.folder))
+
     def submit(self, *options: str) -> None:
         done = self.farm("submit", str(self.plan.folder), *options)
         if done.returncode:
@@ -71,7 +74,7 @@ class Work:
     def finish(self) -> None:
         """Lets the last rows be written, and waits for them."""
         (self.plan.folder / "go").touch()
-        self.wait_for("end", lambda: self.farm("status", str(self.plan.folder)).returncode == 0)
+        self.wait_for("end", lambda: self.status().returncode == 0)
 
     def said(self) -> str:
         """What the scripts of jobs and the tasks have written."""
@@ -161,6 +164,21 @@ class OnSlurm(unittest.TestCase):
         self.addCleanup(os.kill, self.slurm.pids["node2"], signal.SIGCONT)
         os.kill(self.slurm.pids["node2"], signal.SIGSTOP)
         work.wait_for("twin that is tried again", lambda: re.search(r"ended with 75\n.*begins again", work.said()))
+        self.check_rows(work, writers=1)
+
+    def test_node_that_starts_nothing(self) -> None:
+        """Slurm holds what the node could not start, until submit releases it."""
+        work = Work(self.slurm, "held", tasks=2)
+        spool, away = self.slurm.folder / "node2", self.slurm.folder / "node2.away"
+        spool.rename(away)
+        spool.touch()  # no folder, so that there is no place for the script
+        try:
+            work.submit("--constraint", "node2")
+            work.wait_for("failed start", lambda: work.status().stdout.count("no node has started it") == 2)
+        finally:
+            spool.unlink()
+            away.rename(spool)
+        self.assertEqual(work.farm("submit", str(work.plan.folder)).stdout.count("Released part-"), 2)
         self.check_rows(work, writers=1)
 
 
