@@ -95,7 +95,7 @@ def train(job: Job) -> dict[str, Any]:
         with files.whole_folder(job.model, MODEL_NAMES) as part:
             history, errors, result = train_into(job, part, split)
             result["seconds"] = time.monotonic() - start
-            report.write_report(report_part, result, history, job.dataset, errors)
+            report.write_report(report_part, result, history, job.dataset, errors, job.say)
     if not history.interrupted:
         resume.discard(job.model)
     return result

@@ -3,10 +3,11 @@
 
 import io
 import json
+import logging
 import os
 import platform
 from pathlib import Path
-from typing import Any
+from typing import Any, Callable
 
 import numpy as np
 
@@ -20,10 +21,16 @@ ERROR_NAMES = ("report.json", "frames.npy", "frameErrors.npy", "vertices.npy", "
 NAMES = (*ERROR_NAMES, "losses.csv", "loss.png")
 
 
-def write_report(folder: Path, report: dict[str, Any], history: History, dataset: Dataset, errors: Measured) -> None:
+def write_report(folder: Path, report: dict[str, Any], history: History, dataset: Dataset, errors: Measured,
+                 say: Callable[[str], None]) -> None:
     write_errors(folder, report, dataset, errors)
     write_bytes(folder / "losses.csv", losses(history).encode())
-    draw_losses(folder / "loss.png", history)
+    try:
+        picture = drawn_losses(history)
+    except OSError as error:  # matplotlib keeps a list of fonts in the user's home; no training is lost for that
+        say(f"no loss.png, as matplotlib does not start ({error}): losses.csv has the numbers")
+    else:
+        write_bytes(folder / "loss.png", picture)
 
 
 def write_errors(folder: Path, report: dict[str, Any], dataset: Dataset, errors: Measured) -> None:
@@ -58,8 +65,10 @@ def losses(history: History) -> str:
     return "\n".join(["epoch,training,validation", *lines]) + "\n"
 
 
-def draw_losses(path: Path, history: History) -> None:
+def drawn_losses(history: History) -> bytes:
+    """A PNG."""
     os.environ.setdefault("MPLBACKEND", "Agg")
+    logging.getLogger("matplotlib.font_manager").setLevel(logging.ERROR)  # else the first use ever has lines of its own
     from matplotlib.backends.backend_agg import FigureCanvasAgg
     from matplotlib.figure import Figure
     from matplotlib.ticker import MaxNLocator
@@ -79,4 +88,4 @@ def draw_losses(path: Path, history: History) -> None:
     axes.legend()
     picture = io.BytesIO()
     figure.savefig(picture, dpi=100)
-    write_bytes(path, picture.getvalue())
+    return picture.getvalue()

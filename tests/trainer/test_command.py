@@ -178,7 +178,18 @@ class CommandTest(unittest.TestCase):
             self.refused("train", "sets", "--quiet", "--epochs", "1", status=1)
         self.refused("info", "begun", status=1)
 
+    def test_a_full_home_costs_the_picture_alone(self) -> None:
+        """matplotlib writes a list of fonts there when it is first used."""
+        (self.place / "home").mkdir()
+        out, err = self.run_trainer(*TRAIN, "--epochs", "1", "--principal-shapes", "--neurons", "2", largest_file=15000,
+                                    MPLCONFIGDIR=str(self.place / "home"))
+        self.assertRegex(out, r"no loss.png, as matplotlib does not start \(.*File too large\)")
+        self.assertEqual(err, "")
+        self.assertTrue((self.place / "m/arm.report/losses.csv").exists())
+        self.assertFalse((self.place / "m/arm.report/loss.png").exists())
+
     def test_a_full_disk_is_told_with_the_file(self) -> None:
+        subprocess.run([sys.executable, "-c", "import matplotlib.font_manager"], check=True)  # see the test before
         synthetic.make(self.place / "two", frames=60, affect=[1, 2])
         shapes = ("--principal-shapes", "--neurons", "2")
         for name, size, data, more in (
