@@ -36,8 +36,10 @@ function(nw_target target)
       -fsanitize=${NW_SANITIZE} -fno-omit-frame-pointer -fno-sanitize-recover=all)
     target_link_options(${target} PRIVATE -fsanitize=${NW_SANITIZE})
     if(NW_SANITIZE MATCHES undefined AND CMAKE_CXX_COMPILER_ID MATCHES Clang)
-      target_compile_options(${target} PRIVATE
-        -fsanitize-ignorelist=${PROJECT_SOURCE_DIR}/tests/sanitizers/ubsan.ignorelist)
+      # by a path that is the same in every checkout, and by the option's older name, of which ccache knows that it names
+      # a file: otherwise no checkout could use what another one has compiled
+      file(RELATIVE_PATH _ignorelist ${CMAKE_BINARY_DIR} ${PROJECT_SOURCE_DIR}/tests/sanitizers/ubsan.ignorelist)
+      target_compile_options(${target} PRIVATE -fsanitize-blacklist=${_ignorelist})
     endif()
   endif()
 endfunction()
