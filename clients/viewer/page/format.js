@@ -1,12 +1,12 @@
 // SPDX-License-Identifier: Apache-2.0
 // How numbers are written.
 
-/** At most three digits that count, without an exponent down to a millionth: "0.0312", "1.2", "128". */
+/** At most three digits that count, without an exponent down to a ten-thousandth: "0.0312", "1.2", "128". */
 export function digits(value) {
   if (!Number.isFinite(value)) return '—';
   if (value === 0) return '0';
   const before = Math.floor(Math.log10(Math.abs(value))) + 1;
-  if (before < -5) return value.toExponential(1);
+  if (before < -3) return value.toExponential(1);
   const text = value.toFixed(Math.max(0, 3 - before));
   return text.includes('.') ? text.replace(/\.?0+$/, '') : text;
 }
