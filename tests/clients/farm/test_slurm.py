@@ -132,7 +132,7 @@ class OnSlurm(unittest.TestCase):
     def test_preempted(self) -> None:
         work = self.begin("preempted")
         self.slurm.run("sbatch", "--partition=urgent", "--nodelist=node2", "--cpus-per-task=4", "--output=/dev/null",
-                       "--wrap=sleep 1")
+                       f"--chdir={self.slurm.folder}", "--wrap=sleep 1")
         self.check_goes_on(work)
         self.assertIn("asked to end", work.said())
 
