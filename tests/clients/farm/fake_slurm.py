@@ -61,8 +61,8 @@ def main() -> int:
     elif tool == "scancel":
         for job in jobs:
             if job["id"] == sys.argv[-1] and job["options"]["job-name"] == options["name"]:
-                job["states"] = ["CANCELLED" if state in ("PENDING", options.get("state", "RUNNING")) else state
-                                 for state in job["states"]]
+                ends = ("PENDING", options.get("state", "RUNNING"))
+                job["states"] = ["CANCELLED" if state.split()[0] in ends else state for state in job["states"]]
     elif sys.argv[1] == "show":
         print("MaxArraySize            = 4")
     elif sys.argv[1] == "release":

@@ -234,7 +234,11 @@ class SlurmTest(AtFakeSlurm):
         self.set_states(["PENDING"] * 3, [held])
         self.assertIn("Released merge in job 2", self.here("submit", of.folder))
         self.assertEqual((self.place / "released").read_text(), "1_1\n2\n")
-        self.assertIn("Cancelled 2 jobs", self.here("cancel", of.folder))
+        self.set_states(["NODE_FAIL"] + ["PENDING"] * 2, [held])  # what it waits for is sent anew, and so is it
+        self.assertNotIn("Released", self.here("submit", of.folder))
+        self.assertEqual([job["states"][0].split()[0] for job in self.jobs()[1:]], ["CANCELLED", "PENDING", "PENDING"])
+        self.set_states(["PENDING"] * 3)
+        self.assertIn("Cancelled 3 jobs", self.here("cancel", of.folder))
 
     def test_what_sbatch_refuses_or_takes_without_an_answer(self) -> None:
         for trouble, said in (("refuse", "invalid partition"), ("lose", "Socket timed out")):

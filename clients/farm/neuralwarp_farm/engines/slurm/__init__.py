@@ -22,8 +22,9 @@ class Slurm:
         base.one_line(plan)
         jobs = job_list.read(plan)
         queue = Queue(jobs)
-        told = [release(task, queue.job_of[task.id], options) for task in tasks if queue.states.get(task.id) == "held"]
         chosen = to_send(tasks, queue.states)
+        told = [release(task, queue.job_of[task.id], options) for task in tasks
+                if queue.states.get(task.id) == "held" and task not in chosen]
         if not chosen and not told:
             return f"Nothing to send: {count(len(tasks), 'task')} of {plan.name} in the queue already."
         sender = Sender(plan, jobs, queue, options, base.task_command(plan, options))

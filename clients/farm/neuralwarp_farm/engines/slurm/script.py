@@ -5,7 +5,7 @@ import shlex
 from typing import Mapping, Sequence
 
 MOST_RESTARTS = 5
-REQUEUE_TRIES = 8  # a busy controller does not answer in time; all of them fit between the warning and the time limit
+REQUEUE_TRIES = 8  # a busy controller does not answer in time; the time limit may end them sooner
 REQUEUE_PAUSE = 5  # seconds between two of them
 
 

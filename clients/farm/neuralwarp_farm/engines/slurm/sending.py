@@ -86,7 +86,7 @@ class Sender:
         Tasks of an array need the same, so that all of it that waits goes: of one index scancel would take all, too.
         """
         waiting = {self._queue.job_of[task.id].name: self._queue.job_of[task.id] for task in tasks
-                   if self._queue.states.get(task.id) == "pending"}
+                   if self._queue.states.get(task.id) in ("pending", "held")}
         for job in waiting.values():
             call(["scancel", "--state=PENDING", f"--name={job.name}", str(job.id)])
 
