@@ -47,7 +47,8 @@ def main() -> None:
 def start(log: str, *command: str) -> str:
     try:
         with open(log, "ab") as output:
-            child = subprocess.Popen(command, stdin=subprocess.DEVNULL, stdout=output, stderr=output,
+            # in the folder, with which the core goes that one of them may leave
+            child = subprocess.Popen(command, cwd=sys.argv[1], stdin=subprocess.DEVNULL, stdout=output, stderr=output,
                                      start_new_session=True, preexec_fn=die_with_the_keeper)
     except OSError as error:
         return f"{error.filename}: {error.strerror}"
